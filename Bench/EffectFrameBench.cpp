@@ -1,0 +1,47 @@
+#include "EffectRun.h"
+
+// What does the frame itself cost per block, before any effect does anything? Bar: 60 ns.
+namespace {
+
+class NoEffect : public Corvo::DSP::CorvoEffectBase {
+public:
+    float GetParam(int) override { return 0.0f; }
+    int GetParamCountReal() override { return 16; }
+    std::string GetName() override { return "nothing"; }
+
+protected:
+    bool DoSetParam(int, float, bool) override { return false; }
+    void ProcessInternal(double*, int, const tWAVEFORMATEX* format,
+                         Corvo::DSP::ProcessFlags& flags) override {
+        if (m_cook.load(std::memory_order_relaxed)) CheckCookProperties(format, flags.force_cook);
+    }
+};
+
+void BM_FramePerBlock(benchmark::State& state) {
+    NoEffect effect;
+    const auto format = TestSupport::Format<float>();
+    float sample[2]{};
+    Corvo::DSP::ProcessFlags flags;
+    for (auto _ : state) {
+        effect.Process(reinterpret_cast<double*>(sample), 1, &format, flags);
+        benchmark::ClobberMemory();
+    }
+}
+BENCHMARK(BM_FramePerBlock);
+
+template <typename Sample>
+void BM_BlockCopy(benchmark::State& state) {
+    const auto frames = static_cast<std::size_t>(state.range(0));
+    const auto input = TestSupport::Noise<Sample>(2 * frames);
+    auto block = input;
+    for (auto _ : state) {
+        block = input;
+        benchmark::DoNotOptimize(block.data());
+        benchmark::ClobberMemory();
+    }
+    state.SetItemsProcessed(state.iterations() * state.range(0));
+}
+BENCHMARK_TEMPLATE(BM_BlockCopy, float)->Arg(512);
+BENCHMARK_TEMPLATE(BM_BlockCopy, double)->Arg(512);
+
+}  // namespace

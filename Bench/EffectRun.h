@@ -1,0 +1,28 @@
+#pragma once
+
+#include <benchmark/benchmark.h>
+
+#include <vector>
+
+#include "DSP/Effects/CorvoEffectBase.h"
+#include "Support/Signals.h"
+
+// Runs an effect over stereo noise in blocks of state.range(0) frames and reports frames per second. The
+// block is copied afresh each time: fed back, it would fade or grow and the run would time something else.
+// BM_BlockCopy is what to subtract.
+template <typename Sample>
+void RunEffect(benchmark::State& state, Corvo::DSP::CorvoEffectBase& effect) {
+    const auto frames = static_cast<int>(state.range(0));
+    const auto format = TestSupport::Format<Sample>();
+    effect.InitProcessing(frames, &format);
+    const auto input = TestSupport::Noise<Sample>(2 * static_cast<std::size_t>(frames));
+    auto block = input;
+    Corvo::DSP::ProcessFlags flags;
+    for (auto _ : state) {
+        block = input;
+        effect.Process(reinterpret_cast<double*>(block.data()), frames, &format, flags);
+        benchmark::DoNotOptimize(block.data());
+        benchmark::ClobberMemory();
+    }
+    state.SetItemsProcessed(state.iterations() * frames);
+}

@@ -1,0 +1,37 @@
+#include "Support/EffectCases.h"
+
+#include <algorithm>
+#include <array>
+#include <stdexcept>
+
+#include "DSP/Effects/GainEfx.h"
+
+namespace TestSupport {
+namespace {
+
+using namespace Corvo::DSP;
+
+template <typename Effect>
+std::unique_ptr<CorvoEffectBase> Make() {
+    return std::make_unique<Effect>();
+}
+
+constexpr std::array kEffects{
+    EffectCase{.name = "Gain",
+               .make = Make<GainEfx::GainEfx>,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "sine and cosine of the pan law",
+               .textTruncates = true},
+};
+
+}  // namespace
+
+std::span<const EffectCase> AllEffects() { return kEffects; }
+
+const EffectCase& FindEffect(const std::string& name) {
+    const auto found = std::ranges::find(kEffects, name, &EffectCase::name);
+    if (found == kEffects.end()) throw std::invalid_argument("no effect is called " + name);
+    return *found;
+}
+
+}  // namespace TestSupport

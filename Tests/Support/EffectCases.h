@@ -1,0 +1,47 @@
+#pragma once
+
+#include <memory>
+#include <span>
+#include <string>
+
+#include "DSP/Effects/CorvoEffectBase.h"
+
+namespace TestSupport {
+
+// How the output may depend on the way a stream is cut into blocks.
+enum class Cuts {
+    SameBits,
+    PhasePerBlock,  // an oscillator's phase is reduced per block: 1e-12 in double, one rounding in float
+    Glides,         // 1e-9: coefficients that glide are sampled per block
+    Exempt,         // the engine behind it works in pieces of its own
+};
+
+// How far another build of the library (other compiler, other mathematics library) may be off.
+enum class OtherBuild {
+    SameBits,   // basic arithmetic only
+    Relative,   // 1e-12 relative in double: sines, powers and logarithms differ in the last bit
+    Character,  // length, level and pitch only
+};
+
+// One row per effect; every suite over all effects, the comparison with the Windows build and the
+// benchmarks read this table. A new effect is one line in EffectCases.cpp.
+struct EffectCase {
+    const char* name;
+    std::unique_ptr<Corvo::DSP::CorvoEffectBase> (*make)();
+    Cuts cuts = Cuts::SameBits;
+    OtherBuild otherBuild = OtherBuild::SameBits;
+    const char* otherBuildReason = "basic arithmetic only";
+    // The engine behind the effect allocates or locks while processing; says why.
+    const char* engineAllocates = nullptr;
+    // Some settings have a loop gain of 1 or more, so the output may grow without bound.
+    bool mayGrow = false;
+    // Parameters that move together on purpose: setting a parameter may change others of its group.
+    bool linkedParameters = false;
+    // Texts are truncated, so text -> value -> text may lose one unit of the last place.
+    bool textTruncates = false;
+};
+
+std::span<const EffectCase> AllEffects();
+const EffectCase& FindEffect(const std::string& name);
+
+}  // namespace TestSupport

@@ -1,0 +1,66 @@
+#pragma once
+
+#include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <numbers>
+#include <vector>
+
+#include "Platform/WaveFormat.h"
+
+namespace TestSupport {
+
+// The format of a block of float or double samples.
+template <typename Sample>
+tWAVEFORMATEX Format(int channels = 2, int rate = 48000) {
+    tWAVEFORMATEX format{};
+    format.wFormatTag = 3;
+    format.nChannels = static_cast<std::uint16_t>(channels);
+    format.nSamplesPerSec = static_cast<std::uint32_t>(rate);
+    format.wBitsPerSample = static_cast<std::uint16_t>(8 * sizeof(Sample));
+    format.nBlockAlign = static_cast<std::uint16_t>(sizeof(Sample) * static_cast<std::size_t>(channels));
+    format.nAvgBytesPerSec = format.nSamplesPerSec * format.nBlockAlign;
+    return format;
+}
+
+// The same random numbers on every machine and in every run of one seed.
+class Random {
+public:
+    explicit Random(std::uint64_t seed = 1) : m_state(seed * 0x9E3779B97F4A7C15u + 1) {}
+    std::uint32_t Next() {
+        m_state ^= m_state << 13;
+        m_state ^= m_state >> 7;
+        m_state ^= m_state << 17;
+        return static_cast<std::uint32_t>(m_state >> 32);
+    }
+    // 0..1, 1 excluded.
+    double Unit() { return Next() * (1.0 / 4294967296.0); }
+    int Below(int limit) { return static_cast<int>(Unit() * limit); }
+
+private:
+    std::uint64_t m_state;
+};
+
+// `count` samples in -amplitude..amplitude.
+template <typename Sample>
+std::vector<Sample> Noise(std::size_t count, double amplitude = 0.25, std::uint64_t seed = 1) {
+    Random random(seed);
+    std::vector<Sample> noise(count);
+    for (auto& sample : noise) sample = static_cast<Sample>((2.0 * random.Unit() - 1.0) * amplitude);
+    return noise;
+}
+
+// The same sine on every channel, interleaved.
+template <typename Sample>
+std::vector<Sample> Sine(std::size_t frames, double hz, int rate = 48000, double amplitude = 0.5,
+                         int channels = 1) {
+    std::vector<Sample> sine;
+    sine.reserve(frames * static_cast<std::size_t>(channels));
+    for (std::size_t i = 0; i < frames; ++i)
+        sine.insert(sine.end(), static_cast<std::size_t>(channels),
+                    static_cast<Sample>(
+                        amplitude * std::sin(2.0 * std::numbers::pi * hz * static_cast<double>(i) / rate)));
+    return sine;
+}
+
+}  // namespace TestSupport
