@@ -163,9 +163,8 @@ std::wstring GainEfx::GetParameterFormattedText(int index, double value) {
 float GainEfx::GetParamValueNormalizedFromText(int index, std::string text) {
     if (!Has(index)) return -1.0f;
     const auto parameter = static_cast<std::size_t>(index);
-    if (kRows[parameter].type == MPT_BOOL) return ParseSwitch(text);
-    if (index != kGain) return Normalised(parameter, ParseNumber(text));
-    return Normalised(parameter, static_cast<float>(std::pow(10.0, ParseDecibels(text) * 0.05)));
+    const float number = ParseNumber(text);
+    return Normalised(parameter, index == kGain ? static_cast<float>(std::pow(10.0, number * 0.05)) : number);
 }
 
 void GainEfx::GetParamSectionInfo(int index, PluginParameterInfo& info) {

@@ -60,14 +60,9 @@ float ParseNumber(std::string_view text) {
     return number;
 }
 
-float ParseDecibels(std::string_view text) {
-    text = Trimmed(text);
-    return StartsWithNoCase(text, "-inf") ? -std::numeric_limits<float>::infinity() : ParseNumber(text);
-}
-
 std::int32_t ParseTenthsOfDb(std::string_view text, std::int32_t floor) {
     constexpr float kFarOut = 1e8f;  // keeps the conversion defined
-    const float tenths = ParseDecibels(text) * 10.0f;
+    const float tenths = ParseNumber(text) * 10.0f;
     if (!(tenths > static_cast<float>(floor))) return floor;
     return static_cast<std::int32_t>(std::lround(std::min(tenths, kFarOut)));
 }

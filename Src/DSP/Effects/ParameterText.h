@@ -20,11 +20,10 @@ std::wstring FormatSwitch(bool on);
 // The text, one blank, the unit; the blank stays when the unit is empty.
 std::wstring WithUnit(std::wstring text, std::wstring_view unit);
 
-// The number at the start of `text`, after blanks. Throws std::invalid_argument("invalid stof argument")
+// The number at the start of `text`, after blanks; "inf" and "nan" are numbers too, so "-Inf." is minus
+// infinity. Throws std::invalid_argument("invalid stof argument")
 // when there is none and std::out_of_range("stof argument out of range") when a float cannot hold it.
 float ParseNumber(std::string_view text);
-// Decibels as FormatTenthsOfDb shows them, "-Inf." included: negative infinity. Throws like ParseNumber.
-float ParseDecibels(std::string_view text);
 // The tenths that FormatTenthsOfDb shows as `text`: rounded, because the text is exact to a tenth; "-Inf."
 // gives `floor`.
 std::int32_t ParseTenthsOfDb(std::string_view text, std::int32_t floor);
