@@ -81,6 +81,7 @@ void CorvoEffectBase::SetParam(int index, float normalised, bool fromAutomation)
 }
 
 bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format) {
+    m_tail = {};
     SetMaximumFramesPerBuffer(maxFrames);
     CheckCookProperties(format, true);
     return true;
@@ -89,15 +90,26 @@ bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format)
 void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
-    ProcessInternal(buffer, frames, format, flags);
+    ProcessInternal(buffer, m_tail.BeginBlock(frames), format, flags);
+    m_tail.EndBlock();
 }
 
 void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                             ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
-    ProcessInternalNoninterleaved(channels, frames, format, flags);
+    ProcessInternalNoninterleaved(channels, m_tail.BeginBlock(frames), format, flags);
+    m_tail.EndBlock();
 }
+
+void CorvoEffectBase::StartTail(std::int64_t maxFrames) {
+    m_tail.frames_limited_to = std::max<std::int64_t>(maxFrames, 0);
+}
+void CorvoEffectBase::EndTail() { m_tail.frames_limited_to = -1; }
+bool CorvoEffectBase::InTail() const { return m_tail.TailMode(); }
+int CorvoEffectBase::TailFramesProduced() const { return m_tail.frames_produced; }
+bool CorvoEffectBase::TailFinished() const { return m_tail.finished; }
+void CorvoEffectBase::RequestTailRestart() { m_tail.restart_requested = true; }
 
 void CorvoEffectBase::SetHostCallback(CorvoEffectHostCallback* callback) { m_host_callback = callback; }
 void CorvoEffectBase::NotifyTempoChanged() { m_cook.store(true, std::memory_order_release); }

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "DSP/Effects/ProcessFlags.h"
+#include "DSP/Effects/TailRecord.h"
 #include "Host/BuiltinEditor.h"
 #include "Host/CorvoEffectHostCallback.h"
 #include "Host/GenericUIData.h"
@@ -135,6 +136,24 @@ public:
     void ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                ProcessFlags& flags);
 
+    // Ringing out, on the audio thread and between blocks. When the stream has ended, the host calls
+    // StartTail and goes on with blocks of silence: of each, the first TailFramesProduced() frames are
+    // output and the rest is as it was handed in, until TailFinished(). Then EndTail.
+    //
+    // Echo, chorus and flanger know how long they ring and finish after one pass of their delay line;
+    // with feedback more is left, which ordinary blocks after EndTail bring out. Every other effect fills
+    // all blocks and finishes at the limit only. So the host that wants everything goes on after EndTail,
+    // or sets the limit, until it hears silence.
+    void StartTail(std::int64_t maxFrames);  // 0 or below finishes with the next block, without output
+    void EndTail();
+    bool InTail() const;
+    int TailFramesProduced() const;  // of the last block; outside the tail all its frames
+    bool TailFinished() const;
+    // With the next block the delay lines run from their first element again, keeping what they hold, and
+    // a whole pass is left to ring. Not needed after InitProcessing, which clears the tail; for a host that
+    // begins another stream without it.
+    void RequestTailRestart();
+
     void SetHostCallback(CorvoEffectHostCallback* callback);  // not owned; null for none
     // The host calls this when tempo or time signature changed: the next block derives afresh.
     void NotifyTempoChanged();
@@ -192,6 +211,7 @@ protected:
     std::int64_t m_envelope_time = 0;
     // Raised with release after an edit is stored, lowered with acquire before it is read.
     std::atomic<bool> m_cook{true};
+    TailRecord m_tail;
 };
 
 }  // namespace Corvo::DSP
