@@ -32,11 +32,9 @@ BENCHMARK(BM_FramePerBlock);
 template <typename Sample>
 void BM_BlockCopy(benchmark::State& state) {
     const auto frames = static_cast<std::size_t>(state.range(0));
-    const auto input = TestSupport::Noise<Sample>(2 * frames);
-    auto block = input;
+    TestSupport::BlockCopy block(TestSupport::Noise<Sample>(2 * frames));
     for (auto _ : state) {
-        block = input;
-        benchmark::DoNotOptimize(block.data());
+        benchmark::DoNotOptimize(block.Fresh());
         benchmark::ClobberMemory();
     }
     state.SetItemsProcessed(state.iterations() * state.range(0));

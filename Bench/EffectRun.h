@@ -2,9 +2,8 @@
 
 #include <benchmark/benchmark.h>
 
-#include <vector>
-
 #include "DSP/Effects/CorvoEffectBase.h"
+#include "Support/BlockCopy.h"
 #include "Support/Signals.h"
 
 // Runs an effect over stereo noise in blocks of state.range(0) frames and reports frames per second. The
@@ -15,13 +14,10 @@ void RunEffect(benchmark::State& state, Corvo::DSP::CorvoEffectBase& effect) {
     const auto frames = static_cast<int>(state.range(0));
     const auto format = TestSupport::Format<Sample>();
     effect.InitProcessing(frames, &format);
-    const auto input = TestSupport::Noise<Sample>(2 * static_cast<std::size_t>(frames));
-    auto block = input;
+    TestSupport::BlockCopy block(TestSupport::Noise<Sample>(2 * static_cast<std::size_t>(frames)));
     Corvo::DSP::ProcessFlags flags;
     for (auto _ : state) {
-        block = input;
-        effect.Process(reinterpret_cast<double*>(block.data()), frames, &format, flags);
-        benchmark::DoNotOptimize(block.data());
+        effect.Process(reinterpret_cast<double*>(block.Fresh()), frames, &format, flags);
         benchmark::ClobberMemory();
     }
     state.SetItemsProcessed(state.iterations() * frames);

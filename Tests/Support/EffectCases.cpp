@@ -21,6 +21,7 @@ constexpr std::array kEffects{
                .make = Make<GainEfx::GainEfx>,
                .otherBuild = OtherBuild::Relative,
                .otherBuildReason = "sine and cosine of the pan law",
+               .plainFloats = true,
                .textTruncates = true},
 };
 

@@ -37,6 +37,8 @@ struct EffectCase {
     bool mayGrow = false;
     // Parameters that move together on purpose: setting a parameter may change others of its group.
     bool linkedParameters = false;
+    // Parameters are kept as plain floats rather than words, so a round trip may be off by a rounding.
+    bool plainFloats = false;
     // Texts are truncated, so text -> value -> text may lose one unit of the last place.
     bool textTruncates = false;
 };

@@ -1,0 +1,153 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <stdexcept>
+
+#include "Support/EveryEffect.h"
+
+using namespace TestSupport;
+
+// What every effect promises about parameters, presets and chunks.
+namespace {
+
+using Bytes = std::vector<std::uint8_t>;
+
+// Loads bytes that may be anything and runs a block, watching the block's edges.
+void ExpectHarmless(CorvoEffectBase& effect, const Bytes& chunk, const std::string& what) {
+    const auto format = Format<float>();
+    effect.SetSettingsChunk(chunk);
+    FencedBlock<float> block(2 * 64);
+    std::ranges::copy(Noise<float>(2 * 64), block.Data());
+    ProcessBlock(effect, block.Data(), 64, format);
+    ASSERT_TRUE(block.Intact()) << what;
+    for (int i = 0; i < effect.GetParamCount(); ++i) {
+        const float value = effect.GetParam(i);
+        ASSERT_TRUE(value >= 0.0f && value <= 1.0f) << what << ", parameter " << i << " at " << value;
+        effect.GetParameterFormattedText(i, value);
+    }
+}
+
+std::string NarrowText(CorvoEffectBase& effect, int index) {
+    const auto wide = effect.GetParameterFormattedText(index, effect.GetParam(index));
+    return {wide.begin(), wide.end()};
+}
+
+}  // namespace
+
+using EveryEffectSettings = EveryEffect;
+INSTANTIATE_TEST_SUITE_P(All, EveryEffectSettings, testing::ValuesIn(AllEffects()), EffectTestName);
+
+// Catches knobs that creep when a project is reopened, and rows wired to the wrong field.
+TEST_P(EveryEffectSettings, MovesOneParameterAndKeepsItsWord) {
+    const auto effect = Make();
+    for (int index = 0; index < effect->GetParamCount(); ++index)
+        for (int step = 0; step <= 500; ++step) {
+            auto expected = AllParams(*effect);
+            effect->SetParam(index, static_cast<float>(step) / 500.0f, false);
+            const auto stored = Chunk(*effect);
+            expected[static_cast<std::size_t>(index)] = effect->GetParam(index);
+            if (GetParam().plainFloats) {
+                ASSERT_NEAR(effect->GetParam(index), static_cast<float>(step) / 500.0f, 1e-6);
+            } else {
+                effect->SetParam(index, effect->GetParam(index), false);
+                ASSERT_EQ(Chunk(*effect), stored) << "parameter " << index << ", step " << step;
+            }
+            if (!GetParam().linkedParameters) {
+                ASSERT_EQ(AllParams(*effect), expected) << "parameter " << index << ", step " << step;
+            }
+        }
+}
+
+// Catches a field that is not saved, saved twice or read from the wrong place.
+TEST_P(EveryEffectSettings, SavesAndLoadsEverySetting) {
+    for (std::uint64_t seed = 1; seed <= 20; ++seed) {
+        const auto effect = Make();
+        Random random(seed);
+        SetAllParams(*effect, random);
+        const auto chunk = Chunk(*effect);
+        ASSERT_EQ(chunk.size(), static_cast<std::size_t>(effect->GetSettingsChunkSize()));
+        const auto other = GetParam().make();
+        other->SetSettingsChunk(chunk);
+        ASSERT_EQ(Chunk(*other), chunk);
+        ASSERT_EQ(AllParams(*other), AllParams(*effect));
+    }
+    const auto effect = Make();
+    for (int preset = 0; preset < effect->NumPresets(); ++preset) {
+        effect->SetPreset(preset);
+        EXPECT_FALSE(effect->GetPresetName(preset).empty());
+        const auto other = GetParam().make();
+        other->SetSettingsChunk(Chunk(*effect));
+        ASSERT_EQ(Chunk(*other), Chunk(*effect)) << "preset " << preset;
+    }
+}
+
+// Catches trust in bytes from outside.
+TEST_P(EveryEffectSettings, SurvivesAnyChunk) {
+    const auto effect = Make();
+    const auto format = Format<float>();
+    effect->InitProcessing(64, &format);
+    const auto good = Chunk(*effect);
+    const std::size_t stride = std::max<std::size_t>(1, good.size() / 200);
+    for (std::size_t length = 0; length < good.size(); length += stride)
+        ExpectHarmless(*effect, Bytes(good.begin(), good.begin() + static_cast<std::ptrdiff_t>(length)),
+                       "cut at " + std::to_string(length));
+    Random random(5);
+    for (int round = 0; round < 60; ++round) {
+        Bytes bytes(round % 3 == 0 ? good.size() : static_cast<std::size_t>(random.Below(400)));
+        for (auto& byte : bytes) byte = static_cast<std::uint8_t>(random.Next());
+        ExpectHarmless(*effect, bytes, "random bytes " + std::to_string(round));
+    }
+    for (const int value : {0x00, 0x7F, 0x80, 0xFF}) {
+        const auto byte = static_cast<std::uint8_t>(value);
+        ExpectHarmless(*effect, Bytes(good.size(), byte), "all bytes " + std::to_string(value));
+        ExpectHarmless(*effect, Bytes(1 << 20, byte), "a megabyte of " + std::to_string(value));
+    }
+    effect->SetSettingsChunk(good);
+    EXPECT_EQ(Chunk(*effect), good) << "a good chunk is taken after all that";
+    effect->Cleanup();
+    const auto output = Render(*effect, Noise<float>(2 * 4800), format, {512});
+    EXPECT_TRUE(std::ranges::all_of(output, [](float sample) { return std::isfinite(sample); }));
+}
+
+// Catches a number from outside that is believed.
+TEST_P(EveryEffectSettings, IgnoresPresetNumbersAndIndicesItDoesNotHave) {
+    const auto effect = Make();
+    const auto before = Chunk(*effect);
+    for (const int index : {-1, 1000, effect->GetParamCount(), 1 << 30}) effect->SetParam(index, 0.3f, true);
+    for (const int preset : {-1, effect->NumPresets(), 1 << 30}) effect->SetPreset(preset);
+    EXPECT_EQ(Chunk(*effect), before);
+}
+
+// Catches texts that the effect shows but does not understand, or reads as another value.
+TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
+    const auto effect = Make();
+    for (int index = 0; index < effect->GetParamCount(); ++index) {
+        // The host matches the texts of switches and lists itself.
+        if (effect->GetParameterTypeAutomatable(index) != Corvo::DSP::EffectParameterType::Continuous)
+            continue;
+        for (int step = 0; step <= 100; ++step) {
+            effect->SetParam(index, static_cast<float>(step) / 100.0f, false);
+            const auto shown = NarrowText(*effect, index);
+            ASSERT_FALSE(shown.empty()) << "parameter " << index;
+            const float value = effect->GetParamValueNormalizedFromText(index, shown);
+            if (value == -1.0f && step == 0) break;  // this effect parses no text
+            ASSERT_TRUE(value >= 0.0f && value <= 1.0f) << shown;
+            effect->SetParam(index, value, false);
+            const auto again = NarrowText(*effect, index);
+            if (!GetParam().textTruncates) {
+                ASSERT_EQ(again, shown) << "parameter " << index;
+            } else if (again != shown) {
+                ASSERT_NEAR(std::stod(again), std::stod(shown), 0.1001) << "parameter " << index;
+            }
+        }
+    }
+}
+
+// Catches defaults that differ from the preset a new instance should start from.
+TEST_P(EveryEffectSettings, StartsFromItsDefaultPreset) {
+    const auto effect = GetParam().make();
+    if (effect->NumPresets() == 0) GTEST_SKIP() << "has no presets";
+    const auto fresh = AllParams(*effect);
+    effect->SetPreset(effect->GetDefaultPreset());
+    EXPECT_EQ(AllParams(*effect), fresh);
+}

@@ -1,0 +1,196 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <limits>
+
+#include "Support/EveryEffect.h"
+
+using namespace TestSupport;
+
+// What every effect promises about streams of audio.
+namespace {
+
+// Every parameter moved once, spread over the middle of the stream, so that glides are cut as well.
+std::vector<Edit> MoveEverything(CorvoEffectBase& effect, std::size_t frames, std::uint64_t seed) {
+    Random random(seed);
+    const int count = effect.GetParamCount();
+    std::vector<Edit> edits;
+    for (int i = 0; i < count; ++i)
+        edits.push_back(
+            {frames / 3 + static_cast<std::size_t>(i) * frames / static_cast<std::size_t>(4 * count), i,
+             static_cast<float>(random.Unit())});
+    return edits;
+}
+
+template <typename Sample>
+bool Close(Sample a, Sample b, Cuts cuts) {
+    if (a == b) return true;
+    const double difference = std::abs(static_cast<double>(a) - static_cast<double>(b));
+    const double rounding =
+        std::is_same_v<Sample, float> ? 1.2e-7 * std::max(std::abs(static_cast<double>(a)), 1e-3) : 0.0;
+    switch (cuts) {
+        case Cuts::PhasePerBlock:
+            return difference <= 1e-12 + rounding;
+        case Cuts::Glides:
+            return difference <= 1e-9 + rounding;
+        default:
+            return false;
+    }
+}
+
+template <typename Sample>
+void ExpectTheSameHoweverCut(const EffectCase& row) {
+    constexpr std::size_t kFrames = 5000;
+    const auto format = Format<Sample>();
+    const auto input = Noise<Sample>(2 * kFrames);
+    std::vector<int> random(40);
+    Random source(7);
+    for (auto& cut : random) cut = 1 + source.Below(700);
+    std::vector<Sample> whole;
+    for (const auto& cuts : {std::vector<int>{kFrames}, {1}, {7}, {64}, {511}, {4096}, random}) {
+        const auto effect = row.make();
+        const auto output = Render(*effect, input, format, cuts, MoveEverything(*effect, kFrames, 3));
+        if (whole.empty()) whole = output;
+        for (std::size_t i = 0; i < output.size(); ++i)
+            ASSERT_TRUE(Close(output[i], whole[i], row.cuts))
+                << "frame " << i / 2 << ", blocks of " << cuts.front() << ": " << output[i] << " instead of "
+                << whole[i];
+    }
+}
+
+bool AllFinite(std::span<const float> samples) {
+    return std::ranges::all_of(samples, [](float sample) { return std::isfinite(sample); });
+}
+
+}  // namespace
+
+INSTANTIATE_TEST_SUITE_P(All, EveryEffect, testing::ValuesIn(AllEffects()), EffectTestName);
+
+// Catches state lost, advanced twice or rounded at a block's edge.
+TEST_P(EveryEffect, GivesTheSameOutputHoweverTheStreamIsCut) {
+    if (GetParam().cuts == Cuts::Exempt) GTEST_SKIP() << "its engine works in pieces of its own";
+    ExpectTheSameHoweverCut<float>(GetParam());
+    ExpectTheSameHoweverCut<double>(GetParam());
+}
+
+// Catches a per-channel path that lags behind the interleaved one, or that touches what it does not support.
+TEST_P(EveryEffect, TreatsPlanarBlocksLikeInterleavedOnes) {
+    constexpr std::size_t kFrames = 2000;
+    const auto format = Format<double>();
+    const auto input = Noise<double>(2 * kFrames);
+    const auto planar = Make(), interleaved = Make();
+    std::vector<double> left, right;
+    for (std::size_t i = 0; i < kFrames; ++i) {
+        left.push_back(input[2 * i]);
+        right.push_back(input[2 * i + 1]);
+    }
+    double* const channels[] = {left.data(), right.data()};
+    planar->InitProcessing(kFrames, &format);
+    Corvo::DSP::ProcessFlags flags;
+    planar->ProcessNoninterleaved(channels, kFrames, &format, flags);
+    const auto expected =
+        planar->SupportsNoninterleaved() ? Render(*interleaved, input, format, {kFrames}) : input;
+    for (std::size_t i = 0; i < kFrames; ++i) {
+        ASSERT_EQ(left[i], expected[2 * i]) << "frame " << i;
+        ASSERT_EQ(right[i], expected[2 * i + 1]) << "frame " << i;
+    }
+}
+
+// Catches delay lines and filters that only fit the usual rates, and prepared memory that a block larger than
+// announced, or a second preparation, runs out of.
+TEST_P(EveryEffect, StaysInsideItsBlocksAtAnyRateAndSize) {
+    const auto effect = Make();
+    for (const int rate : {1000, 7919, 8000, 44056, 44100, 48000, 96001, 192000, 768000})
+        for (const int channels : {2, 1}) {
+            const auto format = Format<float>(channels, rate);
+            effect->InitProcessing(100, &format);
+            for (const int frames : {100, 200, 1, 0}) {
+                const auto count = static_cast<std::size_t>(frames * channels);
+                const auto noise = Noise<float>(count);
+                FencedBlock<float> block(count);
+                std::ranges::copy(noise, block.Data());
+                ProcessBlock(*effect, block.Data(), frames, format);
+                ASSERT_TRUE(block.Intact()) << rate << " Hz, " << channels << " channels, " << frames;
+                for (std::size_t i = 0; i < count; ++i)
+                    ASSERT_TRUE(std::isfinite(block.Data()[i])) << rate << " Hz, " << channels << " channels";
+            }
+        }
+}
+
+// Catches a format change in mid-stream that the effect was not prepared for.
+TEST_P(EveryEffect, SurvivesSwitchingBetweenMonoAndStereo) {
+    const auto effect = Make();
+    const auto stereo = Format<float>(2), mono = Format<float>(1), wide = Format<double>(2, 96000);
+    effect->InitProcessing(256, &stereo);
+    for (int round = 0; round < 12; ++round)
+        for (const auto* format : {&stereo, &mono, &wide}) {
+            const auto count = static_cast<std::size_t>(256 * format->nChannels);
+            FencedBlock<double> block(count);
+            std::fill_n(block.Data(), count, 0.125);
+            if (format->wBitsPerSample == 32)
+                std::ranges::copy(Noise<float>(count), reinterpret_cast<float*>(block.Data()));
+            Corvo::DSP::ProcessFlags flags;
+            effect->Process(block.Data(), 256, format, flags);
+            ASSERT_TRUE(block.Intact());
+        }
+}
+
+// Catches settings that blow up inside their allowed range.
+TEST_P(EveryEffect, StaysFiniteAtEverySetting) {
+    const auto format = Format<float>();
+    const auto input = Noise<float>(2 * 3000);
+    const auto check = [&](const auto& set, const std::string& what) {
+        const auto effect = Make();
+        set(*effect);
+        const auto output = Render(*effect, input, format, {512});
+        if (!GetParam().mayGrow) {
+            ASSERT_TRUE(AllFinite(output)) << what;
+        }
+        effect->Cleanup();
+        effect->SetPreset(effect->GetDefaultPreset());
+        for (int i = 0; effect->NumPresets() == 0 && i < effect->GetParamCount(); ++i)
+            effect->SetParam(i, 0.5f, false);
+        ASSERT_TRUE(AllFinite(Render(*effect, input, format, {512}))) << what << ", afterwards";
+    };
+    const auto plain = Make();
+    for (int i = 0; i < plain->GetParamCount(); ++i)
+        for (const float value : {0.0f, 1.0f, std::numeric_limits<float>::quiet_NaN(), -1e30f, 1e30f}) {
+            // The gain effect stores what it is given, however far out of range.
+            if (!(std::abs(value) <= 1.0f) && std::string(GetParam().name) == "Gain") continue;
+            check([&](auto& effect) { effect.SetParam(i, value, false); },
+                  "parameter " + std::to_string(i) + " at " + std::to_string(value));
+        }
+    for (std::uint64_t seed = 1; seed <= 50; ++seed)
+        check(
+            [&](auto& effect) {
+                Random random(seed);
+                SetAllParams(effect, random);
+            },
+            "random settings " + std::to_string(seed));
+}
+
+// Catches poison that stays in filters and delay lines for good.
+TEST_P(EveryEffect, RecoversFromInputThatIsNoNumber) {
+    const auto format = Format<float>();
+    const auto effect = Make();
+    auto poison = Noise<float>(2 * 1000);
+    poison[100] = std::numeric_limits<float>::quiet_NaN();
+    poison[501] = std::numeric_limits<float>::infinity();
+    poison[900] = -std::numeric_limits<float>::infinity();
+    effect->InitProcessing(1000, &format);
+    FencedBlock<float> block(poison.size());
+    std::ranges::copy(poison, block.Data());
+    ProcessBlock(*effect, block.Data(), 1000, format);
+    ASSERT_TRUE(block.Intact());
+    effect->Cleanup();
+    const auto output = Render(*effect, Noise<float>(2 * 2 * 48000), format, {512});
+    ASSERT_TRUE(AllFinite(std::span(output).subspan(2 * 48000))) << "still poisoned after a second";
+}
+
+// Catches noise, constant offsets and oscillation where there should be nothing.
+TEST_P(EveryEffect, KeepsSilenceSilent) {
+    const auto effect = Make();
+    const auto format = Format<double>();
+    const auto output = Render(*effect, std::vector<double>(2 * 20000), format, {512});
+    for (const double sample : output) ASSERT_LT(std::abs(sample), 1e-9);
+}

@@ -1,0 +1,146 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <chrono>
+#include <ctime>
+#include <mutex>
+#include <thread>
+
+#include "Support/AudioThreadRules.h"
+#include "Support/BlockCopy.h"
+#include "Support/EveryEffect.h"
+
+using namespace TestSupport;
+
+// What every effect promises about its two threads and about its cost.
+namespace {
+
+double ThreadSeconds() {
+#if defined(__linux__)
+    timespec time{};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
+    return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_nsec) * 1e-9;
+#else
+    return static_cast<double>(std::clock()) / CLOCKS_PER_SEC;
+#endif
+}
+
+double SecondsFor(CorvoEffectBase& effect, BlockCopy<float>& block, int frames, const tWAVEFORMATEX& format) {
+    const double start = ThreadSeconds();
+    for (int round = 0; round < 40; ++round) ProcessBlock(effect, block.Fresh(), frames, format);
+    return ThreadSeconds() - start;
+}
+
+}  // namespace
+
+using EveryEffectThread = EveryEffect;
+INSTANTIATE_TEST_SUITE_P(All, EveryEffectThread, testing::ValuesIn(AllEffects()), EffectTestName);
+
+// Catches counters that see nothing, which would make the next test pass whatever an effect does.
+TEST(AudioThreadRules, SeesWhatIsForbidden) {
+    if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
+    std::mutex mutex;
+    std::unique_ptr<std::vector<int>> memory;
+    std::string broken;
+    {
+        const AudioThreadRules rules;
+        memory = std::make_unique<std::vector<int>>(100);
+        const std::lock_guard lock(mutex);
+        std::this_thread::sleep_for(std::chrono::nanoseconds(1));
+        broken = rules.Broken();
+    }
+    EXPECT_EQ(broken, "2 allocations, 1 locks, 1 waits");
+    {
+        const AudioThreadRules rules;
+        memory.reset();
+        broken = rules.Broken();
+    }
+    EXPECT_EQ(broken, "2 frees");
+}
+
+// Catches work on the audio thread that may stop it: edits, presets, automation and forced cooks included.
+TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
+    if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
+    if (GetParam().engineAllocates) GTEST_SKIP() << GetParam().engineAllocates;
+    const auto effect = Make();
+    const auto format = Format<float>();
+    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.2f, 0.2f, 0, 0}, {600, 600, 0.7f, 0.7f, 0, 0}};
+    for (int index = 0; index < effect->GetParamCountReal(); index += 2)
+        effect->AddEnvelope(index, 2, segments);
+    effect->InitProcessing(256, &format);
+    auto block = Noise<float>(2 * 256);
+    Random random(11);
+    const auto process = [&](const std::string& what, bool force) {
+        Corvo::DSP::ProcessFlags flags{force, false};
+        std::string broken;
+        {
+            const AudioThreadRules rules;
+            effect->Process(reinterpret_cast<double*>(block.data()), 256, &format, flags);
+            broken = rules.Broken();
+        }
+        ASSERT_EQ(broken, "") << what;
+        block = Noise<float>(2 * 256);
+    };
+    for (int round = 0; round < 100; ++round) {
+        effect->SetEnvelopeTime(round * 256);
+        if (round % 3 == 0) SetAllParams(*effect, random);
+        if (round % 7 == 0 && effect->NumPresets() > 0) effect->SetPreset(random.Below(effect->NumPresets()));
+        process("round " + std::to_string(round), round % 10 == 9);
+    }
+    for (int index = 0; index < effect->GetParamCount(); ++index)
+        for (const float value : {0.0f, 1.0f, 0.5f}) {
+            effect->SetParam(index, value, false);
+            process("parameter " + std::to_string(index) + " at " + std::to_string(value), false);
+        }
+}
+
+// Catches races between edits and processing (under the thread sanitizer) and edits that get lost.
+TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
+    const auto effect = Make();
+    const auto format = Format<float>();
+    effect->InitProcessing(32, &format);
+    std::atomic<bool> done{false};
+    std::thread userInterface([&] {
+        Random random(13);
+        const auto good = Chunk(*effect);
+        for (int round = 0; !done || round < 20; ++round) {
+            for (int index = 0; index < effect->GetParamCount(); ++index) {
+                effect->SetParam(index, static_cast<float>(random.Unit()), false);
+                effect->GetParameterFormattedText(index, effect->GetParam(index));
+                PluginParameterInfo info;
+                effect->GetParamSectionInfo(index, info);
+            }
+            if (round % 5 == 0 && effect->NumPresets() > 0)
+                effect->SetPreset(random.Below(effect->NumPresets()));
+            if (round % 7 == 0) effect->SetSettingsChunk(good);
+            if (effect->WantsUpdateUiFromScratch()) effect->SetUpdateUiFromScratch(false);
+            std::this_thread::yield();
+        }
+    });
+    const auto input = Noise<float>(2 * 32);
+    for (int i = 0; i < 500; ++i) {
+        auto block = input;
+        ProcessBlock(*effect, block.data(), 32, format);
+    }
+    done = true;
+    userInterface.join();
+}
+
+// Catches a missing denormal guard: filters that ring out into silence then run many times slower.
+TEST_P(EveryEffectThread, CostsNoMoreOnDenormalsThanOnNoise) {
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__) || defined(_WIN32)
+    GTEST_SKIP() << "timings mean nothing on this build";
+#endif
+    const auto effect = Make();
+    const auto format = Format<float>();
+    effect->InitProcessing(512, &format);
+    BlockCopy noise(Noise<float>(2 * 512)), tiny(Noise<float>(2 * 512, 1e-40));
+    // The best of several rounds, more of them while other work on the machine disturbs the measurement.
+    double best[2] = {1e9, 1e9};
+    for (int round = 0; round < 60; ++round) {
+        best[0] = std::min(best[0], SecondsFor(*effect, noise, 512, format));
+        best[1] = std::min(best[1], SecondsFor(*effect, tiny, 512, format));
+        if (round >= 4 && best[1] <= 1.2 * best[0]) break;
+    }
+    EXPECT_LE(best[1], 1.2 * best[0]);
+}

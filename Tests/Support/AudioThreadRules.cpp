@@ -1,0 +1,135 @@
+#include "Support/AudioThreadRules.h"
+
+#include <array>
+
+#if defined(__linux__) && !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
+#define COUNTS_CALLS 1
+#include <dlfcn.h>
+#include <pthread.h>
+#include <time.h>
+
+#include <cerrno>
+#include <cstddef>
+#include <typeinfo>
+#endif
+
+namespace TestSupport {
+namespace {
+
+enum Kind { kAllocation, kFree, kLock, kWait, kThrow, kKinds };
+constexpr std::array<const char*, kKinds> kNames{"allocations", "frees", "locks", "waits", "throws"};
+
+thread_local bool t_counting = false;
+thread_local std::array<int, kKinds> t_counts{};
+
+#if COUNTS_CALLS
+void Note(Kind kind) {
+    if (t_counting) ++t_counts[kind];
+}
+
+template <typename Function>
+Function* Next(const char* name) {
+    return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+}
+#endif
+
+}  // namespace
+
+AudioThreadRules::AudioThreadRules() {
+    t_counts = {};
+    t_counting = true;
+}
+
+AudioThreadRules::~AudioThreadRules() { t_counting = false; }
+
+std::string AudioThreadRules::Broken() const {
+    t_counting = false;
+    std::string text;
+    for (std::size_t kind = 0; kind < kKinds; ++kind)
+        if (t_counts[kind] > 0)
+            text += (text.empty() ? "" : ", ") + std::to_string(t_counts[kind]) + " " + kNames[kind];
+    t_counting = true;
+    return text;
+}
+
+bool AudioThreadRules::CanCount() {
+#if COUNTS_CALLS
+    return true;
+#else
+    return false;
+#endif
+}
+
+}  // namespace TestSupport
+
+#if COUNTS_CALLS
+using TestSupport::Note;
+
+extern "C" {
+void* __libc_malloc(std::size_t);
+void* __libc_calloc(std::size_t, std::size_t);
+void* __libc_realloc(void*, std::size_t);
+void* __libc_memalign(std::size_t, std::size_t);
+void __libc_free(void*);
+
+void* malloc(std::size_t size) {
+    Note(TestSupport::kAllocation);
+    return __libc_malloc(size);
+}
+void* calloc(std::size_t count, std::size_t size) {
+    Note(TestSupport::kAllocation);
+    return __libc_calloc(count, size);
+}
+void* realloc(void* memory, std::size_t size) {
+    Note(TestSupport::kAllocation);
+    return __libc_realloc(memory, size);
+}
+void* aligned_alloc(std::size_t alignment, std::size_t size) {
+    Note(TestSupport::kAllocation);
+    return __libc_memalign(alignment, size);
+}
+int posix_memalign(void** memory, std::size_t alignment, std::size_t size) {
+    Note(TestSupport::kAllocation);
+    *memory = __libc_memalign(alignment, size);
+    return *memory ? 0 : ENOMEM;
+}
+void free(void* memory) {
+    if (memory) Note(TestSupport::kFree);
+    __libc_free(memory);
+}
+
+// Trying a lock is allowed; only a lock that can wait counts.
+int pthread_mutex_lock(pthread_mutex_t* mutex) {
+    static const auto next = TestSupport::Next<int(pthread_mutex_t*)>("pthread_mutex_lock");
+    Note(TestSupport::kLock);
+    return next(mutex);
+}
+int pthread_cond_wait(pthread_cond_t* condition, pthread_mutex_t* mutex) {
+    static const auto next = TestSupport::Next<int(pthread_cond_t*, pthread_mutex_t*)>("pthread_cond_wait");
+    Note(TestSupport::kWait);
+    return next(condition, mutex);
+}
+int clock_nanosleep(clockid_t clock, int flags, const timespec* time, timespec* rest) {
+    static const auto next =
+        TestSupport::Next<int(clockid_t, int, const timespec*, timespec*)>("clock_nanosleep");
+    Note(TestSupport::kWait);
+    return next(clock, flags, time, rest);
+}
+int nanosleep(const timespec* time, timespec* rest) {
+    static const auto next = TestSupport::Next<int(const timespec*, timespec*)>("nanosleep");
+    Note(TestSupport::kWait);
+    return next(time, rest);
+}
+int sched_yield() noexcept {
+    static const auto next = TestSupport::Next<int()>("sched_yield");
+    Note(TestSupport::kWait);
+    return next();
+}
+[[noreturn]] void __cxa_throw(void* object, std::type_info* type, void (*destroy)(void*)) {
+    static const auto next = TestSupport::Next<void(void*, std::type_info*, void (*)(void*))>("__cxa_throw");
+    Note(TestSupport::kThrow);
+    next(object, type, destroy);
+    __builtin_unreachable();
+}
+}
+#endif

@@ -1,0 +1,24 @@
+#pragma once
+
+#include <string>
+
+namespace TestSupport {
+
+// Counts what the audio thread must not do: while one of these lives, every allocation, free, lock, sleep
+// and throw of its thread is noted. The counters sit in front of the C library's own functions.
+class AudioThreadRules {
+public:
+    AudioThreadRules();
+    ~AudioThreadRules();
+    AudioThreadRules(const AudioThreadRules&) = delete;
+    AudioThreadRules& operator=(const AudioThreadRules&) = delete;
+
+    // What was done, for example "2 allocations, 1 lock"; empty when nothing was.
+    std::string Broken() const;
+
+    // False where the counters cannot be put in front of the system's functions: under a sanitizer, which
+    // has its own in that place, and on Windows.
+    static bool CanCount();
+};
+
+}  // namespace TestSupport

@@ -1,0 +1,82 @@
+#pragma once
+
+#include <algorithm>
+#include <vector>
+
+#include "DSP/Effects/CorvoEffectBase.h"
+#include "Support/Signals.h"
+
+namespace TestSupport {
+
+using Corvo::DSP::CorvoEffectBase;
+
+// One edit on the user-interface side, made in front of frame `at`.
+struct Edit {
+    std::size_t at;
+    int index;
+    float value;
+};
+
+// Guard zones around a block, to see writes outside it without a sanitizer.
+template <typename Sample>
+class FencedBlock {
+public:
+    explicit FencedBlock(std::size_t count) : m_samples(count + 2 * kFence, kMark) {}
+    Sample* Data() { return m_samples.data() + kFence; }
+    bool Intact() const {
+        const auto marked = [](Sample sample) { return sample == kMark; };
+        return std::all_of(m_samples.begin(), m_samples.begin() + kFence, marked) &&
+               std::all_of(m_samples.end() - kFence, m_samples.end(), marked);
+    }
+
+private:
+    static constexpr std::ptrdiff_t kFence = 64;
+    static constexpr Sample kMark = Sample(12345.625);
+    std::vector<Sample> m_samples;
+};
+
+template <typename Sample>
+void ProcessBlock(CorvoEffectBase& effect, Sample* block, int frames, const tWAVEFORMATEX& format) {
+    Corvo::DSP::ProcessFlags flags;
+    effect.Process(reinterpret_cast<double*>(block), frames, &format, flags);
+}
+
+// Runs interleaved `samples` through the effect in blocks whose sizes are taken from `cuts` in turn. Blocks
+// also end where an edit (sorted by place) is due, so that every way of cutting makes the edits at the same
+// frame.
+template <typename Sample>
+std::vector<Sample> Render(CorvoEffectBase& effect, std::vector<Sample> samples, const tWAVEFORMATEX& format,
+                           const std::vector<int>& cuts, const std::vector<Edit>& edits = {}) {
+    effect.InitProcessing(*std::ranges::max_element(cuts), &format);
+    const std::size_t frames = samples.size() / format.nChannels;
+    auto edit = edits.begin();
+    std::size_t cut = 0;
+    for (std::size_t done = 0; done < frames;) {
+        for (; edit != edits.end() && edit->at <= done; ++edit)
+            effect.SetParam(edit->index, edit->value, false);
+        const std::size_t limit = edit != edits.end() ? std::min(edit->at, frames) : frames;
+        const auto count = std::min(limit - done, static_cast<std::size_t>(cuts[cut++ % cuts.size()]));
+        ProcessBlock(effect, samples.data() + done * format.nChannels, static_cast<int>(count), format);
+        done += count;
+    }
+    return samples;
+}
+
+inline std::vector<std::uint8_t> Chunk(CorvoEffectBase& effect) {
+    std::vector<std::uint8_t> chunk;
+    effect.GetSettingsChunk(chunk);
+    return chunk;
+}
+
+inline std::vector<float> AllParams(CorvoEffectBase& effect) {
+    std::vector<float> values;
+    for (int i = 0; i < effect.GetParamCount(); ++i) values.push_back(effect.GetParam(i));
+    return values;
+}
+
+inline void SetAllParams(CorvoEffectBase& effect, Random& random) {
+    for (int i = 0; i < effect.GetParamCount(); ++i)
+        effect.SetParam(i, static_cast<float>(random.Unit()), false);
+}
+
+}  // namespace TestSupport
