@@ -1,0 +1,36 @@
+# Shared by the scripts of this project; sourced with the project's root as working directory.
+
+say() { printf '\n== %s\n' "$*"; }
+
+# Installs the Debian packages that are missing; needs root or sudo only then.
+need_packages() {
+    local missing=()
+    for package in "$@"; do
+        dpkg-query -W -f='${Status}' "$package" 2>/dev/null | grep -q 'ok installed' || missing+=("$package")
+    done
+    [ ${#missing[@]} -gt 0 ] || return 0
+    local as_root=()
+    if [ "$(id -u)" -ne 0 ]; then
+        command -v sudo >/dev/null || {
+            echo "missing packages, and neither root nor sudo to install them: ${missing[*]}" >&2
+            return 1
+        }
+        as_root=(sudo)
+    fi
+    say "installing ${missing[*]}"
+    "${as_root[@]}" apt-get update -q >/dev/null
+    "${as_root[@]}" env DEBIAN_FRONTEND=noninteractive \
+        apt-get install -q -y --no-install-recommends "${missing[@]}" >/dev/null
+}
+
+BUILD_PACKAGES=(g++ cmake ninja-build ccache pkg-config libxsimd-dev libsndfile1-dev libcli11-dev
+    nlohmann-json3-dev libsoundtouch-dev)
+TEST_PACKAGES=(libgtest-dev sonic-pi-samples binutils)
+
+# Configures and builds one preset, or the named targets of it.
+build_preset() {
+    local preset=$1
+    shift
+    cmake --preset "$preset" >/dev/null
+    cmake --build --preset "$preset" ${1:+--target "$@"}
+}

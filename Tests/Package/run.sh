@@ -1,0 +1,32 @@
+#!/usr/bin/env bash
+# Installs the build into a folder, moves that folder, and builds and runs the README's example against it
+# with find_package and with pkg-config.
+set -euo pipefail
+source_dir=$1 build_dir=$2 compiler=$3
+here=$(cd "$(dirname "$0")" && pwd)
+work=$build_dir/package-test
+rm -rf "$work"
+mkdir -p "$work/example"
+
+cmake --install "$build_dir" --prefix "$work/first" >/dev/null
+mv "$work/first" "$work/installed"
+
+# The example is the README's only block of C++.
+awk '/^```cpp$/ {on = 1; next} /^```$/ {on = 0} on' "$source_dir/README.md" > "$work/example/example.cpp"
+[ -s "$work/example/example.cpp" ]
+cp "$here/CMakeLists.txt" "$work/example/"
+
+cmake -S "$work/example" -B "$work/by-cmake" -DCMAKE_PREFIX_PATH="$work/installed" \
+    -DCMAKE_CXX_COMPILER="$compiler" >/dev/null
+cmake --build "$work/by-cmake" >/dev/null
+by_cmake=$("$work/by-cmake/example")
+
+pc=$(find "$work/installed" -name dspdll.pc)
+export PKG_CONFIG_PATH=${pc%/*}
+# shellcheck disable=SC2046
+"$compiler" "$work/example/example.cpp" -o "$work/by-pkg-config" $(pkg-config --cflags --libs dspdll) \
+    -Wl,-rpath,"$(pkg-config --variable=libdir dspdll)"
+by_pkg_config=$("$work/by-pkg-config")
+
+echo "the example says: $by_cmake"
+[ -n "$by_cmake" ] && [ "$by_cmake" = "$by_pkg_config" ]

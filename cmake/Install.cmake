@@ -1,0 +1,20 @@
+# Headers, library, CMake package and pkg-config file, so that hosts find the library either way.
+
+install(TARGETS DSPDll EXPORT DSPDllTargets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
+    FILE_SET HEADERS DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/DSPDll)
+
+set(DSP_PACKAGE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/DSPDll)
+install(EXPORT DSPDllTargets NAMESPACE DSPDll:: DESTINATION ${DSP_PACKAGE_DIR})
+configure_package_config_file(cmake/DSPDllConfig.cmake.in DSPDllConfig.cmake
+    INSTALL_DESTINATION ${DSP_PACKAGE_DIR})
+write_basic_package_version_file(DSPDllConfigVersion.cmake COMPATIBILITY SameMajorVersion)
+install(FILES ${CMAKE_CURRENT_BINARY_DIR}/DSPDllConfig.cmake ${CMAKE_CURRENT_BINARY_DIR}/DSPDllConfigVersion.cmake
+    DESTINATION ${DSP_PACKAGE_DIR})
+
+# The file finds its prefix from its own place, so an installed tree may be moved.
+file(RELATIVE_PATH DSP_PC_PREFIX /prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig /prefix)
+configure_file(cmake/dspdll.pc.in dspdll.pc @ONLY)
+install(FILES ${CMAKE_CURRENT_BINARY_DIR}/dspdll.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
