@@ -3,6 +3,7 @@
 #include <cmath>
 #include <numbers>
 
+#include "DSP/Effects/GainKernel.h"
 #include "DSP/Effects/ParameterTable.h"
 #include "DSP/Effects/ParameterText.h"
 #include "DSP/Effects/SampleDispatch.h"
@@ -85,17 +86,6 @@ double PanRight(double pan) {
     if (pan == -1.0) return 0.0;
     return kPanMakeUp * std::sin((pan + 1.0) * (std::numbers::pi / 4.0));
 }
-
-template <typename Sample>
-struct Coefficients {
-    Sample side, mid, left, right;
-
-    void Apply(Sample& l, Sample& r) const {
-        const Sample difference = (l - r) * side, sum = (l + r) * mid;
-        l = (difference + sum) * Sample(0.5) * left;
-        r = (sum - difference) * Sample(0.5) * right;
-    }
-};
 
 }  // namespace
 
@@ -212,11 +202,12 @@ void GainEfx::UpdateCoefficients() {
 void GainEfx::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
     CheckCookProperties(format, flags.force_cook);
     UpdateCoefficients();
+    if (frames < 1) return;
     WithSamples(buffer, *format, OtherWidths::Skip, [&]<typename Sample>(Sample* samples) {
         const Coefficients<Sample> c{m_coef_side, m_coef_mid, m_gain_left, m_gain_right};
         const int channels = format->nChannels;
         if (channels == 2)
-            for (int i = 0; i < frames; ++i) c.Apply(samples[2 * i], samples[2 * i + 1]);
+            ScaleStereo(samples, frames, c);
         else if (channels > 0)
             for (int i = 0; i < frames; ++i) samples[static_cast<std::ptrdiff_t>(i) * channels] *= c.left;
     });
@@ -226,12 +217,13 @@ void GainEfx::ProcessInternalNoninterleaved(double* const* channels, int frames,
                                             ProcessFlags& flags) {
     CheckCookProperties(format, flags.force_cook);
     UpdateCoefficients();
+    if (frames < 1) return;
     WithChannels(channels, *format, OtherWidths::Skip, [&]<typename Sample>(Sample* const* buffers) {
         const Coefficients<Sample> c{m_coef_side, m_coef_mid, m_gain_left, m_gain_right};
         if (format->nChannels == 2)
-            for (int i = 0; i < frames; ++i) c.Apply(buffers[0][i], buffers[1][i]);
+            ScaleStereoPlanar(buffers[0], buffers[1], frames, c);
         else if (format->nChannels > 0)
-            for (int i = 0; i < frames; ++i) buffers[0][i] *= c.left;
+            for (Sample* sample = buffers[0]; sample != buffers[0] + frames; ++sample) *sample *= c.left;
     });
 }
 

@@ -5,7 +5,8 @@
 #include <cmath>
 #include <stdexcept>
 
-#include "Support/Signals.h"
+#include "Plain/PlainGain.h"
+#include "Support/EffectRun.h"
 
 using Corvo::DSP::ProcessFlags;
 using Corvo::DSP::GainEfx::GainEfx;
@@ -110,6 +111,22 @@ TEST(GainEfx, ReadsTexts) {
     } catch (const std::out_of_range& error) {
         EXPECT_STREQ(error.what(), "stof argument out of range");
     }
+}
+
+// Catches lanes that are swapped or rounded differently, and the frames that fill no register.
+TEST(GainEfx, HasTheBitsOfThePlainForm) {
+    const auto check = []<typename Sample>(Sample) {
+        for (int frames = 1; frames <= 17; ++frames) {
+            GainEfx gain;
+            gain.SetParam(kWidth, Width(0.75), false);
+            const auto input = TestSupport::Noise<Sample>(static_cast<std::size_t>(2 * frames));
+            auto expected = input;
+            Plain::Gain(expected.data(), frames, Sample(0.75), Sample(1.25), Sample(1), Sample(1));
+            ASSERT_EQ(TestSupport::Render(gain, input, Format<Sample>(), {frames}), expected) << frames;
+        }
+    };
+    check(0.0f);
+    check(0.0);
 }
 
 // Catches a stride or channel mistake: only the first channel of a stream that is not stereo is scaled.
