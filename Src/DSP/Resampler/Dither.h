@@ -1,0 +1,44 @@
+#pragma once
+
+#include <array>
+
+#include "Platform/Export.h"
+
+// One channel's dither in front of a word-length reduction. The converter reads the set-up and keeps the
+// running state here; MakeDither fills one.
+template <typename T>
+struct CDither {
+    static constexpr int kMaxOrder = 16;
+
+    bool enabled = false;
+    bool noiseShaping = false;
+    T amplitude = 0;       // of one step of the random numbers' sum
+    int shapingOrder = 0;  // 0..kMaxOrder; more counts as kMaxOrder
+    // The error made k + 1 samples ago is fed back with coefficients[k]: quantisation noise is shaped by
+    // 1 + sum of coefficients[k] z^-(k+1).
+    std::array<T, kMaxOrder> coefficients{};
+    std::array<T, kMaxOrder> quantisedHistory{};  // newest first
+    std::array<T, kMaxOrder> shapedHistory{};     // newest first
+    int scale = 1;                                // quantisation steps per unit
+    T lastShaped = 0;
+    T lastQuantised = 0;
+};
+
+enum class DitherCurve {
+    None,
+    Flat,    // triangular noise of two steps, white
+    Gentle,  // the same, shaped out of the ear's most sensitive band: 5 taps
+    Strong,  // deeper around 4 kHz and 12 kHz for more noise above 15 kHz: 9 taps
+};
+
+// Dither for samples of 16 or 24 bits; disabled for any other width and for DitherCurve::None. The shaped
+// curves are made for sample rates of 44100 and 48000.
+DSP_API CDither<double> MakeDither(DitherCurve curve, int bits);
+
+// One output sample, dithered; advances the state. Not enabled: the sample itself.
+DSP_API double ApplyDither(CDither<double>& dither, double sample);
+
+// Where the random numbers come from: a function that returns 0..32767 and is called twice per sample.
+// Returns the previous one; null goes back to the platform's. Any thread, but not while converting.
+using DitherRandom = int (*)();
+DSP_API DitherRandom SetDitherRandom(DitherRandom source);

@@ -1,0 +1,57 @@
+#pragma once
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <cstring>
+
+#include "Platform/Export.h"
+
+// Tags that tell the converter how one sample of a stream is read and written. Samples are little-endian
+// and may start at any address.
+
+// Reading gives full scale as -1..1. Writing integers truncates towards zero and clips to the format's
+// range; NaN is written as 0.
+template <int Bits>
+struct IntegerSample {
+    static constexpr int kBytes = Bits / 8;
+    static constexpr double kScale = static_cast<double>(1 << (Bits - 1));
+
+    static double Read(const char* sample) {
+        std::uint32_t word = 0;
+        for (int i = 0; i < kBytes; ++i)
+            word |= static_cast<std::uint32_t>(static_cast<unsigned char>(sample[i])) << (32 - Bits + 8 * i);
+        // Sits at the top of the word, so that its sign is the word's.
+        return static_cast<std::int32_t>(word) * (1.0 / 2147483648.0);
+    }
+    static void Write(double value, char* sample) {
+        const double scaled = std::isnan(value) ? 0.0 : std::clamp(value * kScale, -kScale, kScale - 1.0);
+        const auto word = static_cast<std::uint32_t>(static_cast<std::int32_t>(scaled));
+        for (int i = 0; i < kBytes; ++i) sample[i] = static_cast<char>(word >> (8 * i) & 0xFF);
+    }
+};
+
+template <typename Float>
+struct FloatSample {
+    static constexpr int kBytes = sizeof(Float);
+
+    static double Read(const char* sample) {
+        Float value;
+        std::memcpy(&value, sample, sizeof(value));
+        return value;
+    }
+    static void Write(double value, char* sample) {
+        const auto rounded = static_cast<Float>(value);
+        std::memcpy(sample, &rounded, sizeof(rounded));
+    }
+};
+
+struct DSP_API tipo_16bit : IntegerSample<16> {};
+struct DSP_API tipo_24bit : IntegerSample<24> {};
+struct DSP_API tipo_floatbit : FloatSample<float> {};
+struct DSP_API tipo_doublebit : FloatSample<double> {};
+
+struct DSP_API tipo_16bit_outd : IntegerSample<16> {};
+struct DSP_API tipo_24bit_outd : IntegerSample<24> {};
+struct DSP_API tipo_floatbit_outd : FloatSample<float> {};
+struct DSP_API tipo_doublebit_outd : FloatSample<double> {};

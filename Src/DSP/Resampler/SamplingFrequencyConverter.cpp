@@ -1,0 +1,318 @@
+#include "DSP/Resampler/SamplingFrequencyConverter.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <new>
+#include <span>
+
+#include "DSP/Resampler/PolePairKernel.h"
+#include "Platform/DenormalGuard.h"
+
+using PolePairs::Lanes;
+using PolePairs::State;
+
+namespace {
+
+constexpr std::size_t kTaps = SamplingFrequencyConverter::kOrder + 1;  // of a history in use
+
+// What a group of one or two channels converts.
+struct Block {
+    int frames;
+    const char* in[2];
+    char* out[2];
+    int inStride, outStride;
+    CDither<double>* dither;  // null, or of a group's only channel
+};
+
+// Runs one group through `block`, picking up and leaving behind its state and its read position: how many
+// steps of the raised rate the next output is away from the next input. Groups of one channel leave the
+// second lane silent.
+template <typename In, typename Out, int kChannels>
+class GroupRun {
+public:
+    GroupRun(const SamplingFrequencyConverter& converter, const State& state, const Block& block,
+             std::int64_t toNextOutput)
+        : m_up(converter.up),
+          m_down(converter.down),
+          m_filter(*converter.pairs),
+          m_state(state),
+          m_block(block),
+          m_step(toNextOutput) {}
+
+    void Run(int frames) {
+        State state = m_state;
+        Block block = m_block;
+        std::int64_t step = m_step;
+        const double *const phases = m_filter.phases.data(), *const advance = m_filter.advance.data();
+        for (int i = 0; i < frames; ++i) {
+            m_sample = Read(block);
+            state.Take(advance, m_sample);
+            for (; step < m_up; step += m_down) {
+                Write(state.Output(phases + step * kRow, m_sample), block);
+                ++m_written;
+            }
+            step -= m_up;
+        }
+        m_state = state;
+        m_block = block;
+        m_step = step;
+    }
+
+    const State& Filter() const { return m_state; }
+    Lanes Sample() const { return m_sample; }
+    int Written() const { return m_written; }
+
+private:
+    static constexpr std::ptrdiff_t kRow = PolePairLowPass::kPhaseStride;
+
+    static Lanes Read(Block& block) {
+        alignas(16) double samples[2]{};
+        for (int c = 0; c < kChannels; ++c) {
+            samples[c] = In::Read(block.in[c]);
+            block.in[c] += block.inStride;
+        }
+        return Lanes::load_aligned(samples);
+    }
+    static void Write(Lanes values, Block& block) {
+        alignas(16) double samples[2];
+        values.store_aligned(samples);
+        if constexpr (kChannels == 1)
+            if (block.dither) samples[0] = ApplyDither(*block.dither, samples[0]);
+        for (int c = 0; c < kChannels; ++c) {
+            Out::Write(samples[c], block.out[c]);
+            block.out[c] += block.outStride;
+        }
+    }
+
+    const std::int64_t m_up, m_down;
+    const PolePairLowPass& m_filter;
+    State m_state;
+    Block m_block;
+    std::int64_t m_step;
+    Lanes m_sample = Lanes(0.0);
+    int m_written = 0;
+};
+
+// The newest values of a stream at the raised rate, at most as many as a history holds.
+struct Newest {
+    std::size_t count = 0;
+    std::array<std::array<double, 2>, kTaps> input, output;  // output: L times the filter's
+
+    void Add(Lanes in, Lanes out) {
+        if (count == kTaps) {
+            std::shift_left(input.begin(), input.end(), 1);
+            std::shift_left(output.begin(), output.end(), 1);
+            --count;
+        }
+        in.store_unaligned(input[count].data());
+        out.store_unaligned(output[count].data());
+        ++count;
+    }
+};
+
+void Append(double* history, const auto& values, std::size_t count, std::size_t lane, double scale) {
+    std::shift_left(history, history + kTaps, static_cast<std::ptrdiff_t>(count));
+    for (std::size_t i = 0; i < count; ++i) history[kTaps - count + i] = values[i][lane] * scale;
+}
+
+bool AllZero(const double* history) {
+    return std::all_of(history, history + kTaps, [](double value) { return value == 0.0; });
+}
+
+// Moves a ring position by `steps` and returns how often it went round.
+int Advance(int& position, std::int64_t steps, int ringLength) {
+    const std::int64_t moved = position + steps;
+    position = static_cast<int>(moved % ringLength);
+    return static_cast<int>(moved / ringLength);
+}
+
+// Converts one group, then brings its channels' histories and rings up to date.
+template <typename In, typename Out, int kChannels>
+int ConvertGroup(SamplingFrequencyConverter& c, int firstChannel, const Block& block,
+                 std::int64_t toNextOutput) {
+    constexpr int kGroup = SamplingFrequencyConverter::kChannelsPerGroup;
+    auto& stored = c.pairStates[firstChannel / kGroup];
+    const int firstLane = firstChannel % kGroup;
+    for (int lane = 0; lane < kChannels; ++lane) {
+        const int channel = firstChannel + lane;
+        if (AllZero(c.inputHistory[channel]) && AllZero(c.outputHistory[channel]))
+            for (auto& value : stored) value[firstLane + lane] = 0.0;
+    }
+    // A single channel may be stored in either lane; it is computed in the first.
+    double lanes[SamplingFrequencyConverter::kOrder][2]{};
+    for (std::size_t k = 0; k < std::size(lanes); ++k)
+        std::copy_n(stored[k] + firstLane, kChannels, lanes[k]);
+
+    GroupRun<In, Out, kChannels> run(c, State::From(lanes), block, toNextOutput);
+    const int taps = static_cast<int>(kTaps);
+    const int recorded = std::min(block.frames, (taps + c.up - 1) / c.up);
+    run.Run(block.frames - recorded);
+    Newest newest;
+    for (int i = 0; i < recorded; ++i) {
+        run.Run(1);
+        for (int step = std::max(0, c.up - taps); step < c.up; ++step) {
+            const double* row =
+                &c.pairs->phases[static_cast<std::size_t>(step) * PolePairLowPass::kPhaseStride];
+            newest.Add(step == 0 ? run.Sample() : Lanes(0.0), run.Filter().Output(row, run.Sample()));
+        }
+    }
+
+    run.Filter().To(lanes);
+    for (std::size_t k = 0; k < std::size(lanes); ++k)
+        std::copy_n(lanes[k], kChannels, stored[k] + firstLane);
+    for (std::size_t lane = 0; lane < kChannels; ++lane) {
+        const int channel = firstChannel + static_cast<int>(lane);
+        Append(c.inputHistory[channel], newest.input, newest.count, lane, 1.0 / c.lowPass.gain);
+        Append(c.outputHistory[channel], newest.output, newest.count, lane, 1.0 / c.up);
+        int position = c.writePosition;
+        Advance(position, static_cast<std::int64_t>(block.frames) * c.up - static_cast<int>(newest.count),
+                c.ringLength);
+        for (std::size_t i = 0; i < newest.count; ++i) {
+            c.rings[channel][position] = newest.output[i][lane];
+            Advance(position, 1, c.ringLength);
+        }
+    }
+    return run.Written();
+}
+
+}  // namespace
+
+SamplingFrequencyConverter::SamplingFrequencyConverter() = default;
+SamplingFrequencyConverter::~SamplingFrequencyConverter() = default;
+SamplingFrequencyConverter::SamplingFrequencyConverter(const SamplingFrequencyConverter& other) = default;
+SamplingFrequencyConverter& SamplingFrequencyConverter::operator=(const SamplingFrequencyConverter& other) =
+    default;
+
+int SamplingFrequencyConverter::InitConversion(int inRate, int outRate) {
+    constexpr int kLargest = 49;
+    constexpr double kCloseEnough = 0.001;
+    if (inRate == outRate || inRate < 1 || outRate < 1) return 0;
+    const double ratio = static_cast<double>(outRate) / inRate;
+    double best = 9999.0;
+    int bestUp = 0, bestDown = 0;
+    for (int u = 1; u <= kLargest && best >= kCloseEnough; ++u)
+        for (int d = 1; d <= kLargest && best >= kCloseEnough; ++d) {
+            const double error = std::abs(static_cast<double>(u) / d - ratio);
+            if (error >= best) continue;
+            best = error;
+            bestUp = u;
+            bestDown = d;
+        }
+    return InitConversionByFactors(bestUp, bestDown);
+}
+
+int SamplingFrequencyConverter::InitConversionByFactors(int upFactor, int downFactor) {
+    if (upFactor < 1 || downFactor < 1 || std::max(upFactor, downFactor) > kMaxFactor) return 0;
+    constexpr double kCutoff = 0.455;  // of the lower rate
+    std::shared_ptr<const PolePairLowPass> designed;
+    try {
+        designed = std::make_shared<const PolePairLowPass>(
+            upFactor, kCutoff * std::min(1.0 / upFactor, 1.0 / downFactor));
+    } catch (const std::bad_alloc&) {
+        return 0;
+    }
+    pairs = std::move(designed);
+    up = upFactor;
+    down = downFactor;
+    lowPass = {};
+    lowPass.poles = lowPass.zeros = kOrder;
+    lowPass.gain = pairs->gain;
+    double binomial = 1.0;
+    for (int i = 0; i <= kOrder; binomial = binomial * (kOrder - i) / (i + 1), ++i)
+        lowPass.feedForward[i] = binomial;
+    std::ranges::copy(pairs->feedback, lowPass.feedback);
+    // The other channels keep what they hold, as hosts expect.
+    for (int channel = 0; channel < 2; ++channel) {
+        std::ranges::fill(inputHistory[channel], 0.0);
+        std::ranges::fill(outputHistory[channel], 0.0);
+        for (auto& value : pairStates[channel / kChannelsPerGroup]) value[channel % kChannelsPerGroup] = 0.0;
+    }
+    return 1;
+}
+
+void SamplingFrequencyConverter::Init(int channels) {
+    ringLength = 10 * std::max(up, down);
+    writePosition = readPosition = writeWraps = readWraps = 0;
+    for (int channel = 0; channel < std::min(channels, kMaxChannels); ++channel)
+        rings[channel] = new (std::nothrow) double[static_cast<std::size_t>(ringLength)]();
+}
+
+void SamplingFrequencyConverter::FreeRings() {
+    for (auto& ring : rings) {
+        delete[] ring;
+        ring = nullptr;
+    }
+}
+
+double SamplingFrequencyConverter::GroupDelay() const { return pairs ? pairs->groupDelay : 0.0; }
+
+double SamplingFrequencyConverter::sfreq_conv_lowpass(double x, double* xHistory, double* yHistory) {
+    std::shift_left(xHistory, xHistory + lowPass.zeros + 1, 1);
+    xHistory[lowPass.zeros] = x / lowPass.gain;
+    std::shift_left(yHistory, yHistory + lowPass.poles + 1, 1);
+    yHistory[lowPass.poles] = 0.0;
+    double y = 0.0;
+    for (int i = 0; i <= lowPass.zeros; ++i) y += xHistory[i] * lowPass.feedForward[i];
+    for (int i = 0; i < lowPass.poles; ++i) y += yHistory[i] * lowPass.feedback[i];
+    yHistory[lowPass.poles] = y;
+    return y;
+}
+
+template <typename In, typename Out>
+int SamplingFrequencyConverter::sfreq_conversion_core_block(int frames, char* in, char* out, int channels,
+                                                            int inFrameBytes, int outFrameBytes,
+                                                            CDither<double>* dither) {
+    if (frames < 1 || channels < 1 || channels > kMaxChannels || !pairs || ringLength < 1) return 0;
+    if (std::any_of(rings, rings + channels, [](const double* ring) { return ring == nullptr; })) return 0;
+    const Corvo::DenormalGuard guard;
+
+    const std::int64_t toNextOutput = std::max<std::int64_t>(
+        0, static_cast<std::int64_t>(readWraps - writeWraps) * ringLength + readPosition - writePosition);
+    const auto block = [&](int channel, CDither<double>* ownDither) {
+        const auto at = [&](auto* frame, int c, int stride) {
+            return frame + static_cast<std::int64_t>(std::min(c, channels - 1)) * stride / channels;
+        };
+        return Block{frames,
+                     {at(in, channel, inFrameBytes), at(in, channel + 1, inFrameBytes)},
+                     {at(out, channel, outFrameBytes), at(out, channel + 1, outFrameBytes)},
+                     inFrameBytes,
+                     outFrameBytes,
+                     ownDither};
+    };
+    // Dither draws its random numbers channel by channel, so then no two channels run together.
+    const bool dithered =
+        dither && std::any_of(dither, dither + channels, [](const auto& d) { return d.enabled; });
+    int written = 0;
+    for (int channel = 0; channel < channels;) {
+        if (!dithered && channel + 1 < channels) {
+            written = ConvertGroup<In, Out, 2>(*this, channel, block(channel, nullptr), toNextOutput);
+            channel += 2;
+        } else {
+            written = ConvertGroup<In, Out, 1>(
+                *this, channel, block(channel, dithered ? dither + channel : nullptr), toNextOutput);
+            ++channel;
+        }
+    }
+    writeWraps += Advance(writePosition, static_cast<std::int64_t>(frames) * up, ringLength);
+    readWraps += Advance(readPosition, static_cast<std::int64_t>(written) * down, ringLength);
+    const int common = std::min(writeWraps, readWraps);
+    writeWraps -= common;
+    readWraps -= common;
+    return written;
+}
+
+// clang-format off
+#define CONVERT(In, Out)                                                                                  \
+    template DSP_API int SamplingFrequencyConverter::sfreq_conversion_core_block<In, Out>(int, char*,     \
+        char*, int, int, int, CDither<double>*);
+#define CONVERT_TO_ALL(In)                                                                                \
+    CONVERT(In, tipo_16bit_outd) CONVERT(In, tipo_24bit_outd)                                             \
+    CONVERT(In, tipo_floatbit_outd) CONVERT(In, tipo_doublebit_outd)
+CONVERT_TO_ALL(tipo_16bit)
+CONVERT_TO_ALL(tipo_24bit)
+CONVERT_TO_ALL(tipo_floatbit)
+CONVERT_TO_ALL(tipo_doublebit)
+// clang-format on
