@@ -1,5 +1,6 @@
 #include "DSP/Effects/GainEfx.h"
 #include "EffectRun.h"
+#include "FfmpegPeer.h"
 
 // How does gain scale with block size, precision and layout?
 namespace {
@@ -41,5 +42,12 @@ void BM_GainPlanar(benchmark::State& state) {
 }
 BENCHMARK_TEMPLATE(BM_GainPlanar, float)->RangeMultiplier(4)->Range(32, 4096);
 BENCHMARK_TEMPLATE(BM_GainPlanar, double)->RangeMultiplier(4)->Range(32, 4096);
+
+#if DSP_HAVE_LIBAVFILTER
+void BM_FfmpegGraphAlone(benchmark::State& state) { RunFfmpeg<float>(state, "anull", "flt"); }
+BENCHMARK(BM_FfmpegGraphAlone)->Arg(512)->Arg(4096);
+void BM_FfmpegExtrastereo(benchmark::State& state) { RunFfmpeg<float>(state, "extrastereo=m=1.5", "flt"); }
+BENCHMARK(BM_FfmpegExtrastereo)->Arg(512)->Arg(4096);
+#endif
 
 }  // namespace
