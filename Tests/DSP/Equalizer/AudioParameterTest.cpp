@@ -1,0 +1,73 @@
+#include "DSP/Equalizer/AudioParameter.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+
+namespace {
+
+using Progress = Corvo::DSP::AudioParameterProgressAlternate;
+using Managed = Corvo::DSP::AudioParameterManaged<double, Progress>;
+using Plain = Corvo::DSP::AudioParameter<double, Progress>;
+
+// Catches a wrong digit in the polynomial.
+TEST(AudioParameter, RateFollowsTheExponential) {
+    for (int i = 0; i <= 10000; ++i) {
+        const double rel = i / 10000.0, exact = 9e-5 * std::exp(5.0 * (1.0 - rel));
+        ASSERT_NEAR(Progress::Rate(rel) / exact, 1.0, 1e-10) << rel;
+    }
+}
+
+// The whole way, recomputed with the library's exponential.
+TEST(AudioParameter, GlidesAsDescribedAndSnapsAtTheEnd) {
+    std::int32_t counter = 0;
+    Managed parameter{.value = 1.0, .target = 1.0, .counter = &counter};
+    parameter.SetTarget(-1.0);
+    EXPECT_EQ(counter, 1);
+    parameter.Advance();
+    EXPECT_DOUBLE_EQ(parameter.value, 1.0 - 0.0009 * 2.0);
+    double expected = parameter.value;
+    int steps = 1;
+    for (double rel = 1.0; !(rel < 0.01); ++steps) {
+        ASSERT_TRUE(parameter.moving) << steps;
+        rel = std::abs(expected + 1.0) / 2.0;
+        const double k = 9e-5 * std::exp(5.0 * (1.0 - rel));
+        expected = rel < 0.01 ? -1.0 : (1.0 - k) * expected - k;
+        parameter.Advance();
+        ASSERT_NEAR(parameter.value, expected, 1e-9) << steps;
+    }
+    EXPECT_EQ(parameter.value, -1.0);
+    EXPECT_FALSE(parameter.moving);
+    EXPECT_EQ(counter, 0);
+    EXPECT_GT(steps, 1000);
+}
+
+TEST(AudioParameter, NothingToCoverEndsAtOnceAtZero) {
+    Plain parameter{.value = 9e-15};
+    parameter.SetTarget(-3e-15);
+    parameter.Advance();
+    EXPECT_EQ(parameter.value, 0.0);
+    EXPECT_FALSE(parameter.moving);
+}
+
+TEST(AudioParameter, ManagedFormCountsOnlyRealMoves) {
+    std::int32_t counter = 0;
+    Managed parameter{.counter = &counter};
+    parameter.SetTarget(0.0);
+    EXPECT_FALSE(parameter.moving) << "the target it had already";
+    parameter.SetTarget(1.0);
+    parameter.SetTarget(2.0);
+    EXPECT_EQ(counter, 1) << "one value on the move, however often it is sent elsewhere";
+    counter = 0;
+    parameter.Jump();
+    EXPECT_EQ(counter, 0) << "never below 0";
+    EXPECT_EQ(parameter.value, 2.0);
+
+    Plain plain{.value = 1.0, .target = 1.0};
+    plain.SetTarget(1.0);
+    EXPECT_TRUE(plain.moving) << "the plain form always glides";
+    plain.Jump();
+    EXPECT_EQ(plain.start, 1.0);
+}
+
+}  // namespace

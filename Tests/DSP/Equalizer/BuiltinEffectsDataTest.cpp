@@ -1,0 +1,156 @@
+#include "DSP/Equalizer/BuiltinEffectsData.h"
+
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <string>
+
+namespace {
+
+using Data = Corvo::DSP::builtin_effects_data;
+using Corvo::DSP::_eq_data;
+
+// Writes its letter, and the band's index if there is one, into a log.
+template <typename... Args>
+class Scribe : public Corvo::DSP::EqListener<Args...> {
+public:
+    Scribe(std::string& log, char letter) : m_log(log), m_letter(letter) { ++s_alive; }
+    Scribe(const Scribe& other)
+        : Corvo::DSP::EqListener<Args...>(other), m_log(other.m_log), m_letter(other.m_letter) {
+        ++s_alive;
+    }
+    ~Scribe() override { --s_alive; }
+    std::unique_ptr<Corvo::DSP::EqListener<Args...>> Clone() const override {
+        return std::make_unique<Scribe>(*this);
+    }
+    void Invoke(Args... args) override {
+        m_log += m_letter;
+        (m_log.append(std::to_string(args)), ...);
+    }
+    static inline int s_alive = 0;
+
+private:
+    std::string& m_log;
+    char m_letter;
+};
+
+void Listen(Data& data, std::string& log) {
+    data.Q_changed.Add(std::make_unique<Scribe<int>>(log, 'q'));
+    data.freq_changed.Add(std::make_unique<Scribe<int>>(log, 'f'));
+    data.boost_changed.Add(std::make_unique<Scribe<int>>(log, 'b'));
+    data.reserved_changed.Add(std::make_unique<Scribe<int>>(log, 'r'));
+    data.bypass_changed.Add(std::make_unique<Scribe<>>(log, 'p'));
+    data.structure_changed.Add(std::make_unique<Scribe<>>(log, 's'));
+}
+
+TEST(BuiltinEffectsData, StartsWithThreeFlatBands) {
+    Data data;
+    EXPECT_EQ(data.GetNumBands(), 3);
+    EXPECT_FALSE(data.GetPhaseShift());
+    constexpr int kExpected[][4] = {{6, 100, 0, 50}, {2, 2500, 0, 200}, {5, 6000, 0, 50}};
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ(data.GetEqType(i), kExpected[i][0]);
+        EXPECT_EQ(data.GetEqFreq(i), kExpected[i][1]);
+        EXPECT_EQ(data.GetEqBoost(i), kExpected[i][2]);
+        EXPECT_EQ(data.GetEqQ(i), kExpected[i][3]);
+    }
+    // Only the boost goes for a number that names no default, and bands behind the third stay.
+    data.SetEqData(5, {4, 77, 30, 9});
+    data.defaults(5, 3);
+    data.defaults();
+    EXPECT_EQ(data.GetEqFreq(5), 77);
+    EXPECT_EQ(data.GetEqBoost(5), 0);
+    EXPECT_EQ(data.GetEqType(5), 4);
+}
+
+// Who is told what by which operation; from a band 1 that is a bypassed peak of 2500 Hz, 6 dB, Q 300.
+TEST(BuiltinEffectsData, TellsTheRightListeners) {
+    struct Case {
+        const char* fault;
+        std::function<void(Data&)> act;
+        const char* log;
+        int type, freq, boost, Q, numBands;
+    };
+    constexpr int kType = 2 | _eq_data::kBypassBand;
+    const Case kCases[] = {
+        {"a new frequency", [](Data& d) { d.SetEqFreq(1, 80); }, "f1", kType, 80, 60, 300, 3},
+        {"the same frequency", [](Data& d) { d.SetEqFreq(1, 2500); }, "", kType, 2500, 60, 300, 3},
+        {"below 1 Hz, twice", [](Data& d) { d.SetEqFreq(1, 0), d.SetEqFreq(1, -5); }, "f1", kType, 1, 60, 300,
+         3},
+        {"a new boost", [](Data& d) { d.SetEqBoost(1, -9), d.SetEqBoost(1, -9); }, "b1", kType, 2500, -9, 300,
+         3},
+        {"a new Q", [](Data& d) { d.SetEqQ(1, 7), d.SetEqQ(1, 7); }, "q1", kType, 2500, 60, 7, 3},
+        {"a peak's own Q", [](Data& d) { d.SetDefaultQ(1), d.SetDefaultQ(1); }, "q1", kType, 2500, 60, 200,
+         3},
+        {"a type ends the bypass", [](Data& d) { d.SetEqType(1, 4); }, "s", 4, 2500, 60, 300, 3},
+        {"the Q of others", [](Data& d) { d.SetEqType(1, 4), d.SetDefaultQ(1); }, "sq1", 4, 2500, 60, 50, 3},
+        {"bypass keeps the type", [](Data& d) { d.SetBypass(1, false); }, "p", 2, 2500, 60, 300, 3},
+        {"bypass unchanged is told", [](Data& d) { d.SetBypass(1, true); }, "p", kType, 2500, 60, 300, 3},
+        {"the channel's bypass", [](Data& d) { d.SetBypassChannel(true); }, "p", kType, 2500, 60, 300, 3},
+        {"the count is not clamped", [](Data& d) { d.SetNumBands(99); }, "s", kType, 2500, 60, 300, 99},
+        {"defaults of one band", [](Data& d) { d.defaults(1, 0); }, "s", 6, 100, 0, 50, 3},
+        {"defaults of all", [](Data& d) { d.defaults(); }, "", 2, 2500, 0, 200, 3},
+        {"whole bands",
+         [](Data& d) {
+             d.SetEqData(1, {1, 2, 3, 4});
+         },
+         "s", 1, 2, 3, 4, 3},
+        {"deleting moves the rest", [](Data& d) { d.DeleteBand(0); }, "ss", 2, 6000, 0, 50, 2},
+        {"deleting the last", [](Data& d) { d.DeleteBand(2); }, "ss", kType, 2500, 60, 300, 2},
+        {"deleting behind the end", [](Data& d) { d.DeleteBand(3); }, "", kType, 2500, 60, 300, 3},
+        {"deleting from too many", [](Data& d) { d.numBands = 25, d.DeleteBand(19); }, "ss", kType, 2500, 60,
+         300, 24},
+        {"polarity", [](Data& d) { d.SetPhaseShift(true); }, "", kType, 2500, 60, 300, 3},
+    };
+    for (const auto& c : kCases) {
+        std::string log;
+        Data data;
+        data.SetEqType(2, 2);  // so that deleting band 0 leaves a bare peak behind band 1's slot
+        data.SetEqData(1, {kType, 2500, 60, 300});
+        Listen(data, log);
+        c.act(data);
+        EXPECT_EQ(log, c.log) << c.fault;
+        EXPECT_EQ(data.GetEqType(1), c.type) << c.fault;
+        EXPECT_EQ(data.GetEqFreq(1), c.freq) << c.fault;
+        EXPECT_EQ(data.GetEqBoost(1), c.boost) << c.fault;
+        EXPECT_EQ(data.GetEqQ(1), c.Q) << c.fault;
+        EXPECT_EQ(data.GetNumBands(), c.numBands) << c.fault;
+    }
+}
+
+TEST(BuiltinEffectsData, ChannelBypassLivesInBandZero) {
+    Data data;
+    data.SetBypassChannel(true);
+    data.SetBypass(0, true);
+    EXPECT_EQ(data.GetEqType(0), 6 + 0x10000 + 0x20000);
+    data.SetEqType(0, 6);
+    EXPECT_FALSE(data.GetBypass(0));
+    EXPECT_FALSE(data.GetBypassChannel());
+}
+
+TEST(BuiltinEffectsData, CopiesHaveListenersOfTheirOwn) {
+    std::string log;
+    {
+        Data data;
+        for (const char letter : {'1', '2', '3'})
+            data.structure_changed.Add(std::make_unique<Scribe<>>(log, letter));
+        data.reserved = {1, 2, 3, 4};
+        data.reserved_word = 5;
+        data.SetPhaseShift(true);
+        Data copy(data), assigned;
+        assigned.structure_changed.Add(std::make_unique<Scribe<>>(log, 'x'));
+        assigned = copy;
+        auto& self = assigned;
+        assigned = self;
+        EXPECT_EQ(Scribe<>::s_alive, 9);
+        assigned.SetNumBands(1);
+        EXPECT_EQ(log, "123") << "in the order of their addition, the head last";
+        EXPECT_EQ(copy.GetNumBands(), 3);
+        EXPECT_EQ(assigned.reserved, data.reserved);
+        EXPECT_EQ(assigned.reserved_word, 5);
+        EXPECT_TRUE(assigned.GetPhaseShift());
+    }
+    EXPECT_EQ(Scribe<>::s_alive, 0);
+}
+
+}  // namespace
