@@ -4,6 +4,7 @@
 #include <array>
 #include <stdexcept>
 
+#include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 
 namespace TestSupport {
@@ -23,6 +24,12 @@ constexpr std::array kEffects{
                .otherBuildReason = "sine and cosine of the pan law",
                .plainFloats = true,
                .textTruncates = true},
+    EffectCase{.name = "Echo",
+               .make = Make<Echo>,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "powers of the gains",
+               .mayGrow = true,
+               .linkedParameters = true},
 };
 
 }  // namespace
