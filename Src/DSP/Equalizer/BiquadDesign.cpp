@@ -4,6 +4,8 @@
 #include <cmath>
 #include <numbers>
 
+#include "DSP/Equalizer/BiquadSection.h"
+
 namespace Corvo::DSP {
 namespace {
 
@@ -18,17 +20,13 @@ constexpr double kOctavesPerQ = 0.002605816468270471;  // ln 2 / 266
 constexpr double kQUnit = 0.02;
 constexpr double kSteepestSlope = 3.0;
 
-struct Section {
-    double b0, b1, b2, a1, a2;
-};
-
 struct Polynomial {
     double p0, p1, p2;
 };
 
 double Decibels(double gain) { return 20.0 * std::log10(gain); }
 
-Section Peak(double gain, double freq, double Q, double rate) {
+BiquadSection Peak(double gain, double freq, double Q, double rate) {
     // The centre goes through the bilinear warping, which pulls high frequencies down.
     const double w = 2.0 * std::atan(kPi * freq / rate);
     const double s = std::sin(w), c = std::cos(w);
@@ -39,7 +37,7 @@ Section Peak(double gain, double freq, double Q, double rate) {
     return {(1.0 + alpha * A) * n, middle, (1.0 - alpha * A) * n, middle, (1.0 - alpha / A) * n};
 }
 
-Section Shelf(bool high, double gain, double freq, double Q, double rate) {
+BiquadSection Shelf(bool high, double gain, double freq, double Q, double rate) {
     const double A = std::pow(10.0, Decibels(gain) * 0.025);
     const double w = 2.0 * kPi * freq / rate;
     const double s = std::sin(w), c = std::cos(w);
@@ -68,7 +66,7 @@ Polynomial Moved(const Polynomial& p, double t) {
             p.p0 * t * t + p.p1 * t + p.p2};
 }
 
-Section ButterworthShelf(bool high, double gain, double freq, double rate) {
+BiquadSection ButterworthShelf(bool high, double gain, double freq, double rate) {
     const double t = std::tan(kPi * (freq / rate - 0.25));
     const double dB = Decibels(gain);
     const double G = std::pow(10.0, dB * 0.05);
@@ -82,7 +80,7 @@ Section ButterworthShelf(bool high, double gain, double freq, double rate) {
     return {N.p0 / P.p0, N.p1 / P.p0, N.p2 / P.p0, P.p1 / P.p0, P.p2 / P.p0};
 }
 
-Section Pass(bool high, double gain, double freq, double Q, double rate) {
+BiquadSection Pass(bool high, double gain, double freq, double Q, double rate) {
     const double omega = 2.0 * rate * std::tan(kPi * freq / rate);
     const double r = 2.0 * (kSqrt2Pass / (Q * kQUnit)) / omega;
     const double u = 1.0 / (omega * omega);
@@ -93,7 +91,9 @@ Section Pass(bool high, double gain, double freq, double Q, double rate) {
             (4.0 * u * rate * rate - r * rate + 1.0) / a0};
 }
 
-Section Design(EQFilterType type, double gain, double freq, double Q, double rate) {
+}  // namespace
+
+BiquadSection DesignBiquad(EQFilterType type, double gain, double freq, double Q, double rate) {
     switch (type) {
         case EQ_PEAK:
             return Peak(gain, freq, Q, rate);
@@ -108,21 +108,11 @@ Section Design(EQFilterType type, double gain, double freq, double Q, double rat
     }
 }
 
-}  // namespace
-
 template <typename Parameter>
 void CalcolaCoefficientiBiquad(EQFilterType type, double gain, long freq, long Q,
                                coeff<Parameter>* coefficients, int sampleRate, bool immediate) {
-    const Section section = Design(type, gain, static_cast<double>(freq), static_cast<double>(Q), sampleRate);
-    const auto hand = [immediate](Parameter& parameter, double target) {
-        parameter.SetTarget(target);
-        if (immediate) parameter.Jump();
-    };
-    hand(coefficients->b0, section.b0);
-    hand(coefficients->b1, section.b1);
-    hand(coefficients->b2, section.b2);
-    hand(coefficients->a1, section.a1);
-    hand(coefficients->a2, section.a2);
+    DesignBiquad(type, gain, static_cast<double>(freq), static_cast<double>(Q), sampleRate)
+        .HandTo(*coefficients, immediate);
 }
 
 template DSP_API void CalcolaCoefficientiBiquad(EQFilterType, double, long, long, coeff<SmoothCoefficient>*,

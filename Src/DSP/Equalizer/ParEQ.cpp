@@ -1,0 +1,132 @@
+#include "DSP/Equalizer/ParEQ.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+
+#include "DSP/Equalizer/BiquadSection.h"
+#include "DSP/Equalizer/EqCascade.h"
+#include "DSP/Equalizer/EqChannel.h"
+#include "Platform/DenormalGuard.h"
+
+namespace Corvo::DSP {
+namespace {
+
+constexpr int kMaxBands = builtin_effects_data::kMaxBands;
+
+int BandsInUse(const builtin_effects_data& record) { return std::clamp(record.numBands, 0, kMaxBands); }
+
+// The highest frequency below half the rate. A peak's warping is valid anywhere.
+double DesignFrequency(const _eq_data& band, int sampleRate) {
+    const int freq = std::max(band.freq, 1);
+    return band.filter_type() == EQ_PEAK ? freq : std::min(freq, std::max((sampleRate - 1) / 2, 1));
+}
+
+bool IsFlat(const _eq_data& band) {
+    const auto type = band.filter_type();
+    return band.boost == 0 && type != EQ_HIGHPASS && type != EQ_LOWPASS;
+}
+
+void CookBand(EqBand& band, const _eq_data& data, int sampleRate, bool smooth) {
+    const auto section = DesignBiquad(data.filter_type(), std::pow(10.0, data.boost * 0.005),
+                                      DesignFrequency(data, sampleRate), data.Q, sampleRate);
+    const bool glide = smooth && band.active;
+    band.active = section.IsUsable();
+    if (!band.active) return;
+    section.HandTo(band._eq_coeffs, !glide);
+    if (!glide) band.w1 = band.w2 = 0.0;
+}
+
+void CookChannel(EqChannel& channel, const builtin_effects_data& data, int sampleRate, bool smooth,
+                 bool bypassAll) {
+    const int count = BandsInUse(data);
+    for (int i = 0; i < count; ++i) {
+        EqBand& band = channel.bands[static_cast<std::size_t>(i)];
+        const _eq_data& settings = data.bands[static_cast<std::size_t>(i)];
+        if (bypassAll || settings.bypass() || data.GetBypassChannel() || IsFlat(settings))
+            band.active = 0;
+        else
+            CookBand(band, settings, sampleRate, smooth);
+    }
+}
+
+// The samples of one channel in an interleaved block.
+template <typename Sample>
+struct ChannelSamples {
+    Sample* first;
+    std::ptrdiff_t stride;
+    int count;
+
+    ChannelSamples(Sample* buf, int frames, int step, int channel) : first(buf), stride(step), count(0) {
+        if (frames <= 0 || step <= 0) return;
+        const int offset = step < 2 ? 0 : channel;
+        const std::int64_t end = static_cast<std::int64_t>(frames) * step;
+        if (offset >= end) return;
+        first += offset;
+        count = static_cast<int>((end - offset + step - 1) / step);
+    }
+};
+
+template <typename Sample>
+void Invert(const ChannelSamples<Sample>& samples) {
+    for (int i = 0; i < samples.count; ++i)
+        samples.first[i * samples.stride] = -samples.first[i * samples.stride];
+}
+
+}  // namespace
+
+ParEQ::ParEQ() : m_glide_counter(std::make_shared<std::int32_t>(0)) {}
+ParEQ::ParEQ(const ParEQ&) = default;
+ParEQ& ParEQ::operator=(const ParEQ&) = default;
+ParEQ::~ParEQ() = default;
+
+void ParEQ::AfterCloneInit() { *this = ParEQ(); }
+
+void ParEQ::Resize(int n) {
+    m_channel_count = std::max(n, 0);
+    while (m_channels.size() < static_cast<std::size_t>(m_channel_count))
+        m_channels.push_back(std::make_shared<EqChannel>(m_glide_counter.get()));
+}
+
+void ParEQ::Cook(bool smooth, bool bypassAll, builtin_effects_data* data, int sampleRate, int numChannels) {
+    if (!data) return;
+    Resize(numChannels);
+    for (const auto& channel : m_channels) CookChannel(*channel, *data, sampleRate, smooth, bypassAll);
+}
+
+void ParEQ::ResetProcessing() { *m_glide_counter = 0; }
+
+EqChannel* ParEQ::Channel(int channel) const {
+    return channel >= 0 && static_cast<std::size_t>(channel) < m_channels.size()
+               ? m_channels[static_cast<std::size_t>(channel)].get()
+               : nullptr;
+}
+
+template <typename Sample>
+void ParEQ::Process(Sample* buf, int frames, int numChannels, bool feedSpectrum,
+                    builtin_effects_data* records) {
+    for (int channel = 0; channel < numChannels; ++channel)
+        ProcessSingle(buf, frames, numChannels, feedSpectrum, channel, records);
+}
+
+template <typename Sample>
+void ParEQ::ProcessSingle(Sample* buf, int frames, int stride, bool, int channel,
+                          builtin_effects_data* records) {
+    EqChannel* const state = Channel(channel);
+    if (!state || !records) return;
+    const DenormalGuard guard;
+    const ChannelSamples<Sample> samples(buf, frames, stride, channel);
+    if (records[channel].GetPhaseShift()) Invert(samples);
+    const bool gliding = *m_glide_counter != 0;
+    for (int i = 0; i < BandsInUse(records[0]); ++i) {
+        auto& band = state->bands[static_cast<std::size_t>(i)];
+        if (band.active) RunBand(band, samples.first, samples.stride, samples.count, gliding);
+    }
+}
+
+template DSP_API void ParEQ::Process(float*, int, int, bool, builtin_effects_data*);
+template DSP_API void ParEQ::Process(double*, int, int, bool, builtin_effects_data*);
+template DSP_API void ParEQ::ProcessSingle(float*, int, int, bool, int, builtin_effects_data*);
+template DSP_API void ParEQ::ProcessSingle(double*, int, int, bool, int, builtin_effects_data*);
+
+}  // namespace Corvo::DSP

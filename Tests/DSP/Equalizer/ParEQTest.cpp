@@ -1,0 +1,222 @@
+#include "DSP/Equalizer/ParEQ.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstring>
+#include <limits>
+#include <numbers>
+#include <optional>
+
+#include "Plain/PlainParEQ.h"
+#include "Platform/DenormalGuard.h"
+#include "Support/Signals.h"
+
+namespace {
+
+using namespace Corvo::DSP;
+using TestSupport::Noise;
+using TestSupport::Random;
+
+builtin_effects_data Bands(std::initializer_list<_eq_data> bands) {
+    builtin_effects_data data;
+    data.numBands = 0;
+    for (const auto& band : bands) data.bands[static_cast<std::size_t>(data.numBands++)] = band;
+    return data;
+}
+
+_eq_data RandomBand(Random& random) {
+    _eq_data band;
+    band.type = random.Below(8) | (random.Below(6) == 0 ? _eq_data::kBypassBand : 0);
+    band.freq = 1 + static_cast<int>(std::exp2(random.Unit() * 15.0));
+    band.boost = random.Below(5) == 0 ? 0 : random.Below(300) - 150;
+    band.Q = 10 + random.Below(140);
+    return band;
+}
+
+template <typename Sample>
+bool SameBits(const std::vector<Sample>& a, const std::vector<Sample>& b) {
+    return a.size() == b.size() && std::memcmp(a.data(), b.data(), a.size() * sizeof(Sample)) == 0;
+}
+
+// A session of edits, glides and blocks of every length, in step with the plain form.
+template <typename Sample>
+void CompareWithPlain(int channels, int bands, std::uint64_t seed) {
+    const Corvo::DenormalGuard guard;
+    Random random(seed);
+    const int rate = random.Below(2) ? 48000 : 8000;
+    std::vector<builtin_effects_data> records(static_cast<std::size_t>(channels));
+    auto& data = records[0];
+    data.numBands = bands;
+    for (auto& band : data.bands) band = RandomBand(random);
+    ParEQ eq;
+    Plain::ParEQ<> plain(channels);
+    eq.Cook(false, false, &data, rate, channels);
+    plain.Cook(false, false, data, rate);
+    for (int block = 0; block < 60; ++block) {
+        if (random.Below(3) == 0) {
+            data.bands[static_cast<std::size_t>(random.Below(20))] = RandomBand(random);
+            const bool smooth = random.Below(8) != 0, bypassAll = random.Below(15) == 0;
+            eq.Cook(smooth, bypassAll, &data, rate, channels);
+            plain.Cook(smooth, bypassAll, data, rate);
+        }
+        if (random.Below(10) == 0) {
+            eq.ResetProcessing();
+            plain.counter = 0;
+        }
+        for (auto& record : records) record.SetPhaseShift(random.Below(2) == 0);
+        const int frames = random.Below(4) == 0 ? random.Below(1500) : random.Below(40);
+        auto samples = Noise<Sample>(static_cast<std::size_t>(frames * channels), 0.25, seed + 1);
+        auto expected = samples;
+        if (random.Below(5) == 0) {
+            const int channel = random.Below(channels), stride = 1 + random.Below(channels + 2);
+            const int fit = frames * channels / stride;
+            eq.ProcessSingle(samples.data(), fit, stride, false, channel, records.data());
+            plain.ProcessSingle(expected.data(), fit, stride, channel, records.data());
+        } else {
+            eq.Process(samples.data(), frames, channels, false, records.data());
+            plain.Process(expected.data(), frames, channels, records.data());
+        }
+        ASSERT_TRUE(SameBits(samples, expected))
+            << channels << " channels, " << bands << " bands, block " << block << ", seed " << seed;
+    }
+}
+
+TEST(ParEQ, EqualsThePlainFormToTheBit) {
+    for (const int channels : {1, 2, 3, 4})
+        for (const int bands : {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 13, 20}) {
+            const auto seed = static_cast<std::uint64_t>(100 * channels + bands);
+            CompareWithPlain<float>(channels, bands, seed);
+            CompareWithPlain<double>(channels, bands, seed);
+            if (HasFailure()) return;
+        }
+}
+
+// Catches a cascade that is right in itself but runs the wrong way round or with the wrong signs.
+TEST(ParEQ, LiftsASineByThePeaksHeight) {
+    constexpr int kRate = 48000, kHz = 1000;
+    auto data = Bands({{EQ_PEAK, kHz, 60, 200}, {EQ_LOWSHELF, 100, 0, 50}});
+    data.SetPhaseShift(true);
+    ParEQ eq;
+    eq.Cook(false, false, &data, kRate, 1);
+    const double centre = std::atan(std::numbers::pi * kHz / kRate) / std::numbers::pi * kRate;
+    const auto input = TestSupport::Sine<double>(9600, centre);
+    auto output = input;
+    eq.Process(output.data(), 9600, 1, false, &data);
+    const double gain = std::pow(10.0, 0.3);
+    for (std::size_t i = 4800; i < output.size(); ++i) ASSERT_NEAR(output[i], -gain * input[i], 1e-9) << i;
+}
+
+// At 0 Hz a low shelf is its boost, so the output shows the glide: the first step covers 0.09 % of the way
+// between the coefficients, and in the end all of it.
+TEST(ParEQ, GlidesAfterASmoothCookAndJumpsOtherwise) {
+    const auto run = [](bool smooth, bool wasBypassed) {
+        auto data = Bands({{EQ_HIGHPASS, 1000, 0, 50}});
+        data.SetBypass(0, wasBypassed);
+        ParEQ eq;
+        eq.Cook(false, false, &data, 48000, 1);
+        data.SetBypass(0, false);
+        data.SetEqBoost(0, 60);
+        eq.Cook(smooth, false, &data, 48000, 1);
+        double impulse = 1.0;
+        eq.Process(&impulse, 1, 1, false, &data);
+        return impulse;  // the first b0
+    };
+    coeff<SmoothCoefficient> before, after;
+    CalcolaCoefficientiBiquad(EQ_HIGHPASS, 1.0, 1000, 50, &before, 48000, true);
+    CalcolaCoefficientiBiquad(EQ_HIGHPASS, std::pow(10.0, 0.3), 1000, 50, &after, 48000, true);
+    const double b0 = before.b0.value, target = after.b0.value;
+    EXPECT_DOUBLE_EQ(run(true, false), b0 + 0.0009 * (target - b0));
+    EXPECT_DOUBLE_EQ(run(true, true), target) << "was inactive";
+    EXPECT_DOUBLE_EQ(run(false, false), target);
+}
+
+TEST(ParEQ, StaysBoundedWhateverTheRecordSays) {
+    constexpr int kMost = std::numeric_limits<int>::max();
+    for (int type = 0; type < 8; ++type)
+        for (const int freq : {-5, 0, 1, 3999, 4000, 4001, 22050, 96000, kMost})
+            for (const int Q : {-kMost, -1, 0, 1, 200, kMost})
+                for (const int boost : {-kMost, -960, 240})
+                    for (const int rate : {8000, 44100, 0, -1}) {
+                        auto data = Bands({{type, freq, boost, Q}});
+                        ParEQ eq;
+                        eq.Cook(false, false, &data, rate, 1);
+                        auto samples = Noise<double>(300);
+                        eq.Process(samples.data(), 300, 1, false, &data);
+                        for (const double sample : samples)
+                            ASSERT_LT(std::abs(sample), 1e4)
+                                << type << ' ' << freq << ' ' << Q << ' ' << boost << ' ' << rate;
+                    }
+}
+
+TEST(ParEQ, TouchesNothingButItsChannel) {
+    auto data = Bands({{EQ_PEAK, 1000, 60, 200}});
+    std::vector<builtin_effects_data> records(8, data);
+    for (auto& record : records) record.SetPhaseShift(true);
+    ParEQ eq;
+    eq.Cook(false, false, &data, 48000, 6);
+    // stride, channel -> the samples that may change; four of a buffer of 8 frames have to stay as they are
+    struct Case {
+        int frames, stride, channel, first, count;
+    };
+    for (const Case c : {Case{4, 2, 1, 1, 4},
+                         {4, 2, 5, 5, 2},
+                         {4, 1, 3, 0, 4},
+                         {4, 0, 3, 0, 0},
+                         {4, 2, 6, 0, 0},
+                         {4, 2, -1, 0, 0},
+                         {0, 2, 1, 0, 0},
+                         {-1, 2, 0, 0, 0},
+                         {4, -2, 1, 0, 0},
+                         {1, 2, 4, 0, 0}}) {
+        std::vector<float> samples(16, 1.0f);
+        eq.ProcessSingle(samples.data(), c.frames, c.stride, true, c.channel, records.data());
+        for (int i = 0; i < 16; ++i) {
+            const int steps = i - c.first;
+            const bool mine = c.count && steps >= 0 && steps % c.stride == 0 && steps / c.stride < c.count;
+            EXPECT_EQ(samples[static_cast<std::size_t>(i)] != 1.0f, mine)
+                << "stride " << c.stride << ", channel " << c.channel << ", sample " << i;
+        }
+    }
+    std::vector<float> samples(16, 1.0f);
+    eq.Process(samples.data(), 8, 0, true, records.data());
+    eq.Process<float>(samples.data(), 8, 2, true, nullptr);
+    eq.Cook(false, false, nullptr, 48000, 9);
+    EXPECT_EQ(samples, std::vector<float>(16, 1.0f));
+    EXPECT_EQ(eq.GetNumSubChannels(), 6);
+}
+
+// Catches double frees and leaks (with the address sanitizer) and glides counted on a freed counter.
+TEST(ParEQ, CopiesMayGoInAnyOrder) {
+    auto data = Bands({{EQ_PEAK, 1000, 60, 200}});
+    const builtin_effects_data records[] = {data, data};
+    const auto use = [&](ParEQ& eq) {
+        std::vector<double> samples(64, 0.5);
+        eq.Process(samples.data(), 32, 2, false, const_cast<builtin_effects_data*>(records));
+        return samples.back();
+    };
+    for (int order = 0; order < 6; ++order) {
+        std::optional<ParEQ> source(std::in_place), copy, assigned(std::in_place);
+        source->Cook(false, false, &data, 48000, 2);
+        assigned->Cook(false, false, &data, 44100, 4);
+        copy = source;
+        *assigned = *source;
+        auto& self = *assigned;
+        *assigned = self;
+        EXPECT_EQ(copy->GetNumSubChannels(), 2);
+        EXPECT_NE(use(*copy), 0.5) << "shares the channels";
+        data.SetEqBoost(0, 61 + order);
+        copy->Cook(true, false, &data, 48000, 3);  // begins a glide on the shared counter
+        if (order & 1) source.reset();
+        copy->AfterCloneInit();
+        EXPECT_EQ(copy->GetNumSubChannels(), 0);
+        EXPECT_EQ(use(*copy), 0.5) << "no channels, nothing happens";
+        copy->Cook(false, false, &data, 48000, 2);
+        if (order & 2) assigned.reset();
+        if (order & 4) copy.reset();
+        for (auto* eq : {&source, &copy, &assigned})
+            if (*eq) use(**eq);
+    }
+}
+
+}  // namespace
