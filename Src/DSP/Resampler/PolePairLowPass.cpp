@@ -75,15 +75,16 @@ PolePairLowPass::PolePairLowPass(int upFactor, double cutoff) {
         for (std::size_t i = 0; i < kOrder; ++i) residue *= pole + Real(1);
         for (const Complex other : poles)
             if (other != s) residue /= Distance(s, other);
-        Complex power = 1;
-        for (std::size_t j = 0; j < steps; ++j, power *= pole) {
-            const Complex factor = static_cast<Real>(2 * upFactor) * residue * power;
+        Complex over = 1;  // p^L: over all steps between two samples
+        for (std::size_t j = 0; j < steps; ++j) over *= pole;
+        PutTwice(&advance[kLanes * 2 * pair], std::norm(Real(1) - over));
+        PutTwice(&advance[kLanes * (2 * pair + 1)], std::norm(over));
+        Complex factor = static_cast<Real>(2 * upFactor) * residue;
+        for (std::size_t j = 0; j < steps; ++j, factor *= pole) {
             double* row = &phases[j * kPhaseStride + kLanes * (1 + 2 * pair)];
-            PutTwice(row, factor.real());
-            PutTwice(row + kLanes, -factor.imag());
+            PutTwice(row, (factor * std::conj(Real(1) - over)).real());
+            PutTwice(row + kLanes, (factor * std::conj(over)).real());
         }
-        PutTwice(&advance[kLanes * 2 * pair], power.real());
-        PutTwice(&advance[kLanes * (2 * pair + 1)], power.imag());
         ++pair;
     }
 }

@@ -8,16 +8,21 @@
 
 // A low-pass of order 10 for a stream whose rate is raised by L, as a sum of five complex pole pairs:
 //   H(z) = d + sum of 2 Re(r / (1 - p / z)).
-// Between two samples there are only zeros, so a pair's state v moves on by p^L once per sample and the
-// output j steps after a sample is 2 Re(r p^j v), without any work for the steps that nobody reads.
+// Between two samples there are only zeros, so once per sample a pair moves on by P = p^L. In real numbers,
+// with u the pair's denominator run over the samples at their own rate and c its last change:
+//   c = x + |P|^2 c - |1 - P|^2 u,  u = u + c
+// (the change is kept instead of the value before, because P may be next to 1 and their difference would
+// drown in rounding), and the output j steps after a sample is
+//   d x [at j = 0] + sum of 2 Re(r p^j (1 - P*)) u + 2 Re(r p^j P*) c,
+// without any work for the steps that nobody reads.
 struct PolePairLowPass {
     static constexpr std::size_t kPairs = 5;
     static constexpr std::size_t kLanes = 2;  // every number stands here twice: two channels at once
 
-    // Per step j: L d (at step 0, else 0), then per pair the factors of the state's real and imaginary part.
+    // Per step j: L d (at step 0, else 0), then per pair L times the factors of u and c.
     static constexpr std::size_t kPhaseStride = kLanes * (1 + 2 * kPairs);
     std::vector<double, Corvo::AlignedAllocator<double>> phases;
-    // p^L, real and imaginary parts.
+    // Per pair |1 - P|^2 and |P|^2.
     alignas(16) std::array<double, kLanes * 2 * kPairs> advance;
 
     double groupDelay;

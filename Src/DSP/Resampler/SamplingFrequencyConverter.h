@@ -86,7 +86,7 @@ struct DSP_API SamplingFrequencyConverter {
     double inputHistory[kMaxChannels][kMaxOrder + 1]{};
     double outputHistory[kMaxChannels][kMaxOrder + 1]{};
 
-    // The pole pairs' state, real and imaginary parts, two channels side by side.
+    // The pole pairs' state, value and change, two channels side by side.
     static constexpr int kChannelsPerGroup = 2;
     double pairStates[kMaxChannels / kChannelsPerGroup][kOrder][kChannelsPerGroup]{};
     std::shared_ptr<const PolePairLowPass> pairs;  // never changes once made; shared by copies

@@ -160,6 +160,17 @@ TEST(SamplingFrequencyConverterTest, ReadsAndWritesSamplesToTheirLimits) {
     EXPECT_EQ(tipo_24bit::Read(lowest), -1.0);
 }
 
+// A constant is the hardest for poles next to 1, and the exact ratios of files go beyond 49.
+TEST(SamplingFrequencyConverterTest, StaysExactForSlowFiltersAndLargeFactors) {
+    constexpr int kFactors[][2] = {{1, 49}, {49, 1}, {160, 147}, {147, 1280}, {1, 1000}};
+    for (const auto& [up, down] : kFactors) {
+        const std::vector<double> input(static_cast<std::size_t>(500 + 40 * down / up), 1.0);
+        EXPECT_LT(LargestDifference(Owned(up, down, 1).Convert(input), Plain::Convert(input, up, down)),
+                  1e-12)
+            << up << "/" << down;
+    }
+}
+
 // A host that goes on with the step after a block must hear the stream continue.
 TEST(SamplingFrequencyConverterTest, LeavesTheHistoriesWhereTheDirectFormWouldHaveThem) {
     constexpr int kFactors[][2] = {{1, 1}, {2, 1}, {3, 2}, {12, 1}};
