@@ -1,0 +1,53 @@
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "File.h"
+#include "SampleFormat.h"
+#include "SoundFile.h"
+
+namespace dsphost {
+
+// Reads audio of any kind that libsndfile knows, a block at a time, as doubles with full scale 1.
+//
+// "-" is standard input; it and named pipes may carry anything: WAV streams through, also without a stated
+// length, and what cannot be read forwards only (FLAC, W64, ...) is first spooled to a temporary file.
+class AudioReader {
+public:
+    // Throws UserError when there is nothing there, or nothing that is audio.
+    explicit AudioReader(const std::string& path);
+    ~AudioReader();
+
+    int Channels() const { return m_info.channels; }
+    int Rate() const { return m_info.samplerate; }
+    std::optional<std::int64_t> Frames() const { return m_frames; }  // nothing: known at the end only
+    // Nothing for lossy codecs.
+    std::optional<SampleFormat> Format() const { return FromSubtype(m_info.format & SF_FORMAT_SUBMASK); }
+    const std::string& Name() const { return m_name; }  // as messages call it
+
+    // Fills `samples` with up to `frames` interleaved frames and returns how many there were: fewer only at
+    // the end. Throws UserError when the file turns out to be damaged.
+    int Read(double* samples, int frames);
+
+private:
+    void OpenStream(File stream);
+    void OpenFile(const std::filesystem::path& path);
+
+    std::string m_name;
+    std::filesystem::path m_spool;
+    std::unique_ptr<File> m_file;
+    std::unique_ptr<SoundFile> m_sound;
+    SF_INFO m_info{};
+    std::optional<std::int64_t> m_frames;
+    std::int64_t m_position = 0;
+};
+
+// Throws UserError unless the rate is between 1000 and 768000 Hz and there are at most `maxChannels`
+// channels; `reason` says why not more.
+void RequireFormat(const AudioReader& input, int maxChannels, const std::string& reason);
+
+}  // namespace dsphost

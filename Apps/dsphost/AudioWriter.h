@@ -1,0 +1,62 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "OutputFile.h"
+#include "SampleFormat.h"
+#include "SoundFile.h"
+
+namespace dsphost {
+
+struct AudioWriterOptions {
+    int channels = 2, rate = 48000;
+    std::optional<SampleFormat> asked;         // --format
+    std::optional<SampleFormat> inputFormat;   // kept when nothing is asked for
+    std::optional<std::int64_t> framesAtMost;  // decides whether a plain WAV is large enough
+};
+
+// Writes audio a block at a time; the file appears at Commit, whole, or not at all. The kind of file follows
+// from the name's ending; streams ("-", devices, pipes) get WAV with sizes that say "until the end". A WAV
+// that would pass 4 GiB becomes an RF64. The same samples always give the same bytes (Ogg excepted, whose
+// streams carry a random number).
+//
+// Integers: full scale is 1; values are rounded to nearest, ties to even, without dither, and clipped.
+class AudioWriter {
+public:
+    // Throws UserError when the place, the kind of file or the sample format will not do.
+    AudioWriter(const std::string& path, const OutputRules& rules, const AudioWriterOptions& options);
+    ~AudioWriter();
+
+    // `samples`: interleaved. Throws IoError when they cannot be stored.
+    void Write(const double* samples, std::int64_t frames);
+    // Completes the file and puts it in its place. Throws IoError.
+    void Commit();
+
+    std::int64_t ClippedSamples() const { return m_clipped; }
+    std::int64_t FramesWritten() const { return m_frames; }
+    SampleFormat Format() const { return m_format; }
+    const std::string& Name() const { return m_output.Name(); }
+
+private:
+    void Open(int container, const std::optional<std::int64_t>& framesAtMost);
+    void WriteIntegers(const double* samples, std::int64_t frames);
+
+    OutputFile m_output;
+    SF_INFO m_info{};
+    SampleFormat m_format;
+    int m_subtype = 0;
+    bool m_stream = false;
+    std::int64_t m_start = -1;  // of the stream, when it can go back there
+    std::unique_ptr<SoundFile> m_sound;
+    std::vector<int> m_integers;
+    std::int64_t m_clipped = 0, m_frames = 0;
+};
+
+// "3 samples of out.wav were clipped" on standard error when there were any.
+void WarnOfClipping(const AudioWriter& writer);
+
+}  // namespace dsphost

@@ -1,0 +1,44 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "EffectTable.h"
+
+namespace dsphost {
+
+// One parameter as a person names it.
+struct EffectParameter {
+    int index = 0;      // external: what SetParam takes
+    std::string label;  // with its side, " L" or " R", where it has one
+    std::string unit;
+    Corvo::DSP::EffectParameterType type{};
+    std::vector<std::string> values;  // the choices of a list
+    float neutral = 0.5f;             // normalised
+
+    // The label without its side.
+    std::string_view Stem() const;
+};
+
+// A new instance in the state it should start from: its default preset where it has presets.
+std::unique_ptr<Effect> MakeEffect(EffectFactory factory);
+std::vector<EffectParameter> DescribeParameters(EffectFactory factory);
+
+// The text that `effect` shows once the parameter is set to the normalised value; it stays set.
+std::string TextAt(Effect& effect, const EffectParameter& parameter, float normalised);
+// The text of the value that it has now.
+std::string CurrentText(Effect& effect, const EffectParameter& parameter);
+
+// The parameters that a label names: both sides when it names none, all that bear it when several do.
+// Throws UserError with the nearest labels.
+std::vector<const EffectParameter*> FindParameters(const std::vector<EffectParameter>& all,
+                                                   std::string_view label, const std::string& effectName);
+
+// The normalised value that `text` stands for, in the state that `effect` is in: "n:0.37", a choice of a
+// list or switch, or what the effect's own parser understands. Throws UserError that says what would be
+// accepted. Numbers beyond the range are limited by the effect; `warning` then says so.
+float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& parameter,
+                 std::string_view text, std::string& warning);
+
+}  // namespace dsphost

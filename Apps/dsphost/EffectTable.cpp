@@ -1,0 +1,51 @@
+#include "EffectTable.h"
+
+#include <algorithm>
+#include <array>
+#include <iterator>
+
+#include "DSP/Effects/GainEfx.h"
+#include "EffectElement.h"
+
+namespace dsphost {
+namespace {
+
+template <typename T>
+std::unique_ptr<Effect> Make() {
+    return std::make_unique<T>();
+}
+
+// One line registers an effect; it goes by its GetName().
+// clang-format off
+constexpr std::array<EffectFactory, 1> kEffects{
+    Make<Corvo::DSP::GainEfx::GainEfx>,
+};
+// clang-format on
+
+}  // namespace
+
+std::span<const EffectFactory> EffectFactories() { return kEffects; }
+
+std::span<const std::string> EffectNames() {
+    static const auto names = [] {
+        std::vector<std::string> all;
+        for (const auto make : kEffects) all.push_back(make()->GetName());
+        return all;
+    }();
+    return names;
+}
+
+std::span<const ElementKind> ElementKinds() {
+    static const auto kinds = [] {
+        std::vector<ElementKind> all;
+        for (const auto make : kEffects)
+            all.push_back({make()->GetName(), [make](std::string_view settings) {
+                               return std::make_unique<EffectElement>(make, settings);
+                           }});
+        // What is no effect but can stand in a chain: one line each.
+        return all;
+    }();
+    return kinds;
+}
+
+}  // namespace dsphost

@@ -1,0 +1,42 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include <sndfile.h>
+
+#include "File.h"
+
+namespace dsphost {
+
+// libsndfile over a File, so that names, large positions and failures are treated alike on every system.
+// The File must outlive it and stay where it is.
+class SoundFile {
+public:
+    // Opens with sf_open's modes; `info` as sf_open takes and fills it. Where the file cannot seek, only
+    // raw samples can be handled, from where it stands. Throws UserError naming the file.
+    SoundFile(File& file, int mode, SF_INFO& info);
+    SoundFile(const SoundFile&) = delete;
+    SoundFile& operator=(const SoundFile&) = delete;
+    ~SoundFile();
+
+    SNDFILE* Get() const { return m_handle; }
+    File& Bytes() const { return m_stream.file; }
+    // libsndfile's own words on what went wrong.
+    std::string Error() const;
+    // Writes what is pending, headers included; the file itself stays open.
+    void Close();
+
+private:
+    struct Stream {
+        File& file;
+        bool seekable;
+        std::int64_t position = 0;  // of a stream that cannot seek
+    };
+    static SF_VIRTUAL_IO Callbacks();
+
+    Stream m_stream;
+    SNDFILE* m_handle;
+};
+
+}  // namespace dsphost

@@ -1,0 +1,135 @@
+#include "Text.h"
+
+#include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <cstdint>
+#include <numeric>
+#include <utility>
+
+#include "Errors.h"
+
+namespace dsphost {
+namespace {
+
+constexpr std::size_t kShortList = 12;
+constexpr std::size_t kSuggestions = 3;
+
+char Lower(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; }
+
+// Edits (insert, delete, replace) that turn one text into the other, whatever the case.
+std::size_t Distance(std::string_view a, std::string_view b) {
+    std::vector<std::size_t> row(b.size() + 1);
+    std::iota(row.begin(), row.end(), std::size_t{0});
+    for (std::size_t i = 0; i < a.size(); ++i) {
+        std::size_t diagonal = std::exchange(row[0], i + 1);
+        for (std::size_t j = 0; j < b.size(); ++j) {
+            const std::size_t replaced = diagonal + (Lower(a[i]) == Lower(b[j]) ? 0 : 1);
+            diagonal = row[j + 1];
+            row[j + 1] = std::min({row[j] + 1, diagonal + 1, replaced});
+        }
+    }
+    return row.back();
+}
+
+}  // namespace
+
+std::string Utf8(std::wstring_view wide) {
+    std::string text;
+    const auto tail = [&](std::uint32_t code, int shift) {
+        text += static_cast<char>(0x80 | ((code >> shift) & 0x3F));
+    };
+    for (std::size_t i = 0; i < wide.size(); ++i) {
+        auto code = static_cast<std::uint32_t>(wide[i]);
+        // Where wchar_t has 16 bits, two of them make one character beyond the first 65536.
+        if (code >= 0xD800 && code < 0xDC00 && i + 1 < wide.size())
+            code = 0x10000 + ((code - 0xD800) << 10) + (static_cast<std::uint32_t>(wide[++i]) - 0xDC00);
+        if (code < 0x80) {
+            text += static_cast<char>(code);
+        } else if (code < 0x800) {
+            text += static_cast<char>(0xC0 | (code >> 6));
+            tail(code, 0);
+        } else if (code < 0x10000) {
+            text += static_cast<char>(0xE0 | (code >> 12));
+            tail(code, 6);
+            tail(code, 0);
+        } else {
+            text += static_cast<char>(0xF0 | (code >> 18));
+            tail(code, 12);
+            tail(code, 6);
+            tail(code, 0);
+        }
+    }
+    return text;
+}
+
+std::string_view Trimmed(std::string_view text) {
+    constexpr std::string_view kBlanks = " \t\r\n\f\v";
+    const auto first = text.find_first_not_of(kBlanks);
+    if (first == text.npos) return {};
+    return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
+}
+
+bool StartsWithNoCase(std::string_view text, std::string_view start) {
+    return text.size() >= start.size() && std::equal(start.begin(), start.end(), text.begin(),
+                                                     [](char a, char b) { return Lower(a) == Lower(b); });
+}
+
+bool SameNoCase(std::string_view a, std::string_view b) {
+    return a.size() == b.size() && StartsWithNoCase(a, b);
+}
+
+std::string Joined(std::span<const std::string> texts, std::string_view separator) {
+    std::string joined;
+    for (const auto& text : texts) {
+        if (!joined.empty()) joined += separator;
+        joined += text;
+    }
+    return joined;
+}
+
+std::size_t NumberLength(std::string_view text) {
+    const std::size_t sign = text.starts_with('+') ? 1 : 0;
+    double value;
+    const auto* begin = text.data() + sign;
+    const auto [end, error] = std::from_chars(begin, text.data() + text.size(), value);
+    return error == std::errc::invalid_argument ? 0 : static_cast<std::size_t>(end - text.data());
+}
+
+std::optional<double> ToNumber(std::string_view text) {
+    text = Trimmed(text);
+    if (text.starts_with('+')) text.remove_prefix(1);
+    double value;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    if (error != std::errc{} || end != text.data() + text.size() || !std::isfinite(value)) return {};
+    return value;
+}
+
+std::string Suggestion(std::string_view text, std::span<const std::string> names) {
+    if (names.empty()) return "there are none";
+    std::vector<std::string> nearest(names.begin(), names.end());
+    if (nearest.size() <= kShortList) return "accepted: " + Joined(nearest, ", ");
+    std::ranges::stable_sort(nearest, {}, [&](const auto& name) {
+        const bool contained = name.size() > text.size() && StartsWithNoCase(name, text);
+        return contained ? 0 : Distance(text, name);
+    });
+    nearest.resize(kSuggestions);
+    return "did you mean " + nearest[0] + ", " + nearest[1] + " or " + nearest[2] + "?";
+}
+
+std::size_t FindName(std::string_view text, std::span<const std::string> names, std::string_view what) {
+    text = Trimmed(text);
+    const auto same = std::ranges::find_if(names, [&](const auto& name) { return SameNoCase(name, text); });
+    if (same != names.end()) return static_cast<std::size_t>(same - names.begin());
+
+    const auto begins = [&](const auto& name) { return StartsWithNoCase(name, text); };
+    std::vector<std::string> candidates;
+    if (!text.empty()) std::ranges::copy_if(names, std::back_inserter(candidates), begins);
+    if (candidates.size() == 1)
+        return static_cast<std::size_t>(std::ranges::find_if(names, begins) - names.begin());
+    const std::string asked = std::string(what) + " \"" + std::string(text) + "\"";
+    if (candidates.size() > 1) throw UserError(asked + " could be several: " + Joined(candidates, ", "));
+    throw UserError("there is no " + asked + "; " + Suggestion(text, names));
+}
+
+}  // namespace dsphost
