@@ -1,9 +1,9 @@
 #include "EffectTable.h"
 
 #include <algorithm>
-#include <array>
 #include <iterator>
 
+#include "DSP/Effects/Autovol.h"
 #include "DSP/Effects/GainEfx.h"
 #include "EffectElement.h"
 
@@ -17,8 +17,9 @@ std::unique_ptr<Effect> Make() {
 
 // One line registers an effect; it goes by its GetName().
 // clang-format off
-constexpr std::array<EffectFactory, 1> kEffects{
+constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::GainEfx::GainEfx>,
+    Make<Corvo::DSP::Autovol>,
 };
 // clang-format on
 

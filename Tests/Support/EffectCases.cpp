@@ -4,6 +4,7 @@
 #include <array>
 #include <stdexcept>
 
+#include "DSP/Effects/Autovol.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 
@@ -24,6 +25,11 @@ constexpr std::array kEffects{
                .otherBuildReason = "sine and cosine of the pan law",
                .plainFloats = true,
                .textTruncates = true},
+    EffectCase{.name = "Tremolo",
+               .make = Make<Autovol>,
+               .cuts = Cuts::PhasePerBlock,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "the oscillator's sine and the gain's power"},
     EffectCase{.name = "Echo",
                .make = Make<Echo>,
                .otherBuild = OtherBuild::Relative,

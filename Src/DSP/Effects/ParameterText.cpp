@@ -16,6 +16,8 @@ using NumberBuffer = std::array<char, 400>;
 
 char Lower(char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; }
 
+constexpr float kFarOut = 1e8f;  // keeps conversions to integers defined
+
 bool IsBlank(char c) { return c == ' ' || (c >= '\t' && c <= '\r'); }
 
 }  // namespace
@@ -60,8 +62,12 @@ float ParseNumber(std::string_view text) {
     return number;
 }
 
+std::int32_t ParseSteps(std::string_view text, double step) {
+    const double steps = ParseNumber(text) / step;
+    return static_cast<std::int32_t>(std::lround(steps > 0.0 ? std::min<double>(steps, kFarOut) : 0.0));
+}
+
 std::int32_t ParseTenthsOfDb(std::string_view text, std::int32_t floor) {
-    constexpr float kFarOut = 1e8f;  // keeps the conversion defined
     const float tenths = ParseNumber(text) * 10.0f;
     if (!(tenths > static_cast<float>(floor))) return floor;
     return static_cast<std::int32_t>(std::lround(std::min(tenths, kFarOut)));

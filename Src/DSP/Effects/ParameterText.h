@@ -27,6 +27,9 @@ float ParseNumber(std::string_view text);
 // The tenths that FormatTenthsOfDb shows as `text`: rounded, because the text is exact to a tenth; "-Inf."
 // gives `floor`.
 std::int32_t ParseTenthsOfDb(std::string_view text, std::int32_t floor);
+// The word that shows as the number at the start of `text` when each unit of it counts `step`; 0 for negative
+// numbers and NaN. Throws like ParseNumber.
+std::int32_t ParseSteps(std::string_view text, double step);
 // Normalised 1 for "On" and 0 for "Off", whatever the case; a number counts as on from 0.5. Throws like
 // ParseNumber.
 float ParseSwitch(std::string_view text);
