@@ -1,0 +1,60 @@
+#pragma once
+
+#include <atomic>
+#include <vector>
+
+#include "Platform/Export.h"
+#include "Spectrum/kivspectrum.h"
+
+// Turns the power spectra of one analyser into the curve that is drawn: smooths them over time and keeps a
+// memory of their peaks. Used on the display side of its analyser, which lends its lock.
+class DSP_API SpectrumDrawer {
+public:
+    explicit SpectrumDrawer(kivspectrum::spectrum_settings settings);
+    ~SpectrumDrawer();
+
+    void UpdateSettings(kivspectrum::spectrum_settings settings);
+    const kivspectrum::spectrum_settings& GetSettings() const;
+
+    // Size the spectrum, the peaks and their counters for the settings. Allocate keeps what is there;
+    // ReallocateBuffers starts from zero.
+    void Allocate();
+    void ReallocateBuffers();
+    void Deallocate();
+
+    // Another rate than before clears all history. -1 until set.
+    void UpdateSamplingFrequency(int samplingRate);
+    int GetSamplingFrequency() const;
+
+    // Takes the next power spectrum into the smoothed one. `coefficient` is the share of it that counts when
+    // analyses come once a second per sample of hop: 0.15 is brisk, 0.035 calm. Always true.
+    bool SmoothFftSpectrum(const std::vector<float>& power, float coefficient,
+                           VectorInterpolationFilterFloat& filter);
+    const std::vector<float>& GetPowerSmoothed() const;
+
+    // Milliseconds between display refreshes.
+    static int GetRefreshRatePeriod();
+    // Refreshes per second: the display's with time smoothing, else as many as there are new spectra.
+    int GetActualRefreshRate(const std::vector<float>& power) const;
+    // How many frames a peak stays before it falls: 1 without peak memory, 0 when it never falls.
+    int power_decay_length(const std::vector<float>& power) const;
+
+    // One drawn frame older: peaks that the spectrum reaches are new, those whose frames ran out sink by
+    // 1 dB a frame until they meet it.
+    void AgePeaks();
+    void peak_reset();
+    const std::vector<float>& GetPeaks() const;
+
+    void SetOn(bool on);
+    bool GetOn() const;
+
+private:
+    double RefreshRate(const std::vector<float>& power) const;
+
+    kivspectrum::spectrum_settings m_settings;
+    std::vector<float> m_smoothed;
+    std::vector<float> m_peaks;
+    std::vector<float> m_peakFrames;  // until each peak falls
+    int m_samplingRate = -1;
+    std::atomic<bool> m_on{true};
+};

@@ -1,0 +1,190 @@
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#include "Platform/CriticalSection.h"
+#include "Platform/Export.h"
+#include "Spectrum/CorvoFFT.h"
+
+class MessagePoster;
+class SpectrumDrawer;
+class SpectrumStaticInfo;
+class Tuner;
+class VectorInterpolationFilterFloat;
+namespace Corvo {
+class CaptureBuffer;
+}
+
+// A real-time spectrum analyser: captures the newest samples of a signal, windows and transforms them, and
+// hands the power spectrum to its drawer for smoothing and drawing.
+//
+// All analysis settings are class-wide: a change made through any analyser's menu reaches every live one.
+//
+// Threads: one audio thread calls Feed. One display thread prepares frames and reads what the drawer and the
+// buffers hold. Menu commands and switches may come from any thread; a class-wide lock in front of the
+// analysers' own keeps them apart, and nobody holds up the audio thread. Who draws on another thread than the
+// menu's must not read the buffers while a command runs.
+class DSP_API kivspectrum {
+public:
+    // 24 fields of 32 bits. Lengths are in samples.
+    struct spectrum_settings {
+        std::int32_t fft_length = 4096;
+        std::int32_t fft_length_auto = 1;  // 1: the transform is as long as the window
+        std::int32_t window_length = 4096;
+        std::int32_t hop_length = -1;      // samples between analyses; below 1: one window
+        std::int32_t window_type = 4;      // 0 rectangular, 1 triangular, 2 Hann, 3 Hamming, 4 Blackman
+        std::int32_t view_option_a = 1;    // frequency scale, see FrequencyScale
+        std::int32_t view_option_b = 0;    // level scale, see LevelScale
+        std::int32_t peak_decay_mode = 2;  // how long peaks stay: 0 for good, 1 long, 2 medium, 3 short
+        std::int32_t view_option_c = 1;    // grid: 0 off, 1 on
+        std::int32_t view_option_d = 1;    // vertical range: 60, 90, 120 or 144 dB
+        float gain = 1.0f;                 // scales the drawn amplitude
+        std::int32_t view_flag_a = 0;      // show the two channels apart
+        std::int32_t peak_hold_mode = 1;   // 0 no peaks, 1 peaks fall, 2 they stay until reset
+        std::int32_t view_flag_b = 1;      // labels
+        std::int32_t view_option_e = 1;    // curve style: 1 line, 2 filled, 3 bars
+        std::int32_t view_flag_c = 1;      // info box at the pointer
+        float overlap = 0.0f;              // of successive windows, kept below 1
+        std::int32_t reserved_18 = 0;
+        std::int32_t time_smoothing = 1;
+        bool view_flag_d = false;  // note names on the frequency axis
+        std::uint8_t view_flag_d_rest[3]{};
+        std::int32_t reserved_21 = 1;
+        std::int32_t reserved_22 = 0;
+        std::int32_t smoothing_type = 0;  // 0 exponential, 1 moving filter, 2 none
+        std::int32_t smoothing_filter_length = 5;
+    };
+    enum _display_mode : int { display_spectrum, display_sonogram, display_both, display_tuner };
+
+    static constexpr int window_types_num = 5;
+
+    // Class-wide. Written by menu commands and init; a host that stores or restores it does so while no
+    // command runs and calls ObserverUpdate afterwards.
+    static spectrum_settings settings;
+    // While set, init does nothing.
+    static std::atomic<bool> lock_init;
+    // The tuner panel's bitmaps must be made again: command 1350 was chosen or the resolution changed.
+    static std::atomic<bool> needPrepareBitmap;
+
+    static SpectrumStaticInfo& GetStaticInfo();
+    // Milliseconds between display refreshes.
+    static int GetRefreshRatePeriod();
+    // Stores the overlap, 1 and more as 0.99, and the hop length that follows from it. Values below 0 leave
+    // gaps between the windows.
+    static void SetAnalysisWindowsOverlap(float overlap);
+    // The display's dots per inch; a change asks for new bitmaps.
+    static void SetDpi(int dpi);
+    // Every live analyser is registered by its constructor and leaves with its destructor.
+    static void ObserverAdd(kivspectrum* instance, bool add);
+
+    // Off, its tuner too, with buffers for the current settings.
+    kivspectrum();
+    ~kivspectrum();
+    kivspectrum(const kivspectrum&) = delete;
+    kivspectrum& operator=(const kivspectrum&) = delete;
+
+    // Audio thread; never allocates and never waits. Frame i has its channels at samples[i * stride] and
+    // following; their mean is captured. Ignored without samples, frames or channels.
+    void Feed(const float* samples, int frames, int stride, int channels);
+    void Feed(const double* samples, int frames, int stride, int channels);
+
+    // The rate for PrepareFFTForDrawingHelper; below 1 is ignored.
+    void set_parameters(int samplingRate);
+    // Brings buffers and window in line with the settings.
+    void init();
+    // Sizes the buffers for what init found, or empties them when `reset` is 0 or the analyser is frozen.
+    void allocate(int reset);
+    // Re-initialises every live analyser after a change of the settings. Tuners go off with this one's.
+    void ObserverUpdate();
+    // Carries out a menu command, 1200..1402. False, with nothing changed, when it is none of these.
+    bool popupmenu_process(int command);
+
+    // Prepares a frame when new samples came; false when there is nothing to do. With probeOnly it only says
+    // whether there would be a frame. sonogramMode smooths at the sonogram's speed unless overridden,
+    // fastSmoothing is for everything else.
+    bool PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, bool sonogramMode, bool sonogramOverride,
+                              bool probeOnly);
+    bool PrepareFFTForDrawingHelper(bool sonogramMode, bool sonogramOverride);
+    // The display's entry per frame: prepares one and returns the smoothed power spectrum, which stays the
+    // drawer's. False, with `spectrum` untouched, when there was no new frame.
+    bool GetFFTFor3DSonogram(int samplingRate, const std::vector<float>** spectrum, bool fastSmoothing,
+                             bool probeOnly);
+    // Windows and transforms the newest samples.
+    void PerformFFT();
+
+    // The captured samples: the newest min(window length, transform length), oldest first, then zeros. The
+    // audio thread goes on writing them.
+    std::vector<float>& GetBufferInputPoints();
+    // Their channels: always 1.
+    int GetBufferInputChannels() const;
+    // The spectrum of the last frame, |bin|^2 unscaled; entry 0 holds DC^2 + Nyquist^2.
+    const std::vector<float>& GetPower() const;
+    // The window that the newest samples are multiplied by.
+    const std::vector<float>& GetWindow() const;
+    SpectrumDrawer* GetSpectrumDrawer() const;
+    Tuner* GetTuner() const;
+    void peak_reset();
+
+    void SetOn(bool on);
+    bool GetOn() const;
+    void SetTunerOn(bool on);
+    bool GetTunerOn() const;
+    // Switches the tuner off when it runs, else tuner and analyser on, with fresh buffers.
+    void ToggleTuner();
+    // A frozen analyser runs no analysis; a thawed one has fresh buffers.
+    void SetFrozen(bool frozen);
+    bool GetFrozen() const;
+
+    // Spectrum, sonogram, both, tuner, and around again.
+    void ToggleDisplayMode();
+    // Shows or hides the sonogram.
+    void ToggleDisplayMode2();
+    _display_mode GetDisplayMode() const;
+    void ShowSonogram(bool show);
+    bool IsShowSonogram() const;
+    void ToggleShowInfoBoxes();
+    void SetShowInfoBox(bool show);
+    bool IsShowInfoBox() const;
+
+private:
+    bool ApplyCommand(int command);
+    void ResizeFilter();
+    void cook_window();
+    void ComputePower();
+    float SmoothingCoefficient(bool fastSmoothing, bool sonogramMode, bool sonogramOverride) const;
+    void UpdateDrawer(const spectrum_settings& current);
+    void Tell(int message, std::intptr_t detail);
+
+    mutable Corvo::CriticalSection m_instanceLock;
+    CorvoFFT m_fft;
+    int m_order;     // of the transform length, kNoOrder when it is not a power of two
+    int m_fftOrder;  // what m_fft was built for
+    std::int32_t m_builtFftLength = 0;
+    std::int32_t m_builtWindowType = -1;
+    std::int32_t m_builtWindowLength = 0;
+    std::int32_t m_builtHopLength = 0;
+
+    std::unique_ptr<Corvo::CaptureBuffer> m_capture;
+    std::vector<float> m_samples;    // the copy that an analysis works on
+    std::vector<float> m_transform;  // windowed, then transformed in place
+    std::vector<float> m_window;
+    std::vector<float> m_power;
+    std::unique_ptr<SpectrumDrawer> m_drawer;
+    std::unique_ptr<VectorInterpolationFilterFloat> m_filter;
+    std::unique_ptr<Tuner> m_tuner;
+
+    std::atomic<bool> m_on{false};
+    std::atomic<bool> m_tunerOn{false};
+    std::atomic<bool> m_tunerVisible{false};
+    std::atomic<bool> m_frozen{false};
+    std::atomic<bool> m_transforming{false};
+    std::atomic<bool> m_showSonogram{false};
+    std::atomic<bool> m_showInfoBox{true};
+    std::atomic<_display_mode> m_displayMode{display_spectrum};
+    std::atomic<int> m_samplingRate{44100};
+};
+
+static_assert(sizeof(kivspectrum::spectrum_settings) == 24 * 4);
