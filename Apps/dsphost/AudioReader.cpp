@@ -6,7 +6,7 @@
 
 #include "Errors.h"
 #include "OutputFile.h"
-#include "WavStream.h"
+#include "WavHeader.h"
 
 namespace dsphost {
 namespace {

@@ -4,13 +4,9 @@
 #include <cmath>
 
 #include "Errors.h"
-#include "WavStream.h"
 
 namespace dsphost {
 namespace {
-
-// What a plain WAV can hold, headers and an ample reserve for them taken off.
-constexpr std::int64_t kLargestWav = 0xFFFFFFFFll - (1 << 16);
 
 // Nearest integer, ties to even, of a value that is within the integer's range.
 int Rounded(double value) { return static_cast<int>(std::lrint(value)); }
@@ -18,36 +14,34 @@ int Rounded(double value) { return static_cast<int>(std::lrint(value)); }
 }  // namespace
 
 AudioWriter::AudioWriter(const std::string& path, const OutputRules& rules, const AudioWriterOptions& options)
-    : m_output(path, rules), m_stream(m_output.IsStream()) {
-    const int container = ContainerFor(path, m_stream);
+    : m_output(path, rules) {
+    const int container = ContainerFor(path, m_output.IsStream());
     m_format = ChooseSampleFormat(path, container, options.inputFormat, options.asked);
-    m_subtype = *SubtypeIn(container, m_format);
     m_info.channels = options.channels;
     m_info.samplerate = options.rate;
-    Open(container, options.framesAtMost);
+    m_info.format = container | *SubtypeIn(container, m_format);
+    if (container == SF_FORMAT_WAV || container == SF_FORMAT_RF64) OpenWav(container, options.framesAtMost);
+    m_sound = std::make_unique<SoundFile>(m_output.Bytes(), SFM_WRITE, m_info);
+    // The peak chunk carries the time of day, and the same input would give other bytes.
+    sf_command(m_sound->Get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
 }
 
 AudioWriter::~AudioWriter() = default;
 
-void AudioWriter::Open(int container, const std::optional<std::int64_t>& framesAtMost) {
-    if (m_stream) {
-        m_start = m_output.Bytes().Position();
-        const auto header = MakeWavHeader(m_info.channels, m_info.samplerate, m_subtype, {});
-        m_output.Bytes().Write(header.data(), header.size());
-        m_info.format = SF_FORMAT_RAW | m_subtype | SF_ENDIAN_LITTLE;
-    } else {
-        const std::int64_t frameBytes = std::int64_t{m_info.channels} * WavSampleBytes(m_subtype);
-        const bool fits =
-            framesAtMost && *framesAtMost <= kLargestWav / std::max<std::int64_t>(frameBytes, 1);
-        if (container == SF_FORMAT_WAV && !fits) container = SF_FORMAT_RF64;
-        m_info.format = container | m_subtype;
-    }
-    const bool mayShrink =
-        !m_stream && (m_info.format & SF_FORMAT_TYPEMASK) == SF_FORMAT_RF64 && !framesAtMost;
-    m_sound = std::make_unique<SoundFile>(m_output.Bytes(), SFM_WRITE, m_info);
-    // The peak chunk carries the time of day, and the same input would give other bytes.
-    sf_command(m_sound->Get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
-    if (mayShrink) sf_command(m_sound->Get(), SFC_RF64_AUTO_DOWNGRADE, nullptr, SF_TRUE);
+// WAV headers are our own, in files as in pipes; libsndfile lays the samples behind them.
+void AudioWriter::OpenWav(int container, const std::optional<std::int64_t>& framesAtMost) {
+    const int subtype = m_info.format & SF_FORMAT_SUBMASK;
+    m_wav = WavShape{m_info.channels, m_info.samplerate, subtype};
+    m_wav->rf64 = container == SF_FORMAT_RF64;
+    const std::int64_t frameBytes = std::int64_t{m_info.channels} * WavSampleBytes(subtype);
+    m_wav->room = !m_output.IsStream() && !(framesAtMost && *framesAtMost <= kLargestWavBytes / frameBytes);
+    WriteHeader({});
+    m_info.format = SF_FORMAT_RAW | subtype | SF_ENDIAN_LITTLE;
+}
+
+void AudioWriter::WriteHeader(std::optional<std::int64_t> sampleBytes) {
+    const auto header = MakeWavHeader(*m_wav, sampleBytes);
+    m_output.Bytes().Write(header.data(), header.size());
 }
 
 void AudioWriter::Write(const double* samples, std::int64_t frames) {
@@ -84,16 +78,20 @@ void AudioWriter::WriteIntegers(const double* samples, std::int64_t frames) {
     throw IoError(Name() + ": " + m_sound->Error());
 }
 
+void AudioWriter::CompleteWav() {
+    auto& bytes = m_output.Bytes();
+    const std::int64_t size = m_frames * m_wav->channels * WavSampleBytes(m_wav->subtype);
+    // Standard output may well be a file that can be gone back in; one that was appended to is left alone.
+    const auto start = static_cast<std::int64_t>(MakeWavHeader(*m_wav, {}).size());
+    if (bytes.Position() != start + size || !bytes.Seek(0)) return;
+    WriteHeader(size);
+    bytes.Seek(0, SEEK_END);
+    if (size % 2 != 0) bytes.Write("", 1);
+}
+
 void AudioWriter::Commit() {
     m_sound->Close();
-    auto& bytes = m_output.Bytes();
-    // A stream that turned out to be a file gets its true sizes.
-    if (m_stream && m_start == 0 && bytes.Seek(0)) {
-        const auto size = m_frames * m_info.channels * WavSampleBytes(m_subtype);
-        const auto header = MakeWavHeader(m_info.channels, m_info.samplerate, m_subtype, size);
-        bytes.Write(header.data(), header.size());
-        bytes.Seek(0, SEEK_END);
-    }
+    if (m_wav) CompleteWav();
     m_output.Commit();
 }
 

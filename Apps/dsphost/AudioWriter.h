@@ -9,6 +9,7 @@
 #include "OutputFile.h"
 #include "SampleFormat.h"
 #include "SoundFile.h"
+#include "WavHeader.h"
 
 namespace dsphost {
 
@@ -42,15 +43,15 @@ public:
     const std::string& Name() const { return m_output.Name(); }
 
 private:
-    void Open(int container, const std::optional<std::int64_t>& framesAtMost);
+    void OpenWav(int container, const std::optional<std::int64_t>& framesAtMost);
+    void WriteHeader(std::optional<std::int64_t> sampleBytes);
+    void CompleteWav();
     void WriteIntegers(const double* samples, std::int64_t frames);
 
     OutputFile m_output;
     SF_INFO m_info{};
     SampleFormat m_format;
-    int m_subtype = 0;
-    bool m_stream = false;
-    std::int64_t m_start = -1;  // of the stream, when it can go back there
+    std::optional<WavShape> m_wav;
     std::unique_ptr<SoundFile> m_sound;
     std::vector<int> m_integers;
     std::int64_t m_clipped = 0, m_frames = 0;

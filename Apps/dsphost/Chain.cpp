@@ -1,12 +1,28 @@
 #include "Chain.h"
 
 #include <algorithm>
+#include <utility>
 
 #include "EffectTable.h"
 #include "Errors.h"
 #include "Text.h"
 
 namespace dsphost {
+namespace {
+
+std::vector<std::unique_ptr<ChainElement>> MakeElements(std::span<const std::string> texts) {
+    std::vector<std::string> names;
+    for (const auto& kind : ElementKinds()) names.push_back(kind.name);
+    std::vector<std::unique_ptr<ChainElement>> elements;
+    for (const std::string_view text : texts) {
+        const std::size_t colon = std::min(text.find(':'), text.size());
+        const auto& kind = ElementKinds()[FindName(text.substr(0, colon), names, "effect")];
+        elements.push_back(kind.make(Trimmed(text.substr(std::min(colon + 1, text.size())))));
+    }
+    return elements;
+}
+
+}  // namespace
 
 std::vector<int> ChainElement::AutomationLanes(std::string_view) {
     throw UserError(Name() + " plays no automation");
@@ -14,16 +30,10 @@ std::vector<int> ChainElement::AutomationLanes(std::string_view) {
 void ChainElement::Automate(int, std::span<const AutomationPoint>) {}
 std::vector<std::uint8_t> ChainElement::State() { throw UserError(Name() + " has no settings chunk"); }
 
-Chain::Chain(std::span<const std::string> texts) {
-    std::vector<std::string> names;
-    for (const auto& kind : ElementKinds()) names.push_back(kind.name);
-    for (const std::string_view text : texts) {
-        const std::size_t colon = std::min(text.find(':'), text.size());
-        const auto& kind = ElementKinds()[FindName(text.substr(0, colon), names, "effect")];
-        m_elements.push_back(kind.make(Trimmed(text.substr(std::min(colon + 1, text.size())))));
-    }
-    m_points.resize(m_elements.size());
-}
+Chain::Chain(std::vector<std::unique_ptr<ChainElement>> elements)
+    : m_elements(std::move(elements)), m_points(m_elements.size()) {}
+
+Chain::Chain(std::span<const std::string> texts) : Chain(MakeElements(texts)) {}
 
 void Chain::Automate(std::size_t element, int lane, std::span<const AutomationPoint> points) {
     m_elements[element]->Automate(lane, points);
@@ -44,6 +54,12 @@ std::vector<std::string> Chain::Prepare(int maxFrames, const tWAVEFORMATEX& form
     }
     std::ranges::sort(m_cuts);
     return interleavedOnly;
+}
+
+double Chain::LongestGap() {
+    double gap = 0.0;
+    for (const auto& element : m_elements) gap += element->LongestGap();
+    return gap;
 }
 
 int Chain::FramesToCut(std::int64_t position, int most) const {

@@ -15,6 +15,7 @@ class Chain {
 public:
     // Each text is "NAME" or "NAME: settings". Throws UserError.
     explicit Chain(std::span<const std::string> texts);
+    explicit Chain(std::vector<std::unique_ptr<ChainElement>> elements);
 
     std::size_t Size() const { return m_elements.size(); }
     ChainElement& Element(std::size_t index) { return *m_elements[index]; }
@@ -27,6 +28,8 @@ public:
     // although those were asked for.
     std::vector<std::string> Prepare(int maxFrames, const tWAVEFORMATEX& format, bool planar);
     std::int64_t Latency() const { return m_latency; }
+    // The longest silence, in seconds, inside the tail of the whole chain as its effects stand now.
+    double LongestGap();
 
     // Frames from `position`, which a block must not pass; `most` where nothing is in the way.
     int FramesToCut(std::int64_t position, int most) const;

@@ -34,6 +34,9 @@ public:
     // runs out.
     virtual void Process(double* samples, int frames, std::int64_t time) = 0;
 
+    // The longest silence, in seconds, that may lie between two sounds of its tail.
+    virtual double LongestGap() { return 0.0; }
+
     // The index of a parameter's automation lane, two for a left/right pair named without its side. Throws
     // UserError when there is no such parameter or the element plays no automation.
     virtual std::vector<int> AutomationLanes(std::string_view parameter);

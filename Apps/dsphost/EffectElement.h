@@ -24,6 +24,7 @@ public:
     bool Prepare(int maxFrames, const tWAVEFORMATEX& format, bool planar) override;
     int Latency() override;
     void Process(double* samples, int frames, std::int64_t time) override;
+    double LongestGap() override;
     std::vector<int> AutomationLanes(std::string_view parameter) override;
     void Automate(int lane, std::span<const AutomationPoint> points) override;
     std::vector<std::uint8_t> State() override;

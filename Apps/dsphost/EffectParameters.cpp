@@ -77,15 +77,6 @@ float Neutral(Effect& effect, int index, const MP_PARAMINFO& record) {
     return low;
 }
 
-// A second instance in the same state, to try values on.
-std::unique_ptr<Effect> Copy(EffectFactory factory, Effect& effect) {
-    std::vector<std::uint8_t> chunk;
-    effect.GetSettingsChunk(chunk);
-    auto copy = factory();
-    copy->SetSettingsChunk(chunk);
-    return copy;
-}
-
 // "4 x" and "4" name the same choice when the unit is "x".
 bool SameChoice(std::string_view shown, std::string_view text, std::string_view unit) {
     shown = Trimmed(shown), text = Trimmed(text), unit = Trimmed(unit);
@@ -155,6 +146,14 @@ std::unique_ptr<Effect> MakeEffect(EffectFactory factory) {
     return effect;
 }
 
+std::unique_ptr<Effect> CopyEffect(EffectFactory factory, Effect& effect) {
+    std::vector<std::uint8_t> chunk;
+    effect.GetSettingsChunk(chunk);
+    auto copy = factory();
+    copy->SetSettingsChunk(chunk);
+    return copy;
+}
+
 std::vector<EffectParameter> DescribeParameters(EffectFactory factory) {
     const auto effect = MakeEffect(factory);
     const auto records = Records(*effect);
@@ -209,7 +208,7 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
             throw UserError(asked + "n: takes a normalised value from 0 to 1, such as n:0.37");
         return static_cast<float>(*number);
     }
-    const auto scratch = Copy(factory, effect);
+    const auto scratch = CopyEffect(factory, effect);
     const auto choices = Choices(*scratch, parameter);
     for (std::size_t i = 0; i < choices.size(); ++i)
         if (SameChoice(choices[i], text, parameter.unit))
@@ -223,6 +222,7 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
     if (!choices.empty() && length == 0) throw UserError(asked + accepted);
     // The effects' parsers stop at the end of a number; what follows can only be the unit.
     const std::string_view rest = Trimmed(text.substr(length));
+    if (text.empty()) throw UserError(asked + accepted);
     if (length > 0 && !rest.empty() && !SameNoCase(rest, Trimmed(parameter.unit)))
         throw UserError(asked + accepted);
     float value = -1.0f;
@@ -234,6 +234,9 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
         throw UserError(asked + accepted);
     }
     if (!(value >= 0.0f && value <= 1.0f)) throw UserError(asked + accepted);
+    // Words count when the effect shows the same: a lenient parser must not make a value of anything.
+    if (length == 0 && !StartsWithNoCase(Trimmed(TextAt(*scratch, parameter, value)), text))
+        throw UserError(asked + accepted);
     if (const auto number = ToNumber(text.substr(0, length));
         number && BeyondRange(*scratch, parameter, *number, value))
         warning = effect.GetName() + ": " + parameter.label + "=" + std::string(text) +

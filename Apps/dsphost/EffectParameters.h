@@ -23,6 +23,8 @@ struct EffectParameter {
 
 // A new instance in the state it should start from: its default preset where it has presets.
 std::unique_ptr<Effect> MakeEffect(EffectFactory factory);
+// A second instance in the same state, to try things on.
+std::unique_ptr<Effect> CopyEffect(EffectFactory factory, Effect& effect);
 std::vector<EffectParameter> DescribeParameters(EffectFactory factory);
 
 // The text that `effect` shows once the parameter is set to the normalised value; it stays set.

@@ -20,10 +20,18 @@ namespace {
 
 volatile std::sig_atomic_t g_interrupted = 0;
 
-extern "C" void OnInterrupt(int signal) {
-    // A second one ends the program at once.
-    g_interrupted = 1;
-    std::signal(signal, SIG_DFL);
+extern "C" void OnInterrupt(int) { g_interrupted = 1; }
+
+// The first signal also ends a wait for input; a second one ends the program at once.
+void CatchInterrupt(int signal) {
+#if defined(_WIN32)
+    std::signal(signal, OnInterrupt);  // the system restores the default when it calls
+#else
+    struct sigaction action {};
+    action.sa_handler = OnInterrupt;
+    action.sa_flags = static_cast<int>(SA_RESETHAND);
+    sigaction(signal, &action, nullptr);
+#endif
 }
 
 std::FILE* OpenStream(const std::filesystem::path& path, File::Mode mode) {
@@ -100,7 +108,9 @@ std::int64_t File::Length() {
 }
 
 void File::ThrowIfFailed() const {
-    if (m_error != 0) throw IoError(m_name + ": " + std::strerror(m_error));
+    if (m_error == 0) return;
+    CheckInterrupted();
+    throw IoError(m_name + ": " + std::strerror(m_error));
 }
 
 void File::Close() {
@@ -130,8 +140,8 @@ void PrepareProcess() {
     std::signal(SIGPIPE, SIG_IGN);
     std::signal(SIGXFSZ, SIG_IGN);
 #endif
-    std::signal(SIGINT, OnInterrupt);
-    std::signal(SIGTERM, OnInterrupt);
+    CatchInterrupt(SIGINT);
+    CatchInterrupt(SIGTERM);
 }
 
 void CheckInterrupted() {

@@ -80,10 +80,4 @@ void OutputFile::Commit() {
     m_partial.clear();
 }
 
-void WriteWholeFile(const std::string& path, const OutputRules& rules, const void* bytes, std::size_t count) {
-    OutputFile file(path, rules);
-    file.Bytes().Write(bytes, count);
-    file.Commit();
-}
-
 }  // namespace dsphost

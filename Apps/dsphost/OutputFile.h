@@ -41,7 +41,4 @@ private:
     std::optional<File> m_file;
 };
 
-// Writes a whole small file under the same rules.
-void WriteWholeFile(const std::string& path, const OutputRules& rules, const void* bytes, std::size_t count);
-
 }  // namespace dsphost

@@ -71,14 +71,17 @@ private:
     std::int64_t OutputPosition() const { return m_position - m_chain.Latency(); }
     bool Finished() const {
         return OutputPosition() >= OutputFrames() ||
-               (!m_options.tail && m_gate.QuietFrames() >= Seconds(kTailQuietSeconds));
+               (m_quietEnough && m_gate.QuietFrames() >= *m_quietEnough);
     }
     int BlockFrames() const { return m_chain.FramesToCut(m_position, m_options.block); }
 
     // Silence follows the input's last frame.
     void ReadBlock(int frames) {
         const int got = m_inputFrames ? 0 : m_input.Read(m_samples.data(), frames);
-        if (got < frames && !m_inputFrames) m_inputFrames = m_position + got;
+        if (got < frames && !m_inputFrames) {
+            m_inputFrames = m_position + got;
+            if (!m_options.tail) m_quietEnough = Seconds(kTailQuietSeconds + m_chain.LongestGap());
+        }
         std::fill(m_samples.begin() + static_cast<std::ptrdiff_t>(got) * m_input.Channels(), m_samples.end(),
                   0.0);
     }
@@ -115,7 +118,8 @@ private:
     std::vector<float> m_narrow;
     TailGate m_gate;
     std::int64_t m_position = 0;  // frames given to the chain
-    std::optional<std::int64_t> m_inputFrames;
+    // Known at the input's end; the second for an automatic tail only.
+    std::optional<std::int64_t> m_inputFrames, m_quietEnough;
 };
 
 }  // namespace

@@ -17,9 +17,9 @@ struct RenderOptions {
     std::optional<double> tail = 0.0;  // seconds after the input's end; nothing: until it has died away
 };
 
-// An automatic tail has died away when the output stayed below -120 dBFS for this long: more than the longest
-// delay between two echoes, 10 s. The quiet end is not written.
-inline constexpr double kTailQuietSeconds = 12.0;
+// An automatic tail has died away when the output stayed below -120 dBFS for this long and for the longest
+// gap between two echoes of the chain. The quiet end is not written.
+inline constexpr double kTailQuietSeconds = 0.5;
 inline constexpr double kTailThreshold = 1e-6;
 inline constexpr double kLongestAutoTail = 60.0;
 

@@ -48,10 +48,15 @@ void CheckNumbers(const Arguments& arguments) {
                         std::to_string(arguments.effects.size()));
 }
 
-// One file per effect, as it was when rendering began.
-void SaveChunks(const Arguments& arguments, const std::vector<std::vector<std::uint8_t>>& states) {
-    for (std::size_t i = 0; i < states.size(); ++i)
-        WriteWholeFile(arguments.chunks[i], arguments.writing.rules, states[i].data(), states[i].size());
+// The state of each effect as rendering begins, in files that wait for their Commit.
+std::vector<std::unique_ptr<OutputFile>> PrepareChunks(const Arguments& arguments, Chain& chain) {
+    std::vector<std::unique_ptr<OutputFile>> files;
+    for (std::size_t i = 0; i < arguments.chunks.size(); ++i) {
+        files.push_back(std::make_unique<OutputFile>(arguments.chunks[i], arguments.writing.rules));
+        const auto state = chain.Element(i).State();
+        files.back()->Bytes().Write(state.data(), state.size());
+    }
+    return files;
 }
 
 void Run(Arguments arguments) {
@@ -67,8 +72,7 @@ void Run(Arguments arguments) {
     AudioReader input(arguments.input);
     RequireFormat(input, kMostChannels, "the effects process mono and stereo");
     if (!arguments.automation.empty()) LoadAutomation(arguments.automation, input.Rate(), chain);
-    std::vector<std::vector<std::uint8_t>> states;
-    for (std::size_t i = 0; i < arguments.chunks.size(); ++i) states.push_back(chain.Element(i).State());
+    const auto chunks = PrepareChunks(arguments, chain);
 
     const auto format = ChainFormat(input.Channels(), input.Rate(), options.precision);
     const auto interleavedOnly = chain.Prepare(options.block, format, options.planar);
@@ -85,7 +89,7 @@ void Run(Arguments arguments) {
         Render(input, chain, output, options, [&](std::int64_t frames) { progress.Update(frames); });
     }
     output.Commit();
-    SaveChunks(arguments, states);
+    for (const auto& chunk : chunks) chunk->Commit();
     WarnOfClipping(output);
 }
 

@@ -89,10 +89,11 @@ std::string Joined(std::span<const std::string> texts, std::string_view separato
 }
 
 std::size_t NumberLength(std::string_view text) {
-    const std::size_t sign = text.starts_with('+') ? 1 : 0;
+    const std::size_t sign = text.starts_with('+') || text.starts_with('-') ? 1 : 0;
+    // Not "inf" and "nan", which from_chars would take.
+    if (text.find_first_of("0123456789.", sign) != sign) return 0;
     double value;
-    const auto* begin = text.data() + sign;
-    const auto [end, error] = std::from_chars(begin, text.data() + text.size(), value);
+    const auto [end, error] = std::from_chars(text.data() + sign, text.data() + text.size(), value);
     return error == std::errc::invalid_argument ? 0 : static_cast<std::size_t>(end - text.data());
 }
 

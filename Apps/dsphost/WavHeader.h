@@ -10,7 +10,7 @@
 
 namespace dsphost {
 
-// WAV through a pipe: nothing can be looked up later, and sizes may be unknown until the end.
+// WAV headers read and written without looking ahead or back, so that they serve pipes too.
 
 struct WavStreamHeader {
     int channels = 0, rate = 0;
@@ -22,10 +22,19 @@ struct WavStreamHeader {
 // when the result is nothing: not a WAV stream, or a coding that does not stream.
 std::optional<WavStreamHeader> ReadWavStreamHeader(File& file, std::vector<unsigned char>& bytes);
 
-// The header of a plain WAV file of little-endian PCM or floats; without a size it says "until the end", as
+// A WAV file of little-endian PCM or floats.
+struct WavShape {
+    int channels = 0, rate = 0;
+    int subtype = 0;    // libsndfile's
+    bool room = false;  // keep room to make it an RF64 should it pass 4 GiB
+    bool rf64 = false;  // make it one in any case
+};
+
+// The header, of a length that depends on the shape alone. Without a size it says "until the end", as
 // streaming tools understand.
-std::vector<unsigned char> MakeWavHeader(int channels, int rate, int subtype,
-                                         std::optional<std::int64_t> sampleBytes);
+std::vector<unsigned char> MakeWavHeader(const WavShape& shape, std::optional<std::int64_t> sampleBytes);
+// The most that a WAV holds without being an RF64.
+inline constexpr std::int64_t kLargestWavBytes = 0xFFFFFFFFll - 256;
 
 // Bytes of one sample in a plain WAV file; 0 for other codings.
 int WavSampleBytes(int subtype);

@@ -1,8 +1,7 @@
-#include "WavStream.h"
+#include "WavHeader.h"
 
 #include <algorithm>
 #include <array>
-#include <limits>
 #include <string_view>
 
 namespace dsphost {
@@ -98,29 +97,40 @@ std::optional<WavStreamHeader> ReadWavStreamHeader(File& file, std::vector<unsig
     return {};
 }
 
-std::vector<unsigned char> MakeWavHeader(int channels, int rate, int subtype,
-                                         std::optional<std::int64_t> sampleBytes) {
-    constexpr std::int64_t kHeaderBytes = 44;
-    constexpr std::uint32_t kUntilTheEnd = 0xFFFFFFFF;
-    const auto& coding = *std::ranges::find(kCodings, subtype, &CodingRow::subtype);
-    const auto size = [&](std::int64_t extra) {
-        const bool known = sampleBytes && *sampleBytes + kHeaderBytes < kUntilTheEnd;
-        return known ? static_cast<std::uint32_t>(*sampleBytes + extra) : kUntilTheEnd;
+std::vector<unsigned char> MakeWavHeader(const WavShape& shape, std::optional<std::int64_t> sampleBytes) {
+    constexpr std::uint64_t kUntilTheEnd = 0xFFFFFFFF;
+    const auto& coding = *std::ranges::find(kCodings, shape.subtype, &CodingRow::subtype);
+    const auto frameBytes = static_cast<std::uint64_t>(shape.channels * coding.bits / 8);
+    const auto size = static_cast<std::uint64_t>(sampleBytes.value_or(0));
+    const bool rf64 = shape.rf64 || (shape.room && sampleBytes > kLargestWavBytes);
+    const bool integers = coding.tag == kPcm;
+    // What follows the first 8 bytes: "WAVE", the room, the format, the count of frames, the samples.
+    const std::uint64_t room = shape.room || shape.rf64 ? 36 : 0;
+    const std::uint64_t whole = 4 + room + (integers ? 24 : 38) + 8 + size + size % 2;
+    const auto shortSize = [&](std::uint64_t value) {
+        return sampleBytes && !rf64 ? std::min(value, kUntilTheEnd) : kUntilTheEnd;
     };
+
     std::vector<unsigned char> bytes;
     const auto text = [&](std::string_view four) {
         for (const char c : four) bytes.push_back(static_cast<unsigned char>(c));
     };
-    const auto number = [&](std::uint32_t value, int count) {
+    const auto number = [&](std::uint64_t value, int count) {
         for (int i = 0; i < count; ++i) bytes.push_back(static_cast<unsigned char>(value >> (8 * i)));
     };
-    const auto frameBytes = static_cast<std::uint32_t>(channels * coding.bits / 8);
-    text("RIFF"), number(size(kHeaderBytes - 8), 4), text("WAVE");
-    text("fmt "), number(16, 4);
-    number(static_cast<std::uint32_t>(coding.tag), 2), number(static_cast<std::uint32_t>(channels), 2);
-    number(static_cast<std::uint32_t>(rate), 4), number(static_cast<std::uint32_t>(rate) * frameBytes, 4);
-    number(frameBytes, 2), number(static_cast<std::uint32_t>(coding.bits), 2);
-    text("data"), number(size(0), 4);
+    text(rf64 ? "RF64" : "RIFF"), number(shortSize(whole), 4), text("WAVE");
+    if (room > 0) {
+        text(rf64 ? "ds64" : "JUNK"), number(28, 4);
+        for (const std::uint64_t value : {whole, size, size / frameBytes}) number(rf64 ? value : 0, 8);
+        number(0, 4);
+    }
+    text("fmt "), number(integers ? 16 : 18, 4);
+    number(static_cast<std::uint64_t>(coding.tag), 2), number(static_cast<std::uint64_t>(shape.channels), 2);
+    number(static_cast<std::uint64_t>(shape.rate), 4);
+    number(static_cast<std::uint64_t>(shape.rate) * frameBytes, 4);
+    number(frameBytes, 2), number(static_cast<std::uint64_t>(coding.bits), 2);
+    if (!integers) number(0, 2), text("fact"), number(4, 4), number(shortSize(size / frameBytes), 4);
+    text("data"), number(shortSize(size), 4);
     return bytes;
 }
 

@@ -1,0 +1,110 @@
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "Apps/Program.h"
+
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr bool kSanitized = true;
+#else
+constexpr bool kSanitized = false;
+#endif
+
+#if !defined(_WIN32)
+#include <fcntl.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+#endif
+
+namespace AppTest {
+namespace {
+
+class Pipes : public Program {};
+
+constexpr int kPcm16 = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
+
+// Every kind of file may come through standard input; what goes out is WAV with the same samples.
+TEST_F(Pipes, ReadsAnythingFromStandardInput) {
+    for (const int format : {kPcm16, SF_FORMAT_WAV | SF_FORMAT_PCM_24, SF_FORMAT_WAV | SF_FORMAT_FLOAT,
+                             SF_FORMAT_WAV | SF_FORMAT_DOUBLE, SF_FORMAT_WAVEX | SF_FORMAT_PCM_32,
+                             SF_FORMAT_RF64 | SF_FORMAT_PCM_16, SF_FORMAT_W64 | SF_FORMAT_PCM_16,
+                             SF_FORMAT_FLAC | SF_FORMAT_PCM_16, SF_FORMAT_AIFF | SF_FORMAT_PCM_24,
+                             SF_FORMAT_CAF | SF_FORMAT_PCM_16}) {
+        SCOPED_TRACE(format);
+        Save("in", NoiseSound(3000, 1, format));
+        const auto result = Run({"render", "-", "-", "--fx", "Gain"}, Bytes("in"));
+        ASSERT_EQ(result.status, 0) << result.err;
+        SaveBytes("out", result.out);
+        EXPECT_EQ(Load("out").samples, Load("in").samples);
+    }
+}
+
+// A WAV whose writer did not know its length: 0, the largest size or half of it stand there.
+TEST_F(Pipes, ReadsAStreamToItsEnd) {
+    Save("in.wav", NoiseSound(3000));
+    for (const std::string& size :
+         {std::string(4, '\0'), std::string(4, '\xFF'), std::string("\x00\xF0\xFF\x7F", 4)}) {
+        std::string stream = Bytes("in.wav");
+        stream.replace(40, 4, size);
+        const auto result = Run({"render", "-", "out.wav", "-y"}, stream);
+        ASSERT_EQ(result.status, 0) << result.err;
+        EXPECT_EQ(Load("out.wav").samples, Load("in.wav").samples);
+    }
+    // A stated size ends the samples; what follows them is not sound.
+    const auto result = Run({"render", "-", "out.wav", "-y"}, Bytes("in.wav") + "LIST....and so on");
+    EXPECT_EQ(result.status, 0);
+    EXPECT_EQ(Load("out.wav").samples, Load("in.wav").samples);
+}
+
+TEST_F(Pipes, RefusesStreamsThatAreNoAudio) {
+    Save("in.wav", NoiseSound(100));
+    const std::string wav = Bytes("in.wav");
+    ExpectRefused(Run({"render", "-", "out.wav"}, ""), 2, {"standard input", "empty"});
+    ExpectRefused(Run({"render", "-", "out.wav"}, wav.substr(0, 44)), 2, {"standard input", "no samples"});
+    for (const std::string& stream :
+         {wav.substr(0, 11), wav.substr(0, 30), std::string("RIFF....WAVEdata....")})
+        ExpectRefused(Run({"render", "-", "out.wav"}, stream), 2, {"standard input", "not an audio file"});
+}
+
+#if !defined(_WIN32)
+TEST_F(Pipes, WritesSizesThatSayUntilTheEnd) {
+    Save("in.wav", NoiseSound(3000));
+    ASSERT_EQ(Shell("DSPHOST render in.wav - | cat > stream; DSPHOST render - again.wav < stream").status, 0);
+    EXPECT_EQ(Bytes("stream").substr(40, 4), "\xFF\xFF\xFF\xFF");
+    EXPECT_EQ(Bytes("stream").substr(4, 4), "\xFF\xFF\xFF\xFF");
+    EXPECT_EQ(Load("again.wav").samples, Load("in.wav").samples);
+    // Standard output that is a file can be completed.
+    ASSERT_EQ(Shell("DSPHOST render in.wav - > file.wav").status, 0);
+    EXPECT_EQ(Bytes("file.wav"), Bytes("in.wav"));
+}
+
+TEST_F(Pipes, ReportsAClosedPipe) {
+    Save("in.wav", NoiseSound(200000));
+    const auto result = Shell("{ DSPHOST render in.wav -; echo $? >&2; } | head -c 1000 > start");
+    EXPECT_EQ(result.err, "dsphost: standard output: Broken pipe\n1\n");
+}
+
+// Ten minutes of stereo at 96 kHz, made up while it is read: memory must not grow with length.
+TEST_F(Pipes, StreamsLongFilesInLittleMemory) {
+    if (kSanitized) GTEST_SKIP() << "sanitizers need memory of their own";
+    Sound head = NoiseSound(0);
+    head.rate = 96000;
+    Save("head.wav", head);
+    std::string header = Bytes("head.wav");
+    header.replace(40, 4, "\xFF\xFF\xFF\xFF");
+    SaveBytes("head.wav", header);
+    const std::size_t bytes = std::size_t{10 * 60} * 96000 * 4;
+    const auto result = Shell("{ cat head.wav; head -c " + std::to_string(bytes) +
+                              " /dev/zero; } | DSPHOST render - - --fx Gain --fx 'Gain: Pan=1' | wc -c");
+    ASSERT_EQ(result.status, 0);
+    EXPECT_EQ(std::stoull(result.out), bytes + 44);
+    rusage usage{};
+    getrusage(RUSAGE_CHILDREN, &usage);
+    EXPECT_LT(usage.ru_maxrss, 64 * 1024) << "KiB, the largest of all programs that the tests ran";
+}
+#endif
+
+}  // namespace
+}  // namespace AppTest

@@ -1,0 +1,122 @@
+#include "Apps/Program.h"
+
+#include <algorithm>
+#include <atomic>
+#include <cmath>
+#include <cstdlib>
+#include <fstream>
+#include <iterator>
+#include <random>
+
+#include "Support/Signals.h"
+
+#if !defined(_WIN32)
+#include <sys/wait.h>
+#endif
+
+namespace AppTest {
+namespace fs = std::filesystem;
+
+void Save(const std::string& path, const Sound& sound) {
+    SF_INFO info{};
+    info.channels = sound.channels;
+    info.samplerate = sound.rate;
+    info.format = sound.format;
+    SNDFILE* const file = sf_open(path.c_str(), SFM_WRITE, &info);
+    ASSERT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
+    // As 32-bit integers: scaled by libsndfile a full scale of 1 would be one step too small.
+    std::vector<int> integers;
+    for (const double sample : sound.samples)
+        integers.push_back(static_cast<int>(std::lrint(sample * 0x1p31)));
+    const int subtype = sound.format & SF_FORMAT_SUBMASK;
+    const auto frames = static_cast<sf_count_t>(sound.Frames());
+    if (subtype == SF_FORMAT_FLOAT || subtype == SF_FORMAT_DOUBLE || subtype == SF_FORMAT_VORBIS)
+        EXPECT_EQ(sf_writef_double(file, sound.samples.data(), frames), frames);
+    else
+        EXPECT_EQ(sf_writef_int(file, integers.data(), frames), frames);
+    sf_close(file);
+}
+
+Sound Load(const std::string& path) {
+    SF_INFO info{};
+    SNDFILE* const file = sf_open(path.c_str(), SFM_READ, &info);
+    EXPECT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
+    Sound sound{1, 0, 0, {}};
+    if (!file) return sound;
+    sound = {info.channels, info.samplerate, info.format, {}};
+    sound.samples.resize(static_cast<std::size_t>(info.frames * info.channels));
+    EXPECT_EQ(sf_readf_double(file, sound.samples.data(), info.frames), info.frames);
+    sf_close(file);
+    return sound;
+}
+
+Sound NoiseSound(std::size_t frames, int channels, int format) {
+    Sound sound{channels, 48000, format,
+                TestSupport::Noise<double>(frames * static_cast<std::size_t>(channels), 0.5)};
+    for (double& sample : sound.samples) sample = std::nearbyint(sample * 0x1p15) * 0x1p-15;
+    return sound;
+}
+
+std::string Bytes(const std::string& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+void SaveBytes(const std::string& path, const std::string& bytes) {
+    std::ofstream(path, std::ios::binary) << bytes;
+}
+
+std::vector<std::string> Files() {
+    std::vector<std::string> names;
+    for (const auto& entry : fs::directory_iterator(".")) names.push_back(entry.path().filename().string());
+    std::ranges::sort(names);
+    return names;
+}
+
+Program::Program() : m_before(fs::current_path()) {
+    m_directory = fs::temp_directory_path() / ("dsphost-test-" + std::to_string(std::random_device()()));
+    fs::create_directory(m_directory);
+    fs::current_path(m_directory);
+}
+
+Program::~Program() {
+    fs::current_path(m_before);
+    fs::remove_all(m_directory);
+}
+
+Result Program::Shell(std::string line) {
+    const char* const other = std::getenv("DSPHOST");
+    const auto quoted = [](const std::string& text) { return std::string("\"").append(text).append("\""); };
+    const std::string program = quoted(other ? other : DSPHOST_PROGRAM);
+    for (std::size_t at; (at = line.find("DSPHOST")) != line.npos;) line.replace(at, 7, program);
+    const std::string out = m_directory.string() + "-out", err = m_directory.string() + "-err";
+    m_files = Files();
+    int status = std::system(("( " + line + " ) > " + quoted(out) + " 2> " + quoted(err)).c_str());
+#if !defined(_WIN32)
+    status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+#endif
+    Result result{status, Bytes(out), Bytes(err)};
+    fs::remove(out);
+    fs::remove(err);
+    return result;
+}
+
+Result Program::Run(const std::vector<std::string>& arguments, const std::string& input) {
+    std::string line = "DSPHOST";
+    for (const auto& argument : arguments) line += " \"" + argument + "\"";
+    const std::string place = m_directory.string() + "-in";
+    SaveBytes(place, input);
+    const Result result = Shell(line + " < \"" + place + "\"");
+    fs::remove(place);
+    return result;
+}
+
+void Program::ExpectRefused(const Result& result, int status, const std::vector<std::string>& words) {
+    EXPECT_EQ(result.status, status) << result.err;
+    EXPECT_EQ(std::ranges::count(result.err, '\n'), 1) << result.err;
+    for (const auto& word : words)
+        EXPECT_NE(result.err.find(word), std::string::npos) << word << " in " << result.err;
+    EXPECT_EQ(Files(), m_files);
+}
+
+}  // namespace AppTest

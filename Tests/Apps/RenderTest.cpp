@@ -1,0 +1,125 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "Apps/Program.h"
+#include "AudioReader.h"
+#include "AudioWriter.h"
+#include "Chain.h"
+#include "Render.h"
+
+// Rendering with elements made for the purpose: what happens to time, whatever the effects are.
+namespace AppTest {
+namespace {
+
+using dsphost::AutomationPoint;
+
+// Delays by `latency` frames and announces it; adds an echo at half the level `echo` frames later; multiplies
+// by the automated gain at the frame that the points name.
+class Model : public dsphost::ChainElement {
+public:
+    Model(int latency, std::size_t echo, double level = 0.5)
+        : m_latency(latency), m_level(level), m_echo(echo), m_line(static_cast<std::size_t>(latency)) {}
+
+    std::string Name() const override { return "Model"; }
+    bool Prepare(int, const tWAVEFORMATEX& format, bool) override {
+        EXPECT_EQ(format.nChannels, 1);
+        return false;
+    }
+    int Latency() override { return m_latency; }
+    double LongestGap() override { return static_cast<double>(m_echo) / kRate; }
+    std::vector<int> AutomationLanes(std::string_view) override { return {0}; }
+    void Automate(int, std::span<const AutomationPoint> points) override {
+        m_points.assign(points.begin(), points.end());
+    }
+    // As an effect plays its envelope: what is due at the start holds for the whole block.
+    void Process(double* samples, int frames, std::int64_t time) override {
+        double gain = 1.0;
+        for (const auto& point : m_points)
+            if (point.frame <= time) gain = point.value;
+        for (int i = 0; i < frames; ++i) {
+            m_line.push_back(samples[i] * gain);
+            const std::size_t at = m_line.size() - 1 - static_cast<std::size_t>(m_latency);
+            samples[i] = m_line[at] + (m_echo > 0 && at >= m_echo ? m_level * m_line[at - m_echo] : 0.0);
+        }
+    }
+
+    static constexpr int kRate = 48000;
+
+private:
+    int m_latency;
+    double m_level;
+    std::size_t m_echo;
+    std::vector<double> m_line;
+    std::vector<AutomationPoint> m_points;
+};
+
+class Rendering : public Program {
+protected:
+    template <typename... Elements>
+    static std::vector<std::unique_ptr<dsphost::ChainElement>> Models(Elements... elements) {
+        std::vector<std::unique_ptr<dsphost::ChainElement>> all;
+        (all.push_back(std::make_unique<Model>(std::move(elements))), ...);
+        return all;
+    }
+
+    std::vector<double> Render(const std::vector<double>& input, dsphost::Chain& chain,
+                               const dsphost::RenderOptions& options) {
+        Save("in.wav", {1, Model::kRate, SF_FORMAT_WAV | SF_FORMAT_DOUBLE, input});
+        dsphost::AudioReader reader("in.wav");
+        chain.Prepare(options.block, dsphost::ChainFormat(1, Model::kRate, options.precision),
+                      options.planar);
+        dsphost::AudioWriter writer("out.wav", {true, {}}, {1, Model::kRate, {}, reader.Format(), {}});
+        dsphost::Render(reader, chain, writer, options, [](std::int64_t) {});
+        writer.Commit();
+        return Load("out.wav").samples;
+    }
+};
+
+TEST_F(Rendering, LinesUpWithTheInputWhateverTheLatency) {
+    const auto input = NoiseSound(1000, 1).samples;
+    for (const int block : {1, 7, 100, 4096}) {
+        dsphost::Chain chain(Models(Model(100, 0), Model(1, 0), Model(2000, 0)));
+        EXPECT_EQ(Render(input, chain, {.block = block}), input) << block;
+        EXPECT_EQ(chain.Latency(), 2101);
+    }
+}
+
+// Points are met to the frame in both elements, though the second hears everything 300 frames late.
+TEST_F(Rendering, AutomatesToTheFrame) {
+    const std::vector<double> input(1000, 1.0);
+    for (const int block : {1, 64, 999, 4096}) {
+        dsphost::Chain chain(Models(Model(300, 0), Model(50, 0)));
+        chain.Automate(0, 0, std::vector<AutomationPoint>{{0, 1.0f}, {123, 0.5f}, {700, 0.25f}});
+        chain.Automate(1, 0, std::vector<AutomationPoint>{{0, 1.0f}, {456, 0.125f}});
+        const auto output = Render(input, chain, {.block = block});
+        ASSERT_EQ(output.size(), input.size());
+        for (std::size_t i = 0; i < output.size(); ++i)
+            ASSERT_EQ(output[i], (i < 123 ? 1.0 : i < 700 ? 0.5 : 0.25) * (i < 456 ? 1.0 : 0.125)) << i;
+    }
+}
+
+TEST_F(Rendering, CutsTheTailWhereToldOrWhereItHasDied) {
+    std::vector<double> input(1000);
+    input[990] = 1.0;
+    const auto frames = [&](std::size_t echo, double level, std::optional<double> tail) {
+        dsphost::Chain chain(Models(Model(77, echo, level)));
+        return Render(input, chain, {.tail = tail}).size();
+    };
+    EXPECT_EQ(frames(48000, 0.5, 0.0), 1000u);
+    EXPECT_EQ(frames(48000, 0.5, 0.25), 13000u);
+    // The echo comes long after half a second of silence, and nothing is written behind it.
+    EXPECT_EQ(frames(200000, 0.5, {}), 990u + 200000 + 1);
+    EXPECT_EQ(frames(200000, 1.1e-6, {}), 990u + 200000 + 1);
+    EXPECT_EQ(frames(200000, 0.9e-6, {}), 1000u);
+    // Nothing rings for longer than a minute.
+    EXPECT_EQ(frames(60 * 48000 + 11, 0.5, {}), 1000u);
+    EXPECT_EQ(frames(60 * 48000 + 9, 0.5, {}), 60u * 48000 + 1000);
+}
+
+}  // namespace
+}  // namespace AppTest
