@@ -4,6 +4,7 @@
 #include <iterator>
 
 #include "DSP/Effects/Autovol.h"
+#include "DSP/Effects/Chorus.h"
 #include "DSP/Effects/GainEfx.h"
 #include "EffectElement.h"
 
@@ -20,6 +21,7 @@ std::unique_ptr<Effect> Make() {
 constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::GainEfx::GainEfx>,
     Make<Corvo::DSP::Autovol>,
+    Make<Corvo::DSP::Chorus>,
 };
 // clang-format on
 

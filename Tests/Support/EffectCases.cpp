@@ -5,6 +5,7 @@
 #include <stdexcept>
 
 #include "DSP/Effects/Autovol.h"
+#include "DSP/Effects/Chorus.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 
@@ -30,6 +31,11 @@ constexpr std::array kEffects{
                .cuts = Cuts::PhasePerBlock,
                .otherBuild = OtherBuild::Relative,
                .otherBuildReason = "the oscillator's sine and the gain's power"},
+    EffectCase{.name = "Chorus",
+               .make = Make<Chorus>,
+               .cuts = Cuts::PhasePerBlock,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "the oscillator's sine and the levels' powers"},
     EffectCase{.name = "Echo",
                .make = Make<Echo>,
                .otherBuild = OtherBuild::Relative,
