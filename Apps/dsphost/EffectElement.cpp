@@ -157,6 +157,7 @@ double EffectElement::LongestGap() {
     std::vector<double> silence(static_cast<std::size_t>(kFrames) * format.nChannels);
     ProcessFlags flags;
     probe->InitProcessing(kFrames, &format);
+    probe->RequestTailRestart();
     probe->StartTail(kLongest);
     std::int64_t produced = 0;
     do {

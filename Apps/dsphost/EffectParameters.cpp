@@ -126,6 +126,17 @@ std::string RangeText(Effect& scratch, const EffectParameter& parameter) {
     return std::string(Trimmed(low)) + " to " + std::string(Trimmed(high));
 }
 
+// Parsers stop where they understand no more: words, and what follows a number, count when the effect shows
+// them too. "-inf" for "-Inf. dB", "500 ms" for "499 ms", "1/4" for "1/4 (500 ms)".
+bool SaysTheSame(std::string_view shown, std::string_view text, std::string_view unit) {
+    shown = Trimmed(shown);
+    const std::size_t length = NumberLength(text);
+    const std::string_view rest = Trimmed(text.substr(length));
+    return StartsWithNoCase(shown, text) ||
+           (length > 0 && (rest.empty() || SameNoCase(rest, Trimmed(unit)) ||
+                           SameNoCase(rest, Trimmed(shown.substr(NumberLength(shown))))));
+}
+
 bool BeyondRange(Effect& scratch, const EffectParameter& parameter, double number, float normalised) {
     if (normalised > 0.0f && normalised < 1.0f) return false;
     const std::string text = TextAt(scratch, parameter, normalised);
@@ -219,12 +230,7 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
                                                   : "accepted: " + Joined(choices, ", ")) +
                                  ", or a normalised value such as n:0.5";
     const std::size_t length = NumberLength(text);
-    if (!choices.empty() && length == 0) throw UserError(asked + accepted);
-    // The effects' parsers stop at the end of a number; what follows can only be the unit.
-    const std::string_view rest = Trimmed(text.substr(length));
-    if (text.empty()) throw UserError(asked + accepted);
-    if (length > 0 && !rest.empty() && !SameNoCase(rest, Trimmed(parameter.unit)))
-        throw UserError(asked + accepted);
+    if (text.empty() || (!choices.empty() && length == 0)) throw UserError(asked + accepted);
     float value = -1.0f;
     try {
         value = effect.GetParamValueNormalizedFromText(parameter.index, std::string(text));
@@ -233,9 +239,8 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
     } catch (const std::out_of_range&) {
         throw UserError(asked + accepted);
     }
-    if (!(value >= 0.0f && value <= 1.0f)) throw UserError(asked + accepted);
-    // Words count when the effect shows the same: a lenient parser must not make a value of anything.
-    if (length == 0 && !StartsWithNoCase(Trimmed(TextAt(*scratch, parameter, value)), text))
+    if (!(value >= 0.0f && value <= 1.0f) ||
+        !SaysTheSame(TextAt(*scratch, parameter, value), text, parameter.unit))
         throw UserError(asked + accepted);
     if (const auto number = ToNumber(text.substr(0, length));
         number && BeyondRange(*scratch, parameter, *number, value))

@@ -5,6 +5,7 @@
 
 #include "DSP/Effects/Autovol.h"
 #include "DSP/Effects/Chorus.h"
+#include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 #include "EffectElement.h"
 
@@ -22,6 +23,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::GainEfx::GainEfx>,
     Make<Corvo::DSP::Autovol>,
     Make<Corvo::DSP::Chorus>,
+    Make<Corvo::DSP::Echo>,
 };
 // clang-format on
 

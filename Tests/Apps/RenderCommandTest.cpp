@@ -108,6 +108,42 @@ TEST_F(RenderCommand, AddsATailOfSilenceWhenAskedAndTrimsAnAutomaticOne) {
     EXPECT_EQ(Load("b.wav").Frames(), 1000u);
 }
 
+// Lists by their texts, values as the effect shows them, and a tail that outlives the silence before an echo.
+TEST_F(RenderCommand, LetsALateEchoRingOut) {
+    Sound in{1, 48000, SF_FORMAT_WAV | SF_FORMAT_DOUBLE, std::vector<double>(1000)};
+    in.samples[999] = 0.5;
+    Save("in.wav", in);
+    const std::string fx =
+        "Echo: preset=single, Depth mode=time (linear), Depth=5000 ms, Delay=0, Mix=100 %, Out gain=0 dB";
+    const auto result = Run({"render", "in.wav", "out.wav", "--tail", "auto", "--fx", fx});
+    ASSERT_EQ(result.status, 0) << result.err;
+    const auto out = Load("out.wav").samples;
+    EXPECT_NEAR(static_cast<double>(out.size()), 1000 + 5 * 48000, 1);
+    EXPECT_NEAR(out.back(), 0.25, 1e-6);
+    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: Depth=5 apples"}), 2,
+                  {"5 apples", "4999 ms"});
+    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: Depth mode=slow"}), 2,
+                  {"slow", "Time (log)"});
+    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: preset=e, preset=s"}), 2, {"one preset"});
+    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Tremolo: preset=f00"}), 2,
+                  {"f00", "Fast Tremolo"});
+}
+
+// A tremolo that stands still multiplies by 1 / (1 + depth); every step comes on its frame.
+TEST_F(RenderCommand, PlaysAutomation) {
+    Sound in{1, 48000, SF_FORMAT_WAV | SF_FORMAT_DOUBLE, std::vector<double>(1000, 0.5)};
+    Save("in.wav", in);
+    SaveBytes("moves.json", R"([{"parameter": "Depth", "points": [[0, 0], [0.01, 1], [0.015, 0.25]]}])");
+    for (const std::string block : {"1", "64", "4096"}) {
+        const auto result = Run({"render", "in.wav", "out.wav", "-y", "--fx", "Tremolo: Frequency=0",
+                                 "--automation", "moves.json", "--block", block});
+        ASSERT_EQ(result.status, 0) << result.err;
+        const auto out = Load("out.wav").samples;
+        for (std::size_t i = 0; i < out.size(); ++i)
+            ASSERT_DOUBLE_EQ(out[i], 0.5 / (i < 480 ? 1.0 : i < 720 ? 2.0 : 1.25)) << i;
+    }
+}
+
 TEST_F(RenderCommand, WarnsOfSettingsBeyondTheRange) {
     Save("in.wav", NoiseSound(10, 2, SF_FORMAT_WAV | SF_FORMAT_FLOAT));
     const auto result = Run({"render", "in.wav", "out.wav", "--fx", "Gain: Gain=40 dB"});
