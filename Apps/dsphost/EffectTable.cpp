@@ -7,6 +7,7 @@
 #include "DSP/Effects/Chorus.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
+#include "DSP/Effects/TubeDistorsion.h"
 #include "EffectElement.h"
 
 namespace dsphost {
@@ -24,6 +25,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::Autovol>,
     Make<Corvo::DSP::Chorus>,
     Make<Corvo::DSP::Echo>,
+    Make<Corvo::DSP::TubeDistorsion>,
 };
 // clang-format on
 

@@ -8,6 +8,7 @@
 #include "DSP/Effects/Chorus.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
+#include "DSP/Effects/TubeDistorsion.h"
 
 namespace TestSupport {
 namespace {
@@ -42,6 +43,10 @@ constexpr std::array kEffects{
                .otherBuildReason = "powers of the gains",
                .mayGrow = true,
                .linkedParameters = true},
+    EffectCase{.name = "Tube distortion",
+               .make = Make<TubeDistorsion>,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "tangents and sines of the filters and of the shape"},
 };
 
 }  // namespace

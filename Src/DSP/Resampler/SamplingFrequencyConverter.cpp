@@ -224,20 +224,40 @@ int SamplingFrequencyConverter::InitConversionByFactors(int upFactor, int downFa
     for (int i = 0; i <= kOrder; binomial = binomial * (kOrder - i) / (i + 1), ++i)
         lowPass.feedForward[i] = binomial;
     std::ranges::copy(pairs->feedback, lowPass.feedback);
-    // The other channels keep what they hold, as hosts expect.
+    ClearFirstChannels();
+    return 1;
+}
+
+// The other channels keep what they hold, as hosts expect.
+void SamplingFrequencyConverter::ClearFirstChannels() {
     for (int channel = 0; channel < 2; ++channel) {
         std::ranges::fill(inputHistory[channel], 0.0);
         std::ranges::fill(outputHistory[channel], 0.0);
         for (auto& value : pairStates[channel / kChannelsPerGroup]) value[channel % kChannelsPerGroup] = 0.0;
     }
-    return 1;
+}
+
+void SamplingFrequencyConverter::StartStream() {
+    ringLength = 10 * std::max(up, down);
+    writePosition = readPosition = writeWraps = readWraps = 0;
 }
 
 void SamplingFrequencyConverter::Init(int channels) {
-    ringLength = 10 * std::max(up, down);
-    writePosition = readPosition = writeWraps = readWraps = 0;
+    StartStream();
+    ringCapacity = ringLength;
     for (int channel = 0; channel < std::min(channels, kMaxChannels); ++channel)
         rings[channel] = new (std::nothrow) double[static_cast<std::size_t>(ringLength)]();
+}
+
+bool SamplingFrequencyConverter::Restart(const SamplingFrequencyConverter& design) {
+    if (!design.pairs || 10 * std::max(design.up, design.down) > ringCapacity) return false;
+    up = design.up;
+    down = design.down;
+    lowPass = design.lowPass;
+    pairs = design.pairs;
+    ClearFirstChannels();
+    StartStream();
+    return true;
 }
 
 void SamplingFrequencyConverter::FreeRings() {

@@ -46,6 +46,9 @@ struct DSP_API SamplingFrequencyConverter {
     int InitConversionByFactors(int upFactor, int downFactor);
     // Makes rings for 0..48 channels and starts the stream. Rings of an earlier Init are not freed.
     void Init(int channels);
+    // Starts afresh like `design`, which is initialised, in the rings this object has: neither allocates
+    // nor frees as long as whoever set up `design` keeps it. False, nothing done, if the rings are too short.
+    bool Restart(const SamplingFrequencyConverter& design);
     // Frees the rings of this object and of all its copies; blocks then return 0 until the next Init.
     void FreeRings();
 
@@ -90,4 +93,10 @@ struct DSP_API SamplingFrequencyConverter {
     static constexpr int kChannelsPerGroup = 2;
     double pairStates[kMaxChannels / kChannelsPerGroup][kOrder][kChannelsPerGroup]{};
     std::shared_ptr<const PolePairLowPass> pairs;  // never changes once made; shared by copies
+
+    int ringCapacity = 0;  // what Init allocated
+
+private:
+    void StartStream();
+    void ClearFirstChannels();
 };
