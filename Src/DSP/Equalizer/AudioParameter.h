@@ -18,11 +18,11 @@ struct AudioParameterProgressAlternate {
     // library exponential, comes out the same on every machine and works in the lanes of a register.
     template <typename Value>
     static Value Rate(const Value& rel) {
-        Value root = Value(-2.1804304592120065e-08) * rel + Value(1.4500166741204932e-06);
-        root = root * rel + Value(-7.428997425635657e-05);
-        root = root * rel + Value(0.0028527541301630716);
-        root = root * rel + Value(-0.07303050872274937);
-        root = root * rel + Value(0.9347905117795469);
+        const Value square = rel * rel;
+        const Value high = Value(-2.1804304592120065e-08) * rel + Value(1.4500166741204932e-06);
+        const Value middle = Value(-7.428997425635657e-05) * rel + Value(0.0028527541301630716);
+        const Value low = Value(-0.07303050872274937) * rel + Value(0.9347905117795469);
+        Value root = (high * square + middle) * square + low;
         for (int i = 0; i < 6; ++i) root = root * root;
         return root;
     }

@@ -19,6 +19,11 @@ struct EqBand {
         for (auto* c : {&_eq_coeffs.a1, &_eq_coeffs.a2, &_eq_coeffs.b0, &_eq_coeffs.b1, &_eq_coeffs.b2})
             call(*c);
     }
+    // How many of its coefficients are on the move.
+    int Moving() const {
+        const auto& c = _eq_coeffs;
+        return c.a1.moving + c.a2.moving + c.b0.moving + c.b1.moving + c.b2.moving;
+    }
 };
 
 // What ParEQ keeps per channel.

@@ -50,27 +50,9 @@ void CookChannel(EqChannel& channel, const builtin_effects_data& data, int sampl
     }
 }
 
-// The samples of one channel in an interleaved block.
 template <typename Sample>
-struct ChannelSamples {
-    Sample* first;
-    std::ptrdiff_t stride;
-    int count;
-
-    ChannelSamples(Sample* buf, int frames, int step, int channel) : first(buf), stride(step), count(0) {
-        if (frames <= 0 || step <= 0) return;
-        const int offset = step < 2 ? 0 : channel;
-        const std::int64_t end = static_cast<std::int64_t>(frames) * step;
-        if (offset >= end) return;
-        first += offset;
-        count = static_cast<int>((end - offset + step - 1) / step);
-    }
-};
-
-template <typename Sample>
-void Invert(const ChannelSamples<Sample>& samples) {
-    for (int i = 0; i < samples.count; ++i)
-        samples.first[i * samples.stride] = -samples.first[i * samples.stride];
+void Invert(Sample* samples, std::ptrdiff_t stride, int frames) {
+    for (int i = 0; i < frames; ++i) samples[i * stride] = -samples[i * stride];
 }
 
 }  // namespace
@@ -105,23 +87,34 @@ EqChannel* ParEQ::Channel(int channel) const {
 template <typename Sample>
 void ParEQ::Process(Sample* buf, int frames, int numChannels, bool feedSpectrum,
                     builtin_effects_data* records) {
-    for (int channel = 0; channel < numChannels; ++channel)
-        ProcessSingle(buf, frames, numChannels, feedSpectrum, channel, records);
+    if (!records || frames <= 0) return;
+    const DenormalGuard guard;
+    for (int channel = 0; channel < numChannels; ++channel) {
+        EqChannel* const pair[] = {Channel(channel), Channel(channel + 1)};
+        const int numBands = BandsInUse(records[0]);
+        if (channel + 1 == numChannels || !pair[1] ||
+            !MayRunTogether(*pair[0], *pair[1], numBands, *m_glide_counter)) {
+            ProcessSingle(buf, frames, numChannels, feedSpectrum, channel, records);
+            continue;
+        }
+        for (const int c : {channel, channel + 1})
+            if (records[c].GetPhaseShift()) Invert(buf + c, numChannels, frames);
+        RunCascade(buf + channel, numChannels, frames, pair, numBands, *m_glide_counter);
+        ++channel;
+    }
 }
 
 template <typename Sample>
 void ParEQ::ProcessSingle(Sample* buf, int frames, int stride, bool, int channel,
                           builtin_effects_data* records) {
     EqChannel* const state = Channel(channel);
-    if (!state || !records) return;
+    if (!state || !records || frames <= 0 || stride <= 0) return;
     const DenormalGuard guard;
-    const ChannelSamples<Sample> samples(buf, frames, stride, channel);
-    if (records[channel].GetPhaseShift()) Invert(samples);
-    const bool gliding = *m_glide_counter != 0;
-    for (int i = 0; i < BandsInUse(records[0]); ++i) {
-        auto& band = state->bands[static_cast<std::size_t>(i)];
-        if (band.active) RunBand(band, samples.first, samples.stride, samples.count, gliding);
-    }
+    const std::int64_t first = stride < 2 ? 0 : channel, end = static_cast<std::int64_t>(frames) * stride;
+    const int count = first < end ? static_cast<int>((end - first + stride - 1) / stride) : 0;
+    Sample* const samples = buf + first;
+    if (records[channel].GetPhaseShift()) Invert(samples, stride, count);
+    RunCascade(samples, stride, count, {&state, 1}, BandsInUse(records[0]), *m_glide_counter);
 }
 
 template DSP_API void ParEQ::Process(float*, int, int, bool, builtin_effects_data*);

@@ -1,0 +1,72 @@
+#include "DSP/Equalizer/EqCascade.h"
+
+#include <algorithm>
+
+namespace Corvo::DSP {
+namespace {
+
+#if defined(DSP_WIDE_KERNELS)
+const bool kWide = __builtin_cpu_supports("avx2");
+#endif
+
+template <typename Sample>
+const EqKernels<Sample>& Kernels() {
+#if defined(DSP_WIDE_KERNELS)
+    if (kWide) return EqAvx2Kernels<Sample>();
+#endif
+    return EqBaselineKernels<Sample>();
+}
+
+template <typename Sample>
+bool Moves(const EqCascade<Sample>& cascade, int band) {
+    const auto at = static_cast<std::size_t>(band);
+    return cascade.bands[0][at]->Moving() || (cascade.channels == 2 && cascade.bands[1][at]->Moving());
+}
+
+}  // namespace
+
+bool MayRunTogether(const EqChannel& first, const EqChannel& second, int numBands, std::int32_t counter) {
+    int movingFirst = 0, movingSecond = 0;
+    for (std::size_t i = 0; i < static_cast<std::size_t>(numBands); ++i) {
+        if (first.bands[i].active != second.bands[i].active) return false;
+        if (counter == 0 || !first.bands[i].active) continue;
+        movingFirst += first.bands[i].Moving();
+        movingSecond += second.bands[i].Moving();
+    }
+    return movingSecond == 0 || counter > movingFirst;
+}
+
+template <typename Sample>
+void RunCascade(Sample* samples, std::ptrdiff_t stride, int frames, std::span<EqChannel* const> channels,
+                int numBands, std::int32_t& counter) {
+    EqCascade<Sample> cascade{samples, stride, frames, static_cast<int>(channels.size())};
+    for (std::size_t i = 0; i < static_cast<std::size_t>(numBands); ++i) {
+        if (!channels[0]->bands[i].active) continue;
+        for (std::size_t c = 0; c < channels.size(); ++c)
+            cascade.bands[c][static_cast<std::size_t>(cascade.count)] = &channels[c]->bands[i];
+        ++cascade.count;
+    }
+    if (frames <= 0) return;
+
+    const auto& kernels = Kernels<Sample>();
+    if (counter == 0) {
+        if (cascade.count) kernels.settled(cascade, 0, cascade.count);
+        return;
+    }
+    // Only bands that really move pay for it: neighbours that do, and neighbours that do not, run together.
+    for (int first = 0; first < cascade.count;) {
+        const bool moves = Moves(cascade, first);
+        int end = first + 1;
+        while (end < cascade.count && Moves(cascade, end) == moves) ++end;
+        if (moves)
+            counter = std::max(counter - kernels.gliding(cascade, first, end - first), 0);
+        else
+            kernels.settled(cascade, first, end - first);
+        first = end;
+    }
+}
+
+template void RunCascade(float*, std::ptrdiff_t, int, std::span<EqChannel* const>, int, std::int32_t&);
+template void RunCascade(double*, std::ptrdiff_t, int, std::span<EqChannel* const>, int, std::int32_t&);
+
+}  // namespace Corvo::DSP
