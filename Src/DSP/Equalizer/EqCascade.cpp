@@ -25,25 +25,25 @@ bool Moves(const EqCascade<Sample>& cascade, int band) {
 
 }  // namespace
 
-bool MayRunTogether(const EqChannel& first, const EqChannel& second, int numBands, std::int32_t counter) {
+bool MayRunTogether(const EqBands& first, const EqBands& second, int numBands, std::int32_t counter) {
     int movingFirst = 0, movingSecond = 0;
     for (std::size_t i = 0; i < static_cast<std::size_t>(numBands); ++i) {
-        if (first.bands[i].active != second.bands[i].active) return false;
-        if (counter == 0 || !first.bands[i].active) continue;
-        movingFirst += first.bands[i].Moving();
-        movingSecond += second.bands[i].Moving();
+        if (first[i].active != second[i].active) return false;
+        if (counter == 0 || !first[i].active) continue;
+        movingFirst += first[i].Moving();
+        movingSecond += second[i].Moving();
     }
     return movingSecond == 0 || counter > movingFirst;
 }
 
 template <typename Sample>
-void RunCascade(Sample* samples, std::ptrdiff_t stride, int frames, std::span<EqChannel* const> channels,
+void RunCascade(Sample* samples, std::ptrdiff_t stride, int frames, std::span<EqBands* const> channels,
                 int numBands, std::int32_t& counter) {
     EqCascade<Sample> cascade{samples, stride, frames, static_cast<int>(channels.size())};
     for (std::size_t i = 0; i < static_cast<std::size_t>(numBands); ++i) {
-        if (!channels[0]->bands[i].active) continue;
+        if (!(*channels[0])[i].active) continue;
         for (std::size_t c = 0; c < channels.size(); ++c)
-            cascade.bands[c][static_cast<std::size_t>(cascade.count)] = &channels[c]->bands[i];
+            cascade.bands[c][static_cast<std::size_t>(cascade.count)] = &(*channels[c])[i];
         ++cascade.count;
     }
     if (frames <= 0) return;
@@ -66,7 +66,7 @@ void RunCascade(Sample* samples, std::ptrdiff_t stride, int frames, std::span<Eq
     }
 }
 
-template void RunCascade(float*, std::ptrdiff_t, int, std::span<EqChannel* const>, int, std::int32_t&);
-template void RunCascade(double*, std::ptrdiff_t, int, std::span<EqChannel* const>, int, std::int32_t&);
+template void RunCascade(float*, std::ptrdiff_t, int, std::span<EqBands* const>, int, std::int32_t&);
+template void RunCascade(double*, std::ptrdiff_t, int, std::span<EqBands* const>, int, std::int32_t&);
 
 }  // namespace Corvo::DSP

@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <span>
 
-#include "DSP/Equalizer/EqChannel.h"
+#include "DSP/Equalizer/EqBand.h"
 
 namespace Corvo::DSP {
 
@@ -40,11 +40,11 @@ const EqKernels<Sample>& EqAvx2Kernels();  // for processors that have it
 // Runs the first `numBands` bands, as far as they are active, of one channel or of two neighbouring ones.
 // `counter` counts the coefficients on the move; while it is 0 nothing moves.
 template <typename Sample>
-void RunCascade(Sample* samples, std::ptrdiff_t stride, int frames, std::span<EqChannel* const> channels,
+void RunCascade(Sample* samples, std::ptrdiff_t stride, int frames, std::span<EqBands* const> channels,
                 int numBands, std::int32_t& counter);
 
 // Whether two channels side by side come out as one after the other: they have the same bands active, and
 // the first one's glides do not decide whether the second one's go on.
-bool MayRunTogether(const EqChannel& first, const EqChannel& second, int numBands, std::int32_t counter);
+bool MayRunTogether(const EqBands& first, const EqBands& second, int numBands, std::int32_t counter);
 
 }  // namespace Corvo::DSP

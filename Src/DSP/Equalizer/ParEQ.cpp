@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstddef>
+#include <numbers>
 
 #include "DSP/Equalizer/BiquadSection.h"
 #include "DSP/Equalizer/EqCascade.h"
@@ -37,11 +38,11 @@ void CookBand(EqBand& band, const _eq_data& data, int sampleRate, bool smooth) {
     if (!glide) band.w1 = band.w2 = 0.0;
 }
 
-void CookChannel(EqChannel& channel, const builtin_effects_data& data, int sampleRate, bool smooth,
-                 bool bypassAll) {
+void CookBands(EqBands& bands, const builtin_effects_data& data, int sampleRate, bool smooth,
+               bool bypassAll) {
     const int count = BandsInUse(data);
     for (int i = 0; i < count; ++i) {
-        EqBand& band = channel.bands[static_cast<std::size_t>(i)];
+        EqBand& band = bands[static_cast<std::size_t>(i)];
         const _eq_data& settings = data.bands[static_cast<std::size_t>(i)];
         if (bypassAll || settings.bypass() || data.GetBypassChannel() || IsFlat(settings))
             band.active = 0;
@@ -73,7 +74,11 @@ void ParEQ::Resize(int n) {
 void ParEQ::Cook(bool smooth, bool bypassAll, builtin_effects_data* data, int sampleRate, int numChannels) {
     if (!data) return;
     Resize(numChannels);
-    for (const auto& channel : m_channels) CookChannel(*channel, *data, sampleRate, smooth, bypassAll);
+    for (const auto& channel : m_channels) {
+        CookBands(channel->bands, *data, sampleRate, smooth, bypassAll);
+        channel->analyser.set_parameters(sampleRate);
+        channel->analyser.init();
+    }
 }
 
 void ParEQ::ResetProcessing() { *m_glide_counter = 0; }
@@ -84,37 +89,68 @@ EqChannel* ParEQ::Channel(int channel) const {
                : nullptr;
 }
 
+kivspectrum* ParEQ::GetSpectrum(int channel) {
+    if (channel < 0) return nullptr;
+    if (!Channel(channel)) Resize(channel + 1);
+    return &Channel(channel)->analyser;
+}
+
 template <typename Sample>
 void ParEQ::Process(Sample* buf, int frames, int numChannels, bool feedSpectrum,
                     builtin_effects_data* records) {
     if (!records || frames <= 0) return;
     const DenormalGuard guard;
+    const int numBands = BandsInUse(records[0]);
     for (int channel = 0; channel < numChannels; ++channel) {
-        EqChannel* const pair[] = {Channel(channel), Channel(channel + 1)};
-        const int numBands = BandsInUse(records[0]);
-        if (channel + 1 == numChannels || !pair[1] ||
-            !MayRunTogether(*pair[0], *pair[1], numBands, *m_glide_counter)) {
+        EqChannel* const first = Channel(channel);
+        EqChannel* const second = channel + 1 < numChannels ? Channel(channel + 1) : nullptr;
+        if (!second || !MayRunTogether(first->bands, second->bands, numBands, *m_glide_counter)) {
             ProcessSingle(buf, frames, numChannels, feedSpectrum, channel, records);
             continue;
         }
-        for (const int c : {channel, channel + 1})
-            if (records[c].GetPhaseShift()) Invert(buf + c, numChannels, frames);
-        RunCascade(buf + channel, numChannels, frames, pair, numBands, *m_glide_counter);
+        Sample* const samples = buf + channel;
+        EqBands* const bands[] = {&first->bands, &second->bands};
+        if (records[channel].GetPhaseShift()) Invert(samples, numChannels, frames);
+        if (records[channel + 1].GetPhaseShift()) Invert(samples + 1, numChannels, frames);
+        RunCascade(samples, numChannels, frames, bands, numBands, *m_glide_counter);
+        if (feedSpectrum) {
+            first->analyser.Feed(samples, frames, numChannels, 1);
+            second->analyser.Feed(samples + 1, frames, numChannels, 1);
+        }
         ++channel;
     }
 }
 
 template <typename Sample>
-void ParEQ::ProcessSingle(Sample* buf, int frames, int stride, bool, int channel,
+void ParEQ::ProcessSingle(Sample* buf, int frames, int stride, bool feedSpectrum, int channel,
                           builtin_effects_data* records) {
     EqChannel* const state = Channel(channel);
     if (!state || !records || frames <= 0 || stride <= 0) return;
     const DenormalGuard guard;
     const std::int64_t first = stride < 2 ? 0 : channel, end = static_cast<std::int64_t>(frames) * stride;
-    const int count = first < end ? static_cast<int>((end - first + stride - 1) / stride) : 0;
+    if (first >= end) return;
+    const int count = static_cast<int>((end - first + stride - 1) / stride);
     Sample* const samples = buf + first;
     if (records[channel].GetPhaseShift()) Invert(samples, stride, count);
-    RunCascade(samples, stride, count, {&state, 1}, BandsInUse(records[0]), *m_glide_counter);
+    EqBands* const bands = &state->bands;
+    RunCascade(samples, stride, count, {&bands, 1}, BandsInUse(records[0]), *m_glide_counter);
+    if (feedSpectrum) state->analyser.Feed(samples, count, stride, 1);
+}
+
+std::complex<double> ParEQ::GetResponse(int channel, double frequency, int sampleRate,
+                                        const builtin_effects_data* records) const {
+    const EqChannel* const state = Channel(channel);
+    if (!state || !records || sampleRate <= 0) return 1.0;
+    const auto z1 = std::polar(1.0, -2.0 * std::numbers::pi * frequency / sampleRate), z2 = z1 * z1;
+    std::complex<double> response = records[channel].GetPhaseShift() ? -1.0 : 1.0;
+    for (int i = 0; i < BandsInUse(records[0]); ++i) {
+        const EqBand& band = state->bands[static_cast<std::size_t>(i)];
+        const auto& [b0, b1, b2, a1, a2] = band._eq_coeffs;
+        if (band.active)
+            response *=
+                (b0.target + b1.target * z1 + b2.target * z2) / (1.0 + a1.target * z1 + a2.target * z2);
+    }
+    return response;
 }
 
 template DSP_API void ParEQ::Process(float*, int, int, bool, builtin_effects_data*);

@@ -1,11 +1,14 @@
 #pragma once
 
+#include <complex>
 #include <cstdint>
 #include <memory>
 #include <vector>
 
 #include "DSP/Equalizer/BuiltinEffectsData.h"
 #include "Platform/Export.h"
+
+class kivspectrum;
 
 namespace Corvo::DSP {
 
@@ -40,6 +43,14 @@ public:
     // below half the rate, and that a band whose numbers give no stable filter is left out. Bands beyond the
     // record's count keep what they have. A null record changes nothing.
     void Cook(bool smooth, bool bypassAll, builtin_effects_data* data, int sampleRate, int numChannels);
+
+    // What the cooked bands make of a sine of `frequency` Hz once all glides have ended, polarity included.
+    // `records` as for processing. 1 for a channel that was never cooked.
+    std::complex<double> GetResponse(int channel, double frequency, int sampleRate,
+                                     const builtin_effects_data* records) const;
+    // The analyser of a channel's result, which stays the equaliser's and lives as long as its channels; a
+    // missing channel is made, as by Resize(channel + 1). Null below 0.
+    kivspectrum* GetSpectrum(int channel);
 
     // Forgets that coefficients are gliding: they rest where they are until the next glide begins.
     void ResetProcessing();

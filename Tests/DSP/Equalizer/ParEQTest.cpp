@@ -10,6 +10,7 @@
 
 #include "Plain/PlainParEQ.h"
 #include "Platform/DenormalGuard.h"
+#include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
 
 namespace {
@@ -105,6 +106,7 @@ TEST(ParEQ, LiftsASineByThePeaksHeight) {
     eq.Process(output.data(), 9600, 1, false, &data);
     const double gain = std::pow(10.0, 0.3);
     for (std::size_t i = 4800; i < output.size(); ++i) ASSERT_NEAR(output[i], -gain * input[i], 1e-9) << i;
+    EXPECT_NEAR(std::abs(eq.GetResponse(0, centre, kRate, &data) + gain), 0.0, 1e-9);
 }
 
 // At 0 Hz a low shelf is its boost, so the output shows the glide: the first step covers 0.09 % of the way
@@ -184,6 +186,36 @@ TEST(ParEQ, TouchesNothingButItsChannel) {
     eq.Cook(false, false, nullptr, 48000, 9);
     EXPECT_EQ(samples, std::vector<float>(16, 1.0f));
     EXPECT_EQ(eq.GetNumSubChannels(), 6);
+}
+
+// Each channel's analyser gets that channel's result, and a block's end is the end.
+TEST(ParEQ, FeedsTheAnalysersWithTheResult) {
+    constexpr int kFrames = 2000;
+    auto data = Bands({{EQ_PEAK, 1000, 60, 200}});
+    const builtin_effects_data records[] = {data, data, data};
+    auto* const shared = const_cast<builtin_effects_data*>(records);
+    ParEQ eq;
+    eq.Cook(false, false, &data, 48000, 1);
+    EXPECT_EQ(eq.GetSpectrum(-1), nullptr);
+    ASSERT_NE(eq.GetSpectrum(2), nullptr);
+    EXPECT_EQ(eq.GetNumSubChannels(), 3);
+    eq.Cook(false, false, &data, 48000, 3);
+    auto samples = Noise<float>(3 * kFrames);
+    eq.Process(samples.data(), kFrames, 3, true, shared);
+    for (std::size_t c = 0; c < 3; ++c) {
+        const auto& captured = eq.GetSpectrum(static_cast<int>(c))->GetBufferInputPoints();
+        ASSERT_GE(captured.size(), kFrames);
+        const auto offset = captured.size() - kFrames;
+        for (std::size_t i = 0; i < kFrames; ++i) ASSERT_EQ(captured[offset + i], samples[3 * i + c]) << i;
+    }
+    const auto newest = [&](int channel) { return eq.GetSpectrum(channel)->GetBufferInputPoints().back(); };
+    const float before = newest(2);
+    eq.ProcessSingle(samples.data(), 10, 2, false, 1, shared);
+    EXPECT_EQ(newest(1), samples[3 * (kFrames - 1) + 1]) << "not fed";
+    eq.ProcessSingle(samples.data(), 1, 2, true, 2, shared);
+    EXPECT_EQ(newest(2), before) << "the channel lies behind the block";
+    eq.ProcessSingle(samples.data(), 2, 2, true, 2, shared);
+    EXPECT_EQ(newest(2), samples[2]);
 }
 
 // Catches double frees and leaks (with the address sanitizer) and glides counted on a freed counter.
