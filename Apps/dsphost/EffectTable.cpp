@@ -7,6 +7,7 @@
 #include "DSP/Effects/Chorus.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
+#include "DSP/Effects/Phaser.h"
 #include "DSP/Effects/TubeDistorsion.h"
 #include "EffectElement.h"
 
@@ -26,6 +27,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::Chorus>,
     Make<Corvo::DSP::Echo>,
     Make<Corvo::DSP::TubeDistorsion>,
+    Make<Corvo::DSP::Phaser>,
 };
 // clang-format on
 

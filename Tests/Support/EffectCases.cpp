@@ -8,6 +8,7 @@
 #include "DSP/Effects/Chorus.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
+#include "DSP/Effects/Phaser.h"
 #include "DSP/Effects/TubeDistorsion.h"
 
 namespace TestSupport {
@@ -37,6 +38,10 @@ constexpr std::array kEffects{
                .cuts = Cuts::PhasePerBlock,
                .otherBuild = OtherBuild::Relative,
                .otherBuildReason = "the oscillator's sine and the levels' powers"},
+    EffectCase{.name = "Phaser",
+               .make = Make<Phaser>,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "the oscillator's sine"},
     EffectCase{.name = "Echo",
                .make = Make<Echo>,
                .otherBuild = OtherBuild::Relative,
