@@ -10,6 +10,7 @@
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
 #include "DSP/Effects/TubeDistorsion.h"
+#include "DSP/Effects/PitchShift.h"
 
 namespace TestSupport {
 namespace {
@@ -52,6 +53,14 @@ constexpr std::array kEffects{
                .make = Make<TubeDistorsion>,
                .otherBuild = OtherBuild::Relative,
                .otherBuildReason = "tangents and sines of the filters and of the shape"},
+    EffectCase{.name = "Pitch Shift",
+               .make = Make<PitchShift>,
+               .cuts = Cuts::Exempt,
+               .otherBuild = OtherBuild::Character,
+               .otherBuildReason = "the engine's splices are choices between near equals",
+               .engineAllocates = "the engine grows its own buffers and is locked against edits",
+               .startsBlank = true,
+               .textTruncates = true},
 };
 
 }  // namespace

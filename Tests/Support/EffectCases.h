@@ -39,6 +39,8 @@ struct EffectCase {
     bool linkedParameters = false;
     // Parameters are kept as plain floats rather than words, so a round trip may be off by a rounding.
     bool plainFloats = false;
+    // A new instance holds an empty record; the host loads a preset or a chunk first.
+    bool startsBlank = false;
     // Texts are truncated, so text -> value -> text may lose one unit of the last place.
     bool textTruncates = false;
 };

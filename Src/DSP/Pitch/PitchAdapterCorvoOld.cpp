@@ -1,0 +1,184 @@
+#include "DSP/Pitch/PitchAdapterCorvoOld.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+#include <numbers>
+
+#include "DSP/Effects/SharedRecord.h"
+#include "Platform/DenormalGuard.h"
+
+namespace Corvo::DSP {
+namespace {
+
+constexpr double kPi = std::numbers::pi;
+constexpr std::size_t kMostFrame = 10000;
+constexpr std::size_t kMostBins = kMostFrame / 2 + 1;
+
+// To the nearest integer for |x| below 2^51; a sum that compilers vectorise on every target.
+double Nearest(double x) {
+    constexpr double kShift = 6755399441055744.0;
+    return x + kShift - kShift;
+}
+
+// Cosine to 1e-10, which is far below the float that becomes of it. Without a call, so that the loop around
+// it fills the registers.
+double Cosine(double x) {
+    const double turns = Nearest(x * (1.0 / kPi));
+    const double r = x - turns * kPi, r2 = r * r;
+    const double odd = turns - 2.0 * Nearest(turns * 0.5);  // -1, 0 or 1
+    double sum = -1.0 / 87178291200.0;
+    for (const double term :
+         {1.0 / 479001600.0, -1.0 / 3628800.0, 1.0 / 40320.0, -1.0 / 720.0, 1.0 / 24.0, -0.5})
+        sum = sum * r2 + term;
+    return (1.0 + sum * r2) * (1.0 - 2.0 * odd * odd);
+}
+
+template <typename Table>
+std::size_t Limited(const Table& table, int index) {
+    return static_cast<std::size_t>(std::clamp(index, 0, static_cast<int>(table.size()) - 1));
+}
+
+// A frequency away from the bin's own, from a change of phase: less what the bin itself advances, wrapped to
+// half a turn either way, in bins.
+double BinsOff(double phaseChange, double advance, int oversampling) {
+    double d = phaseChange - advance;
+    int turns = static_cast<int>(d / kPi);
+    turns += turns >= 0 ? turns & 1 : -(turns & 1);
+    d -= kPi * turns;
+    return oversampling * d / (2.0 * kPi);
+}
+
+}  // namespace
+
+struct PitchAdapterCorvoOld::Channel {
+    std::array<float, kMostFrame> input, output;
+    std::array<float, 2 * kMostFrame> accumulator;
+    std::array<float, kMostBins> magnitude, frequency, spectrum;
+    std::array<double, kMostBins> phase;   // double: it grows without end, and a float would soon be noise
+    std::array<bool, kMostBins> negative;  // sign of the windowed sample in the last frame
+    int rover;
+    float pitch;
+};
+
+PitchAdapterCorvoOld::PitchAdapterCorvoOld() : m_state(std::make_unique<std::array<Channel, 2>>()) {
+    // Room for every frame size, so that cooking only fills what is there.
+    m_window.reserve(kFFTSizes.back());
+    for (auto& table : m_frequencies) table.reserve(kMostBins);
+}
+PitchAdapterCorvoOld::~PitchAdapterCorvoOld() = default;
+
+void PitchAdapterCorvoOld::SetSampleRate(int rate) { m_rate = rate; }
+
+void PitchAdapterCorvoOld::SetPitchFactor(int channel, float factor) {
+    if (channel == 0 || channel == 1) StoreShared(m_factors[static_cast<std::size_t>(channel)], factor);
+}
+
+void PitchAdapterCorvoOld::SetFFTSize(int index) { m_size = kFFTSizes[Limited(kFFTSizes, index)]; }
+
+void PitchAdapterCorvoOld::SetQuality(int index) {
+    m_oversampling = kOversampling[Limited(kOversampling, index)];
+}
+
+void PitchAdapterCorvoOld::CookFactors() {
+    if (m_size == 0 || m_oversampling == 0) return;
+    m_step = m_size / m_oversampling;
+    m_latency = m_size - m_step;
+    m_expectedPhase = m_step * 2.0 * kPi / m_size;
+    m_binWidth = static_cast<double>(m_rate) / m_size;
+
+    for (Channel& channel : *m_state) {
+        channel = {};
+        channel.rover = m_latency;
+        channel.pitch = 1.0f;
+    }
+    m_window.resize(static_cast<std::size_t>(m_size));
+    for (std::size_t k = 0; k < m_window.size(); ++k)
+        m_window[k] = 0.5 - 0.5 * std::cos(2.0 * kPi * static_cast<double>(k) / m_size);
+
+    // A real value has the phase 0 or pi, so a bin's change of phase is one of four: by the sign now (even or
+    // odd place) and the sign before.
+    constexpr double kChanges[] = {0.0, kPi, -kPi, 0.0};  // [before * 2 + now]
+    for (std::size_t change = 0; change < m_frequencies.size(); ++change) {
+        auto& table = m_frequencies[change];
+        table.resize(static_cast<std::size_t>(m_size / 2) + 1);
+        for (std::size_t k = 0; k < table.size(); ++k) {
+            const auto bin = static_cast<double>(k);
+            const double off = BinsOff(kChanges[change], bin * m_expectedPhase, m_oversampling);
+            table[k] = static_cast<float>(bin * m_binWidth + off * m_binWidth);
+        }
+    }
+}
+
+void PitchAdapterCorvoOld::ProcessInPlace(double*, int) {}
+
+void PitchAdapterCorvoOld::ProcessInPlace(float* buffer, int frames) {
+    if (m_window.empty()) return;
+    const DenormalGuard guard;
+    for (int channel = 0; channel < std::min(m_channels, 2); ++channel) {
+        const auto side = static_cast<std::size_t>(channel);
+        if (channel == 0 || m_channels == 2)
+            ShiftChannel((*m_state)[side], buffer + channel, frames, m_channels, LoadShared(m_factors[side]));
+    }
+}
+
+void PitchAdapterCorvoOld::ShiftChannel(Channel& channel, float* samples, int frames, int stride,
+                                        float factor) {
+    channel.pitch = static_cast<float>(0.6 * factor + 0.4 * channel.pitch);
+    while (frames > 0) {
+        const int count = std::min(frames, m_size - channel.rover);
+        auto* in = channel.input.data() + channel.rover;
+        const auto* out = channel.output.data() + (channel.rover - m_latency);
+        for (int i = 0; i < count; ++i, samples += stride) {
+            in[i] = *samples;
+            *samples = out[i];
+        }
+        channel.rover += count;
+        frames -= count;
+        if (channel.rover < m_size) continue;
+        channel.rover = m_latency;
+        ShiftFrame(channel, channel.pitch);
+    }
+}
+
+void PitchAdapterCorvoOld::ShiftFrame(Channel& c, float pitch) {
+    const std::size_t bins = static_cast<std::size_t>(m_size / 2) + 1;
+    const auto size = static_cast<std::ptrdiff_t>(m_size), step = static_cast<std::ptrdiff_t>(m_step);
+
+    // Analysis, and every bin moved to where the pitch takes it. Amplitudes meet there, the last frequency
+    // stays.
+    std::fill_n(c.magnitude.begin(), bins, 0.0f);
+    std::fill_n(c.frequency.begin(), bins, 0.0f);
+    for (std::size_t k = 0; k < bins; ++k) {
+        const auto value = static_cast<float>(c.input[k] * m_window[k]);
+        const bool negative = std::signbit(value);  // of -0 too: its phase is pi
+        const std::size_t change = 2u * c.negative[k] + negative;
+        c.negative[k] = negative;
+        const float target = static_cast<float>(k) * pitch;
+        if (!(target > -1.0f && target < static_cast<float>(bins))) continue;
+        const auto j = static_cast<std::size_t>(static_cast<int>(target));
+        c.magnitude[j] += 2.0f * std::abs(value);
+        c.frequency[j] = m_frequencies[change][k] * pitch;
+    }
+
+    // Synthesis: each bin's phase goes on by its frequency. Wrapping it keeps the cosine exact for ever.
+    const double binWidth = m_binWidth, expected = m_expectedPhase;
+    const double perBin = 2.0 * kPi, oversampling = m_oversampling;
+    for (std::size_t k = 0; k < bins; ++k) {
+        const auto bin = static_cast<double>(static_cast<int>(k));
+        const double off = (static_cast<double>(c.frequency[k]) - bin * binWidth) / binWidth;
+        const double phase = c.phase[k] + (off * perBin / oversampling + bin * expected);
+        c.phase[k] = phase - 2.0 * kPi * Nearest(phase * (0.5 / kPi));
+        c.spectrum[k] = static_cast<float>(static_cast<double>(c.magnitude[k]) * Cosine(c.phase[k]));
+    }
+
+    const double scale = static_cast<double>(m_size / 2) * m_oversampling;
+    for (std::size_t k = 0; k < bins; ++k)
+        c.accumulator[k] = static_cast<float>(c.accumulator[k] +
+                                              2.0 * m_window[k] * static_cast<double>(c.spectrum[k]) / scale);
+    std::copy_n(c.accumulator.begin(), step, c.output.begin());
+    std::copy(c.accumulator.begin() + step, c.accumulator.begin() + size + step, c.accumulator.begin());
+    std::copy(c.input.begin() + step, c.input.begin() + size, c.input.begin());
+}
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,194 @@
+#include "DSP/Pitch/PitchAdapterSoundTouch.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <limits>
+#include <mutex>
+
+#include "DSP/Pitch/ShortFader.h"
+#include "Platform/DenormalGuard.h"
+
+namespace Corvo::DSP {
+namespace {
+
+constexpr int kMostChannels = 16;
+constexpr int kPrimingFrames = 28;
+constexpr int kFlushFrames = 128;
+// The engine can only be flushed by more input; far more than its longest sequence ends the attempt.
+constexpr int kMostFlushBlocks = 1 << 16;
+// The engine throws at higher rates. It only sizes its sequences by the rate, so they become shorter.
+constexpr int kHighestRate = 192000;
+constexpr float kLowestPitch = 0.02f;
+// Above this the engine would make thousands of frames of every one it is given.
+constexpr float kHighestPitch = 64.0f;
+// Blocks up to this size need no new memory, whatever their precision.
+constexpr std::size_t kScratchSamples = 16384;
+
+constexpr std::array<float, kFlushFrames * kMostChannels> kSilence{};
+
+std::size_t Samples(int frames, int channels) {
+    return static_cast<std::size_t>(std::max(frames, 0)) * static_cast<std::size_t>(std::max(channels, 0));
+}
+
+}  // namespace
+
+PitchAdapterSoundTouch::PitchAdapterSoundTouch() : m_fadePosition(ShortFaderNumSamples() + 1) {
+    m_scratch.reserve(kScratchSamples);
+}
+PitchAdapterSoundTouch::~PitchAdapterSoundTouch() = default;
+
+void PitchAdapterSoundTouch::Reset() {
+    m_inputFrames = m_outputFrames = 0;
+    m_engine.clear();
+    m_atRest = true;
+    m_fadePosition = 0;
+}
+
+// The engine takes 16 channels, but its anti-alias filter ends the process when it is given more than 15.
+void PitchAdapterSoundTouch::ApplyFilter() {
+    m_engine.setSetting(SETTING_USE_AA_FILTER, m_wantsFilter && m_engineChannels < kMostChannels);
+}
+
+void PitchAdapterSoundTouch::Put(const float* samples, int frames) {
+    if (Ready() && frames > 0) m_engine.putSamples(samples, static_cast<unsigned>(frames));
+}
+
+int PitchAdapterSoundTouch::Take(float* buffer, int frames) {
+    if (!Ready() || frames <= 0) return 0;
+    return static_cast<int>(m_engine.receiveSamples(buffer, static_cast<unsigned>(frames)));
+}
+
+// Output frames that the input is worth, less those taken.
+std::int64_t PitchAdapterSoundTouch::Owed() const {
+    return static_cast<std::int64_t>(static_cast<double>(m_inputFrames) / m_speed) - m_outputFrames;
+}
+
+void PitchAdapterSoundTouch::Clear() {
+    const std::lock_guard lock(m_lock);
+    Reset();
+}
+
+void PitchAdapterSoundTouch::SetSampleRate(int rate) {
+    const std::lock_guard lock(m_lock);
+    Reset();
+    m_rateSet = rate > 0;
+    if (m_rateSet) m_engine.setSampleRate(static_cast<unsigned>(std::min(rate, kHighestRate)));
+    Put(kSilence.data(), kPrimingFrames);
+}
+
+void PitchAdapterSoundTouch::SetChannelsNum(int channels) {
+    const std::lock_guard lock(m_lock);
+    m_channels = channels;
+    Reset();
+    m_engineChannels = 0;  // stays so when the engine refuses
+    m_engine.setChannels(static_cast<unsigned>(channels));
+    m_engineChannels = channels;
+    ApplyFilter();
+}
+
+void PitchAdapterSoundTouch::SetPitchFactor(int channel, float factor) {
+    const std::lock_guard lock(m_lock);
+    if (channel != 0) return;  // all channels share one pitch
+    m_engine.setPitch(factor > kLowestPitch ? std::min(factor, kHighestPitch) : kLowestPitch);
+    Reset();
+}
+
+void PitchAdapterSoundTouch::SetSpeed(float speed) {
+    if (!(speed > 0.0f) || !std::isfinite(speed)) return;
+    const std::lock_guard lock(m_lock);
+    m_speed = speed;
+    m_engine.setRate(speed);
+    Reset();
+}
+
+void PitchAdapterSoundTouch::SetQuality(int index) {
+    const std::lock_guard lock(m_lock);
+    Reset();
+    m_wantsFilter = index >= 3;
+    ApplyFilter();
+    m_engine.setSetting(SETTING_AA_FILTER_LENGTH, index <= 4 ? 32 : index == 5 ? 64 : 128);
+    m_engine.setSetting(SETTING_USE_QUICKSEEK, index < 4);
+}
+
+void PitchAdapterSoundTouch::ProcessInPlace(float* buffer, int frames) {
+    const DenormalGuard guard;
+    const std::lock_guard lock(m_lock);
+    m_atRest = false;
+    Put(buffer, frames);
+    if (static_cast<std::int64_t>(m_engine.numSamples()) < frames)
+        std::fill_n(buffer, Samples(frames, m_channels), 0.0f);
+    else
+        Take(buffer, frames);
+}
+
+int PitchAdapterSoundTouch::ProcessInPlaceNoPadding(float* buffer, int frames) {
+    const DenormalGuard guard;
+    const std::lock_guard lock(m_lock);
+    m_atRest = false;
+    Put(buffer, frames);
+    m_inputFrames += std::max(frames, 0);
+    const int taken = Take(buffer, frames);
+    m_outputFrames += taken;
+    return taken;
+}
+
+template <typename Call>
+int PitchAdapterSoundTouch::ThroughScratch(double* buffer, int frames, Call call) {
+    const std::lock_guard lock(m_lock);
+    const std::size_t count = Samples(frames, m_channels);
+    if (m_scratch.size() < count) m_scratch.resize(count);
+    std::transform(buffer, buffer + count, m_scratch.begin(), [](double s) { return static_cast<float>(s); });
+    const int result = call(m_scratch.data());
+    std::copy_n(m_scratch.begin(), count, buffer);
+    return result;
+}
+
+void PitchAdapterSoundTouch::ProcessInPlace(double* buffer, int frames) {
+    ThroughScratch(buffer, frames, [&](float* scratch) {
+        ProcessInPlace(scratch, frames);
+        return frames;
+    });
+}
+
+int PitchAdapterSoundTouch::ProcessInPlaceNoPadding(double* buffer, int frames) {
+    return ThroughScratch(buffer, frames,
+                          [&](float* scratch) { return ProcessInPlaceNoPadding(scratch, frames); });
+}
+
+void PitchAdapterSoundTouch::Flush() {
+    const DenormalGuard guard;
+    const std::lock_guard lock(m_lock);
+    if (m_atRest) return;
+    m_atRest = true;
+    if (!Ready()) return;
+    const std::int64_t owed = Owed();
+    for (int i = 0; static_cast<std::int64_t>(m_engine.numSamples()) < owed && i < kMostFlushBlocks; ++i)
+        Put(kSilence.data(), kFlushFrames);
+}
+
+int PitchAdapterSoundTouch::GetNumSamplesAvailable() {
+    const std::lock_guard lock(m_lock);
+    const std::int64_t held = m_engine.numSamples();
+    const std::int64_t count = m_atRest ? std::min(held, Owed()) : held;
+    using Limits = std::numeric_limits<int>;
+    return static_cast<int>(std::clamp<std::int64_t>(count, Limits::min(), Limits::max()));
+}
+
+void PitchAdapterSoundTouch::ReceiveSamples(float* buffer, int frames) {
+    if (frames <= 0) return;
+    const int taken = Take(buffer, frames);
+    std::fill_n(buffer + Samples(taken, m_channels), Samples(frames - taken, m_channels), 0.0f);
+    m_outputFrames += frames;
+}
+
+void PitchAdapterSoundTouch::ReceiveSamples(double* buffer, int frames) {
+    ThroughScratch(buffer, frames, [&](float* scratch) {
+        ReceiveSamples(scratch, frames);
+        return frames;
+    });
+}
+
+int PitchAdapterSoundTouch::GetLatency() { return m_engine.getSetting(SETTING_INITIAL_LATENCY); }
+
+}  // namespace Corvo::DSP

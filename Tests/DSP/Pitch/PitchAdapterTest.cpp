@@ -1,0 +1,298 @@
+#include "DSP/Pitch/PitchAdapter.h"
+
+#include <SoundTouch.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <atomic>
+#include <bit>
+#include <memory>
+#include <ranges>
+#include <thread>
+
+#include "Plain/PlainClassicPitch.h"
+#include "Support/Signals.h"
+
+using namespace Corvo::DSP;
+using namespace TestSupport;
+
+namespace {
+
+enum { kClassic, kNew };
+
+std::unique_ptr<PitchAdapter> Make(int index, int channels = 2, float factor = 1.0f, int quality = 4) {
+    std::unique_ptr<PitchAdapter> adapter(PitchAdapter::CreateAdapter(index));
+    adapter->SetChannelsNum(channels);
+    adapter->SetSampleRate(48000);
+    for (int channel = 0; channel < channels; ++channel) adapter->SetPitchFactor(channel, factor);
+    adapter->SetFFTSize(2);
+    adapter->SetQuality(quality);
+    adapter->CookFactors();
+    return adapter;
+}
+
+// Through the path without padding: as many frames as went in.
+template <typename Sample>
+std::vector<Sample> Offline(PitchAdapter& adapter, const std::vector<Sample>& input, int channels,
+                            int block) {
+    std::vector<Sample> output, buffer;
+    const auto width = static_cast<std::size_t>(channels);
+    for (std::size_t done = 0; done < input.size();) {
+        const auto count = std::min(input.size() - done, static_cast<std::size_t>(block) * width);
+        const auto at = input.begin() + static_cast<std::ptrdiff_t>(done);
+        buffer.assign(at, at + static_cast<std::ptrdiff_t>(count));
+        const int got = adapter.ProcessInPlaceNoPadding(buffer.data(), static_cast<int>(count / width));
+        output.insert(output.end(), buffer.begin(), buffer.begin() + got * channels);
+        done += count;
+    }
+    adapter.Flush();
+    while (const int available = adapter.GetNumSamplesAvailable()) {
+        if (available < 0) break;
+        const int count = std::min(available, block);
+        buffer.assign(static_cast<std::size_t>(count) * width, Sample(9));
+        adapter.ReceiveSamples(buffer.data(), count);
+        output.insert(output.end(), buffer.begin(), buffer.end());
+    }
+    return output;
+}
+
+// Frequency of a steady tone, from the rising zero crossings of the first channel of a stretch in the middle.
+double Frequency(const std::vector<float>& samples, int channels, int rate) {
+    const auto frames = samples.size() / static_cast<std::size_t>(channels);
+    const auto at = [&](std::size_t i) { return samples[i * static_cast<std::size_t>(channels)]; };
+    double first = 0.0, last = 0.0;
+    int count = -1;
+    for (std::size_t i = frames / 4; i < frames * 3 / 4; ++i)
+        if (at(i - 1) < 0.0f && at(i) >= 0.0f) {
+            last = static_cast<double>(i) - at(i) / (at(i) - at(i - 1));
+            if (++count == 0) first = last;
+        }
+    return count * rate / (last - first);
+}
+
+template <typename Member>
+int Slot(Member member) {
+    struct Pointer {
+        std::ptrdiff_t offsetPlusOne, adjustment;
+    };
+    return static_cast<int>((std::bit_cast<Pointer>(member).offsetPlusOne - 1) /
+                            static_cast<std::ptrdiff_t>(sizeof(void*)));
+}
+
+}  // namespace
+
+// Catches a virtual operation that was moved: hosts call by number.
+TEST(PitchAdapter, KeepsEveryOperationInItsSlot) {
+    using A = PitchAdapter;
+    using Doubles = void (A::*)(double*, int);
+    using Floats = void (A::*)(float*, int);
+    using DoublesCounted = int (A::*)(double*, int);
+    using FloatsCounted = int (A::*)(float*, int);
+    const int slots[] = {Slot(&A::Clear),
+                         Slot(&A::SetSampleRate),
+                         Slot(&A::SetChannelsNum),
+                         Slot(&A::SetPitchFactor),
+                         Slot(&A::SetSpeed),
+                         Slot(&A::CookFactors),
+                         Slot(&A::SetFFTSize),
+                         Slot(&A::SetQuality),
+                         Slot<Doubles>(&A::ProcessInPlace),
+                         Slot<Floats>(&A::ProcessInPlace),
+                         Slot<DoublesCounted>(&A::ProcessInPlaceNoPadding),
+                         Slot<FloatsCounted>(&A::ProcessInPlaceNoPadding),
+                         Slot(&A::Flush),
+                         Slot(&A::GetNumSamplesAvailable),
+                         Slot<Doubles>(&A::ReceiveSamples),
+                         Slot<Floats>(&A::ReceiveSamples)};
+    for (int i = 0; i < 16; ++i) EXPECT_EQ(slots[i], i);
+    EXPECT_EQ(Slot(&A::GetLatency), 18) << "behind the destructor's two places";
+}
+
+TEST(PitchAdapter, IsMadeFromTheRegistry) {
+    const auto adapters = PitchAdapterInfo::GetPitchAdapters();
+    ASSERT_EQ(adapters.size(), 2u);
+    EXPECT_EQ(adapters[kClassic]->GetName(), "Classic");
+    EXPECT_EQ(adapters[kNew]->GetName(), "New");
+    EXPECT_EQ(adapters[kClassic]->GetFFTSizes(), (std::vector{256, 512, 1024, 2048, 4096, 8192}));
+    EXPECT_EQ(adapters[kClassic]->GetQualities(),
+              (std::vector{2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 16, 24, 32}));
+    EXPECT_TRUE(adapters[kNew]->GetFFTSizes().empty());
+    EXPECT_EQ(adapters[kNew]->GetQualities(), (std::vector{0, 1, 2, 3, 4, 5, 6, 7, 8, 9}));
+    PitchAdapterInfo stranger("Classic");
+    EXPECT_EQ(PitchAdapter::CreateAdapter(&stranger), nullptr);
+
+    // Only "New" has a latency to report, which tells the two apart.
+    for (const auto& [index, latent] : {std::pair{-3, false}, {0, false}, {1, true}, {7, true}})
+        EXPECT_EQ(Make(index)->GetLatency() > 0, latent) << index;
+}
+
+// Catches an engine configured otherwise than each quality says, or driven in another order.
+TEST(PitchAdapterNew, IsTheEngineAsConfigured) {
+    for (int quality = 0; quality <= 9; ++quality) {
+        soundtouch::SoundTouch engine;
+        engine.setChannels(2);
+        engine.setSampleRate(48000);
+        engine.setPitch(1.25f);
+        engine.setSetting(SETTING_USE_AA_FILTER, quality >= 3 ? 1 : 0);
+        engine.setSetting(SETTING_AA_FILTER_LENGTH, quality <= 4 ? 32 : quality == 5 ? 64 : 128);
+        engine.setSetting(SETTING_USE_QUICKSEEK, quality < 4 ? 1 : 0);
+        const auto adapter = Make(kNew, 2, 1.25f, quality);
+        const auto input = Noise<float>(2 * 512 * 40);
+        for (std::size_t at = 0; at < input.size(); at += 2 * 512) {
+            std::vector<float> block(input.begin() + static_cast<std::ptrdiff_t>(at),
+                                     input.begin() + static_cast<std::ptrdiff_t>(at + 2 * 512));
+            std::vector<float> expected(block.size());
+            engine.putSamples(block.data(), 512);
+            if (engine.numSamples() >= 512) engine.receiveSamples(expected.data(), 512);
+            adapter->ProcessInPlace(block.data(), 512);
+            ASSERT_EQ(block, expected) << "quality " << quality << ", frame " << at / 2;
+        }
+    }
+}
+
+TEST(PitchAdapterNew, ShiftsTheRightDistance) {
+    for (const float semitones : {-12.0f, -2.0f, -1.0f, 1.0f, 2.0f, 12.0f}) {
+        const auto adapter = Make(kNew, 1);
+        adapter->SetTranspose(semitones);
+        const auto output = Offline(*adapter, Sine<float>(96000, 440.0), 1, 512);
+        const double cents = 1200.0 * std::log2(Frequency(output, 1, 48000) / 440.0);
+        EXPECT_NEAR(cents, 100.0 * static_cast<double>(semitones), 3.0);
+    }
+    const auto adapter = Make(kNew, 1);
+    adapter->SetPitchFactor(1, 2.0f);  // only the first channel's factor counts
+    const auto output = Offline(*adapter, Sine<float>(48000, 440.0), 1, 512);
+    EXPECT_NEAR(Frequency(output, 1, 48000), 440.0, 0.5);
+}
+
+// Catches frames lost or invented at the ends of an offline rendering, and a stream that comes out shifted.
+TEST(PitchAdapterNew, ReturnsAsManyFramesAsItWasGiven) {
+    for (const int frames : {1, 100, 5000, 30011})
+        for (const int block : {64, 1000, 8192})
+            for (const float speed : {1.0f, 1.5f}) {
+                const auto adapter = Make(kNew, 2, 1.5f);
+                adapter->SetSpeed(speed);
+                const auto input = Noise<double>(2 * static_cast<std::size_t>(frames));
+                const auto expected = static_cast<std::size_t>(frames / static_cast<double>(speed));
+                const auto got = Offline(*adapter, input, 2, block).size() / 2;
+                EXPECT_EQ(got, expected) << frames << " in blocks of " << block << " at speed " << speed;
+            }
+    for (const auto& [semitones, tolerance] : {std::pair{12.0f, 1500}, {-12.0f, 1500}, {0.0f, 1}}) {
+        std::vector<float> click(48000);
+        click[20000] = 1.0f;
+        const auto adapter = Make(kNew, 1);
+        adapter->SetTranspose(semitones);
+        const auto output = Offline(*adapter, click, 1, 512);
+        const auto peak = std::ranges::max_element(output, {}, [](float s) { return std::abs(s); });
+        EXPECT_NEAR(static_cast<double>(peak - output.begin()), 20000.0, tolerance) << semitones;
+    }
+}
+
+TEST(PitchAdapterNew, KeepsItsBooks) {
+    const auto adapter = Make(kNew, 1);
+    auto block = Noise<float>(4096);
+    adapter->ProcessInPlace(block.data(), 512);
+    EXPECT_TRUE(std::ranges::all_of(block | std::views::take(512), [](float s) { return s == 0.0f; }))
+        << "silence until the engine is full";
+    adapter->Clear();
+    adapter->Flush();
+    EXPECT_EQ(adapter->GetNumSamplesAvailable(), 0) << "a flush at rest adds nothing";
+
+    for (int i = 0; i < 4; ++i) adapter->ProcessInPlaceNoPadding(block.data(), 4096);
+    const int held = adapter->GetNumSamplesAvailable();
+    block.assign(4096, 9.0f);
+    adapter->ReceiveSamples(block.data(), held + 100);
+    EXPECT_EQ(block[static_cast<std::size_t>(held) + 99], 0.0f) << "what is not there is silence";
+    EXPECT_EQ(block[static_cast<std::size_t>(held) + 100], 9.0f);
+    std::vector<float> more(16384);
+    adapter->ReceiveSamples(more.data(), 16384);
+    adapter->Flush();
+    EXPECT_LT(adapter->GetNumSamplesAvailable(), 0) << "more was taken than is owed";
+
+    for (const int channels : {0, -1, 17}) {
+        EXPECT_THROW(adapter->SetChannelsNum(channels), std::runtime_error);
+        adapter->ProcessInPlace(block.data(), 16);  // refused, so it must not reach the engine
+    }
+    adapter->SetChannelsNum(16);
+    adapter->SetSampleRate(44100);
+    adapter->ProcessInPlaceNoPadding(more.data(), 1000);
+    adapter->Flush();
+    EXPECT_EQ(adapter->GetNumSamplesAvailable(), 1000);
+}
+
+// Catches races between configuring and processing, under the thread sanitizer.
+TEST(PitchAdapterNew, IsConfiguredWhileItProcesses) {
+    const auto adapter = Make(kNew);
+    std::atomic<bool> done{false};
+    std::thread configure([&] {
+        for (int i = 0; !done; ++i) {
+            adapter->SetPitchFactor(0, 0.5f + 0.01f * static_cast<float>(i % 100));
+            adapter->SetQuality(i % 10);
+            adapter->GetNumSamplesAvailable();
+        }
+    });
+    auto block = Noise<double>(2 * 256);
+    for (int i = 0; i < 200; ++i) adapter->ProcessInPlace(block.data(), 256);
+    done = true;
+    configure.join();
+}
+
+// Catches the tables of sign changes, the wrapped phases and the short cosine drifting from the definition.
+TEST(PitchAdapterClassic, AgreesWithTheDefinition) {
+    struct Case {
+        int sizeIndex, size, qualityIndex, oversampling;
+        float left, right;
+    } const cases[] = {{0, 256, 2, 4, 1.5f, 0.5f},
+                       {2, 1024, 1, 3, 1.0f, 2.0f},
+                       {1, 512, 9, 11, 0.7f, 1.01f},
+                       {5, 8192, 13, 32, 1.2f, 0.9f},
+                       {99, 8192, -5, 2, 1.2f, 0.9f}};
+    for (const auto& c : cases) {
+        const auto adapter = Make(kClassic);
+        adapter->SetPitchFactor(0, c.left);
+        adapter->SetPitchFactor(1, c.right);
+        adapter->SetFFTSize(c.sizeIndex);
+        adapter->SetQuality(c.qualityIndex);
+        adapter->CookFactors();
+        Plain::ClassicPitch left(c.size, c.oversampling, 48000), right = left;
+        auto samples = Noise<float>(2 * 20000);
+        auto expected = samples;
+        for (std::size_t at = 0; at < 20000; at += 500) {
+            adapter->ProcessInPlace(samples.data() + 2 * at, 500);
+            left.Run(expected.data() + 2 * at, 500, 2, c.left);
+            right.Run(expected.data() + 2 * at + 1, 500, 2, c.right);
+        }
+        for (std::size_t i = 0; i < samples.size(); ++i)
+            ASSERT_NEAR(samples[i], expected[i], 2e-7f) << c.size << "/" << c.oversampling << ", " << i / 2;
+        EXPECT_GT(*std::ranges::max_element(samples), 1e-6f) << "something must come out";
+    }
+}
+
+TEST(PitchAdapterClassic, LeavesWhatItDoesNotShift) {
+    const auto input = Noise<float>(4 * 5000);
+    auto four = input;
+    const auto adapter = Make(kClassic, 4, 1.5f);
+    adapter->ProcessInPlace(four.data(), 5000);
+    for (std::size_t i = 0; i < four.size(); ++i)
+        if (i % 4 >= 2) {
+            ASSERT_EQ(four[i], input[i]) << "channel " << i % 4;
+        }
+    EXPECT_NE(four[0], input[0]);
+
+    const auto doubles = Noise<double>(2 * 1000);
+    auto block = doubles;
+    EXPECT_EQ(Make(kClassic)->ProcessInPlaceNoPadding(block.data(), 1000), 1000);
+    EXPECT_EQ(block, doubles);
+
+    std::unique_ptr<PitchAdapter> raw(PitchAdapter::CreateAdapter(kClassic));
+    auto floats = input;
+    raw->SetChannelsNum(2);
+    raw->ProcessInPlace(floats.data(), 5000);  // never cooked
+    EXPECT_EQ(floats, input);
+    for (const float wild : {-1.0f, 1e30f, std::nanf("")}) {
+        raw->SetFFTSize(0);
+        raw->SetQuality(0);
+        raw->SetPitchFactor(0, wild);
+        raw->CookFactors();
+        raw->ProcessInPlace(floats.data(), 5000);
+    }
+}
