@@ -9,6 +9,7 @@
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
 #include "DSP/Effects/TubeDistorsion.h"
+#include "DSP/Effects/PitchShift.h"
 #include "EffectElement.h"
 
 namespace dsphost {
@@ -28,6 +29,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::Echo>,
     Make<Corvo::DSP::TubeDistorsion>,
     Make<Corvo::DSP::Phaser>,
+    Make<Corvo::DSP::PitchShift>,
 };
 // clang-format on
 

@@ -14,6 +14,7 @@ namespace {
 // One line registers a command.
 constexpr void (*kCommands[])(CLI::App&) = {
     AddEffectsCommand,
+    AddPitchCommand,
     AddRenderCommand,
 };
 
