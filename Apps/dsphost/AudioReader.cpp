@@ -96,6 +96,11 @@ int AudioReader::Read(double* samples, int frames) {
         throw UserError(m_name + ": is damaged after " + std::to_string(m_position) +
                         " frames: " + m_sound->Error());
     if (m_position == 0) throw UserError(m_name + ": is empty: it holds no samples");
+    if (m_frames && got < wanted) {
+        PrintMessage("warning: " + m_name + ": ended after " + std::to_string(m_position) + " of " +
+                     std::to_string(*m_frames) + " frames");
+        m_frames = m_position;
+    }
     return static_cast<int>(got);
 }
 

@@ -51,6 +51,13 @@ std::vector<std::uint8_t> ReadChunk(const std::string& path) {
     return bytes;
 }
 
+MP_ENVELOPE_SEGMENT Jump(const AutomationPoint& point) {
+    MP_ENVELOPE_SEGMENT segment{};
+    segment.rtStart = segment.rtEnd = point.frame;
+    segment.valStart = segment.valEnd = point.value;
+    return segment;
+}
+
 // Copies between one interleaved block and its channels one behind the other.
 template <typename Sample>
 void Deinterleave(const Sample* from, Sample* to, int channels, int frames) {
@@ -174,7 +181,7 @@ bool EffectElement::PlaysAutomation() {
     tWAVEFORMATEX format{3, 2, 48000, 48000 * 8, 8, 32, 0};
     constexpr int kFrames = 16;
     std::array<float, 2 * kFrames> silence{};
-    const MP_ENVELOPE_SEGMENT segment{0, 0, probe->GetParam(0), probe->GetParam(0), 0, 0};
+    const auto segment = Jump({0, probe->GetParam(0)});
     probe->InitProcessing(kFrames, &format);
     probe->AddEnvelope(0, 1, &segment);
     ProcessFlags flags;
@@ -191,8 +198,7 @@ std::vector<int> EffectElement::AutomationLanes(std::string_view parameter) {
 
 void EffectElement::Automate(int lane, std::span<const AutomationPoint> points) {
     std::vector<MP_ENVELOPE_SEGMENT> segments;
-    for (const auto& point : points)
-        segments.push_back({point.frame, point.frame, point.value, point.value, 0, 0});
+    for (const auto& point : points) segments.push_back(Jump(point));
     m_effect->AddEnvelope(lane, static_cast<int>(segments.size()), segments.data());
     m_automated = true;
 }

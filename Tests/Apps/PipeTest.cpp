@@ -58,6 +58,15 @@ TEST_F(Pipes, ReadsAStreamToItsEnd) {
     EXPECT_EQ(Load("out.wav").samples, Load("in.wav").samples);
 }
 
+// A producer that died is no reason to lose what came, but it must not pass unnoticed.
+TEST_F(Pipes, WarnsOfAStreamThatEndsEarly) {
+    Save("in.wav", NoiseSound(3000));
+    const auto result = Run({"render", "-", "out.wav"}, Bytes("in.wav").substr(0, 44 + 4 * 2000));
+    EXPECT_EQ(result.status, 0);
+    EXPECT_EQ(result.err, "dsphost: warning: standard input: ended after 2000 of 3000 frames\n");
+    EXPECT_EQ(Load("out.wav").Frames(), 2000u);
+}
+
 TEST_F(Pipes, RefusesStreamsThatAreNoAudio) {
     Save("in.wav", NoiseSound(100));
     const std::string wav = Bytes("in.wav");
