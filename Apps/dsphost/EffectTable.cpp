@@ -5,6 +5,7 @@
 
 #include "DSP/Effects/Autovol.h"
 #include "DSP/Effects/Chorus.h"
+#include "DSP/Effects/Compressor.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
@@ -30,6 +31,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::TubeDistorsion>,
     Make<Corvo::DSP::Phaser>,
     Make<Corvo::DSP::PitchShift>,
+    Make<Corvo::DSP::Compressor>,
 };
 // clang-format on
 

@@ -6,6 +6,7 @@
 
 #include "DSP/Effects/Autovol.h"
 #include "DSP/Effects/Chorus.h"
+#include "DSP/Effects/Compressor.h"
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
@@ -29,6 +30,11 @@ constexpr std::array kEffects{
                .otherBuildReason = "sine and cosine of the pan law",
                .plainFloats = true,
                .textTruncates = true},
+    EffectCase{.name = "Compressor",
+               .make = Make<Compressor>,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "powers behind the curve and the coefficients",
+               .linkedParameters = true},
     EffectCase{.name = "Tremolo",
                .make = Make<Autovol>,
                .cuts = Cuts::PhasePerBlock,

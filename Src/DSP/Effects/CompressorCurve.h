@@ -1,0 +1,80 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+
+#include "Platform/Export.h"
+
+namespace Corvo::DSP::CompressorPrivate {
+
+// "No threshold (or ratio) has been set since the last preset."
+constexpr std::int32_t kNotSet = -9999;
+
+constexpr std::int32_t kLowestThreshold = -800, kHighestThreshold = -10;  // tenths of a decibel
+constexpr std::int32_t kRatioSteps = 251;
+
+// Output level y that belongs to input level x, both linear amplitudes, and the slope of the straight
+// segment to the next point.
+struct CurvePoint {
+    float x, y, slope;
+};
+
+// One channel's transfer curve: points in ascending x from (0, 0) to x = 1, joined by straight segments.
+//
+// The threshold is the knee above which the curve is a straight line in decibels,
+//   output = threshold + slope * (input - threshold),   slope = 1 - step / 251,
+// and is marked by its point standing twice. A curve without the mark (drawn by hand) has its threshold
+// where its topmost straight line begins, and at x = 1 when that line is unity.
+//
+// Operations allocate nothing and run on either thread, on that thread's own curve.
+struct DSP_API TransferCurve {
+    static constexpr std::size_t kMaxPoints = 666;
+
+    std::array<CurvePoint, kMaxPoints> points{};
+    std::int32_t count = 0;
+
+    const CurvePoint* begin() const;
+    const CurvePoint* end() const;
+
+    // Appends a point; ignored when the curve is full.
+    void Add(double x, double y);
+    // Fills in the slopes, after the last Add.
+    void UpdateSlopes();
+    // Makes a curve of whatever came from outside: drops points that are no numbers or descend, limits
+    // levels, adds the ends, clears what is beyond the count.
+    void Repair();
+
+    const CurvePoint* Threshold() const;  // end() for an empty curve only
+    std::int32_t ThresholdTenths() const;
+    // Decibels out per decibel in, above the threshold; the ratio is its reciprocal.
+    double SlopeAboveThreshold() const;
+
+    // Moves the knee and keeps the slope above it and what lies below: a gate stays where it is, or is
+    // pushed down whole by a knee that meets it. The knee is hard afterwards.
+    void MoveThreshold(std::int32_t tenths);
+    // Turns the part above the knee. A curve without a threshold gets one at its highest setting.
+    void SetRatioStep(std::int32_t step);
+
+    bool operator==(const TransferCurve& other) const;
+
+private:
+    void Redraw(float knee, double slope);
+};
+
+// The curves of both channels and the edits last made to them.
+struct CompMapStereo {
+    std::array<TransferCurve, 2> m_comp_map;
+    std::array<std::int32_t, 2> reserved{};  // kept for whoever wrote them
+    std::int32_t last_threshold = kNotSet;   // tenths of a decibel
+    std::int32_t last_ratio_step = kNotSet;
+};
+
+// The largest level that reads as `tenths` of a decibel when its decibels are truncated.
+DSP_API float LevelFromTenths(std::int32_t tenths);
+
+constexpr double SlopeOfStep(std::int32_t step) {
+    return 1.0 - static_cast<double>(step) / static_cast<double>(kRatioSteps);
+}
+
+}  // namespace Corvo::DSP::CompressorPrivate

@@ -1,0 +1,37 @@
+#pragma once
+
+#include <array>
+#include <atomic>
+
+namespace Corvo::DSP {
+
+// Hands whole values from one writing thread to one reading thread. Three slots change hands through one
+// atomic index, so neither side waits, allocates or frees, and a value is never seen half written.
+template <typename Value>
+class LatestValue {
+public:
+    // Writer: fill Draft() completely, then Publish() it. A published value that was not taken is replaced.
+    Value& Draft() { return m_slots[m_draft]; }
+    void Publish() {
+        // Release hands the draft over; acquire sees that the reader is done with the slot coming back.
+        m_draft = m_middle.exchange(m_draft | kFresh, std::memory_order_acq_rel) & kSlot;
+    }
+
+    // Reader: the newest value, or null when none came since the last call. It stays as it is until the
+    // next Take() that returns one.
+    const Value* Take() {
+        if ((m_middle.load(std::memory_order_relaxed) & kFresh) == 0) return nullptr;
+        m_taken = m_middle.exchange(m_taken, std::memory_order_acq_rel) & kSlot;
+        return &m_slots[m_taken];
+    }
+
+private:
+    static constexpr unsigned kSlot = 3, kFresh = 4;
+
+    std::array<Value, 3> m_slots{};
+    unsigned m_draft = 0;               // the writer's
+    unsigned m_taken = 1;               // the reader's
+    std::atomic<unsigned> m_middle{2};  // whoever exchanges it owns the slot that comes back
+};
+
+}  // namespace Corvo::DSP
