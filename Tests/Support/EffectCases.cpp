@@ -10,8 +10,8 @@
 #include "DSP/Effects/Echo.h"
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
-#include "DSP/Effects/TubeDistorsion.h"
 #include "DSP/Effects/PitchShift.h"
+#include "DSP/Effects/TubeDistorsion.h"
 
 namespace TestSupport {
 namespace {
