@@ -13,6 +13,7 @@ namespace dsphost {
 void AddEffectsCommand(CLI::App& app);
 void AddPitchCommand(CLI::App& app);
 void AddRenderCommand(CLI::App& app);
+void AddSpectrumCommand(CLI::App& app);
 
 // What every command that writes takes.
 struct WritingOptions {

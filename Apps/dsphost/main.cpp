@@ -16,6 +16,7 @@ constexpr void (*kCommands[])(CLI::App&) = {
     AddEffectsCommand,
     AddPitchCommand,
     AddRenderCommand,
+    AddSpectrumCommand,
 };
 
 constexpr int kSuccess = 0, kIoFailure = 1, kUserFailure = 2, kInterrupted = 130;

@@ -1,9 +1,11 @@
 #pragma once
 
 #include <atomic>
+#include <cstddef>
 #include <vector>
 
 #include "Platform/Export.h"
+#include "Spectrum/CoordinatesAndFrequencies.h"
 #include "Spectrum/kivspectrum.h"
 
 // Turns the power spectra of one analyser into the curve that is drawn: smooths them over time and keeps a
@@ -45,16 +47,37 @@ public:
     void peak_reset();
     const std::vector<float>& GetPeaks() const;
 
+    // Works out the curve in `rectangle` and copies as many of its points as `capacity` allows to `points`
+    // (may be null); `count`, also returned, says how many. `map` is for the same rectangle. Every pixel
+    // column gets one point, the maximum of its bins or a smooth curve between bins further apart; octave and
+    // third-octave bands get two each, so that there are never more than two per column. `offset` (dB) is
+    // added to the levels. Draws the smoothed spectrum, and counts as a frame for the peaks; or `other`, with
+    // fft_length / 2 powers. The sonogram has no points.
+    int ComputeSpectrumPoints(const Corvo::RectF& rectangle, Corvo::PointF* points, int& count,
+                              const CoordinatesAndFrequencies& map, kivspectrum::_display_mode mode,
+                              int capacity, float offset, const std::vector<float>* other = nullptr);
+    // All points of the last curve, and the bins that they stand for.
+    const std::vector<Corvo::PointF>& GetXYPoints() const;
+    const std::vector<int>& GetFFTPoints() const;
+
     void SetOn(bool on);
     bool GetOn() const;
 
 private:
+    void AddCurve(const Corvo::RectF& rectangle, const CoordinatesAndFrequencies& map,
+                  const std::vector<float>& power, double scale);
+    void AddBands(const Corvo::RectF& rectangle, const CoordinatesAndFrequencies& map,
+                  const std::vector<float>& power, double scale);
+    void AddPoint(double x, double y, std::ptrdiff_t bin);
     double RefreshRate(const std::vector<float>& power) const;
 
     kivspectrum::spectrum_settings m_settings;
     std::vector<float> m_smoothed;
     std::vector<float> m_peaks;
     std::vector<float> m_peakFrames;  // until each peak falls
+    std::vector<Corvo::PointF> m_points;
+    std::vector<int> m_pointBins;
+    std::vector<float> m_levels;
     int m_samplingRate = -1;
     std::atomic<bool> m_on{true};
 };

@@ -1,0 +1,122 @@
+#include <bit>
+#include <charconv>
+#include <memory>
+#include <numeric>
+#include <string>
+#include <vector>
+
+#include "AudioReader.h"
+#include "Commands.h"
+#include "Errors.h"
+#include "Progress.h"
+#include "Spectrum/PowerToDecibels.h"
+#include "Spectrum/kivspectrum.h"
+#include "Text.h"
+
+namespace dsphost {
+namespace {
+
+constexpr int kMostChannels = 64;
+constexpr int kShortest = 128, kLongest = 524288;
+const std::vector<std::string> kWindows{"rectangular", "triangular", "hann", "hamming", "blackman"};
+
+struct Arguments {
+    std::string input, output, window = kWindows.back();
+    int length = 4096;
+    float overlap = 0.5f;
+    WritingOptions writing;
+};
+
+void CheckNumbers(const Arguments& arguments) {
+    if (arguments.length < kShortest || arguments.length > kLongest ||
+        !std::has_single_bit(static_cast<unsigned>(arguments.length)))
+        throw UserError("--length cannot be " + std::to_string(arguments.length) +
+                        "; accepted: powers of two from 128 to 524288");
+    if (!(arguments.overlap >= 0.0f && arguments.overlap <= 0.99f))
+        throw UserError("--overlap cannot be " + std::to_string(arguments.overlap) +
+                        "; accepted: 0 to 0.99 of a window");
+}
+
+// The mean power spectrum of all whole windows of the input; an input shorter than one is followed by
+// silence.
+std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser, const Arguments& arguments) {
+    const int hop = kivspectrum::settings.hop_length;
+    std::vector<double> sum(analyser.GetPower().size()),
+        samples(static_cast<std::size_t>(hop) * static_cast<std::size_t>(input.Channels()));
+    Progress progress("spectrum", input.Rate(), input.Frames(), arguments.writing.quiet);
+    std::int64_t read = 0, spectra = 0;
+    for (;;) {
+        CheckInterrupted();
+        const int got = input.Read(samples.data(), hop);
+        if (got < hop && spectra > 0) break;  // what is left does not fill a window
+        if (got < hop)
+            std::fill(samples.begin() + std::ptrdiff_t{got} * input.Channels(), samples.end(), 0.0);
+        analyser.Feed(samples.data(), hop, input.Channels(), input.Channels());
+        read += hop;
+        progress.Update(read);
+        const bool prepared = analyser.PrepareFFTForDrawingHelper(false, false);
+        if (read < arguments.length || !prepared) continue;
+        const auto& power = analyser.GetPower();
+        for (std::size_t k = 0; k < sum.size(); ++k) sum[k] += power[k];
+        ++spectra;
+    }
+    for (double& power : sum) power /= static_cast<double>(spectra);
+    return sum;
+}
+
+std::string Csv(const std::vector<double>& power, const std::vector<float>& window, int rate, int length) {
+    // A full-scale sine has half the window's sum as its amplitude.
+    const double full = std::accumulate(window.begin(), window.end(), 0.0) / 2.0;
+    std::string text = "frequency_hz,level_db\n";
+    const auto append = [&text](double value, int digits, char end) {
+        char number[64];
+        const auto result =
+            std::to_chars(number, number + sizeof number, value, std::chars_format::fixed, digits);
+        text.append(number, result.ptr) += end;
+    };
+    for (std::size_t k = 0; k < power.size(); ++k) {
+        const auto share = static_cast<float>(power[k] / (full * full));
+        float level;
+        Corvo::PowerToDecibels(&share, &level, 1, 0.0f);
+        append(static_cast<double>(k) * rate / length, 4, ',');
+        append(level, 3, '\n');
+    }
+    return text;
+}
+
+void Run(Arguments arguments) {
+    CheckNumbers(arguments);
+    arguments.writing.rules.inputs = {arguments.input};
+    auto& settings = kivspectrum::settings;
+    settings.window_type = static_cast<std::int32_t>(FindName(arguments.window, kWindows, "window"));
+    settings.window_length = arguments.length;
+    kivspectrum::SetAnalysisWindowsOverlap(arguments.overlap);
+
+    AudioReader input(arguments.input);
+    RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
+    kivspectrum analyser;
+    analyser.set_parameters(input.Rate());
+    analyser.SetOn(true);
+    const auto power = AveragePower(input, analyser, arguments);
+    const std::string text = Csv(power, analyser.GetWindow(), input.Rate(), arguments.length);
+    WriteWholeFile(arguments.output, arguments.writing.rules, text.data(), text.size());
+}
+
+}  // namespace
+
+void AddSpectrumCommand(CLI::App& app) {
+    const auto arguments = std::make_shared<Arguments>();
+    auto& a = *arguments;
+    auto* const command =
+        app.add_subcommand("spectrum", "Writes the mean spectrum of an audio file, its channels mixed");
+    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
+    command->add_option("--csv", a.output, "Table of frequencies and levels, 0 dB a full-scale sine")
+        ->required();
+    command->add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
+    command->add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
+    command->add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
+    a.writing.AddTo(*command);
+    command->callback([arguments] { Run(*arguments); });
+}
+
+}  // namespace dsphost

@@ -1,0 +1,81 @@
+#include "Spectrum/CoordinatesAndFrequencies.h"
+
+#include <algorithm>
+#include <cmath>
+
+using Corvo::FrequencyScale;
+using Corvo::LevelScale;
+
+namespace {
+
+constexpr double kLowestLogarithmic = 1.0;
+constexpr double kMelCorner = 700.0;
+constexpr double kConcertPitch = 440.0;
+constexpr double kSemitones = 12.0;
+
+bool IsLogarithmic(FrequencyScale scale) {
+    return scale != FrequencyScale::Linear && scale != FrequencyScale::Mel;
+}
+
+}  // namespace
+
+CoordinatesAndFrequencies::CoordinatesAndFrequencies(const Corvo::RectF& rectangle, double lowest,
+                                                     double highest, FrequencyScale frequencies,
+                                                     LevelScale levels, float range)
+    : m_rectangle(rectangle),
+      m_frequencies(frequencies),
+      m_levels(levels),
+      m_lowest(std::max(lowest, 0.0)),
+      m_highest(highest) {
+    if (m_frequencies == FrequencyScale::Automatic)
+        m_frequencies = m_highest < 4.0 * m_lowest ? FrequencyScale::Linear : FrequencyScale::Logarithmic;
+    if (IsLogarithmic(m_frequencies)) m_lowest = std::max(m_lowest, kLowestLogarithmic);
+    m_highest = std::max(m_highest, m_lowest + 1.0);
+    if (m_frequencies == FrequencyScale::Notes) {
+        const auto semitone = [](double hz) { return kSemitones * std::log2(hz / kConcertPitch); };
+        const auto frequency = [](double note) { return kConcertPitch * std::exp2(note / kSemitones); };
+        m_lowest = frequency(std::floor(semitone(m_lowest) + 0.5) - 0.5);
+        m_highest = frequency(std::ceil(semitone(m_highest) - 0.5) + 0.5);
+    }
+    m_left = Position(m_lowest);
+    m_span = Position(m_highest) - m_left;
+    const bool decibels = m_levels == LevelScale::Decibels;
+    m_floor = decibels ? -std::max(static_cast<double>(range), 1.0) : 0.0;
+    m_top = decibels ? 0.0 : 1.0;
+}
+
+const Corvo::RectF& CoordinatesAndFrequencies::GetRectangle() const { return m_rectangle; }
+double CoordinatesAndFrequencies::GetLowest() const { return m_lowest; }
+double CoordinatesAndFrequencies::GetHighest() const { return m_highest; }
+FrequencyScale CoordinatesAndFrequencies::GetFrequencyScale() const { return m_frequencies; }
+LevelScale CoordinatesAndFrequencies::GetLevelScale() const { return m_levels; }
+double CoordinatesAndFrequencies::GetFloor() const { return m_floor; }
+
+double CoordinatesAndFrequencies::Position(double frequency) const {
+    if (IsLogarithmic(m_frequencies)) return std::log2(std::max(frequency, kLowestLogarithmic));
+    if (m_frequencies == FrequencyScale::Mel) return std::log1p(std::max(frequency, 0.0) / kMelCorner);
+    return frequency;
+}
+
+float CoordinatesAndFrequencies::FrequencyToX(double frequency) const {
+    return static_cast<float>(m_rectangle.x + (Position(frequency) - m_left) / m_span * m_rectangle.width);
+}
+
+double CoordinatesAndFrequencies::XToFrequency(double x) const {
+    if (!(m_rectangle.width > 0.0f)) return m_lowest;
+    const double position = m_left + (x - m_rectangle.x) / m_rectangle.width * m_span;
+    if (IsLogarithmic(m_frequencies)) return std::exp2(position);
+    if (m_frequencies == FrequencyScale::Mel) return kMelCorner * std::expm1(position);
+    return position;
+}
+
+float CoordinatesAndFrequencies::LevelToY(double level) const {
+    const double share = (std::clamp(level, m_floor, m_top) - m_floor) / (m_top - m_floor);
+    return static_cast<float>(m_rectangle.y + (1.0 - share) * m_rectangle.height);
+}
+
+double CoordinatesAndFrequencies::YToLevel(double y) const {
+    if (!(m_rectangle.height > 0.0f)) return m_floor;
+    const double share = 1.0 - (y - m_rectangle.y) / m_rectangle.height;
+    return m_floor + share * (m_top - m_floor);
+}
