@@ -1,0 +1,63 @@
+#include <atomic>
+#include <chrono>
+#include <thread>
+#include <vector>
+
+#include "AnalyserFixture.h"
+#include "Spectrum/Tuner.h"
+
+namespace {
+
+class AnalyserThreads : public AnalyserTest {};
+
+// One thread feeds two analysers, one prepares their frames, two choose from their menus. Caught by the
+// thread sanitizer: a race; by the test never ending: locks taken in two orders.
+TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
+    kivspectrum first, second;
+    first.SetOn(true);
+    second.SetOn(true);
+    std::atomic<bool> stop{false};
+    std::atomic<int> frames{0};
+    const auto audio = [&] {
+        const auto noise = TestSupport::Noise<float>(2 * 256);
+        while (!stop) {
+            first.Feed(noise.data(), 256, 2, 2);
+            second.Feed(noise.data(), 256, 2, 1);
+        }
+    };
+    const auto display = [&] {
+        const std::vector<float>* spectrum = nullptr;
+        while (!stop) {
+            frames += first.PrepareFFTForDrawingHelper(false, false);
+            frames += second.GetFFTFor3DSonogram(48000, &spectrum, true, false);
+        }
+    };
+    // The longest lengths only take time.
+    const auto menu = [&](kivspectrum& mine, kivspectrum& other, int step) {
+        for (int command = 1200; !stop; command = 1200 + (command - 1200 + step) % 203) {
+            if ((command >= 1209 && command <= 1213) || (command >= 1228 && command <= 1232)) continue;
+            mine.popupmenu_process(command);
+            if (command == 1258) {
+                other.SetOn(true);
+                mine.SetOn(true);
+            }
+            if (command == 1300) other.ToggleTuner();
+        }
+    };
+    std::vector<std::thread> threads;
+    threads.emplace_back(audio);
+    threads.emplace_back(display);
+    threads.emplace_back([&] { menu(first, second, 1); });
+    threads.emplace_back([&] { menu(second, first, 5); });
+    std::this_thread::sleep_for(std::chrono::milliseconds(1000));
+    stop = true;
+    for (auto& thread : threads) thread.join();
+    EXPECT_GT(frames, 0);
+    Tuner::SetDetectionMethod(0);
+    Tuner::SetShowDenoisedSpectrum(false);
+    Tuner::SetTemperament(0);
+    Tuner::SetNoteNaming(0);
+    Tuner::SetTunedQuantumPreset(3);
+}
+
+}  // namespace
