@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <bit>
 #include <charconv>
 #include <memory>
@@ -40,25 +41,22 @@ void CheckNumbers(const Arguments& arguments) {
 // The mean power spectrum of all whole windows of the input; an input shorter than one is followed by
 // silence.
 std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser, const Arguments& arguments) {
-    const int hop = kivspectrum::settings.hop_length;
-    std::vector<double> sum(analyser.GetPower().size()),
-        samples(static_cast<std::size_t>(hop) * static_cast<std::size_t>(input.Channels()));
+    const auto channels = static_cast<std::ptrdiff_t>(input.Channels());
+    std::vector<double> sum(analyser.GetPower().size());
+    std::vector<double> samples(static_cast<std::size_t>(arguments.length * channels));
     Progress progress("spectrum", input.Rate(), input.Frames(), arguments.writing.quiet);
     std::int64_t read = 0, spectra = 0;
-    for (;;) {
+    for (int wanted = arguments.length;; wanted = kivspectrum::settings.hop_length) {
         CheckInterrupted();
-        const int got = input.Read(samples.data(), hop);
-        if (got < hop && spectra > 0) break;  // what is left does not fill a window
-        if (got < hop)
-            std::fill(samples.begin() + std::ptrdiff_t{got} * input.Channels(), samples.end(), 0.0);
-        analyser.Feed(samples.data(), hop, input.Channels(), input.Channels());
-        read += hop;
-        progress.Update(read);
-        const bool prepared = analyser.PrepareFFTForDrawingHelper(false, false);
-        if (read < arguments.length || !prepared) continue;
+        const int got = input.Read(samples.data(), wanted);
+        if (got < wanted && spectra > 0) break;
+        std::fill(samples.begin() + got * channels, samples.end(), 0.0);
+        analyser.Feed(samples.data(), wanted, input.Channels(), input.Channels());
+        analyser.PrepareFFTForDrawingHelper(false, false);
         const auto& power = analyser.GetPower();
         for (std::size_t k = 0; k < sum.size(); ++k) sum[k] += power[k];
         ++spectra;
+        progress.Update(read += got);
     }
     for (double& power : sum) power /= static_cast<double>(spectra);
     return sum;
@@ -94,12 +92,14 @@ void Run(Arguments arguments) {
 
     AudioReader input(arguments.input);
     RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
+    OutputFile output(arguments.output, arguments.writing.rules);
     kivspectrum analyser;
     analyser.set_parameters(input.Rate());
     analyser.SetOn(true);
     const auto power = AveragePower(input, analyser, arguments);
     const std::string text = Csv(power, analyser.GetWindow(), input.Rate(), arguments.length);
-    WriteWholeFile(arguments.output, arguments.writing.rules, text.data(), text.size());
+    output.Bytes().Write(text.data(), text.size());
+    output.Commit();
 }
 
 }  // namespace
