@@ -95,8 +95,10 @@ BENCHMARK(BM_EqSingle)->Arg(3)->Arg(8)->Arg(20);
 #if DSP_HAVE_LIBAVFILTER
 void BM_FfmpegEqualizer(benchmark::State& state) {
     std::string chain;
-    for (int i = 0; i < state.range(0); ++i)
-        chain += (i ? "," : "") + ("equalizer=t=o:w=1.1:g=6:a=dii:r=f64:f=" + std::to_string(Frequency(i)));
+    for (int i = 0; i < state.range(0); ++i) {
+        if (i > 0) chain += ',';
+        chain.append("equalizer=t=o:w=1.1:g=6:a=dii:r=f64:f=").append(std::to_string(Frequency(i)));
+    }
     FfmpegPeer peer(chain, "dblp", kRate, kFrames);
     const auto input = TestSupport::Noise<double>(kFrames * kChannels);
     for (auto _ : state) peer.Run(input.data());

@@ -12,6 +12,7 @@ namespace dsphost {
 // main.cpp lists them. A command throws UserError, IoError or Interrupted.
 void AddEffectsCommand(CLI::App& app);
 void AddPitchCommand(CLI::App& app);
+void AddEqCurveCommand(CLI::App& app);
 void AddRenderCommand(CLI::App& app);
 void AddSpectrumCommand(CLI::App& app);
 

@@ -12,6 +12,7 @@
 #include "DSP/Effects/PitchShift.h"
 #include "DSP/Effects/TubeDistorsion.h"
 #include "EffectElement.h"
+#include "EqualiserElement.h"
 
 namespace dsphost {
 namespace {
@@ -56,6 +57,7 @@ std::span<const ElementKind> ElementKinds() {
                                return std::make_unique<EffectElement>(make, settings);
                            }});
         // What is no effect but can stand in a chain: one line each.
+        all.push_back({EqualiserElement::kName, std::make_unique<EqualiserElement, std::string_view>});
         return all;
     }();
     return kinds;

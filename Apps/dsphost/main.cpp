@@ -15,6 +15,7 @@ namespace {
 constexpr void (*kCommands[])(CLI::App&) = {
     AddEffectsCommand,
     AddPitchCommand,
+    AddEqCurveCommand,
     AddRenderCommand,
     AddSpectrumCommand,
 };
