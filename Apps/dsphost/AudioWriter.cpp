@@ -95,8 +95,8 @@ void AudioWriter::Commit() {
     m_output.Commit();
 }
 
-void WarnOfClipping(const AudioWriter& writer) {
-    if (const auto count = writer.ClippedSamples(); count > 0)
+void WarnOfClipping(const AudioWriter& writer, std::int64_t before) {
+    if (const auto count = writer.ClippedSamples() + before; count > 0)
         PrintMessage("warning: " + writer.Name() + ": " + std::to_string(count) +
                      (count == 1 ? " sample was clipped" : " samples were clipped"));
 }

@@ -57,7 +57,8 @@ private:
     std::int64_t m_clipped = 0, m_frames = 0;
 };
 
-// "3 samples of out.wav were clipped" on standard error when there were any.
-void WarnOfClipping(const AudioWriter& writer);
+// "3 samples of out.wav were clipped" on standard error when there were any; `before` were clipped already on
+// their way to the writer.
+void WarnOfClipping(const AudioWriter& writer, std::int64_t before = 0);
 
 }  // namespace dsphost

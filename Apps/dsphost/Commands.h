@@ -10,6 +10,7 @@ namespace dsphost {
 
 // Each command lives in a file of its own, adds itself to the command line, and runs from CLI11's callback;
 // main.cpp lists them. A command throws UserError, IoError or Interrupted.
+void AddConvertCommand(CLI::App& app);
 void AddEffectsCommand(CLI::App& app);
 void AddPitchCommand(CLI::App& app);
 void AddEqCurveCommand(CLI::App& app);

@@ -13,6 +13,7 @@ namespace {
 
 // One line registers a command.
 constexpr void (*kCommands[])(CLI::App&) = {
+    AddConvertCommand,
     AddEffectsCommand,
     AddPitchCommand,
     AddEqCurveCommand,

@@ -110,7 +110,7 @@ TEST(DitherTest, ConverterDrawsNumbersChannelByChannel) {
 // What a word-length reduction adds: truncation towards zero errs by 1/3 of a step squared, triangular
 // dither adds 1/6. Shaped curves add more in all and are only printed.
 TEST(DitherTest, NoiseFloorIsTruncationPlusTriangle) {
-    constexpr int kFrames = 50000;
+    constexpr int kFrames = 20000;
     auto input = TestSupport::Sine<double>(kFrames, 997.0, 44100, 0.7);
     const auto convert = [&]<typename Out>(Out, DitherCurve curve) {
         SamplingFrequencyConverter converter;

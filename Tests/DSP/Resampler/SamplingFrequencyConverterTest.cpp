@@ -70,7 +70,7 @@ TEST(SamplingFrequencyConverterTest, IsTheExactFilterForEveryPairOfFactors) {
     for (int up = 1; up <= 49; ++up)
         for (int down = 1; down <= 49; ++down) {
             if (std::gcd(up, down) > 1 && up != down) continue;
-            const auto input = TestSupport::Noise<double>(static_cast<std::size_t>(20 + 1200 / up), 1.0);
+            const auto input = TestSupport::Noise<double>(static_cast<std::size_t>(20 + 600 / up), 1.0);
             const auto exact = Plain::Convert(input, up, down);
             const double error = LargestDifference(Owned(up, down, 1).Convert(input), exact);
             ASSERT_LT(error, 1e-12) << up << "/" << down;
