@@ -64,7 +64,8 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
     if (GetParam().engineAllocates) GTEST_SKIP() << GetParam().engineAllocates;
     const auto effect = Make();
     const auto format = Format<float>();
-    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.2f, 0.2f, 0, 0}, {600, 600, 0.7f, 0.7f, 0, 0}};
+    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.2f, 0.2f, MP_CURVE_JUMP, 0},
+                                            {600, 600, 0.7f, 0.7f, MP_CURVE_JUMP, 0}};
     for (int index = 0; index < effect->GetParamCountReal(); index += 2)
         effect->AddEnvelope(index, 2, segments);
     effect->InitProcessing(256, &format);

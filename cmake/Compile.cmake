@@ -1,7 +1,8 @@
 # Compiler settings shared by the library, the programs and the tests.
 
 add_library(dsp_compile INTERFACE)
-target_compile_options(dsp_compile INTERFACE -Wall -Wextra -Wconversion -Wshadow)
+# The Windows headers declare names such as `byte` globally; hiding those is not our doing.
+target_compile_options(dsp_compile INTERFACE -Wall -Wextra -Wconversion -Wshadow$<$<BOOL:${WIN32}>:=local>)
 if(DSP_WARNINGS_AS_ERRORS)
     target_compile_options(dsp_compile INTERFACE -Werror)
 endif()

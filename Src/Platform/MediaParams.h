@@ -13,7 +13,13 @@
 enum MP_TYPE : std::uint32_t { MPT_INT = 0, MPT_FLOAT = 1, MPT_BOOL = 2, MPT_ENUM = 3 };
 using MP_CAPS = std::uint32_t;
 using MP_DATA = float;
-using MP_CURVE_TYPE = std::uint32_t;
+enum MP_CURVE_TYPE : std::uint32_t {
+    MP_CURVE_JUMP = 1,
+    MP_CURVE_LINEAR = 2,
+    MP_CURVE_SQUARE = 4,
+    MP_CURVE_INVSQUARE = 8,
+    MP_CURVE_SINE = 16,
+};
 using MP_FLAGS = std::uint32_t;
 
 struct _MP_PARAMINFO {

@@ -224,7 +224,8 @@ TEST(Compressor, AutomationReachesTheEditor) {
 TEST(Compressor, TakesEditsPresetsAndChunksWhileAutomated) {
     const auto format = Format<float>();
     Compressor effect;
-    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.4f, 0.4f, 0, 0}, {100, 100, 0.8f, 0.8f, 0, 0}};
+    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.4f, 0.4f, MP_CURVE_JUMP, 0},
+                                            {100, 100, 0.8f, 0.8f, MP_CURVE_JUMP, 0}};
     for (const int index : {0, 4, 6, 9}) effect.AddEnvelope(index, 2, segments);
     effect.InitProcessing(32, &format);
     std::atomic<bool> done{false};

@@ -75,7 +75,9 @@ int Slot(Member member) {
                             static_cast<std::ptrdiff_t>(sizeof(void*)));
 }
 
-MP_ENVELOPE_SEGMENT Jump(std::int64_t start, float value) { return {start, start, value, value, 0, 0}; }
+MP_ENVELOPE_SEGMENT Jump(std::int64_t start, float value) {
+    return {start, start, value, value, MP_CURVE_JUMP, 0};
+}
 
 }  // namespace
 

@@ -1,0 +1,21 @@
+# What only the Windows build has: a version resource, the compiler's runtime beside the programs, and the
+# package as a zip.
+
+enable_language(RC)
+configure_file(${CMAKE_CURRENT_LIST_DIR}/Version.rc.in ${CMAKE_BINARY_DIR}/Version.rc @ONLY)
+target_sources(DSPDll PRIVATE ${CMAKE_BINARY_DIR}/Version.rc)
+
+# An exception thrown in the DLL is caught in the host, so both must use one runtime: as DLLs, never linked in.
+foreach(name libgcc_s_dw2-1 libstdc++-6 libwinpthread-1)
+    execute_process(COMMAND ${CMAKE_CXX_COMPILER} -print-file-name=${name}.dll
+        OUTPUT_VARIABLE dll OUTPUT_STRIP_TRAILING_WHITESPACE)
+    if(NOT IS_ABSOLUTE "${dll}")
+        message(FATAL_ERROR "The compiler does not know where its ${name}.dll is.")
+    endif()
+    file(COPY_FILE ${dll} ${CMAKE_RUNTIME_OUTPUT_DIRECTORY}/${name}.dll ONLY_IF_DIFFERENT)
+    install(FILES ${dll} DESTINATION ${CMAKE_INSTALL_BINDIR})
+endforeach()
+
+set(CPACK_GENERATOR ZIP)
+set(CPACK_PACKAGE_FILE_NAME DSPDll-${PROJECT_VERSION}-win32)
+include(CPack)
