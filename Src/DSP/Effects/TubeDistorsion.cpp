@@ -274,11 +274,15 @@ template <typename Sample>
 void TubeDistorsion::RecentInput::Add(const Sample* samples, int frames, int channels) {
     const int added = std::min(frames, kFrames);
     samples += static_cast<std::ptrdiff_t>(frames - added) * channels;
-    for (int i = 0; i < added; ++i, samples += channels) {
-        m_frames[static_cast<std::size_t>(m_next)] = {static_cast<double>(samples[0]),
-                                                      static_cast<double>(samples[channels - 1])};
-        m_next = (m_next + 1) % kFrames;
-    }
+    const auto add = [&](int from, int to) {
+        for (int i = from; i < to; ++i, samples += channels)
+            m_frames[static_cast<std::size_t>(i)] = {static_cast<double>(samples[0]),
+                                                     static_cast<double>(samples[channels - 1])};
+    };
+    const int upToEnd = std::min(added, kFrames - m_next), rest = added - upToEnd;
+    add(m_next, m_next + upToEnd);
+    add(0, rest);
+    m_next = rest > 0 ? rest : (m_next + upToEnd) % kFrames;
 }
 
 void TubeDistorsion::RecentInput::Clear() { m_frames = {}; }

@@ -76,21 +76,17 @@ struct ArayaS {
     }
 };
 
-// Boosts and shapes the lanes of `sides` (left in the even ones), in place.
-template <typename Shaper, typename Sample>
-void Run(Sample* samples, std::size_t count, const Settings<xsimd::batch<Sample>>& settings,
-         const typename xsimd::batch<Sample>::batch_bool_type& sides) {
+// Replaces every register of interleaved samples, in place; what is left at the end goes through a copy.
+template <typename Sample, typename Change>
+void ForEachRegister(Sample* samples, std::size_t count, Change change) {
     using Lanes = xsimd::batch<Sample>;
-    const auto shape = [&](const Lanes& x) {
-        return xsimd::select(sides, Shaper::Apply(x * settings.boost, settings), x);
-    };
     std::size_t i = 0;
     for (; i + Lanes::size <= count; i += Lanes::size)
-        shape(Lanes::load_unaligned(samples + i)).store_unaligned(samples + i);
+        change(Lanes::load_unaligned(samples + i)).store_unaligned(samples + i);
     if (i == count) return;
     std::array<Sample, Lanes::size> rest{};
     std::copy(samples + i, samples + count, rest.begin());
-    shape(Lanes::load_unaligned(rest.data())).store_unaligned(rest.data());
+    change(Lanes::load_unaligned(rest.data())).store_unaligned(rest.data());
     std::copy_n(rest.begin(), count - i, samples + i);
 }
 

@@ -166,17 +166,22 @@ void VirtualTubeAmp::Shape(Sample* samples, int frames, int channels) const {
         alternating(left.boost, right.boost), alternating(left.drive, right.drive),
         alternating(left.shapeFactor, right.shapeFactor)};
     const auto count = static_cast<std::size_t>(frames) * static_cast<std::size_t>(channels);
-    const auto run = [&](int function, bool ofLeft, bool ofRight) {
-        const auto sides = alternating(ofLeft, ofRight) != xsimd::batch<Sample>(Sample(0));
-        WithShaper(function, [&]<typename Shaper>(Shaper) {
-            TubeShapers::Run<Shaper>(samples, count, settings, sides);
-        });
-    };
-    // Sides that differ go one after the other, each with the other's lanes left alone.
+    using Lanes = xsimd::batch<Sample>;
     const auto function = [](const Side& side) { return side.drive == 0.0f ? kFunctions : side.function; };
-    if (function(left) == function(right)) return run(function(left), true, true);
-    run(function(left), true, false);
-    run(function(right), false, true);
+    if (function(left) == function(right))
+        return WithShaper(function(left), [&]<typename Shaper>(Shaper) {
+            TubeShapers::ForEachRegister(
+                samples, count, [&](const Lanes& x) { return Shaper::Apply(x * settings.boost, settings); });
+        });
+    // Sides that differ go one after the other, each with the other's lanes left alone.
+    for (const bool ofLeft : {true, false}) {
+        const auto sides = alternating(ofLeft, !ofLeft) != Lanes(Sample(0));
+        WithShaper(function(ofLeft ? left : right), [&]<typename Shaper>(Shaper) {
+            TubeShapers::ForEachRegister(samples, count, [&](const Lanes& x) {
+                return xsimd::select(sides, Shaper::Apply(x * settings.boost, settings), x);
+            });
+        });
+    }
 }
 
 template void VirtualTubeAmp::FilterTone(float*, int, int);
