@@ -10,6 +10,7 @@
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
 #include "DSP/Effects/PitchShift.h"
+#include "DSP/Effects/Reverb.h"
 #include "DSP/Effects/TubeDistorsion.h"
 #include "EffectElement.h"
 #include "EqualiserElement.h"
@@ -33,6 +34,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::Phaser>,
     Make<Corvo::DSP::PitchShift>,
     Make<Corvo::DSP::Compressor>,
+    Make<Corvo::DSP::Reverb>,
 };
 // clang-format on
 

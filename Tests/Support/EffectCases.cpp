@@ -11,6 +11,7 @@
 #include "DSP/Effects/GainEfx.h"
 #include "DSP/Effects/Phaser.h"
 #include "DSP/Effects/PitchShift.h"
+#include "DSP/Effects/Reverb.h"
 #include "DSP/Effects/TubeDistorsion.h"
 
 namespace TestSupport {
@@ -67,6 +68,10 @@ constexpr std::array kEffects{
                .engineAllocates = "the engine grows its own buffers and is locked against edits",
                .startsBlank = true,
                .textTruncates = true},
+    EffectCase{.name = "Reverb",
+               .make = Make<Reverb>,
+               .otherBuild = OtherBuild::Relative,
+               .otherBuildReason = "powers of the gains, the input filter's design"},
 };
 
 }  // namespace

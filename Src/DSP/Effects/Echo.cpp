@@ -83,16 +83,6 @@ bool VisitWords(auto&& visit, auto& s) {
     return VisitOldWords(visit, s) && visit(s.mode) && visit(s.modeCopy);
 }
 
-// Reads words that each take 8 bytes.
-struct SpreadReader {
-    ChunkReader read;
-    bool operator()(std::int32_t& word) { return read(word) && read.Skip(4); }
-    template <std::size_t N>
-    bool operator()(std::array<std::int32_t, N>& words) {
-        return std::ranges::all_of(words, [this](std::int32_t& word) { return (*this)(word); });
-    }
-};
-
 }  // namespace
 
 Echo::Echo() { SetPreset(0); }
@@ -247,8 +237,9 @@ void Echo::SetPreset(int preset) {
 }
 
 void Echo::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
+    const auto settings = Snapshot(m_settings);
     ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && VisitWords(write, std::as_const(m_settings));
+    write(m_chunk_tag) && VisitWords(write, settings);
 }
 
 void Echo::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
@@ -267,7 +258,7 @@ bool Echo::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
     ChunkReader read(chunk);
     Props settings{};
     read(m_chunk_tag);
-    VisitOldWords(SpreadReader{read}, settings);
+    VisitOldWords(SpreadWordReader(read), settings);
     Assign(m_settings, settings);
     m_cook.store(true, std::memory_order_release);
     return true;
