@@ -50,8 +50,8 @@ public:
     int GetSettingsChunkSize() override;
     // A chunk below 92 bytes is ignored.
     void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
-    // The oldest layout, in which each word takes 8 bytes: 180 bytes. False, with nothing changed, when there are
-    // fewer.
+    // The oldest layout, in which each word takes 8 bytes: 180 bytes. False, with nothing changed, when there
+    // are fewer.
     bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
     // Frees the back-end; the next cook or block makes a new one.
     void Cleanup() override;
