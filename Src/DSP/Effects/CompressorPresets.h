@@ -40,7 +40,7 @@ inline constexpr std::array<CompressorPreset, 42> kCompressorPresets{{
     {"Soft Noise Gate",              0.0,   1.0,  0.0,   2.0,  20.0,  0.0,  {-46.0,  2.0, 30.0, 10.0}},
     {"Noise Gate",                   0.0,   1.0,  0.0,   0.5,  12.0,  0.0,  {-42.0,  8.0, 60.0}},
     {"Heavy Limiter",              -12.0, kLimit, 0.0,   0.05,  6.0},
-    {"Inverted dynamic",           -36.0,  -2.0,  0.0,   5.0,  12.0},
+    {"Inverted dynamic",           -30.0,  -2.5,  0.0,   5.0,  12.0, 12.0},
     {"Acoustic Guitar",            -22.0,   3.0,  6.0,  15.0,  12.0,  3.0},
     {"Angry Piano",                -28.0,   6.0,  4.0,   3.0,   8.0,  8.0},
     {"Big Red Kick",               -18.0,   5.0,  2.0,  20.0,   6.0,  4.0,  {-40.0,  4.0, 30.0}},
@@ -60,7 +60,7 @@ inline constexpr std::array<CompressorPreset, 42> kCompressorPresets{{
     {"Narrator",                   -26.0,   3.5,  8.0,   4.0,  16.0,  6.0,  {-52.0,  2.0, 24.0, 6.0}},
     {"Nashville Jangle",           -25.0,   6.0,  4.0,   7.0,   9.0,  6.5},
     {"Nice Overheads",             -18.0,   2.0, 10.0,  25.0,  20.0,  1.5},
-    {"Pump It",                    -32.0,  10.0,  0.0,  10.0,  30.0, 10.0},
+    {"Pump It",                    -24.0,   8.0,  0.0,   5.0,  20.0, 12.0},
     {"Radiant Guitar",             -24.0,   3.6, 10.0,  14.0,  22.0,  5.0},
     {"Rock Vox",                   -24.0,   6.0,  3.0,   3.0,   9.0,  7.0,  {-54.0,  2.5, 24.0}},
     {"Soft Mix Buss",              -14.0,   1.8, 12.0,  30.0,  20.0,  1.5},
@@ -71,7 +71,7 @@ inline constexpr std::array<CompressorPreset, 42> kCompressorPresets{{
     {"Velvet Kit",                 -20.0,   2.4, 12.0,  22.0,  16.0,  2.5},
     {"Vintage Electric Bass",      -26.0,   3.8, 12.0,   9.0,  30.0,  6.0},
     {"Vintage Organ",              -22.0,   2.6, 12.0,  12.0,  35.0,  3.5},
-    {"Vintage String Machines",    -28.0,   2.0, 14.0,  30.0,  50.0,  0.0,  {}, true, true},
+    {"Vintage String Machines",    -28.0,   2.0, 14.0,   4.0,  50.0,  0.0,  {}, true, true},
     {"Wurlie Rhodes",              -24.0,   3.4,  8.0,  18.0,  18.0,  4.0,  {}, false},
 }};
 // clang-format on
