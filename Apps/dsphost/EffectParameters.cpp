@@ -230,7 +230,8 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
                                                   : "accepted: " + Joined(choices, ", ")) +
                                  ", or a normalised value such as n:0.5";
     const std::size_t length = NumberLength(text);
-    if (text.empty() || (!choices.empty() && length == 0)) throw UserError(asked + accepted);
+    const bool list = parameter.type == EffectParameterType::List;
+    if (text.empty() || (!choices.empty() && (list || length == 0))) throw UserError(asked + accepted);
     float value = -1.0f;
     try {
         value = effect.GetParamValueNormalizedFromText(parameter.index, std::string(text));

@@ -124,6 +124,8 @@ TEST_F(RenderCommand, LetsALateEchoRingOut) {
                   {"5 apples", "4999 ms"});
     ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: Depth mode=slow"}), 2,
                   {"slow", "Time (log)"});
+    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Valvex: Oversampling=5"}), 2,
+                  {"5", "1, 2, 4, 8"});
     ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: preset=e, preset=s"}), 2, {"one preset"});
     ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Tremolo: preset=f00"}), 2,
                   {"f00", "Fast Tremolo"});
