@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -40,6 +41,13 @@ TEST_F(SampleFormats, KeepTheInputsSamplesAndFormat) {
         EXPECT_EQ(out.format & (SF_FORMAT_TYPEMASK | SF_FORMAT_SUBMASK),
                   in.format & (SF_FORMAT_TYPEMASK | SF_FORMAT_SUBMASK));
         EXPECT_EQ(out.rate, in.rate);
+        // The outermost size counts everything behind it, padding too.
+        const std::string bytes = Bytes("out-" + name);
+        std::uint32_t size = 0;
+        for (std::size_t i = 8; i-- > 4;) size = size << 8 | static_cast<unsigned char>(bytes[i]);
+        if (bytes.substr(0, 4) == "RIFF") {
+            EXPECT_EQ(size + 8, bytes.size());
+        }
     }
     // The same samples give the same bytes: no time stamps.
     EXPECT_EQ(Run({"render", "in-e.wav", "again.wav", "--fx", "Gain"}).status, 0);
