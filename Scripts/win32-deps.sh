@@ -63,6 +63,9 @@ build_all() {
     build googletest -DBUILD_GMOCK=OFF
     mv soundtouch-*/ soundtouch
     build soundtouch -DSOUNDSTRETCH=OFF -DBUILD_SHARED_LIBS=OFF
+    # Its CMake package leaves out the folder that its headers are in.
+    sed -i 's|{_IMPORT_PREFIX}/include;|{_IMPORT_PREFIX}/include/soundtouch;|' \
+        "$part/lib/cmake/SoundTouch/SoundTouchTargets.cmake"
     mv libsndfile-*/ libsndfile
     build libsndfile -DBUILD_SHARED_LIBS=OFF -DBUILD_PROGRAMS=OFF -DBUILD_EXAMPLES=OFF -DBUILD_TESTING=OFF \
         -DENABLE_EXTERNAL_LIBS=OFF -DENABLE_MPEG=OFF

@@ -27,13 +27,58 @@ if [ -f build/win32/CMakeCache.txt ] && ! grep -qF "$prefix/" build/win32/CMakeC
 cmake --preset win32 "${fresh[@]}" > /dev/null
 cmake --build --preset win32
 
-say "exported names"
-Tests/Exports/exports.sh check build/win32/bin/DSPDll.dll Tests/Exports/win32.txt
+# Every part runs even when one before it failed, so that one run tells all.
+failed=()
+part() {
+    say "$1"
+    set +e
+    (set -e; "${@:2}")
+    local status=$?
+    set -e
+    [ $status = 0 ] || failed+=("$1")
+}
 
-say "testing under Wine"
-report=build/win32/dsp_tests.report
-Scripts/win32-wine.sh build/win32/bin/dsp_tests.exe | tee "$report"
-grep -qE '^\[==========\] [1-9][0-9]* tests? from .* ran\.' "$report" || {
-    echo "win32: the test program ran no test"
+# GoogleTest's own report and verdict; a program that ran nothing has not passed.
+test_program() {
+    local report=build/win32/$1.report
+    Scripts/win32-wine.sh "build/win32/bin/$1.exe" | tee "$report"
+    grep -qE '^\[==========\] [1-9][0-9]* tests? from .* ran\.' "$report" || {
+        echo "$1 ran no test"
+        return 1
+    }
+}
+
+compare_builds() {
+    build_preset release record_effects compare_builds
+    build/release/bin/record_effects build/release/native.takes
+    Scripts/win32-wine.sh build/win32/bin/record_effects.exe win32.takes
+    build/release/bin/compare_builds build/release/native.takes build/win32/bin/win32.takes
+}
+
+# From the unpacked zip alone the host renders a file to the same bytes as the native one.
+try_package() {
+    local unpacked=build/win32/package/unpacked programs
+    cpack --config build/win32/CPackConfig.cmake -B build/win32/package > /dev/null
+    rm -rf "$unpacked"
+    unzip -q build/win32/package/DSPDll-*-win32.zip -d "$unpacked"
+    programs=$(echo "$unpacked"/*/bin)
+    ls "$programs"
+    build_preset release dsphost
+    local render=(render -q -y --fx "Gain: Gain=-3") host=build/release/bin/dsphost
+    "$host" render -q -y --fx Gain --format f32 /usr/share/sonic-pi/samples/loop_amen.flac "$programs/loop.wav"
+    "$host" "${render[@]}" "$programs/loop.wav" "$unpacked/here.wav"
+    Scripts/win32-wine.sh "$programs/dsphost.exe" "${render[@]}" loop.wav there.wav
+    cmp "$unpacked/here.wav" "$programs/there.wav"
+    echo "dsphost.exe rendered the same $(stat -c %s "$unpacked/here.wav") bytes as the native host"
+}
+
+part "tests under Wine" test_program dsp_tests
+part "exported names" Tests/Exports/exports.sh check build/win32/bin/DSPDll.dll Tests/Exports/win32.txt
+part "the native build and this one" compare_builds
+part "package" try_package
+
+[ ${#failed[@]} = 0 ] || {
+    printf '\nwin32: FAILED: %s\n' "${failed[@]}"
     exit 1
 }
+printf '\nwin32: everything passed\n'

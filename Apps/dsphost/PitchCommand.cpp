@@ -85,7 +85,8 @@ public:
         const std::int64_t count = std::min<std::int64_t>(frames - skipped, owed - m_output.FramesWritten());
         if (count <= 0) return;
         const auto first = block.begin() + static_cast<std::ptrdiff_t>(m_channels) * skipped;
-        m_samples.assign(first, first + static_cast<std::ptrdiff_t>(m_channels) * count);
+        m_samples.assign(
+            first, first + static_cast<std::ptrdiff_t>(m_channels) * static_cast<std::ptrdiff_t>(count));
         m_output.Write(m_samples.data(), count);
     }
 
