@@ -6,6 +6,7 @@ configure_file(${CMAKE_CURRENT_LIST_DIR}/Version.rc.in ${CMAKE_BINARY_DIR}/Versi
 target_sources(DSPDll PRIVATE ${CMAKE_BINARY_DIR}/Version.rc)
 
 # An exception thrown in the DLL is caught in the host, so both must use one runtime: as DLLs, never linked in.
+file(MAKE_DIRECTORY ${CMAKE_RUNTIME_OUTPUT_DIRECTORY})  # a fresh tree has none yet
 foreach(name libgcc_s_dw2-1 libstdc++-6 libwinpthread-1)
     execute_process(COMMAND ${CMAKE_CXX_COMPILER} -print-file-name=${name}.dll
         OUTPUT_VARIABLE dll OUTPUT_STRIP_TRAILING_WHITESPACE)

@@ -176,7 +176,7 @@ TEST(Compressor, RepairsWhatAChunkHolds) {
     Random random(21);
     for (std::size_t length = 0; length < 16300; length += 97) {
         Bytes bytes(length);
-        for (auto& byte : bytes) byte = static_cast<std::uint8_t>(random.Next());
+        for (auto& value : bytes) value = static_cast<std::uint8_t>(random.Next());
         check(bytes, std::to_string(length) + " random bytes");
     }
 }
