@@ -123,8 +123,7 @@ TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
     const auto effect = Make();
     for (int index = 0; index < effect->GetParamCount(); ++index) {
         // The host matches the texts of switches and lists itself.
-        if (effect->GetParameterTypeAutomatable(index) != Corvo::DSP::EffectParameterType::Continuous)
-            continue;
+        if (effect->GetParameterTypeAutomatable(index) != Corvo::EffectParameterType::Continuous) continue;
         for (int step = 0; step <= 100; ++step) {
             effect->SetParam(index, static_cast<float>(step) / 100.0f, false);
             const auto shown = NarrowText(*effect, index);

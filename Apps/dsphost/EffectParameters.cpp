@@ -12,8 +12,8 @@
 namespace dsphost {
 namespace {
 
+using Corvo::EffectParameterType;
 using Corvo::DSP::CorvoEffect;
-using Corvo::DSP::EffectParameterType;
 
 constexpr std::string_view kNormalisedMark = "n:";
 // Fine enough for the narrowest choice of any list.

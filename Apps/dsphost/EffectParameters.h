@@ -13,7 +13,7 @@ struct EffectParameter {
     int index = 0;      // external: what SetParam takes
     std::string label;  // with its side, " L" or " R", where it has one
     std::string unit;
-    Corvo::DSP::EffectParameterType type{};
+    Corvo::EffectParameterType type{};
     std::vector<std::string> values;  // the choices of a list
     float neutral = 0.5f;             // normalised
 

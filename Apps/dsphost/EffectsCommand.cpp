@@ -14,7 +14,7 @@
 namespace dsphost {
 namespace {
 
-using Corvo::DSP::EffectParameterType;
+using Corvo::EffectParameterType;
 using Json = nlohmann::ordered_json;
 
 struct Arguments {

@@ -13,6 +13,8 @@ constexpr double kMelCorner = 700.0;
 constexpr double kConcertPitch = 440.0;
 constexpr double kSemitones = 12.0;
 
+constexpr double kHighest = 1e9, kLargestRange = 1000.0;
+
 bool IsLogarithmic(FrequencyScale scale) {
     return scale != FrequencyScale::Linear && scale != FrequencyScale::Mel;
 }
@@ -25,8 +27,9 @@ CoordinatesAndFrequencies::CoordinatesAndFrequencies(const Corvo::RectF& rectang
     : m_rectangle(rectangle),
       m_frequencies(frequencies),
       m_levels(levels),
-      m_lowest(std::max(lowest, 0.0)),
-      m_highest(highest) {
+      // What is not a number becomes 0, what is out of reach the end of it.
+      m_lowest(lowest > 0.0 ? std::min(lowest, kHighest) : 0.0),
+      m_highest(highest > 0.0 ? std::min(highest, 2.0 * kHighest) : 0.0) {
     if (m_frequencies == FrequencyScale::Automatic)
         m_frequencies = m_highest < 4.0 * m_lowest ? FrequencyScale::Linear : FrequencyScale::Logarithmic;
     if (IsLogarithmic(m_frequencies)) m_lowest = std::max(m_lowest, kLowestLogarithmic);
@@ -40,7 +43,7 @@ CoordinatesAndFrequencies::CoordinatesAndFrequencies(const Corvo::RectF& rectang
     m_left = Position(m_lowest);
     m_span = Position(m_highest) - m_left;
     const bool decibels = m_levels == LevelScale::Decibels;
-    m_floor = decibels ? -std::max(static_cast<double>(range), 1.0) : 0.0;
+    m_floor = decibels ? -(range > 1.0f ? std::min(static_cast<double>(range), kLargestRange) : 1.0) : 0.0;
     m_top = decibels ? 0.0 : 1.0;
 }
 

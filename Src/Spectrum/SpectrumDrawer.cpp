@@ -57,7 +57,7 @@ bool SpectrumDrawer::SmoothFftSpectrum(const std::vector<float>& power, float co
         case kExponential: {
             const int hop = m_settings.hop_length >= 1 ? m_settings.hop_length : m_settings.window_length;
             const double rate = static_cast<double>(m_samplingRate) / std::max(hop, 1);
-            const double alpha = std::min(rate * static_cast<double>(coefficient), 1.0);
+            const double alpha = std::clamp(rate * static_cast<double>(coefficient), 0.0, 1.0);
             const auto fall = static_cast<float>(alpha);
             const auto rise = static_cast<float>(std::min(kRise * alpha, 1.0));
             const std::size_t bins = std::min(m_smoothed.size(), power.size());

@@ -13,6 +13,8 @@ using Corvo::LevelScale;
 
 namespace {
 
+constexpr float kWidest = 65536.0f;  // pixels
+
 // Through the middle two of four levels, without ever leaving the range between them.
 double Between(double before, double from, double to, double after, double share) {
     const auto slope = [](double left, double right) {
@@ -108,14 +110,15 @@ void SpectrumDrawer::AddCurve(const Corvo::RectF& rectangle, const CoordinatesAn
         return static_cast<double>(
             m_levels[static_cast<std::size_t>(std::clamp<std::ptrdiff_t>(k, 0, last))]);
     };
-    const int columns = static_cast<int>(std::ceil(rectangle.width));
+    const int columns = static_cast<int>(std::ceil(std::min(rectangle.width, kWidest)));
     const double left = rectangle.x, right = left + rectangle.width;
     double from = map.XToFrequency(left) * perHz;
     for (int column = 0; column < columns && from <= static_cast<double>(last + 1); ++column) {
         const double edge = std::min(left + column + 1.0, right);
         const double to = map.XToFrequency(edge) * perHz;
-        const auto first = static_cast<std::ptrdiff_t>(std::ceil(from));
-        const auto end = std::min(static_cast<std::ptrdiff_t>(std::ceil(to)), last + 1);
+        const double bins = static_cast<double>(last + 1);
+        const auto first = static_cast<std::ptrdiff_t>(std::ceil(std::clamp(from, 0.0, bins)));
+        const auto end = static_cast<std::ptrdiff_t>(std::ceil(std::clamp(to, 0.0, bins)));
         std::ptrdiff_t bin = first;
         double value;
         if (first < end) {
@@ -123,7 +126,7 @@ void SpectrumDrawer::AddCurve(const Corvo::RectF& rectangle, const CoordinatesAn
                 if (level(k) > level(bin)) bin = k;
             value = level(bin);
         } else {
-            const double middle = std::min((from + to) / 2.0, static_cast<double>(last));
+            const double middle = std::clamp((from + to) / 2.0, 0.0, static_cast<double>(last));
             const auto below = static_cast<std::ptrdiff_t>(middle);
             const double share = middle - static_cast<double>(below);
             value = Between(level(below - 1), level(below), level(below + 1), level(below + 2), share);
@@ -146,7 +149,7 @@ void SpectrumDrawer::AddBands(const Corvo::RectF& rectangle, const CoordinatesAn
         return std::floor(perOctave * std::log2(map.XToFrequency(x) / kCentre) + 0.5);
     };
     const double left = rectangle.x, right = left + rectangle.width;
-    const int columns = static_cast<int>(std::ceil(rectangle.width));
+    const int columns = static_cast<int>(std::ceil(std::min(rectangle.width, kWidest)));
     for (int column = 0; column < columns;) {
         const double band = bandAt(left + column + 0.5);
         if (edge(band) >= nyquist) break;

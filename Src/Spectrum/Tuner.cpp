@@ -39,8 +39,9 @@ bool Tuner::GetShowDenoisedSpectrum() { return g_choices.showDenoised; }
 
 void Tuner::SetTemperament(int temperament) {
     if (temperament == g_choices.temperament) return;
-    g_choices.temperamentChanged = true;
+    // Stored before it is announced, or a display thread could cook the old one.
     g_choices.temperament = Within(temperament, kTemperaments) ? temperament : 0;
+    g_choices.temperamentChanged = true;
     if (TuningListener* const listener = g_choices.listener) listener->NotesMustBeRecomputed();
 }
 int Tuner::GetTemperament() { return g_choices.temperament; }

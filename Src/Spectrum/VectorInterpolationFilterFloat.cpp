@@ -10,16 +10,20 @@ VectorInterpolationFilterFloat::~VectorInterpolationFilterFloat() = default;
 void VectorInterpolationFilterFloat::Resize(int spectra, int bins) {
     const bool usable = spectra > 0 && bins > 0;
     const auto count = static_cast<std::size_t>(usable ? spectra : 0);
-    m_bins = static_cast<std::size_t>(usable ? bins : 0);
+    const auto size = static_cast<std::size_t>(usable ? bins : 0);
     m_current = 0;
+    // Empty until all is there: the ring is large, and making it may throw.
+    m_weights.clear();
+    m_bins = 0;
+    m_ring.assign(count * size, 0.0f);
+    m_ring.shrink_to_fit();
     m_weights.resize(count);
+    m_bins = size;
     // The cosines of a whole turn sum to zero, so the weights sum to 1 without scaling.
     const double steps = static_cast<double>(count) + 1.0;
     for (std::size_t age = 0; age < count; ++age)
         m_weights[age] = static_cast<float>(
             (1.0 - std::cos(2.0 * std::numbers::pi * (static_cast<double>(age) + 1.0) / steps)) / steps);
-    m_ring.assign(count * m_bins, 0.0f);
-    m_ring.shrink_to_fit();
 }
 
 int VectorInterpolationFilterFloat::GetSpectra() const { return static_cast<int>(m_weights.size()); }

@@ -67,8 +67,8 @@ void kivspectrum::SetAnalysisWindowsOverlap(float overlap) {
     const double used = overlap < kLargestOverlap ? overlap : kLargestOverlap;
     settings.overlap = overlap < 1.0f ? overlap : kLargestOverlap;
     constexpr double kLongestHop = 1 << 30;
-    settings.hop_length =
-        static_cast<std::int32_t>(std::min((1.0 - used) * settings.window_length, kLongestHop));
+    const double hop = (1.0 - used) * settings.window_length;
+    settings.hop_length = hop > -kLongestHop ? static_cast<std::int32_t>(std::min(hop, kLongestHop)) : -1;
 }
 
 void kivspectrum::SetDpi(int dpi) {
@@ -91,6 +91,8 @@ kivspectrum::kivspectrum()
       m_drawer(std::make_unique<SpectrumDrawer>(spectrum_settings{})),
       m_filter(std::make_unique<VectorInterpolationFilterFloat>()),
       m_tuner(std::make_unique<Tuner>()) {
+    // Together: a menu command in between would not reach this analyser.
+    const Lock classLock(AnalyserLock());
     init();
     ObserverAdd(this, true);
 }
@@ -133,7 +135,12 @@ void kivspectrum::init() {
     m_builtWindowLength = settings.window_length;
     m_builtHopLength = settings.hop_length;
     UpdateDrawer(settings);
-    allocate(1);
+    try {
+        allocate(1);
+    } catch (...) {
+        m_builtHopLength = std::numeric_limits<std::int32_t>::min();  // the next init builds again
+        throw;
+    }
     m_capture->ClearPending();
 }
 
@@ -213,6 +220,7 @@ bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, boo
         const spectrum_settings current = settings;
         classLock.unlock();
 
+        const Corvo::DenormalGuard denormals;
         PerformFFT();
         ComputePower();
         if (samplingRate != m_drawer->GetSamplingFrequency()) m_drawer->UpdateSamplingFrequency(samplingRate);
@@ -242,9 +250,12 @@ void kivspectrum::PerformFFT() {
         const Lock instanceLock(m_instanceLock);
         const Corvo::DenormalGuard denormals;
         m_capture->CopyTo(m_samples);
-        const std::size_t windowed = std::min(m_window.size(), m_samples.size());
+        // Alike, unless memory ran out while they grew.
+        const std::size_t length = std::min(m_samples.size(), m_transform.size());
+        const std::size_t windowed = std::min(m_window.size(), length);
         for (std::size_t i = 0; i < windowed; ++i) m_transform[i] = m_samples[i] * m_window[i];
-        std::copy(m_samples.begin() + static_cast<std::ptrdiff_t>(windowed), m_samples.end(),
+        std::copy(m_samples.begin() + static_cast<std::ptrdiff_t>(windowed),
+                  m_samples.begin() + static_cast<std::ptrdiff_t>(length),
                   m_transform.begin() + static_cast<std::ptrdiff_t>(windowed));
         if (m_transform.size() == static_cast<std::size_t>(m_builtFftLength))
             m_fft.DoFFTReal(m_transform.data(), 0, 0);

@@ -68,6 +68,7 @@ constexpr std::array<Row, 10> kRows{{
 
 constexpr std::array<std::string_view, 2> kChoices{"Disabled", "Enabled"};
 constexpr std::int32_t kSilent = -960;
+constexpr std::int32_t kLoudest = 200, kWhole = 1000;
 constexpr double kPerMille = 0.001;
 constexpr double kRadiansPerRateStep = 0.06283185307179587;  // 2 pi / 100
 constexpr std::size_t kWords = sizeof(Props) / 4;
@@ -265,9 +266,11 @@ void Autovol::InitState(const Props& settings, const tWAVEFORMATEX& format, bool
         auto& side = (*m_sides)[i];
         if (force) side.oscillator.SetPhase(0.0);
         side.oscillator.SetIncrement(kRadiansPerRateStep * settings.rate[i] / hz);
-        const double gain = GainFromTenthsOfDb(settings.outGain[i], kSilent);
+        // Words of a chunk may be anything; they sound like the nearest that the knobs reach.
+        const double gain = GainFromTenthsOfDb(std::min(settings.outGain[i], kLoudest), kSilent);
         const double signedGain = settings.invert[i] == 1 ? -gain : gain;
-        const double depth = settings.depth[i] * kPerMille, mix = settings.mix[i] * kPerMille;
+        const double depth = std::clamp(settings.depth[i], 0, kWhole) * kPerMille;
+        const double mix = std::clamp(settings.mix[i], 0, kWhole) * kPerMille;
         if (settings.ringMod[i] == 1) {
             side.amplitude = mix * signedGain;
             side.offset = (1.0 - mix) * signedGain;

@@ -202,7 +202,10 @@ void Compressor::SetParamFromUi(int index, float normalised, bool submit) {
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
     SetParamInternal(index, normalised, m_ui->edited.settings.parameters, nullptr);
-    if (submit) SubmitUiSettingsChange();
+    if (submit)
+        SubmitUiSettingsChange();
+    else
+        ++m_ui->edited.submission;  // curves that come back from the audio side do not know this edit
 }
 
 void Compressor::SetParamInternal(int index, float normalised, Parameters& parameters, CompMapStereo* map) {
@@ -240,11 +243,13 @@ void Compressor::SetParamInternal(int index, float normalised, Parameters& param
 
 void Compressor::AdjustThreshold(std::int32_t tenths, std::size_t channel, CompMapStereo* map) {
     auto& m_comp_map = (map ? *map : m_ui->edited.settings.map).m_comp_map;
+    if (channel >= m_comp_map.size()) return;
     m_comp_map[channel].MoveThreshold(std::clamp(tenths, kLowestThreshold, kHighestThreshold));
 }
 
 void Compressor::AdjustRatio(std::int32_t step, std::size_t channel, CompMapStereo* map) {
     auto& m_comp_map = (map ? *map : m_ui->edited.settings.map).m_comp_map;
+    if (channel >= m_comp_map.size()) return;
     m_comp_map[channel].SetRatioStep(std::clamp(step, 0, kRatioSteps));
 }
 
@@ -312,7 +317,8 @@ std::wstring Compressor::GetParameterFormattedText(int index, double value) {
             const auto canale = SideOf(index);
             const auto& m_comp_map = m_ui->edited.settings.map.m_comp_map;
             const auto* itThreshold = m_comp_map[canale].Threshold();
-            DSP_ASSERT(itThreshold != m_comp_map[canale].end(), "Src/DSP/Effects/Compressor");
+            if (itThreshold == m_comp_map[canale].end())
+                ReportAssertion("Src/DSP/Effects/Compressor", "itThreshold!=m_comp_map[canale].end()");
             text = PairOf(index) == kRatio
                        ? RatioText(m_comp_map[canale])
                        : FormatTenthsOfDb(m_comp_map[canale].ThresholdTenths(), kLowestThreshold);
@@ -330,7 +336,8 @@ float Compressor::GetParamValueNormalizedFromText(int index, std::string text) {
     switch (PairOf(index)) {
         case kAttack:
         case kRelease: {
-            const float ms = std::clamp(ParseNumber(text), 0.0f, kLongestTime * 0.01f);
+            const float parsed = ParseNumber(text);
+            const float ms = parsed > 0.0f ? std::min(parsed, kLongestTime * 0.01f) : 0.0f;  // of NaN too
             return map.Normalised(Hundredths(ms));
         }
         case kOutGain:

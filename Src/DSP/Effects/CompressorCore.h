@@ -232,7 +232,7 @@ Parameters RunCore(const Frame& frame, int frames, const std::array<std::size_t,
     }
 
     for (std::size_t lane = 0; lane < 2; ++lane) {
-        state.envelope[channel[lane]] = envelope.get(0);
+        state.envelope[channel[lane]] = envelope.get(0);  // so that unlinking starts from where both are
         state.segment[channel[lane]] = at.segment[lane];
         state.displayGain[channel[lane]] = display.get(lane);
     }

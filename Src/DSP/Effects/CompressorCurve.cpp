@@ -163,7 +163,9 @@ void TransferCurve::Redraw(float knee, double slope) {
     for (int i = 0; i <= kSegmentsAbove; ++i) {
         const double up = range * i / kSegmentsAbove;
         const double x = i == 0 ? knee : i == kSegmentsAbove ? 1.0 : knee * std::exp(up);
-        Add(x, std::min(pivot * std::exp(up * slope), static_cast<double>(kHighestLevel)));
+        // From 0 no slope leads anywhere; a steep one would make it 0 times infinity.
+        Add(x,
+            pivot > 0.0 ? std::min(pivot * std::exp(up * slope), static_cast<double>(kHighestLevel)) : 0.0);
     }
     std::fill(points.begin() + count, points.end(), CurvePoint{});
     UpdateSlopes();

@@ -129,7 +129,7 @@ int CorvoEffectBase::GetSidechainBusNumChannels(int bus) {
 }
 
 void CorvoEffectBase::AddEnvelope(int index, int count, const MP_ENVELOPE_SEGMENT* segments) {
-    if (index < 0) return;
+    if (index < 0 || index >= GetParamCountReal()) return;
     const auto parameter = static_cast<std::size_t>(index);
     // Before the first cook there is no array yet; positions stay with the cook, so nothing plays early.
     if (parameter >= m_envelopes.size()) m_envelopes.resize(parameter + 1);

@@ -16,10 +16,12 @@
 #include "Platform/MediaParams.h"
 #include "Platform/WaveFormat.h"
 
-namespace Corvo::DSP {
+namespace Corvo {
 
 // How the host automates a parameter.
 enum class EffectParameterType : int { Continuous = 0, Switch = 1, List = 2 };
+
+namespace DSP {
 
 // The contract between the host and every effect.
 //
@@ -214,4 +216,5 @@ protected:
     TailRecord m_tail;
 };
 
-}  // namespace Corvo::DSP
+}  // namespace DSP
+}  // namespace Corvo

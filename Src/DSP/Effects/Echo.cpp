@@ -294,9 +294,11 @@ bool Echo::InitState(bool reset) {
 bool Echo::LayRing(std::array<int, 2> lengths, bool reset) {
     const int used = std::max(lengths[0], lengths[1]), sides = Sides();
     if (!m_ring || reset || used != std::max(m_lengths[0], m_lengths[1])) {
-        // On reset the memory of every edit to come is made and touched. One more for an odd length.
+        // At first and on reset the memory of every edit to come is made and touched. One more for an odd
+        // length.
         const double hz = std::min(static_cast<double>(m_format.nSamplesPerSec), kFastestHz);
-        const int wanted = 1 + (reset ? std::max(used, static_cast<int>(kLongestTimeMs * 0.001 * hz)) : used);
+        const bool whole = reset || !m_ring;
+        const int wanted = 1 + (whole ? std::max(used, static_cast<int>(kLongestTimeMs * 0.001 * hz)) : used);
         if (wanted > m_capacity) {
             std::unique_ptr<float[]> grown(new (std::nothrow) float[static_cast<std::size_t>(wanted)]);
             if (!grown) return false;

@@ -19,7 +19,7 @@ constexpr std::array<std::string_view, kModes> kModeNames{"Time (linear)", "Time
 constexpr std::array<std::string_view, 10> kNotes{"1/256", "1/128", "1/64", "1/32", "1/16",
                                                   "1/8",   "1/4",   "1/2",  "Beat", "Measure"};
 constexpr int kBeat = 8, kMeasure = 9;
-constexpr std::int32_t kTopWord = 10000, kWordsPerNote = 1000;
+constexpr std::int32_t kWordsPerNote = 1000;
 
 struct Tempo {
     double bpm;
@@ -31,8 +31,8 @@ inline bool IsTempo(std::int32_t mode) { return mode >= kStraight && mode <= kDo
 
 inline int NoteIndex(std::int32_t word) { return std::clamp(word / kWordsPerNote, 0, kMeasure); }
 
-// The constants are single-precision roundings of 60000, 62.5 and 1/3: delays in saved projects were made
-// with them.
+// One and two single-precision steps off 60000 and 62.5, and 1/3 in single precision: delays in saved
+// projects were made with them.
 inline double NoteMs(int note, std::int32_t mode, const Tempo& tempo) {
     const double ms = note == kMeasure
                           ? 3840.0 / tempo.denominator * (62.500004 / tempo.bpm) * tempo.numerator
@@ -50,11 +50,12 @@ inline double Ms(std::int32_t word, std::int32_t mode, const Tempo& tempo) {
     return IsTempo(mode) ? NoteMs(NoteIndex(word), mode, tempo) : 1.0;
 }
 
-// The word of a time mode whose delay is `ms`, within its range.
+// The word of a time mode whose delay is `ms`. It may lie above what the parameter reaches: 10 s in the
+// logarithmic mode is 10817.
 inline std::int32_t Word(std::int32_t mode, double ms) {
     const double word =
         mode == kLinear ? ms : 1.0 - std::trunc(-1174.6484375 * std::log(std::max(20.0, ms) - 19.0));
-    return word > 0.0 ? static_cast<std::int32_t>(std::min<double>(word, kTopWord)) : 0;
+    return word > 0.0 ? static_cast<std::int32_t>(std::min(word, 1e6)) : 0;
 }
 
 // The note whose delay is nearest to `ms`.

@@ -161,6 +161,7 @@ void GainEfx::GetParamSectionInfo(int index, PluginParameterInfo& info) {
     if (!Has(index)) return;
     const auto parameter = static_cast<std::size_t>(index);
     auto knobs = m_knobs;
+    if (m_had_stereo.load(std::memory_order_relaxed)) SetKnobsLayout(false, knobs);  // a label that stays
     SetKnobsLayout(m_mono_layout.load(std::memory_order_relaxed), knobs);
     info = knobs[parameter];
     info.hidden = kRows[parameter].stereoOnly && m_stereo_hidden.load(std::memory_order_relaxed);
@@ -184,6 +185,7 @@ void GainEfx::CheckCookProperties(const tWAVEFORMATEX* format, bool) {
     const bool mono = m_format.nChannels != 2;
     m_stereo_hidden.store(mono, std::memory_order_relaxed);
     if (!m_layout_dirty.exchange(false, std::memory_order_acquire) && mono == wasMono) return;
+    if (!mono) m_had_stereo.store(true, std::memory_order_relaxed);
     m_mono_layout.store(mono, std::memory_order_relaxed);
     SetUpdateUiFromScratch(true);
 }

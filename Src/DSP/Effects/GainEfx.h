@@ -59,6 +59,7 @@ private:
     bool m_separate_settings = false;
     std::atomic<bool> m_layout_dirty{false};
     std::atomic<bool> m_mono_layout{true};
+    std::atomic<bool> m_had_stereo{false};
     std::atomic<bool> m_stereo_hidden{false};  // the controls that only a stereo stream has
 };
 

@@ -18,19 +18,22 @@ struct Coefficients {
     }
 };
 
-// Whole frames side by side in one register, left in the even lanes. The right lanes compute (R - L) * side,
-// the exact negative of the difference, so every sample has the bits of the plain form.
+// Whole frames side by side in one register, left in the even lanes. Both lanes of a frame compute L - R, and
+// the right one multiplies it by -side: every sample has the bits of the plain form, signed zeros included.
 template <typename Sample>
 class InterleavedFrames {
 public:
     using Batch = xsimd::batch<Sample>;
 
     explicit InterleavedFrames(const Coefficients<Sample>& c)
-        : m_side(c.side), m_mid(c.mid), m_gain(xsimd::select(EvenLanes(), Batch(c.left), Batch(c.right))) {}
+        : m_side(EvenOdd(c.side, -c.side)),
+          m_mid(c.mid),
+          m_gain(EvenOdd(c.left, c.right)),
+          m_rightSign(EvenOdd(Sample(0.0), Sample(-0.0))) {}
 
     Batch operator()(const Batch& x) const {
-        const Batch swapped = xsimd::swizzle(x, xsimd::make_batch_constant<Index, Neighbour>());
-        return ((x - swapped) * m_side + (x + swapped) * m_mid) * Batch(Sample(0.5)) * m_gain;
+        const Batch y = x ^ m_rightSign;  // L, -R
+        return ((y + Swapped(y)) * m_side + (x + Swapped(x)) * m_mid) * Batch(Sample(0.5)) * m_gain;
     }
 
 private:
@@ -41,11 +44,15 @@ private:
     struct Even {
         static constexpr bool get(std::size_t lane, std::size_t) { return lane % 2 == 0; }
     };
-    static typename Batch::batch_bool_type EvenLanes() {
-        return xsimd::make_batch_bool_constant<Batch, Even>();
+    static Batch Swapped(const Batch& x) {
+        return xsimd::swizzle(x, xsimd::make_batch_constant<Index, Neighbour>());
+    }
+    static Batch EvenOdd(Sample even, Sample odd) {
+        const typename Batch::batch_bool_type lanes = xsimd::make_batch_bool_constant<Batch, Even>();
+        return xsimd::select(lanes, Batch(even), Batch(odd));
     }
 
-    Batch m_side, m_mid, m_gain;
+    Batch m_side, m_mid, m_gain, m_rightSign;
 };
 
 template <typename Sample>

@@ -1,5 +1,6 @@
 #include "DSP/Effects/MemoryFile.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
@@ -16,6 +17,8 @@ using Corvo::DSP::LittleEndianValue;
 
 // Growth is linear on purpose: the files are small, and 32-bit hosts are short of contiguous memory.
 constexpr std::int32_t kGrowth = 102400;
+
+constexpr std::int32_t kFirstRoom = 4096;  // elements to make room for before they have been seen
 
 template <typename T>
 void WriteValue(CFileBase& file, T value) {
@@ -86,14 +89,14 @@ void CMemoryFile::Reserve(std::int64_t size) {
 }
 
 std::int64_t CMemoryFile::Write(const void* source, std::int64_t count) {
-    if (m_position < 0 || count <= 0 || !source) return 0;
+    if (m_position < 0 || count < 0 || (!source && count > 0)) return 0;
     // Past the largest file there is: fails in Reserve like any other shortage of memory.
     const std::int64_t room = std::numeric_limits<std::int64_t>::max() - kGrowth - m_position;
     const std::int64_t end =
         count > room ? std::numeric_limits<std::int64_t>::max() - kGrowth : m_position + count;
     Reserve(end);
     if (end > m_size) m_size = end;
-    std::memcpy(m_data + m_position, source, static_cast<std::size_t>(count));
+    if (count > 0) std::memcpy(m_data + m_position, source, static_cast<std::size_t>(count));
     m_position += count;
     return count;
 }
@@ -129,11 +132,10 @@ void WriteDoubles(CFileBase& file, const std::vector<double>& values) {
 
 void ReadDoubles(CFileBase& file, std::vector<double>& values) {
     const auto count = ReadValue<std::int32_t>(file);
-    const std::int64_t left = file.GetLength() - file.GetPosition();
-    if (count < 0 || count > left / static_cast<std::int64_t>(sizeof(double)))
-        throw CorvoException("Error reading data");
+    if (count < 0) throw CorvoException("Error reading data");
     std::vector<double> read;
-    read.reserve(static_cast<std::size_t>(count));
+    // Grows with what is really there: the count may promise more than the file has left.
+    read.reserve(static_cast<std::size_t>(std::min(count, kFirstRoom)));
     for (std::int32_t i = 0; i < count; ++i) read.push_back(ReadValue<double>(file));
     values = std::move(read);
 }

@@ -40,7 +40,8 @@ public:
     ~CMemoryFile() override;
 
     // Writes `count` bytes at the position, growing the file; a gap left by seeking past the end is not
-    // cleared at the seek, but memory is zeroed when it is obtained. A negative position or count, or null,
+    // cleared at the seek, but memory is zeroed when it is obtained. A count of 0 only makes the
+    // file reach to the position. A negative position or count, or null,
     // writes nothing and returns 0. Throws CorvoException with the system's error text when memory runs
     // out; the file is not usable afterwards.
     std::int64_t Write(const void* source, std::int64_t count) override;

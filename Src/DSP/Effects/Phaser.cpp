@@ -133,9 +133,10 @@ std::wstring Phaser::GetParameterFormattedText(int index, double value) {
     if (!Has(index)) return {};
     const auto normalised = static_cast<float>(value);
     if (index == kStages) {
-        // No position of the knob stands for the presets' 0 stages.
+        // No position of the knob stands for the presets' 0 stages, nor for more than it reaches.
         const auto stored = LoadShared(m_settings.stages);
-        return FormatInteger(stored < 1 && normalised == GetParam(index) ? stored : StagesFrom(normalised));
+        const bool beyond = stored < 1 || stored > PhaserImpl::kMaxStages;
+        return FormatInteger(beyond && normalised == GetParam(index) ? stored : StagesFrom(normalised));
     }
     const Row& row = RowAt(index);
     return WithUnit(FormatFixed(Limited(normalised) * row.span * row.shown, row.decimals), row.unit);

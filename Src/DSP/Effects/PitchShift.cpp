@@ -2,6 +2,7 @@
 
 #include <cmath>
 #include <mutex>
+#include <new>
 
 #include "DSP/Effects/FixedPoint.h"
 #include "DSP/Effects/ParameterTable.h"
@@ -168,12 +169,12 @@ bool PitchShift::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
 }
 
 void PitchShift::TakeRecord(const _transform_props& record) {
-    Assign(m_record, record);
     {
         const std::lock_guard lock(m_lock);
         const int wanted = BackEndIndex(record);
         if (m_back_end.index != wanted && m_spare.index != wanted)
             m_spare = {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(wanted)), wanted};
+        Assign(m_record, record);  // last: a cook that reads it finds the back-end ready
     }
     m_cook.store(true, std::memory_order_release);
 }
@@ -193,7 +194,11 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const bool newFormat = format->nChannels != m_format.nChannels ||
                            format->nSamplesPerSec != m_format.nSamplesPerSec || !m_back_end.adapter;
     if (!m_cook.exchange(false, std::memory_order_acquire) && !force && !newFormat) return;
-    if (InitState(Snapshot(m_record), format, force))
+    // Held from before the record is read: an edit in between would reach the back-end first and be
+    // overwritten.
+    std::unique_lock lock(m_lock, std::defer_lock);
+    if (force) lock.lock();
+    if ((force || lock.try_lock()) && InitState(Snapshot(m_record), format, force))
         m_format = *format;
     else
         m_cook.store(true, std::memory_order_release);  // the next block tries again
@@ -207,11 +212,20 @@ bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* 
         return false;
     InitEnvelopes(true);
     m_channel_count = format->nChannels;
+    try {
+        ConfigureBackEnd(record, format);
+    } catch (const std::bad_alloc&) {
+        return false;  // the next block tries again
+    }
+    return true;
+}
+
+void PitchShift::ConfigureBackEnd(const _transform_props& record, const tWAVEFORMATEX* format) {
     const int wanted = BackEndIndex(record);
     if (m_back_end.index != wanted) std::swap(m_back_end, m_spare);
     if (m_back_end.index != wanted)
         m_back_end = {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(wanted)), wanted};
-    if (m_channel_count < 1 || m_channel_count > kMostChannels) return true;
+    if (m_channel_count < 1 || m_channel_count > kMostChannels) return;
 
     PitchAdapter& adapter = *m_back_end.adapter;
     adapter.SetChannelsNum(m_channel_count);
@@ -220,7 +234,6 @@ bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* 
     adapter.SetFFTSize(record.fftSize);
     adapter.SetQuality(record.quality);
     adapter.CookFactors();
-    return true;
 }
 
 void PitchShift::CookPitchShift(const _transform_props& record, int channels) {

@@ -36,8 +36,9 @@ static_assert(sizeof(_transform_props) == 88);
 // Left and right are one external parameter, "Pitch". A new instance has an empty record, at the lowest
 // pitch: load a preset or a chunk first.
 //
-// Threads: as in CorvoEffectBase. An edit reaches the back-end at once and, with "New", restarts it; the
-// audio thread never waits for that. Back-ends are made and freed on the user-interface side.
+// Threads: as in CorvoEffectBase. An edit reaches the back-end at once and, with "New", restarts it under the
+// back-end's own lock, which a block may wait for briefly; for the effect's lock the audio thread only tries.
+// Back-ends are made and freed on the user-interface side, but for the one a block makes after Cleanup.
 class DSP_API PitchShift : public CorvoEffect {
 public:
     PitchShift();
@@ -91,6 +92,7 @@ private:
         int index = -1;
     };
 
+    void ConfigureBackEnd(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format);
     // User-interface side: stores a record and has the back-end it asks for ready before the audio thread
     // looks.
     void TakeRecord(const PitchShiftPrivate::_transform_props& record);

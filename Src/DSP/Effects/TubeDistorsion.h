@@ -37,8 +37,8 @@ public:
     // 44 bytes: the leading word and the ten values as floats.
     void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
     int GetSettingsChunkSize() override;
-    // A chunk below 44 bytes is ignored. Values are stored as they come; out of range, they sound like the
-    // nearest end, a boost like none.
+    // A chunk below 44 bytes is ignored. Values are stored as they come; out of range, drive, function and
+    // oversampling act like the nearest end, a boost like none, and the tone follows its formula.
     void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
     // Clears the filters and frees the buffers; until the next InitProcessing blocks take longer.
     void Cleanup() override;

@@ -35,10 +35,10 @@ int Convert(SamplingFrequencyConverter& converter, int frames, void* in, void* o
 }  // namespace
 
 TubeOversampling::TubeOversampling() {
-    AllDesigns();
-    m_up.InitConversionByFactors(kLargestFactor, 1);
+    // Designs that live on, so that Restart never drops the last reference to one while audio runs.
+    m_up = AllDesigns().up[kLargestFactor];
     m_up.Init(kMaxChannels);
-    m_down.InitConversionByFactors(1, kLargestFactor);
+    m_down = AllDesigns().down[kLargestFactor];
     m_down.Init(kMaxChannels);
 }
 

@@ -66,12 +66,12 @@ int VirtualTubeAmp::OversamplingFactor(float normalised) {
         int factor;
     } kTable[] = {{0.18f, 1}, {0.36f, 2}, {0.54f, 4}, {0.72f, 8}, {0.8f, 12}};
     for (const auto& row : kTable)
-        if (normalised < row.below) return row.factor;
+        if (!(normalised >= row.below)) return row.factor;  // NaN is no factor above 1
     return 16;
 }
 
 int VirtualTubeAmp::FunctionIndex(float normalised) {
-    return normalised < 0.25f ? 0 : normalised < 0.5f ? 1 : normalised < 0.75f ? 2 : 3;
+    return normalised >= 0.75f ? 3 : normalised >= 0.5f ? 2 : normalised >= 0.25f ? 1 : 0;
 }
 
 void VirtualTubeAmp::SetParameter(const Values& values, int changed) {

@@ -28,7 +28,7 @@ struct EqLanes<xsimd::sse2> {
     template <int Channels>
     static V Load(const float* frame) {
         if constexpr (Channels == 1) return V(_mm_set1_pd(*frame));
-        return V(_mm_cvtps_pd(_mm_castpd_ps(_mm_load_sd(reinterpret_cast<const double*>(frame)))));
+        return V(_mm_cvtps_pd(_mm_castsi128_ps(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(frame)))));
     }
     // `Channels` lanes from lane `lane` on.
     template <int Channels>

@@ -20,7 +20,8 @@ int BandsInUse(const builtin_effects_data& record) { return std::clamp(record.nu
 // The highest frequency below half the rate. A peak's warping is valid anywhere.
 double DesignFrequency(const _eq_data& band, int sampleRate) {
     const int freq = std::max(band.freq, 1);
-    return band.filter_type() == EQ_PEAK ? freq : std::min(freq, std::max((sampleRate - 1) / 2, 1));
+    const int highest = sampleRate > 2 ? (sampleRate - 1) / 2 : 1;
+    return band.filter_type() == EQ_PEAK ? freq : std::min(freq, highest);
 }
 
 bool IsFlat(const _eq_data& band) {

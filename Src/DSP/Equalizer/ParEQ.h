@@ -52,7 +52,8 @@ public:
     // missing channel is made, as by Resize(channel + 1). Null below 0.
     kivspectrum* GetSpectrum(int channel);
 
-    // Forgets that coefficients are gliding: they rest where they are until the next glide begins.
+    // Forgets that coefficients are gliding: they rest where they are, whatever a smooth Cook asks of them,
+    // until another coefficient begins to glide or a Cook without `smooth` makes them jump.
     void ResetProcessing();
 
     // Processes interleaved float or double samples in place. `records` is an array with one record per

@@ -60,7 +60,7 @@ public:
     virtual void SetChannelsNum(int channels);
     // "New" shifts all channels by channel 0's factor, at least 0.02; "Classic" has one for each of two.
     virtual void SetPitchFactor(int channel, float factor) = 0;
-    // "New" only: playback speed, which moves the pitch along. What is not above 0 is ignored.
+    // "New" only: playback speed, 0.01 to 100, which moves the pitch along. What is not above 0 is ignored.
     virtual void SetSpeed(float speed);
     // "Classic" only: derives everything from the configuration and starts afresh.
     virtual void CookFactors();

@@ -113,7 +113,8 @@ void PitchAdapterCorvoOld::CookFactors() {
 void PitchAdapterCorvoOld::ProcessInPlace(double*, int) {}
 
 void PitchAdapterCorvoOld::ProcessInPlace(float* buffer, int frames) {
-    if (m_window.empty()) return;
+    // A new frame size waits for CookFactors.
+    if (m_window.empty() || m_window.size() != static_cast<std::size_t>(m_size)) return;
     const DenormalGuard guard;
     for (int channel = 0; channel < std::min(m_channels, 2); ++channel) {
         const auto side = static_cast<std::size_t>(channel);

@@ -22,6 +22,8 @@ constexpr int kHighestRate = 192000;
 constexpr float kLowestPitch = 0.02f;
 // Above this the engine would make thousands of frames of every one it is given.
 constexpr float kHighestPitch = 64.0f;
+// Beyond these the engine's own counts overflow.
+constexpr float kLowestSpeed = 0.01f, kHighestSpeed = 100.0f;
 // Blocks up to this size need no new memory, whatever their precision.
 constexpr std::size_t kScratchSamples = 16384;
 
@@ -33,7 +35,8 @@ std::size_t Samples(int frames, int channels) {
 
 }  // namespace
 
-PitchAdapterSoundTouch::PitchAdapterSoundTouch() : m_fadePosition(ShortFaderNumSamples() + 1) {
+PitchAdapterSoundTouch::PitchAdapterSoundTouch()
+    : m_fadePosition(static_cast<std::int64_t>(static_cast<std::uint64_t>(ShortFaderNumSamples()) + 1)) {
     m_scratch.reserve(kScratchSamples);
 }
 PitchAdapterSoundTouch::~PitchAdapterSoundTouch() = default;
@@ -96,6 +99,7 @@ void PitchAdapterSoundTouch::SetPitchFactor(int channel, float factor) {
 
 void PitchAdapterSoundTouch::SetSpeed(float speed) {
     if (!(speed > 0.0f) || !std::isfinite(speed)) return;
+    speed = std::clamp(speed, kLowestSpeed, kHighestSpeed);
     const std::lock_guard lock(m_lock);
     m_speed = speed;
     m_engine.setRate(speed);

@@ -245,8 +245,9 @@ void SamplingFrequencyConverter::StartStream() {
 void SamplingFrequencyConverter::Init(int channels) {
     StartStream();
     ringCapacity = ringLength;
-    for (int channel = 0; channel < std::min(channels, kMaxChannels); ++channel)
-        rings[channel] = new (std::nothrow) double[static_cast<std::size_t>(ringLength)]();
+    for (int channel = 0; channel < kMaxChannels; ++channel)
+        rings[channel] =
+            channel < channels ? new (std::nothrow) double[static_cast<std::size_t>(ringLength)]() : nullptr;
 }
 
 bool SamplingFrequencyConverter::Restart(const SamplingFrequencyConverter& design) {

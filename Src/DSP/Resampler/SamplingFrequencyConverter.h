@@ -29,8 +29,8 @@ struct DSP_API SamplingFrequencyConverter {
     static constexpr int kMaxChannels = 48;
     static constexpr int kMaxOrder = 40;
     static constexpr int kOrder = 10;
-    // Of the L-times raised rate; larger would not fit the ring's length.
-    static constexpr int kMaxFactor = 0x7FFFFFFF / 10;
+    // Each step of the raised rate takes 176 bytes of tables, which must fit a 32-bit address space.
+    static constexpr int kMaxFactor = 0x7FFFFFFF / 256;
 
     SamplingFrequencyConverter();
     ~SamplingFrequencyConverter();

@@ -2,15 +2,16 @@
 
 #include <gtest/gtest.h>
 
-#include <bit>
 #include <limits>
 #include <tuple>
 
 #include "DSP/Effects/CorvoEffect.h"
 #include "DSP/Effects/ParameterTable.h"
 #include "Support/Signals.h"
+#include "Support/VirtualSlot.h"
 
 using namespace Corvo::DSP;
+using TestSupport::Slot;
 
 namespace {
 
@@ -64,16 +65,6 @@ public:
 private:
     int m_count;
 };
-
-// A pointer to a virtual member holds its place in the table, in bytes and plus one, in this ABI.
-template <typename Member>
-int Slot(Member member) {
-    struct Pointer {
-        std::ptrdiff_t offsetPlusOne, adjustment;
-    };
-    return static_cast<int>((std::bit_cast<Pointer>(member).offsetPlusOne - 1) /
-                            static_cast<std::ptrdiff_t>(sizeof(void*)));
-}
 
 MP_ENVELOPE_SEGMENT Jump(std::int64_t start, float value) {
     return {start, start, value, value, MP_CURVE_JUMP, 0};
@@ -241,13 +232,13 @@ TEST(CorvoEffect, NamesAndTypesParametersFromItsTable) {
     struct Case {
         const wchar_t *label, *name;
         MP_TYPE type;
-        EffectParameterType shown;
+        Corvo::EffectParameterType shown;
     } const cases[] = {
-        {L"Flip phase L", L"Flip phase", MPT_BOOL, EffectParameterType::Switch},
-        {L"Depth R", L"Depth", MPT_FLOAT, EffectParameterType::Continuous},
-        {L" L", L" L", MPT_INT, EffectParameterType::Continuous},
-        {L"LR", L"LR", MPT_ENUM, EffectParameterType::List},
-        {L"DEPTHL", L"DEPTHL", MPT_ENUM, EffectParameterType::List},
+        {L"Flip phase L", L"Flip phase", MPT_BOOL, Corvo::EffectParameterType::Switch},
+        {L"Depth R", L"Depth", MPT_FLOAT, Corvo::EffectParameterType::Continuous},
+        {L" L", L" L", MPT_INT, Corvo::EffectParameterType::Continuous},
+        {L"LR", L"LR", MPT_ENUM, Corvo::EffectParameterType::List},
+        {L"DEPTHL", L"DEPTHL", MPT_ENUM, Corvo::EffectParameterType::List},
         {L"exactly thirty-two characters!!!", L"exactly thirty-two characters!!", MPT_INT, {}},
     };
     for (const auto& c : cases) {

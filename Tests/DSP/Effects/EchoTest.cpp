@@ -210,6 +210,7 @@ TEST(Echo, KeepsTheDelayWhenTheModeBecomesATime) {
     };
     const Case cases[] = {
         {"linear to log", 0, 1, 300, 120, log(300), log(120)},
+        {"linear to log, beyond its knob", 0, 1, 10000, 6000, log(10000), log(6000)},
         {"below 20 ms there is no logarithm", 0, 1, 7, 19, 1, 1},
         {"log to linear", 1, 0, 0, 10000, 20, 4999},
         {"note to linear", 2, 0, 8000, 6000, 499, 124},

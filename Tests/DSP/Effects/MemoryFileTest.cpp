@@ -4,6 +4,8 @@
 
 #include <limits>
 
+#include "Support/VirtualSlot.h"
+
 using Corvo::CorvoException;
 using KivFiles::CMemoryFile;
 
@@ -12,6 +14,18 @@ namespace {
 constexpr std::int64_t kFar = std::numeric_limits<std::int64_t>::max();
 
 }  // namespace
+
+// Catches a virtual operation that was moved: hosts call by number.
+TEST(MemoryFile, KeepsEveryOperationInItsSlot) {
+    using F = KivFiles::CFileBase;
+    using TestSupport::Slot;
+    const int slots[] = {
+        Slot(&F::Write),       Slot(&F::Read),     Slot(&F::Seek),      4 /* destructor, with 3 */,
+        Slot(&F::GetPosition), Slot(&F::Truncate), Slot(&F::GetLength), Slot(&F::IsReadable),
+        Slot(&F::IsWritable)};
+    for (int slot = 0; slot < 9; ++slot)
+        EXPECT_EQ(slots[slot], slot < 3 ? slot : slot + 1) << "operation " << slot;
+}
 
 TEST(MemoryFile, GrowsInFixedSteps) {
     CMemoryFile file;
@@ -82,6 +96,13 @@ TEST(MemoryFile, StreamsArraysOfDoubles) {
     file.Seek(0, CMemoryFile::FromStart);
     KivFiles::ReadDoubles(file, read);
     EXPECT_EQ(read, values);
+
+    read.clear();
+    file.SetUnbounded(true);  // such a file does not know its length
+    file.Seek(0, CMemoryFile::FromStart);
+    KivFiles::ReadDoubles(file, read);
+    EXPECT_EQ(read, values);
+    file.SetUnbounded(false);
 
     // A count that the bytes cannot hold must neither be believed nor spoil what the caller has.
     for (const std::int32_t count : {4, std::numeric_limits<std::int32_t>::max(), -1}) {

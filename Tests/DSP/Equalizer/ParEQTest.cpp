@@ -37,7 +37,8 @@ _eq_data RandomBand(Random& random) {
 
 template <typename Sample>
 bool SameBits(const std::vector<Sample>& a, const std::vector<Sample>& b) {
-    return a.size() == b.size() && std::memcmp(a.data(), b.data(), a.size() * sizeof(Sample)) == 0;
+    return a.size() == b.size() &&
+           (a.empty() || std::memcmp(a.data(), b.data(), a.size() * sizeof(Sample)) == 0);
 }
 
 // A session of edits, glides and blocks of every length, in step with the plain form.

@@ -5,13 +5,13 @@
 
 #include <algorithm>
 #include <atomic>
-#include <bit>
 #include <memory>
 #include <ranges>
 #include <thread>
 
 #include "Plain/PlainClassicPitch.h"
 #include "Support/Signals.h"
+#include "Support/VirtualSlot.h"
 
 using namespace Corvo::DSP;
 using namespace TestSupport;
@@ -68,15 +68,6 @@ double Frequency(const std::vector<float>& samples, int channels, int rate) {
             if (++count == 0) first = last;
         }
     return count * rate / (last - first);
-}
-
-template <typename Member>
-int Slot(Member member) {
-    struct Pointer {
-        std::ptrdiff_t offsetPlusOne, adjustment;
-    };
-    return static_cast<int>((std::bit_cast<Pointer>(member).offsetPlusOne - 1) /
-                            static_cast<std::ptrdiff_t>(sizeof(void*)));
 }
 
 }  // namespace
