@@ -88,7 +88,7 @@ logged() {
 
 : > "$log"
 logged fetch_sources soundtouch libsndfile
-[ $status = 0 ] || skip "Debian's source packages could not be fetched (no network?): $(tail -n 1 "$log")"
+[ $status = 0 ] || skip "Debian's source packages could not be fetched (no network?), see $log"
 logged build_all
 if [ $status != 0 ]; then
     grep -iE 'error|cannot' "$log" | tail -n 20 >&2

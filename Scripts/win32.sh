@@ -7,18 +7,20 @@ cd "$tree"
 
 need_win32_packages
 
-# The root for Wine takes the network and one core for a minute; the libraries are built beside it.
-say "libraries for the target and the i386 root (kept in $cache)"
-Scripts/win32-root.sh > "$cache/root.answer.$$" &
+# The root for Wine takes the network's time more than this machine's: it is made beside everything up to the
+# first program that runs.
+answer=$(mktemp)
+trap 'rm -f "$answer"' EXIT
+Scripts/win32-root.sh > "$answer" &
 root_job=$!
-prefix_status=0
-prefix=$(Scripts/win32-deps.sh) || prefix_status=$?
-root_status=0
-wait $root_job || root_status=$?
-root=$(tail -n 1 "$cache/root.answer.$$")
-rm -f "$cache/root.answer.$$"
-[ $prefix_status = 0 ] || { echo "$prefix"; exit $prefix_status; }
-[ $root_status = 0 ] || { echo "$root"; exit $root_status; }
+root_ready() {
+    local status=0
+    wait $root_job || status=$?
+    [ $status = 0 ] || { cat "$answer"; exit $status; }
+}
+
+say "libraries for the target (kept in $cache)"
+prefix=$(Scripts/win32-deps.sh) || { status=$?; echo "$prefix"; root_ready; exit $status; }
 
 say "building (win32)"
 # Paths of an earlier prefix would stick in the cache of the build.
@@ -26,6 +28,7 @@ fresh=()
 if [ -f build/win32/CMakeCache.txt ] && ! grep -qF "$prefix/" build/win32/CMakeCache.txt; then fresh=(--fresh); fi
 cmake --preset win32 "${fresh[@]}" > /dev/null
 cmake --build --preset win32
+root_ready
 
 # Every part runs even when one before it failed, so that one run tells all.
 failed=()
