@@ -27,7 +27,7 @@ say "building (win32)"
 fresh=()
 if [ -f build/win32/CMakeCache.txt ] && ! grep -qF "$prefix/" build/win32/CMakeCache.txt; then fresh=(--fresh); fi
 cmake --preset win32 "${fresh[@]}" > /dev/null
-cmake --build --preset win32
+cmake --build --preset win32 --target DSPDll dsp_tests record_effects dsphost
 root_ready
 
 # Every part runs even when one before it failed, so that one run tells all.
