@@ -65,6 +65,8 @@ void CorvoEffectBase::InitializeXyEditingData(GenericUIData&) {}
 float CorvoEffectBase::GetParamFromProp(int, int) { return -1.0f; }
 
 void CorvoEffectBase::SetParam(int index, float normalised, bool fromAutomation) {
+    // Not the external count: automation goes by real indices.
+    if (index < 0 || index >= GetParamCountReal()) return;
     const bool paired = SeparateLeftRightControls() == 0;
     const int real = paired ? 2 * index : index;
     bool changed;
