@@ -66,7 +66,7 @@ void RecordSamples(const EffectCase& which, const Scene& scene, Kind kind, std::
     if (scene.seed != 0) {
         Random random(scene.seed);
         SetAllParams(*effect, random);
-        takes.push_back({which.name, scene.name, Kind::Chunk, Chunk(*effect)});
+        if (kind == Kind::Float) takes.push_back({which.name, scene.name, Kind::Chunk, Chunk(*effect)});
         for (std::size_t at = 5000; at < 40000; at += 5000)
             edits.push_back({at, random.Below(effect->GetParamCount()), static_cast<float>(random.Unit())});
     }
