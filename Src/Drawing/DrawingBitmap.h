@@ -1,0 +1,46 @@
+#pragma once
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <vector>
+
+namespace Corvo {
+
+// A picture in memory that any back-end can draw.
+//
+// One 32-bit word per pixel, 0xAARRGGBB in the machine's byte order with the colours already multiplied by
+// the alpha; rows from the top down, none padded. Whoever changes pixels or size counts `version` up, so that
+// a back-end which keeps a copy of its own knows when it is stale. No locks: one thread at a time.
+struct DrawingBitmap {
+    // 256 MiB, more than any screen: what a request beyond it is cut to.
+    static constexpr int kLargestSide = 16384, kMostPixels = 1 << 26;
+
+    int width = 0, height = 0;
+    std::vector<std::uint32_t> pixels;  // width * height
+    bool opaque = false;                // the top byte is no alpha and may hold anything
+    std::uint32_t version = 0;
+
+    // The pixels' values are then unspecified, unless the size is what it was. Memory grows where it must and
+    // is kept when the picture shrinks. Negative sides count as 0; rows that the limits leave no room for are
+    // missing at the bottom.
+    void Size(int newWidth, int newHeight) {
+        newWidth = std::clamp(newWidth, 0, kLargestSide);
+        newHeight = std::clamp(newHeight, 0, std::min(kLargestSide, kMostPixels / std::max(newWidth, 1)));
+        if (newWidth == width && newHeight == height) return;
+        pixels.resize(static_cast<std::size_t>(newWidth) * static_cast<std::size_t>(newHeight));
+        width = newWidth;
+        height = newHeight;
+        ++version;
+    }
+
+    bool IsEmpty() const { return pixels.empty(); }
+    std::uint32_t* Row(int y) {
+        return pixels.data() + static_cast<std::ptrdiff_t>(y) * static_cast<std::ptrdiff_t>(width);
+    }
+    const std::uint32_t* Row(int y) const {
+        return pixels.data() + static_cast<std::ptrdiff_t>(y) * static_cast<std::ptrdiff_t>(width);
+    }
+};
+
+}  // namespace Corvo
