@@ -1,6 +1,9 @@
 # Headers, library, CMake package and pkg-config file, so that hosts find the library either way.
 
-install(TARGETS DSPDll EXPORT DSPDllTargets
+if(TARGET DSPDrawing)
+    set(dsp_drawing DSPDrawing)
+endif()
+install(TARGETS DSPDll ${dsp_drawing} EXPORT DSPDllTargets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
     ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
     RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
