@@ -1,0 +1,49 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <vector>
+
+#if defined(_WIN32)
+#include "Drawing/DrawingGdiPlus.h"
+#else
+#include "Drawing/DrawingCairo.h"
+#endif
+
+namespace dsphost {
+
+#if defined(_WIN32)
+using PictureDrawing = Corvo::DrawingGdiPlus;
+#else
+using PictureDrawing = Corvo::DrawingCairo;
+#endif
+
+// A picture in memory, opaque and black at first, drawn on with the library's primitives and saved as PNG.
+class Picture {
+public:
+    // Sides in pixels, at least 1. Throws UserError for a size that the drawing system does not take.
+    Picture(int width, int height, float dpi);
+    ~Picture();
+    Picture(const Picture&) = delete;
+    Picture& operator=(const Picture&) = delete;
+
+    // draw(PictureDrawing::DrawTarget&); each call goes on with what is there.
+    template <typename Draw>
+    void Paint(Draw draw) {
+        PictureDrawing::DrawTarget target = Target();
+        draw(target);
+    }
+
+    // The bytes of a PNG file. Throws IoError when it cannot be made.
+    std::vector<std::uint8_t> Png();
+
+private:
+    PictureDrawing::DrawTarget Target();
+
+    struct Surface;
+    std::unique_ptr<Surface> m_surface;
+    PictureDrawing m_drawing;
+    float m_dpi;
+};
+
+}  // namespace dsphost

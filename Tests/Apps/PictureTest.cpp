@@ -1,0 +1,61 @@
+#include <algorithm>
+#include <cstddef>
+#include <utility>
+
+#include <cairo.h>
+#include <gtest/gtest.h>
+
+#include "Errors.h"
+#include "Picture.h"
+
+using dsphost::Picture;
+
+namespace {
+
+struct Bytes {
+    const std::vector<std::uint8_t>& all;
+    std::size_t read = 0;
+};
+
+cairo_status_t Take(void* bytes, unsigned char* to, unsigned count) {
+    auto& [all, read] = *static_cast<Bytes*>(bytes);
+    if (all.size() - read < count) return CAIRO_STATUS_READ_ERROR;
+    std::copy_n(all.begin() + static_cast<std::ptrdiff_t>(read), count, to);
+    read += count;
+    return CAIRO_STATUS_SUCCESS;
+}
+
+}  // namespace
+
+// Catches red and blue exchanged, an alpha that lets the viewer's ground through, and a Paint that starts
+// over instead of going on.
+TEST(Picture, IsSavedAsItWasDrawn) {
+    Picture picture(5, 3, 192.0f);
+    picture.Paint([](auto& target) {
+        EXPECT_EQ(target.Scale(), 2.0f);
+        target.FillRectangle({1, 0, 1, 3}, {0x000000FFu});
+    });
+    picture.Paint([](auto& target) { target.FillRectangle({4, 2, 1, 1}, {0x00FF8000u, 128}); });
+
+    const auto png = picture.Png();
+    Bytes bytes{png};
+    cairo_surface_t* const image = cairo_image_surface_create_from_png_stream(Take, &bytes);
+    ASSERT_EQ(cairo_surface_status(image), CAIRO_STATUS_SUCCESS);
+    EXPECT_EQ(cairo_image_surface_get_format(image), CAIRO_FORMAT_RGB24);
+    ASSERT_EQ(cairo_image_surface_get_width(image), 5);
+    ASSERT_EQ(cairo_image_surface_get_height(image), 3);
+    const auto pixel = [&](int x, int y) {
+        const unsigned char* const row =
+            cairo_image_surface_get_data(image) + y * cairo_image_surface_get_stride(image);
+        return reinterpret_cast<const std::uint32_t*>(row)[x] & 0xFFFFFFu;
+    };
+    EXPECT_EQ(pixel(0, 0), 0x000000u);
+    EXPECT_EQ(pixel(1, 2), 0xFF0000u);
+    EXPECT_EQ(pixel(4, 2), 0x004080u);
+    cairo_surface_destroy(image);
+}
+
+TEST(Picture, RefusesSizesThatCannotBe) {
+    for (const auto& [width, height] : {std::pair{0, 4}, {4, -1}, {1 << 20, 1 << 20}})
+        EXPECT_THROW(Picture(width, height, 96.0f), dsphost::UserError) << width << "x" << height;
+}
