@@ -82,3 +82,12 @@ double CoordinatesAndFrequencies::YToLevel(double y) const {
     const double share = 1.0 - (y - m_rectangle.y) / m_rectangle.height;
     return m_floor + share * (m_top - m_floor);
 }
+
+CoordinatesAndFrequencies Corvo::SpectrumMap(const RectF& rectangle, const SpectrumSettings& settings,
+                                             int samplingRate) {
+    constexpr double kLowestHeard = 20.0;
+    const FrequencyScale scale = FrequencyScaleOf(settings);
+    const bool fromZero = scale == FrequencyScale::Linear || scale == FrequencyScale::Mel;
+    return {rectangle, fromZero ? 0.0 : kLowestHeard, samplingRate / 2.0,
+            scale,     LevelScaleOf(settings),        VerticalRangeOf(settings)};
+}

@@ -50,3 +50,12 @@ private:
     double m_left, m_span;  // of the position along the scale
     double m_floor, m_top;
 };
+
+namespace Corvo {
+
+// What a display of the settings shows in `rectangle`: from 20 Hz, or 0 on the linear and mel scales, to half
+// the sampling rate.
+DSP_API CoordinatesAndFrequencies SpectrumMap(const RectF& rectangle, const SpectrumSettings& settings,
+                                              int samplingRate);
+
+}  // namespace Corvo

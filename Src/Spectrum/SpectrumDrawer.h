@@ -8,6 +8,15 @@
 #include "Spectrum/CoordinatesAndFrequencies.h"
 #include "Spectrum/kivspectrum.h"
 
+namespace Corvo {
+
+// Between bins, and what a sine there would have: dB below full scale.
+struct SpectrumPeak {
+    double frequency, level;
+};
+
+}  // namespace Corvo
+
 // Turns the power spectra of one analyser into the curve that is drawn: smooths them over time and keeps a
 // memory of their peaks. Used on the display side of its analyser, which lends its lock.
 class DSP_API SpectrumDrawer {
@@ -59,6 +68,9 @@ public:
     // All points of the last curve, and the bins that they stand for.
     const std::vector<Corvo::PointF>& GetXYPoints() const;
     const std::vector<int>& GetFFTPoints() const;
+
+    // The highest peak of the smoothed spectrum above 0 Hz; 0 Hz and -300 dB when there is none.
+    Corvo::SpectrumPeak HighestPeak() const;
 
     void SetOn(bool on);
     bool GetOn() const;

@@ -1,14 +1,17 @@
 #pragma once
 
+#include <array>
 #include <atomic>
 #include <cstdint>
 #include <memory>
 #include <vector>
 
+#include "Drawing/DrawingBitmap.h"
 #include "Platform/CriticalSection.h"
 #include "Platform/Export.h"
 #include "Spectrum/CorvoFFT.h"
 
+class CoordinatesAndFrequencies;
 class MessagePoster;
 class SpectrumDrawer;
 class SpectrumStaticInfo;
@@ -16,7 +19,9 @@ class Tuner;
 class VectorInterpolationFilterFloat;
 namespace Corvo {
 class CaptureBuffer;
-}
+struct PointF;
+struct RectF;
+}  // namespace Corvo
 
 // A real-time spectrum analyser: captures the newest samples of a signal, windows and transforms them, and
 // hands the power spectrum to its drawer for smoothing and drawing.
@@ -61,6 +66,9 @@ public:
 
     static constexpr int window_types_num = 5;
 
+    // Four of the tuner panel's images, nearest the centre first.
+    using BarItems = std::array<Corvo::DrawingBitmap*, 4>;
+
     // Class-wide. Written by menu commands and init; a host that stores or restores it does so while no
     // command runs and calls ObserverUpdate afterwards.
     static spectrum_settings settings;
@@ -69,7 +77,38 @@ public:
     // The tuner panel's bitmaps must be made again: command 1350 was chosen or the resolution changed.
     static std::atomic<bool> needPrepareBitmap;
 
+    // The tuner panel's images, drawn at the size needed when they are first drawn: the circle behind the
+    // note, lit and unlit (Base); ripples beside it for notes too low (L) and too high (R), lit and unlit;
+    // and upright bars in the place of ripples for small panels. They belong to the thread that draws.
+    static Corvo::DrawingBitmap mainWitheCirleBitmap, mainWitheCirleBitmapBase;
+    // clang-format off
+    static Corvo::DrawingBitmap tunerBarItem_00_L, tunerBarItem_01_L, tunerBarItem_02_L, tunerBarItem_03_L;
+    static Corvo::DrawingBitmap tunerBarItem_00_R, tunerBarItem_01_R, tunerBarItem_02_R, tunerBarItem_03_R;
+    static Corvo::DrawingBitmap tunerBarItem_Base_00_L, tunerBarItem_Base_01_L,
+                                tunerBarItem_Base_02_L, tunerBarItem_Base_03_L;
+    static Corvo::DrawingBitmap tunerBarItem_Base_00_R, tunerBarItem_Base_01_R,
+                                tunerBarItem_Base_02_R, tunerBarItem_Base_03_R;
+    static Corvo::DrawingBitmap tunerBarItem_Minimized_00_L, tunerBarItem_Minimized_01_L,
+                                tunerBarItem_Minimized_02_L, tunerBarItem_Minimized_03_L;
+    static Corvo::DrawingBitmap tunerBarItem_Minimized_00_R, tunerBarItem_Minimized_01_R,
+                                tunerBarItem_Minimized_02_R, tunerBarItem_Minimized_03_R;
+    static Corvo::DrawingBitmap tunerBarItem_Minimized_Base_00_L, tunerBarItem_Minimized_Base_01_L,
+                                tunerBarItem_Minimized_Base_02_L, tunerBarItem_Minimized_Base_03_L;
+    static Corvo::DrawingBitmap tunerBarItem_Minimized_Base_00_R, tunerBarItem_Minimized_Base_01_R,
+                                tunerBarItem_Minimized_Base_02_R, tunerBarItem_Minimized_Base_03_R;
+    // clang-format on
+    static const BarItems leftItems, rightItems, baseItems_L, baseItems_R;
+    static const BarItems leftItemsMinimized, rightItemsMinimized, baseItemsMinimized_L, baseItemsMinimized_R;
+    // Arrows that point to where the note has to go.
+    static Corvo::DrawingBitmap tunerErrorFlatBitmap, tunerErrorSharpBitmap;
+    // Draw the images anew when larger ones are needed or needPrepareBitmap asks for it; sizes in pixels.
+    static void SetupTunerBitmaps(int circleRadius);
+    static void SetupMinimizedTunerBitmaps(int height);
+    static void SetupErrorBitmaps(int side);
+
     static SpectrumStaticInfo& GetStaticInfo();
+    // A copy that no menu command changes half way. Any thread.
+    static spectrum_settings GetSettings();
     // Milliseconds between display refreshes.
     static int GetRefreshRatePeriod();
     // Stores the overlap, 1 and more as 0.99, and the hop length that follows from it. Values below 0 leave
@@ -148,8 +187,20 @@ public:
     void ToggleShowInfoBoxes();
     void SetShowInfoBox(bool show);
     bool IsShowInfoBox() const;
+    // Where the mouse is, in the coordinates of the drawing; the info box tells what is there.
+    void SetPointer(float x, float y);
+    void ClearPointer();
+
+    // Drawing, once per back-end (Drawing/DrawingCairo.h, on Windows DrawingGdiPlus.h and DrawingD2D.h): into
+    // `rectangle`, in pixels of the target, whatever its size. One thread draws for all analysers; it is the
+    // display thread, or the menu's while the display thread rests.
+    template <class Drawing>
+    void DoDrawSpectrum(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
 
 private:
+    template <class Drawing>
+    void DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
+                          const CoordinatesAndFrequencies& map);
     bool ApplyCommand(int command);
     void ResizeFilter();
     void cook_window();
@@ -185,6 +236,8 @@ private:
     std::atomic<bool> m_showInfoBox{true};
     std::atomic<_display_mode> m_displayMode{display_spectrum};
     std::atomic<int> m_samplingRate{44100};
+    std::atomic<float> m_pointerX{-1.0f}, m_pointerY{-1.0f};
+    std::vector<Corvo::PointF> m_outline;  // of the filled curve
 };
 
 static_assert(sizeof(kivspectrum::spectrum_settings) == 24 * 4);

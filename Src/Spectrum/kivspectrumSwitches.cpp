@@ -78,3 +78,14 @@ bool kivspectrum::IsShowSonogram() const { return m_showSonogram; }
 void kivspectrum::ToggleShowInfoBoxes() { SetShowInfoBox(!m_showInfoBox); }
 void kivspectrum::SetShowInfoBox(bool show) { m_showInfoBox = show; }
 bool kivspectrum::IsShowInfoBox() const { return m_showInfoBox; }
+
+kivspectrum::spectrum_settings kivspectrum::GetSettings() {
+    const Lock classLock(Corvo::AnalyserLock());
+    return settings;
+}
+
+void kivspectrum::SetPointer(float x, float y) {
+    m_pointerX = x;
+    m_pointerY = y;
+}
+void kivspectrum::ClearPointer() { SetPointer(-1.0f, -1.0f); }

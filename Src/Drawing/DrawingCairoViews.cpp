@@ -1,0 +1,4 @@
+#include "Drawing/DrawingCairo.h"
+#include "Drawing/Views.h"
+
+DSP_INSTANTIATE_VIEWS(Corvo::DrawingCairo)

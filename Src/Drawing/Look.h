@@ -1,0 +1,70 @@
+#pragma once
+
+#include <algorithm>
+#include <cmath>
+
+#include "Drawing/DrawTarget.h"
+
+// Colours and sizes of everything drawn. Texts keep a contrast of 4.5:1 or more on the ground they stand on.
+namespace Corvo::Look {
+
+// clang-format off
+constexpr ColourReference kGround     = ColourFromRgb(0x0E1116);
+constexpr ColourReference kPlot       = ColourFromRgb(0x12161D);
+constexpr ColourReference kGrid       = ColourFromRgb(0x2A323D);
+constexpr ColourReference kMinorGrid  = ColourFromRgb(0x1B2129);
+constexpr ColourReference kLabel      = ColourFromRgb(0xA3AFBE);
+constexpr ColourReference kText       = ColourFromRgb(0xE8EDF3);
+constexpr ColourReference kBox        = ColourFromRgb(0x1D242E);
+constexpr ColourReference kCurve      = ColourFromRgb(0x4CC2FF);
+constexpr ColourReference kPeaks      = ColourFromRgb(0xF2A65A);
+constexpr ColourReference kPointer    = ColourFromRgb(0xE8EDF3);
+constexpr ColourReference kTrace      = ColourFromRgb(0x7CFF6B);
+constexpr ColourReference kInTune     = ColourFromRgb(0x5BE08A);
+constexpr ColourReference kOutOfTune  = ColourFromRgb(0xFF7A6B);
+constexpr ColourReference kNeedle     = ColourFromRgb(0xF5F7FA);
+
+// In 1/96 inch.
+constexpr float kLabelSize   = 11.0f;
+constexpr float kInfoSize    = 12.0f;
+constexpr float kGap         = 4.0f;
+constexpr float kLabelGap    = 10.0f;  // least distance between labels side by side
+constexpr float kHairline    = 1.0f;
+constexpr float kCurveWidth  = 1.5f;
+constexpr float kTraceWidth  = 2.0f;
+constexpr float kIntensity   = 12.0f;  // width of the intensity scale's bar
+constexpr float kLeastPlot   = 48.0f;  // a plot with less on either side gets no labels
+// clang-format on
+
+}  // namespace Corvo::Look
+
+namespace Corvo {
+
+inline float Right(const RectF& r) { return r.x + r.width; }
+inline float Bottom(const RectF& r) { return r.y + r.height; }
+inline PointF Centre(const RectF& r) { return {r.x + r.width / 2.0f, r.y + r.height / 2.0f}; }
+
+inline bool Contains(const RectF& r, PointF p) {
+    return p.x >= r.x && p.x < Right(r) && p.y >= r.y && p.y < Bottom(r);
+}
+
+// Without what `left`, `top`, `right` and `bottom` take from the sides; never less than nothing.
+inline RectF Shrunk(const RectF& r, float left, float top, float right, float bottom) {
+    return {r.x + left, r.y + top, std::max(r.width - left - right, 0.0f),
+            std::max(r.height - top - bottom, 0.0f)};
+}
+
+// To whole pixels, so that edges are crisp.
+inline RectF Snapped(const RectF& r) {
+    const float x = std::round(r.x), y = std::round(r.y);
+    return {x, y, std::round(Right(r)) - x, std::round(Bottom(r)) - y};
+}
+
+// Nothing to draw on: empty, not a number, or beyond any surface.
+inline bool IsDrawable(const RectF& r) {
+    constexpr float kFarthest = 32767.0f;
+    return r.width >= 1.0f && r.height >= 1.0f && r.width <= kFarthest && r.height <= kFarthest &&
+           std::abs(r.x) <= kFarthest && std::abs(r.y) <= kFarthest;
+}
+
+}  // namespace Corvo
