@@ -1,22 +1,34 @@
 #include "Spectrum/Tuner.h"
 
-#include <array>
-#include <atomic>
+#include <algorithm>
+#include <cmath>
 #include <cstddef>
+#include <cstdio>
+
+#include "Platform/DenormalGuard.h"
+#include "Spectrum/PitchDetector.h"
+#include "Spectrum/TunerNotes.h"
+#include "Spectrum/TunerSensitivity.h"
+
+using Corvo::kTunerSensitivities;
 
 namespace {
 
-constexpr int kTemperaments = 11;
 constexpr int kNamings = 3;
 constexpr float kDefaultQuantum = 2.0f;
 constexpr std::array kQuantumPresets{0.1f, 0.5f, 1.0f, 2.0f, 5.0f, 10.0f};
-constexpr std::array kReportedSensitivity{2, 1, 2, 3, 4, 5};
+constexpr double kRefreshRate = 30.0;
+constexpr double kStableSeconds = 0.5;
+constexpr double kStableOctaves = 10.0 / 1200.0;
+
+constexpr const char* kNoteNames[kNamings][12] = {
+    {"A", "A#", "B", "C", "C#", "D", "D#", "E", "F", "F#", "G", "G#"},
+    {"A", "Bb", "B", "C", "Db", "D", "Eb", "E", "F", "Gb", "G", "Ab"},
+    {"La", "La#", "Si", "Do", "Do#", "Re", "Re#", "Mi", "Fa", "Fa#", "Sol", "Sol#"},
+};
 
 struct Choices {
     std::atomic<int> method{0};
-    std::atomic<int> temperament{0};
-    std::atomic<bool> temperamentChanged{false};
-    std::atomic<TuningListener*> listener{nullptr};
     std::atomic<float> quantum{kDefaultQuantum};
     std::atomic<int> naming{0};
     std::atomic<bool> showDenoised{false};
@@ -25,31 +37,30 @@ Choices g_choices;
 
 bool Within(int index, std::size_t count) { return index >= 0 && static_cast<std::size_t>(index) < count; }
 
+// Refreshes counted in analyses, of which there may be fewer.
+int Analyses(int refreshes, double framePeriod) {
+    return std::max(static_cast<int>(std::ceil(refreshes / (kRefreshRate * framePeriod))), 1);
+}
+
 }  // namespace
 
-TuningListener::~TuningListener() = default;
+TunerDisplayListener::~TunerDisplayListener() = default;
 
-Tuner::Tuner() = default;
+Tuner::Tuner() : m_detector(std::make_unique<Corvo::PitchDetector>()) {}
+Tuner::~Tuner() = default;
 
 void Tuner::SetDetectionMethod(int method) { g_choices.method = method; }
 int Tuner::GetDetectionMethod() { return g_choices.method; }
 
 void Tuner::SetShowDenoisedSpectrum(bool show) { g_choices.showDenoised = show; }
 bool Tuner::GetShowDenoisedSpectrum() { return g_choices.showDenoised; }
-
-void Tuner::SetTemperament(int temperament) {
-    if (temperament == g_choices.temperament) return;
-    // Stored before it is announced, or a display thread could cook the old one.
-    g_choices.temperament = Within(temperament, kTemperaments) ? temperament : 0;
-    g_choices.temperamentChanged = true;
-    if (TuningListener* const listener = g_choices.listener) listener->NotesMustBeRecomputed();
-}
-int Tuner::GetTemperament() { return g_choices.temperament; }
-bool Tuner::IsTemperamentChanged() { return g_choices.temperamentChanged; }
-void Tuner::SetTuningListener(TuningListener* listener) { g_choices.listener = listener; }
+const std::vector<float>& Tuner::GetDenoisedSpectrum() const { return m_detector->Denoised(); }
 
 void Tuner::SetNoteNaming(int naming) { g_choices.naming = Within(naming, kNamings) ? naming : 0; }
 int Tuner::GetNoteNaming() { return g_choices.naming; }
+const char* Tuner::GetNoteName(int note) {
+    return Within(note, std::size(kNoteNames[0])) ? kNoteNames[g_choices.naming][note] : "";
+}
 
 void Tuner::SetTunedQuantum(float cents) { g_choices.quantum = cents; }
 float Tuner::GetTunedQuantum() { return g_choices.quantum; }
@@ -59,8 +70,158 @@ void Tuner::SetTunedQuantumPreset(int preset) {
 }
 
 void Tuner::SetSensibilityPreset(int preset) {
-    if (Within(preset, kReportedSensitivity.size())) m_sensitivity = preset;
+    if (Within(preset, kTunerSensitivities.size())) m_sensitivity = preset;
+    m_presetChosen = true;
 }
 int Tuner::GetSensibilityPreset() const {
-    return kReportedSensitivity[static_cast<std::size_t>(m_sensitivity)];
+    return kTunerSensitivities[static_cast<std::size_t>(m_sensitivity)].values.reported;
+}
+const char* Tuner::GetSensibilityPresetName(int preset) {
+    return Within(preset, kTunerSensitivities.size())
+               ? kTunerSensitivities[static_cast<std::size_t>(preset)].name
+               : "";
+}
+
+void Tuner::SetDisplayListener(TunerDisplayListener* listener) { m_displayListener = listener; }
+void Tuner::SetWindowType(int type) { m_windowType = type; }
+
+bool Tuner::IsTuned() const { return GetNote() >= 0; }
+bool Tuner::IsTunedCentered() const { return IsTuned() && std::abs(GetErrorCents()) < GetTunedQuantum(); }
+bool Tuner::IsTracking() const { return m_tracking; }
+int Tuner::GetNote() const { return m_note; }
+int Tuner::GetOctave() const { return m_octave; }
+double Tuner::GetFrequency() const { return m_frequency; }
+float Tuner::GetErrorCents() const { return m_cents; }
+float Tuner::GetProminence() const { return m_prominence; }
+double Tuner::GetStableFrequency() const { return m_stableFrequency; }
+
+const char* Tuner::GetTunedNoteName() const { return GetNoteName(GetNote()); }
+std::string Tuner::GetTuningErrorStr() const {
+    return IsTuned() ? GetTuningErrorStr(GetErrorCents()) : std::string();
+}
+std::string Tuner::GetTuningErrorStr(float cents) {
+    constexpr float kMost = 9999.9f;
+    const float shown = std::abs(cents) <= kMost ? cents : std::copysign(kMost, cents);
+    const int tenths = static_cast<int>(std::lround(10.0f * std::abs(shown)));
+    const char* const sign = tenths == 0 ? "" : cents < 0.0f ? "-" : "+";
+    std::array<char, 16> text;
+    std::snprintf(text.data(), text.size(), "%s%d.%dc", sign, tenths / 10, tenths % 10);
+    return text.data();
+}
+
+void Tuner::Tune(const std::vector<float>& power, const std::vector<float>&, int fftLength, int hopLength,
+                 int windowLength, int samplingRate, bool halveHarmonics, bool denoise) {
+    if (Analyse(power, fftLength, hopLength, windowLength, samplingRate, halveHarmonics, denoise)) Announce();
+}
+
+bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLength, int windowLength,
+                    int samplingRate, bool halveHarmonics, bool denoise) {
+    if (power.empty() || fftLength < 2 || samplingRate < 1) return false;
+    const Corvo::DenormalGuard denormals;
+    CookNotesFrequencies(false);
+    if (m_presetChosen.exchange(false)) {
+        m_detector->SetSensitivity(kTunerSensitivities[static_cast<std::size_t>(m_sensitivity)].values);
+        ResetPeakMemories(true);
+    }
+    const int window = windowLength >= 1 ? std::min(windowLength, fftLength) : fftLength;
+    const std::size_t bins = std::min(power.size(), static_cast<std::size_t>(fftLength / 2));
+    m_detector->Initialise({fftLength, window, m_windowType, samplingRate, bins});
+    const std::span<const float> spectrum(power.data(), bins);
+
+    const auto detect = [&]() -> Corvo::Pitch {
+        if (denoise) return m_detector->TuneHPSdenoise(spectrum, true);
+        switch (g_choices.method) {
+            case 0:
+                return m_detector->TuneHPSdenoise(spectrum, g_choices.showDenoised);
+            case 1:
+                return m_detector->TuneHPS(spectrum, halveHarmonics);
+            case 2:
+                return m_detector->TunePseudoHPS(spectrum);
+            case 4:
+                return m_detector->TuneTWMorig(spectrum);
+            default:
+                return m_detector->TuneLegacy(spectrum);
+        }
+    };
+    const auto [hz, prominence] = detect();
+    const int hop = hopLength >= 1 ? hopLength : window;
+    Follow(hz, prominence, std::max(static_cast<double>(hop) / samplingRate, 1.0 / kRefreshRate));
+    return m_note != m_announcedNote || m_octave != m_announcedOctave;
+}
+
+void Tuner::Announce() {
+    m_announcedNote = m_note;
+    m_announcedOctave = m_octave;
+    if (TunerDisplayListener* const listener = m_displayListener) listener->NoteChanged(m_announcedNote >= 0);
+}
+
+// The note shown follows the pitch at once; another replaces it only when it has been heard often enough, or
+// at once where there was none.
+void Tuner::Follow(double hz, float prominence, double framePeriod) {
+    const Corvo::TunerSensitivity& sensitivity = m_detector->Sensitivity();
+    const bool heard = hz > 0.0;
+    const Corvo::NearestNote nearest = heard ? Corvo::FindNearestNote(hz) : Corvo::NearestNote{};
+    const bool same = heard && nearest.note == m_note && nearest.octave == m_octave;
+    const bool other = heard && !same && prominence >= sensitivity.onsetDb;
+    if (other) {
+        const bool again = nearest.note == m_otherNote && nearest.octave == m_otherOctave;
+        m_otherCount = again ? m_otherCount + 1 : 1;
+        m_otherNote = nearest.note;
+        m_otherOctave = nearest.octave;
+    } else {
+        m_otherCount = 0;
+    }
+    if (same || (other && (m_note < 0 || m_otherCount >= sensitivity.confirmCount))) {
+        if (!same) ResetPeakMemories(false);
+        Hear(hz, prominence, nearest);
+        RememberPitch(hz, framePeriod);
+        return;
+    }
+    m_pitchCount = 0;
+    m_stableFrequency = 0.0;
+    if (m_note < 0) return;
+    ++m_missed;
+    if (m_missed >= Analyses(sensitivity.holdCount, framePeriod)) m_tracking = false;
+    if (m_missed >= Analyses(sensitivity.releaseCount, framePeriod)) ResetPeakMemories(true);
+}
+
+void Tuner::Hear(double hz, float prominence, const Corvo::NearestNote& heard) {
+    m_note = heard.note;
+    m_octave = heard.octave;
+    m_frequency = hz;
+    m_cents = static_cast<float>(heard.cents);
+    m_prominence = prominence;
+    m_tracking = true;
+    m_missed = 0;
+}
+
+void Tuner::ResetPeakMemories(bool forgetNote) {
+    m_otherNote = -1;
+    m_otherCount = 0;
+    m_pitchCount = 0;
+    m_missed = 0;
+    m_stableFrequency = 0.0;
+    if (!forgetNote) return;
+    m_note = -1;
+    m_octave = 0;
+    m_frequency = 0.0;
+    m_cents = 0.0f;
+    m_prominence = 0.0f;
+    m_tracking = false;
+}
+
+void Tuner::RememberPitch(double hz, double framePeriod) {
+    const int needed =
+        std::clamp(1 + static_cast<int>(std::ceil(kStableSeconds / framePeriod)), 2, kLongestMemory);
+    m_pitches[static_cast<std::size_t>(m_pitchCount % kLongestMemory)] = std::log2(hz);
+    ++m_pitchCount;
+    if (m_pitchCount < needed) return;
+    double lowest = std::log2(hz), highest = lowest, sum = 0.0;
+    for (int i = 1; i <= needed; ++i) {
+        const double pitch = m_pitches[static_cast<std::size_t>((m_pitchCount - i) % kLongestMemory)];
+        lowest = std::min(lowest, pitch);
+        highest = std::max(highest, pitch);
+        sum += pitch;
+    }
+    m_stableFrequency = highest - lowest <= kStableOctaves ? std::exp2(sum / needed) : 0.0;
 }

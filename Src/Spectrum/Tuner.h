@@ -1,49 +1,189 @@
 #pragma once
 
+#include <array>
+#include <atomic>
+#include <memory>
+#include <string>
+#include <vector>
+
 #include "Platform/Export.h"
 
-// Told when the notes' frequencies must be worked out again.
+class kivspectrum;
+namespace Corvo {
+class PitchDetector;
+struct NearestNote;
+}  // namespace Corvo
+
+// Told when the notes' frequencies must be worked out again: another temperament or calibration. Called on
+// the thread that changed it, from menu commands with the analysers' class-wide lock held: it must not wait
+// for another thread, and calls no analyser but to post.
 class DSP_API TuningListener {
 public:
     virtual ~TuningListener();
     virtual void NotesMustBeRecomputed() = 0;
 };
 
-// The tuner's choices. All but the sensitivity are shared by every tuner; any thread may read and set them.
+// Told by one tuner that the note it shows is another, or gone. Called on the display thread, without a lock.
+class DSP_API TunerDisplayListener {
+public:
+    virtual ~TunerDisplayListener();
+    virtual void NoteChanged(bool present) = 0;
+};
+
+// Finds the pitch in its analyser's spectra, the nearest note of the chosen temperament and the error.
+//
+// Class-wide choices are shared by every tuner; any thread may read and set them. The sensitivity may be set
+// by any thread, too, and takes effect at the next analysis. Analyses run on the analyser's display thread,
+// one at a time; what they found may be read anywhere, value by value.
 class DSP_API Tuner {
 public:
+    // Silent, with the sensitivity "Standard".
     Tuner();
+    ~Tuner();
+    Tuner(const Tuner&) = delete;
+    Tuner& operator=(const Tuner&) = delete;
 
     // 0 denoised harmonic product, 1 harmonic product, 2 pseudo harmonic product, 3 legacy, 4 two-way
     // mismatch. Kept as given; any other value works as 3.
     static void SetDetectionMethod(int method);
     static int GetDetectionMethod();
 
+    // Whether the spectrum without its noise floor is made along with each analysis of method 0.
     static void SetShowDenoisedSpectrum(bool show);
     static bool GetShowDenoisedSpectrum();
 
     // 0 Equal .. 10 Vallotti; an index outside is stored as 0. A temperament other than the current one marks
-    // it changed and tells the listener.
+    // it changed and tells the listener; the notes follow at the next CookNotesFrequencies.
     static void SetTemperament(int temperament);
     static int GetTemperament();
     static bool IsTemperamentChanged();
+    // Empty outside 0..10.
+    static const char* GetTemperamentName(int temperament);
+    static const char* GetCurrentTemperamentName();
     // The listener stays the caller's; null for none.
     static void SetTuningListener(TuningListener* listener);
 
-    // 0..2; anything else is stored as 0.
+    // Works out the notes for temperament and calibration, unless neither `force` nor a change asks for it.
+    static void CookNotesFrequencies(bool force);
+    // The octave of notes from the calibration base up, Hz: 0 A, 1 A#, 2 B, 3 C .. 11 G#, 12 the next A. 0
+    // outside.
+    static double GetNoteFrequency(int entry);
+    // The A two octaves below the one the orchestra tunes to, Hz; 110 unless calibrated.
+    static double GetCalibrationBase();
+
+    // 0 letters with sharps, 1 letters with flats, 2 solfege; anything else is stored as 0.
     static void SetNoteNaming(int naming);
     static int GetNoteNaming();
+    // The name of note 0 (A) .. 11 (G#) in the current naming, without its octave; empty outside.
+    static const char* GetNoteName(int note);
 
     // Cents within which a note counts as tuned. Presets 0..5 are 0.1, 0.5, 1, 2, 5 and 10; any other is 2.
     static void SetTunedQuantum(float cents);
     static float GetTunedQuantum();
     static void SetTunedQuantumPreset(int preset);
 
-    // 0 Standard .. 5 Very high frequencies; an index outside changes nothing. Reading back gives 2 for both
-    // Standard and Sensitive.
+    // 0 Standard .. 5 Very high frequencies; an index outside changes no value. Either way the tuner forgets
+    // what it heard. Reading back gives 2 for both Standard and Sensitive.
     void SetSensibilityPreset(int preset);
     int GetSensibilityPreset() const;
+    // Empty outside 0..5.
+    static const char* GetSensibilityPresetName(int preset);
+
+    // The listener stays the caller's; null for none.
+    void SetDisplayListener(TunerDisplayListener* listener);
+
+    // The shape of the window that the spectra come through, as in the analyser's settings (0 rectangular ..
+    // 4 Blackman, which it is until set; anything else counts as Blackman). Display thread.
+    void SetWindowType(int type);
+
+    // Runs one analysis. `power` holds |bin|^2, unscaled, of `fftLength` samples of which the first
+    // `windowLength` were windowed and the rest, if any, were zero; entry 0 is not looked at. `transform` is
+    // the packed spectrum itself, which no method needs. `hopLength` is the number of samples between
+    // analyses, one window when below 1. `halveHarmonics` halves the overtones of the harmonic product;
+    // `denoise` makes method 0 work on the spectrum without its noise floor, whatever method is chosen.
+    // Nothing happens without spectrum, length or rate. Allocates only when the lengths change.
+    void Tune(const std::vector<float>& power, const std::vector<float>& transform, int fftLength,
+              int hopLength, int windowLength, int samplingRate, bool halveHarmonics, bool denoise);
+
+    // A note is shown. It may have ended a moment ago: the sensitivity says for how long it stays.
+    bool IsTuned() const;
+    // It is closer to its place than the tuned quantum.
+    bool IsTunedCentered() const;
+    // Whether the note shown was heard only just now.
+    bool IsTracking() const;
+    // 0 A .. 11 G#; negative for no note.
+    int GetNote() const;
+    // Of the note, changing at C: 440 Hz is the A of octave 4. 0 without a note.
+    int GetOctave() const;
+    // The pitch last heard of the note shown, Hz. 0 without a note.
+    double GetFrequency() const;
+    // How far that is from the note, positive when sharp. 0 without a note.
+    float GetErrorCents() const;
+    // By how many decibels the strongest partial (the product, with method 1) stood out. 0 without a note.
+    float GetProminence() const;
+    // The mean pitch of the last half second if it stayed within 10 cents, else 0. Hz.
+    double GetStableFrequency() const;
+
+    // The name of the note shown; empty for none.
+    const char* GetTunedNoteName() const;
+    // The error as "+12.3c"; without a sign when it rounds to nothing. Empty without a note. Too short to
+    // allocate.
+    std::string GetTuningErrorStr() const;
+    static std::string GetTuningErrorStr(float cents);
+
+    // The spectrum without its noise floor, as long as the one analysed; empty until it was asked for.
+    // Belongs to the display thread.
+    const std::vector<float>& GetDenoisedSpectrum() const;
 
 private:
-    int m_sensitivity = 0;
+    friend class kivspectrum;
+    // Tune without telling the listener; true when it ought to be told. For the analyser, which does so when
+    // it has let go of its lock.
+    bool Analyse(const std::vector<float>& power, int fftLength, int hopLength, int windowLength,
+                 int samplingRate, bool halveHarmonics, bool denoise);
+    void Announce();
+
+    void ResetPeakMemories(bool forgetNote);
+    void Hear(double hz, float prominence, const Corvo::NearestNote& heard);
+    void Follow(double hz, float prominence, double framePeriod);
+    void RememberPitch(double hz, double framePeriod);
+
+    static constexpr int kLongestMemory = 16;  // analyses in half a second at the display's rate, both ends
+
+    std::unique_ptr<Corvo::PitchDetector> m_detector;
+    std::atomic<int> m_sensitivity{0};
+    std::atomic<bool> m_presetChosen{true};
+    std::atomic<TunerDisplayListener*> m_displayListener{nullptr};
+    int m_windowType = 4;
+
+    // What was found.
+    std::atomic<int> m_note{-1};
+    std::atomic<int> m_octave{0};
+    std::atomic<double> m_frequency{0.0};
+    std::atomic<float> m_cents{0.0f};
+    std::atomic<float> m_prominence{0.0f};
+    std::atomic<double> m_stableFrequency{0.0};
+    std::atomic<bool> m_tracking{false};
+
+    // Display thread only.
+    int m_announcedNote = -1, m_announcedOctave = 0;
+    int m_otherNote = -1, m_otherOctave = 0, m_otherCount = 0;  // heard instead of the note shown
+    int m_missed = 0;                                           // analyses without the note shown
+    std::array<double, kLongestMemory> m_pitches{};             // of the note shown, octaves above 1 Hz
+    int m_pitchCount = 0;
 };
+
+// Takes the pitch that `tuner` hears for the nearest note: moves the calibration base by the note's error, at
+// most 50 cents, and works out the notes. False, with nothing changed, unless the pitch has stayed within 10
+// cents for half a second. Like the reset it tells the tuning listener. Any thread.
+DSP_API bool TunerCalibrateNow(const Tuner& tuner);
+DSP_API void TunerCalibrateReset();
+DSP_API bool TunerIsNonstandardCalibration();
+DSP_API bool TunerCalibrationNotStandardOrNotUseEqualTemperament();
+// Lines of text that belong below a shown note: error and frequency, and a third for calibration and
+// temperament when they are not the usual ones.
+DSP_API int TunerGetNumLines();
+// Whether the note that `tuner` shows is being heard.
+DSP_API bool TunerIsTracking(const Tuner& tuner);
+// Works out the notes at once.
+DSP_API void CookNotesFreqs();

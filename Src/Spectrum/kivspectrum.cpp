@@ -238,10 +238,33 @@ bool kivspectrum::PrepareFFTForDrawingHelper(bool sonogramMode, bool sonogramOve
 
 bool kivspectrum::GetFFTFor3DSonogram(int samplingRate, const std::vector<float>** spectrum,
                                       bool fastSmoothing, bool probeOnly) {
-    if (!m_transforming && !PrepareFFTForDrawing(samplingRate, fastSmoothing, false, false, probeOnly))
-        return false;
+    if (!m_transforming) {
+        if (!PrepareFFTForDrawing(samplingRate, fastSmoothing, false, false, probeOnly)) return false;
+        if (!probeOnly && m_tunerOn) RunTuner(samplingRate);
+    }
     if (spectrum) *spectrum = &m_drawer->GetPowerSmoothed();
     return true;
+}
+
+bool kivspectrum::Refresh() {
+    if (!PrepareFFTForDrawingHelper(m_showSonogram, false)) return false;
+    if (m_tunerOn) RunTuner(m_samplingRate);
+    return true;
+}
+
+// The tuner reads buffers that a menu command may rebuild; its listener is told without the lock, since it
+// may answer with a command.
+void kivspectrum::RunTuner(int samplingRate) {
+    bool changed = false;
+    {
+        const Lock instanceLock(m_instanceLock);
+        m_tuner->SetWindowType(m_builtWindowType);
+        changed = m_tuner->Analyse(m_power, m_builtFftLength, m_builtHopLength, m_builtWindowLength,
+                                   samplingRate, true, false);
+    }
+    if (!changed) return;
+    m_tuner->Announce();
+    Tell(kMessageNoteChanged, m_tuner->IsTuned() ? 1 : 0);
 }
 
 void kivspectrum::PerformFFT() {

@@ -147,10 +147,14 @@ public:
     bool PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, bool sonogramMode, bool sonogramOverride,
                               bool probeOnly);
     bool PrepareFFTForDrawingHelper(bool sonogramMode, bool sonogramOverride);
-    // The display's entry per frame: prepares one and returns the smoothed power spectrum, which stays the
-    // drawer's. False, with `spectrum` untouched, when there was no new frame.
+    // The display's entry per frame: prepares one, tunes when the tuner is on, and returns the smoothed power
+    // spectrum, which stays the drawer's. False, with `spectrum` untouched, when there was no new frame.
     bool GetFFTFor3DSonogram(int samplingRate, const std::vector<float>** spectrum, bool fastSmoothing,
                              bool probeOnly);
+    // One display refresh, 30 times a second: prepares a frame when new samples came, smoothed at the
+    // sonogram's speed while that is shown, and tunes when the tuner is on; at the stored rate. True when
+    // there was a new frame.
+    bool Refresh();
     // Windows and transforms the newest samples.
     void PerformFFT();
 
@@ -207,6 +211,7 @@ private:
     void ComputePower();
     float SmoothingCoefficient(bool fastSmoothing, bool sonogramMode, bool sonogramOverride) const;
     void UpdateDrawer(const spectrum_settings& current);
+    void RunTuner(int samplingRate);
     void Tell(int message, std::intptr_t detail);
 
     mutable Corvo::CriticalSection m_instanceLock;

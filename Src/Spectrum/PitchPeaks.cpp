@@ -1,0 +1,108 @@
+#include "Spectrum/PitchPeaks.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace Corvo {
+namespace {
+
+constexpr std::size_t kMostPeaks = 32;
+constexpr float kFloorPerMean = 2.0f;
+// Less than this amplitude is a filter ringing out or rounding, whatever stands above whatever.
+constexpr double kSilentAmplitude = 1e-5;
+constexpr double kTypicalWindowMean = 0.42;
+// Leakage within this many bins of the window counts; further off it is weaker than any partial.
+constexpr double kLeakageReach = 7.0;
+constexpr float kLeakageMargin = 2.0f;
+// The position's variance: of the noise, in bins at a signal as strong as the noise, and of what else moves a
+// partial (its neighbours' skirts, its own decay).
+constexpr double kNoiseVariance = 0.15;
+constexpr double kOtherVariance = 0.004 * 0.004;
+
+float PowerRatio(float decibels) { return std::pow(10.0f, 0.1f * decibels); }
+
+}  // namespace
+
+void PitchPeaks::Initialise(const SpectrumFormat& format) {
+    m_format = format;
+    m_interpolation.Initialise(format.windowType, format.windowLength, format.fftLength);
+    m_floor.Initialise(format.bins, static_cast<double>(format.fftLength) / format.windowLength);
+    m_floorLevels.resize(format.bins);
+    // Two neighbours are never both peaks.
+    m_peaks.reserve(format.bins / 2 + 1);
+    m_silence = std::pow(0.5 * kSilentAmplitude * kTypicalWindowMean * format.windowLength, 2.0);
+}
+
+double PitchPeaks::InterpolateMax(std::span<const float> power, std::size_t bin) const {
+    return static_cast<double>(bin) + m_interpolation.InterpolateMax(power.data() + bin);
+}
+
+void PitchPeaks::Collect(std::span<const float> power, const TunerSensitivity& sensitivity) {
+    m_peaks.clear();
+    const float above = kFloorPerMean * PowerRatio(sensitivity.partialDb);
+    const double hz = m_format.HzPerBin();
+    const auto first = std::max<std::size_t>(static_cast<std::size_t>(sensitivity.lowestHz / hz), 1);
+    const auto last = std::min(m_format.bins - 1, static_cast<std::size_t>(sensitivity.highestHz / hz) + 1);
+    const float* const p = power.data();
+    const float* const floor = m_floorLevels.data();
+    for (std::size_t k = first; k < last; ++k)
+        if (p[k] > above * floor[k] && p[k] >= p[k - 1] && p[k] > p[k + 1])
+            m_peaks.push_back({k, 0.0, 0.0, p[k], 0.0f, 0.0f});
+}
+
+void PitchPeaks::DropLeakage() {
+    const double reach = kLeakageReach * m_format.fftLength / m_format.windowLength;
+    if (m_interpolation.LobeWidth() >= reach) return;
+    const auto leaks = [&](const SpectralPeak& from, const SpectralPeak& to) {
+        const double distance = std::abs(to.position - from.position);
+        return distance < reach && to.power < from.power &&
+               to.power < kLeakageMargin * from.power * static_cast<float>(m_interpolation.Leakage(distance));
+    };
+    for (SpectralPeak& peak : m_peaks) {
+        const auto near = [&](const SpectralPeak& other) { return leaks(other, peak); };
+        if (std::any_of(m_peaks.begin(), m_peaks.end(), near)) peak.weight = -1.0f;
+    }
+    std::erase_if(m_peaks, [](const SpectralPeak& peak) { return peak.weight < 0.0f; });
+}
+
+void PitchPeaks::KeepStrongest() {
+    if (m_peaks.size() <= kMostPeaks) return;
+    const auto end = m_peaks.begin() + static_cast<std::ptrdiff_t>(kMostPeaks);
+    std::nth_element(m_peaks.begin(), end, m_peaks.end(),
+                     [](const SpectralPeak& a, const SpectralPeak& b) { return a.power > b.power; });
+    m_peaks.erase(end, m_peaks.end());
+    std::sort(m_peaks.begin(), m_peaks.end(),
+              [](const SpectralPeak& a, const SpectralPeak& b) { return a.bin < b.bin; });
+}
+
+std::span<const SpectralPeak> PitchPeaks::FilterPeaks(std::span<const float> power,
+                                                      const TunerSensitivity& sensitivity,
+                                                      std::span<float> clean) {
+    if (m_format.bins < 3) return {};
+    m_floor.Measure(power, m_floorLevels);
+    if (clean.empty()) {
+        Collect(power, sensitivity);
+    } else {
+        for (std::size_t k = 0; k < m_format.bins; ++k)
+            clean[k] = std::max(power[k] - kFloorPerMean * m_floorLevels[k], 0.0f);
+        Collect(clean, sensitivity);
+    }
+    float strongest = 0.0f;
+    for (const SpectralPeak& peak : m_peaks) strongest = std::max(strongest, peak.power);
+    const float weakest = strongest / PowerRatio(sensitivity.rangeDb);
+    std::erase_if(m_peaks, [&](const SpectralPeak& peak) {
+        return !(peak.power >= weakest && peak.power >= m_silence);
+    });
+    KeepStrongest();
+    for (SpectralPeak& peak : m_peaks) {
+        peak.position = InterpolateMax(power, peak.bin);
+        const double noise = m_floorLevels[peak.bin] / peak.power;
+        peak.variance = kOtherVariance + kNoiseVariance * noise;
+        peak.aboveFloor = static_cast<float>(-10.0 * std::log10(std::max(kFloorPerMean * noise, 1e-20)));
+        peak.weight = 1.0f + 10.0f * std::log10(peak.power / strongest) / sensitivity.rangeDb;
+    }
+    DropLeakage();
+    return m_peaks;
+}
+
+}  // namespace Corvo
