@@ -25,13 +25,18 @@ struct DrawingBitmap {
     // is kept when the picture shrinks. Negative sides count as 0; rows that the limits leave no room for are
     // missing at the bottom.
     void Size(int newWidth, int newHeight) {
-        newWidth = std::clamp(newWidth, 0, kLargestSide);
-        newHeight = std::clamp(newHeight, 0, std::min(kLargestSide, kMostPixels / std::max(newWidth, 1)));
+        newWidth = LimitedWidth(newWidth);
+        newHeight = LimitedHeight(newWidth, newHeight);
         if (newWidth == width && newHeight == height) return;
         pixels.resize(static_cast<std::size_t>(newWidth) * static_cast<std::size_t>(newHeight));
         width = newWidth;
         height = newHeight;
         ++version;
+    }
+
+    static constexpr int LimitedWidth(int width) { return std::clamp(width, 0, kLargestSide); }
+    static constexpr int LimitedHeight(int width, int height) {
+        return std::clamp(height, 0, std::min(kLargestSide, kMostPixels / std::max(LimitedWidth(width), 1)));
     }
 
     bool IsEmpty() const { return pixels.empty(); }

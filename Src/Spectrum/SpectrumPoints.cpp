@@ -3,6 +3,7 @@
 #include <cstddef>
 
 #include "Spectrum/CoordinatesAndFrequencies.h"
+#include "Spectrum/PixelBins.h"
 #include "Spectrum/PowerToDecibels.h"
 #include "Spectrum/SpectrumDrawer.h"
 
@@ -14,17 +15,6 @@ using Corvo::LevelScale;
 namespace {
 
 constexpr float kWidest = 65536.0f;  // pixels
-
-// Through the middle two of four levels, without ever leaving the range between them.
-double Between(double before, double from, double to, double after, double share) {
-    const auto slope = [](double left, double right) {
-        return left * right > 0.0 ? 2.0 * left * right / (left + right) : 0.0;
-    };
-    const double step = to - from;
-    const double atFrom = slope(from - before, step), atTo = slope(step, after - to);
-    const double s = share, s2 = s * s, s3 = s2 * s;
-    return from + step * (3.0 * s2 - 2.0 * s3) + atFrom * (s3 - 2.0 * s2 + s) + atTo * (s3 - s2);
-}
 
 double ToLevel(double share, LevelScale scale) {
     switch (scale) {
@@ -98,41 +88,20 @@ int SpectrumDrawer::ComputeSpectrumPoints(const Corvo::RectF& rectangle, Corvo::
     return count;
 }
 
-// A column that holds bins shows the highest of them; where bins lie further apart than columns, the curve
-// passes smoothly from one to the next.
 void SpectrumDrawer::AddCurve(const Corvo::RectF& rectangle, const CoordinatesAndFrequencies& map,
                               const std::vector<float>& power, double scale) {
     m_levels.resize(power.size());
     ToLevels(power, m_levels, scale, map);
     const double perHz = static_cast<double>(m_settings.fft_length) / m_samplingRate;
-    const auto last = static_cast<std::ptrdiff_t>(power.size()) - 1;
-    const auto level = [&](std::ptrdiff_t k) {
-        return static_cast<double>(
-            m_levels[static_cast<std::size_t>(std::clamp<std::ptrdiff_t>(k, 0, last))]);
-    };
+    const auto bins = static_cast<std::ptrdiff_t>(power.size());
     const int columns = static_cast<int>(std::ceil(std::min(rectangle.width, kWidest)));
     const double left = rectangle.x, right = left + rectangle.width;
     double from = map.XToFrequency(left) * perHz;
-    for (int column = 0; column < columns && from <= static_cast<double>(last + 1); ++column) {
+    for (int column = 0; column < columns && from <= static_cast<double>(bins); ++column) {
         const double edge = std::min(left + column + 1.0, right);
         const double to = map.XToFrequency(edge) * perHz;
-        const double bins = static_cast<double>(last + 1);
-        const auto first = static_cast<std::ptrdiff_t>(std::ceil(std::clamp(from, 0.0, bins)));
-        const auto end = static_cast<std::ptrdiff_t>(std::ceil(std::clamp(to, 0.0, bins)));
-        std::ptrdiff_t bin = first;
-        double value;
-        if (first < end) {
-            for (std::ptrdiff_t k = first + 1; k < end; ++k)
-                if (level(k) > level(bin)) bin = k;
-            value = level(bin);
-        } else {
-            const double middle = std::clamp((from + to) / 2.0, 0.0, static_cast<double>(last));
-            const auto below = static_cast<std::ptrdiff_t>(middle);
-            const double share = middle - static_cast<double>(below);
-            value = Between(level(below - 1), level(below), level(below + 1), level(below + 2), share);
-            bin = share < 0.5 ? below : std::min(below + 1, last);
-        }
-        AddPoint((left + column + edge) / 2.0, map.LevelToY(value), bin);
+        const auto shown = Corvo::LevelOf(Corvo::BinsBetween(from, to, bins), m_levels.data(), bins);
+        AddPoint((left + column + edge) / 2.0, map.LevelToY(shown.level), shown.bin);
         from = to;
     }
 }

@@ -6,6 +6,7 @@
 #include <limits>
 #include <mutex>
 #include <numbers>
+#include <utility>
 
 #include "Platform/DenormalGuard.h"
 #include "Spectrum/AnalyserLock.h"
@@ -90,7 +91,8 @@ kivspectrum::kivspectrum()
       m_capture(std::make_unique<Corvo::CaptureBuffer>()),
       m_drawer(std::make_unique<SpectrumDrawer>(spectrum_settings{})),
       m_filter(std::make_unique<VectorInterpolationFilterFloat>()),
-      m_tuner(std::make_unique<Tuner>()) {
+      m_tuner(std::make_unique<Tuner>()),
+      m_sonogram(std::make_unique<Corvo::Sonogram>()) {
     // Together: a menu command in between would not reach this analyser.
     const Lock classLock(AnalyserLock());
     init();
@@ -227,6 +229,7 @@ bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, boo
         UpdateDrawer(current);
         m_drawer->SmoothFftSpectrum(
             m_power, SmoothingCoefficient(fastSmoothing, sonogramMode, sonogramOverride), *m_filter);
+        m_frameForSonogram = true;
     }
     Tell(kMessageFrameReady, 0);
     return true;
@@ -247,9 +250,9 @@ bool kivspectrum::GetFFTFor3DSonogram(int samplingRate, const std::vector<float>
 }
 
 bool kivspectrum::Refresh() {
-    if (!PrepareFFTForDrawingHelper(m_showSonogram, false)) return false;
-    if (m_tunerOn) RunTuner(m_samplingRate);
-    return true;
+    const bool prepared = PrepareFFTForDrawingHelper(m_showSonogram, false);
+    if (prepared && m_tunerOn) RunTuner(m_samplingRate);
+    return AdvanceSonogram() || prepared;
 }
 
 // The tuner reads buffers that a menu command may rebuild; its listener is told without the lock, since it
@@ -265,6 +268,14 @@ void kivspectrum::RunTuner(int samplingRate) {
     if (!changed) return;
     m_tuner->Announce();
     Tell(kMessageNoteChanged, m_tuner->IsTuned() ? 1 : 0);
+}
+
+bool kivspectrum::AdvanceSonogram() {
+    // The smoothed spectrum is rebuilt under this lock.
+    const Lock instanceLock(m_instanceLock);
+    if (!m_showSonogram || !m_on || m_frozen || m_drawer->GetSamplingFrequency() <= 0) return false;
+    const double pitch = m_tunerOn ? m_tuner->GetFrequency() : 0.0;
+    return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch));
 }
 
 void kivspectrum::PerformFFT() {

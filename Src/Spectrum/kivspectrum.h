@@ -19,6 +19,7 @@ class Tuner;
 class VectorInterpolationFilterFloat;
 namespace Corvo {
 class CaptureBuffer;
+class Sonogram;
 struct PointF;
 struct RectF;
 }  // namespace Corvo
@@ -152,9 +153,12 @@ public:
     bool GetFFTFor3DSonogram(int samplingRate, const std::vector<float>** spectrum, bool fastSmoothing,
                              bool probeOnly);
     // One display refresh, 30 times a second: prepares a frame when new samples came, smoothed at the
-    // sonogram's speed while that is shown, and tunes when the tuner is on; at the stored rate. True when
-    // there was a new frame.
+    // sonogram's speed while that is shown, tunes when the tuner is on, and advances the sonogram; at the
+    // stored rate. True when there is something new to draw.
     bool Refresh();
+    // The sonogram's part of a refresh: its step, with the pitch that the tuner hears, while it is shown and
+    // the analyser runs. True when the picture has new columns, which it has without a new frame, too.
+    bool AdvanceSonogram();
     // Windows and transforms the newest samples.
     void PerformFFT();
 
@@ -169,6 +173,7 @@ public:
     const std::vector<float>& GetWindow() const;
     SpectrumDrawer* GetSpectrumDrawer() const;
     Tuner* GetTuner() const;
+    Corvo::Sonogram* GetSonogram() const;
     void peak_reset();
 
     void SetOn(bool on);
@@ -231,6 +236,8 @@ private:
     std::unique_ptr<SpectrumDrawer> m_drawer;
     std::unique_ptr<VectorInterpolationFilterFloat> m_filter;
     std::unique_ptr<Tuner> m_tuner;
+    std::unique_ptr<Corvo::Sonogram> m_sonogram;
+    bool m_frameForSonogram = false;  // prepared since its last step
 
     std::atomic<bool> m_on{false};
     std::atomic<bool> m_tunerOn{false};

@@ -2,6 +2,7 @@
 
 #include "Spectrum/AnalyserLock.h"
 #include "Spectrum/CaptureBuffer.h"
+#include "Spectrum/Sonogram.h"
 #include "Spectrum/SpectrumDrawer.h"
 #include "Spectrum/Tuner.h"
 #include "Spectrum/VectorInterpolationFilterFloat.h"
@@ -17,6 +18,7 @@ const std::vector<float>& kivspectrum::GetPower() const { return m_power; }
 const std::vector<float>& kivspectrum::GetWindow() const { return m_window; }
 SpectrumDrawer* kivspectrum::GetSpectrumDrawer() const { return m_drawer.get(); }
 Tuner* kivspectrum::GetTuner() const { return m_tuner.get(); }
+Corvo::Sonogram* kivspectrum::GetSonogram() const { return m_sonogram.get(); }
 
 void kivspectrum::peak_reset() {
     const Lock instanceLock(m_instanceLock);

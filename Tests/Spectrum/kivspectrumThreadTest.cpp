@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "AnalyserFixture.h"
+#include "Spectrum/Sonogram.h"
 #include "Spectrum/Tuner.h"
 
 namespace {
@@ -27,8 +28,10 @@ TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
     };
     const auto display = [&] {
         const std::vector<float>* spectrum = nullptr;
+        first.GetSonogram()->CheckPixelBufferSize({0.0f, 0.0f, 20.0f, 10.0f}, 0);
         while (!stop) {
             frames += first.PrepareFFTForDrawingHelper(false, false);
+            first.AdvanceSonogram();
             frames += second.GetFFTFor3DSonogram(48000, &spectrum, true, false);
         }
     };
@@ -42,6 +45,9 @@ TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
                 mine.SetOn(true);
             }
             if (command == 1300) other.ToggleTuner();
+            mine.ShowSonogram(true);
+            Corvo::Sonogram::SetSpeedIndex(command % 9);
+            Corvo::Sonogram::SetColourScheme(command % 7);
         }
     };
     std::vector<std::thread> threads;
@@ -53,6 +59,8 @@ TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
     stop = true;
     for (auto& thread : threads) thread.join();
     EXPECT_GT(frames, 0);
+    Corvo::Sonogram::SetSpeedIndex(3);
+    Corvo::Sonogram::SetColourScheme(0);
     Tuner::SetDetectionMethod(0);
     Tuner::SetShowDenoisedSpectrum(false);
     Tuner::SetTemperament(0);
