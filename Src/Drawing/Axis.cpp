@@ -59,8 +59,10 @@ void AddSteps(AxisTicks& ticks, const CoordinatesAndFrequencies& map, float leng
     }
 }
 
-// Every semitone where there is room, else the naturals, else the Cs alone.
+// Lines: every semitone where there is room, else the naturals, else the Cs alone. Labels likewise, so that
+// what is named does not change from octave to octave.
 void AddNotes(AxisTicks& ticks, const CoordinatesAndFrequencies& map, float unit) {
+    const float line = 1.6f * unit, label = 4.0f * unit;
     const auto hz = [](int semitone) {
         return kConcertPitch * std::exp2((semitone - kConcertSemitone) / 12.0);
     };
@@ -73,9 +75,12 @@ void AddNotes(AxisTicks& ticks, const CoordinatesAndFrequencies& map, float unit
         const int inOctave = (note % 12 + 12) % 12;
         const bool isNatural = (0b101010110101 >> inOctave & 1) != 0;
         const double step = map.FrequencyToX(hz(note + 1)) - map.FrequencyToX(hz(note));
-        const double next = isNatural ? 1.5 * step : step;
-        if (inOctave != 0 && next < unit) continue;
+        if (inOctave != 0 && (isNatural ? 1.5 * step : step) < line) continue;
         const int rank = inOctave == 0 ? 0 : isNatural ? 1 : 2;
+        if (inOctave != 0 && step < label) {
+            ticks.Add(hz(note), AxisTick::kUnlabelled, {});
+            continue;
+        }
         ticks.Add(hz(note), rank, ShortText().AddNoteName(note).View());
     }
 }
@@ -121,8 +126,9 @@ AxisTicks TimeTicks(double seconds, float length, float labelWidth) {
     if (!(seconds > 0.0)) return ticks;
     const double step = RoundStep(seconds * std::max(labelWidth, 1.0f) / std::max(length, 1.0f));
     const int decimals = step >= 1.0 ? 0 : static_cast<int>(std::ceil(-std::log10(step) - 1e-9));
-    for (int i = 0; i < kMostSteps && i * step <= seconds; ++i)
-        ticks.Add(-i * step, 0, ShortText().AddNumber(-i * step, decimals).Add(i == 0 ? "s" : "").View());
+    ticks.Add(0.0, 0, "0 s");
+    for (int i = 1; i < kMostSteps && i * step <= seconds; ++i)
+        ticks.Add(-i * step, 0, ShortText().AddNumber(-i * step, decimals).View());
     return ticks;
 }
 

@@ -5,6 +5,7 @@
 
 #include "Drawing/Axis.h"
 #include "Drawing/Look.h"
+#include "Drawing/ShortText.h"
 
 // Grid lines and labels of scales. `position` turns a tick's value into x or y.
 namespace Corvo {
@@ -65,13 +66,15 @@ void DrawLabelColumn(Target& target, const AxisTicks& ticks, float top, float bo
         }
 }
 
+// What the labels of levels, round frequencies and, with `notes`, notes take beside a plot.
 template <typename Target>
-float WidestLabel(Target& target, const AxisTicks& ticks) {
+float LabelWidth(Target& target, bool notes) {
     const float size = Look::kLabelSize * target.Scale();
-    float widest = 0.0f;
-    for (const AxisTick& tick : ticks.All())
-        if (tick.rank < AxisTick::kUnlabelled)
-            widest = std::max(widest, target.MeasureText(tick.Label(), size).width);
+    float widest = target.MeasureText("\u2212144", size).width;
+    constexpr int kWidestOctave = 10 * 12 + 12;
+    for (int note = 0; notes && note < 12; ++note)
+        widest = std::max(
+            widest, target.MeasureText(ShortText().AddNoteName(kWidestOctave + note).View(), size).width);
     return widest;
 }
 

@@ -29,6 +29,7 @@ constexpr float kLabelSize   = 11.0f;
 constexpr float kInfoSize    = 12.0f;
 constexpr float kGap         = 4.0f;
 constexpr float kLabelGap    = 10.0f;  // least distance between labels side by side
+constexpr float kLevelPitch  = 2.6f;   // least distance between labels of levels, in their heights
 constexpr float kHairline    = 1.0f;
 constexpr float kCurveWidth  = 1.5f;
 constexpr float kTraceWidth  = 2.0f;

@@ -4,6 +4,8 @@
 #include <charconv>
 #include <cmath>
 
+#include "Spectrum/Tuner.h"
+
 namespace Corvo {
 namespace {
 
@@ -46,9 +48,8 @@ ShortText& ShortText::AddNote(double hz) {
 }
 
 ShortText& ShortText::AddNoteName(int semitone) {
-    constexpr std::array<std::string_view, 12> kNames{"C",  "C#", "D",  "D#", "E",  "F",
-                                                      "F#", "G",  "G#", "A",  "A#", "B"};
-    return Add(kNames[static_cast<std::size_t>((semitone % 12 + 12) % 12)])
+    constexpr int kA = 9;  // the tuner counts the notes of an octave from A
+    return Add(Tuner::GetNoteName(((semitone - kA) % 12 + 12) % 12))
         .AddNumber(std::floor(semitone / 12.0) - 1.0, 0);
 }
 

@@ -19,7 +19,7 @@ public:
     ShortText& AddFrequency(double hz);
     // "A4 +12c": the note of equal temperament on A = 440 Hz that is nearest; nothing outside 8 Hz..32 kHz.
     ShortText& AddNote(double hz);
-    // "A4", from the number of semitones above C-1.
+    // "A4", in the tuner's naming, from the number of semitones above C-1.
     ShortText& AddNoteName(int semitone);
 
 private:

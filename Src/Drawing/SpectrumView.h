@@ -22,13 +22,17 @@ struct SpectrumLayout {
 template <typename Target>
 SpectrumLayout LayOutSpectrum(Target& target, const RectF& rectangle, const SpectrumSettings& settings) {
     const float scale = target.Scale(), size = Look::kLabelSize * scale, gap = Look::kGap * scale;
-    const TextMetrics widest = target.MeasureText("\u2212144", size);
-    const float left = widest.width + 2.0f * gap, bottom = widest.ascent + widest.descent + gap;
+    const TextMetrics line = target.MeasureText("0", size);
+    const float left = LabelWidth(target, false) + 2.0f * gap, bottom = line.ascent + line.descent + gap;
     const RectF inner = Snapped(Shrunk(rectangle, left, gap, gap, bottom));
     const float least = Look::kLeastPlot * scale;
     if (settings.view_flag_b == 0 || inner.width < least || inner.height < least)
         return {Snapped(rectangle), false};
     return {inner, true};
+}
+
+inline bool ShowsNotes(const SpectrumSettings& settings) {
+    return settings.view_flag_d || FrequencyScaleOf(settings) == FrequencyScale::Notes;
 }
 
 template <typename Target>
@@ -38,7 +42,7 @@ void DrawSpectrumScales(Target& target, const SpectrumLayout& layout, const Coor
     const float scale = target.Scale(), size = Look::kLabelSize * scale, gap = Look::kGap * scale;
     const TextMetrics line = target.MeasureText("0", size);
     const AxisTicks frequencies = FrequencyTicks(map, plot.width, 6.0f * scale, settings.view_flag_d);
-    const AxisTicks levels = LevelTicks(map, plot.height, 2.0f * (line.ascent + line.descent));
+    const AxisTicks levels = LevelTicks(map, plot.height, Look::kLevelPitch * (line.ascent + line.descent));
     const auto xOf = [&](double hz) { return map.FrequencyToX(hz); };
     const auto yOf = [&](double level) { return map.LevelToY(level); };
     if (settings.view_option_c != 0) {
@@ -47,8 +51,9 @@ void DrawSpectrumScales(Target& target, const SpectrumLayout& layout, const Coor
     }
     if (!layout.labels) return;
     DrawLabelRow(target, frequencies, plot.x, Right(plot), Bottom(plot) + gap / 2.0f + line.ascent, xOf);
-    target.Text("Hz", {plot.x - gap, Bottom(plot) + gap / 2.0f + line.ascent}, TextAlign::Right, size,
-                {Look::kLabel});
+    if (!ShowsNotes(settings))
+        target.Text("Hz", {plot.x - gap, Bottom(plot) + gap / 2.0f + line.ascent}, TextAlign::Right, size,
+                    {Look::kLabel});
     DrawLabelColumn(target, levels, plot.y, Bottom(plot), plot.x - gap, TextAlign::Right, yOf);
 }
 

@@ -95,6 +95,20 @@ public:
     // What the tuner heard at a column, 0 the left one; 0 where it heard nothing, or outside.
     float GetPitch(int column) const;
 
+    // Drawing, once per back-end, into `rectangle`: the picture; its scale of colours with levels;
+    // frequencies or notes, up to the rectangle's right edge; seconds before now, for a picture as wide as
+    // the rectangle; what the tuner heard, over a picture that fills it. One thread at a time.
+    template <class Drawing>
+    void Draw(typename Drawing::DrawTarget& target, const RectF& rectangle);
+    template <class Drawing>
+    void DrawIntensityScale(typename Drawing::DrawTarget& target, const RectF& rectangle);
+    template <class Drawing>
+    void DrawFrequencyScale(typename Drawing::DrawTarget& target, const RectF& rectangle, bool noteNames);
+    template <class Drawing>
+    void DrawTimeline(typename Drawing::DrawTarget& target, const RectF& rectangle);
+    template <class Drawing>
+    void DrawPitchTrace(typename Drawing::DrawTarget& target, const RectF& rectangle);
+
 private:
     static constexpr int kShades = 1024;
 
@@ -133,6 +147,7 @@ private:
 
     std::vector<float> m_pitches;  // a ring, one per column of the picture
     int m_oldestPitch = 0;
+    std::vector<PointF> m_trace;  // one stretch of them as drawn
 };
 
 }  // namespace Corvo

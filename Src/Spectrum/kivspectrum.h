@@ -203,13 +203,47 @@ public:
     // Drawing, once per back-end (Drawing/DrawingCairo.h, on Windows DrawingGdiPlus.h and DrawingD2D.h): into
     // `rectangle`, in pixels of the target, whatever its size. One thread draws for all analysers; it is the
     // display thread, or the menu's while the display thread rests.
+    //
+    // DoDraw draws what the display mode says.
+    template <class Drawing>
+    void DoDraw(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
     template <class Drawing>
     void DoDrawSpectrum(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // The spectrum above the sonogram.
+    template <class Drawing>
+    void DoDrawSonogramAndSpectrum(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // The sonogram with its scales and, while the tuner is on, the pitch; and its scale of colours alone.
+    template <class Drawing>
+    void DrawSonogramComponents(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    template <class Drawing>
+    void DrawSonogramIntensityScale(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // The name of the note in its circle.
+    template <class Drawing>
+    void DoDrawBigLetter(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // The whole tuner: note and needle side by side or one above the other, or one line where it is small.
+    template <class Drawing>
+    void DrawTuner(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // The note between ripples that light up with its error.
+    template <class Drawing>
+    void DrawTunerBigLetter(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // A dial from -50 to 50 cents, and what there is to read below it.
+    template <class Drawing>
+    void DrawTunerWithNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // The dial alone, and the text alone.
+    template <class Drawing>
+    void DrawNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    template <class Drawing>
+    void DrawNeedleInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
 
 private:
     template <class Drawing>
     void DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
                           const CoordinatesAndFrequencies& map);
+    template <class Drawing>
+    void DrawSonogramInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot);
+    template <class Drawing>
+    void DrawTunerLine(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+
     bool ApplyCommand(int command);
     void ResizeFilter();
     void cook_window();

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <cstdint>
 #include <vector>
 
@@ -45,5 +47,7 @@ private:
     cairo_surface_t* m_surface;
     Corvo::DrawingCairo m_drawing;
 };
+
+using DrawingBackends = testing::Types<Corvo::DrawingCairo>;
 
 }  // namespace TestSupport
