@@ -15,7 +15,9 @@ void AddEffectsCommand(CLI::App& app);
 void AddPitchCommand(CLI::App& app);
 void AddEqCurveCommand(CLI::App& app);
 void AddRenderCommand(CLI::App& app);
+void AddSonogramCommand(CLI::App& app);
 void AddSpectrumCommand(CLI::App& app);
+void AddTunerCommand(CLI::App& app);
 
 // What every command that writes takes.
 struct WritingOptions {

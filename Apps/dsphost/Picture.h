@@ -34,6 +34,8 @@ public:
         draw(target);
     }
 
+    Corvo::RectF Whole() const { return m_whole; }
+
     // The bytes of a PNG file. Throws IoError when it cannot be made.
     std::vector<std::uint8_t> Png();
 
@@ -43,6 +45,7 @@ private:
     struct Surface;
     std::unique_ptr<Surface> m_surface;
     PictureDrawing m_drawing;
+    Corvo::RectF m_whole;
     float m_dpi;
 };
 

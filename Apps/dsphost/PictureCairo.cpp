@@ -32,7 +32,9 @@ struct Picture::Surface {
 };
 
 Picture::Picture(int width, int height, float dpi)
-    : m_surface(std::make_unique<Surface>(width, height)), m_dpi(dpi) {
+    : m_surface(std::make_unique<Surface>(width, height)),
+      m_whole{0.0f, 0.0f, static_cast<float>(width), static_cast<float>(height)},
+      m_dpi(dpi) {
     if (width < 1 || height < 1 || cairo_status(m_surface->context) != CAIRO_STATUS_SUCCESS)
         throw UserError("no picture of " + std::to_string(width) + "x" + std::to_string(height) +
                         " pixels can be made");

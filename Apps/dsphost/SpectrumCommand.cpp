@@ -3,14 +3,19 @@
 #include <charconv>
 #include <memory>
 #include <numeric>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include "AudioReader.h"
 #include "Commands.h"
 #include "Errors.h"
+#include "PictureOptions.h"
 #include "Progress.h"
 #include "Spectrum/PowerToDecibels.h"
+#include "Spectrum/SpectrumDrawer.h"
+#include "Spectrum/SpectrumScales.h"
+#include "Spectrum/VectorInterpolationFilterFloat.h"
 #include "Spectrum/kivspectrum.h"
 #include "Text.h"
 
@@ -18,17 +23,21 @@ namespace dsphost {
 namespace {
 
 constexpr int kMostChannels = 64;
+constexpr int kPeaksStay = 2;
 constexpr int kShortest = 128, kLongest = 524288;
 const std::vector<std::string> kWindows{"rectangular", "triangular", "hann", "hamming", "blackman"};
 
 struct Arguments {
-    std::string input, output, window = kWindows.back();
+    std::string input, picture, csv, window = kWindows.back();
     int length = 4096;
     float overlap = 0.5f;
+    PictureOptions drawing;
     WritingOptions writing;
 };
 
-void CheckNumbers(const Arguments& arguments) {
+void Check(const Arguments& arguments) {
+    if (arguments.picture.empty() && arguments.csv.empty())
+        throw UserError("an output is missing; accepted: a picture (OUT.png), --csv FILE, or both");
     if (arguments.length < kShortest || arguments.length > kLongest ||
         !std::has_single_bit(static_cast<unsigned>(arguments.length)))
         throw UserError("--length cannot be " + std::to_string(arguments.length) +
@@ -53,6 +62,7 @@ std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser, cons
         std::fill(samples.begin() + got * channels, samples.end(), 0.0);
         analyser.Feed(samples.data(), wanted, input.Channels(), input.Channels());
         analyser.PrepareFFTForDrawingHelper(false, false);
+        analyser.GetSpectrumDrawer()->AgePeaks();
         const auto& power = analyser.GetPower();
         for (std::size_t k = 0; k < sum.size(); ++k) sum[k] += power[k];
         ++spectra;
@@ -82,24 +92,48 @@ std::string Csv(const std::vector<double>& power, const std::vector<float>& wind
     return text;
 }
 
+// The curve is the mean, over the highest that each frequency ever reached.
+void Draw(kivspectrum& analyser, const std::vector<double>& power, Picture& picture) {
+    auto& settings = kivspectrum::settings;
+    SpectrumDrawer& drawer = *analyser.GetSpectrumDrawer();
+    drawer.UpdateSettings(settings);
+    VectorInterpolationFilterFloat unused;
+    drawer.SmoothFftSpectrum({power.begin(), power.end()}, 0.0f, unused);
+    picture.Paint([&](auto& target) { analyser.DoDrawSpectrum<PictureDrawing>(target, picture.Whole()); });
+}
+
 void Run(Arguments arguments) {
-    CheckNumbers(arguments);
+    Check(arguments);
     arguments.writing.rules.inputs = {arguments.input};
     auto& settings = kivspectrum::settings;
     settings.window_type = static_cast<std::int32_t>(FindName(arguments.window, kWindows, "window"));
     settings.window_length = arguments.length;
+    settings.time_smoothing = 0;
+    settings.peak_hold_mode = kPeaksStay;
+    settings.view_option_e = static_cast<std::int32_t>(Corvo::CurveStyle::Filled);
     kivspectrum::SetAnalysisWindowsOverlap(arguments.overlap);
 
     AudioReader input(arguments.input);
     RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
-    OutputFile output(arguments.output, arguments.writing.rules);
     kivspectrum analyser;
     analyser.set_parameters(input.Rate());
     analyser.SetOn(true);
+    arguments.drawing.ApplyTo(analyser);
+    std::optional<OutputFile> table, drawing;
+    std::unique_ptr<Picture> picture;
+    if (!arguments.csv.empty()) table.emplace(arguments.csv, arguments.writing.rules);
+    if (!arguments.picture.empty()) {
+        picture = arguments.drawing.Make();
+        drawing.emplace(arguments.picture, arguments.writing.rules);
+    }
     const auto power = AveragePower(input, analyser, arguments);
-    const std::string text = Csv(power, analyser.GetWindow(), input.Rate(), arguments.length);
-    output.Bytes().Write(text.data(), text.size());
-    output.Commit();
+    if (picture) Draw(analyser, power, *picture);
+    if (table) {
+        const std::string text = Csv(power, analyser.GetWindow(), input.Rate(), arguments.length);
+        table->Bytes().Write(text.data(), text.size());
+    }
+    if (picture) Save(*picture, *drawing);
+    if (table) table->Commit();
 }
 
 }  // namespace
@@ -110,11 +144,12 @@ void AddSpectrumCommand(CLI::App& app) {
     auto* const command =
         app.add_subcommand("spectrum", "Writes the mean spectrum of an audio file, its channels mixed");
     command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("--csv", a.output, "Table of frequencies and levels, 0 dB a full-scale sine")
-        ->required();
+    command->add_option("OUT", a.picture, "PNG picture: the mean, and the highest levels as a thin line");
+    command->add_option("--csv", a.csv, "Table of frequencies and mean levels, 0 dB a full-scale sine");
     command->add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
     command->add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
     command->add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
+    a.drawing.AddTo(*command);
     a.writing.AddTo(*command);
     command->callback([arguments] { Run(*arguments); });
 }

@@ -13,8 +13,8 @@ namespace {
 
 // One line registers a command.
 constexpr void (*kCommands[])(CLI::App&) = {
-    AddConvertCommand, AddEffectsCommand, AddPitchCommand,
-    AddEqCurveCommand, AddRenderCommand,  AddSpectrumCommand,
+    AddConvertCommand, AddEffectsCommand,  AddPitchCommand,    AddEqCurveCommand,
+    AddRenderCommand,  AddSonogramCommand, AddSpectrumCommand, AddTunerCommand,
 };
 
 constexpr int kSuccess = 0, kIoFailure = 1, kUserFailure = 2, kInterrupted = 130;

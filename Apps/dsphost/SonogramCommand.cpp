@@ -1,0 +1,113 @@
+#include <algorithm>
+#include <cmath>
+#include <memory>
+#include <string>
+
+#include "AudioReader.h"
+#include "Commands.h"
+#include "Errors.h"
+#include "PictureOptions.h"
+#include "Playback.h"
+#include "Spectrum/Sonogram.h"
+#include "Spectrum/kivspectrum.h"
+
+namespace dsphost {
+namespace {
+
+constexpr int kMostChannels = 64;
+constexpr int kSlowest = 0, kFastest = 8, kLastScheme = 6;
+constexpr int kChooseSpeed = -1;
+// A new spectrum at every refresh, whatever the rate.
+constexpr float kOverlap = 0.98f;
+
+struct Arguments {
+    std::string input, output;
+    int scheme = 0, speed = kChooseSpeed;
+    bool spectrum = false, pitch = false;
+    PictureOptions drawing;
+    WritingOptions writing;
+};
+
+void Check(int value, int first, int last, const std::string& option) {
+    if (value < first || value > last)
+        throw UserError(option + " cannot be " + std::to_string(value) +
+                        "; accepted: " + std::to_string(first) + " to " + std::to_string(last));
+}
+
+// The fastest speed at which the whole file fits into so many columns; the slowest when none does or its
+// length is not known.
+int SpeedFor(const AudioReader& input, int columns) {
+    if (!input.Frames()) return kSlowest;
+    const double seconds = static_cast<double>(*input.Frames()) / input.Rate();
+    for (int speed = kFastest; speed > kSlowest; --speed) {
+        Corvo::Sonogram::SetSpeedIndex(speed);
+        if (seconds * Corvo::Sonogram::GetColumnsPerSecond() <= columns) return speed;
+    }
+    return kSlowest;
+}
+
+// How many columns a file shorter than the picture leaves empty; some stay for the picture's sake.
+int SpareColumns(const AudioReader& input, int columns) {
+    constexpr int kLeastColumns = 480;
+    if (!input.Frames()) return 0;
+    const double seconds = static_cast<double>(*input.Frames()) / input.Rate();
+    const double needed = std::ceil(seconds * Corvo::Sonogram::GetColumnsPerSecond());
+    return std::max(columns - static_cast<int>(std::clamp<double>(needed, kLeastColumns, columns)), 0);
+}
+
+void Run(Arguments arguments) {
+    if (arguments.speed != kChooseSpeed) Check(arguments.speed, kSlowest, kFastest, "--speed");
+    Check(arguments.scheme, 0, kLastScheme, "--scheme");
+    arguments.writing.rules.inputs = {arguments.input};
+    AudioReader input(arguments.input);
+    RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
+    auto picture = arguments.drawing.Make();
+    OutputFile output(arguments.output, arguments.writing.rules);
+
+    kivspectrum analyser;
+    analyser.set_parameters(input.Rate());
+    analyser.SetOn(true);
+    analyser.SetTunerOn(arguments.pitch);
+    kivspectrum::SetAnalysisWindowsOverlap(kOverlap);
+    analyser.ObserverUpdate();
+    arguments.drawing.ApplyTo(analyser);
+    Corvo::Sonogram::SetColourScheme(arguments.scheme);
+    analyser.ShowSonogram(true);
+    const auto draw = [&](auto& target) {
+        if (arguments.spectrum)
+            analyser.DoDrawSonogramAndSpectrum<PictureDrawing>(target, picture->Whole());
+        else
+            analyser.DrawSonogramComponents<PictureDrawing>(target, picture->Whole());
+    };
+    picture->Paint(draw);  // makes the sonogram as wide as it will be
+    const int columns = analyser.GetSonogram()->GetBitmap().width;
+    Corvo::Sonogram::SetSpeedIndex(arguments.speed == kChooseSpeed ? SpeedFor(input, columns)
+                                                                   : arguments.speed);
+    picture = arguments.drawing.Make(SpareColumns(input, columns));
+    picture->Paint(draw);
+    PlayThrough(input, analyser, "sonogram", arguments.writing.quiet, [&](double) { analyser.Refresh(); });
+    picture->Paint(draw);
+    Save(*picture, output);
+}
+
+}  // namespace
+
+void AddSonogramCommand(CLI::App& app) {
+    const auto arguments = std::make_shared<Arguments>();
+    auto& a = *arguments;
+    auto* const command = app.add_subcommand("sonogram", "Draws how the spectrum of an audio file changes");
+    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
+    command->add_option("OUT", a.output, "PNG picture")->required();
+    command->add_option("--scheme", a.scheme, "Colours, 0 to 6");
+    command->add_option(
+        "--speed", a.speed,
+        "0 to 8: 5, 10, 15, 30, 60, 90, 150, 300 or 450 columns a second; the picture then ends "
+        "with the file. Without it the whole file is in the picture where it fits");
+    command->add_flag("--spectrum", a.spectrum, "With the last spectrum above");
+    command->add_flag("--pitch", a.pitch, "With the pitch that the tuner hears");
+    a.drawing.AddTo(*command);
+    a.writing.AddTo(*command);
+    command->callback([arguments] { Run(*arguments); });
+}
+
+}  // namespace dsphost

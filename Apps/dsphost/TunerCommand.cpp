@@ -1,0 +1,173 @@
+#include <cmath>
+#include <memory>
+#include <optional>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <nlohmann/json.hpp>
+
+#include "AudioReader.h"
+#include "Commands.h"
+#include "Errors.h"
+#include "File.h"
+#include "PictureOptions.h"
+#include "Playback.h"
+#include "Spectrum/Tuner.h"
+#include "Spectrum/kivspectrum.h"
+#include "Text.h"
+
+namespace dsphost {
+namespace {
+
+constexpr int kMostChannels = 64;
+constexpr float kOverlap = 0.98f;  // a new spectrum at every refresh, whatever the rate
+const std::vector<std::string> kMethods{"denoised", "harmonic-product", "pseudo-harmonic-product", "legacy",
+                                        "two-way-mismatch"};
+
+struct Arguments {
+    std::string input, output, method = kMethods.front(), temperament = "Equal", sensitivity = "Standard";
+    std::optional<double> at;
+    bool json = false;
+    PictureOptions drawing;
+    WritingOptions writing;
+};
+
+std::vector<std::string> Names(const char* (*nameOf)(int)) {
+    std::vector<std::string> names;
+    for (int i = 0; *nameOf(i) != '\0'; ++i) names.push_back(nameOf(i));
+    return names;
+}
+
+// What was heard at one refresh.
+struct Heard {
+    double seconds, hz;
+    float cents;
+    int note, octave;
+};
+
+Heard Hear(const Tuner& tuner, double seconds) {
+    return {seconds, tuner.GetFrequency(), tuner.GetErrorCents(), tuner.IsTuned() ? tuner.GetNote() : -1,
+            tuner.GetOctave()};
+}
+
+std::string Json(const std::vector<Heard>& all) {
+    auto array = nlohmann::ordered_json::array();
+    const auto rounded = [](double value, double steps) { return std::round(value * steps) / steps; };
+    for (const Heard& heard : all) {
+        nlohmann::ordered_json row{{"time", rounded(heard.seconds, 1000.0)},
+                                   {"note", nullptr},
+                                   {"cents", nullptr},
+                                   {"frequency", nullptr}};
+        if (heard.note >= 0) {
+            row["note"] = Tuner::GetNoteName(heard.note) + std::to_string(heard.octave);
+            row["cents"] = rounded(static_cast<double>(heard.cents), 100.0);
+            row["frequency"] = rounded(heard.hz, 1000.0);
+        }
+        array.push_back(std::move(row));
+    }
+    return array.dump(1) + "\n";
+}
+
+// Says when the panel is worth drawing: at the moment that was asked for, or as the longest note so far goes
+// on.
+class Moment {
+public:
+    explicit Moment(std::optional<double> at) : m_at(at) {}
+
+    bool IsNow(const Heard& heard) {
+        if (m_at) return std::exchange(m_before, heard.seconds) < *m_at && heard.seconds >= *m_at;
+        const bool same = heard.note == m_note && heard.octave == m_octave;
+        m_note = heard.note;
+        m_octave = heard.octave;
+        m_length = same ? m_length + 1 : 1;
+        // Now and then is enough: a long note is drawn many times otherwise.
+        constexpr int kRefreshes = 6;
+        if (heard.note < 0 || m_length < m_longest + kRefreshes) return false;
+        m_longest = m_length;
+        return true;
+    }
+
+private:
+    std::optional<double> m_at;
+    double m_before = -1.0;
+    int m_note = -1, m_octave = 0, m_length = 0, m_longest = 0;
+};
+
+class Listener {
+public:
+    explicit Listener(const Arguments& arguments) : m_arguments(arguments), m_input(arguments.input) {
+        RequireFormat(m_input, kMostChannels, "the analyser takes the mean of up to 64");
+        m_analyser.set_parameters(m_input.Rate());
+        m_analyser.SetOn(true);
+        m_analyser.SetTunerOn(true);
+        m_analyser.ObserverUpdate();
+        kivspectrum::SetAnalysisWindowsOverlap(kOverlap);
+        m_analyser.ObserverUpdate();
+    }
+
+    // each(seconds) at every refresh; the time is that of the window's middle.
+    template <typename Each>
+    void Play(Each each) {
+        const double half = kivspectrum::settings.window_length / 2.0 / m_input.Rate();
+        PlayThrough(m_input, m_analyser, "tuner", m_arguments.writing.quiet, [&](double seconds) {
+            if (m_analyser.Refresh() && seconds >= half) each(seconds - half);
+        });
+    }
+    kivspectrum& Analyser() { return m_analyser; }
+
+private:
+    const Arguments& m_arguments;
+    AudioReader m_input;
+    kivspectrum m_analyser;
+};
+
+void Run(Arguments arguments) {
+    arguments.writing.rules.inputs = {arguments.input};
+    const auto temperaments = Names(Tuner::GetTemperamentName);
+    const auto sensitivities = Names(Tuner::GetSensibilityPresetName);
+    Tuner::SetDetectionMethod(static_cast<int>(FindName(arguments.method, kMethods, "method")));
+    Tuner::SetTemperament(static_cast<int>(FindName(arguments.temperament, temperaments, "temperament")));
+    const auto sensitivity = static_cast<int>(FindName(arguments.sensitivity, sensitivities, "sensitivity"));
+    const auto picture = arguments.drawing.Make();
+    OutputFile output(arguments.output, arguments.writing.rules);
+
+    Listener listener(arguments);
+    listener.Analyser().GetTuner()->SetSensibilityPreset(sensitivity);
+    Moment moment(arguments.at);
+    std::vector<Heard> all;
+    bool drawn = false;
+    const auto draw = [&] {
+        picture->Paint(
+            [&](auto& target) { listener.Analyser().DrawTuner<PictureDrawing>(target, picture->Whole()); });
+        drawn = true;
+    };
+    listener.Play([&](double seconds) {
+        all.push_back(Hear(*listener.Analyser().GetTuner(), seconds));
+        if (moment.IsNow(all.back())) draw();
+    });
+    if (!drawn) draw();
+    Save(*picture, output);
+    if (arguments.json) Print(Json(all));
+}
+
+}  // namespace
+
+void AddTunerCommand(CLI::App& app) {
+    const auto arguments = std::make_shared<Arguments>();
+    auto& a = *arguments;
+    auto* const command = app.add_subcommand("tuner", "Names the notes of an audio file and draws the tuner");
+    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
+    command->add_option("OUT", a.output, "PNG picture of the panel while the longest note sounds")
+        ->required();
+    command->add_flag("--json", a.json, "What was heard 30 times a second, on standard output");
+    command->add_option("--at", a.at, "The moment to draw instead, in seconds");
+    command->add_option("--method", a.method, "Of detection: " + Joined(kMethods, ", "));
+    command->add_option("--temperament", a.temperament, "Equal, Pythagorean, Vallotti, ...");
+    command->add_option("--sensitivity", a.sensitivity, "Standard, Noisy environment, Sensitive, ...");
+    a.drawing.AddTo(*command);
+    a.writing.AddTo(*command);
+    command->callback([arguments] { Run(*arguments); });
+}
+
+}  // namespace dsphost
