@@ -100,6 +100,7 @@ void Sonogram::DrawPitchTrace(typename Drawing::DrawTarget& target, const RectF&
     const float perRow = rectangle.height / static_cast<float>(m_bitmap.height);
     const float perColumn = rectangle.width / static_cast<float>(m_bitmap.width);
     const float width = Look::kTraceWidth * target.Scale();
+    m_trace.reserve(static_cast<std::size_t>(m_bitmap.width));
     target.PushClip(rectangle);
     for (int column = 0; column < m_bitmap.width;) {
         m_trace.clear();
