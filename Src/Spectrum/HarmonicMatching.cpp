@@ -18,14 +18,29 @@ constexpr float kMissingCost = 0.6f;
 
 // Expected spread of a string's inharmonicity.
 constexpr double kUsualInharmonicity = 5e-4;
+// Standard deviations of the first partial, as far as it is known, within which others are looked for.
+constexpr double kDoubt = 3.0;
 // Peaks that miss the fit by more standard deviations than this belong to something else.
 constexpr double kOutlier = 6.0;
 
-// The line  position / n = first + stretch (n^2 - 1)  through the peaks, by weighted least squares. A stretch
-// is as unlikely as the strings of instruments make it, or one high partial could not tell it from the pitch.
+// Partials at n sqrt(square + stretch (n^2 - 1)): the first one's square, and what a stiff string adds.
+// Exactly a straight line over n^2, fitted by weighted least squares. A stretch is as unlikely as the strings
+// of instruments make it, or one high partial could not tell it from the pitch.
 struct StretchedSeries {
-    double first, stretch;
-    double At(double number) const { return number * (first + stretch * (number * number - 1.0)); }
+    double square, stretch;
+    double First() const { return std::sqrt(square); }
+    double At(double number) const {
+        return number * std::sqrt(std::max(square + stretch * (number * number - 1.0), 0.0));
+    }
+    // Of the partial at `position`, 0 for none. `doubt` is how far the first one may be off.
+    int NumberOf(double position, double doubt) const {
+        const double first = First(), unstretched = position / first;
+        const double number = std::round(unstretched * position / At(unstretched));
+        const double off = std::abs(position - At(number));
+        const double taken = kOffBins + kOffShare * position + doubt * number;
+        const bool near = off <= std::min(taken, kOffSpacing * first);
+        return number >= 1.0 && number <= kMostPartials && near ? static_cast<int>(number) : 0;
+    }
 };
 
 struct WeightedLine {
@@ -48,22 +63,22 @@ struct WeightedLine {
 
 void PitchCandidates::FindMultipleFrequencies(std::span<const SpectralPeak> peaks, double lowest,
                                               double highest) {
-    std::array<const SpectralPeak*, kPeaks> strongest{};
+    std::array<const SpectralPeak*, kPeaks> most{};
     std::size_t found = 0;
     for (const SpectralPeak& peak : peaks) {
         std::size_t place = found < kPeaks ? found++ : kPeaks;
         if (place == kPeaks) {
-            if (peak.power <= strongest[kPeaks - 1]->power) continue;
+            if (peak.Importance() <= most[kPeaks - 1]->Importance()) continue;
             place = kPeaks - 1;
         }
-        for (; place > 0 && strongest[place - 1]->power < peak.power; --place)
-            strongest[place] = strongest[place - 1];
-        strongest[place] = &peak;
+        for (; place > 0 && most[place - 1]->Importance() < peak.Importance(); --place)
+            most[place] = most[place - 1];
+        most[place] = &peak;
     }
     m_count = 0;
     for (std::size_t i = 0; i < found; ++i)
         for (std::size_t divisor = 1; divisor <= kDivisors; ++divisor) {
-            const double bins = strongest[i]->position / static_cast<double>(divisor);
+            const double bins = most[i]->position / static_cast<double>(divisor);
             if (bins < lowest) break;
             if (bins <= highest) m_bins[m_count++] = bins;
         }
@@ -95,24 +110,36 @@ float HarmonicMatching(std::span<const SpectralPeak> peaks, double fundamental) 
     return all > 0.0f ? explained / all : 0.0f;
 }
 
+// Partial by partial upwards, so that each is looked for where those below it, stretched as they are,
+// foretell.
 double RefineFundamental(std::span<const SpectralPeak> peaks, double fundamental) {
-    const double usualStretch = 0.5 * kUsualInharmonicity * fundamental;
-    const auto fit = [&](const auto& number) {
-        WeightedLine line;
-        for (const SpectralPeak& peak : peaks)
-            if (const double n = number(peak); n > 0.0)
-                line.Add(n * n - 1.0, peak.position / n, n * n / peak.variance);
-        return line.w > 0.0 ? line.Fit(1.0 / (usualStretch * usualStretch))
-                            : StretchedSeries{fundamental, 0.0};
+    const double square = fundamental * fundamental;
+    const double usualStretch = kUsualInharmonicity * square;
+    const double slopeWeight = 1.0 / (usualStretch * usualStretch);
+    std::array<int, kMostPeaks> numbers{};
+    const auto add = [&](WeightedLine& line, const SpectralPeak& peak, double n) {
+        const double first = peak.position / n;
+        line.Add(n * n - 1.0, first * first, n * n / (4.0 * square * peak.variance));
     };
-    const auto near = [&](const SpectralPeak& peak) { return FitPartial(fundamental, peak.position).number; };
-    const StretchedSeries rough = fit([&](const SpectralPeak& peak) { return double{1.0 * near(peak)}; });
-    const StretchedSeries fine = fit([&](const SpectralPeak& peak) {
-        const double n = near(peak);
-        const double off = n > 0.0 ? peak.position - rough.At(n) : 0.0;
-        return off * off <= kOutlier * kOutlier * peak.variance ? n : 0.0;
-    });
-    return fine.first > 0.0 ? fine.first : fundamental;
+
+    WeightedLine line;
+    StretchedSeries series{square, 0.0};
+    for (std::size_t i = 0; i < peaks.size() && i < numbers.size(); ++i) {
+        const double doubt = line.w > 0.0 ? kDoubt / (2.0 * fundamental * std::sqrt(line.w)) : 0.0;
+        const int number = series.NumberOf(peaks[i].position, doubt);
+        if (number < 1) continue;
+        numbers[i] = number;
+        add(line, peaks[i], number);
+        series = line.Fit(slopeWeight);
+    }
+    WeightedLine belonging;
+    for (std::size_t i = 0; i < peaks.size() && i < numbers.size(); ++i) {
+        if (numbers[i] < 1) continue;
+        const double off = peaks[i].position - series.At(numbers[i]);
+        if (off * off <= kOutlier * kOutlier * peaks[i].variance) add(belonging, peaks[i], numbers[i]);
+    }
+    const double fitted = belonging.w > 0.0 ? belonging.Fit(slopeWeight).First() : series.First();
+    return fitted > 0.0 ? fitted : fundamental;
 }
 
 }  // namespace Corvo

@@ -6,10 +6,9 @@
 namespace Corvo {
 namespace {
 
-constexpr std::size_t kMostPeaks = 32;
 constexpr float kFloorPerMean = 2.0f;
 // Less than this amplitude is a filter ringing out or rounding, whatever stands above whatever.
-constexpr double kSilentAmplitude = 1e-5;
+constexpr double kSilentAmplitude = 1e-6;
 constexpr double kTypicalWindowMean = 0.42;
 // Leakage within this many bins of the window counts; further off it is weaker than any partial.
 constexpr double kLeakageReach = 7.0;
@@ -40,9 +39,12 @@ double PitchPeaks::InterpolateMax(std::span<const float> power, std::size_t bin)
 void PitchPeaks::Collect(std::span<const float> power, const TunerSensitivity& sensitivity) {
     m_peaks.clear();
     const float above = kFloorPerMean * PowerRatio(sensitivity.partialDb);
-    const double hz = m_format.HzPerBin();
-    const auto first = std::max<std::size_t>(static_cast<std::size_t>(sensitivity.lowestHz / hz), 1);
-    const auto last = std::min(m_format.bins - 1, static_cast<std::size_t>(sensitivity.highestHz / hz) + 1);
+    const auto binOf = [this](float hz) {
+        return static_cast<std::size_t>(
+            std::min(hz / m_format.HzPerBin(), static_cast<double>(m_format.bins)));
+    };
+    const std::size_t first = std::max<std::size_t>(binOf(sensitivity.lowestHz), 1);
+    const std::size_t last = std::min(m_format.bins - 1, binOf(sensitivity.highestHz) + 1);
     const float* const p = power.data();
     const float* const floor = m_floorLevels.data();
     for (std::size_t k = first; k < last; ++k)
@@ -65,11 +67,12 @@ void PitchPeaks::DropLeakage() {
     std::erase_if(m_peaks, [](const SpectralPeak& peak) { return peak.weight < 0.0f; });
 }
 
-void PitchPeaks::KeepStrongest() {
+void PitchPeaks::KeepMostImportant() {
     if (m_peaks.size() <= kMostPeaks) return;
     const auto end = m_peaks.begin() + static_cast<std::ptrdiff_t>(kMostPeaks);
-    std::nth_element(m_peaks.begin(), end, m_peaks.end(),
-                     [](const SpectralPeak& a, const SpectralPeak& b) { return a.power > b.power; });
+    std::nth_element(m_peaks.begin(), end, m_peaks.end(), [](const SpectralPeak& a, const SpectralPeak& b) {
+        return a.Importance() > b.Importance();
+    });
     m_peaks.erase(end, m_peaks.end());
     std::sort(m_peaks.begin(), m_peaks.end(),
               [](const SpectralPeak& a, const SpectralPeak& b) { return a.bin < b.bin; });
@@ -93,7 +96,7 @@ std::span<const SpectralPeak> PitchPeaks::FilterPeaks(std::span<const float> pow
     std::erase_if(m_peaks, [&](const SpectralPeak& peak) {
         return !(peak.power >= weakest && peak.power >= m_silence);
     });
-    KeepStrongest();
+    KeepMostImportant();
     for (SpectralPeak& peak : m_peaks) {
         peak.position = InterpolateMax(power, peak.bin);
         const double noise = m_floorLevels[peak.bin] / peak.power;

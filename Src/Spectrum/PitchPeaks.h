@@ -26,15 +26,19 @@ struct SpectralPeak {
     float power;
     float aboveFloor;  // dB
     float weight;      // 0 for what counts for nothing .. 1 for the strongest
+    // Of equally strong peaks the lower ones say more: they are the partials of low numbers.
+    float Importance() const { return power / static_cast<float>(bin); }
 };
+
+inline constexpr std::size_t kMostPeaks = 32;
 
 // Finds the partials in a power spectrum: local maxima above the noise and above what leaks from stronger
 // ones, no more than the sensitivity's range below the strongest.
 class PitchPeaks {
 public:
     void Initialise(const SpectrumFormat& format);
-    // By frequency; valid until the next call. With `clean`, a spectrum as long as `power`, also writes what
-    // stands above the floor there, and finds the peaks in that.
+    // At most kMostPeaks, by frequency; valid until the next call. With `clean`, a spectrum as long as
+    // `power`, also writes what stands above the floor there, and finds the peaks in that.
     std::span<const SpectralPeak> FilterPeaks(std::span<const float> power,
                                               const TunerSensitivity& sensitivity, std::span<float> clean);
 
@@ -45,7 +49,7 @@ public:
 private:
     void Collect(std::span<const float> power, const TunerSensitivity& sensitivity);
     void DropLeakage();
-    void KeepStrongest();
+    void KeepMostImportant();
 
     SpectrumFormat m_format;
     PeakInterpolation m_interpolation;

@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <cmath>
 #include <cstddef>
 
 #include "Spectrum/PitchDetector.h"
@@ -17,9 +16,9 @@ Pitch PitchDetector::TuneHPS(std::span<const float> power, bool halveHarmonics) 
     m_sensitivity.harmonics = kHarmonics;
     m_product.HarmonicProductSepctrumComputation(power, kHarmonics, halveHarmonics);
     const int length = static_cast<int>(m_product.Values().size());
+    const int lowest = static_cast<int>(std::min(LowestBins(), static_cast<double>(length)));
     double prominence = 0.0;
-    const int bin =
-        m_product.SearchMaximunInRange(static_cast<int>(LowestBins()), length, kProminenceLimit, prominence);
+    const int bin = m_product.SearchMaximunInRange(lowest, length, kProminenceLimit, prominence);
     if (bin < 1) return {};
     // The product's maximum may lie a bin beside the spectrum's, where the overtones are wider apart.
     const auto at = power.begin() + bin;

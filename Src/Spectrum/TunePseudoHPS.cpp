@@ -11,7 +11,7 @@ constexpr double kReach = 1.5;
 // Each further partial counts this much of the one before, so that a lone one is a fundamental.
 constexpr float kNextPartial = 0.9f;
 
-// The product's logarithm: levels above the floor, summed over the first partials.
+// The product's logarithm: levels in decibels above the weakest that counts, summed over the first partials.
 float PseudoHarmonicProductPitchDetection(std::span<const SpectralPeak> peaks, double fundamental,
                                           int harmonics) {
     float sum = 0.0f, share = 1.0f;
@@ -22,7 +22,7 @@ float PseudoHarmonicProductPitchDetection(std::span<const SpectralPeak> peaks, d
         float level = 0.0f;
         for (auto near = peak; near != peaks.end() && near->position < wanted + kReach; ++near) {
             const double closeness = 1.0 - std::abs(near->position - wanted) / kReach;
-            level = std::max(level, near->aboveFloor * static_cast<float>(closeness));
+            level = std::max(level, near->weight * static_cast<float>(closeness));
         }
         sum += share * level;
     }

@@ -255,7 +255,7 @@ TEST_F(TunerTest, HearsNothingInNoise) {
     click[50000] = 1.0f;
     const std::vector<float> sounds[] = {
         std::vector<float>(200000), std::vector<float>(200000, 0.5f), click, white, brown,
-        Sine(440.0, 1e-6, 200000)};
+        Sine(440.0, 1e-7, 200000)};
     for (int preset = 0; preset < 6; ++preset)
         for (std::size_t s = 0; s < std::size(sounds); ++s) {
             TunerProbe probe(kRate);

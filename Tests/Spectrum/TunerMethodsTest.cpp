@@ -1,0 +1,207 @@
+#include <cmath>
+#include <limits>
+#include <vector>
+
+#include "Spectrum/HarmonicProduct.h"
+#include "Spectrum/SpectrumFloor.h"
+#include "TunerFixture.h"
+#include "TunerSounds.h"
+
+namespace {
+
+using Corvo::HarmonicProduct;
+using TunerSounds::Kind;
+
+constexpr int kRate = 44100;
+constexpr std::size_t kLength = 8192;
+
+// Each overtone counts as 1 at least, the fundamental as it is.
+TEST(HarmonicProductTest, MultipliesCompressedSpectra) {
+    const std::vector<float> spectrum{2, 0.5f, 0.25f, 10, 4, 3, 8, 1, 6, 1.5f, 7, 7};
+    struct Case {
+        int harmonics;
+        bool halve;
+        std::vector<double> product;
+    };
+    HarmonicProduct product;
+    for (const Case& c : {Case{3, false, {8, 0.5 * 1 * 10, 0.25 * 4 * 8, 10 * 8 * 1.5}},
+                          Case{3, true, {2, 0.5 * 1 * 5, 0.25 * 2 * 4, 10 * 4 * 1}},
+                          Case{5, false, {32, 0.5 * 1 * 10 * 4 * 3}}}) {
+        product.HarmonicProductSepctrumComputation(spectrum, c.harmonics, c.halve);
+        EXPECT_EQ(product.Values(), c.product) << c.harmonics << c.halve;
+    }
+}
+
+TEST(HarmonicProductTest, SearchesAPeakBetweenValleys) {
+    struct Case {
+        const char* fault;
+        std::vector<double> values;
+        int start, end;
+        double limit;
+        int bin;
+        double prominence;
+    };
+    constexpr double kInfinite = std::numeric_limits<double>::infinity();
+    for (const Case& c : {
+             Case{"misses the peak", {9, 1, 5, 100, 4, 1, 9}, 0, 7, 20.0, 3, 20.0},
+             Case{"accepts less than the limit", {9, 1, 5, 100, 4, 1, 9}, 0, 7, 20.001, -1, 0.0},
+             Case{"stops before the valley", {9, 1, 10, 20, 1000, 20, 10, 9}, 0, 8, 0.0, -1, 0.0},
+             Case{"takes the deeper of two valleys",
+                  {9, 1, 8, 4, 100, 2, 8, 1, 9},
+                  0,
+                  9,
+                  0.0,
+                  4,
+                  20.0 - 5.0 * std::log10(8.0)},
+             Case{"wants valleys deeper than both sides",
+                  {9, 4, 4, 100, 2, 2, 9},
+                  0,
+                  7,
+                  0.0,
+                  3,
+                  20.0 - 5.0 * std::log10(8.0)},
+             Case{"takes the higher of equals", {9, 1, 100, 1, 100, 1, 9}, 0, 7, 0.0, 2, 20.0},
+             Case{"searches below the start", {1000, 1, 9, 1, 100, 1, 9}, 1, 7, 0.0, 4, 20.0},
+             Case{"searches the end", {9, 1, 100, 1, 1000, 1, 9}, 0, 4, 0.0, 2, 20.0},
+             Case{"invents a valley after the last bin", {9, 1, 5, 4, 100}, 0, 5, 0.0, -1, 0.0},
+             Case{"takes the last bin for a valley", {9, 1, 5, 100, 4}, 0, 5, 0.0, -1, 0.0},
+             Case{"takes the first bin for a valley", {1, 100, 1, 9, 1, 9}, 0, 6, 0.0, -1, 0.0},
+             Case{"hears silence", {0, 0, 0, 0, 0, 0, 0}, 3, 7, 0.0, -1, 0.0},
+             Case{"refuses a clean tone", {9, 0, 100, 0, 9}, 0, 5, 55.0, 2, kInfinite},
+             Case{"reads outside", {9, 1, 100, 1, 9}, -5, 50, 0.0, 2, 20.0},
+             Case{"searches nothing", {9, 1, 100, 1, 9}, 4, 3, 0.0, -1, 0.0},
+         }) {
+        HarmonicProduct product;
+        product.Values() = c.values;
+        double prominence = -1.0;
+        EXPECT_EQ(product.SearchMaximunInRange(c.start, c.end, c.limit, prominence), c.bin) << c.fault;
+        if (std::isinf(c.prominence))
+            EXPECT_EQ(prominence, c.prominence) << c.fault;
+        else
+            EXPECT_NEAR(prominence, c.prominence, 1e-9) << c.fault;
+    }
+}
+
+// The floor is the mean power of white noise, and no more than the rest's when half the bins are peaks.
+TEST(SpectrumFloorTest, FindsTheNoiseBelowThePeaks) {
+    constexpr std::size_t kBins = 4096;
+    TestSupport::Random random;
+    std::vector<float> power(kBins), floor(kBins);
+    Corvo::SpectrumFloor measure;
+    measure.Initialise(kBins, 1.0);
+    for (const bool tones : {false, true}) {
+        double sum = 0.0;
+        for (int frame = 0; frame < 50; ++frame) {
+            for (std::size_t k = 0; k < kBins; ++k) {
+                power[k] = static_cast<float>(-3.0 * std::log(1.0 - random.Unit()));
+                if (tones && k % 10 < 5) power[k] = 1e6f;
+            }
+            measure.Measure(power, floor);
+            for (const float value : floor) sum += value;
+        }
+        const double decibels = 10.0 * std::log10(sum / (50.0 * kBins) / 3.0);
+        // Half the bins gone, the quarter is the half of those that are left: ln 2 instead of ln 4/3.
+        EXPECT_NEAR(decibels, tones ? 10.0 * std::log10(std::log(2.0) / std::log(4.0 / 3.0)) : 0.0, 1.0);
+    }
+}
+
+// What each method is able to hear; what it is not is left out.
+struct Ability {
+    int method;
+    Kind kind;
+    double noise;  // dB below, 0 for none
+    int wrong;     // of a hundred frames, at most
+};
+constexpr Ability kAbilities[] = {
+    // The bare product gives way to octaves and, with one partial or in noise, finds its valleys too shallow.
+    {1, Kind::Sine, 0, 5},      {1, Kind::Plucked, 0, 15},  {1, Kind::Plucked, 20, 15},
+    {1, Kind::Piano, 20, 15},   {2, Kind::Sine, 10, 0},     {2, Kind::Sawtooth, 0, 0},
+    {2, Kind::Sawtooth, 10, 0}, {2, Kind::Plucked, 20, 0},  {2, Kind::Piano, 20, 0},
+    {3, Kind::Sine, 10, 0},     {3, Kind::Sawtooth, 0, 0},  {3, Kind::Sawtooth, 10, 0},
+    {3, Kind::Plucked, 20, 0},  {3, Kind::Piano, 20, 0},    {4, Kind::Sine, 10, 0},
+    {4, Kind::Sawtooth, 0, 0},  {4, Kind::Sawtooth, 10, 0}, {4, Kind::Plucked, 20, 0},
+    {4, Kind::Piano, 20, 0},    {7, Kind::Sawtooth, 20, 0},  // as 3
+};
+
+TEST_F(TunerTest, HearsWithEveryMethodWhatThatIsAbleTo) {
+    for (const Ability& ability : kAbilities) {
+        Tuner::SetDetectionMethod(ability.method);
+        int wrong = 0, frames = 0;
+        for (int semitones = 0; semitones <= 72; semitones += 3) {
+            const double hz = 55.0 * std::exp2((semitones + 0.2 * std::sin(semitones)) / 12.0);
+            auto sound = TunerSounds::Sound(ability.kind, hz, kRate, kLength, 0.1 * semitones);
+            if (ability.noise > 0.0) TunerSounds::AddNoise(sound, ability.noise, 7);
+            TunerProbe probe(kRate);
+            probe.Tune(sound.data());
+            ++frames;
+            wrong += std::abs(probe.tuner.GetFrequency() / hz - 1.0) > 0.003;
+        }
+        EXPECT_LE(100 * wrong, ability.wrong * frames)
+            << "method " << ability.method << ", sound " << static_cast<int>(ability.kind) << ", "
+            << ability.noise << " dB";
+    }
+}
+
+std::vector<float> Partials(std::initializer_list<int> numbers, double hz) {
+    std::vector<float> sum(kLength);
+    for (const int n : numbers) {
+        const auto partial = TestSupport::Sine<float>(kLength, n * hz, kRate, 0.1);
+        for (std::size_t i = 0; i < kLength; ++i) sum[i] += partial[i];
+    }
+    return sum;
+}
+
+// Each method is another: they part where the fundamental is missing.
+TEST_F(TunerTest, DispatchesToFiveMethods) {
+    const auto sound = Partials({3, 4, 5, 6, 7, 8}, 100.0);
+    const auto heard = [&](int method, bool denoise) {
+        Tuner::SetDetectionMethod(method);
+        TunerProbe probe(kRate);
+        probe.Tune(sound.data(), denoise);
+        return probe.tuner.GetFrequency();
+    };
+    EXPECT_NEAR(heard(0, false), 100.0, 0.05);
+    for (int method = 1; method < 5; ++method) {
+        EXPECT_FALSE(std::abs(heard(method, false) - 100.0) < 1.0 && method != 3) << method;
+        EXPECT_NEAR(heard(method, true), 100.0, 0.05) << method;  // the denoising form, whatever is chosen
+    }
+}
+
+// The harmonic product leaves its five harmonics to the pseudo product, until a preset is chosen: with three
+// of them partials 2..5 of 200 Hz sound like 400 Hz.
+TEST_F(TunerTest, KeepsFiveHarmonicsUntilAPresetIsChosen) {
+    const auto sound = Partials({2, 3, 4, 5}, 200.0);
+    TunerProbe probe(kRate);
+    const auto heard = [&] {
+        Tuner::SetDetectionMethod(2);
+        for (int i = 0; i < 3; ++i) probe.Tune(sound.data());
+        return probe.tuner.GetFrequency();
+    };
+    EXPECT_NEAR(heard(), 400.0, 0.1);
+    Tuner::SetDetectionMethod(1);
+    probe.Tune(sound.data());
+    EXPECT_NEAR(heard(), 200.0, 0.1);
+    probe.tuner.SetSensibilityPreset(0);
+    EXPECT_NEAR(heard(), 400.0, 0.1);
+}
+
+// Made only when asked for; peaks stay, most of the noise is gone.
+TEST_F(TunerTest, ShowsTheSpectrumWithoutItsFloor) {
+    auto sound = TestSupport::Sine<float>(kLength, 1000.0, kRate);
+    TunerSounds::AddNoise(sound, 20.0, 3);
+    TunerProbe probe(kRate);
+    const auto& power = probe.Transform(sound.data());
+    probe.Tune(power);
+    EXPECT_TRUE(probe.tuner.GetDenoisedSpectrum().empty());
+    Tuner::SetShowDenoisedSpectrum(true);
+    probe.Tune(power);
+    const auto& clean = probe.tuner.GetDenoisedSpectrum();
+    ASSERT_EQ(clean.size(), power.size());
+    int left = 0;
+    for (std::size_t k = 0; k < clean.size(); ++k) left += clean[k] > 0.0f;
+    // One bin of noise in seven is above the floor, give or take what one spectrum allows.
+    EXPECT_NEAR(left / 4096.0, std::exp(-2.0), 0.03);
+    EXPECT_NEAR(clean[186] / power[186], 1.0, 0.001);
+}
+
+}  // namespace
