@@ -26,7 +26,7 @@ constexpr ViewOption kView[] = {
     {"decibels",       1291}, {"power",      1292}, {"amplitude", 1293},
     {"60dB",           1250}, {"90dB",       1251}, {"120dB", 1252}, {"144dB",   1253},
     {"no-grid",        1254}, {"no-labels",  1306}, {"no-info", 1312}, {"no-peaks", 1300},
-    {"note-names",     1316},
+    {"note-names",     1316}, {"sharps",     1335}, {"flats", 1336}, {"solfege", 1337},
 };
 // clang-format on
 

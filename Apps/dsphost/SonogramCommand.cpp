@@ -62,7 +62,6 @@ void Run(Arguments arguments) {
     AudioReader input(arguments.input);
     RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
     auto picture = arguments.drawing.Make();
-    OutputFile output(arguments.output, arguments.writing.rules);
 
     kivspectrum analyser;
     analyser.set_parameters(input.Rate());
@@ -71,6 +70,7 @@ void Run(Arguments arguments) {
     kivspectrum::SetAnalysisWindowsOverlap(kOverlap);
     analyser.ObserverUpdate();
     arguments.drawing.ApplyTo(analyser);
+    OutputFile output(arguments.output, arguments.writing.rules);
     Corvo::Sonogram::SetColourScheme(arguments.scheme);
     analyser.ShowSonogram(true);
     const auto draw = [&](auto& target) {

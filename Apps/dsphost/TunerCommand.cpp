@@ -129,10 +129,12 @@ void Run(Arguments arguments) {
     Tuner::SetDetectionMethod(static_cast<int>(FindName(arguments.method, kMethods, "method")));
     Tuner::SetTemperament(static_cast<int>(FindName(arguments.temperament, temperaments, "temperament")));
     const auto sensitivity = static_cast<int>(FindName(arguments.sensitivity, sensitivities, "sensitivity"));
+    if (arguments.at && !(*arguments.at >= 0.0))
+        throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; accepted: 0 seconds or more");
     const auto picture = arguments.drawing.Make();
-    OutputFile output(arguments.output, arguments.writing.rules);
-
     Listener listener(arguments);
+    arguments.drawing.ApplyTo(listener.Analyser());
+    OutputFile output(arguments.output, arguments.writing.rules);
     listener.Analyser().GetTuner()->SetSensibilityPreset(sensitivity);
     Moment moment(arguments.at);
     std::vector<Heard> all;
