@@ -19,5 +19,9 @@ install(FILES ${CMAKE_CURRENT_BINARY_DIR}/DSPDllConfig.cmake ${CMAKE_CURRENT_BIN
 
 # The file finds its prefix from its own place, so an installed tree may be moved.
 file(RELATIVE_PATH DSP_PC_PREFIX /prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig /prefix)
-configure_file(cmake/dspdll.pc.in dspdll.pc @ONLY)
-install(FILES ${CMAKE_CURRENT_BINARY_DIR}/dspdll.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+foreach(library dspdll dspdrawing)
+    if(library STREQUAL dspdll OR TARGET DSPDrawing)
+        configure_file(cmake/${library}.pc.in ${library}.pc @ONLY)
+        install(FILES ${CMAKE_CURRENT_BINARY_DIR}/${library}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+    endif()
+endforeach()

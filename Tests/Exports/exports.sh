@@ -2,7 +2,7 @@
 # The names the library exports are its contract; they are kept in a list per target beside this script.
 #
 #   exports.sh check LIBRARY LIST   compares
-#   exports.sh update               builds the libraries of both targets and rewrites both lists
+#   exports.sh update               builds the libraries of both targets and rewrites the lists
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
 
@@ -31,7 +31,7 @@ check() {
         echo "${library##*/} does not export what Tests/Exports/${list##*/} says. If the contract is meant to"
         echo "change, run"
         echo "    Tests/Exports/exports.sh update"
-        echo "which builds both targets and rewrites both lists; review the difference and commit it."
+        echo "which builds both targets and rewrites the lists; review the difference and commit it."
         return 1
     fi
     echo "${library##*/} exports the $(wc -l < "$list") names of Tests/Exports/${list##*/}"
@@ -40,8 +40,9 @@ check() {
 update() {
     cd "$here/../.."
     cmake --preset release > /dev/null
-    cmake --build --preset release --target DSPDll
+    cmake --build --preset release --target DSPDll DSPDrawing
     names build/release/bin/libDSPDll.so > "$here/linux.txt"
+    names build/release/bin/libDSPDrawing.so > "$here/linux-drawing.txt"
     Scripts/win32-deps.sh > /dev/null
     cmake --preset win32 > /dev/null
     cmake --build --preset win32 --target DSPDll

@@ -11,15 +11,19 @@ mkdir -p "$work/example"
 cmake --install "$build_dir" --prefix "$work/first" >/dev/null
 mv "$work/first" "$work/installed"
 
+if [ -x "$work/installed/bin/dsphost" ]; then "$work/installed/bin/dsphost" --version; fi
+
 # The example is the README's only block of C++.
 awk '/^```cpp$/ {on = 1; next} /^```$/ {on = 0} on' "$source_dir/README.md" > "$work/example/example.cpp"
 [ -s "$work/example/example.cpp" ]
-cp "$here/CMakeLists.txt" "$work/example/"
+cp "$here/CMakeLists.txt" "$here/drawing.cpp" "$work/example/"
 
 cmake -S "$work/example" -B "$work/by-cmake" -DCMAKE_PREFIX_PATH="$work/installed" \
     -DCMAKE_CXX_COMPILER="$compiler" >/dev/null
 cmake --build "$work/by-cmake" >/dev/null
 by_cmake=$("$work/by-cmake/example")
+drawing=$(find "$work/installed" -name dspdrawing.pc)
+if [ -n "$drawing" ]; then "$work/by-cmake/drawing"; fi
 
 pc=$(find "$work/installed" -name dspdll.pc)
 export PKG_CONFIG_PATH=${pc%/*}
@@ -27,6 +31,12 @@ export PKG_CONFIG_PATH=${pc%/*}
 "$compiler" "$work/example/example.cpp" -o "$work/by-pkg-config" $(pkg-config --cflags --libs dspdll) \
     -Wl,-rpath,"$(pkg-config --variable=libdir dspdll)"
 by_pkg_config=$("$work/by-pkg-config")
+if [ -n "$drawing" ]; then
+    # shellcheck disable=SC2046
+    "$compiler" "$work/example/drawing.cpp" -o "$work/drawing" $(pkg-config --cflags --libs dspdrawing) \
+        -Wl,-rpath,"$(pkg-config --variable=libdir dspdrawing)"
+    "$work/drawing"
+fi
 
 echo "the example says: $by_cmake"
 [ -n "$by_cmake" ] && [ "$by_cmake" = "$by_pkg_config" ]
