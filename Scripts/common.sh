@@ -34,3 +34,16 @@ build_preset() {
     cmake --preset "$preset" >/dev/null
     cmake --build --preset "$preset" ${1:+--target "$@"}
 }
+
+# Puts the typeface of the drawings into a folder; Debian has no package of it.
+fetch_montserrat() {
+    command -v npm >/dev/null || return 1
+    local download
+    download=$(mktemp -d)
+    mkdir -p "$1"
+    (cd "$download" && timeout 60 npm pack --silent @expo-google-fonts/montserrat >/dev/null && tar xzf ./*.tgz) &&
+        cp "$download/package/400Regular/Montserrat_400Regular.ttf" "$1"
+    local status=$?
+    rm -rf "$download"
+    return $status
+}

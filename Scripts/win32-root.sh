@@ -22,16 +22,6 @@ part=$(mktemp -d "$cache/root.part.XXXXXX")
 trap 'rm -rf --one-file-system "$part"' EXIT
 chmod 755 "$part"
 
-# The typeface of the drawings; Debian has no package of it. Without it texts are drawn in another one.
-add_montserrat() {
-    command -v npm >/dev/null || return 1
-    local download=$part/tmp/montserrat fonts=$part/usr/share/fonts/truetype/montserrat
-    mkdir -p "$download" "$fonts"
-    (cd "$download" && timeout 60 npm pack --silent @expo-google-fonts/montserrat && tar xzf ./*.tgz) || return 1
-    find "$download" -name 'Montserrat_[4567]00*.ttf' ! -name '*Italic*' -exec cp {} "$fonts" \;
-    rm -rf "$download"
-}
-
 make_root() {
     debootstrap --variant=minbase --arch=i386 "$release" "$part" "$mirror"
     printf '%s\n' force-unsafe-io path-exclude=/usr/share/{doc,man,locale}/'*' > "$part/etc/dpkg/dpkg.cfg.d/lean"
@@ -44,7 +34,8 @@ make_root() {
         wine wine32 xvfb libgl1 libgl1-mesa-dri fontconfig
     chroot "$part" apt-get clean
     rm -rf "$part"/var/lib/apt/lists/*
-    add_montserrat || echo "Montserrat could not be fetched"
+    # Without it texts are drawn in another typeface.
+    fetch_montserrat "$part/usr/share/fonts/truetype/montserrat" || echo "Montserrat could not be fetched"
     install -m 755 "$tree/Scripts/win32-inside.sh" "$part/usr/local/bin/inside"
     mkdir "$part/wine"
     # After a crash the debugger prints where, and does not wait for somebody to press a button.
@@ -55,7 +46,7 @@ make_root() {
 
 # Mounts live in a name space of their own: whatever happens, they are gone when it ends.
 export part mirror release tree
-export -f make_root add_montserrat
+export -f make_root fetch_montserrat
 unshare --mount --propagation private bash -euo pipefail -c make_root > "$cache/root.log" 2>&1 ||
     skip "the i386 root could not be made (no network, no mounts?): $(tail -n 1 "$cache/root.log")"
 mv "$part" "$root"

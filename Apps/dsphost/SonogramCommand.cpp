@@ -9,6 +9,7 @@
 #include "PictureOptions.h"
 #include "Playback.h"
 #include "Spectrum/Sonogram.h"
+#include "Spectrum/SpectrumDrawer.h"
 #include "Spectrum/kivspectrum.h"
 
 namespace dsphost {
@@ -85,7 +86,10 @@ void Run(Arguments arguments) {
                                                                    : arguments.speed);
     picture = arguments.drawing.Make(SpareColumns(input, columns));
     picture->Paint(draw);
-    PlayThrough(input, analyser, "sonogram", arguments.writing.quiet, [&](double) { analyser.Refresh(); });
+    PlayThrough(input, analyser, "sonogram", arguments.writing.quiet, [&](double) {
+        analyser.Refresh();
+        analyser.GetSpectrumDrawer()->AgePeaks();  // as drawing every refresh would
+    });
     picture->Paint(draw);
     Save(*picture, output);
 }
