@@ -29,7 +29,7 @@ int HarmonicProduct::SearchMaximunInRange(int start, int end, double limit, doub
     const int peak = static_cast<int>(std::max_element(p + start, p + end) - p);
     int right = peak + 1;
     while (right <= length - 2 && !isValley(right)) ++right;
-    int left = std::min(peak - 1, length - 2);
+    int left = peak - 1;
     while (left >= 1 && !isValley(left)) --left;
     if (right > length - 2 || left < 1) return -1;
     const double above = 10.0 * std::log10(p[peak]) - 5.0 * std::log10(p[left] * p[right]);

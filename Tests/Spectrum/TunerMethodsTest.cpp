@@ -142,6 +142,7 @@ TEST_F(TunerTest, HearsWithEveryMethodWhatThatIsAbleTo) {
     }
 }
 
+// Of the same amplitude; one that is named twice sounds twice as loud.
 std::vector<float> Partials(std::initializer_list<int> numbers, double hz) {
     std::vector<float> sum(kLength);
     for (const int n : numbers) {
@@ -165,6 +166,14 @@ TEST_F(TunerTest, DispatchesToFiveMethods) {
         EXPECT_FALSE(std::abs(heard(method, false) - 100.0) < 1.0 && method != 3) << method;
         EXPECT_NEAR(heard(method, true), 100.0, 0.05) << method;  // the denoising form, whatever is chosen
     }
+}
+
+// A stranger two octaves below is not the fundamental: most of its other partials are missing.
+TEST_F(TunerTest, KeepsTheStrongestPeakWithoutItsSubharmonics) {
+    Tuner::SetDetectionMethod(3);
+    TunerProbe probe(kRate);
+    probe.Tune(Partials({1, 4, 4, 4}, 250.0).data());
+    EXPECT_NEAR(probe.tuner.GetFrequency(), 1000.0, 0.1);
 }
 
 // The harmonic product leaves its five harmonics to the pseudo product, until a preset is chosen: with three

@@ -38,7 +38,7 @@ inline std::vector<Partial> Partials(Kind kind, double f0, int rate) {
                 partials.push_back({1.0 * n, std::sin(std::numbers::pi * n / 7.0) / n, 1.5 + 0.3 * n});
             break;
         case Kind::MissingFundamental:
-            for (int n = 2; below(n) && n <= 8; ++n) partials.push_back({1.0 * n, 1.0, 0.0});
+            for (int n = 2; below(n) && n <= 60; ++n) partials.push_back({1.0 * n, 1.0, 0.0});
             break;
         case Kind::Piano:
             for (int n = 1; below(stretch(n)) && n <= 16; ++n)

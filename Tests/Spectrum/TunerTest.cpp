@@ -175,7 +175,7 @@ struct Waiting {
 // A first note appears at once, another when it has been confirmed, none when it has been missing for long
 // enough; until then note and error stay as they were.
 TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
-    const auto a = Sine(440.0), b = Sine(494.0), silence = std::vector<float>(kLength);
+    const auto a = Sine(440.0), b = Sine(494.0), c = Sine(523.0), silence = std::vector<float>(kLength);
     for (const Waiting& w : {Waiting{0, 60, 40, 3}, Waiting{1, 40, 25, 6}, Waiting{2, 60, 40, 2},
                              Waiting{3, 40, 30, 8}, Waiting{4, 50, 30, 4}, Waiting{5, 50, 30, 4}}) {
         TunerProbe probe(kRate);
@@ -189,13 +189,15 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
         times(1, a);
         EXPECT_EQ(tuner.GetNote(), 0) << w.preset;
         times(w.confirm - 1, b);
-        times(1, a);
+        times(1, c);
         times(w.confirm - 1, b);
         EXPECT_EQ(tuner.GetNote(), 0) << w.preset;
         EXPECT_NEAR(tuner.GetErrorCents(), 0.0, 0.1);
         times(1, b);
         EXPECT_EQ(tuner.GetNote(), 2) << w.preset;
         const float error = tuner.GetErrorCents();
+        times(w.release - 1, silence);
+        times(1, b);
         times(w.hold - 1, silence);
         EXPECT_TRUE(TunerIsTracking(tuner)) << w.preset;
         times(1, silence);
