@@ -272,28 +272,21 @@ void TubeDistorsion::ProcessInternal(double* buffer, int frames, const tWAVEFORM
 
 template <typename Sample>
 void TubeDistorsion::RecentInput::Add(const Sample* samples, int frames, int channels) {
-    const int added = std::min(frames, kFrames);
-    samples += static_cast<std::ptrdiff_t>(frames - added) * channels;
-    const auto add = [&](int from, int to) {
-        for (int i = from; i < to; ++i, samples += channels)
-            m_frames[static_cast<std::size_t>(i)] = {static_cast<double>(samples[0]),
-                                                     static_cast<double>(samples[channels - 1])};
-    };
-    const int upToEnd = std::min(added, kFrames - m_next), rest = added - upToEnd;
-    add(m_next, m_next + upToEnd);
-    add(0, rest);
-    m_next = rest > 0 ? rest : (m_next + upToEnd) % kFrames;
+    const int size = kFrames * channels, added = std::min(frames, kFrames) * channels;
+    samples += static_cast<std::ptrdiff_t>(std::max(frames - kFrames, 0)) * channels;
+    const int upToEnd = std::min(added, size - m_next);
+    std::copy_n(samples, upToEnd, m_samples.begin() + m_next);
+    std::copy_n(samples + upToEnd, added - upToEnd, m_samples.begin());
+    m_next = (m_next + added) % size;
 }
 
-void TubeDistorsion::RecentInput::Clear() { m_frames = {}; }
+void TubeDistorsion::RecentInput::Clear() { *this = {}; }
 
 std::array<double, TubeDistorsion::RecentInput::kFrames * 2> TubeDistorsion::RecentInput::Samples(
     int channels) const {
     std::array<double, kFrames * 2> samples{};
-    auto* sample = samples.data();
-    for (int i = 0; i < kFrames; ++i)
-        sample =
-            std::copy_n(m_frames[static_cast<std::size_t>((m_next + i) % kFrames)].begin(), channels, sample);
+    const auto begin = m_samples.begin();
+    std::rotate_copy(begin, begin + m_next, begin + kFrames * channels, samples.begin());
     return samples;
 }
 

@@ -75,7 +75,7 @@ private:
     using Values = VirtualTubeAmp::Values;
 
     // The newest frames in front of the shaper, for filters that come into use in mid-stream. They ring
-    // out to 1e-12 within this length.
+    // out to 1e-12 within this length. To be cleared when the channel count changes.
     class RecentInput {
     public:
         static constexpr int kFrames = 64;
@@ -86,7 +86,7 @@ private:
         std::array<double, kFrames * 2> Samples(int channels) const;
 
     private:
-        std::array<std::array<double, 2>, kFrames> m_frames{};
+        std::array<double, kFrames * 2> m_samples{};  // interleaved, a ring of kFrames
         int m_next = 0;
     };
 

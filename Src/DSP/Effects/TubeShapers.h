@@ -1,12 +1,13 @@
 #pragma once
 
-#include <algorithm>
-#include <array>
-#include <cstddef>
 #include <xsimd/xsimd.hpp>
 
-// The shaping functions of the tube distortion, on whole registers.
+#include "DSP/Effects/TubeKernel.h"
+
+// The shaping functions of the tube distortion, on whole registers. Private to each source file that includes
+// it: those files are compiled for different processors and must not share code.
 namespace Corvo::DSP::TubeShapers {
+namespace {
 
 template <typename Lanes>
 Lanes Clamped(const Lanes& x) {
@@ -76,18 +77,70 @@ struct ArayaS {
     }
 };
 
+// Calls `call` with the shaper of a function.
+template <typename Call>
+void WithShaper(int function, Call&& call) {
+    switch (function) {
+        case 0:
+            return call(Martens{});
+        case 1:
+            return call(DoidicS{});
+        case 2:
+            return call(DoidicA{});
+        case 3:
+            return call(ArayaS{});
+        default:
+            return call(Bypass{});
+    }
+}
+
+// The left value in the even lanes, the right one in the odd ones.
+template <typename Lanes>
+Lanes Alternating(float left, float right) {
+    using Value = typename Lanes::value_type;
+    alignas(Lanes) Value lanes[Lanes::size];
+    for (std::size_t i = 0; i < Lanes::size; ++i) lanes[i] = static_cast<Value>(i % 2 == 0 ? left : right);
+    return Lanes::load_aligned(lanes);
+}
+
 // Replaces every register of interleaved samples, in place; what is left at the end goes through a copy.
-template <typename Sample, typename Change>
-void ForEachRegister(Sample* samples, std::size_t count, Change change) {
-    using Lanes = xsimd::batch<Sample>;
+template <typename Lanes, typename Change>
+void ForEachRegister(typename Lanes::value_type* samples, std::size_t count, const Change& change) {
     std::size_t i = 0;
     for (; i + Lanes::size <= count; i += Lanes::size)
         change(Lanes::load_unaligned(samples + i)).store_unaligned(samples + i);
     if (i == count) return;
-    std::array<Sample, Lanes::size> rest{};
-    std::copy(samples + i, samples + count, rest.begin());
-    change(Lanes::load_unaligned(rest.data())).store_unaligned(rest.data());
-    std::copy_n(rest.begin(), count - i, samples + i);
+    alignas(Lanes) typename Lanes::value_type rest[Lanes::size] = {};
+    for (std::size_t j = i; j < count; ++j) rest[j - i] = samples[j];
+    change(Lanes::load_aligned(rest)).store_aligned(rest);
+    for (std::size_t j = i; j < count; ++j) samples[j] = rest[j - i];
 }
 
+template <typename Sample, typename Arch>
+void Shape(Sample* samples, std::size_t count, const TubeShaping& shaping) {
+    using Lanes = xsimd::batch<Sample, Arch>;
+    const auto& left = shaping.sides[0];
+    const auto& right = shaping.sides[1];
+    // By value everywhere: behind a reference the compiler would read them again after every store.
+    const Settings<Lanes> settings{Alternating<Lanes>(left.boost, right.boost),
+                                   Alternating<Lanes>(left.drive, right.drive),
+                                   Alternating<Lanes>(left.shapeFactor, right.shapeFactor)};
+    if (left.function == right.function)
+        return WithShaper(left.function, [=]<typename Shaper>(Shaper) {
+            ForEachRegister<Lanes>(samples, count, [settings](const Lanes& x) {
+                return Shaper::Apply(x * settings.boost, settings);
+            });
+        });
+    // Sides that differ go one after the other, each with the other's lanes left alone.
+    for (const bool ofLeft : {true, false}) {
+        const auto side = Alternating<Lanes>(ofLeft, !ofLeft) != Lanes(Sample(0));
+        WithShaper((ofLeft ? left : right).function, [=]<typename Shaper>(Shaper) {
+            ForEachRegister<Lanes>(samples, count, [settings, side](const Lanes& x) {
+                return xsimd::select(side, Shaper::Apply(x * settings.boost, settings), x);
+            });
+        });
+    }
+}
+
+}  // namespace
 }  // namespace Corvo::DSP::TubeShapers

@@ -9,15 +9,6 @@ namespace Corvo::DSP {
 namespace {
 
 constexpr std::size_t kLeft = 0, kRight = 1;
-constexpr int kFunctions = 4;
-
-// Lanes of an interleaved block: the left value in the even ones; everywhere, if there is one channel only.
-template <typename Sample>
-xsimd::batch<Sample> Alternating(double left, double right) {
-    std::array<Sample, xsimd::batch<Sample>::size> lanes;
-    for (std::size_t i = 0; i < lanes.size(); ++i) lanes[i] = static_cast<Sample>(i % 2 == 0 ? left : right);
-    return xsimd::batch<Sample>::load_unaligned(lanes.data());
-}
 
 template <typename Shaper>
 double ShapeOne(double sample, double shape) {
@@ -26,21 +17,13 @@ double ShapeOne(double sample, double shape) {
         .get(0);
 }
 
-// Calls `call` with the shaper of a function; anything else passes.
-template <typename Call>
-void WithShaper(int function, Call&& call) {
-    switch (function) {
-        case 0:
-            return call(TubeShapers::Martens{});
-        case 1:
-            return call(TubeShapers::DoidicS{});
-        case 2:
-            return call(TubeShapers::DoidicA{});
-        case 3:
-            return call(TubeShapers::ArayaS{});
-        default:
-            return call(TubeShapers::Bypass{});
-    }
+template <typename Sample>
+TubeKernel<Sample> BestTubeKernel() {
+#if defined(DSP_WIDE_KERNELS)
+    static const bool wide = __builtin_cpu_supports("avx2");
+    if (wide) return Avx2TubeKernel<Sample>();
+#endif
+    return BaselineTubeKernel<Sample>();
 }
 
 }  // namespace
@@ -135,7 +118,7 @@ void VirtualTubeAmp::FilterTone(Sample* samples, int frames, int channels) {
     using Lanes = xsimd::batch<double>;
     static_assert(Lanes::size == kSides);
     const auto load = [](const Sides& sides) { return Lanes::load_unaligned(sides.data()); };
-    const auto on = Alternating<double>(left, right) != Lanes(0.0);
+    const auto on = TubeShapers::Alternating<Lanes>(left, right) != Lanes(0.0);
     const Lanes gain = load(m_filter.gain), a1 = load(m_filter.feedback[0]), a2 = load(m_filter.feedback[1]),
                 a3 = load(m_filter.feedback[2]), a4 = load(m_filter.feedback[3]), four(4.0), six(6.0);
     auto& memory = m_filter.memory;
@@ -161,27 +144,12 @@ void VirtualTubeAmp::FilterTone(Sample* samples, int frames, int channels) {
 template <typename Sample>
 void VirtualTubeAmp::Shape(Sample* samples, int frames, int channels) const {
     const Side &left = m_sides[kLeft], &right = m_sides[channels == 2 ? kRight : kLeft];
-    const auto alternating = [](double l, double r) { return Alternating<Sample>(l, r); };
-    const TubeShapers::Settings<xsimd::batch<Sample>> settings{
-        alternating(left.boost, right.boost), alternating(left.drive, right.drive),
-        alternating(left.shapeFactor, right.shapeFactor)};
-    const auto count = static_cast<std::size_t>(frames) * static_cast<std::size_t>(channels);
-    using Lanes = xsimd::batch<Sample>;
-    const auto function = [](const Side& side) { return side.drive == 0.0f ? kFunctions : side.function; };
-    if (function(left) == function(right))
-        return WithShaper(function(left), [&]<typename Shaper>(Shaper) {
-            TubeShapers::ForEachRegister(
-                samples, count, [&](const Lanes& x) { return Shaper::Apply(x * settings.boost, settings); });
-        });
-    // Sides that differ go one after the other, each with the other's lanes left alone.
-    for (const bool ofLeft : {true, false}) {
-        const auto sides = alternating(ofLeft, !ofLeft) != Lanes(Sample(0));
-        WithShaper(function(ofLeft ? left : right), [&]<typename Shaper>(Shaper) {
-            TubeShapers::ForEachRegister(samples, count, [&](const Lanes& x) {
-                return xsimd::select(sides, Shaper::Apply(x * settings.boost, settings), x);
-            });
-        });
-    }
+    const auto settings = [](const Side& side) {
+        const int function = side.drive == 0.0f ? TubeShaping::kNoFunction : side.function;
+        return TubeShaping::Side{function, side.boost, side.drive, side.shapeFactor};
+    };
+    BestTubeKernel<Sample>()(samples, static_cast<std::size_t>(frames) * static_cast<std::size_t>(channels),
+                             {{settings(left), settings(right)}});
 }
 
 template void VirtualTubeAmp::FilterTone(float*, int, int);

@@ -157,24 +157,25 @@ TEST(TubeDistorsionTest, ChangesItsFactorWithoutAClick) {
     TubeDistorsion tube;
     SetBoth(tube, kDrive, 0.4f);
     const auto format = Format<double>();
-    tube.InitProcessing(64, &format);
-    const auto input = Sine<double>(64 * 100, 100.0, 48000, 0.3, 2);
+    constexpr int kBlock = 50;  // not a divisor of the frames kept for warming up
+    tube.InitProcessing(kBlock, &format);
+    const auto input = Sine<double>(kBlock * 100, 100.0, 48000, 0.3, 2);
     double last = 0.0, steepest = 0.0;
     for (std::size_t block = 0; block < 100; ++block) {
-        auto samples = std::vector(input.begin() + static_cast<std::ptrdiff_t>(128 * block),
-                                   input.begin() + static_cast<std::ptrdiff_t>(128 * (block + 1)));
+        const auto begin = input.begin() + static_cast<std::ptrdiff_t>(2 * kBlock * block);
+        auto samples = std::vector(begin, begin + 2 * kBlock);
         // From 2 to 16 and back: every pair of neighbours in both directions.
         constexpr float kSettings[] = {0.3f, 0.5f, 0.6f, 0.75f, 1.0f, 0.75f, 0.6f, 0.5f};
         tube.SetParam(kOversampling + 1, kSettings[block / 2 % 8], false);
-        ProcessBlock(tube, samples.data(), 64, format);
-        for (std::size_t i = 0; i < 64; ++i) {
+        ProcessBlock(tube, samples.data(), kBlock, format);
+        for (std::size_t i = 0; i < kBlock; ++i) {
             if (block > 0) steepest = std::max(steepest, std::abs(samples[2 * i] - last));
             last = samples[2 * i];
         }
     }
-    // The curve's own slope: 2 pi 100 / 48000 * 0.3 * (k + 1) with k = 2.96 is 0.0155 a frame; a filter that
-    // starts from silence steps by the whole signal.
-    EXPECT_LT(steepest, 0.02);
+    // The curve's own slope: 2 pi 100 / 48000 * 0.3 * (k + 1) with k = 2.96 is 0.0155 a frame, and up to
+    // twice that where the latency changes; a filter that starts from silence steps by the whole signal.
+    EXPECT_LT(steepest, 0.031);
     EXPECT_GT(steepest, 0.01);
 }
 
