@@ -5,6 +5,7 @@
 #include <iostream>
 
 #include "OtherBuild/Comparison.h"
+#include "OtherBuild/Subjects.h"
 
 namespace {
 
@@ -40,7 +41,7 @@ void CompareTexts(const Take& reference, const Take& other, Verdict& verdict) {
 }
 
 template <typename Sample>
-void CompareSamples(const Take& reference, const Take& other, Rule rule, Verdict& verdict) {
+void CompareSamples(const Take& reference, const Take& other, const Subject& which, Verdict& verdict) {
     const auto a = Values<Sample>(reference), b = Values<Sample>(other);
     const std::string what = reference.scene + (sizeof(Sample) == 4 ? " in float" : " in double");
     if (a.size() != b.size() || a.empty()) {
@@ -49,7 +50,7 @@ void CompareSamples(const Take& reference, const Take& other, Rule rule, Verdict
         return;
     }
     verdict.samples += a.size();
-    if (rule == Rule::Character) {
+    if (which.rule == Rule::Character) {
         const auto here = SettledTone(a), there = SettledTone(b);
         const double level = std::abs(LevelDb(here) - LevelDb(there));
         const double pitch = Pitch(here) > 0.0 ? std::abs(Pitch(there) / Pitch(here) - 1.0) : Pitch(there);
@@ -62,16 +63,16 @@ void CompareSamples(const Take& reference, const Take& other, Rule rule, Verdict
     const double deviation = Deviation(a, b);
     double& worst = verdict.worst[sizeof(Sample) == 8];
     worst = std::max(worst, deviation);
-    if (rule == Rule::SameBits) CompareBits(reference, other, what, verdict);
-    if (rule == Rule::Relative && !(deviation <= (sizeof(Sample) == 8 ? kDoubleLimit : kFloatLimit))) {
+    if (which.rule == Rule::SameBits) CompareBits(reference, other, what, verdict);
+    if (which.rule == Rule::Relative &&
+        !(deviation <= (sizeof(Sample) == 8 ? which.doubleLimit : kFloatLimit))) {
         char text[32];
         std::snprintf(text, sizeof text, ": off by %.1e", deviation);
         verdict.misses.push_back(what + text);
     }
 }
 
-Verdict Compare(const TestSupport::EffectCase& which, const std::vector<Take>& here,
-                const std::vector<Take>& there) {
+Verdict Compare(const Subject& which, const std::vector<Take>& here, const std::vector<Take>& there) {
     Verdict verdict;
     const auto ofEffect = [&](const Take& take) { return take.effect == which.name; };
     if (std::ranges::count_if(here, ofEffect) != std::ranges::count_if(there, ofEffect))
@@ -87,10 +88,10 @@ Verdict Compare(const TestSupport::EffectCase& which, const std::vector<Take>& h
         }
         switch (take.kind) {
             case Kind::Float:
-                CompareSamples<float>(take, *other, which.otherBuild, verdict);
+                CompareSamples<float>(take, *other, which, verdict);
                 break;
             case Kind::Double:
-                CompareSamples<double>(take, *other, which.otherBuild, verdict);
+                CompareSamples<double>(take, *other, which, verdict);
                 break;
             case Kind::Chunk:
                 CompareBits(take, *other, "settings chunk, " + take.scene, verdict);
@@ -119,17 +120,17 @@ int main(int count, char** arguments) try {
     const auto here = Load(arguments[1]), there = Load(arguments[2]);
     const char* const rules[] = {"same bits", "relative", "character"};
     std::printf(
-        "relative: %.0e of the largest sample in double, %.1e in float; character: %.1f dB, pitch "
+        "relative: %.0e of the largest sample in double (%s: %.0e), %.1e in float; character: %.1f dB, pitch "
         "%.1f %%\n\n",
-        kDoubleLimit, kFloatLimit, kLevelLimitDb, 100.0 * kPitchLimit);
+        kDoubleLimit, kEqualizer.name, kEqualizer.doubleLimit, kFloatLimit, kLevelLimitDb,
+        100.0 * kPitchLimit);
     std::printf("%-18s %-10s %-30s %-8s %s\n", "effect", "rule", "worst deviation", "verdict",
                 "reason for the rule");
     bool missed = false;
-    for (const auto& which : TestSupport::AllEffects()) {
+    for (const auto& which : AllSubjects()) {
         const Verdict verdict = Compare(which, here, there);
-        std::printf("%-18s %-10s %-30s %-8s %s\n", which.name, rules[static_cast<int>(which.otherBuild)],
-                    Worst(which.otherBuild, verdict).c_str(), verdict.misses.empty() ? "ok" : "MISS",
-                    which.otherBuildReason);
+        std::printf("%-18s %-10s %-30s %-8s %s\n", which.name, rules[static_cast<int>(which.rule)],
+                    Worst(which.rule, verdict).c_str(), verdict.misses.empty() ? "ok" : "MISS", which.reason);
         for (const auto& miss : verdict.misses) std::printf("    %s\n", miss.c_str());
         missed = missed || !verdict.misses.empty();
     }

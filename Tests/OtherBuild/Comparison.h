@@ -8,16 +8,12 @@
 #include <vector>
 
 #include "OtherBuild/Recording.h"
-#include "Support/EffectCases.h"
 
 namespace OtherBuild {
 
-using Rule = TestSupport::OtherBuild;
-
-// 1e-12 is 4500 roundings of a double: what sines, powers and logarithms that differ in their last bit grow
-// into on the way through an effect. In float the same shows as a last bit that falls the other way, and that
-// comes back through feedback.
-constexpr double kDoubleLimit = 1e-12, kFloatLimit = 4.0 * std::numeric_limits<float>::epsilon();
+// In float a last bit of the double computation shows as a last bit that falls the other way, and that comes
+// back through feedback.
+constexpr double kFloatLimit = 4.0 * std::numeric_limits<float>::epsilon();
 constexpr double kLevelLimitDb = 0.5, kPitchLimit = 0.005;
 
 template <typename T>

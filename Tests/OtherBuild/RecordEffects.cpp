@@ -1,46 +1,18 @@
-// A host of its own, built for every target from this one source: drives each effect with a fixed signal and
-// writes what comes out, for CompareBuilds to hold one build against another. Nothing here may depend on the
-// build: no mathematics library, no clock, no standard random numbers.
+// A host of its own, built for every target from this one source: drives each effect and the equaliser with a
+// fixed signal and writes what comes out, for CompareBuilds to hold one build against another. Nothing here
+// may depend on the build: no mathematics library, no clock, no standard random numbers.
 
-#include <cstring>
 #include <iostream>
 
 #include "DSP/Effects/MemoryFile.h"
-#include "OtherBuild/Recording.h"
-#include "Support/EffectCases.h"
+#include "OtherBuild/FixedSignal.h"
+#include "OtherBuild/Subjects.h"
 #include "Support/EffectRun.h"
 
 namespace {
 
 using namespace OtherBuild;
 using namespace TestSupport;
-
-// 440 Hz by recursion: multiplications and additions give the same bits everywhere, a library's sine does
-// not.
-template <typename Sample>
-std::vector<Sample> FixedSignal() {
-    constexpr double kTwiceCosine = 1.9966836332280566, kSine = 0.057564026959567284;
-    std::vector<Sample> signal;
-    double previous = -0.4 * kSine, current = 0.0;
-    for (std::size_t i = 0; i < kToneFrames; ++i) {
-        signal.push_back(static_cast<Sample>(current));
-        signal.push_back(static_cast<Sample>(0.5 * current));
-        const double next = kTwiceCosine * current - previous;
-        previous = current;
-        current = next;
-    }
-    const auto noise = Noise<Sample>(kNoiseFrames * kChannels);
-    signal.insert(signal.end(), noise.begin(), noise.end());
-    signal.resize(signal.size() + kSilentFrames * kChannels);
-    return signal;
-}
-
-template <typename T>
-std::vector<std::uint8_t> Bytes(const std::vector<T>& values) {
-    std::vector<std::uint8_t> bytes(values.size() * sizeof(T));
-    if (!bytes.empty()) std::memcpy(bytes.data(), values.data(), bytes.size());
-    return bytes;
-}
 
 struct Scene {
     std::string name;
@@ -124,8 +96,10 @@ int main(int count, char** arguments) try {
         }
         takes.push_back({which.name, "texts", Kind::Texts, Texts(*effect)});
     }
+    RecordEqualizer(takes);
     Save(arguments[1], takes);
-    std::cout << "recorded " << AllEffects().size() << " effects in " << takes.size() << " takes\n";
+    std::cout << "recorded " << AllEffects().size() << " effects and the equaliser in " << takes.size()
+              << " takes\n";
 } catch (const std::exception& exception) {
     std::cerr << "record_effects: " << exception.what() << "\n";
     return 1;
