@@ -13,8 +13,11 @@ constexpr double kOffBins = 0.3;
 constexpr double kOffShare = 0.003;
 constexpr double kStretchShare = 1.5e-4;
 constexpr double kOffSpacing = 0.25;
+// A low candidate's partials lie so close that some peaks fit them by chance: the wider what is taken beside
+// their distance, the less a fit says.
+constexpr double kChanceCost = 1.5;
 // What missing partials below a peak cost.
-constexpr float kMissingCost = 0.6f;
+constexpr float kMissingCost = 0.8f;
 
 // Expected spread of a string's inharmonicity.
 constexpr double kUsualInharmonicity = 5e-4;
@@ -92,7 +95,7 @@ PartialFit FitPartial(double fundamental, double position) {
     const double taken =
         std::min(kOffBins + position * (kOffShare + kStretchShare * n * n), kOffSpacing * fundamental);
     const double share = off / taken;
-    const double fit = 1.0 - share * share;
+    const double fit = (1.0 - share * share) * (1.0 - kChanceCost * taken / fundamental);
     return fit > 0.0 ? PartialFit{number, static_cast<float>(fit)} : PartialFit{0, 0.0f};
 }
 

@@ -21,8 +21,9 @@ private:
     std::size_t m_count = 0;
 };
 
-// Which partial of `fundamental` a peak is, 0 for none, and how well it fits: 1 exactly .. 0 at the edge of
-// what is taken. Partials may be stretched as a string's are.
+// Which partial of `fundamental` a peak is, 0 for none, and how much that says: towards 1 the better it fits
+// and the less it would by chance, 0 at the edge of what is taken. Partials may be stretched as a string's
+// are.
 struct PartialFit {
     int number;
     float fit;

@@ -1,3 +1,4 @@
+#include <algorithm>
 #include <cmath>
 #include <limits>
 #include <vector>
@@ -174,6 +175,22 @@ TEST_F(TunerTest, KeepsTheStrongestPeakWithoutItsSubharmonics) {
     TunerProbe probe(kRate);
     probe.Tune(Partials({1, 4, 4, 4}, 250.0).data());
     EXPECT_NEAR(probe.tuner.GetFrequency(), 1000.0, 0.1);
+}
+
+// Two notes at once are no deep third one whose high partials they happen to meet. (A fifth is partials 2 and
+// 3 of one, and heard so.)
+TEST_F(TunerTest, HearsOneOfTwoNotes) {
+    for (const double other : {1.26, 1.335, 1.682, 2.245}) {
+        auto sound = TunerSounds::Sound(Kind::Piano, 329.6, kRate, kLength, 0.2);
+        const auto second = TunerSounds::Sound(Kind::Piano, 329.6 * other, kRate, kLength, 0.7);
+        for (std::size_t i = 0; i < kLength; ++i) sound[i] += 0.7f * second[i];
+        TunerProbe probe(kRate);
+        probe.Tune(sound.data());
+        EXPECT_NEAR(std::min(std::abs(probe.tuner.GetFrequency() / 329.6 - 1.0),
+                             std::abs(probe.tuner.GetFrequency() / (329.6 * other) - 1.0)),
+                    0.0, 0.005)
+            << other;
+    }
 }
 
 // The harmonic product leaves its five harmonics to the pseudo product, until a preset is chosen: with three
