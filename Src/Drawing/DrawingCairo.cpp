@@ -1,9 +1,6 @@
 #include "Drawing/DrawingCairo.h"
 
 #include <algorithm>
-#include <array>
-#include <cmath>
-#include <limits>
 #include <numbers>
 #include <string>
 
@@ -11,32 +8,12 @@
 #include <pango/pangocairo.h>
 
 #include "Drawing/DrawingFont.h"
+#include "Drawing/PrimitiveArguments.h"
+#include "Drawing/ResourceKeys.h"
 #include "Drawing/SlotCache.h"
 
 namespace Corvo {
 namespace {
-
-constexpr float kDotsPerInch = 96.0f;
-constexpr float kLargest = 32767.0f;  // what Cairo's fixed-point coordinates hold, with room to spare
-
-struct InkKey {
-    Ink ink{};
-    bool operator==(const InkKey& other) const {
-        return ink.colour == other.ink.colour && ink.opacity == other.ink.opacity;
-    }
-};
-
-struct StrokeKey {
-    InkKey ink;
-    float width = 0.0f;
-    bool operator==(const StrokeKey&) const = default;
-};
-
-struct TextKey {
-    std::array<char, 56> text{};
-    float size = 0.0f;
-    bool operator==(const TextKey&) const = default;
-};
 
 struct LaidOutText {
     PangoLayout* layout = nullptr;
@@ -48,13 +25,6 @@ struct CairoPen {
     cairo_pattern_t* pattern;
     float width;
 };
-
-bool IsUsable(float number) { return std::abs(number) <= kLargest; }
-bool IsUsable(PointF point) { return IsUsable(point.x) && IsUsable(point.y); }
-bool IsUsable(const RectF& r) {
-    return IsUsable(PointF{r.x, r.y}) && r.width > 0.0f && r.height > 0.0f && IsUsable(r.width) &&
-           IsUsable(r.height);
-}
 
 // The file joins those that the program knows; once for each file.
 void AddFontFile() {
@@ -100,9 +70,7 @@ struct DrawingCairo::Resources {
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
 
     const LaidOutText& LaidOut(std::string_view text, float size) {
-        TextKey key;
-        std::copy_n(text.begin(), std::min(text.size(), key.text.size() - 1), key.text.begin());
-        key.size = size;
+        const TextKey key(text, size);
         return texts.Find(
             key, [&] { return LayOut(key.text.data(), size); },
             [](LaidOutText& old) { g_object_unref(old.layout); });
@@ -157,9 +125,7 @@ void DrawingCairo::ReleasePen(DrawingPen*& pen) {
 }
 
 DrawingCairo::DrawTarget::DrawTarget(DrawingCairo& drawing, cairo_t* context, float dpi)
-    : m_drawing(drawing),
-      m_context(cairo_reference(context)),
-      m_scale(dpi > 0.0f && dpi <= kLargest ? dpi / kDotsPerInch : 1.0f) {
+    : m_drawing(drawing), m_context(cairo_reference(context)), m_scale(ScaleOf(dpi)) {
     cairo_save(m_context);
     cairo_new_path(m_context);
     cairo_set_line_join(m_context, CAIRO_LINE_JOIN_ROUND);
@@ -182,7 +148,7 @@ void DrawingCairo::DrawTarget::Use(Ink ink) {
 
 // False for a line of no width.
 bool DrawingCairo::DrawTarget::Use(const Stroke& stroke) {
-    if (!(stroke.width > 0.0f) || !IsUsable(stroke.width)) return false;
+    if (!IsUsableSize(stroke.width)) return false;
     const DrawingPen* const pen = m_drawing.m_resources->pens.Find(
         {{stroke.ink}, stroke.width}, [&] { return m_drawing.CreatePen(stroke); },
         [&](DrawingPen* old) { m_drawing.ReleasePen(old); });
@@ -221,8 +187,9 @@ void DrawingCairo::DrawTarget::FillRectangle(const RectF& r, Ink ink) {
 }
 
 void DrawingCairo::DrawTarget::OutlineRectangle(const RectF& r, const Stroke& stroke) {
+    if (!IsUsable(r) || !IsUsableSize(stroke.width)) return;
     const float width = std::min({stroke.width, r.width / 2.0f, r.height / 2.0f});
-    if (!IsUsable(r) || !Use(Stroke{stroke.ink, width})) return;
+    Use(Stroke{stroke.ink, width});
     cairo_set_line_join(m_context, CAIRO_LINE_JOIN_MITER);
     cairo_rectangle(m_context, r.x + width / 2.0f, r.y + width / 2.0f, r.width - width, r.height - width);
     cairo_stroke(m_context);
@@ -245,23 +212,22 @@ void DrawingCairo::DrawTarget::FillRoundedRectangle(const RectF& r, float radius
 }
 
 TextMetrics DrawingCairo::DrawTarget::MeasureText(std::string_view text, float size) {
-    if (!(size > 0.0f) || !IsUsable(size)) return {0.0f, 0.0f, 0.0f};
+    if (!IsUsableSize(size)) return {0.0f, 0.0f, 0.0f};
     return m_drawing.m_resources->LaidOut(text, size).metrics;
 }
 
 void DrawingCairo::DrawTarget::Text(std::string_view text, PointF baseline, TextAlign align, float size,
                                     Ink ink) {
-    if (!(size > 0.0f) || !IsUsable(size) || !IsUsable(baseline)) return;
+    if (!IsUsableSize(size) || !IsUsable(baseline)) return;
     const LaidOutText& laidOut = m_drawing.m_resources->LaidOut(text, size);
-    const float share = align == TextAlign::Left ? 0.0f : align == TextAlign::Centre ? 0.5f : 1.0f;
     Use(ink);
-    cairo_move_to(m_context, baseline.x - laidOut.metrics.width * share, baseline.y);
+    cairo_move_to(m_context, baseline.x - laidOut.metrics.width * ShareBefore(align), baseline.y);
     pango_cairo_show_layout_line(m_context, pango_layout_get_line_readonly(laidOut.layout, 0));
     cairo_new_path(m_context);
 }
 
 void DrawingCairo::DrawTarget::Bitmap(const DrawingBitmap& bitmap, const RectF& r, std::uint8_t opacity) {
-    if (bitmap.width < 1 || bitmap.height < 1 || !IsUsable(r)) return;
+    if (!IsUsable(bitmap) || !IsUsable(r)) return;
     // Only read from, whatever the signature says.
     auto* const pixels =
         const_cast<unsigned char*>(reinterpret_cast<const unsigned char*>(bitmap.pixels.data()));

@@ -2,52 +2,29 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdint>
-#include <vector>
-
-#include "Drawing/DrawingCairo.h"
-
-#include <cairo.h>
+#if defined(_WIN32)
+#include "Support/DrawingSurfaceD2D.h"
+#include "Support/DrawingSurfaceGdiPlus.h"
+#else
+#include "Support/DrawingSurfaceCairo.h"
+#endif
 
 namespace TestSupport {
 
-// A picture in memory with one back-end's target on it. Paint() hands the target to `draw`; Pixel() is
-// 0xRRGGBB of what came out. The ground is black.
+// A picture in memory, black at first, and one back-end that draws on it.
+//   Paint(dpi, draw)  hands the back-end's target to `draw`
+//   PaintWith(brush)  fills the picture with a brush that the caller made
+//   Pixel(x, y)       0xRRGGBB
+//   Drawing()         the back-end
+//   Smooths()         whether the system under the back-end smooths edges
 template <typename Drawing>
 class DrawingSurface;
 
-template <>
-class DrawingSurface<Corvo::DrawingCairo> {
-public:
-    DrawingSurface(int width, int height)
-        : m_surface(cairo_image_surface_create(CAIRO_FORMAT_RGB24, width, height)) {}
-    ~DrawingSurface() { cairo_surface_destroy(m_surface); }
-    DrawingSurface(const DrawingSurface&) = delete;
-    DrawingSurface& operator=(const DrawingSurface&) = delete;
-
-    template <typename Draw>
-    void Paint(float dpi, Draw draw) {
-        cairo_t* const context = cairo_create(m_surface);
-        {
-            Corvo::DrawingCairo::DrawTarget target(m_drawing, context, dpi);
-            draw(target);
-        }
-        cairo_destroy(context);
-        cairo_surface_flush(m_surface);
-    }
-
-    std::uint32_t Pixel(int x, int y) const {
-        const unsigned char* const row =
-            cairo_image_surface_get_data(m_surface) + y * cairo_image_surface_get_stride(m_surface);
-        return reinterpret_cast<const std::uint32_t*>(row)[x] & 0xFFFFFFu;
-    }
-    Corvo::DrawingCairo& Drawing() { return m_drawing; }
-
-private:
-    cairo_surface_t* m_surface;
-    Corvo::DrawingCairo m_drawing;
-};
-
+// Every back-end of this system: what a typed suite about drawing runs over.
+#if defined(_WIN32)
+using DrawingBackends = testing::Types<Corvo::DrawingGdiPlus, Corvo::DrawingD2D>;
+#else
 using DrawingBackends = testing::Types<Corvo::DrawingCairo>;
+#endif
 
 }  // namespace TestSupport
