@@ -50,6 +50,7 @@ TYPED_TEST(TextLayout, TextsStayApartAndInside) {
     shown.Hear(466.16, 0.5, 0.6);
     ASSERT_TRUE(analyser.GetTuner()->IsTuned());
     std::size_t texts = 0;
+    DrawingSurface<TypeParam> surface(16, 16);
     for (const RectF& size : kSizes)
         for (const float dpi : {96.0f, 144.0f, 192.0f})
             for (int scale = -1; scale <= 5; ++scale)
@@ -59,7 +60,6 @@ TYPED_TEST(TextLayout, TextsStayApartAndInside) {
                     kivspectrum::settings.view_option_a = scale;
                     kivspectrum::settings.view_flag_d = notes;
                     shown.Hear(466.16, 0.5, 0.04);
-                    DrawingSurface<TypeParam> surface(16, 16);
                     surface.Paint(dpi, [&](auto& inner) {
                         const auto check = [&](auto draw) {
                             typename Recording::DrawTarget target(inner);

@@ -154,11 +154,11 @@ TEST_F(SonogramTest, LosesNoBin) {
                 if (scale != 0) share = std::log(std::max(hz, 20.0) / 20.0) / std::log(kRate / 40.0);
                 if (scale == 4) share = std::log1p(hz / 700.0) / std::log1p(kRate / 1400.0);
                 // The note scale is widened to whole semitones, of which it has 123.
-                const int near = scale == 5 ? 1 + height / 123 : 1;
+                const int reach = scale == 5 ? 1 + height / 123 : 1;
                 const int row = height - 1 - static_cast<int>(share * height);
                 const float* const column = m_sonogram.GetColumn();
-                const float highest = *std::max_element(column + std::max(row - near, 0),
-                                                        column + std::min(row + near + 1, height));
+                const float highest = *std::max_element(column + std::max(row - reach, 0),
+                                                        column + std::min(row + reach + 1, height));
                 ASSERT_NEAR(highest, 0.0, 1e-3) << scale << " " << bin;
             }
         }

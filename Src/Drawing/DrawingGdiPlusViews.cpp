@@ -1,0 +1,4 @@
+#include "Drawing/DrawingGdiPlus.h"
+#include "Drawing/Views.h"
+
+DSP_INSTANTIATE_VIEWS(Corvo::DrawingGdiPlus)
