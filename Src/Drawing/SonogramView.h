@@ -179,17 +179,3 @@ void kivspectrum::DoDrawSonogramAndSpectrum(typename Drawing::DrawTarget& target
     DrawSonogramComponents<Drawing>(
         target, {rectangle.x, rectangle.y + upper, rectangle.width, rectangle.height - upper});
 }
-
-template <class Drawing>
-void kivspectrum::DoDraw(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    switch (m_displayMode.load()) {
-        case display_sonogram:
-            return DrawSonogramComponents<Drawing>(target, rectangle);
-        case display_both:
-            return DoDrawSonogramAndSpectrum<Drawing>(target, rectangle);
-        case display_tuner:
-            return DrawTuner<Drawing>(target, rectangle);
-        default:
-            return DoDrawSpectrum<Drawing>(target, rectangle);
-    }
-}

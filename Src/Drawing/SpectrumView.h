@@ -7,6 +7,7 @@
 #include "Drawing/ShortText.h"
 #include "Spectrum/SpectrumDrawer.h"
 #include "Spectrum/SpectrumScales.h"
+#include "Spectrum/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 
 // The spectrum's curve with its scales.
@@ -130,13 +131,15 @@ void kivspectrum::DoDrawSpectrum(typename Drawing::DrawTarget& target, const Cor
     DrawSpectrumScales(target, layout, map, view);
     target.PushClip(plot);
     int count = 0;
-    if (view.peak_hold_mode != 0) {
-        m_drawer->ComputeSpectrumPoints(plot, nullptr, count, map, display_spectrum, 0, 0.0f,
-                                        &m_drawer->GetPeaks());
-        const auto& peaks = m_drawer->GetXYPoints();
-        target.Polyline(peaks.data(), static_cast<int>(peaks.size()),
-                        {{Look::kPeaks}, Look::kHairline * target.Scale()});
-    }
+    const auto other = [&](const std::vector<float>& power, ColourReference colour) {
+        m_drawer->ComputeSpectrumPoints(plot, nullptr, count, map, display_spectrum, 0, 0.0f, &power);
+        const auto& points = m_drawer->GetXYPoints();
+        target.Polyline(points.data(), static_cast<int>(points.size()),
+                        {{colour}, Look::kHairline * target.Scale()});
+    };
+    if (view.peak_hold_mode != 0) other(m_drawer->GetPeaks(), Look::kPeaks);
+    if (m_tunerOn && Tuner::GetShowDenoisedSpectrum() && !m_tuner->GetDenoisedSpectrum().empty())
+        other(m_tuner->GetDenoisedSpectrum(), Look::kTrace);
     m_drawer->ComputeSpectrumPoints(plot, nullptr, count, map, display_spectrum, 0, 0.0f);
     DrawCurve(target, plot, map, m_drawer->GetXYPoints(), CurveStyleOf(view), m_outline);
     target.PopClip();

@@ -1,8 +1,6 @@
 #pragma once
 
-#include "Drawing/SonogramView.h"
-#include "Drawing/SpectrumView.h"
-#include "Drawing/TunerView.h"
+#include "Drawing/WholeView.h"
 #include "Platform/Export.h"
 
 // Makes all drawing routines for one back-end; in one source file each.

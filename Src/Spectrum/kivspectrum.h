@@ -48,7 +48,7 @@ public:
         std::int32_t view_option_c = 1;    // grid: 0 off, 1 on
         std::int32_t view_option_d = 1;    // vertical range: 60, 90, 120 or 144 dB
         float gain = 1.0f;                 // scales the drawn amplitude
-        std::int32_t view_flag_a = 0;      // show the two channels apart
+        std::int32_t view_flag_a = 0;      // for the host: show the two channels' analysers apart
         std::int32_t peak_hold_mode = 1;   // 0 no peaks, 1 peaks fall, 2 they stay until reset
         std::int32_t view_flag_b = 1;      // labels
         std::int32_t view_option_e = 1;    // curve style: 1 line, 2 filled, 3 bars
@@ -204,7 +204,7 @@ public:
     // `rectangle`, in pixels of the target, whatever its size. One thread draws for all analysers; it is the
     // display thread, or the menu's while the display thread rests.
     //
-    // DoDraw draws what the display mode says.
+    // DoDraw draws what the display mode says, and the tuner in a strip above it while that is on.
     template <class Drawing>
     void DoDraw(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
     template <class Drawing>
