@@ -270,7 +270,7 @@ void kivspectrum::DrawTuner(typename Drawing::DrawTarget& target, const Corvo::R
     using namespace Corvo;
     if (!IsDrawable(rectangle)) return;
     const float scale = target.Scale();
-    constexpr float kSmallWidth = 180.0f, kSmallHeight = 90.0f, kSideBySide = 1.7f;
+    constexpr float kSmallWidth = 180.0f, kSmallHeight = 90.0f, kSideBySide = 1.7f, kWidestHalf = 2.0f;
     target.PushClip(rectangle);
     target.FillRectangle(rectangle, {Look::kGround});
     const float gap = 2.0f * Look::kGap * scale;
@@ -278,9 +278,11 @@ void kivspectrum::DrawTuner(typename Drawing::DrawTarget& target, const Corvo::R
     if (rectangle.width < kSmallWidth * scale || rectangle.height < kSmallHeight * scale) {
         DrawTunerLine<Drawing>(target, rectangle);
     } else if (rectangle.width > kSideBySide * rectangle.height) {
-        const float half = (inner.width - gap) / 2.0f;
-        DrawTunerBigLetter<Drawing>(target, {inner.x, inner.y, half, inner.height});
-        DrawTunerWithNeedle<Drawing>(target, {Right(inner) - half, inner.y, half, inner.height});
+        // In a long strip they stay together in the middle.
+        const float half = std::min((inner.width - gap) / 2.0f, kWidestHalf * inner.height);
+        const float middle = Centre(inner).x;
+        DrawTunerBigLetter<Drawing>(target, {middle - gap / 2.0f - half, inner.y, half, inner.height});
+        DrawTunerWithNeedle<Drawing>(target, {middle + gap / 2.0f, inner.y, half, inner.height});
     } else {
         const float upper = 0.5f * inner.height;
         DrawTunerBigLetter<Drawing>(target, {inner.x, inner.y, inner.width, upper});
