@@ -43,8 +43,8 @@ private:
     PictureDrawing::DrawTarget Target();
 
     struct Surface;
+    PictureDrawing m_drawing;  // first: it starts the drawing system where that has to be
     std::unique_ptr<Surface> m_surface;
-    PictureDrawing m_drawing;
     Corvo::RectF m_whole;
     float m_dpi;
 };
