@@ -11,6 +11,7 @@
 #include "DSP/Effects/SharedRecord.h"
 #include "DSP/Effects/TubeOversampling.h"
 #include "DSP/Effects/TubePresets.h"
+#include "DSP/Effects/TubeRecentInput.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -71,7 +72,7 @@ float OversamplingFromNumber(float number) {
 
 }  // namespace
 
-TubeDistorsion::TubeDistorsion() {
+TubeDistorsion::TubeDistorsion() : m_recent(std::make_unique<TubeRecentInput>()) {
     for (auto& state : m_states) state = std::make_unique<TubeOversampling>();
     SetPreset(GetDefaultPreset());
 }
@@ -217,7 +218,7 @@ void TubeDistorsion::Cleanup() {
     FreeBuffers();
     LiveState().Restart(LiveState().Factor());
     LiveState().amp.ClearMemories();
-    m_recent.Clear();
+    m_recent->Clear();
 }
 
 void TubeDistorsion::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
@@ -239,7 +240,7 @@ void TubeDistorsion::InitState(bool fromSilence) {
         if (m_copies.Exchange()) live = &LiveState();
         live->Restart(live->Factor());
         live->amp.SetParameter(values, VirtualTubeAmp::kAllParameters);
-        m_recent.Clear();
+        m_recent->Clear();
     }
     using Bits = std::array<std::uint32_t, std::tuple_size_v<Values>>;
     const auto now = std::bit_cast<Bits>(values), before = std::bit_cast<Bits>(m_cooked);
@@ -253,8 +254,8 @@ void TubeDistorsion::ExchangeCopies(int channels) {
     if (!m_copies.Exchange()) return;
     TubeOversampling& live = LiveState();
     live.amp = before.amp;
-    auto recent = m_recent.Samples(channels);
-    live.Shape(recent.data(), RecentInput::kFrames, channels);
+    auto recent = m_recent->Samples(channels);
+    live.Shape(recent.data(), TubeRecentInput::kFrames, channels);
 }
 
 void TubeDistorsion::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
@@ -265,29 +266,9 @@ void TubeDistorsion::ProcessInternal(double* buffer, int frames, const tWAVEFORM
     TubeOversampling& live = LiveState();
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&](auto* samples) {
         live.amp.FilterTone(samples, frames, channels);
-        m_recent.Add(samples, frames, channels);
+        m_recent->Add(samples, frames, channels);
         live.Shape(samples, frames, channels);
     });
-}
-
-template <typename Sample>
-void TubeDistorsion::RecentInput::Add(const Sample* samples, int frames, int channels) {
-    const int size = kFrames * channels, added = std::min(frames, kFrames) * channels;
-    samples += static_cast<std::ptrdiff_t>(std::max(frames - kFrames, 0)) * channels;
-    const int upToEnd = std::min(added, size - m_next);
-    std::copy_n(samples, upToEnd, m_samples.begin() + m_next);
-    std::copy_n(samples + upToEnd, added - upToEnd, m_samples.begin());
-    m_next = (m_next + added) % size;
-}
-
-void TubeDistorsion::RecentInput::Clear() { *this = {}; }
-
-std::array<double, TubeDistorsion::RecentInput::kFrames * 2> TubeDistorsion::RecentInput::Samples(
-    int channels) const {
-    std::array<double, kFrames * 2> samples{};
-    const auto begin = m_samples.begin();
-    std::rotate_copy(begin, begin + m_next, begin + kFrames * channels, samples.begin());
-    return samples;
 }
 
 }  // namespace Corvo::DSP

@@ -10,6 +10,7 @@
 namespace Corvo::DSP {
 
 class TubeOversampling;
+class TubeRecentInput;
 
 // Tube-style distortion, "Valvex" to the user: per side a low-pass of order 4, a boost and one of four
 // shaping functions, which may run at up to 16 times the stream's rate.
@@ -74,22 +75,6 @@ protected:
 private:
     using Values = VirtualTubeAmp::Values;
 
-    // The newest frames in front of the shaper, for filters that come into use in mid-stream. They ring
-    // out to 1e-12 within this length. To be cleared when the channel count changes.
-    class RecentInput {
-    public:
-        static constexpr int kFrames = 64;
-        template <typename Sample>
-        void Add(const Sample* samples, int frames, int channels);
-        void Clear();
-        // Interleaved, oldest first.
-        std::array<double, kFrames * 2> Samples(int channels) const;
-
-    private:
-        std::array<double, kFrames * 2> m_samples{};  // interleaved, a ring of kFrames
-        int m_next = 0;
-    };
-
     TubeOversampling& LiveState();
     int WantedFactor() const;
     void ApplyValues(const Values& values);
@@ -106,7 +91,7 @@ private:
     // Audio thread.
     tWAVEFORMATEX m_format{};
     Values m_cooked{};
-    RecentInput m_recent;
+    std::unique_ptr<TubeRecentInput> m_recent;
 };
 
 }  // namespace Corvo::DSP
