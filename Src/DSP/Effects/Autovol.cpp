@@ -7,12 +7,13 @@
 #include "DSP/Effects/AutovolPresets.h"
 #include "DSP/Effects/Decibels.h"
 #include "DSP/Effects/FixedPoint.h"
+#include "DSP/Effects/PairedWords.h"
 #include "DSP/Effects/ParameterTable.h"
 #include "DSP/Effects/ParameterText.h"
 #include "DSP/Effects/SampleDispatch.h"
-#include "DSP/Effects/SettingsChunk.h"
 #include "DSP/Effects/SharedRecord.h"
 #include "DSP/Effects/SineOscillator.h"
+#include "DSP/Effects/WordChunk.h"
 
 namespace Corvo::DSP {
 
@@ -71,17 +72,14 @@ constexpr std::int32_t kSilent = -960;
 constexpr std::int32_t kLoudest = 200, kWhole = 1000;
 constexpr double kPerMille = 0.001;
 constexpr double kRadiansPerRateStep = 0.06283185307179587;  // 2 pi / 100
-constexpr std::size_t kWords = sizeof(Props) / 4;
-constexpr std::size_t kChunkSize = 4 + 4 * kWords, kOldChunkSize = 4 + 8 * kWords;
 
-bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
-bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kPresets.size()); }
-const Row& RowAt(int index) { return kRows[static_cast<std::size_t>(index)]; }
+using Words = PairedWords<kRows, kPresets>;
 
-bool VisitWords(auto&& visit, auto& s) {
+constexpr auto kVisitWords = [](auto&& visit, auto& s) {
     return visit(s.depth) && visit(s.mix) && visit(s.rate) && visit(s.ringMod) && visit(s.invert) &&
            visit(s.reserved) && visit(s.outGain) && visit(s.reserved2);
-}
+};
+using SettingsChunk = WordChunk<Props, kVisitWords>;
 
 template <typename Sample>
 void Modulate(Sample* samples, double factor) {
@@ -121,9 +119,9 @@ void RunSide(AutovolPrivate::Side& side, Sample* samples, int frames, int stride
 Autovol::Autovol() : m_sides(std::make_unique<Sides>()) { SetPreset(0); }
 Autovol::~Autovol() = default;
 
-int Autovol::GetParamCountReal() { return static_cast<int>(kRows.size()); }
-int Autovol::GetSettingsChunkSize() { return kChunkSize; }
-int Autovol::NumPresets() { return static_cast<int>(kPresets.size()); }
+int Autovol::GetParamCountReal() { return Words::kCount; }
+int Autovol::GetSettingsChunkSize() { return SettingsChunk::kSize; }
+int Autovol::NumPresets() { return Words::kPresetCount; }
 std::string Autovol::GetName() { return "Tremolo"; }
 std::string Autovol::GetImage() { return "builtinTremolo.png"; }
 std::string Autovol::GetPluginIconPath() { return "BuiltinPlugins/Tremolo@3x.png"; }
@@ -140,33 +138,16 @@ const MP_PARAMINFO* Autovol::GetParametersInfo() {
 }
 
 bool Autovol::DoSetParam(int index, float normalised, bool) {
-    if (!Has(index)) return false;
-    const Row& row = RowAt(index);
-    StoreShared((m_settings.*row.field)[row.side], row.map.Word(normalised));
-    return true;
+    return Words::Set(m_settings, index, normalised);
 }
 
-float Autovol::GetParamPlain(int index) const {
-    if (!Has(index)) return 0.0f;
-    const Row& row = RowAt(index);
-    return static_cast<float>(LoadShared((m_settings.*row.field)[row.side]));
-}
-
-float Autovol::GetParam(int index) {
-    if (!Has(index)) return 0.0f;
-    const Row& row = RowAt(index);
-    return row.map.Normalised(LoadShared((m_settings.*row.field)[row.side]));
-}
-
-float Autovol::GetParamFromProp(int index, int preset) {
-    if (!Has(index) || !HasPreset(preset)) return -1.0f;
-    const Row& row = RowAt(index);
-    return row.map.Normalised((kPresets[static_cast<std::size_t>(preset)].settings.*row.field)[row.side]);
-}
+float Autovol::GetParamPlain(int index) const { return Words::Plain(m_settings, index); }
+float Autovol::GetParam(int index) { return Words::Normalised(m_settings, index); }
+float Autovol::GetParamFromProp(int index, int preset) { return Words::InPreset(index, preset); }
 
 std::wstring Autovol::GetParameterFormattedText(int index, double value) {
-    if (!Has(index)) return {};
-    const Row& row = RowAt(index);
+    if (!Words::Has(index)) return {};
+    const Row& row = Words::RowAt(index);
     const auto word = row.map.Word(static_cast<float>(value));
     switch (row.show) {
         case Show::Steps:
@@ -181,8 +162,8 @@ std::wstring Autovol::GetParameterFormattedText(int index, double value) {
 }
 
 float Autovol::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Has(index)) return -1.0f;
-    const Row& row = RowAt(index);
+    if (!Words::Has(index)) return -1.0f;
+    const Row& row = Words::RowAt(index);
     switch (row.show) {
         case Show::Steps:
             return row.map.Normalised(ParseSteps(text, row.step));
@@ -195,16 +176,16 @@ float Autovol::GetParamValueNormalizedFromText(int index, std::string text) {
 }
 
 std::vector<std::string> Autovol::GetParameterAvailableValues(int index) {
-    if (!Has(index) || RowAt(index).show != Show::Choice) return {};
+    if (!Words::Has(index) || Words::RowAt(index).show != Show::Choice) return {};
     return {kChoices.begin(), kChoices.end()};
 }
 
 void Autovol::GetParamSectionInfo(int index, PluginParameterInfo& info) {
-    if (!Has(index)) return;
+    if (!Words::Has(index)) return;
     info = {};
     info.param_index = index;
     info.values = GetParameterAvailableValues(index);
-    info.label = Narrow(RowAt(index).label);
+    info.label = Narrow(Words::RowAt(index).label);
 }
 
 void Autovol::InitializeXyEditingData(GenericUIData& data) {
@@ -216,39 +197,24 @@ void Autovol::InitializeXyEditingData(GenericUIData& data) {
     data.entries = {"Default"};
 }
 
-std::string Autovol::GetPresetName(int preset) {
-    return HasPreset(preset) ? kPresets[static_cast<std::size_t>(preset)].name : std::string();
-}
+std::string Autovol::GetPresetName(int preset) { return Words::PresetName(preset); }
 
 void Autovol::SetPreset(int preset) {
-    if (!HasPreset(preset)) return;
-    Assign(m_settings, kPresets[static_cast<std::size_t>(preset)].settings);
-    m_cook.store(true, std::memory_order_release);
+    if (Words::TakePreset(m_settings, preset)) m_cook.store(true, std::memory_order_release);
 }
 
 void Autovol::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    const auto settings = Snapshot(m_settings);
-    ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && VisitWords(write, settings);
+    SettingsChunk::Write(chunk, m_chunk_tag, m_settings);
 }
 
 void Autovol::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kChunkSize) return;
-    ChunkReader read(chunk);
-    Props settings;
-    read(m_chunk_tag) && VisitWords(read, settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
+    if (SettingsChunk::Read(chunk, m_chunk_tag, m_settings)) m_cook.store(true, std::memory_order_release);
 }
 
 bool Autovol::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kOldChunkSize) return false;
-    ChunkReader read(chunk);
-    Props settings;
-    read(m_chunk_tag) && VisitWords(SpreadWordReader(read), settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
-    return true;
+    const bool fits = SettingsChunk::ReadOld(chunk, m_chunk_tag, m_settings);
+    if (fits) m_cook.store(true, std::memory_order_release);
+    return fits;
 }
 
 void Autovol::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {

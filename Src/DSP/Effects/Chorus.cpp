@@ -8,11 +8,12 @@
 #include "DSP/Effects/ChorusPresets.h"
 #include "DSP/Effects/Decibels.h"
 #include "DSP/Effects/FixedPoint.h"
+#include "DSP/Effects/PairedWords.h"
 #include "DSP/Effects/ParameterTable.h"
 #include "DSP/Effects/ParameterText.h"
 #include "DSP/Effects/SampleDispatch.h"
-#include "DSP/Effects/SettingsChunk.h"
 #include "DSP/Effects/SharedRecord.h"
+#include "DSP/Effects/WordChunk.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -66,17 +67,14 @@ constexpr double kRadiansPerStep = 0.06283185307179587;  // 2 pi / 100
 constexpr int kFirstCapacity = 480000;                   // floats
 constexpr double kLongestSeconds = 10.0;
 constexpr double kFastestHz = 768e3;  // bounds the memory for formats that nobody has
-constexpr std::size_t kWords = sizeof(Props) / 4;
-constexpr std::size_t kChunkSize = 4 + 4 * kWords, kOldChunkSize = 4 + 8 * kWords;
 
-bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
-bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kPresets.size()); }
-const Row& RowAt(int index) { return kRows[static_cast<std::size_t>(index)]; }
+using Words = PairedWords<kRows, kPresets>;
 
-bool VisitWords(auto&& visit, auto& s) {
+constexpr auto kVisitWords = [](auto&& visit, auto& s) {
     return visit(s.frequency) && visit(s.delay) && visit(s.wet) && visit(s.dry) && visit(s.depth) &&
            visit(s.reserved);
-}
+};
+using SettingsChunk = WordChunk<Props, kVisitWords>;
 
 }  // namespace
 
@@ -91,9 +89,9 @@ Chorus::~Chorus() = default;
 
 int Chorus::Channels() const { return std::clamp<int>(m_format.nChannels, 1, MaxNumChannels); }
 
-int Chorus::GetParamCountReal() { return static_cast<int>(kRows.size()); }
-int Chorus::GetSettingsChunkSize() { return kChunkSize; }
-int Chorus::NumPresets() { return static_cast<int>(kPresets.size()); }
+int Chorus::GetParamCountReal() { return Words::kCount; }
+int Chorus::GetSettingsChunkSize() { return SettingsChunk::kSize; }
+int Chorus::NumPresets() { return Words::kPresetCount; }
 std::string Chorus::GetName() { return "Chorus"; }
 std::string Chorus::GetImage() { return "builtinChorus.png"; }
 std::string Chorus::GetPluginIconPath() { return "BuiltinPlugins/Chorus.png"; }
@@ -105,33 +103,17 @@ const MP_PARAMINFO* Chorus::GetParametersInfo() {
 }
 
 bool Chorus::DoSetParam(int index, float normalised, bool) {
-    if (!Has(index)) return true;
-    const Row& row = RowAt(index);
-    StoreShared((m_settings.*row.field)[row.side], row.map.Word(normalised));
+    Words::Set(m_settings, index, normalised);
     return true;
 }
 
-float Chorus::GetParamPlain(int index) const {
-    if (!Has(index)) return 0.0f;
-    const Row& row = RowAt(index);
-    return static_cast<float>(LoadShared((m_settings.*row.field)[row.side]));
-}
-
-float Chorus::GetParam(int index) {
-    if (!Has(index)) return 0.0f;
-    const Row& row = RowAt(index);
-    return row.map.Normalised(LoadShared((m_settings.*row.field)[row.side]));
-}
-
-float Chorus::GetParamFromProp(int index, int preset) {
-    if (!Has(index) || !HasPreset(preset)) return -1.0f;
-    const Row& row = RowAt(index);
-    return row.map.Normalised((kPresets[static_cast<std::size_t>(preset)].settings.*row.field)[row.side]);
-}
+float Chorus::GetParamPlain(int index) const { return Words::Plain(m_settings, index); }
+float Chorus::GetParam(int index) { return Words::Normalised(m_settings, index); }
+float Chorus::GetParamFromProp(int index, int preset) { return Words::InPreset(index, preset); }
 
 std::wstring Chorus::GetParameterFormattedText(int index, double value) {
-    if (!Has(index)) return {};
-    const Row& row = RowAt(index);
+    if (!Words::Has(index)) return {};
+    const Row& row = Words::RowAt(index);
     const auto word = row.map.Word(static_cast<float>(value));
     return WithUnit(
         row.decimals > 0 ? FormatFixed(word * row.step, row.decimals) : FormatTenthsOfDb(word, kSilent),
@@ -139,16 +121,16 @@ std::wstring Chorus::GetParameterFormattedText(int index, double value) {
 }
 
 float Chorus::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Has(index)) return -1.0f;
-    const Row& row = RowAt(index);
+    if (!Words::Has(index)) return -1.0f;
+    const Row& row = Words::RowAt(index);
     return row.map.Normalised(row.decimals > 0 ? ParseSteps(text, row.step) : ParseTenthsOfDb(text, kSilent));
 }
 
 void Chorus::GetParamSectionInfo(int index, PluginParameterInfo& info) {
-    if (!Has(index)) return;
+    if (!Words::Has(index)) return;
     info = {};
     info.param_index = index;
-    info.label = Narrow(RowAt(index).label);
+    info.label = Narrow(Words::RowAt(index).label);
 }
 
 void Chorus::InitializeXyEditingData(GenericUIData& data) {
@@ -161,39 +143,24 @@ void Chorus::InitializeXyEditingData(GenericUIData& data) {
     }
 }
 
-std::string Chorus::GetPresetName(int preset) {
-    return HasPreset(preset) ? kPresets[static_cast<std::size_t>(preset)].name : std::string();
-}
+std::string Chorus::GetPresetName(int preset) { return Words::PresetName(preset); }
 
 void Chorus::SetPreset(int preset) {
-    if (!HasPreset(preset)) return;
-    Assign(m_settings, kPresets[static_cast<std::size_t>(preset)].settings);
-    m_cook.store(true, std::memory_order_release);
+    if (Words::TakePreset(m_settings, preset)) m_cook.store(true, std::memory_order_release);
 }
 
 void Chorus::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    const auto settings = Snapshot(m_settings);
-    ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && VisitWords(write, settings);
+    SettingsChunk::Write(chunk, m_chunk_tag, m_settings);
 }
 
 void Chorus::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kChunkSize) return;
-    ChunkReader read(chunk);
-    Props settings;
-    read(m_chunk_tag) && VisitWords(read, settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
+    if (SettingsChunk::Read(chunk, m_chunk_tag, m_settings)) m_cook.store(true, std::memory_order_release);
 }
 
 bool Chorus::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kOldChunkSize) return false;
-    ChunkReader read(chunk);
-    Props settings;
-    read(m_chunk_tag) && VisitWords(SpreadWordReader(read), settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
-    return true;
+    const bool fits = SettingsChunk::ReadOld(chunk, m_chunk_tag, m_settings);
+    if (fits) m_cook.store(true, std::memory_order_release);
+    return fits;
 }
 
 void Chorus::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {

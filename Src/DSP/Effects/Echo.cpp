@@ -13,8 +13,8 @@
 #include "DSP/Effects/ParameterTable.h"
 #include "DSP/Effects/ParameterText.h"
 #include "DSP/Effects/SampleDispatch.h"
-#include "DSP/Effects/SettingsChunk.h"
 #include "DSP/Effects/SharedRecord.h"
+#include "DSP/Effects/WordChunk.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -62,9 +62,6 @@ constexpr double kLongestTimeMs = 10000.0, kLongestNoteMs = 60000.0;
 constexpr int kShortestDelay = 10;    // samples
 constexpr double kFastestHz = 768e3;  // bounds the memory for formats that nobody has
 
-constexpr int kOldWords = 22;
-constexpr std::size_t kChunkSize = 100, kChunkSizeWithoutMode = 92, kOldestChunkSize = 4 + 8 * kOldWords;
-
 bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
 bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kPresets.size()); }
 const Row& RowAt(int index) { return kRows[static_cast<std::size_t>(index)]; }
@@ -74,14 +71,15 @@ std::int32_t WordFromNumber(double number) {
 }
 
 // The words that were there before there were modes.
-bool VisitOldWords(auto&& visit, auto& s) {
+constexpr auto kVisitOldWords = [](auto&& visit, auto& s) {
     return visit(s.decay) && visit(s.mix) && visit(s.depth) && visit(s.delayGain) && visit(s.reserved) &&
            visit(s.outGain) && visit(s.reserved2);
-}
-
-bool VisitWords(auto&& visit, auto& s) {
-    return VisitOldWords(visit, s) && visit(s.mode) && visit(s.modeCopy);
-}
+};
+constexpr auto kVisitWords = [](auto&& visit, auto& s) {
+    return kVisitOldWords(visit, s) && visit(s.mode) && visit(s.modeCopy);
+};
+using SettingsChunk = WordChunk<Props, kVisitWords>;
+using ChunkWithoutMode = WordChunk<Props, kVisitOldWords, sizeof(Props) / 4 - 2>;
 
 }  // namespace
 
@@ -91,7 +89,7 @@ Echo::~Echo() = default;
 int Echo::Sides() const { return m_format.nChannels >= 2 ? 2 : 1; }
 
 int Echo::GetParamCountReal() { return static_cast<int>(kRows.size()); }
-int Echo::GetSettingsChunkSize() { return kChunkSize; }
+int Echo::GetSettingsChunkSize() { return SettingsChunk::kSize; }
 int Echo::NumPresets() { return static_cast<int>(kPresets.size()); }
 std::string Echo::GetName() { return "Echo"; }
 std::string Echo::GetImage() { return "builtinEcho.png"; }
@@ -237,31 +235,20 @@ void Echo::SetPreset(int preset) {
 }
 
 void Echo::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    const auto settings = Snapshot(m_settings);
-    ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && VisitWords(write, settings);
+    SettingsChunk::Write(chunk, m_chunk_tag, m_settings);
 }
 
 void Echo::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    const bool withoutMode = chunk.size() == kChunkSizeWithoutMode;
-    if (chunk.size() < kChunkSize && !withoutMode) return;
-    ChunkReader read(chunk);
-    Props settings{};
-    read(m_chunk_tag);
-    withoutMode ? VisitOldWords(read, settings) : VisitWords(read, settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
+    const bool taken = chunk.size() == ChunkWithoutMode::kSize
+                           ? ChunkWithoutMode::Read(chunk, m_chunk_tag, m_settings)
+                           : SettingsChunk::Read(chunk, m_chunk_tag, m_settings);
+    if (taken) m_cook.store(true, std::memory_order_release);
 }
 
 bool Echo::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kOldestChunkSize) return false;
-    ChunkReader read(chunk);
-    Props settings{};
-    read(m_chunk_tag);
-    VisitOldWords(SpreadWordReader(read), settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
-    return true;
+    const bool fits = ChunkWithoutMode::ReadOld(chunk, m_chunk_tag, m_settings);
+    if (fits) m_cook.store(true, std::memory_order_release);
+    return fits;
 }
 
 void Echo::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {

@@ -10,8 +10,8 @@
 #include "DSP/Effects/PhaserKernel.h"
 #include "DSP/Effects/PhaserPresets.h"
 #include "DSP/Effects/SampleDispatch.h"
-#include "DSP/Effects/SettingsChunk.h"
 #include "DSP/Effects/SharedRecord.h"
+#include "DSP/Effects/WordChunk.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -40,7 +40,6 @@ constexpr std::array<Row, 6> kRows{{
 constexpr int kStages = static_cast<int>(kRows.size()), kCount = kStages + 1;
 
 constexpr std::int32_t kChunkVersion = 1;
-constexpr std::size_t kChunkSize = sizeof(kChunkVersion) + sizeof(PhaserSettings);
 constexpr double kRateHz = 6.0;
 
 bool Has(int index) { return index >= 0 && index < kCount; }
@@ -76,10 +75,11 @@ float NormalisedOf(const PhaserSettings& settings, int index) {
     return Inverse([&row](float n) { return n * row.span; }, value, value / row.span);
 }
 
-bool VisitSettings(auto&& visit, auto& s) {
+constexpr auto kVisitSettings = [](auto&& visit, auto& s) {
     return visit(s.rate) && visit(s.feedback) && visit(s.wet) && visit(s.maximum) && visit(s.minimum) &&
            visit(s.width) && visit(s.stages);
-}
+};
+using SettingsChunk = WordChunk<PhaserSettings, kVisitSettings>;
 
 }  // namespace
 
@@ -92,7 +92,7 @@ Phaser::~Phaser() = default;
 bool Phaser::HasSeparateLeftRightSettings() { return false; }
 bool Phaser::SupportsNoninterleaved() { return true; }
 int Phaser::GetParamCountReal() { return kCount; }
-int Phaser::GetSettingsChunkSize() { return kChunkSize; }
+int Phaser::GetSettingsChunkSize() { return SettingsChunk::kSize; }
 int Phaser::NumPresets() { return static_cast<int>(kPresets.size()); }
 std::string Phaser::GetName() { return "Phaser"; }
 std::string Phaser::GetImage() { return "builtinPhaser.png"; }
@@ -172,25 +172,17 @@ std::string Phaser::GetPresetName(int preset) {
 
 void Phaser::SetPreset(int preset) {
     if (!HasPreset(preset)) return;
-    std::vector<std::uint8_t> chunk;
-    ChunkWriter write(chunk, kChunkSize);
-    write(kChunkVersion) && VisitSettings(write, kPresets[static_cast<std::size_t>(preset)].settings);
-    SetSettingsChunk(chunk);
+    Assign(m_settings, kPresets[static_cast<std::size_t>(preset)].settings);
+    m_cook.store(true, std::memory_order_release);
 }
 
 void Phaser::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    const auto settings = Snapshot(m_settings);
-    ChunkWriter write(chunk, kChunkSize);
-    write(kChunkVersion) && VisitSettings(write, settings);
+    SettingsChunk::Write(chunk, kChunkVersion, m_settings);
 }
 
 void Phaser::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kChunkSize) return;
-    ChunkReader read(chunk);
-    PhaserSettings settings;
-    read.Skip(sizeof(kChunkVersion)) && VisitSettings(read, settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
+    std::int32_t version;
+    if (SettingsChunk::Read(chunk, version, m_settings)) m_cook.store(true, std::memory_order_release);
 }
 
 void Phaser::Cleanup() {

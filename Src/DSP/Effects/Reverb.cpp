@@ -5,14 +5,15 @@
 #include <utility>
 
 #include "DSP/Effects/FixedPoint.h"
+#include "DSP/Effects/PairedWords.h"
 #include "DSP/Effects/ParameterTable.h"
 #include "DSP/Effects/ParameterText.h"
 #include "DSP/Effects/ReverbDesign.h"
 #include "DSP/Effects/ReverbEngine.h"
 #include "DSP/Effects/ReverbPresets.h"
 #include "DSP/Effects/SampleDispatch.h"
-#include "DSP/Effects/SettingsChunk.h"
 #include "DSP/Effects/SharedRecord.h"
+#include "DSP/Effects/WordChunk.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -54,15 +55,11 @@ constexpr std::array<Row, 16> kRows{{
 // clang-format on
 
 constexpr std::int32_t kSilentTenths = -450;
-constexpr std::size_t kWords = sizeof(Props) / 4, kChunkSize = 4 + 4 * kWords, kOldChunkSize = 4 + 8 * kWords;
 constexpr double kFastestHz = 768e3;  // bounds the memory for formats that nobody has
 
-bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
-bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kPresets.size()); }
-const Row& RowAt(int index) { return kRows[static_cast<std::size_t>(index)]; }
-const auto& PresetAt(int preset) { return kPresets[static_cast<std::size_t>(preset)]; }
+using Words = PairedWords<kRows, kPresets>;
 // External indices run backwards, and so does this map the other way.
-int Real(int external) { return static_cast<int>(kRows.size()) - 1 - external; }
+int Real(int external) { return Words::kCount - 1 - external; }
 
 int Sides(const tWAVEFORMATEX& format) {
     return std::min<int>(format.nChannels, CorvoEffectBase::MaxNumChannels);
@@ -71,11 +68,12 @@ double Rate(const tWAVEFORMATEX& format) {
     return std::min(static_cast<double>(format.nSamplesPerSec), kFastestHz);
 }
 
-bool VisitWords(auto&& visit, auto& s) {
+constexpr auto kVisitWords = [](auto&& visit, auto& s) {
     return visit(s.preDelay) && visit(s.mix) && visit(s.length) && visit(s.wet) && visit(s.dry) &&
            visit(s.damping) && visit(s.reflections) && visit(s.room) && visit(s.reserved) &&
            visit(s.filterOff);
-}
+};
+using SettingsChunk = WordChunk<Props, kVisitWords>;
 
 }  // namespace
 
@@ -94,9 +92,9 @@ Reverb::Reverb() : m_engines(std::make_unique<Engines>()) {
 Reverb::~Reverb() = default;
 
 bool Reverb::SupportsNoninterleaved() { return true; }
-int Reverb::GetParamCountReal() { return static_cast<int>(kRows.size()); }
-int Reverb::GetSettingsChunkSize() { return kChunkSize; }
-int Reverb::NumPresets() { return static_cast<int>(kPresets.size()); }
+int Reverb::GetParamCountReal() { return Words::kCount; }
+int Reverb::GetSettingsChunkSize() { return SettingsChunk::kSize; }
+int Reverb::NumPresets() { return Words::kPresetCount; }
 std::string Reverb::GetName() { return "Reverb"; }
 std::string Reverb::GetImage() { return "builtinReverb.png"; }
 std::string Reverb::GetPluginIconPath() { return "BuiltinPlugins/Reverb@3x.png"; }
@@ -107,34 +105,19 @@ const MP_PARAMINFO* Reverb::GetParametersInfo() {
 }
 
 bool Reverb::DoSetParam(int index, float normalised, bool) {
-    if (Has(index)) {
-        const Row& row = RowAt(index);
-        StoreShared((m_settings.*row.field)[row.side], row.map.Word(normalised));
-    }
+    Words::Set(m_settings, index, normalised);
     return true;
 }
 
-float Reverb::GetParamPlain(int index) const {
-    if (!Has(index)) return 0.0f;
-    const Row& row = RowAt(index);
-    return static_cast<float>(LoadShared((m_settings.*row.field)[row.side]));
-}
-
+float Reverb::GetParamPlain(int index) const { return Words::Plain(m_settings, index); }
 float Reverb::GetParam(int index) {
-    if (!Has(index)) return 0.0f;
-    const Row& row = RowAt(Real(index));
-    return row.map.Normalised(LoadShared((m_settings.*row.field)[row.side]));
+    return Words::Has(index) ? Words::Normalised(m_settings, Real(index)) : 0.0f;
 }
-
-float Reverb::GetParamFromProp(int index, int preset) {
-    if (!Has(index) || !HasPreset(preset)) return -1.0f;
-    const Row& row = RowAt(index);
-    return row.map.Normalised((PresetAt(preset).settings.*row.field)[row.side]);
-}
+float Reverb::GetParamFromProp(int index, int preset) { return Words::InPreset(index, preset); }
 
 std::wstring Reverb::GetParameterFormattedText(int index, double value) {
-    if (!Has(index)) return {};
-    const Row& row = RowAt(Real(index));
+    if (!Words::Has(index)) return {};
+    const Row& row = Words::RowAt(Real(index));
     const auto word = row.map.Word(static_cast<float>(value));
     return WithUnit(row.shownStep > 0.0 ? FormatFixed(word * row.shownStep, row.decimals)
                                         : FormatTenthsOfDb(word, kSilentTenths),
@@ -142,53 +125,38 @@ std::wstring Reverb::GetParameterFormattedText(int index, double value) {
 }
 
 float Reverb::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Has(index)) return -1.0f;
-    const Row& row = RowAt(Real(index));
+    if (!Words::Has(index)) return -1.0f;
+    const Row& row = Words::RowAt(Real(index));
     if (!(row.shownStep > 0.0)) return row.map.Normalised(ParseTenthsOfDb(text, kSilentTenths));
     const double word = ParseNumber(text) / row.shownStep;
     return row.map.Normalised(static_cast<std::int32_t>(std::lround(word > 0.0 ? std::min(word, 1e6) : 0.0)));
 }
 
 void Reverb::GetParamSectionInfo(int index, PluginParameterInfo& info) {
-    if (!Has(index)) return;
+    if (!Words::Has(index)) return;
     info = {};
     info.param_index = Real(index);
     info.label = Narrow(GetParamName(index));
 }
 
-std::string Reverb::GetPresetName(int preset) {
-    return HasPreset(preset) ? PresetAt(preset).name : std::string();
-}
+std::string Reverb::GetPresetName(int preset) { return Words::PresetName(preset); }
 
 void Reverb::SetPreset(int preset) {
-    if (!HasPreset(preset)) return;
-    Assign(m_settings, PresetAt(preset).settings);
-    m_cook.store(true, std::memory_order_release);
+    if (Words::TakePreset(m_settings, preset)) m_cook.store(true, std::memory_order_release);
 }
 
 void Reverb::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    const auto settings = Snapshot(m_settings);
-    ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && VisitWords(write, settings);
+    SettingsChunk::Write(chunk, m_chunk_tag, m_settings);
 }
 
 void Reverb::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kChunkSize) return;
-    ChunkReader read(chunk);
-    Props settings{};
-    read(m_chunk_tag) && VisitWords(read, settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
+    if (SettingsChunk::Read(chunk, m_chunk_tag, m_settings)) m_cook.store(true, std::memory_order_release);
 }
 
 bool Reverb::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    if (chunk.size() < kOldChunkSize) return false;
-    ChunkReader read(chunk);
-    Props settings{};
-    read(m_chunk_tag) && VisitWords(SpreadWordReader(read), settings);
-    Assign(m_settings, settings);
-    m_cook.store(true, std::memory_order_release);
-    return true;
+    const bool fits = SettingsChunk::ReadOld(chunk, m_chunk_tag, m_settings);
+    if (fits) m_cook.store(true, std::memory_order_release);
+    return fits;
 }
 
 void Reverb::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
