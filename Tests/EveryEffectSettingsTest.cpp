@@ -81,17 +81,24 @@ TEST_P(EveryEffectSettings, SavesAndLoadsEverySetting) {
     }
 }
 
-// Catches trust in bytes from outside.
+// Catches trust in bytes from outside, and settings that are half loaded.
 TEST_P(EveryEffectSettings, SurvivesAnyChunk) {
     const auto effect = Make();
     const auto format = Format<float>();
     effect->InitProcessing(64, &format);
     const auto good = Chunk(*effect);
     const std::size_t stride = std::max<std::size_t>(1, good.size() / 200);
-    for (std::size_t length = 0; length < good.size(); length += stride)
-        ExpectHarmless(*effect, Bytes(good.begin(), good.begin() + static_cast<std::ptrdiff_t>(length)),
-                       "cut at " + std::to_string(length));
     Random random(5);
+    const auto donor = Make();
+    SetAllParams(*donor, random);
+    const auto whole = Chunk(*donor);
+    for (std::size_t length = 0; length < whole.size(); length += stride) {
+        ExpectHarmless(*effect, Bytes(whole.begin(), whole.begin() + static_cast<std::ptrdiff_t>(length)),
+                       "cut at " + std::to_string(length));
+        if (length < GetParam().shortestChunk) {
+            ASSERT_EQ(Chunk(*effect), good) << "half loaded, cut at " << length;
+        }
+    }
     for (int round = 0; round < 60; ++round) {
         Bytes bytes(round % 3 == 0 ? good.size() : static_cast<std::size_t>(random.Below(400)));
         for (auto& byte : bytes) byte = static_cast<std::uint8_t>(random.Next());

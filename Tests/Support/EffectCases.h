@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <memory>
 #include <span>
 #include <string>
@@ -37,6 +38,8 @@ struct EffectCase {
     bool mayGrow = false;
     // Parameters that move together on purpose: setting a parameter may change others of its group.
     bool linkedParameters = false;
+    // The shortest older layout that is still taken, in bytes; below it, and below today's, nothing changes.
+    std::size_t shortestChunk = SIZE_MAX;
     // Parameters are kept as plain floats rather than words, so a round trip may be off by a rounding.
     bool plainFloats = false;
     // A new instance holds an empty record; the host loads a preset or a chunk first.

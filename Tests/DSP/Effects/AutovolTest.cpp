@@ -13,18 +13,13 @@ using TestSupport::Render;
 
 namespace {
 
-enum { kDepth, kRate = 2, kMix = 4, kOutGain = 6, kInvert = 8, kCount = 10 };
+enum { kDepth, kRate = 2, kMix = 4, kOutGain = 6, kInvert = 8 };
 enum Preset { kAutoVol, kLeftPhaseShift, kHardPan = 3, kPedal = 6, kRobot = 7 };
 
 // What the effect makes of a constant 1: the factor itself, frame by frame.
 std::vector<double> Factors(Autovol& tremolo, std::size_t frames, int channels = 1) {
     return Render(tremolo, std::vector<double>(frames * static_cast<std::size_t>(channels), 1.0),
                   Format<double>(channels), {512});
-}
-
-void PutWord(std::vector<std::uint8_t>& chunk, std::size_t at, std::int32_t word) {
-    for (std::size_t i = 0; i < 4; ++i)
-        chunk[at + i] = static_cast<std::uint8_t>(static_cast<std::uint32_t>(word) >> (8 * i));
 }
 
 // Each side against the definition, over blocks that fill no piece of the oscillator.
@@ -161,29 +156,4 @@ TEST(Autovol, ShowsItsValues) {
     ASSERT_EQ(data.groups.size(), 2u);
     EXPECT_EQ(data.groups[1].x_axis, (std::vector{kDepth + 1, kRate + 1}));
     EXPECT_EQ(data.groups[1].y_axis, (std::vector{kMix + 1, kOutGain + 1}));
-}
-
-// Catches words of the layouts in the wrong places, and chunks that are half loaded.
-TEST(Autovol, ReadsBothLayouts) {
-    std::vector<std::uint8_t> current(92), old(180);
-    for (std::size_t word = 0; word < 22; ++word) {
-        PutWord(current, 4 + 4 * word, static_cast<std::int32_t>(word) - 3);
-        PutWord(old, 4 + 8 * word, static_cast<std::int32_t>(word) - 3);
-        PutWord(old, 8 + 8 * word, -1);
-    }
-    PutWord(current, 0, 77);
-    PutWord(old, 0, 77);
-    Autovol fromOld, fromCurrent;
-    const auto fresh = TestSupport::Chunk(fromOld);
-    EXPECT_FALSE(fromOld.FitsOldChunk({old.begin(), old.end() - 1}));
-    fromCurrent.SetSettingsChunk({current.begin(), current.end() - 1});
-    EXPECT_EQ(TestSupport::Chunk(fromOld), fresh);
-    EXPECT_EQ(TestSupport::Chunk(fromCurrent), fresh);
-    EXPECT_TRUE(fromOld.FitsOldChunk(old));
-    fromCurrent.SetSettingsChunk(current);
-    EXPECT_EQ(TestSupport::Chunk(fromOld), current);
-    EXPECT_EQ(TestSupport::Chunk(fromCurrent), current);
-    const int words[kCount] = {0, 1, 4, 5, 2, 3, 18, 19, 8, 9};
-    for (int index = 0; index < kCount; ++index)
-        EXPECT_EQ(fromCurrent.GetParamPlain(index), static_cast<float>(words[index] - 3)) << index;
 }

@@ -100,18 +100,14 @@ TEST(GainEfx, ReadsTexts) {
     EXPECT_FLOAT_EQ(gain.GetParamValueNormalizedFromText(kGain, "40 dB"), 1.0f);
     EXPECT_FLOAT_EQ(gain.GetParamValueNormalizedFromText(kGain, "-Inf. dB"), 0.0f);
     EXPECT_FLOAT_EQ(gain.GetParamValueNormalizedFromText(kPan, " -0.5"), 0.25f);
-    try {
-        gain.GetParamValueNormalizedFromText(kGain, "loud");
-        FAIL();
-    } catch (const std::invalid_argument& error) {
-        EXPECT_STREQ(error.what(), "invalid stof argument");
-    }
-    try {
-        gain.GetParamValueNormalizedFromText(kGain, "1e99");
-        FAIL();
-    } catch (const std::out_of_range& error) {
-        EXPECT_STREQ(error.what(), "stof argument out of range");
-    }
+    for (const auto& [text, message] :
+         {std::pair{"loud", "invalid stof argument"}, std::pair{"1e99", "stof argument out of range"}})
+        try {
+            gain.GetParamValueNormalizedFromText(kGain, text);
+            FAIL();
+        } catch (const std::logic_error& error) {
+            EXPECT_STREQ(error.what(), message);
+        }
 }
 
 // Catches lanes that are swapped or rounded differently, and the frames that fill no register.

@@ -254,24 +254,3 @@ TEST(Reverb, ShowsAndReadsItsTextsBackwards) {
     EXPECT_EQ(reverb.GetParam(15), 1.0f);
     EXPECT_EQ(reverb.GetPresetValues(16)[15], 903.0f / 2000.0f);
 }
-
-// Catches a layout read from the wrong offset, or half.
-TEST(Reverb, ReadsItsOldLayout) {
-    Reverb reverb;
-    reverb.SetPreset(16);
-    const auto chunk = Chunk(reverb);
-    std::vector<std::uint8_t> old(chunk.begin(), chunk.begin() + 4);
-    for (std::size_t at = 4; at < chunk.size(); at += 4) {
-        old.insert(old.end(), chunk.begin() + static_cast<std::ptrdiff_t>(at),
-                   chunk.begin() + static_cast<std::ptrdiff_t>(at + 4));
-        old.insert(old.end(), 4, 0xEE);
-    }
-    ASSERT_EQ(old.size(), 148u);
-    Reverb other;
-    EXPECT_TRUE(other.FitsOldChunk(old));
-    EXPECT_EQ(Chunk(other), chunk);
-    old.pop_back();
-    other.SetPreset(0);
-    EXPECT_FALSE(other.FitsOldChunk(old));
-    EXPECT_EQ(Settings(other).length[0], 2836);
-}

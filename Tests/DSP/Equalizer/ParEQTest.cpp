@@ -110,30 +110,6 @@ TEST(ParEQ, LiftsASineByThePeaksHeight) {
     EXPECT_NEAR(std::abs(eq.GetResponse(0, centre, kRate, &data) + gain), 0.0, 1e-9);
 }
 
-// At 0 Hz a low shelf is its boost, so the output shows the glide: the first step covers 0.09 % of the way
-// between the coefficients, and in the end all of it.
-TEST(ParEQ, GlidesAfterASmoothCookAndJumpsOtherwise) {
-    const auto run = [](bool smooth, bool wasBypassed) {
-        auto data = Bands({{EQ_HIGHPASS, 1000, 0, 50}});
-        data.SetBypass(0, wasBypassed);
-        ParEQ eq;
-        eq.Cook(false, false, &data, 48000, 1);
-        data.SetBypass(0, false);
-        data.SetEqBoost(0, 60);
-        eq.Cook(smooth, false, &data, 48000, 1);
-        double impulse = 1.0;
-        eq.Process(&impulse, 1, 1, false, &data);
-        return impulse;  // the first b0
-    };
-    coeff<SmoothCoefficient> before, after;
-    CalcolaCoefficientiBiquad(EQ_HIGHPASS, 1.0, 1000, 50, &before, 48000, true);
-    CalcolaCoefficientiBiquad(EQ_HIGHPASS, std::pow(10.0, 0.3), 1000, 50, &after, 48000, true);
-    const double b0 = before.b0.value, target = after.b0.value;
-    EXPECT_DOUBLE_EQ(run(true, false), b0 + 0.0009 * (target - b0));
-    EXPECT_DOUBLE_EQ(run(true, true), target) << "was inactive";
-    EXPECT_DOUBLE_EQ(run(false, false), target);
-}
-
 TEST(ParEQ, StaysBoundedWhateverTheRecordSays) {
     constexpr int kMost = std::numeric_limits<int>::max();
     for (int type = 0; type < 8; ++type)
