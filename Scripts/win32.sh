@@ -73,6 +73,9 @@ try_package() {
     Scripts/win32-wine.sh "$programs/dsphost.exe" "${render[@]}" loop.wav there.wav
     cmp "$unpacked/here.wav" "$programs/there.wav"
     echo "dsphost.exe rendered the same $(stat -c %s "$unpacked/here.wav") bytes as the native host"
+    Scripts/win32-wine.sh "$programs/dsphost.exe" sonogram -q -y loop.wav picture.png --spectrum
+    cmp -n 8 "$programs/picture.png" <(printf '\x89PNG\r\n\x1a\n')
+    echo "dsphost.exe drew a picture of $(stat -c %s "$programs/picture.png") bytes"
 }
 
 part "tests under Wine" test_program dsp_tests

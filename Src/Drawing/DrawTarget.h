@@ -35,7 +35,7 @@ constexpr float kCapHeight = 0.7f;
 //
 // A target stands for one surface while one picture is drawn. Coordinates are device pixels, x to the right,
 // y down; whole numbers are pixel edges. Edges are smoothed, and what lies outside the clip is left alone.
-// Text is UTF-8 without line breaks, cut after the last whole character of 55 bytes; `size` is its em in
+// Text is UTF-8 without line breaks, cut after the last whole character of 95 bytes; `size` is its em in
 // pixels. A size, width or rectangle that is empty or not a number draws nothing.
 //
 //   Scale()              pixels per 1/96 inch

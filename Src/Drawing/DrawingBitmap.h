@@ -1,6 +1,7 @@
 #pragma once
 
 #include <algorithm>
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <vector>
@@ -10,7 +11,7 @@ namespace Corvo {
 // A picture in memory that any back-end can draw.
 //
 // One 32-bit word per pixel, 0xAARRGGBB in the machine's byte order with the colours already multiplied by
-// the alpha; rows from the top down, none padded. Whoever changes pixels or size counts `version` up, so that
+// the alpha; rows from the top down, none padded. Whoever changes pixels calls Changed(), so that
 // a back-end which keeps a copy of its own knows when it is stale. No locks: one thread at a time.
 struct DrawingBitmap {
     // 256 MiB, more than any screen: what a request beyond it is cut to.
@@ -31,12 +32,18 @@ struct DrawingBitmap {
         pixels.resize(static_cast<std::size_t>(newWidth) * static_cast<std::size_t>(newHeight));
         width = newWidth;
         height = newHeight;
-        ++version;
+        Changed();
     }
 
     static constexpr int LimitedWidth(int width) { return std::clamp(width, 0, kLargestSide); }
     static constexpr int LimitedHeight(int width, int height) {
         return std::clamp(height, 0, std::min(kLargestSide, kMostPixels / std::max(LimitedWidth(width), 1)));
+    }
+
+    // No two states of any bitmaps get the same number.
+    void Changed() {
+        static std::atomic<std::uint32_t> latest{0};
+        version = latest.fetch_add(1, std::memory_order_relaxed) + 1;
     }
 
     bool IsEmpty() const { return pixels.empty(); }

@@ -65,7 +65,7 @@ bool AddPath(cairo_t* context, const PointF* points, int count) {
 struct DrawingCairo::Resources {
     SlotCache<InkKey, DrawingBrush, 32> brushes;
     SlotCache<StrokeKey, DrawingPen*, 32> pens;
-    SlotCache<TextKey, LaidOutText, 96> texts;
+    SlotCache<TextKey, LaidOutText, 192> texts;
     PangoContext* textContext = MakeTextContext();
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
 

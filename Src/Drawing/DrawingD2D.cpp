@@ -100,7 +100,7 @@ struct DrawingD2D::Resources {
     const TypefaceDirectWrite typeface;
     SlotCache<InkKey, DrawingBrush, 32> brushes;
     SlotCache<StrokeKey, DrawingPen*, 32> pens;
-    SlotCache<TextKey, D2DText, 96> texts;
+    SlotCache<TextKey, D2DText, 192> texts;
     SlotCache<const DrawingBitmap*, D2DBitmap, 48> bitmaps;
     UsablePoints<D2D1_POINT_2F> points;
 

@@ -51,7 +51,7 @@ struct DrawingGdiPlus::Resources {
     SlotCache<InkKey, DrawingBrush, 32> brushes;
     SlotCache<StrokeKey, DrawingPen*, 32> pens;
     SlotCache<float, Gdiplus::Font*, 16> fonts;
-    SlotCache<TextKey, GdiPlusText, 96> texts;
+    SlotCache<TextKey, GdiPlusText, 192> texts;
     UsablePoints<Gdiplus::PointF> points;
     std::vector<unsigned> states;  // memory that one target leaves to the next
 

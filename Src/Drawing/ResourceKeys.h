@@ -25,7 +25,7 @@ struct StrokeKey {
 };
 
 struct TextKey {
-    static constexpr std::size_t kMostBytes = 55;
+    static constexpr std::size_t kMostBytes = 95;
 
     std::array<char, kMostBytes + 1> text{};
     float size = 0.0f;

@@ -23,7 +23,7 @@ public:
     ShortText& AddNoteName(int semitone);
 
 private:
-    std::array<char, 96> m_text{};
+    std::array<char, 95> m_text{};  // as long as a back-end draws
     std::size_t m_length = 0;
 };
 

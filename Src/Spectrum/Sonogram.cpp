@@ -136,7 +136,7 @@ void Sonogram::Recolour(float oldRange) {
         pixels[level] = m_pixels[static_cast<std::size_t>(ShadeOf((share - 1.0f) * oldRange))];
     }
     for (std::uint32_t& pixel : m_bitmap.pixels) pixel = pixels[pixel >> 24];
-    ++m_bitmap.version;
+    m_bitmap.Changed();
 }
 
 void Sonogram::CheckPixelBufferSize(const RectF& rectangle, int rows) {
@@ -168,7 +168,7 @@ void Sonogram::Reshape(int width, const SonogramAxis& axis) {
     for (int x = 0; x < kept; ++x)
         pitches[static_cast<std::size_t>(added + x)] = GetPitch(m_bitmap.width - kept + x);
 
-    reshaped.version = m_bitmap.version + 1;
+    reshaped.Changed();
     m_bitmap = std::move(reshaped);
     m_pitches = std::move(pitches);
     m_oldestPitch = 0;
@@ -213,7 +213,7 @@ void Sonogram::ScrollPixels(int columns) {
     const auto moved = static_cast<std::size_t>(std::clamp(columns, 1, m_bitmap.width));
     std::uint32_t* const pixels = m_bitmap.pixels.data();
     std::memmove(pixels, pixels + moved, (m_bitmap.pixels.size() - moved) * sizeof *pixels);
-    ++m_bitmap.version;
+    m_bitmap.Changed();
 }
 
 // Counted from the last column, which is the newest spectrum exactly.
@@ -251,7 +251,7 @@ int Sonogram::GetColumnHeight() const { return m_newest->Height(); }
 void Sonogram::Clear() {
     std::fill(m_bitmap.pixels.begin(), m_bitmap.pixels.end(), m_pixels[0]);
     std::fill(m_pitches.begin(), m_pitches.end(), kSilent);
-    ++m_bitmap.version;
+    m_bitmap.Changed();
     ClearColumn();
 }
 
@@ -281,7 +281,7 @@ const DrawingBitmap& Sonogram::PrepareIntensityScale(int width, int height) {
         const float share = 1.0f - static_cast<float>(y) / static_cast<float>(std::max(bar.height - 1, 1));
         std::fill_n(bar.Row(y), bar.width, kFullLevel << 24 | ColourAt(*palette, share));
     }
-    ++bar.version;
+    bar.Changed();
     return bar;
 }
 

@@ -20,7 +20,7 @@ template <typename Distance>
 void Fill(DrawingBitmap& bitmap, int width, int height, std::uint32_t rgb, Distance distance) {
     bitmap.Size(width, height);
     bitmap.opaque = false;
-    ++bitmap.version;
+    bitmap.Changed();
     for (int y = 0; y < bitmap.height; ++y)
         for (int x = 0; x < bitmap.width; ++x) {
             const float outside = distance(static_cast<float>(x) + 0.5f, static_cast<float>(y) + 0.5f);

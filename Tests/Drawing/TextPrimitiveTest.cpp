@@ -84,7 +84,7 @@ TYPED_TEST(TextPrimitive, IsMeasuredByItsAdvance) {
 
     std::string letters;
     for (int i = 0; i < 100; ++i) letters += "\xC3\xA9";
-    EXPECT_NEAR(this->WidthOf(letters.c_str(), 12.0f), 27.0f * this->WidthOf("\xC3\xA9", 12.0f), 14.0f);
+    EXPECT_NEAR(this->WidthOf(letters.c_str(), 12.0f), 47.0f * this->WidthOf("\xC3\xA9", 12.0f), 24.0f);
 }
 
 // Catches a typeface's file that stops the text when it is gone.
