@@ -78,11 +78,11 @@ TYPED_TEST(BitmapPrimitive, ShowsEveryVersion) {
     EXPECT_EQ(surface.Pixel(0, 0), 0x112233u);
     bitmap.pixels[0] = 0x00445566;
     bitmap.opaque = true;
-    ++bitmap.version;
+    bitmap.Changed();
     draw(1);
     EXPECT_EQ(surface.Pixel(0, 0), 0x445566u);
     bitmap.pixels[0] = 0x00778899;
-    ++bitmap.version;
+    bitmap.Changed();
     draw(1);
     EXPECT_EQ(surface.Pixel(0, 0), 0x778899u);
     bitmap.Size(2, 1);
