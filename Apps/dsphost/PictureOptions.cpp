@@ -1,8 +1,11 @@
 #include "PictureOptions.h"
 
 #include <algorithm>
+#include <array>
 #include <filesystem>
+#include <fstream>
 #include <iterator>
+#include <string_view>
 
 #include "Drawing/DrawingFont.h"
 #include "Errors.h"
@@ -36,6 +39,15 @@ std::vector<std::string> ViewNames() {
     return names;
 }
 
+// By the first bytes of the file.
+bool IsTypeface(const std::string& path) {
+    std::array<char, 4> tag{};
+    std::ifstream(path, std::ios::binary).read(tag.data(), tag.size());
+    const std::string_view found(tag.data(), tag.size());
+    using namespace std::string_view_literals;
+    return found == "\0\1\0\0"sv || found == "OTTO"sv || found == "true"sv || found == "ttcf"sv;
+}
+
 // "1280x720".
 std::pair<int, int> Sides(const std::string& text) {
     const auto cross = std::min(text.find_first_of("xX"), text.size());
@@ -66,6 +78,8 @@ std::unique_ptr<Picture> PictureOptions::Make(int narrower) const {
         throw UserError("--dpi cannot be " + std::to_string(dpi) + "; accepted: 24 to 960");
     if (!font.empty() && !std::filesystem::is_regular_file(font))
         throw UserError("--font: there is no file \"" + font + "\"");
+    if (!font.empty() && !IsTypeface(font))
+        throw UserError("--font: \"" + font + "\" is no TrueType or OpenType font");
     Corvo::DrawingFont::SetFile(font);
     return std::make_unique<Picture>(width, height, dpi);
 }

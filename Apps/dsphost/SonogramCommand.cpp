@@ -1,6 +1,7 @@
 #include <algorithm>
 #include <cmath>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "AudioReader.h"
@@ -15,15 +16,12 @@
 namespace dsphost {
 namespace {
 
-constexpr int kMostChannels = 64;
 constexpr int kSlowest = 0, kFastest = 8, kLastScheme = 6;
-constexpr int kChooseSpeed = -1;
-// A new spectrum at every refresh, whatever the rate.
-constexpr float kOverlap = 0.98f;
 
 struct Arguments {
     std::string input, output;
-    int scheme = 0, speed = kChooseSpeed;
+    int scheme = 0;
+    std::optional<int> speed;
     bool spectrum = false, pitch = false;
     PictureOptions drawing;
     WritingOptions writing;
@@ -49,15 +47,15 @@ int SpeedFor(const AudioReader& input, int columns) {
 
 // How many columns a file shorter than the picture leaves empty; some stay for the picture's sake.
 int SpareColumns(const AudioReader& input, int columns) {
-    constexpr int kLeastColumns = 480;
+    constexpr double kLeastColumns = 480;
     if (!input.Frames()) return 0;
     const double seconds = static_cast<double>(*input.Frames()) / input.Rate();
     const double needed = std::ceil(seconds * Corvo::Sonogram::GetColumnsPerSecond());
-    return std::max(columns - static_cast<int>(std::clamp<double>(needed, kLeastColumns, columns)), 0);
+    return std::max(columns - static_cast<int>(std::min(std::max(needed, kLeastColumns), 1.0 * columns)), 0);
 }
 
 void Run(Arguments arguments) {
-    if (arguments.speed != kChooseSpeed) Check(arguments.speed, kSlowest, kFastest, "--speed");
+    if (arguments.speed) Check(*arguments.speed, kSlowest, kFastest, "--speed");
     Check(arguments.scheme, 0, kLastScheme, "--scheme");
     arguments.writing.rules.inputs = {arguments.input};
     AudioReader input(arguments.input);
@@ -68,7 +66,7 @@ void Run(Arguments arguments) {
     analyser.set_parameters(input.Rate());
     analyser.SetOn(true);
     analyser.SetTunerOn(arguments.pitch);
-    kivspectrum::SetAnalysisWindowsOverlap(kOverlap);
+    kivspectrum::SetAnalysisWindowsOverlap(kDisplayOverlap);
     analyser.ObserverUpdate();
     arguments.drawing.ApplyTo(analyser);
     OutputFile output(arguments.output, arguments.writing.rules);
@@ -82,12 +80,14 @@ void Run(Arguments arguments) {
     };
     picture->Paint(draw);  // makes the sonogram as wide as it will be
     const int columns = analyser.GetSonogram()->GetBitmap().width;
-    Corvo::Sonogram::SetSpeedIndex(arguments.speed == kChooseSpeed ? SpeedFor(input, columns)
-                                                                   : arguments.speed);
+    Corvo::Sonogram::SetSpeedIndex(arguments.speed ? *arguments.speed : SpeedFor(input, columns));
     picture = arguments.drawing.Make(SpareColumns(input, columns));
     picture->Paint(draw);
-    PlayThrough(input, analyser, "sonogram", arguments.writing.quiet, [&](double) {
+    // The spectrum above would otherwise end in silence.
+    const bool toTheEnd = !arguments.spectrum;
+    PlayThrough(input, analyser, "sonogram", arguments.writing.quiet, toTheEnd, [&](double seconds) {
         analyser.Refresh();
+        analyser.GetSonogram()->SetTimeAtRightEdge(seconds);
         analyser.GetSpectrumDrawer()->AgePeaks();  // as drawing every refresh would
     });
     picture->Paint(draw);

@@ -11,6 +11,7 @@
 #include "Commands.h"
 #include "Errors.h"
 #include "PictureOptions.h"
+#include "Playback.h"
 #include "Progress.h"
 #include "Spectrum/PowerToDecibels.h"
 #include "Spectrum/SpectrumDrawer.h"
@@ -22,7 +23,6 @@
 namespace dsphost {
 namespace {
 
-constexpr int kMostChannels = 64;
 constexpr int kPeaksStay = 2;
 constexpr int kShortest = 128, kLongest = 524288;
 const std::vector<std::string> kWindows{"rectangular", "triangular", "hann", "hamming", "blackman"};
@@ -36,6 +36,8 @@ struct Arguments {
 };
 
 void Check(const Arguments& arguments) {
+    if (arguments.picture == "-" && arguments.csv == "-")
+        throw UserError("picture and table cannot both go to standard output");
     if (arguments.picture.empty() && arguments.csv.empty())
         throw UserError("an output is missing; accepted: a picture (OUT.png), --csv FILE, or both");
     if (arguments.length < kShortest || arguments.length > kLongest ||

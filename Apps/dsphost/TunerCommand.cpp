@@ -20,8 +20,6 @@
 namespace dsphost {
 namespace {
 
-constexpr int kMostChannels = 64;
-constexpr float kOverlap = 0.98f;  // a new spectrum at every refresh, whatever the rate
 const std::vector<std::string> kMethods{"denoised", "harmonic-product", "pseudo-harmonic-product", "legacy",
                                         "two-way-mismatch"};
 
@@ -46,8 +44,10 @@ struct Heard {
     int note, octave;
 };
 
+// Only what sounds: the panel shows a note for a while longer.
 Heard Hear(const Tuner& tuner, double seconds) {
-    return {seconds, tuner.GetFrequency(), tuner.GetErrorCents(), tuner.IsTuned() ? tuner.GetNote() : -1,
+    const bool sounds = tuner.IsTuned() && tuner.GetHeardFrequency() > 0.0;
+    return {seconds, tuner.GetFrequency(), tuner.GetErrorCents(), sounds ? tuner.GetNote() : -1,
             tuner.GetOctave()};
 }
 
@@ -102,16 +102,15 @@ public:
         m_analyser.SetOn(true);
         m_analyser.SetTunerOn(true);
         m_analyser.ObserverUpdate();
-        kivspectrum::SetAnalysisWindowsOverlap(kOverlap);
+        kivspectrum::SetAnalysisWindowsOverlap(kDisplayOverlap);
         m_analyser.ObserverUpdate();
     }
 
-    // each(seconds) at every refresh; the time is that of the window's middle.
+    // each(seconds) at every refresh.
     template <typename Each>
     void Play(Each each) {
-        const double half = kivspectrum::settings.window_length / 2.0 / m_input.Rate();
-        PlayThrough(m_input, m_analyser, "tuner", m_arguments.writing.quiet, [&](double seconds) {
-            if (m_analyser.Refresh() && seconds >= half) each(seconds - half);
+        PlayThrough(m_input, m_analyser, "tuner", m_arguments.writing.quiet, true, [&](double seconds) {
+            if (m_analyser.Refresh()) each(seconds);
         });
     }
     kivspectrum& Analyser() { return m_analyser; }
@@ -131,6 +130,8 @@ void Run(Arguments arguments) {
     const auto sensitivity = static_cast<int>(FindName(arguments.sensitivity, sensitivities, "sensitivity"));
     if (arguments.at && !(*arguments.at >= 0.0))
         throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; accepted: 0 seconds or more");
+    if (arguments.json && arguments.output == "-")
+        throw UserError("picture and notes cannot both go to standard output");
     const auto picture = arguments.drawing.Make();
     Listener listener(arguments);
     arguments.drawing.ApplyTo(listener.Analyser());
@@ -148,6 +149,8 @@ void Run(Arguments arguments) {
         all.push_back(Hear(*listener.Analyser().GetTuner(), seconds));
         if (moment.IsNow(all.back())) draw();
     });
+    if (!drawn && arguments.at)
+        throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; the file ends before");
     if (!drawn) draw();
     Save(*picture, output);
     if (arguments.json) Print(Json(all));

@@ -20,26 +20,32 @@ struct AxisTick {
     std::string_view Label() const { return text.data(); }
 };
 
-// The lines of a scale, lowest first.
+// The lines of a scale in its order. One label says what the unit is.
 class AxisTicks {
 public:
     std::span<const AxisTick> All() const { return {m_ticks.data(), m_count}; }
     // Lines beyond the 192nd are left out.
     void Add(double value, int rank, std::string_view label);
+    // Appends the unit to the label of the first or the last line that has one, and gives it rank 0.
+    void AddUnit(std::string_view unit, bool toTheLast);
 
 private:
     std::array<AxisTick, 192> m_ticks{};
     std::size_t m_count = 0;
 };
 
-// Along a frequency scale of `length` pixels. `unit` is the least distance between two lines, in pixels;
-// labelled ones of a linear scale are about ten times as far apart. With `noteNames` the lines are notes of
-// the scale on A = 440 Hz instead of round frequencies, as they are on the note scale.
-AxisTicks FrequencyTicks(const CoordinatesAndFrequencies& map, float length, float unit, bool noteNames);
-// Along the level scale; labelled lines are at least `labelHeight` pixels apart.
-AxisTicks LevelTicks(const CoordinatesAndFrequencies& map, float length, float labelHeight);
-// Every so many seconds from 0 back to -seconds.
-AxisTicks TimeTicks(double seconds, float length, float labelWidth);
+// What a scale has room for, in pixels: its length, the least distance between lines, and between labels.
+struct AxisRoom {
+    float length, line, label;
+};
+
+// With `noteNames` the lines are notes of the scale on A = 440 Hz instead of round frequencies, as they are
+// on the note scale.
+AxisTicks FrequencyTicks(const CoordinatesAndFrequencies& map, const AxisRoom& room, bool noteNames);
+// From the top down; the lowest level of a decibel scale is one of them.
+AxisTicks LevelTicks(const CoordinatesAndFrequencies& map, const AxisRoom& room);
+// Round times within the `seconds` before `last`.
+AxisTicks TimeTicks(double last, double seconds, const AxisRoom& room);
 
 // Keeps the labels of one scale apart: Take says whether from..to is free and within the scale, and takes it.
 class LabelRoom {

@@ -11,8 +11,8 @@ namespace Corvo::Look {
 // clang-format off
 constexpr ColourReference kGround     = ColourFromRgb(0x0E1116);
 constexpr ColourReference kPlot       = ColourFromRgb(0x12161D);
-constexpr ColourReference kGrid       = ColourFromRgb(0x2A323D);
-constexpr ColourReference kMinorGrid  = ColourFromRgb(0x1B2129);
+constexpr ColourReference kGrid       = ColourFromRgb(0x323C48);
+constexpr ColourReference kMinorGrid  = ColourFromRgb(0x222A33);
 constexpr ColourReference kLabel      = ColourFromRgb(0xA3AFBE);
 constexpr ColourReference kText       = ColourFromRgb(0xE8EDF3);
 constexpr ColourReference kBox        = ColourFromRgb(0x1D242E);
@@ -21,15 +21,15 @@ constexpr ColourReference kPeaks      = ColourFromRgb(0xF2A65A);
 constexpr ColourReference kPointer    = ColourFromRgb(0xE8EDF3);
 constexpr ColourReference kTrace      = ColourFromRgb(0x7CFF6B);
 constexpr ColourReference kInTune     = ColourFromRgb(0x5BE08A);
-constexpr ColourReference kOutOfTune  = ColourFromRgb(0xFF7A6B);
 constexpr ColourReference kNeedle     = ColourFromRgb(0xF5F7FA);
 
 // In 1/96 inch.
+constexpr float kSmallest    = 9.0f;   // no text is smaller
 constexpr float kLabelSize   = 11.0f;
 constexpr float kInfoSize    = 12.0f;
 constexpr float kGap         = 4.0f;
 constexpr float kLabelGap    = 10.0f;  // least distance between labels side by side
-constexpr float kLevelPitch  = 2.6f;   // least distance between labels of levels, in their heights
+constexpr float kLevelPitch  = 24.0f;  // least distance between labels of levels
 constexpr float kHairline    = 1.0f;
 constexpr float kCurveWidth  = 1.5f;
 constexpr float kTraceWidth  = 2.0f;

@@ -4,13 +4,12 @@
 #include <charconv>
 #include <cmath>
 
+#include "Spectrum/EqualTemperament.h"
 #include "Spectrum/Tuner.h"
 
 namespace Corvo {
 namespace {
 
-constexpr double kConcertPitch = 440.0;
-constexpr int kConcertSemitone = 69;
 constexpr double kLowestNamed = 8.0, kHighestNamed = 32000.0;
 constexpr std::string_view kMinus = "\u2212";
 
@@ -34,13 +33,13 @@ ShortText& ShortText::AddNumber(double value, int decimals) {
 }
 
 ShortText& ShortText::AddFrequency(double hz) {
-    if (hz < 999.95) return AddNumber(hz, 1).Add(" Hz");
+    if (hz < 999.95) return AddNumber(hz, hz < 99.995 ? 2 : 1).Add(" Hz");
     return AddNumber(hz / 1000.0, hz < 9999.5 ? 3 : 2).Add(" kHz");
 }
 
 ShortText& ShortText::AddNote(double hz) {
     if (!(hz >= kLowestNamed && hz <= kHighestNamed)) return *this;
-    const double semitone = 12.0 * std::log2(hz / kConcertPitch) + kConcertSemitone;
+    const double semitone = SemitoneOf(hz);
     const int nearest = static_cast<int>(std::lround(semitone));
     const double cents = 100.0 * (semitone - nearest);
     AddNoteName(nearest).Add(cents >= -0.5 ? " +" : " ");

@@ -10,12 +10,11 @@ namespace Corvo {
 class ShortText {
 public:
     std::string_view View() const { return {m_text.data(), m_length}; }
-    bool IsEmpty() const { return m_length == 0; }
 
     ShortText& Add(std::string_view text);
     // With a point whatever the locale, and a real minus sign.
     ShortText& AddNumber(double value, int decimals);
-    // "440.0 Hz" or "1.25 kHz".
+    // "55.03 Hz", "440.0 Hz" or "1.250 kHz".
     ShortText& AddFrequency(double hz);
     // "A4 +12c": the note of equal temperament on A = 440 Hz that is nearest; nothing outside 8 Hz..32 kHz.
     ShortText& AddNote(double hz);

@@ -13,23 +13,15 @@
 // The spectrum's curve with its scales.
 namespace Corvo {
 
-// Where the parts of a spectrum stand: labels to the left of the plot and below it, where they are wanted and
-// leave room.
+// Where the plot of a spectrum stands, and whether there are labels to its left and below it: where they are
+// wanted and leave room.
 struct SpectrumLayout {
     RectF plot;
     bool labels;
 };
 
-template <typename Target>
-SpectrumLayout LayOutSpectrum(Target& target, const RectF& rectangle, const SpectrumSettings& settings) {
-    const float scale = target.Scale(), size = Look::kLabelSize * scale, gap = Look::kGap * scale;
-    const TextMetrics line = target.MeasureText("0", size);
-    const float left = LabelWidth(target, false) + 2.0f * gap, bottom = line.ascent + line.descent + gap;
-    const RectF inner = Snapped(Shrunk(rectangle, left, gap, gap, bottom));
-    const float least = Look::kLeastPlot * scale;
-    if (settings.view_flag_b == 0 || inner.width < least || inner.height < least)
-        return {Snapped(rectangle), false};
-    return {inner, true};
+inline bool IsLargeEnough(const RectF& plot, float scale) {
+    return plot.width >= Look::kLeastPlot * scale && plot.height >= Look::kLeastPlot * scale;
 }
 
 inline bool ShowsNotes(const SpectrumSettings& settings) {
@@ -37,13 +29,20 @@ inline bool ShowsNotes(const SpectrumSettings& settings) {
 }
 
 template <typename Target>
-void DrawSpectrumScales(Target& target, const SpectrumLayout& layout, const CoordinatesAndFrequencies& map,
-                        const SpectrumSettings& settings) {
+SpectrumLayout LayOutSpectrum(Target& target, const RectF& rectangle, const SpectrumSettings& settings) {
+    const LabelMargins margins = MarginsFor(target, ShowsNotes(settings));
+    const RectF inner = Snapped(Shrunk(rectangle, margins.left, margins.top, margins.right, margins.bottom));
+    if (settings.view_flag_b == 0 || !IsLargeEnough(inner, target.Scale()))
+        return {Snapped(rectangle), false};
+    return {inner, true};
+}
+
+template <typename Target>
+void DrawSpectrumScales(Target& target, const RectF& rectangle, const SpectrumLayout& layout,
+                        const CoordinatesAndFrequencies& map, const SpectrumSettings& settings) {
     const RectF& plot = layout.plot;
-    const float scale = target.Scale(), size = Look::kLabelSize * scale, gap = Look::kGap * scale;
-    const TextMetrics line = target.MeasureText("0", size);
-    const AxisTicks frequencies = FrequencyTicks(map, plot.width, 6.0f * scale, settings.view_flag_d);
-    const AxisTicks levels = LevelTicks(map, plot.height, Look::kLevelPitch * (line.ascent + line.descent));
+    const AxisTicks frequencies = FrequencyTicks(map, RoomAlong(target, plot.width), settings.view_flag_d);
+    const AxisTicks levels = LevelTicks(map, RoomForLevels(target, plot.height));
     const auto xOf = [&](double hz) { return map.FrequencyToX(hz); };
     const auto yOf = [&](double level) { return map.LevelToY(level); };
     if (settings.view_option_c != 0) {
@@ -51,11 +50,14 @@ void DrawSpectrumScales(Target& target, const SpectrumLayout& layout, const Coor
         DrawGrid(target, plot, levels, false, yOf);
     }
     if (!layout.labels) return;
-    DrawLabelRow(target, frequencies, plot.x, Right(plot), Bottom(plot) + gap / 2.0f + line.ascent, xOf);
-    if (!ShowsNotes(settings))
-        target.Text("Hz", {plot.x - gap, Bottom(plot) + gap / 2.0f + line.ascent}, TextAlign::Right, size,
-                    {Look::kLabel});
-    DrawLabelColumn(target, levels, plot.y, Bottom(plot), plot.x - gap, TextAlign::Right, yOf);
+    DrawLabelRow(target, frequencies, rectangle.x, Right(rectangle), RowBaseline(target, Bottom(plot)), xOf);
+    DrawLabelColumn(target, levels, rectangle.y, Bottom(rectangle), plot.x - Look::kGap * target.Scale(),
+                    TextAlign::Right, yOf);
+}
+
+inline bool ShowsBands(const CoordinatesAndFrequencies& map) {
+    return map.GetFrequencyScale() == FrequencyScale::Octaves ||
+           map.GetFrequencyScale() == FrequencyScale::ThirdOctaves;
 }
 
 // The area under the points, down to `ground`.
@@ -79,8 +81,9 @@ void DrawBars(Target& target, const RectF& plot, const std::vector<PointF>& poin
             right = points[end].x;
             ++end;
         }
-        const float width = bands ? right - points[i].x - gap : pitch - gap;
-        target.FillRectangle({points[i].x, top, std::max(width, 1.0f), Bottom(plot) - top}, ink);
+        const float left = std::floor(points[i].x);
+        const float width = bands ? std::floor(right) - left - gap : pitch - gap;
+        target.FillRectangle({left, top, std::max(width, 1.0f), Bottom(plot) - top}, ink);
         i = end;
     }
 }
@@ -91,9 +94,7 @@ void DrawCurve(Target& target, const RectF& plot, const CoordinatesAndFrequencie
     if (points.empty()) return;
     const auto count = static_cast<int>(points.size());
     if (style == CurveStyle::Bars) {
-        const bool bands = map.GetFrequencyScale() == FrequencyScale::Octaves ||
-                           map.GetFrequencyScale() == FrequencyScale::ThirdOctaves;
-        DrawBars(target, plot, points, bands, {Look::kCurve, 200});
+        DrawBars(target, plot, points, ShowsBands(map), {Look::kCurve, 200});
         return;
     }
     if (style == CurveStyle::Filled) {
@@ -118,17 +119,24 @@ inline ShortText DescribeSpectrum(double hz, double level, LevelScale scale) {
 
 template <class Drawing>
 void kivspectrum::DoDrawSpectrum(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
+    DrawSpectrumAs<Drawing>(target, rectangle, GetSettings());
+}
+
+template <class Drawing>
+void kivspectrum::DrawSpectrumAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
+                                 const spectrum_settings& view) {
     using namespace Corvo;
     if (!IsDrawable(rectangle)) return;
-    const spectrum_settings view = GetSettings();
     const std::lock_guard lock(m_instanceLock);
     const SpectrumLayout layout = LayOutSpectrum(target, rectangle, view);
     const RectF& plot = layout.plot;
-    const CoordinatesAndFrequencies map = SpectrumMap(plot, view, m_samplingRate);
+    const int prepared = m_drawer->GetSamplingFrequency();
+    const CoordinatesAndFrequencies map =
+        SpectrumMap(plot, view, prepared > 0 ? prepared : m_samplingRate.load());
     target.PushClip(rectangle);
     target.FillRectangle(rectangle, {Look::kGround});
     target.FillRectangle(plot, {Look::kPlot});
-    DrawSpectrumScales(target, layout, map, view);
+    DrawSpectrumScales(target, rectangle, layout, map, view);
     target.PushClip(plot);
     int count = 0;
     const auto other = [&](const std::vector<float>& power, ColourReference colour) {
@@ -147,12 +155,12 @@ void kivspectrum::DoDrawSpectrum(typename Drawing::DrawTarget& target, const Cor
     target.PopClip();
 }
 
-// The pointer's frequency and level, with a hair-cross; without a pointer over the plot, the highest peak's.
+// The pointer's frequency and level, with a hair-cross; without a pointer over the plot the curve's highest
+// peak, in its colour, where that does not hide much of it. A band's level is not its highest bin's.
 template <class Drawing>
 void kivspectrum::DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
                                    const CoordinatesAndFrequencies& map) {
     using namespace Corvo;
-    const float gap = Look::kGap * target.Scale();
     const PointF pointer{m_pointerX, m_pointerY};
     if (Contains(plot, pointer)) {
         const Stroke hair{{Look::kPointer, 110}, std::max(std::round(target.Scale()), 1.0f)};
@@ -160,15 +168,14 @@ void kivspectrum::DrawSpectrumInfo(typename Drawing::DrawTarget& target, const C
         target.Line({plot.x, pointer.y}, {Right(plot), pointer.y}, hair);
         const ShortText text =
             DescribeSpectrum(map.XToFrequency(pointer.x), map.YToLevel(pointer.y), map.GetLevelScale());
-        const bool rightwards = pointer.x < Centre(plot).x;
-        const float x = pointer.x + (rightwards ? 2.0f : -2.0f) * gap;
-        DrawInfoBox(target, Shrunk(plot, gap, gap, gap, gap), {x, pointer.y + 2.0f * gap}, rightwards,
-                    text.View());
-        return;
+        return DrawPointerBox(target, plot, pointer, text.View());
     }
-    const SpectrumPeak peak = m_drawer->HighestPeak();
-    if (!(peak.level > map.GetFloor())) return;
+    const SpectrumPeak peak = m_drawer->HighestPeak(map.GetLowest());
+    if (ShowsBands(map) || !(peak.level > -VerticalRangeOf(m_drawer->GetSettings()))) return;
     ShortText text;
     text.Add("Peak   ").Add(DescribeSpectrum(peak.frequency, peak.level, LevelScale::Decibels).View());
-    DrawInfoBox(target, Shrunk(plot, gap, gap, gap, gap), {Right(plot), plot.y}, false, text.View());
+    constexpr float kMostOfWidth = 0.35f;
+    if (InfoBoxOf(target, text.View()).width > kMostOfWidth * plot.width) return;
+    const float gap = Look::kGap * target.Scale();
+    DrawInfoBox(target, Shrunk(plot, gap, gap, gap, gap), {Right(plot), plot.y}, text.View(), {Look::kCurve});
 }

@@ -17,6 +17,7 @@ namespace Corvo {
 
 constexpr float kDialCents = 50.0f;
 constexpr float kDialHalfAngle = std::numbers::pi_v<float> * 50.0f / 180.0f;
+constexpr float kLeastInfoLine = 15.0f;  // in 1/96 inch; its text is 0.62 of that
 constexpr const char* kNoNote = "\u2013";
 
 // On the circle around `centre`, `angle` to the right of upright.
@@ -62,7 +63,7 @@ constexpr float kHub = 0.05f;       // of the radius
 constexpr float kLabelRoom = 2.4f;  // around the arc, of the labels' size
 
 inline DialLayout LayOutDial(const RectF& r, float scale) {
-    const float size = std::clamp(r.height * 0.08f, 8.0f * scale, 15.0f * scale);
+    const float size = std::clamp(r.height * 0.08f, Look::kSmallest * scale, 15.0f * scale);
     const float room = kLabelRoom * size;
     const float byWidth = (r.width / 2.0f - room) / std::sin(kDialHalfAngle);
     const float byHeight = (r.height - room) / (1.0f + kHub);
@@ -93,8 +94,8 @@ void DrawDialScale(Target& target, const DialLayout& dial) {
                     {{major ? Look::kLabel : Look::kGrid}, (major ? 1.5f : 1.0f) * scale});
         if (!major || !(everyTen || cents % 50 == 0)) continue;
         const ShortText text = ShortText().AddNumber(cents, 0);
-        // As far out as the text's own extent in that direction asks for.
-        const float half = target.MeasureText(text.View(), size).width / 2.0f;
+        // As far out as the digits' extent in that direction asks for; a sign does not count.
+        const float half = target.MeasureText(cents == 0 ? "0" : "50", size).width / 2.0f;
         const float reach = half * std::abs(std::sin(angle)) + kCapHeight * size / 2.0f * std::cos(angle);
         const PointF at = OnCircle(dial.pivot, dial.radius + 0.45f * size + reach, angle);
         target.Text(text.View(), {at.x, at.y + kCapHeight * size / 2.0f}, TextAlign::Centre, size,
@@ -181,7 +182,9 @@ template <class Drawing>
 void kivspectrum::DrawNeedleInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
     using namespace Corvo;
     if (!IsDrawable(rectangle)) return;
-    const int lines = TunerGetNumLines();
+    // The error comes first; the other lines only where they stay large enough to read.
+    const int lines = std::clamp(static_cast<int>(rectangle.height / (kLeastInfoLine * target.Scale())), 1,
+                                 TunerGetNumLines());
     const float middle = Centre(rectangle).x;
     const float pitch = rectangle.height / (static_cast<float>(lines) + 0.4f);
     const auto baseline = [&](int line) { return rectangle.y + pitch * (static_cast<float>(line) + 0.85f); };
@@ -190,24 +193,25 @@ void kivspectrum::DrawNeedleInfo(typename Drawing::DrawTarget& target, const Cor
 
     const std::string error = tuned ? m_tuner->GetTuningErrorStr() : kNoNote;
     const float arrow = 0.5f * pitch;
-    const float size = FittingSize(target, error, 0.82f * pitch, room - 4.0f * arrow);
+    const float size = FittingSize(target, error, 0.82f * pitch, std::max(room - 4.0f * arrow, 0.4f * room));
     const bool centred = tuned && m_tuner->IsTunedCentered();
     target.Text(error, {middle, baseline(0)}, TextAlign::Centre, size,
                 {!tuned    ? Look::kLabel
                  : centred ? Look::kInTune
                            : Look::kText});
-    if (tuned && !centred) {
+    const float away = target.MeasureText(error, size).width / 2.0f + arrow;
+    if (tuned && !centred && away + arrow / 2.0f <= rectangle.width / 2.0f) {
         SetupErrorBitmaps(static_cast<int>(std::ceil(arrow)));
         const bool flat = m_tuner->GetErrorCents() < 0.0f;
-        const float away = target.MeasureText(error, size).width / 2.0f + arrow;
         target.Bitmap(flat ? tunerErrorFlatBitmap : tunerErrorSharpBitmap,
-                      {middle + (flat ? -away - arrow / 2.0f : away - arrow / 2.0f),
+                      {middle + (flat ? -away : away) - arrow / 2.0f,
                        baseline(0) - kCapHeight * size / 2.0f - arrow / 2.0f, arrow, arrow},
                       255);
     }
     const auto line = [&](int index, const ShortText& text) {
-        target.Text(text.View(), {middle, baseline(index)}, TextAlign::Centre,
-                    FittingSize(target, text.View(), 0.62f * pitch, room), {Look::kLabel});
+        if (index < lines)
+            target.Text(text.View(), {middle, baseline(index)}, TextAlign::Centre,
+                        FittingSize(target, text.View(), 0.62f * pitch, room), {Look::kLabel});
     };
     if (tuned) line(1, ShortText().AddFrequency(m_tuner->GetFrequency()));
     if (TunerCalibrationNotStandardOrNotUseEqualTemperament())
@@ -222,15 +226,16 @@ template <class Drawing>
 void kivspectrum::DrawTunerWithNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
     using namespace Corvo;
     if (!IsDrawable(rectangle)) return;
-    const float info = std::min(rectangle.height * 0.11f, 40.0f * target.Scale()) *
-                       (static_cast<float>(TunerGetNumLines()) + 0.4f);
+    const float scale = target.Scale(), lines = static_cast<float>(TunerGetNumLines()) + 0.4f;
+    const float pitch = std::clamp(rectangle.height * 0.11f, (kLeastInfoLine + 0.5f) * scale, 40.0f * scale);
+    const float info = std::min(pitch * lines, 0.45f * rectangle.height);
     const RectF above = Shrunk(rectangle, 0.0f, 0.0f, 0.0f, info);
-    const DialLayout dial = LayOutDial(above, target.Scale());
-    const float height = (1.0f + kHub) * dial.radius + kLabelRoom * dial.labelSize;
-    const float top = rectangle.y + std::max(above.height - height, 0.0f) / 2.0f;
-    DrawNeedle<Drawing>(target, {rectangle.x, top, rectangle.width, std::min(height, above.height)});
-    DrawNeedleInfo<Drawing>(target,
-                            {rectangle.x, top + std::min(height, above.height), rectangle.width, info});
+    const DialLayout dial = LayOutDial(above, scale);
+    const float needed = (1.0f + kHub) * dial.radius + kLabelRoom * dial.labelSize;
+    const float height = std::min(needed, above.height);
+    const float top = rectangle.y + (above.height - height) / 2.0f;
+    DrawNeedle<Drawing>(target, {rectangle.x, top, rectangle.width, height});
+    DrawNeedleInfo<Drawing>(target, {rectangle.x, top + height, rectangle.width, info});
 }
 
 // A small panel: bars, the note, bars.
@@ -270,7 +275,7 @@ void kivspectrum::DrawTuner(typename Drawing::DrawTarget& target, const Corvo::R
     using namespace Corvo;
     if (!IsDrawable(rectangle)) return;
     const float scale = target.Scale();
-    constexpr float kSmallWidth = 180.0f, kSmallHeight = 90.0f, kSideBySide = 1.7f, kWidestHalf = 2.0f;
+    constexpr float kSmallWidth = 180.0f, kSmallHeight = 110.0f, kSideBySide = 1.7f, kWidestHalf = 2.0f;
     target.PushClip(rectangle);
     target.FillRectangle(rectangle, {Look::kGround});
     const float gap = 2.0f * Look::kGap * scale;

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cmath>
 
+#include "Spectrum/EqualTemperament.h"
+
 using Corvo::FrequencyScale;
 using Corvo::LevelScale;
 
@@ -10,8 +12,6 @@ namespace {
 
 constexpr double kLowestLogarithmic = 1.0;
 constexpr double kMelCorner = 700.0;
-constexpr double kConcertPitch = 440.0;
-constexpr double kSemitones = 12.0;
 
 constexpr double kHighest = 1e9, kLargestRange = 1000.0;
 
@@ -35,10 +35,8 @@ CoordinatesAndFrequencies::CoordinatesAndFrequencies(const Corvo::RectF& rectang
     if (IsLogarithmic(m_frequencies)) m_lowest = std::max(m_lowest, kLowestLogarithmic);
     m_highest = std::max(m_highest, m_lowest + 1.0);
     if (m_frequencies == FrequencyScale::Notes) {
-        const auto semitone = [](double hz) { return kSemitones * std::log2(hz / kConcertPitch); };
-        const auto frequency = [](double note) { return kConcertPitch * std::exp2(note / kSemitones); };
-        m_lowest = frequency(std::floor(semitone(m_lowest) + 0.5) - 0.5);
-        m_highest = frequency(std::ceil(semitone(m_highest) - 0.5) + 0.5);
+        m_lowest = Corvo::FrequencyOf(std::floor(Corvo::SemitoneOf(m_lowest) + 0.5) - 0.5);
+        m_highest = Corvo::FrequencyOf(std::ceil(Corvo::SemitoneOf(m_highest) - 0.5) + 0.5);
     }
     m_left = Position(m_lowest);
     m_span = Position(m_highest) - m_left;

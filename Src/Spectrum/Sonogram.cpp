@@ -172,6 +172,7 @@ void Sonogram::Reshape(int width, const SonogramAxis& axis) {
     m_bitmap = std::move(reshaped);
     m_pitches = std::move(pitches);
     m_oldestPitch = 0;
+    m_heardColumns = std::min(m_heardColumns, kept);
     m_samplingRate = axis.samplingRate;
     m_frequencies = axis.scale;
     m_map = axis.Map();
@@ -220,6 +221,7 @@ void Sonogram::ScrollPixels(int columns) {
 void Sonogram::WriteColumns(const SonogramColumn& from, int columns) {
     const int written = std::min(columns, m_bitmap.width);
     ScrollPixels(written);
+    m_heardColumns = std::min(m_heardColumns + written, m_bitmap.width);
     const float* const newest = m_newest->Levels();
     const float* const old = from.Levels();
     for (int y = 0; y < m_bitmap.height; ++y) {
@@ -251,6 +253,7 @@ int Sonogram::GetColumnHeight() const { return m_newest->Height(); }
 void Sonogram::Clear() {
     std::fill(m_bitmap.pixels.begin(), m_bitmap.pixels.end(), m_pixels[0]);
     std::fill(m_pitches.begin(), m_pitches.end(), kSilent);
+    m_heardColumns = 0;
     m_bitmap.Changed();
     ClearColumn();
 }
@@ -310,5 +313,12 @@ float Sonogram::GetPitch(int column) const {
     if (column < 0 || column >= m_bitmap.width || m_pitches.empty()) return kSilent;
     return m_pitches[static_cast<std::size_t>((m_oldestPitch + column) % m_bitmap.width)];
 }
+
+int Sonogram::GetHeardColumns() const { return m_heardColumns; }
+
+void Sonogram::SetTimeAtRightEdge(double seconds) {
+    m_timeAtRightEdge = std::isfinite(seconds) ? seconds : 0.0;
+}
+double Sonogram::GetTimeAtRightEdge() const { return m_timeAtRightEdge; }
 
 }  // namespace Corvo

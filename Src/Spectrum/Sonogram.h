@@ -94,6 +94,12 @@ public:
     const CoordinatesAndFrequencies& GetFrequencyMap() const;
     // What the tuner heard at a column, 0 the left one; 0 where it heard nothing, or outside.
     float GetPitch(int column) const;
+    // How many columns at the right were ever written.
+    int GetHeardColumns() const;
+    // What the timeline calls the right edge: 0, so that it counts back from now, unless a player tells its
+    // place. Seconds; what is not a number counts as 0.
+    void SetTimeAtRightEdge(double seconds);
+    double GetTimeAtRightEdge() const;
 
     // Drawing, once per back-end, into `rectangle`: the picture; its scale of colours with levels;
     // frequencies or notes, up to the rectangle's right edge; seconds before now, for a picture as wide as
@@ -147,6 +153,8 @@ private:
 
     std::vector<float> m_pitches;  // a ring, one per column of the picture
     int m_oldestPitch = 0;
+    int m_heardColumns = 0;
+    double m_timeAtRightEdge = 0.0;
     std::vector<PointF> m_trace;  // one stretch of them as drawn
 };
 

@@ -69,8 +69,9 @@ public:
     const std::vector<Corvo::PointF>& GetXYPoints() const;
     const std::vector<int>& GetFFTPoints() const;
 
-    // The highest peak of the smoothed spectrum above 0 Hz; 0 Hz and -300 dB when there is none.
-    Corvo::SpectrumPeak HighestPeak() const;
+    // The highest peak of the smoothed spectrum from a frequency (Hz) up, DC apart; 0 Hz and -300 dB when
+    // there is none.
+    Corvo::SpectrumPeak HighestPeak(double lowestHz = 0.0) const;
 
     void SetOn(bool on);
     bool GetOn() const;

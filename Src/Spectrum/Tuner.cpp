@@ -91,6 +91,7 @@ bool Tuner::IsTracking() const { return m_tracking; }
 int Tuner::GetNote() const { return m_note; }
 int Tuner::GetOctave() const { return m_octave; }
 double Tuner::GetFrequency() const { return m_frequency; }
+double Tuner::GetHeardFrequency() const { return m_heardFrequency; }
 float Tuner::GetErrorCents() const { return m_cents; }
 float Tuner::GetProminence() const { return m_prominence; }
 double Tuner::GetStableFrequency() const { return m_stableFrequency; }
@@ -171,6 +172,7 @@ void Tuner::Follow(double hz, float prominence, double framePeriod) {
     } else {
         m_otherCount = 0;
     }
+    m_heardFrequency = same || other ? hz : 0.0;
     if (same || (other && (m_note < 0 || m_otherCount >= sensitivity.confirmCount))) {
         if (!same) ResetPeakMemories(false);
         Hear(hz, prominence, nearest);
@@ -204,7 +206,7 @@ void Tuner::ResetPeakMemories(bool forgetNote) {
     if (!forgetNote) return;
     m_note = -1;
     m_octave = 0;
-    m_frequency = 0.0;
+    m_frequency = m_heardFrequency = 0.0;
     m_cents = 0.0f;
     m_prominence = 0.0f;
     m_tracking = false;

@@ -117,7 +117,9 @@ public:
     int GetOctave() const;
     // The pitch last heard of the note shown, Hz. 0 without a note.
     double GetFrequency() const;
-    // How far that is from the note, positive when sharp. 0 without a note.
+    // What the last analysis heard, whether or not it is the note shown yet; 0 when it heard nothing. Hz.
+    double GetHeardFrequency() const;
+    // How far the pitch shown is from the note, positive when sharp. 0 without a note.
     float GetErrorCents() const;
     // By how many decibels the strongest partial (the product, with method 1) stood out. 0 without a note.
     float GetProminence() const;
@@ -160,6 +162,7 @@ private:
     std::atomic<int> m_note{-1};
     std::atomic<int> m_octave{0};
     std::atomic<double> m_frequency{0.0};
+    std::atomic<double> m_heardFrequency{0.0};
     std::atomic<float> m_cents{0.0f};
     std::atomic<float> m_prominence{0.0f};
     std::atomic<double> m_stableFrequency{0.0};

@@ -274,7 +274,7 @@ bool kivspectrum::AdvanceSonogram() {
     // The smoothed spectrum is rebuilt under this lock.
     const Lock instanceLock(m_instanceLock);
     if (!m_showSonogram || !m_on || m_frozen || m_drawer->GetSamplingFrequency() <= 0) return false;
-    const double pitch = m_tunerOn ? m_tuner->GetFrequency() : 0.0;
+    const double pitch = m_tunerOn ? m_tuner->GetHeardFrequency() : 0.0;
     return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch));
 }
 

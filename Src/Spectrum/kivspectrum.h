@@ -3,6 +3,7 @@
 #include <array>
 #include <atomic>
 #include <cstdint>
+#include <limits>
 #include <memory>
 #include <vector>
 
@@ -237,12 +238,20 @@ public:
 
 private:
     template <class Drawing>
+    void DrawSpectrumAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
+                        const spectrum_settings& view);
+    template <class Drawing>
+    void DrawSonogramAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
+                        const spectrum_settings& view);
+    template <class Drawing>
     void DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
                           const CoordinatesAndFrequencies& map);
     template <class Drawing>
     void DrawSonogramInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot);
     template <class Drawing>
     void DrawTunerLine(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+
+    static constexpr float kNowhere = std::numeric_limits<float>::quiet_NaN();  // within no rectangle
 
     bool ApplyCommand(int command);
     void ResizeFilter();
@@ -282,7 +291,7 @@ private:
     std::atomic<bool> m_showInfoBox{true};
     std::atomic<_display_mode> m_displayMode{display_spectrum};
     std::atomic<int> m_samplingRate{44100};
-    std::atomic<float> m_pointerX{-1.0f}, m_pointerY{-1.0f};
+    std::atomic<float> m_pointerX{kNowhere}, m_pointerY{kNowhere};
     std::vector<Corvo::PointF> m_outline;  // of the filled curve
 };
 

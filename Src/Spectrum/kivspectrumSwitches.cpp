@@ -90,4 +90,4 @@ void kivspectrum::SetPointer(float x, float y) {
     m_pointerX = x;
     m_pointerY = y;
 }
-void kivspectrum::ClearPointer() { SetPointer(-1.0f, -1.0f); }
+void kivspectrum::ClearPointer() { SetPointer(kNowhere, kNowhere); }

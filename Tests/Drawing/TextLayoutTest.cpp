@@ -87,7 +87,8 @@ TYPED_TEST(TextLayout, RoomIsUsed) {
         const auto has = [&](const std::string& text) {
             return std::ranges::any_of(target.texts, [&](const auto& t) { return t.text == text; });
         };
-        for (const char* label : {"20", "50", "100", "1k", "2k", "10k", "20k", "0", "\u221260", "\u221290"})
+        for (const char* label :
+             {"20 Hz", "50", "100", "1k", "2k", "10k", "20k", "0 dB", "\u221260", "\u221290"})
             EXPECT_TRUE(has(label)) << label;
     });
 }
