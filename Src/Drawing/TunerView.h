@@ -140,7 +140,8 @@ void kivspectrum::DrawTunerBigLetter(typename Drawing::DrawTarget& target, const
     const float radius = std::floor(
         0.94f * std::min(rectangle.width / (2.0f * halfWidth), rectangle.height / (2.0f * halfHeight)));
     if (radius < 1.0f) return;
-    const PointF centre = Centre(rectangle);
+    // Between pixels, so that images made for this radius are copied as they are.
+    const PointF centre{std::round(Centre(rectangle).x), std::round(Centre(rectangle).y)};
     DoDrawBigLetter<Drawing>(target, {centre.x - radius, centre.y - radius, 2.0f * radius, 2.0f * radius});
     const bool tuned = m_tuner->IsTuned() && !m_tuner->IsTunedCentered();
     const float cents = m_tuner->GetErrorCents();
@@ -148,11 +149,12 @@ void kivspectrum::DrawTunerBigLetter(typename Drawing::DrawTarget& target, const
         for (const bool left : {true, false}) {
             const bool lit = tuned && (cents < 0.0f) == left && bar < LitBars(cents);
             const BarItems& items = lit ? left ? leftItems : rightItems : left ? baseItems_L : baseItems_R;
-            const TunerBarShape shape = TunerBarOf(bar, left);
-            target.Bitmap(*items[static_cast<std::size_t>(bar)],
-                          {centre.x + shape.left * radius, centre.y + shape.top * radius,
-                           shape.width * radius, shape.height * radius},
-                          255);
+            const TunerBarPixels pixels = TunerBarPixelsOf(bar, left, static_cast<int>(radius));
+            target.Bitmap(
+                *items[static_cast<std::size_t>(bar)],
+                {centre.x + static_cast<float>(pixels.left), centre.y + static_cast<float>(pixels.top),
+                 static_cast<float>(pixels.width), static_cast<float>(pixels.height)},
+                255);
         }
 }
 

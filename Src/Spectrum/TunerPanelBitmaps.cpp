@@ -47,12 +47,11 @@ void DrawPanelCircle(DrawingBitmap& bitmap, int diameter, std::uint32_t rgb) {
 
 void DrawPanelArc(DrawingBitmap& bitmap, int circleRadius, int bar, bool onTheLeft, std::uint32_t rgb) {
     const TunerBarShape shape = TunerBarOf(bar, onTheLeft);
+    const TunerBarPixels pixels = TunerBarPixelsOf(bar, onTheLeft, circleRadius);
     const auto unit = static_cast<float>(circleRadius);
-    const auto pixels = [&](float length) { return static_cast<int>(std::ceil(length * unit)); };
-    Fill(bitmap, pixels(shape.width), pixels(shape.height), rgb, [&](float x, float y) {
-        const float fromCentre = shape.left * unit + x;
-        return ArcDistance(onTheLeft ? -fromCentre : fromCentre, shape.top * unit + y, shape.radius * unit,
-                           shape.thickness * unit);
+    Fill(bitmap, pixels.width, pixels.height, rgb, [&](float x, float y) {
+        const float right = x + static_cast<float>(pixels.left), down = y + static_cast<float>(pixels.top);
+        return ArcDistance(onTheLeft ? -right : right, down, shape.radius * unit, shape.thickness * unit);
     });
 }
 

@@ -13,8 +13,7 @@ namespace Corvo {
 constexpr int kTunerBars = 4;
 constexpr float kArcHalfAngle = std::numbers::pi_v<float> * 34.0f / 180.0f;
 
-// Where an arc lies, in units of the circle's radius and seen from its centre: what draws and what places it
-// agree on this.
+// Where an arc lies, in units of the circle's radius and seen from its centre.
 struct TunerBarShape {
     float left, top, width, height;
     float radius, thickness;
@@ -29,7 +28,23 @@ inline TunerBarShape TunerBarOf(int bar, bool onTheLeft) {
     return {onTheLeft ? -outer : inner, -reach, outer - inner, 2.0f * reach, radius, kThickness};
 }
 
+// The whole pixels that an arc of a circle of so many pixels touches, from the circle's centre, which lies
+// between pixels.
+struct TunerBarPixels {
+    int left, top, width, height;
+};
+
+inline TunerBarPixels TunerBarPixelsOf(int bar, bool onTheLeft, int circleRadius) {
+    const TunerBarShape shape = TunerBarOf(bar, onTheLeft);
+    const auto unit = static_cast<float>(circleRadius);
+    const auto before = [&](float edge) { return static_cast<int>(std::floor(edge * unit)); };
+    const auto after = [&](float edge) { return static_cast<int>(std::ceil(edge * unit)); };
+    const int left = before(shape.left), top = before(shape.top);
+    return {left, top, after(shape.left + shape.width) - left, after(shape.top + shape.height) - top};
+}
+
 void DrawPanelCircle(DrawingBitmap& bitmap, int diameter, std::uint32_t rgb);
+// As large as TunerBarPixelsOf says.
 void DrawPanelArc(DrawingBitmap& bitmap, int circleRadius, int bar, bool onTheLeft, std::uint32_t rgb);
 // An upright bar with round ends.
 void DrawPanelBar(DrawingBitmap& bitmap, int width, int height, std::uint32_t rgb);

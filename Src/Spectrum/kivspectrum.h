@@ -103,7 +103,9 @@ public:
     static const BarItems leftItemsMinimized, rightItemsMinimized, baseItemsMinimized_L, baseItemsMinimized_R;
     // Arrows that point to where the note has to go.
     static Corvo::DrawingBitmap tunerErrorFlatBitmap, tunerErrorSharpBitmap;
-    // Draw the images anew when larger ones are needed or needPrepareBitmap asks for it; sizes in pixels.
+    // Draw the images anew when larger ones are needed, when they have been more than twice too large for a
+    // while, or when needPrepareBitmap asks for it, then all kinds. Sizes in pixels, limited to 1..1024.
+    // Without memory they throw std::bad_alloc, and the next call tries again.
     static void SetupTunerBitmaps(int circleRadius);
     static void SetupMinimizedTunerBitmaps(int height);
     static void SetupErrorBitmaps(int side);

@@ -1,5 +1,6 @@
 #include <algorithm>
 
+#include "Spectrum/ImageSize.h"
 #include "Spectrum/TunerPanelBitmaps.h"
 #include "Spectrum/kivspectrum.h"
 
@@ -12,10 +13,13 @@ namespace {
 constexpr std::uint32_t kCircle = 0xF5F7FA, kUnlit = 0x262E39;
 constexpr std::uint32_t kLit[Corvo::kTunerBars] = {0xB8E05B, 0xF2D15A, 0xF2A65A, 0xFF7A6B};
 constexpr std::uint32_t kError = 0xFF7A6B;
-// No panel is larger; more would only cost memory.
-constexpr int kLargestRadius = 1024;
 
-int g_circleRadius = 0, g_minimizedHeight = 0, g_errorSide = 0;
+Corvo::ImageSize g_circles, g_minimized, g_errors;
+
+void ForgetIfAsked() {
+    if (!kivspectrum::needPrepareBitmap.exchange(false)) return;
+    for (Corvo::ImageSize* const size : {&g_circles, &g_minimized, &g_errors}) size->Forget();
+}
 
 }  // namespace
 
@@ -62,37 +66,37 @@ const kivspectrum::BarItems kivspectrum::baseItemsMinimized_R{
 // clang-format on
 
 void kivspectrum::SetupTunerBitmaps(int circleRadius) {
-    const bool remake = needPrepareBitmap.exchange(false);
-    if (!remake && circleRadius <= g_circleRadius) return;
-    g_circleRadius = std::clamp(circleRadius, 1, kLargestRadius);
-    Corvo::DrawPanelCircle(mainWitheCirleBitmap, 2 * g_circleRadius, kCircle);
-    Corvo::DrawPanelCircle(mainWitheCirleBitmapBase, 2 * g_circleRadius, kUnlit);
-    for (std::size_t i = 0; i < Corvo::kTunerBars; ++i) {
-        const int bar = static_cast<int>(i);
-        Corvo::DrawPanelArc(*leftItems[i], g_circleRadius, bar, true, kLit[i]);
-        Corvo::DrawPanelArc(*rightItems[i], g_circleRadius, bar, false, kLit[i]);
-        Corvo::DrawPanelArc(*baseItems_L[i], g_circleRadius, bar, true, kUnlit);
-        Corvo::DrawPanelArc(*baseItems_R[i], g_circleRadius, bar, false, kUnlit);
-    }
-    // The others follow when they are next needed.
-    if (remake) g_minimizedHeight = g_errorSide = 0;
+    ForgetIfAsked();
+    g_circles.Provide(circleRadius, [](int radius) {
+        Corvo::DrawPanelCircle(mainWitheCirleBitmap, 2 * radius, kCircle);
+        Corvo::DrawPanelCircle(mainWitheCirleBitmapBase, 2 * radius, kUnlit);
+        for (std::size_t i = 0; i < Corvo::kTunerBars; ++i) {
+            const int bar = static_cast<int>(i);
+            Corvo::DrawPanelArc(*leftItems[i], radius, bar, true, kLit[i]);
+            Corvo::DrawPanelArc(*rightItems[i], radius, bar, false, kLit[i]);
+            Corvo::DrawPanelArc(*baseItems_L[i], radius, bar, true, kUnlit);
+            Corvo::DrawPanelArc(*baseItems_R[i], radius, bar, false, kUnlit);
+        }
+    });
 }
 
-void kivspectrum::SetupMinimizedTunerBitmaps(int height) {
-    if (height <= g_minimizedHeight) return;
-    g_minimizedHeight = std::clamp(height, 1, kLargestRadius);
-    const int width = std::max(g_minimizedHeight / 4, 1);
-    for (std::size_t i = 0; i < Corvo::kTunerBars; ++i) {
-        Corvo::DrawPanelBar(*leftItemsMinimized[i], width, g_minimizedHeight, kLit[i]);
-        Corvo::DrawPanelBar(*rightItemsMinimized[i], width, g_minimizedHeight, kLit[i]);
-        Corvo::DrawPanelBar(*baseItemsMinimized_L[i], width, g_minimizedHeight, kUnlit);
-        Corvo::DrawPanelBar(*baseItemsMinimized_R[i], width, g_minimizedHeight, kUnlit);
-    }
+void kivspectrum::SetupMinimizedTunerBitmaps(int barHeight) {
+    ForgetIfAsked();
+    g_minimized.Provide(barHeight, [](int height) {
+        const int width = std::max(height / 4, 1);
+        for (std::size_t i = 0; i < Corvo::kTunerBars; ++i) {
+            Corvo::DrawPanelBar(*leftItemsMinimized[i], width, height, kLit[i]);
+            Corvo::DrawPanelBar(*rightItemsMinimized[i], width, height, kLit[i]);
+            Corvo::DrawPanelBar(*baseItemsMinimized_L[i], width, height, kUnlit);
+            Corvo::DrawPanelBar(*baseItemsMinimized_R[i], width, height, kUnlit);
+        }
+    });
 }
 
-void kivspectrum::SetupErrorBitmaps(int side) {
-    if (side <= g_errorSide) return;
-    g_errorSide = std::clamp(side, 1, kLargestRadius);
-    Corvo::DrawPanelArrow(tunerErrorFlatBitmap, g_errorSide, true, kError);
-    Corvo::DrawPanelArrow(tunerErrorSharpBitmap, g_errorSide, false, kError);
+void kivspectrum::SetupErrorBitmaps(int arrowSide) {
+    ForgetIfAsked();
+    g_errors.Provide(arrowSide, [](int side) {
+        Corvo::DrawPanelArrow(tunerErrorFlatBitmap, side, true, kError);
+        Corvo::DrawPanelArrow(tunerErrorSharpBitmap, side, false, kError);
+    });
 }
