@@ -1,3 +1,4 @@
+#include <exception>
 #include <string>
 
 #include <cairo.h>
@@ -8,10 +9,13 @@
 namespace dsphost {
 namespace {
 
-cairo_status_t Append(void* png, const unsigned char* bytes, unsigned count) {
+// Called from C, which no exception must cross.
+cairo_status_t Append(void* png, const unsigned char* bytes, unsigned count) noexcept try {
     auto& all = *static_cast<std::vector<std::uint8_t>*>(png);
     all.insert(all.end(), bytes, bytes + count);
     return CAIRO_STATUS_SUCCESS;
+} catch (const std::exception&) {
+    return CAIRO_STATUS_NO_MEMORY;
 }
 
 }  // namespace

@@ -1,8 +1,11 @@
 #include "Drawing/DrawingCairo.h"
 
 #include <algorithm>
+#include <cmath>
+#include <mutex>
 #include <numbers>
 #include <string>
+#include <vector>
 
 #include <fontconfig/fontconfig.h>
 #include <pango/pangocairo.h>
@@ -11,6 +14,7 @@
 #include "Drawing/PrimitiveArguments.h"
 #include "Drawing/ResourceKeys.h"
 #include "Drawing/SlotCache.h"
+#include "Platform/CriticalSection.h"
 
 namespace Corvo {
 namespace {
@@ -26,10 +30,15 @@ struct CairoPen {
     float width;
 };
 
-// The file joins those that the program knows; once for each file.
+// The file joins those that the program knows; once for each file, or every back-end made would add it again.
 void AddFontFile() {
+    static CriticalSection lock;
+    static std::vector<std::string> added;
     const std::string file = DrawingFont::GetFile();
-    if (!file.empty()) FcConfigAppFontAddFile(nullptr, reinterpret_cast<const FcChar8*>(file.c_str()));
+    const std::lock_guard guard(lock);
+    if (file.empty() || std::ranges::find(added, file) != added.end()) return;
+    if (FcConfigAppFontAddFile(nullptr, reinterpret_cast<const FcChar8*>(file.c_str())))
+        added.push_back(file);
 }
 
 PangoContext* MakeTextContext() {
@@ -60,12 +69,24 @@ bool AddPath(cairo_t* context, const PointF* points, int count) {
     return added >= 2;
 }
 
+// Whether the rectangle is width x height pixels of the surface, upright, whatever the context's scale is.
+bool CoversPixels(cairo_t* context, const RectF& r, int width, int height) {
+    double xScale = 1.0, yScale = 1.0;
+    cairo_surface_get_device_scale(cairo_get_group_target(context), &xScale, &yScale);
+    const auto leads = [&](double x, double y, int right, int down) {
+        constexpr double kSlack = 0.01;  // of a pixel
+        cairo_user_to_device_distance(context, &x, &y);
+        return std::abs(x * xScale - right) < kSlack && std::abs(y * yScale - down) < kSlack;
+    };
+    return leads(r.width, 0.0, width, 0) && leads(0.0, r.height, 0, height);
+}
+
 }  // namespace
 
 struct DrawingCairo::Resources {
-    SlotCache<InkKey, DrawingBrush, 32> brushes;
-    SlotCache<StrokeKey, DrawingPen*, 32> pens;
-    SlotCache<TextKey, LaidOutText, 192> texts;
+    SlotCache<InkKey, DrawingBrush, kKeptInks> brushes;
+    SlotCache<StrokeKey, DrawingPen*, kKeptStrokes> pens;
+    SlotCache<TextKey, LaidOutText, kKeptTexts> texts;
     PangoContext* textContext = MakeTextContext();
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
 
@@ -236,11 +257,11 @@ void DrawingCairo::DrawTarget::Bitmap(const DrawingBitmap& bitmap, const RectF& 
         bitmap.width * static_cast<int>(sizeof(std::uint32_t)));
     const double xScale = static_cast<double>(r.width) / bitmap.width;
     const double yScale = static_cast<double>(r.height) / bitmap.height;
+    const bool ownSize = CoversPixels(m_context, r, bitmap.width, bitmap.height);
     cairo_save(m_context);
     cairo_translate(m_context, r.x, r.y);
     cairo_scale(m_context, xScale, yScale);
     cairo_set_source_surface(m_context, surface, 0.0, 0.0);
-    const bool ownSize = xScale == 1.0 && yScale == 1.0;
     cairo_pattern_set_filter(cairo_get_source(m_context), ownSize ? CAIRO_FILTER_NEAREST : CAIRO_FILTER_GOOD);
     cairo_pattern_set_extend(cairo_get_source(m_context), CAIRO_EXTEND_PAD);
     cairo_rectangle(m_context, 0.0, 0.0, bitmap.width, bitmap.height);

@@ -98,9 +98,9 @@ struct DrawingD2D::Resources {
     ComPtr<ID2D1StrokeStyle> roundStyle;
     ComPtr<ID2D1DrawingStateBlock> stateFound;
     const TypefaceDirectWrite typeface;
-    SlotCache<InkKey, DrawingBrush, 32> brushes;
-    SlotCache<StrokeKey, DrawingPen*, 32> pens;
-    SlotCache<TextKey, D2DText, 192> texts;
+    SlotCache<InkKey, DrawingBrush, kKeptInks> brushes;
+    SlotCache<StrokeKey, DrawingPen*, kKeptStrokes> pens;
+    SlotCache<TextKey, D2DText, kKeptTexts> texts;
     SlotCache<const DrawingBitmap*, D2DBitmap, 48> bitmaps;
     UsablePoints<D2D1_POINT_2F> points;
 

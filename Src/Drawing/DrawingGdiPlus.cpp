@@ -48,10 +48,10 @@ struct DrawingGdiPlus::Resources {
     const TypefaceGdiPlus typeface;
     Gdiplus::GraphicsPath path{Gdiplus::FillModeAlternate};
     Gdiplus::ImageAttributes imageAttributes;
-    SlotCache<InkKey, DrawingBrush, 32> brushes;
-    SlotCache<StrokeKey, DrawingPen*, 32> pens;
+    SlotCache<InkKey, DrawingBrush, kKeptInks> brushes;
+    SlotCache<StrokeKey, DrawingPen*, kKeptStrokes> pens;
     SlotCache<float, Gdiplus::Font*, 16> fonts;
-    SlotCache<TextKey, GdiPlusText, 192> texts;
+    SlotCache<TextKey, GdiPlusText, kKeptTexts> texts;
     UsablePoints<Gdiplus::PointF> points;
     std::vector<unsigned> states;  // memory that one target leaves to the next
 

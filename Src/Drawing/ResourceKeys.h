@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <functional>
 #include <string_view>
 
 #include "Drawing/DrawTarget.h"
@@ -42,4 +43,32 @@ struct TextKey {
     bool operator==(const TextKey&) const = default;
 };
 
+// A picture needs a few colours and widths, and 220 texts on a display of 3840x2160 with note names: enough
+// for two such.
+constexpr std::size_t kKeptInks = 32, kKeptStrokes = 32, kKeptTexts = 512;
+
+inline std::size_t CombinedHash(std::size_t a, std::size_t b) { return a * 31 + b; }
+
 }  // namespace Corvo
+
+template <>
+struct std::hash<Corvo::InkKey> {
+    std::size_t operator()(const Corvo::InkKey& key) const {
+        return Corvo::CombinedHash(key.ink.colour, key.ink.opacity);
+    }
+};
+
+template <>
+struct std::hash<Corvo::StrokeKey> {
+    std::size_t operator()(const Corvo::StrokeKey& key) const {
+        return Corvo::CombinedHash(std::hash<Corvo::InkKey>{}(key.ink), std::hash<float>{}(key.width));
+    }
+};
+
+template <>
+struct std::hash<Corvo::TextKey> {
+    std::size_t operator()(const Corvo::TextKey& key) const {
+        return Corvo::CombinedHash(std::hash<std::string_view>{}(key.text.data()),
+                                   std::hash<float>{}(key.size));
+    }
+};

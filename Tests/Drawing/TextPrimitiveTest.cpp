@@ -82,9 +82,15 @@ TYPED_TEST(TextPrimitive, IsMeasuredByItsAdvance) {
     EXPECT_NEAR(this->WidthOf("\xC3\xA9\xC3\xA9", 48.0f), this->WidthOf("ee", 48.0f), 1.0f);
     EXPECT_EQ(this->WidthOf("", 48.0f), 0.0f);
 
-    std::string letters;
-    for (int i = 0; i < 100; ++i) letters += "\xC3\xA9";
-    EXPECT_NEAR(this->WidthOf(letters.c_str(), 12.0f), 47.0f * this->WidthOf("\xC3\xA9", 12.0f), 24.0f);
+    const auto letters = [](int count) {
+        std::string text;
+        for (int i = 0; i < count; ++i) text += "\xC3\xA9";
+        return text;
+    };
+    const float whole = this->WidthOf(letters(47).c_str(), 12.0f);  // 94 bytes of the 95 that are drawn
+    EXPECT_NEAR(whole, 47.0f * this->WidthOf("\xC3\xA9", 12.0f), 24.0f);
+    EXPECT_EQ(this->WidthOf(letters(48).c_str(), 12.0f), whole);
+    EXPECT_EQ(this->WidthOf(letters(100).c_str(), 12.0f), whole);
 }
 
 // Catches a typeface's file that stops the text when it is gone.

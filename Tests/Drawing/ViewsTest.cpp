@@ -98,7 +98,7 @@ TYPED_TEST(Views, EveryRoutineTakesEveryRectangle) {
     shown.Hear(440.0, 0.5);
     DrawingSurface<TypeParam> surface(64, 48);
     for (const RectF& r : rectangles)
-        for (const float dpi : {96.0f, 0.0f, kNan, 1e9f})
+        for (const float dpi : {96.0f, 192.0f, 384.0f, 0.0f, kNan, 1e9f})
             surface.Paint(dpi, [&](auto& target) {
                 analyser.template DoDraw<TypeParam>(target, r);
                 analyser.template DoDrawSonogramAndSpectrum<TypeParam>(target, r);
