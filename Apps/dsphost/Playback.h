@@ -18,6 +18,16 @@ constexpr int kMostChannels = 64;
 // A new spectrum at every refresh, from 5 kHz on.
 constexpr float kDisplayOverlap = 0.98f;
 
+// Lets the tuner hear as low at every rate as its shortest window does at 48 kHz.
+inline void UseTunerWindow(int rate) {
+    constexpr int kShortest = 8192, kRate = 48000, kLongest = 524288;
+    int window = kShortest;
+    while (window < kLongest &&
+           static_cast<std::int64_t>(window) * kRate < static_cast<std::int64_t>(kShortest) * rate)
+        window *= 2;
+    kivspectrum::settings.window_length = window;
+}
+
 // Plays a file to an analyser as a host would, without waiting: feeds what falls between two refreshes of the
 // display, then calls each(seconds), the time in the file that the middle of the newest window stands at;
 // what lies before the file is left out. With `toTheEnd` half a window of silence follows, so that the file's

@@ -66,6 +66,7 @@ void Run(Arguments arguments) {
     analyser.set_parameters(input.Rate());
     analyser.SetOn(true);
     analyser.SetTunerOn(arguments.pitch);
+    if (arguments.pitch) UseTunerWindow(input.Rate());
     kivspectrum::SetAnalysisWindowsOverlap(kDisplayOverlap);
     analyser.ObserverUpdate();
     arguments.drawing.ApplyTo(analyser);

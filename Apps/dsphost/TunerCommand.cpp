@@ -101,7 +101,7 @@ public:
         m_analyser.set_parameters(m_input.Rate());
         m_analyser.SetOn(true);
         m_analyser.SetTunerOn(true);
-        m_analyser.ObserverUpdate();
+        UseTunerWindow(m_input.Rate());
         kivspectrum::SetAnalysisWindowsOverlap(kDisplayOverlap);
         m_analyser.ObserverUpdate();
     }

@@ -99,6 +99,17 @@ TEST_F(PictureCommands, TunerTellsNotesAsJson) {
     EXPECT_GT(heard, 40);
 }
 
+// Catches a window that is too short for low notes where the rate is high.
+TEST_F(PictureCommands, TunerHearsLowNotesAtHighRates) {
+    Save("in.wav",
+         {1, 192000, SF_FORMAT_WAV | SF_FORMAT_FLOAT, TestSupport::Sine<double>(2 * 192000, 41.2, 192000)});
+    const auto result = Run({"tuner", "in.wav", "o.png", "--json"});
+    ASSERT_EQ(result.status, 0) << result.err;
+    const auto rows = nlohmann::json::parse(result.out);
+    ASSERT_GT(rows.size(), 30u);
+    EXPECT_EQ(rows[rows.size() / 2].at("note"), "E1");
+}
+
 TEST_F(PictureCommands, RefuseWhatTheyCannotDo) {
     SaveTone();
     const struct {
@@ -115,6 +126,10 @@ TEST_F(PictureCommands, RefuseWhatTheyCannotDo) {
         {{"tuner", "in.wav", "o.png", "--scale", "cubic"}, {"cubic", "log"}},
         {{"tuner", "in.wav", "o.png", "--temperament", "Bach"}, {"Bach"}},
         {{"tuner", "in.wav", "o.png", "--at", "-1"}, {"--at"}},
+        {{"tuner", "in.wav", "o.png", "--at", "99"}, {"--at", "ends"}},
+        {{"tuner", "in.wav", "-", "--json"}, {"standard output"}},
+        {{"spectrum", "in.wav", "-", "--csv", "-"}, {"standard output"}},
+        {{"tuner", "in.wav", "o.png", "--font", "in.wav"}, {"--font", "in.wav"}},
         {{"tuner", "in.wav", "in.wav", "-y"}, {"in.wav", "input"}},
         {{"tuner", "in.wav", "o.png", "--font", "none.ttf"}, {"--font", "none.ttf"}},
     };
