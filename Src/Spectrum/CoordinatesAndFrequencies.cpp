@@ -81,11 +81,14 @@ double CoordinatesAndFrequencies::YToLevel(double y) const {
     return m_floor + share * (m_top - m_floor);
 }
 
+double Corvo::LowestShown(FrequencyScale scale) {
+    constexpr double kLowestHeard = 20.0;
+    return scale == FrequencyScale::Linear || scale == FrequencyScale::Mel ? 0.0 : kLowestHeard;
+}
+
 CoordinatesAndFrequencies Corvo::SpectrumMap(const RectF& rectangle, const SpectrumSettings& settings,
                                              int samplingRate) {
-    constexpr double kLowestHeard = 20.0;
     const FrequencyScale scale = FrequencyScaleOf(settings);
-    const bool fromZero = scale == FrequencyScale::Linear || scale == FrequencyScale::Mel;
-    return {rectangle, fromZero ? 0.0 : kLowestHeard, samplingRate / 2.0,
-            scale,     LevelScaleOf(settings),        VerticalRangeOf(settings)};
+    return {rectangle, LowestShown(scale),     samplingRate / 2.0,
+            scale,     LevelScaleOf(settings), VerticalRangeOf(settings)};
 }

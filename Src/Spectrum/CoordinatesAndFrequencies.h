@@ -53,8 +53,11 @@ private:
 
 namespace Corvo {
 
-// What a display of the settings shows in `rectangle`: from 20 Hz, or 0 on the linear and mel scales, to half
-// the sampling rate.
+// Where a display's frequency axis begins: at 20 Hz, or 0 on the linear and mel scales.
+DSP_API double LowestShown(FrequencyScale scale);
+
+// What a display of the settings shows in `rectangle`: from the lowest frequency shown to half the sampling
+// rate.
 DSP_API CoordinatesAndFrequencies SpectrumMap(const RectF& rectangle, const SpectrumSettings& settings,
                                               int samplingRate);
 

@@ -7,17 +7,15 @@
 namespace Corvo {
 namespace {
 
-constexpr double kLowest = 20.0;
 constexpr double kSamePlace = 0.01;  // of a row: what the mapping there and back may lose
 constexpr PixelBins kNoBins{-1, -1, 0.0};
 
 }  // namespace
 
 CoordinatesAndFrequencies SonogramAxis::Map() const {
-    const bool fromZero = scale == FrequencyScale::Linear || scale == FrequencyScale::Mel;
     const bool bands = scale == FrequencyScale::Octaves || scale == FrequencyScale::ThirdOctaves;
-    return {{0.0f, 0.0f, static_cast<float>(height), 1.0f}, fromZero ? 0.0 : kLowest, samplingRate / 2.0,
-            bands ? FrequencyScale::Logarithmic : scale,    LevelScale::Decibels,     1.0f};
+    return {{0.0f, 0.0f, static_cast<float>(height), 1.0f}, LowestShown(scale),   samplingRate / 2.0,
+            bands ? FrequencyScale::Logarithmic : scale,    LevelScale::Decibels, 1.0f};
 }
 
 void SonogramRows::Prepare(const SonogramAxis& axis, int bins) {
