@@ -21,7 +21,7 @@ bool Overlap(const RectF& a, const RectF& b) {
 template <typename Texts>
 void ExpectApartAndInside(const Texts& texts, const RectF& whole) {
     for (std::size_t i = 0; i < texts.size(); ++i) {
-        const auto& [text, box] = texts[i];
+        const auto& [text, box, middle] = texts[i];
         EXPECT_GE(box.x, whole.x - 0.5f) << text;
         EXPECT_GE(box.y, whole.y - 0.5f) << text;
         EXPECT_LE(box.x + box.width, whole.x + whole.width + 0.5f) << text;
