@@ -43,8 +43,8 @@ struct TextKey {
     bool operator==(const TextKey&) const = default;
 };
 
-// A picture needs a few colours and widths, and 220 texts on a display of 3840x2160 with note names: enough
-// for two such.
+// A picture needs a few colours and widths; up to 220 texts on a display of 3840x2160, and there is room for
+// two such pictures.
 constexpr std::size_t kKeptInks = 32, kKeptStrokes = 32, kKeptTexts = 512;
 
 inline std::size_t CombinedHash(std::size_t a, std::size_t b) { return a * 31 + b; }
