@@ -21,7 +21,6 @@ public:
     int SearchMaximunInRange(int start, int end, double limit, double& prominence) const;
 
     const std::vector<double>& Values() const { return m_product; }
-    std::vector<double>& Values() { return m_product; }
 
 private:
     std::vector<double> m_product;

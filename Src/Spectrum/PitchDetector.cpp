@@ -12,8 +12,14 @@ void PitchDetector::Initialise(const SpectrumFormat& format) {
     m_denoised.reserve(format.bins);
 }
 
+void PitchDetector::MeasureFloor(std::span<const float> power, bool keepDenoised) {
+    m_peaks.MeasureFloor(power);
+    m_denoised.resize(keepDenoised ? power.size() : 0);
+    if (keepDenoised) m_peaks.RemoveFloor(power, m_denoised);
+}
+
 std::span<const SpectralPeak> PitchDetector::Peaks(std::span<const float> power) {
-    return m_peaks.FilterPeaks(power, m_sensitivity, {});
+    return m_peaks.FilterPeaks(power, power, m_sensitivity);
 }
 
 Pitch PitchDetector::InterpolatePitchAndAssignOutputValues(std::span<const SpectralPeak> peaks,

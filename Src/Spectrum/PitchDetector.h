@@ -20,11 +20,13 @@ class PitchDetector {
 public:
     void SetSensitivity(const TunerSensitivity& sensitivity) { m_sensitivity = sensitivity; }
     const TunerSensitivity& Sensitivity() const { return m_sensitivity; }
-    // Before every analysis; allocates only when the format changed.
+    // Before every analysis, in this order. The first allocates only when the format changed; the second
+    // measures the floor of the spectrum to analyse, and with `keepDenoised` keeps that spectrum without it.
     void Initialise(const SpectrumFormat& format);
+    void MeasureFloor(std::span<const float> power, bool keepDenoised);
 
     // Of the peaks above the floor, the fundamental that explains them best. With `denoise` they are those of
-    // the spectrum without its floor, which is kept.
+    // the spectrum without its floor, which must have been kept.
     Pitch TuneHPSdenoise(std::span<const float> power, bool denoise);
     // The maximum of the harmonic product over five spectra, by the letter: weak where the fundamental is
     // missing or an overtone of an overtone takes over.
@@ -36,6 +38,7 @@ public:
     // Two-way mismatch: the candidate with the least distances from its partials to the peaks and back.
     Pitch TuneTWMorig(std::span<const float> power);
 
+    // Empty unless it was kept at the last analysis.
     const std::vector<float>& Denoised() const { return m_denoised; }
 
 private:

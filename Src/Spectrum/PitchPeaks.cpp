@@ -36,7 +36,7 @@ double PitchPeaks::InterpolateMax(std::span<const float> power, std::size_t bin)
     return static_cast<double>(bin) + m_interpolation.InterpolateMax(power.data() + bin);
 }
 
-void PitchPeaks::Collect(std::span<const float> power, const TunerSensitivity& sensitivity) {
+float PitchPeaks::Collect(std::span<const float> power, const TunerSensitivity& sensitivity) {
     m_peaks.clear();
     const float above = kFloorPerMean * PowerRatio(sensitivity.partialDb);
     const auto binOf = [this](float hz) {
@@ -50,6 +50,12 @@ void PitchPeaks::Collect(std::span<const float> power, const TunerSensitivity& s
     for (std::size_t k = first; k < last; ++k)
         if (p[k] > above * floor[k] && p[k] >= p[k - 1] && p[k] > p[k + 1])
             m_peaks.push_back({k, 0.0, 0.0, p[k], 0.0f, 0.0f});
+    // Not from the slope of what lies below all bins searched, like a constant offset.
+    std::size_t from = first;
+    while (from < last && p[from] < p[from - 1]) ++from;
+    float loudest = 0.0f;
+    for (std::size_t k = from; k < last; ++k) loudest = std::max(loudest, p[k]);
+    return loudest;
 }
 
 void PitchPeaks::DropLeakage() {
@@ -78,20 +84,20 @@ void PitchPeaks::KeepMostImportant() {
               [](const SpectralPeak& a, const SpectralPeak& b) { return a.bin < b.bin; });
 }
 
+void PitchPeaks::MeasureFloor(std::span<const float> power) {
+    if (m_format.bins >= 3) m_floor.Measure(power, m_floorLevels);
+}
+
+void PitchPeaks::RemoveFloor(std::span<const float> power, std::span<float> clean) const {
+    for (std::size_t k = 0; k < m_format.bins; ++k)
+        clean[k] = std::max(power[k] - kFloorPerMean * m_floorLevels[k], 0.0f);
+}
+
 std::span<const SpectralPeak> PitchPeaks::FilterPeaks(std::span<const float> power,
-                                                      const TunerSensitivity& sensitivity,
-                                                      std::span<float> clean) {
+                                                      std::span<const float> seen,
+                                                      const TunerSensitivity& sensitivity) {
     if (m_format.bins < 3) return {};
-    m_floor.Measure(power, m_floorLevels);
-    if (clean.empty()) {
-        Collect(power, sensitivity);
-    } else {
-        for (std::size_t k = 0; k < m_format.bins; ++k)
-            clean[k] = std::max(power[k] - kFloorPerMean * m_floorLevels[k], 0.0f);
-        Collect(clean, sensitivity);
-    }
-    float strongest = 0.0f;
-    for (const SpectralPeak& peak : m_peaks) strongest = std::max(strongest, peak.power);
+    const float strongest = Collect(seen, sensitivity);
     const float weakest = strongest / PowerRatio(sensitivity.rangeDb);
     std::erase_if(m_peaks, [&](const SpectralPeak& peak) {
         return !(peak.power >= weakest && peak.power >= m_silence);

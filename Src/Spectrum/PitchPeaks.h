@@ -33,21 +33,27 @@ struct SpectralPeak {
 inline constexpr std::size_t kMostPeaks = 32;
 
 // Finds the partials in a power spectrum: local maxima above the noise and above what leaks from stronger
-// ones, no more than the sensitivity's range below the strongest.
+// ones, no more than the sensitivity's range below the loudest bin. That need not be a partial: where noise
+// is louder than they are, as in many an attack, there is none.
 class PitchPeaks {
 public:
     void Initialise(const SpectrumFormat& format);
-    // At most kMostPeaks, by frequency; valid until the next call. With `clean`, a spectrum as long as
-    // `power`, also writes what stands above the floor there, and finds the peaks in that.
-    std::span<const SpectralPeak> FilterPeaks(std::span<const float> power,
-                                              const TunerSensitivity& sensitivity, std::span<float> clean);
+    // First of all for a spectrum: finds its floor, of which the others make use.
+    void MeasureFloor(std::span<const float> power);
+    // Writes what stands above the floor, as many bins as the spectrum has.
+    void RemoveFloor(std::span<const float> power, std::span<float> clean) const;
+    // At most kMostPeaks, by frequency; valid until the next call. They are sought in `seen`, which is
+    // `power` itself or what RemoveFloor made of it.
+    std::span<const SpectralPeak> FilterPeaks(std::span<const float> power, std::span<const float> seen,
+                                              const TunerSensitivity& sensitivity);
 
     // The position of the partial whose local maximum is at `bin`, 1 .. bins - 2.
     double InterpolateMax(std::span<const float> power, std::size_t bin) const;
     const SpectrumFormat& Format() const { return m_format; }
 
 private:
-    void Collect(std::span<const float> power, const TunerSensitivity& sensitivity);
+    // Returns the largest power at the frequencies that the sensitivity seeks, of a peak or not.
+    float Collect(std::span<const float> power, const TunerSensitivity& sensitivity);
     void DropLeakage();
     void KeepMostImportant();
 

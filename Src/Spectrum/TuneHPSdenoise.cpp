@@ -6,9 +6,7 @@ namespace Corvo {
 // harmonic product over the cleaned spectrum, whose absent factors are 1. What the bare product lacks is the
 // comparison with all that a candidate leaves unexplained and with the partials that it wants in vain.
 Pitch PitchDetector::TuneHPSdenoise(std::span<const float> power, bool denoise) {
-    if (denoise) m_denoised.resize(power.size());
-    const auto peaks = m_peaks.FilterPeaks(power, m_sensitivity,
-                                           denoise ? std::span<float>(m_denoised) : std::span<float>());
+    const auto peaks = m_peaks.FilterPeaks(power, denoise ? m_denoised : power, m_sensitivity);
     const double best =
         BestCandidate(peaks, [&](double candidate) { return HarmonicMatching(peaks, candidate); });
     return InterpolatePitchAndAssignOutputValues(peaks, best);

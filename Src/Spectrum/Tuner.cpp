@@ -18,8 +18,14 @@ constexpr int kNamings = 3;
 constexpr float kDefaultQuantum = 2.0f;
 constexpr std::array kQuantumPresets{0.1f, 0.5f, 1.0f, 2.0f, 5.0f, 10.0f};
 constexpr double kRefreshRate = 30.0;
+// Of two analyses, where each refresh brings one: some displays refresh after 30 ms.
+constexpr double kShortestPeriod = 0.030;
 constexpr double kStableSeconds = 0.5;
 constexpr double kStableOctaves = 10.0 / 1200.0;
+// The first analysis of an attack often hears its noise, the second one the note.
+constexpr int kFirstConfirmations = 2;
+// An analysis this much later than its hop says, in refreshes, is taken to be missing: hosts feed in blocks.
+constexpr double kLate = 8.0;
 
 constexpr const char* kNoteNames[kNamings][12] = {
     {"A", "A#", "B", "C", "C#", "D", "D#", "E", "F", "F#", "G", "G#"},
@@ -36,11 +42,6 @@ struct Choices {
 Choices g_choices;
 
 bool Within(int index, std::size_t count) { return index >= 0 && static_cast<std::size_t>(index) < count; }
-
-// Refreshes counted in analyses, of which there may be fewer.
-int Analyses(int refreshes, double framePeriod) {
-    return std::max(static_cast<int>(std::ceil(refreshes / (kRefreshRate * framePeriod))), 1);
-}
 
 }  // namespace
 
@@ -70,8 +71,11 @@ void Tuner::SetTunedQuantumPreset(int preset) {
 }
 
 void Tuner::SetSensibilityPreset(int preset) {
-    if (Within(preset, kTunerSensitivities.size())) m_sensitivity = preset;
-    m_presetChosen = true;
+    if (Within(preset, kTunerSensitivities.size())) {
+        m_sensitivity = preset;
+        m_presetChosen = true;
+    }
+    Forget();
 }
 int Tuner::GetSensibilityPreset() const {
     return kTunerSensitivities[static_cast<std::size_t>(m_sensitivity)].values.reported;
@@ -85,11 +89,17 @@ const char* Tuner::GetSensibilityPresetName(int preset) {
 void Tuner::SetDisplayListener(TunerDisplayListener* listener) { m_displayListener = listener; }
 void Tuner::SetWindowType(int type) { m_windowType = type; }
 
+void Tuner::Forget() {
+    m_forgetAsked = true;
+    ClearShown();
+}
+
 bool Tuner::IsTuned() const { return GetNote() >= 0; }
 bool Tuner::IsTunedCentered() const { return IsTuned() && std::abs(GetErrorCents()) < GetTunedQuantum(); }
 bool Tuner::IsTracking() const { return m_tracking; }
-int Tuner::GetNote() const { return m_note; }
-int Tuner::GetOctave() const { return m_octave; }
+TunedNote Tuner::GetTunedNote() const { return m_shown; }
+int Tuner::GetNote() const { return GetTunedNote().note; }
+int Tuner::GetOctave() const { return GetTunedNote().octave; }
 double Tuner::GetFrequency() const { return m_frequency; }
 double Tuner::GetHeardFrequency() const { return m_heardFrequency; }
 float Tuner::GetErrorCents() const { return m_cents; }
@@ -120,20 +130,19 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
     if (power.empty() || fftLength < 2 || samplingRate < 1) return false;
     const Corvo::DenormalGuard denormals;
     CookNotesFrequencies(false);
-    if (m_presetChosen.exchange(false)) {
-        m_detector->SetSensitivity(kTunerSensitivities[static_cast<std::size_t>(m_sensitivity)].values);
-        ResetPeakMemories(true);
-    }
+    DoAsAsked();
     const int window = windowLength >= 1 ? std::min(windowLength, fftLength) : fftLength;
     const std::size_t bins = std::min(power.size(), static_cast<std::size_t>(fftLength / 2));
     m_detector->Initialise({fftLength, window, m_windowType, samplingRate, bins});
     const std::span<const float> spectrum(power.data(), bins);
 
+    m_detector->MeasureFloor(spectrum, denoise || g_choices.showDenoised);
+
     const auto detect = [&]() -> Corvo::Pitch {
         if (denoise) return m_detector->TuneHPSdenoise(spectrum, true);
         switch (g_choices.method) {
             case 0:
-                return m_detector->TuneHPSdenoise(spectrum, g_choices.showDenoised);
+                return m_detector->TuneHPSdenoise(spectrum, false);
             case 1:
                 return m_detector->TuneHPS(spectrum, halveHarmonics);
             case 2:
@@ -145,76 +154,101 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
         }
     };
     const auto [hz, prominence] = detect();
-    const int hop = hopLength >= 1 ? hopLength : window;
-    Follow(hz, prominence, std::max(static_cast<double>(hop) / samplingRate, 1.0 / kRefreshRate));
-    return m_note != m_announcedNote || m_octave != m_announcedOctave;
+    const double seconds = static_cast<double>(hopLength >= 1 ? hopLength : window) / samplingRate;
+    m_period = std::max(kRefreshRate * seconds, 1.0);
+    Follow(hz, prominence, std::max(seconds, kShortestPeriod));
+    m_waited = 0.0;
+    return GetTunedNote() != m_announced;
+}
+
+bool Tuner::Wait() {
+    DoAsAsked();
+    m_waited += 1.0;
+    if (m_waited > m_period + kLate) {
+        m_heardFrequency = 0.0;
+        m_otherCount = 0;
+        Miss(m_missed + m_waited);
+    }
+    return GetTunedNote() != m_announced;
 }
 
 void Tuner::Announce() {
-    m_announcedNote = m_note;
-    m_announcedOctave = m_octave;
-    if (TunerDisplayListener* const listener = m_displayListener) listener->NoteChanged(m_announcedNote >= 0);
+    const TunedNote shown = GetTunedNote();
+    if (TunerDisplayListener* const listener = m_displayListener) listener->NoteChanged(shown.note >= 0);
+    m_announced = shown;
 }
 
-// The note shown follows the pitch at once; another replaces it only when it has been heard often enough, or
-// at once where there was none.
-void Tuner::Follow(double hz, float prominence, double framePeriod) {
+void Tuner::DoAsAsked() {
+    if (m_presetChosen.exchange(false))
+        m_detector->SetSensitivity(kTunerSensitivities[static_cast<std::size_t>(m_sensitivity)].values);
+    if (m_forgetAsked.exchange(false)) ResetPeakMemories(true);
+}
+
+// The note shown follows the pitch at once; another replaces it only when it has been heard often enough.
+void Tuner::Follow(double hz, float prominence, double seconds) {
     const Corvo::TunerSensitivity& sensitivity = m_detector->Sensitivity();
     const bool heard = hz > 0.0;
     const Corvo::NearestNote nearest = heard ? Corvo::FindNearestNote(hz) : Corvo::NearestNote{};
-    const bool same = heard && nearest.note == m_note && nearest.octave == m_octave;
+    const TunedNote note{nearest.note, nearest.octave}, shown = GetTunedNote();
+    const bool same = heard && note == shown;
     const bool other = heard && !same && prominence >= sensitivity.onsetDb;
-    if (other) {
-        const bool again = nearest.note == m_otherNote && nearest.octave == m_otherOctave;
-        m_otherCount = again ? m_otherCount + 1 : 1;
-        m_otherNote = nearest.note;
-        m_otherOctave = nearest.octave;
-    } else {
-        m_otherCount = 0;
-    }
+    m_otherCount = !other ? 0 : note == m_other ? m_otherCount + 1 : 1;
+    m_other = note;
     m_heardFrequency = same || other ? hz : 0.0;
-    if (same || (other && (m_note < 0 || m_otherCount >= sensitivity.confirmCount))) {
+    const int needed = shown.note < 0 ? kFirstConfirmations
+                                      : static_cast<int>(std::ceil(sensitivity.confirmCount / m_period));
+    if (same || (other && m_otherCount >= needed)) {
         if (!same) ResetPeakMemories(false);
         Hear(hz, prominence, nearest);
-        RememberPitch(hz, framePeriod);
-        return;
+        RememberPitch(hz, seconds);
+    } else if (other) {
+        ForgetPitches();
+    } else {
+        m_missed += std::max(m_period, m_waited);
+        Miss(m_missed);
     }
-    m_pitchCount = 0;
-    m_stableFrequency = 0.0;
-    if (m_note < 0) return;
-    ++m_missed;
-    if (m_missed >= Analyses(sensitivity.holdCount, framePeriod)) m_tracking = false;
-    if (m_missed >= Analyses(sensitivity.releaseCount, framePeriod)) ResetPeakMemories(true);
+}
+
+void Tuner::Miss(double refreshes) {
+    const Corvo::TunerSensitivity& sensitivity = m_detector->Sensitivity();
+    ForgetPitches();
+    if (refreshes >= sensitivity.holdCount) m_tracking = false;
+    if (refreshes >= sensitivity.releaseCount) ResetPeakMemories(true);
 }
 
 void Tuner::Hear(double hz, float prominence, const Corvo::NearestNote& heard) {
-    m_note = heard.note;
-    m_octave = heard.octave;
+    m_shown = TunedNote{heard.note, heard.octave};
     m_frequency = hz;
     m_cents = static_cast<float>(heard.cents);
     m_prominence = prominence;
     m_tracking = true;
-    m_missed = 0;
+    m_missed = 0.0;
 }
 
 void Tuner::ResetPeakMemories(bool forgetNote) {
-    m_otherNote = -1;
+    m_other = {};
     m_otherCount = 0;
+    m_missed = 0.0;
+    ForgetPitches();
+    if (forgetNote) ClearShown();
+}
+
+void Tuner::ForgetPitches() {
     m_pitchCount = 0;
-    m_missed = 0;
     m_stableFrequency = 0.0;
-    if (!forgetNote) return;
-    m_note = -1;
-    m_octave = 0;
-    m_frequency = m_heardFrequency = 0.0;
+}
+
+void Tuner::ClearShown() {
+    m_shown = TunedNote{};
+    m_frequency = m_heardFrequency = m_stableFrequency = 0.0;
     m_cents = 0.0f;
     m_prominence = 0.0f;
     m_tracking = false;
 }
 
-void Tuner::RememberPitch(double hz, double framePeriod) {
+void Tuner::RememberPitch(double hz, double seconds) {
     const int needed =
-        std::clamp(1 + static_cast<int>(std::ceil(kStableSeconds / framePeriod)), 2, kLongestMemory);
+        std::clamp(1 + static_cast<int>(std::ceil(kStableSeconds / seconds)), 2, kLongestMemory);
     m_pitches[static_cast<std::size_t>(m_pitchCount % kLongestMemory)] = std::log2(hz);
     ++m_pitchCount;
     if (m_pitchCount < needed) return;

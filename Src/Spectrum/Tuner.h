@@ -14,6 +14,9 @@ class PitchDetector;
 struct NearestNote;
 }  // namespace Corvo
 
+// Listeners stay the caller's. One that is replaced or taken away may still be called by the command or
+// analysis that is running at that moment, and has to live until then.
+//
 // Told when the notes' frequencies must be worked out again: another temperament or calibration. Called on
 // the thread that changed it, from menu commands with the analysers' class-wide lock held: it must not wait
 // for another thread, and calls no analyser but to post.
@@ -30,11 +33,21 @@ public:
     virtual void NoteChanged(bool present) = 0;
 };
 
+struct TunedNote {
+    int note = -1;   // 0 A .. 11 G#; negative for none
+    int octave = 0;  // changes at C: 440 Hz is the A of octave 4
+    bool operator==(const TunedNote&) const = default;
+};
+
 // Finds the pitch in its analyser's spectra, the nearest note of the chosen temperament and the error.
 //
 // Class-wide choices are shared by every tuner; any thread may read and set them. The sensitivity may be set
-// by any thread, too, and takes effect at the next analysis. Analyses run on the analyser's display thread,
-// one at a time; what they found may be read anywhere, value by value.
+// by any thread, too. Analyses run on the analyser's display thread, one at a time; what they found may be
+// read anywhere, value by value: two values may stem from two analyses.
+//
+// A pitch below some 6 bins of the window (6 sampling rate / window length: 32 Hz with 8192 samples at
+// 44.1 kHz, 70 Hz at 96 kHz) is not told from its own overtones, whatever the sensitivity allows; lower ones
+// want a longer window.
 class DSP_API Tuner {
 public:
     // Silent, with the sensitivity "Standard".
@@ -43,24 +56,28 @@ public:
     Tuner(const Tuner&) = delete;
     Tuner& operator=(const Tuner&) = delete;
 
-    // 0 denoised harmonic product, 1 harmonic product, 2 pseudo harmonic product, 3 legacy, 4 two-way
-    // mismatch. Kept as given; any other value works as 3.
+    // 0 denoised harmonic product: the candidate whose partials, in decibels above the noise floor, explain
+    // most of what is heard, less for partials that are missing. 1 harmonic product, of five spectra. 2
+    // pseudo harmonic product: the largest sum of the first partials' levels. 3 legacy: the strongest partial
+    // or what it is an overtone of. 4 two-way mismatch. Kept as given; any other value works as 3.
     static void SetDetectionMethod(int method);
     static int GetDetectionMethod();
 
-    // Whether the spectrum without its noise floor is made along with each analysis of method 0.
+    // Whether the spectrum without its noise floor is made along with each analysis. Changes nothing in what
+    // is heard.
     static void SetShowDenoisedSpectrum(bool show);
     static bool GetShowDenoisedSpectrum();
 
-    // 0 Equal .. 10 Vallotti; an index outside is stored as 0. A temperament other than the current one marks
-    // it changed and tells the listener; the notes follow at the next CookNotesFrequencies.
+    // 0 Equal .. 10 Vallotti. One other than the current one is marked as changed and told to the listener;
+    // the notes follow at the next CookNotesFrequencies. Negative counts as 0; above 10 it is a change, too,
+    // and stored as 0.
     static void SetTemperament(int temperament);
     static int GetTemperament();
     static bool IsTemperamentChanged();
     // Empty outside 0..10.
     static const char* GetTemperamentName(int temperament);
     static const char* GetCurrentTemperamentName();
-    // The listener stays the caller's; null for none.
+    // Null for none.
     static void SetTuningListener(TuningListener* listener);
 
     // Works out the notes for temperament and calibration, unless neither `force` nor a change asks for it.
@@ -83,13 +100,23 @@ public:
     static void SetTunedQuantumPreset(int preset);
 
     // 0 Standard .. 5 Very high frequencies; an index outside changes no value. Either way the tuner forgets
-    // what it heard. Reading back gives 2 for both Standard and Sensitive.
+    // what it heard: what is shown at once, its memories at the next analysis, when the values take effect.
+    // Reading back gives 2 for both Standard and Sensitive.
+    //
+    // A sensitivity says which pitches are sought; how far above the noise floor a partial must stand to keep
+    // a note alive and how far to begin one, and how far below the loudest it may lie (method 1 has limits of
+    // its own); how long a note is held and when it is dropped; how often another must be heard before it
+    // replaces the note shown (a first one twice in succession); and how many partials method 2 sums.
+    // Choosing method 1 makes these five until a sensitivity is set.
     void SetSensibilityPreset(int preset);
     int GetSensibilityPreset() const;
     // Empty outside 0..5.
     static const char* GetSensibilityPresetName(int preset);
 
-    // The listener stays the caller's; null for none.
+    // Forgets the note and all that led to it. Any thread; the listener is told at the next analysis.
+    void Forget();
+
+    // Null for none.
     void SetDisplayListener(TunerDisplayListener* listener);
 
     // The shape of the window that the spectra come through, as in the analyser's settings (0 rectangular ..
@@ -97,7 +124,7 @@ public:
     void SetWindowType(int type);
 
     // Runs one analysis. `power` holds |bin|^2, unscaled, of `fftLength` samples of which the first
-    // `windowLength` were windowed and the rest, if any, were zero; entry 0 is not looked at. `transform` is
+    // `windowLength` were windowed and the rest, if any, were zero; entry 0 is no pitch. `transform` is
     // the packed spectrum itself, which no method needs. `hopLength` is the number of samples between
     // analyses, one window when below 1. `halveHarmonics` halves the overtones of the harmonic product;
     // `denoise` makes method 0 work on the spectrum without its noise floor, whatever method is chosen.
@@ -107,23 +134,25 @@ public:
 
     // A note is shown. It may have ended a moment ago: the sensitivity says for how long it stays.
     bool IsTuned() const;
-    // It is closer to its place than the tuned quantum.
+    // It is closer to its place than the tuned quantum. False without a note, although the error is 0 then.
     bool IsTunedCentered() const;
     // Whether the note shown was heard only just now.
     bool IsTracking() const;
-    // 0 A .. 11 G#; negative for no note.
+    // Note and octave of the same analysis, and either of them alone: 0 A .. 11 G#, negative for no note; the
+    // octave, 0 without one.
+    TunedNote GetTunedNote() const;
     int GetNote() const;
-    // Of the note, changing at C: 440 Hz is the A of octave 4. 0 without a note.
     int GetOctave() const;
     // The pitch last heard of the note shown, Hz. 0 without a note.
     double GetFrequency() const;
-    // What the last analysis heard, whether or not it is the note shown yet; 0 when it heard nothing. Hz.
+    // What the last analysis heard, whether or not it is the note shown yet; 0 when it heard nothing or none
+    // has come for long. Hz.
     double GetHeardFrequency() const;
     // How far the pitch shown is from the note, positive when sharp. 0 without a note.
     float GetErrorCents() const;
     // By how many decibels the strongest partial (the product, with method 1) stood out. 0 without a note.
     float GetProminence() const;
-    // The mean pitch of the last half second if it stayed within 10 cents, else 0. Hz.
+    // The mean pitch of the last half second or a little more, if it stayed within 10 cents, else 0. Hz.
     double GetStableFrequency() const;
 
     // The name of the note shown; empty for none.
@@ -133,7 +162,8 @@ public:
     std::string GetTuningErrorStr() const;
     static std::string GetTuningErrorStr(float cents);
 
-    // The spectrum without its noise floor, as long as the one analysed; empty until it was asked for.
+    // The spectrum without its noise floor, as long as the one analysed; empty unless the last analysis made
+    // it: with SetShowDenoisedSpectrum, or for its own use.
     // Belongs to the display thread.
     const std::vector<float>& GetDenoisedSpectrum() const;
 
@@ -143,24 +173,32 @@ private:
     // it has let go of its lock.
     bool Analyse(const std::vector<float>& power, int fftLength, int hopLength, int windowLength,
                  int samplingRate, bool halveHarmonics, bool denoise);
+    // Instead of it at a display refresh without a new frame: lets the time pass that a note is held for.
+    bool Wait();
     void Announce();
 
+    void DoAsAsked();
     void ResetPeakMemories(bool forgetNote);
     void Hear(double hz, float prominence, const Corvo::NearestNote& heard);
-    void Follow(double hz, float prominence, double framePeriod);
-    void RememberPitch(double hz, double framePeriod);
+    // `seconds`: since the analysis before.
+    void Follow(double hz, float prominence, double seconds);
+    void RememberPitch(double hz, double seconds);
+    void ForgetPitches();
+    // After so many refreshes without the note shown.
+    void Miss(double refreshes);
+    void ClearShown();
 
-    static constexpr int kLongestMemory = 16;  // analyses in half a second at the display's rate, both ends
+    static constexpr int kLongestMemory = 18;  // analyses in half a second, 30 ms apart, both ends counted
 
     std::unique_ptr<Corvo::PitchDetector> m_detector;
     std::atomic<int> m_sensitivity{0};
     std::atomic<bool> m_presetChosen{true};
+    std::atomic<bool> m_forgetAsked{false};
     std::atomic<TunerDisplayListener*> m_displayListener{nullptr};
     int m_windowType = 4;
 
     // What was found.
-    std::atomic<int> m_note{-1};
-    std::atomic<int> m_octave{0};
+    std::atomic<TunedNote> m_shown{TunedNote{}};
     std::atomic<double> m_frequency{0.0};
     std::atomic<double> m_heardFrequency{0.0};
     std::atomic<float> m_cents{0.0f};
@@ -169,16 +207,19 @@ private:
     std::atomic<bool> m_tracking{false};
 
     // Display thread only.
-    int m_announcedNote = -1, m_announcedOctave = 0;
-    int m_otherNote = -1, m_otherOctave = 0, m_otherCount = 0;  // heard instead of the note shown
-    int m_missed = 0;                                           // analyses without the note shown
-    std::array<double, kLongestMemory> m_pitches{};             // of the note shown, octaves above 1 Hz
+    TunedNote m_announced;
+    TunedNote m_other;  // heard instead of the note shown, so often in succession
+    int m_otherCount = 0;
+    // In refreshes: between analyses, since the last one, and without the note shown up to that.
+    double m_period = 1.0, m_waited = 0.0, m_missed = 0.0;
+    std::array<double, kLongestMemory> m_pitches{};  // of the note shown, octaves above 1 Hz
     int m_pitchCount = 0;
 };
 
-// Takes the pitch that `tuner` hears for the nearest note: moves the calibration base by the note's error, at
-// most 50 cents, and works out the notes. False, with nothing changed, unless the pitch has stayed within 10
-// cents for half a second. Like the reset it tells the tuning listener. Any thread.
+// Takes the pitch that `tuner` hears for the nearest note: moves the calibration base by the note's error,
+// but by at most 50 cents per call, and works out the notes. Where a temperament's notes lie further apart
+// than 100 cents another call may be needed. False, with nothing changed, unless the pitch has stayed within
+// 10 cents for half a second. Like the reset it tells the tuning listener. Any thread.
 DSP_API bool TunerCalibrateNow(const Tuner& tuner);
 DSP_API void TunerCalibrateReset();
 DSP_API bool TunerIsNonstandardCalibration();

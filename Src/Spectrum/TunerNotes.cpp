@@ -55,9 +55,10 @@ TuningListener::~TuningListener() = default;
 
 void Tuner::SetTemperament(int temperament) {
     Notes& notes = Shared();
+    temperament = std::max(temperament, 0);
     if (temperament == notes.temperament) return;
     // Stored before it is announced, or a display thread could cook the old one.
-    notes.temperament = temperament >= 0 && temperament < Corvo::kTemperaments ? temperament : 0;
+    notes.temperament = temperament < Corvo::kTemperaments ? temperament : 0;
     notes.changed = true;
     if (TuningListener* const listener = notes.listener) listener->NotesMustBeRecomputed();
 }

@@ -12,14 +12,14 @@ namespace Corvo {
 //   rangeDb              partials this far below the strongest one count for nothing
 //   releaseCount         refreshes without the note until it is dropped
 //   holdCount            refreshes without the note for which the tuner still counts as tracking it
-//   confirmCount         analyses in succession that must hear another note before it replaces the one shown
-//   harmonics            spectra multiplied by the harmonic product, partials summed by the pseudo product
+//   confirmCount         refreshes in succession that must hear another note before it replaces the one shown
+//   harmonics            partials summed by the pseudo harmonic product (method 2)
 //   reported             what GetSensibilityPreset gives
 //
 // The noise floor is what one bin of noise in seven exceeds (twice the mean power), so that the loudest of a
 // spectrum's thousands of noise bins reaches about 6 dB. Refreshes are thirtieths of a second; with analyses
-// further apart as many of these as take as long. The harmonic product proper (method 1) has fixed limits
-// instead of the three in decibels and takes the first four values only where they are frequencies.
+// further apart as many of these as take as long. The harmonic product proper (method 1) has limits of its
+// own instead of the three in decibels, multiplies five spectra and leaves its five in `harmonics`.
 struct TunerSensitivity {
     float lowestHz, highestHz;
     float partialDb, onsetDb, rangeDb;

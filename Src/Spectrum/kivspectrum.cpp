@@ -149,6 +149,7 @@ void kivspectrum::init() {
 void kivspectrum::allocate(int reset) {
     const Lock classLock(AnalyserLock());
     const Lock instanceLock(m_instanceLock);
+    m_powerIsFrame = false;
     if (m_order != m_fftOrder) {
         m_fft.Free();
         if (m_order != kNoOrder) m_fft.AllocateReal(m_builtFftLength, 0);
@@ -225,6 +226,7 @@ bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, boo
         const Corvo::DenormalGuard denormals;
         PerformFFT();
         ComputePower();
+        m_powerIsFrame = true;
         if (samplingRate != m_drawer->GetSamplingFrequency()) m_drawer->UpdateSamplingFrequency(samplingRate);
         UpdateDrawer(current);
         m_drawer->SmoothFftSpectrum(
@@ -251,21 +253,33 @@ bool kivspectrum::GetFFTFor3DSonogram(int samplingRate, const std::vector<float>
 
 bool kivspectrum::Refresh() {
     const bool prepared = PrepareFFTForDrawingHelper(m_showSonogram, false);
-    if (prepared && m_tunerOn) RunTuner(m_samplingRate);
-    return AdvanceSonogram() || prepared;
+    bool noteGone = false;
+    if (m_tunerOn && prepared) RunTuner(m_samplingRate);
+    if (m_tunerOn && !prepared && !m_frozen) noteGone = LetTunerWait();
+    return AdvanceSonogram() || prepared || noteGone;
 }
 
-// The tuner reads buffers that a menu command may rebuild; its listener is told without the lock, since it
-// may answer with a command.
+// The tuner reads buffers that a menu command may rebuild, even in answer to the frame's message: then there
+// is nothing to tune until the next frame. Its listener is told without the lock for the same reason.
 void kivspectrum::RunTuner(int samplingRate) {
     bool changed = false;
     {
         const Lock instanceLock(m_instanceLock);
+        if (!m_powerIsFrame) return;
         m_tuner->SetWindowType(m_builtWindowType);
         changed = m_tuner->Analyse(m_power, m_builtFftLength, m_builtHopLength, m_builtWindowLength,
                                    samplingRate, true, false);
     }
-    if (!changed) return;
+    if (changed) TellOfNote();
+}
+
+bool kivspectrum::LetTunerWait() {
+    const bool changed = m_tuner->Wait();
+    if (changed) TellOfNote();
+    return changed;
+}
+
+void kivspectrum::TellOfNote() {
     m_tuner->Announce();
     Tell(kMessageNoteChanged, m_tuner->IsTuned() ? 1 : 0);
 }

@@ -157,7 +157,8 @@ public:
                              bool probeOnly);
     // One display refresh, 30 times a second: prepares a frame when new samples came, smoothed at the
     // sonogram's speed while that is shown, tunes when the tuner is on, and advances the sonogram; at the
-    // stored rate. True when there is something new to draw.
+    // stored rate. Without new samples time passes for the tuner, whose note goes after a while, unless the
+    // analyser is frozen. True when there is something new to draw.
     bool Refresh();
     // The sonogram's part of a refresh: its step, with the pitch that the tuner hears, while it is shown and
     // the analyser runs. True when the picture has new columns, which it has without a new frame, too.
@@ -181,6 +182,7 @@ public:
 
     void SetOn(bool on);
     bool GetOn() const;
+    // Switched on, the tuner has forgotten what it heard.
     void SetTunerOn(bool on);
     bool GetTunerOn() const;
     // Switches the tuner off when it runs, else tuner and analyser on, with fresh buffers.
@@ -262,6 +264,8 @@ private:
     float SmoothingCoefficient(bool fastSmoothing, bool sonogramMode, bool sonogramOverride) const;
     void UpdateDrawer(const spectrum_settings& current);
     void RunTuner(int samplingRate);
+    bool LetTunerWait();
+    void TellOfNote();
     void Tell(int message, std::intptr_t detail);
 
     mutable Corvo::CriticalSection m_instanceLock;
@@ -272,6 +276,7 @@ private:
     std::int32_t m_builtWindowType = -1;
     std::int32_t m_builtWindowLength = 0;
     std::int32_t m_builtHopLength = 0;
+    bool m_powerIsFrame = false;  // m_power was made since the buffers were built
 
     std::unique_ptr<Corvo::CaptureBuffer> m_capture;
     std::vector<float> m_samples;    // the copy that an analysis works on

@@ -32,6 +32,7 @@ void kivspectrum::SetOn(bool on) {
 bool kivspectrum::GetOn() const { return m_on; }
 
 void kivspectrum::SetTunerOn(bool on) {
+    if (on) m_tuner->Forget();
     m_tunerOn = on;
     m_tunerVisible = on;
 }

@@ -60,6 +60,17 @@ public:
     }
     // Hop 1: every analysis counts as one refresh.
     void Tune(const float* samples, bool denoise = false) { Tune(Transform(samples), denoise); }
+    // A first note needs two analyses.
+    void Show(const float* samples, bool denoise = false) {
+        Tune(samples, denoise);
+        Tune(samples, denoise);
+    }
+    // What one analysis hears, whatever came before.
+    double Hear(const float* samples) {
+        tuner.Forget();
+        Tune(samples);
+        return tuner.GetHeardFrequency();
+    }
     void Tune(const std::vector<float>& power, bool denoise = false) {
         tuner.Tune(power, m_transform, static_cast<int>(m_transform.size()), 1, m_windowLength, m_rate, true,
                    denoise);

@@ -132,7 +132,7 @@ TEST_F(TunerTest, FindsTheNearestNote) {
           Case{440.0 * std::exp2(0.7 / 12), "A#", 4, -30.0}, Case{65.40639, "C", 2, 0.0},
           Case{51.91309, "G#", 1, 0.0}, Case{4186.009, "C", 8, 0.0}}) {
         TunerProbe probe(kRate);
-        probe.Tune(Sine(c.hz).data());
+        probe.Show(Sine(c.hz).data());
         EXPECT_STREQ(probe.tuner.GetTunedNoteName(), c.name) << c.hz;
         EXPECT_EQ(probe.tuner.GetOctave(), c.octave) << c.hz;
         EXPECT_NEAR(probe.tuner.GetErrorCents(), c.cents, 0.1) << c.hz;
@@ -141,7 +141,7 @@ TEST_F(TunerTest, FindsTheNearestNote) {
     // E is 2 cents higher there.
     Tuner::SetTemperament(1);
     TunerProbe probe(kRate);
-    probe.Tune(Sine(660.0).data());
+    probe.Show(Sine(660.0).data());
     EXPECT_NEAR(probe.tuner.GetErrorCents(), 0.0, 0.05);
 }
 
@@ -149,7 +149,7 @@ TEST_F(TunerTest, FindsTheNearestNote) {
 TEST_F(TunerTest, CentresWithinTheQuantum) {
     TunerProbe probe(kRate);
     EXPECT_FALSE(probe.tuner.IsTuned() || probe.tuner.IsTunedCentered());
-    probe.Tune(Sine(440.0 * std::exp2(-1.5 / 1200)).data());
+    probe.Show(Sine(440.0 * std::exp2(-1.5 / 1200)).data());
     ASSERT_TRUE(probe.tuner.IsTuned());
     const float error = std::abs(probe.tuner.GetErrorCents());
     Tuner::SetTunedQuantum(error);
@@ -172,8 +172,8 @@ struct Waiting {
     int preset, release, hold, confirm;
 };
 
-// A first note appears at once, another when it has been confirmed, none when it has been missing for long
-// enough; until then note and error stay as they were.
+// A first note appears when it is heard twice in succession, another when it has been confirmed, none when it
+// has been missing for long enough; until then note and error stay as they were.
 TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
     const auto a = Sine(440.0), b = Sine(494.0), c = Sine(523.0), silence = std::vector<float>(kLength);
     for (const Waiting& w : {Waiting{0, 60, 40, 3}, Waiting{1, 40, 25, 6}, Waiting{2, 60, 40, 2},
@@ -186,7 +186,9 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
         const auto times = [&](int count, const std::vector<float>& samples) {
             for (int i = 0; i < count; ++i) probe.Tune(samples.data());
         };
-        times(1, a);
+        for (const auto* sound : {&a, &silence, &a, &b}) times(1, *sound);
+        EXPECT_FALSE(tuner.IsTuned()) << w.preset;
+        times(2, a);
         EXPECT_EQ(tuner.GetNote(), 0) << w.preset;
         times(w.confirm - 1, b);
         times(1, c);
@@ -209,15 +211,22 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
         EXPECT_FALSE(tuner.IsTuned()) << w.preset;
         EXPECT_EQ(tuner.GetFrequency(), 0.0);
         EXPECT_EQ(display.heard, "++-") << w.preset;
-        // Choosing a preset, even one that is none, forgets the note.
-        times(1, a);
+        // Choosing a preset, even one that is none, forgets the note, and what was on its way to being one.
+        times(2, a);
+        EXPECT_TRUE(tuner.IsTuned());
         tuner.SetSensibilityPreset(6);
-        times(1, silence);
+        EXPECT_FALSE(tuner.IsTuned() || tuner.IsTracking() || tuner.GetHeardFrequency() > 0.0);
+        EXPECT_EQ(display.heard, "++-+");
+        times(1, a);
         EXPECT_FALSE(tuner.IsTuned());
+        EXPECT_EQ(display.heard, "++-+-");
+        times(1, a);
+        EXPECT_TRUE(tuner.IsTuned());
     }
 }
 
-// Takes a steady pitch for the nearest note, one that wanders by more than 10 cents for nothing.
+// Takes a steady pitch for the nearest note, one that wanders by more than 10 cents for nothing. Refreshed
+// every 30 ms, half a second is 18 analyses from the one that shows the note, which is the second.
 TEST_F(TunerTest, Calibrates) {
     EXPECT_EQ(TunerGetNumLines(), 2);
     struct Case {
@@ -226,8 +235,8 @@ TEST_F(TunerTest, Calibrates) {
         bool done;
     };
     Listener listener;
-    for (const Case& c : {Case{20, 0, 20, 16, true}, Case{20, 0, 0, 14, false}, Case{-30, 4.5, -30, 16, true},
-                          Case{-30, 5.5, 0, 16, false}, Case{1260, 0, -40, 16, true}}) {
+    for (const Case& c : {Case{20, 0, 20, 19, true}, Case{20, 0, 0, 18, false}, Case{-30, 4.5, -30, 19, true},
+                          Case{-30, 5.5, 0, 19, false}, Case{1260, 0, -40, 19, true}}) {
         TunerCalibrateReset();
         TunerProbe probe(kRate);
         for (int i = 0; i < c.frames; ++i)
