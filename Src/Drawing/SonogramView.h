@@ -131,9 +131,12 @@ void Sonogram::DrawPitchTrace(typename Drawing::DrawTarget& target, const RectF&
             before = pitch;
         }
         const auto count = static_cast<int>(m_trace.size());
+        if (count == 0) {
+            ++column;
+            continue;
+        }
         target.Polyline(m_trace.data(), count, {{Look::kGround, 200}, 2.0f * width});
         target.Polyline(m_trace.data(), count, {{Look::kTrace}, width});
-        if (count == 0) ++column;
     }
     target.PopClip();
 }

@@ -257,7 +257,9 @@ void kivspectrum::DrawTunerLine(typename Drawing::DrawTarget& target, const Corv
                 {centred ? Look::kInTune
                  : tuned ? Look::kText
                          : Look::kLabel});
-    const float pitch = height * 0.55f, width = height / 4.0f, first = 1.5f * height;
+    // Whole pixels, as the images are.
+    const float pitch = std::round(height * 0.55f), width = std::floor(height / 4.0f);
+    const float first = std::round(1.5f * height), middle = std::round(centre.x);
     const float cents = m_tuner->GetErrorCents();
     for (int bar = 0; bar < kTunerBars; ++bar)
         for (const bool left : {true, false}) {
@@ -266,9 +268,10 @@ void kivspectrum::DrawTunerLine(typename Drawing::DrawTarget& target, const Corv
                                     : left ? baseItemsMinimized_L
                                            : baseItemsMinimized_R;
             const float away = first + pitch * static_cast<float>(bar);
-            target.Bitmap(*items[static_cast<std::size_t>(bar)],
-                          {centre.x + (left ? -away - width : away), centre.y - height / 2.0f, width, height},
-                          255);
+            target.Bitmap(
+                *items[static_cast<std::size_t>(bar)],
+                {middle + (left ? -away - width : away), std::round(centre.y - height / 2.0f), width, height},
+                255);
         }
 }
 
