@@ -1,6 +1,7 @@
 #include "Spectrum/PitchPeaks.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 
 namespace Corvo {
@@ -17,6 +18,18 @@ constexpr float kLeakageMargin = 2.0f;
 // partial (its neighbours' skirts, its own decay).
 constexpr double kNoiseVariance = 0.15;
 constexpr double kOtherVariance = 0.004 * 0.004;
+
+// In lanes, or the compiler would have to keep the order of the comparisons.
+float Loudest(std::span<const float> power) {
+    constexpr std::size_t kLanes = 8;
+    std::array<float, kLanes> lanes{};
+    const std::size_t whole = power.size() - power.size() % kLanes;
+    for (std::size_t k = 0; k < whole; k += kLanes)
+        for (std::size_t lane = 0; lane < kLanes; ++lane)
+            lanes[lane] = std::max(lanes[lane], power[k + lane]);
+    for (std::size_t k = whole; k < power.size(); ++k) lanes[0] = std::max(lanes[0], power[k]);
+    return *std::max_element(lanes.begin(), lanes.end());
+}
 
 float PowerRatio(float decibels) { return std::pow(10.0f, 0.1f * decibels); }
 
@@ -53,9 +66,7 @@ float PitchPeaks::Collect(std::span<const float> power, const TunerSensitivity& 
     // Not from the slope of what lies below all bins searched, like a constant offset.
     std::size_t from = first;
     while (from < last && p[from] < p[from - 1]) ++from;
-    float loudest = 0.0f;
-    for (std::size_t k = from; k < last; ++k) loudest = std::max(loudest, p[k]);
-    return loudest;
+    return from < last ? Loudest({p + from, last - from}) : 0.0f;
 }
 
 void PitchPeaks::DropLeakage() {
