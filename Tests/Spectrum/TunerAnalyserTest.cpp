@@ -66,6 +66,115 @@ TEST_F(TunerAnalyserTest, TunesEveryFrameWhileOn) {
     kivspectrum::GetStaticInfo().SetMessagePoster(nullptr);
 }
 
+// Answers a frame by choosing a window twice as long, whose spectrum has each frequency at twice the bin.
+struct Resizer : MessagePoster {
+    explicit Resizer(kivspectrum& analyser) : m_analyser(analyser) {}
+    void Post(int message, std::intptr_t, std::intptr_t) override {
+        if (message == kMessageFrameReady) m_analyser.popupmenu_process(1227);
+    }
+    void Send(int, std::intptr_t, std::intptr_t) override {}
+
+private:
+    kivspectrum& m_analyser;
+};
+
+TEST_F(TunerAnalyserTest, SkipsAFrameWhoseBuffersWereRebuilt) {
+    kivspectrum analyser;
+    analyser.ToggleTuner();
+    Resizer resizer(analyser);
+    kivspectrum::GetStaticInfo().SetMessagePoster(&resizer);
+    double heard = 0.0;
+    for (const std::size_t length : {8192u, 16384u}) {
+        EXPECT_EQ(heard, 0.0);
+        Feed(analyser, TestSupport::Sine<float>(length, 440.0, kRate));
+        EXPECT_TRUE(analyser.GetFFTFor3DSonogram(kRate, nullptr, true, false));
+        heard = analyser.GetTuner()->GetHeardFrequency();
+    }
+    EXPECT_NEAR(heard, 440.0, 0.01);
+    kivspectrum::GetStaticInfo().SetMessagePoster(nullptr);
+}
+
+// Windows of 8192 without overlap bring a frame at every sixth refresh. A running tuner keeps its note and
+// takes another at its first frame; when the sound stops time goes on: 40 refreshes of tracking, the note for
+// 60. Frozen, it stays.
+TEST_F(TunerAnalyserTest, LetsTimePassWithoutFrames) {
+    kivspectrum analyser;
+    analyser.ToggleTuner();
+    analyser.set_parameters(kRate);
+    const Tuner& tuner = *analyser.GetTuner();
+    const auto refresh = [&](int times) {
+        for (int i = 0; i < times; ++i) analyser.Refresh();
+    };
+    const auto play = [&](double hz, int frames) {
+        for (int frame = 0; frame < frames; ++frame) {
+            Feed(analyser, TestSupport::Sine<float>(8192, hz, kRate));
+            refresh(6);
+            EXPECT_EQ(tuner.IsTracking(), frame > 0 || tuner.GetNote() >= 0) << frame;
+        }
+    };
+    play(440.0, 10);
+    EXPECT_GT(tuner.GetStableFrequency(), 0.0);
+    play(494.0, 1);
+    EXPECT_EQ(tuner.GetNote(), 2);
+    play(494.0, 10);
+    // Five of the refreshes without a frame have passed.
+    refresh(40 - 5 - 1);
+    EXPECT_TRUE(tuner.IsTracking());
+    EXPECT_FALSE(TunerCalibrateNow(tuner));
+    EXPECT_EQ(tuner.GetHeardFrequency(), 0.0);
+    refresh(1);
+    EXPECT_FALSE(tuner.IsTracking());
+    refresh(60 - 40 - 1);
+    EXPECT_TRUE(tuner.IsTuned());
+    analyser.SetFrozen(true);
+    refresh(100);
+    EXPECT_TRUE(tuner.IsTuned());
+    analyser.SetFrozen(false);
+    EXPECT_TRUE(analyser.Refresh());
+    EXPECT_FALSE(tuner.IsTuned());
+}
+
+// However it is switched on.
+TEST_F(TunerAnalyserTest, ForgetsOldNotesWhenSwitchedOn) {
+    kivspectrum analyser;
+    analyser.ToggleTuner();
+    const Tuner& tuner = *analyser.GetTuner();
+    void (*const switches[])(kivspectrum&, bool) = {[](kivspectrum& a, bool on) { a.SetTunerOn(on); },
+                                                    [](kivspectrum& a, bool) { a.ToggleTuner(); },
+                                                    [](kivspectrum& a, bool) { a.popupmenu_process(1283); }};
+    for (const auto& turn : switches) {
+        for (int i = 0; i < 2; ++i) {
+            Feed(analyser, TestSupport::Sine<float>(8192, 440.0, kRate));
+            analyser.GetFFTFor3DSonogram(kRate, nullptr, true, false);
+        }
+        EXPECT_TRUE(tuner.IsTuned());
+        turn(analyser, false);
+        turn(analyser, true);
+        EXPECT_TRUE(analyser.GetTunerOn());
+        EXPECT_FALSE(tuner.IsTuned());
+    }
+}
+
+// The harmonic product's overtones count half.
+TEST_F(TunerAnalyserTest, HalvesOvertones) {
+    Tuner::SetDetectionMethod(1);
+    kivspectrum analyser;
+    analyser.ToggleTuner();
+    for (int i = 0; i < 2; ++i) {
+        Feed(analyser, TunerSounds::Sound(Kind::Sawtooth, 441.0, kRate, 8192, 0.3));
+        analyser.GetFFTFor3DSonogram(kRate, nullptr, true, false);
+    }
+    Tuner tuner;
+    const auto prominence = [&](bool halve) {
+        tuner.Forget();
+        for (int i = 0; i < 2; ++i) tuner.Tune(analyser.GetPower(), {}, 8192, 1, 8192, kRate, halve, false);
+        return tuner.GetProminence();
+    };
+    EXPECT_EQ(analyser.GetTuner()->GetProminence(), prominence(true));
+    EXPECT_NE(prominence(true), prominence(false));
+    Tuner::SetDetectionMethod(0);
+}
+
 // Every window, whole and padded with zeros: each has lobes of its own, and its own way between the bins.
 TEST_F(TunerAnalyserTest, KnowsItsWindow) {
     struct Case {

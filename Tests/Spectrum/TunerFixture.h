@@ -66,9 +66,10 @@ public:
         Tune(samples, denoise);
     }
     // What one analysis hears, whatever came before.
-    double Hear(const float* samples) {
+    double Hear(const float* samples) { return Hear(Transform(samples)); }
+    double Hear(const std::vector<float>& power) {
         tuner.Forget();
-        Tune(samples);
+        Tune(power);
         return tuner.GetHeardFrequency();
     }
     void Tune(const std::vector<float>& power, bool denoise = false) {

@@ -144,14 +144,8 @@ TEST_F(TunerTest, HearsWithEveryMethodWhatThatIsAbleTo) {
     }
 }
 
-// Of the same amplitude; one that is named twice sounds twice as loud.
 std::vector<float> Partials(std::initializer_list<int> numbers, double hz) {
-    std::vector<float> sum(kLength);
-    for (const int n : numbers) {
-        const auto partial = TestSupport::Sine<float>(kLength, n * hz, kRate, 0.1);
-        for (std::size_t i = 0; i < kLength; ++i) sum[i] += partial[i];
-    }
-    return sum;
+    return TunerSounds::Partials(numbers, hz, kRate, kLength);
 }
 
 // Each method is another: they part where the fundamental is missing.
@@ -205,23 +199,50 @@ TEST_F(TunerTest, KeepsFiveHarmonicsUntilAPresetIsChosen) {
     EXPECT_NEAR(heard(), 400.0, 0.1);
     Tuner::SetDetectionMethod(1);
     probe.Tune(sound.data());
+    probe.tuner.SetSensibilityPreset(6);
     EXPECT_NEAR(heard(), 200.0, 0.1);
     probe.tuner.SetSensibilityPreset(0);
     EXPECT_NEAR(heard(), 400.0, 0.1);
 }
 
-// Made only when asked for; peaks stay, most of the noise is gone.
+// By the letter: from the bin of the lowest frequency (30 Hz), 55 dB above valleys of 0 dB, and no higher
+// than 17 kHz. The bins have no multiples among each other.
+TEST_F(TunerTest, SearchesTheHarmonicProductWithinItsLimits) {
+    Tuner::SetDetectionMethod(1);
+    struct Case {
+        int rate;
+        std::size_t bin;
+        float power;
+        bool heard;
+    };
+    constexpr float kLimit = 316227.78125f, kBelow = 316227.75f;  // 10^5.5 lies between
+    for (const Case& c :
+         {Case{44100, 101, kLimit, true}, Case{44100, 101, kBelow, false}, Case{44100, 5, 1e6f, true},
+          Case{44100, 4, 1e6f, false}, Case{200000, 691, 1e6f, true}, Case{200000, 701, 1e6f, false}}) {
+        std::vector<float> power(kLength / 2, 1.0f);
+        power[c.bin] = c.power;
+        const double hz = static_cast<double>(c.bin) * c.rate / kLength;
+        EXPECT_NEAR(TunerProbe(c.rate).Hear(power), c.heard ? hz : 0.0, 1e-6) << c.bin << ' ' << c.power;
+    }
+}
+
+// Made only when asked for, by every method, and gone when it is no longer; peaks stay, most of the noise is
+// gone, and what is heard is the same.
 TEST_F(TunerTest, ShowsTheSpectrumWithoutItsFloor) {
-    auto sound = TestSupport::Sine<float>(kLength, 1000.0, kRate);
+    auto sound = TunerSounds::Sound(Kind::Plucked, 1000.0, kRate, kLength, 0.0);
     TunerSounds::AddNoise(sound, 20.0, 3);
     TunerProbe probe(kRate);
     const auto& power = probe.Transform(sound.data());
-    probe.Tune(power);
-    EXPECT_TRUE(probe.tuner.GetDenoisedSpectrum().empty());
-    Tuner::SetShowDenoisedSpectrum(true);
-    probe.Tune(power);
     const auto& clean = probe.tuner.GetDenoisedSpectrum();
-    ASSERT_EQ(clean.size(), power.size());
+    for (const int method : {1, 2, 3, 4, 0}) {
+        Tuner::SetDetectionMethod(method);
+        Tuner::SetShowDenoisedSpectrum(false);
+        const double heard = probe.Hear(power);
+        EXPECT_TRUE(clean.empty()) << method;
+        Tuner::SetShowDenoisedSpectrum(true);
+        EXPECT_EQ(probe.Hear(power), heard) << method;
+        ASSERT_EQ(clean.size(), power.size()) << method;
+    }
     int left = 0;
     for (std::size_t k = 0; k < clean.size(); ++k) left += clean[k] > 0.0f;
     // One bin of noise in seven is above the floor, give or take what one spectrum allows.

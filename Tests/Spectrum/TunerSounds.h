@@ -2,6 +2,7 @@
 
 #include <cmath>
 #include <cstddef>
+#include <initializer_list>
 #include <numbers>
 #include <vector>
 
@@ -72,6 +73,17 @@ inline std::vector<float> Sound(Kind kind, double f0, int rate, std::size_t fram
     std::vector<float> sound(frames);
     for (std::size_t i = 0; i < frames; ++i) sound[i] = static_cast<float>(0.5 * sum[i] / largest);
     return sound;
+}
+
+// Partials of the same amplitude; one that is named twice sounds twice as loud.
+inline std::vector<float> Partials(std::initializer_list<int> numbers, double hz, int rate,
+                                   std::size_t frames) {
+    std::vector<float> sum(frames);
+    for (const int n : numbers) {
+        const auto partial = TestSupport::Sine<float>(frames, n * hz, rate, 0.1);
+        for (std::size_t i = 0; i < frames; ++i) sum[i] += partial[i];
+    }
+    return sum;
 }
 
 // Adds white noise this many decibels below the sound's own power.

@@ -72,7 +72,9 @@ TEST_F(TunerTest, CooksWhatChanged) {
     Tuner::CookNotesFrequencies(false);
     EXPECT_NEAR(Tuner::GetNoteFrequency(3), 130.81, 0.005);
     Tuner::SetTemperament(0);
+    Tuner::SetTemperament(-5);
     EXPECT_EQ(listener.told, 0);
+    EXPECT_FALSE(Tuner::IsTemperamentChanged());
     Tuner::SetTemperament(10);
     EXPECT_EQ(listener.told, 1);
     EXPECT_TRUE(Tuner::IsTemperamentChanged());
@@ -137,6 +139,13 @@ TEST_F(TunerTest, FindsTheNearestNote) {
         EXPECT_EQ(probe.tuner.GetOctave(), c.octave) << c.hz;
         EXPECT_NEAR(probe.tuner.GetErrorCents(), c.cents, 0.1) << c.hz;
         EXPECT_NEAR(probe.tuner.GetFrequency(), c.hz, 0.01) << c.hz;
+    }
+    // Where notes are unequally far apart they part midway in cents: C# and D lie 379.1 and 505.2 above A.
+    Tuner::SetTemperament(9);
+    for (const double cents : {442.0, 442.4}) {
+        TunerProbe probe(kRate);
+        probe.Show(Sine(440.0 * std::exp2(cents / 1200)).data());
+        EXPECT_STREQ(probe.tuner.GetTunedNoteName(), cents < 442.2 ? "C#" : "D") << cents;
     }
     // E is 2 cents higher there.
     Tuner::SetTemperament(1);
@@ -225,6 +234,17 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
     }
 }
 
+// The same name in another octave is another note.
+TEST_F(TunerTest, TellsOfOctaves) {
+    TunerProbe probe(kRate);
+    Display display;
+    probe.tuner.SetDisplayListener(&display);
+    for (const double hz : {440.0, 880.0})
+        for (int i = 0; i < 3; ++i) probe.Tune(Sine(hz).data());
+    EXPECT_EQ(probe.tuner.GetTunedNote(), (TunedNote{0, 5}));
+    EXPECT_EQ(display.heard, "++");
+}
+
 // Takes a steady pitch for the nearest note, one that wanders by more than 10 cents for nothing. Refreshed
 // every 30 ms, half a second is 18 analyses from the one that shows the note, which is the second.
 TEST_F(TunerTest, Calibrates) {
@@ -250,6 +270,15 @@ TEST_F(TunerTest, Calibrates) {
     }
     EXPECT_EQ(listener.told, 3);
     EXPECT_EQ(TunerGetNumLines(), 3);
+    // A wide gap's middle is further from both notes than one calibration goes.
+    TunerCalibrateReset();
+    Tuner::SetTemperament(9);
+    TunerProbe probe(kRate);
+    for (int i = 0; i < 19; ++i) probe.Tune(Sine(440.0 * std::exp2(440.0 / 1200)).data());
+    EXPECT_NEAR(probe.tuner.GetErrorCents(), 60.9, 0.1);
+    EXPECT_TRUE(TunerCalibrateNow(probe.tuner));
+    EXPECT_NEAR(CentsBetween(Tuner::GetCalibrationBase(), 110.0), 50.0, 1e-6);
+    Tuner::SetTemperament(0);
     TunerCalibrateReset();
     EXPECT_FALSE(TunerCalibrationNotStandardOrNotUseEqualTemperament());
     Tuner::SetTemperament(4);
@@ -257,7 +286,8 @@ TEST_F(TunerTest, Calibrates) {
     EXPECT_FALSE(TunerIsNonstandardCalibration());
 }
 
-// Half the spectra of noise are louder than their mean: none of that is a note, at any sensitivity.
+// No note in silence, an offset, a click or seconds of noise. "Sensitive" hears one in a thousand spectra of
+// noise alone, but in half an hour of white noise never the same in two that follow each other.
 TEST_F(TunerTest, HearsNothingInNoise) {
     const auto white = TestSupport::Noise<float>(200000);
     auto brown = white;  // falls by 6 dB per octave from 70 Hz
