@@ -193,6 +193,10 @@ TEST_F(TunerAnalyserTest, KnowsItsWindow) {
                     analyser.ToggleTuner();
                     Feed(analyser, TunerSounds::Sound(kind, hz, kRate, 8192, 0.3));
                     ASSERT_TRUE(analyser.GetFFTFor3DSonogram(kRate, nullptr, true, false));
+                    Tuner tuner;
+                    tuner.SetWindowType(c.windowType);
+                    tuner.Tune(analyser.GetPower(), {}, fftLength, -1, 8192, kRate, true, false);
+                    EXPECT_EQ(analyser.GetTuner()->GetHeardFrequency(), tuner.GetHeardFrequency());
                     EXPECT_NEAR(analyser.GetTuner()->GetHeardFrequency() * 8192 / kRate, hz * 8192 / kRate,
                                 c.bins)
                         << "window " << c.windowType << " padded to " << fftLength << ", sound "

@@ -113,34 +113,40 @@ struct Ability {
     int method;
     Kind kind;
     double noise;  // dB below, 0 for none
-    int wrong;     // of a hundred frames, at most
 };
 constexpr Ability kAbilities[] = {
-    // The bare product gives way to octaves and, with one partial or in noise, finds its valleys too shallow.
-    {1, Kind::Sine, 0, 5},      {1, Kind::Plucked, 0, 15},  {1, Kind::Plucked, 20, 15},
-    {1, Kind::Piano, 20, 15},   {2, Kind::Sine, 10, 0},     {2, Kind::Sawtooth, 0, 0},
-    {2, Kind::Sawtooth, 10, 0}, {2, Kind::Plucked, 20, 0},  {2, Kind::Piano, 20, 0},
-    {3, Kind::Sine, 10, 0},     {3, Kind::Sawtooth, 0, 0},  {3, Kind::Sawtooth, 10, 0},
-    {3, Kind::Plucked, 20, 0},  {3, Kind::Piano, 20, 0},    {4, Kind::Sine, 10, 0},
-    {4, Kind::Sawtooth, 0, 0},  {4, Kind::Sawtooth, 10, 0}, {4, Kind::Plucked, 20, 0},
-    {4, Kind::Piano, 20, 0},    {7, Kind::Sawtooth, 20, 0},  // as 3
+    {1, Kind::Sine, 0},      {1, Kind::Plucked, 0},   {1, Kind::Plucked, 20},
+    {1, Kind::Piano, 20},    {2, Kind::Sine, 10},     {2, Kind::Sawtooth, 0},
+    {2, Kind::Sawtooth, 10}, {2, Kind::Plucked, 20},  {2, Kind::Piano, 20},
+    {3, Kind::Sine, 10},     {3, Kind::Sawtooth, 0},  {3, Kind::Sawtooth, 10},
+    {3, Kind::Plucked, 20},  {3, Kind::Piano, 20},    {4, Kind::Sine, 10},
+    {4, Kind::Sawtooth, 0},  {4, Kind::Sawtooth, 10}, {4, Kind::Plucked, 20},
+    {4, Kind::Piano, 20},    {7, Kind::Sawtooth, 20},  // as 3
 };
+
+// The bare product looks for overtones at multiples of whole bins. It misses the fifth partial by more than
+// two of them where the fundamental lies midway between two; the octave, on a bin of its own, may win then.
+bool Hears(const Ability& ability, double hz, double heard) {
+    constexpr double kOff = 0.003, kMidway = 0.1;
+    const double bins = hz * kLength / kRate;
+    const bool midway = std::abs(bins - std::floor(bins) - 0.5) < kMidway;
+    return std::abs(heard / hz - 1.0) < kOff ||
+           (ability.method == 1 && midway && std::abs(heard / hz - 2.0) < kOff);
+}
 
 TEST_F(TunerTest, HearsWithEveryMethodWhatThatIsAbleTo) {
     for (const Ability& ability : kAbilities) {
         Tuner::SetDetectionMethod(ability.method);
-        int wrong = 0, frames = 0;
         for (int semitones = 0; semitones <= 72; semitones += 3) {
             const double hz = 55.0 * std::exp2((semitones + 0.2 * std::sin(semitones)) / 12.0);
             auto sound = TunerSounds::Sound(ability.kind, hz, kRate, kLength, 0.1 * semitones);
             if (ability.noise > 0.0) TunerSounds::AddNoise(sound, ability.noise, 7);
             TunerProbe probe(kRate);
-            ++frames;
-            wrong += std::abs(probe.Hear(sound.data()) / hz - 1.0) > 0.003;
+            const double heard = probe.Hear(sound.data());
+            EXPECT_TRUE(Hears(ability, hz, heard))
+                << "method " << ability.method << ", sound " << static_cast<int>(ability.kind) << ", "
+                << ability.noise << " dB, " << hz << " Hz: " << heard;
         }
-        EXPECT_LE(100 * wrong, ability.wrong * frames)
-            << "method " << ability.method << ", sound " << static_cast<int>(ability.kind) << ", "
-            << ability.noise << " dB";
     }
 }
 

@@ -286,8 +286,8 @@ TEST_F(TunerTest, Calibrates) {
     EXPECT_FALSE(TunerIsNonstandardCalibration());
 }
 
-// No note in silence, an offset, a click or seconds of noise. "Sensitive" hears one in a thousand spectra of
-// noise alone, but in half an hour of white noise never the same in two that follow each other.
+// No note in silence, an offset, a click or seconds of noise. "Sensitive" hears one in two thousand spectra
+// of noise alone, but in half an hour of white noise never the same in two that follow each other.
 TEST_F(TunerTest, HearsNothingInNoise) {
     const auto white = TestSupport::Noise<float>(200000);
     auto brown = white;  // falls by 6 dB per octave from 70 Hz
