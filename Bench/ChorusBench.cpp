@@ -1,4 +1,4 @@
-#include "DSP/Effects/Chorus.h"
+#include "DSP/Effects/Chorus/Chorus.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 #include "LadspaPeer.h"

@@ -1,4 +1,4 @@
-#include "DSP/Effects/Compressor.h"
+#include "DSP/Effects/Compressor/Compressor.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 #include "LadspaPeer.h"

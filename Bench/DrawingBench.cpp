@@ -5,10 +5,10 @@
 
 #include <cairo.h>
 
-#include "Drawing/DrawingCairo.h"
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/Tuner.h"
+#include "Drawing/Backends/DrawingCairo.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
 

@@ -1,4 +1,4 @@
-#include "DSP/Effects/Echo.h"
+#include "DSP/Effects/Echo/Echo.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 #include "Plain/PlainEcho.h"

@@ -2,7 +2,7 @@
 
 #include <benchmark/benchmark.h>
 
-#include "DSP/Effects/CorvoEffectBase.h"
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
 #include "Support/BlockCopy.h"
 #include "Support/Signals.h"
 

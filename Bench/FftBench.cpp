@@ -2,7 +2,7 @@
 
 #include <vector>
 
-#include "Spectrum/CorvoFFT.h"
+#include "Spectrum/Fft/CorvoFFT.h"
 #include "Support/Signals.h"
 
 #if DSP_HAVE_FFTW3 && DSP_HAVE_FFTW3F

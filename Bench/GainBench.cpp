@@ -1,4 +1,4 @@
-#include "DSP/Effects/GainEfx.h"
+#include "DSP/Effects/Gain/GainEfx.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 

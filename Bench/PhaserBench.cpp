@@ -1,4 +1,4 @@
-#include "DSP/Effects/Phaser.h"
+#include "DSP/Effects/Phaser/Phaser.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 #include "LadspaPeer.h"

@@ -1,4 +1,4 @@
-#include "DSP/Effects/Reverb.h"
+#include "DSP/Effects/Reverb/Reverb.h"
 
 #include "EffectRun.h"
 #include "LadspaPeer.h"

@@ -6,9 +6,9 @@
 #include <string>
 #include <vector>
 
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Sonogram/Sonogram.h"
 #include "Support/Signals.h"
 
 // What does a refresh of the sonogram cost? Column and scroll together (BM_SonogramStep/3) may take twice a

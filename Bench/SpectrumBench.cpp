@@ -3,9 +3,9 @@
 #include <cmath>
 #include <vector>
 
-#include "Spectrum/CoordinatesAndFrequencies.h"
-#include "Spectrum/PowerToDecibels.h"
-#include "Spectrum/SpectrumDrawer.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Scales/CoordinatesAndFrequencies.h"
+#include "Spectrum/Scales/PowerToDecibels.h"
 #include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
 

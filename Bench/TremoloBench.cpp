@@ -1,4 +1,4 @@
-#include "DSP/Effects/Autovol.h"
+#include "DSP/Effects/Tremolo/Autovol.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 #include "LadspaPeer.h"

@@ -1,4 +1,4 @@
-#include "DSP/Effects/TubeDistorsion.h"
+#include "DSP/Effects/Tube/TubeDistorsion.h"
 #include "EffectRun.h"
 #include "FfmpegPeer.h"
 #include "LadspaPeer.h"

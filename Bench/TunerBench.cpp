@@ -2,8 +2,8 @@
 
 #include <vector>
 
-#include "Spectrum/CorvoFFT.h"
-#include "Spectrum/Tuner.h"
+#include "Spectrum/Fft/CorvoFFT.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
 

@@ -1,12 +1,11 @@
-# Adds to `target` the source `kernels`, compiled for processors with AVX2, and tells the source `chooser` that
-# it is there. The chooser takes it where the processor allows; results are those of the baseline.
-function(dsp_add_wide_kernels target chooser kernels)
-    if(NOT CMAKE_SYSTEM_PROCESSOR MATCHES "x86|AMD64|i.86")
-        return()
-    endif()
-    target_sources(${target} PRIVATE ${kernels})
-    set_source_files_properties(${kernels}
-        TARGET_DIRECTORY ${target} PROPERTIES COMPILE_OPTIONS -mavx2)
-    set_source_files_properties(${chooser}
-        TARGET_DIRECTORY ${target} PROPERTIES COMPILE_DEFINITIONS DSP_WIDE_KERNELS)
+# The kernels are written in the vector registers of x86 processors, with SSE2 as the least.
+if(NOT CMAKE_SYSTEM_PROCESSOR MATCHES "x86|AMD64|i.86")
+    message(FATAL_ERROR "DSPDll needs an x86 processor: its kernels are written for SSE2 and AVX2.")
+endif()
+
+# Adds kernels compiled for processors with AVX2. Code beside them takes them where the processor allows; results
+# are those of the baseline.
+function(dsp_add_wide_kernels kernels)
+    target_sources(dsp_objects PRIVATE ${kernels})
+    set_source_files_properties(${kernels} TARGET_DIRECTORY dsp_objects PROPERTIES COMPILE_OPTIONS -mavx2)
 endfunction()

@@ -5,7 +5,7 @@
 #include <optional>
 #include <stdexcept>
 
-#include "DSP/Effects/CorvoEffect.h"
+#include "DSP/Effects/Framework/CorvoEffect.h"
 #include "Errors.h"
 #include "Text.h"
 

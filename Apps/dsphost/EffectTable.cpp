@@ -3,15 +3,15 @@
 #include <algorithm>
 #include <iterator>
 
-#include "DSP/Effects/Autovol.h"
-#include "DSP/Effects/Chorus.h"
-#include "DSP/Effects/Compressor.h"
-#include "DSP/Effects/Echo.h"
-#include "DSP/Effects/GainEfx.h"
-#include "DSP/Effects/Phaser.h"
-#include "DSP/Effects/PitchShift.h"
-#include "DSP/Effects/Reverb.h"
-#include "DSP/Effects/TubeDistorsion.h"
+#include "DSP/Effects/Chorus/Chorus.h"
+#include "DSP/Effects/Compressor/Compressor.h"
+#include "DSP/Effects/Echo/Echo.h"
+#include "DSP/Effects/Gain/GainEfx.h"
+#include "DSP/Effects/Phaser/Phaser.h"
+#include "DSP/Effects/PitchShift/PitchShift.h"
+#include "DSP/Effects/Reverb/Reverb.h"
+#include "DSP/Effects/Tremolo/Autovol.h"
+#include "DSP/Effects/Tube/TubeDistorsion.h"
 #include "EffectElement.h"
 #include "EqualiserElement.h"
 

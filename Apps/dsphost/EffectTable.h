@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "ChainElement.h"
-#include "DSP/Effects/CorvoEffectBase.h"
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
 
 namespace dsphost {
 

@@ -5,9 +5,9 @@
 #include <vector>
 
 #if defined(_WIN32)
-#include "Drawing/DrawingGdiPlus.h"
+#include "Drawing/Backends/DrawingGdiPlus.h"
 #else
-#include "Drawing/DrawingCairo.h"
+#include "Drawing/Backends/DrawingCairo.h"
 #endif
 
 namespace dsphost {

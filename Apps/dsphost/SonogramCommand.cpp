@@ -9,8 +9,8 @@
 #include "Errors.h"
 #include "PictureOptions.h"
 #include "Playback.h"
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/SpectrumDrawer.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Sonogram/Sonogram.h"
 #include "Spectrum/kivspectrum.h"
 
 namespace dsphost {

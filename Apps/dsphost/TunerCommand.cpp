@@ -13,7 +13,7 @@
 #include "File.h"
 #include "PictureOptions.h"
 #include "Playback.h"
-#include "Spectrum/Tuner.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 #include "Text.h"
 

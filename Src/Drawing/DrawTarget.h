@@ -4,9 +4,9 @@
 #include <cstdint>
 #include <string_view>
 
-#include "Drawing/DrawingBitmap.h"
-#include "Drawing/DrawingColour.h"
-#include "Spectrum/CoordinatesAndFrequencies.h"
+#include "Picture/DrawingBitmap.h"
+#include "Picture/DrawingColour.h"
+#include "Picture/Geometry.h"
 
 namespace Corvo {
 

@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "Drawing/DrawingColour.h"
+#include "Picture/DrawingColour.h"
 #include "Platform/Export.h"
 
 namespace Corvo {

@@ -11,12 +11,12 @@
 #include "Platform/DenormalGuard.h"
 #include "Spectrum/AnalyserLock.h"
 #include "Spectrum/CaptureBuffer.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
 #include "Spectrum/MessagePoster.h"
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/SpectrumLimits.h"
-#include "Spectrum/Tuner.h"
-#include "Spectrum/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Scales/SpectrumLimits.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
 
 using Corvo::AnalyserLock;
 using Corvo::BufferLength;

@@ -7,10 +7,10 @@
 #include <memory>
 #include <vector>
 
-#include "Drawing/DrawingBitmap.h"
+#include "Picture/DrawingBitmap.h"
 #include "Platform/CriticalSection.h"
 #include "Platform/Export.h"
-#include "Spectrum/CorvoFFT.h"
+#include "Spectrum/Fft/CorvoFFT.h"
 
 class CoordinatesAndFrequencies;
 class MessagePoster;

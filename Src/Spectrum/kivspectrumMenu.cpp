@@ -2,10 +2,10 @@
 #include <mutex>
 
 #include "Spectrum/AnalyserLock.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
 #include "Spectrum/MessagePoster.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/Tuner.h"
-#include "Spectrum/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 
 // The commands of the pop-up menu, which the host builds and words.

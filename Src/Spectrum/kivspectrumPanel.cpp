@@ -1,7 +1,7 @@
 #include <algorithm>
 
-#include "Spectrum/ImageSize.h"
-#include "Spectrum/TunerPanelBitmaps.h"
+#include "Spectrum/Tuner/ImageSize.h"
+#include "Spectrum/Tuner/TunerPanelBitmaps.h"
 #include "Spectrum/kivspectrum.h"
 
 // The images of the tuner panel, shared by all analysers.

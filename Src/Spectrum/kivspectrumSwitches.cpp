@@ -2,10 +2,10 @@
 
 #include "Spectrum/AnalyserLock.h"
 #include "Spectrum/CaptureBuffer.h"
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/Tuner.h"
-#include "Spectrum/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 
 // What an analyser shows and whether it runs.

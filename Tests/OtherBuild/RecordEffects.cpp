@@ -4,7 +4,7 @@
 
 #include <iostream>
 
-#include "DSP/Effects/MemoryFile.h"
+#include "DSP/Effects/Framework/MemoryFile.h"
 #include "OtherBuild/FixedSignal.h"
 #include "OtherBuild/Subjects.h"
 #include "Support/EffectRun.h"

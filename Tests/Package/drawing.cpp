@@ -1,5 +1,5 @@
 // A host that draws: it needs the library beside the other, and neither Cairo's headers nor its package.
-#include "Drawing/DrawingCairo.h"
+#include "Drawing/Backends/DrawingCairo.h"
 #include "Spectrum/kivspectrum.h"
 
 int main() {

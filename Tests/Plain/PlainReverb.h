@@ -3,7 +3,7 @@
 #include <cstddef>
 #include <vector>
 
-#include "DSP/Effects/ReverbDesign.h"
+#include "DSP/Effects/Reverb/ReverbDesign.h"
 #include "DSP/Equalizer/BiquadDesign.h"
 
 namespace Plain {

@@ -2,7 +2,7 @@
 #include <string>
 #include <vector>
 
-#include "AnalyserFixture.h"
+#include "Spectrum/AnalyserFixture.h"
 #include "Support/AudioThreadRules.h"
 
 namespace {

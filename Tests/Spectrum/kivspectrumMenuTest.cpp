@@ -4,11 +4,11 @@
 #include <utility>
 #include <vector>
 
-#include "AnalyserFixture.h"
+#include "Spectrum/AnalyserFixture.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/MessagePoster.h"
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/Tuner.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
 
 namespace {
 

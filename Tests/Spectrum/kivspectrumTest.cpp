@@ -5,10 +5,10 @@
 #include <limits>
 #include <numbers>
 
-#include "AnalyserFixture.h"
+#include "Spectrum/AnalyserFixture.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/MessagePoster.h"
-#include "Spectrum/SpectrumDrawer.h"
-#include "Spectrum/Tuner.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Support/AudioThreadRules.h"
 
 namespace {

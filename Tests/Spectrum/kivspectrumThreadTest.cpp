@@ -3,10 +3,10 @@
 #include <thread>
 #include <vector>
 
-#include "AnalyserFixture.h"
-#include "Drawing/Views.h"
-#include "Spectrum/Sonogram.h"
-#include "Spectrum/Tuner.h"
+#include "Drawing/Views/Views.h"
+#include "Spectrum/AnalyserFixture.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Support/NoDrawing.h"
 
 namespace {

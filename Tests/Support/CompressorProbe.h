@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "DSP/Effects/Compressor.h"
+#include "DSP/Effects/Compressor/Compressor.h"
 #include "Support/EffectRun.h"
 
 namespace TestSupport {

@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "Drawing/DrawingCairo.h"
+#include "Drawing/Backends/DrawingCairo.h"
 
 #include <cairo.h>
 

@@ -5,7 +5,7 @@
 #include <memory>
 #include <vector>
 
-#include "Drawing/DrawingD2D.h"
+#include "Drawing/Backends/DrawingD2D.h"
 #include "Platform/WindowsHeader.h"
 
 #include <d2d1.h>

@@ -2,8 +2,8 @@
 
 #include <cstdint>
 
-#include "Drawing/DrawingGdiPlus.h"
-#include "Drawing/GdiPlusHeader.h"
+#include "Drawing/Backends/DrawingGdiPlus.h"
+#include "Drawing/Backends/GdiPlusHeader.h"
 
 namespace TestSupport {
 

@@ -5,7 +5,7 @@
 #include <span>
 #include <string>
 
-#include "DSP/Effects/CorvoEffectBase.h"
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
 
 namespace TestSupport {
 

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <vector>
 
-#include "DSP/Effects/CorvoEffectBase.h"
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
 #include "Support/Signals.h"
 
 namespace TestSupport {

@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "Drawing/DrawTarget.h"
-#include "Drawing/Look.h"
+#include "Drawing/Views/Look.h"
 
 namespace TestSupport {
 

@@ -5,15 +5,11 @@
 namespace Corvo::DSP {
 namespace {
 
-#if defined(DSP_WIDE_KERNELS)
 const bool kWide = __builtin_cpu_supports("avx2");
-#endif
 
 template <typename Sample>
 const EqKernels<Sample>& Kernels() {
-#if defined(DSP_WIDE_KERNELS)
     if (kWide) return EqAvx2Kernels<Sample>();
-#endif
     return EqBaselineKernels<Sample>();
 }
 

@@ -5,8 +5,8 @@
 #include <cstddef>
 #include <numbers>
 
-#include "DSP/Effects/SharedRecord.h"
 #include "Platform/DenormalGuard.h"
+#include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
 namespace {

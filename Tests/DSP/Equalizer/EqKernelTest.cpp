@@ -16,9 +16,7 @@ using TestSupport::Random;
 template <typename Sample>
 std::vector<const EqKernels<Sample>*> AllKernels() {
     std::vector all{&EqBaselineKernels<Sample>()};
-#if defined(DSP_WIDE_KERNELS)
     if (__builtin_cpu_supports("avx2")) all.push_back(&EqAvx2Kernels<Sample>());
-#endif
     return all;
 }
 

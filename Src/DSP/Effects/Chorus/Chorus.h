@@ -1,0 +1,96 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <memory>
+
+#include "DSP/Effects/Framework/CorvoEffect.h"
+
+namespace Corvo::DSP {
+
+namespace ChorusPrivate {
+
+// The settings, the chunk after its first word, and a row of the preset table; pairs are left, right.
+struct _transform_props {
+    using Pair = std::array<std::int32_t, 2>;
+    Pair frequency;  // of the sweep, 0..300 hundredths of a hertz
+    Pair delay;      // the longest, 0..10000 tenths of a millisecond
+    Pair wet;        // -960..100 tenths of dB, silent at -960
+    Pair dry;        // -960..100 tenths of dB, silent at -960
+    Pair depth;      // 0..1000 thousandths of the delay
+    std::array<std::int32_t, 12> reserved;
+};
+static_assert(sizeof(_transform_props) == 88);
+
+struct Side;
+
+}  // namespace ChorusPrivate
+
+// Chorus and flanger: per side a delay that a sine sweeps, mixed with the dry signal. No feedback.
+//
+// The sweep covers `depth` of the delay, rounded down to a whole even number of frames, upwards from the
+// shortest read position delay * (1 - depth). At full depth it starts at the position that is written next,
+// so that the delay runs from the whole ring down to nothing.
+//
+// Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for float.
+// The delay lines hold floats. Channels after the second pass unchanged, and so does everything when there
+// was no memory for the ring. No latency.
+//
+// Memory: InitProcessing makes a ring for 10 s. Settings from a chunk beyond that, or beyond the ring when
+// the format changed without InitProcessing, are limited to what the ring holds. The ring keeps its contents
+// through edits and preparation.
+class DSP_API Chorus : public CorvoEffect {
+public:
+    Chorus();
+    ~Chorus() override;
+
+    void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
+    // 92 bytes: the chunk tag and the settings, 22 words.
+    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
+    int GetSettingsChunkSize() override;
+    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;  // ignored below 92 bytes
+    // The older layout, in which each of the 22 words takes 8 bytes: 180 bytes. False, with nothing changed,
+    // when there are fewer.
+    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
+    void Cleanup() override;  // frees the ring; the next cook makes a new one
+
+    int NumPresets() override;
+    std::string GetPresetName(int preset) override;
+    void SetPreset(int preset) override;
+    float GetParamFromProp(int index, int preset) override;
+
+    std::wstring GetParameterFormattedText(int index, double value) override;
+    float GetParamValueNormalizedFromText(int index, std::string text) override;
+    float GetParam(int index) override;
+    float GetParamPlain(int index) const override;
+    int GetParamCountReal() override;
+    const MP_PARAMINFO* GetParametersInfo() override;
+
+    std::string GetName() override;
+    std::string GetImage() override;
+    std::string GetPluginIconPath() override;
+    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
+    bool WantsXySerialization() override;
+    void InitializeXyEditingData(GenericUIData& data) override;
+    void InitResetProcessingLight(bool reset) override;  // clears the ring, whatever `reset`
+
+protected:
+    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
+    void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
+                         ProcessFlags& flags) override;
+
+private:
+    int Channels() const;
+    bool InitState(const ChorusPrivate::_transform_props& settings, bool reset);
+    bool MakeRing();
+
+    ChorusPrivate::_transform_props m_settings{};  // shared between the threads
+    tWAVEFORMATEX m_format{};
+    std::unique_ptr<std::array<ChorusPrivate::Side, 2>> m_sides;
+    std::unique_ptr<float[]> m_ring;
+    int m_capacity = 0;     // floats
+    int m_ring_length = 0;  // samples, all channels counted
+    std::array<int, 2> m_tail_left{};
+};
+
+}  // namespace Corvo::DSP

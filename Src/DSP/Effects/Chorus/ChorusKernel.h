@@ -1,0 +1,80 @@
+#pragma once
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+
+#include "DSP/Parts/SineOscillator.h"
+
+namespace Corvo::DSP::ChorusPrivate {
+
+// The ring that the channels share, sample by sample in turn.
+struct Ring {
+    float* samples;
+    int length;  // in samples, a whole number of frames and at least one
+    int channels;
+};
+
+// One side's delay, in frames, and its levels.
+struct Side {
+    SineOscillator oscillator;
+    double wet = 0.0, dry = 0.0;
+    int amplitude = 0;  // of the sweep
+    int base = 0;       // the read position trails the written one by `base` at the sweep's lower end
+    int channel = 0;    // and index of its first sample in the ring
+    int write = 0;      // index of the sample written next
+
+    // One channel of a block.
+    template <typename Sample>
+    void Run(Sample* samples, int frames, std::ptrdiff_t stride, const Ring& ring) {
+        std::array<double, SineOscillator::kPiece> sines, fractions;
+        std::array<int, SineOscillator::kPiece> offsets;
+        for (int taken; frames > 0; frames -= taken, samples += taken * stride) {
+            taken = std::min(frames, SineOscillator::kPiece);
+            oscillator.StepAndTakeSines(sines.data(), taken);
+            for (std::size_t i = 0; i < static_cast<std::size_t>(taken); ++i) {
+                const double sweep = (sines[i] + 1.0) * amplitude;
+                const int whole = static_cast<int>(sweep);
+                fractions[i] = sweep - whole;
+                offsets[i] = (whole - base) * ring.channels;
+            }
+            for (int done = 0; done < taken;) {
+                const int run = std::min(taken - done, FramesToWrap(ring));
+                RunStraight(samples + done * stride, run, stride, ring, offsets.data() + done,
+                            fractions.data() + done);
+                done += run;
+            }
+        }
+    }
+
+private:
+    // At least 1: a ring that became shorter may have left the index at its end, for one frame.
+    int FramesToWrap(const Ring& ring) const {
+        return std::max((ring.length - write + ring.channels - 1) / ring.channels, 1);
+    }
+
+    template <typename Sample>
+    void RunStraight(Sample* samples, int frames, std::ptrdiff_t stride, const Ring& ring, const int* offsets,
+                     const double* fractions) {
+        const int length = ring.length, step = ring.channels;
+        float* const memory = ring.samples;
+        // Reading, the end of the ring is its beginning.
+        int read = write < length ? write : write - length;
+        float* written = memory + write;
+        for (int i = 0; i < frames; ++i, read += step, written += step, samples += stride) {
+            int at = read + offsets[i];
+            at += at < 0 ? length : 0;
+            at -= at >= length ? length : 0;
+            int next = at + step;
+            next -= next >= length ? length : 0;
+            const double x = *samples, here = memory[at];
+            const double delayed = (memory[next] - here) * fractions[i] + here;
+            *written = static_cast<float>(x);
+            *samples = static_cast<Sample>(delayed * wet + x * dry);
+        }
+        write += frames * step;
+        if (write >= length) write = channel;
+    }
+};
+
+}  // namespace Corvo::DSP::ChorusPrivate

@@ -1,0 +1,434 @@
+#include "DSP/Effects/Compressor/Compressor.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <mutex>
+
+#include "DSP/Effects/Compressor/CompressorPresets.h"
+#include "DSP/Effects/Compressor/CompressorSides.h"
+#include "DSP/Effects/Parameters/FixedPoint.h"
+#include "DSP/Effects/Parameters/ParameterTable.h"
+#include "DSP/Effects/Parameters/ParameterText.h"
+#include "DSP/Effects/Parameters/SettingsChunk.h"
+#include "Platform/Assertion.h"
+
+namespace Corvo::DSP {
+
+using namespace CompressorPrivate;
+
+namespace {
+
+// Parameters come as pairs of this order.
+enum Pair { kAttack, kRelease, kOutGain, kThreshold, kRatio, kStereoLink, kMakeUp, kMonitor };
+
+struct Row {
+    const wchar_t *label, *unit;
+    MP_TYPE type;
+    FixedPoint map;
+};
+
+// clang-format off
+constexpr std::array<Row, 16> kRows{{
+    // label                 unit    type        span      floor
+    {L"Attack L",            L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
+    {L"Attack R",            L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
+    {L"Release L",           L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
+    {L"Release R",           L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
+    {L"Out gain L",          L"dB",  MPT_FLOAT, { 1160.0f, -960.0f}},
+    {L"Out gain R",          L"dB",  MPT_FLOAT, { 1160.0f, -960.0f}},
+    {L"Threshold L",         L"dB",  MPT_FLOAT, {  790.0f, -800.0f}},
+    {L"Threshold R",         L"dB",  MPT_FLOAT, {  790.0f, -800.0f}},
+    {L"Ratio L",             L"",    MPT_FLOAT, {  251.0f,    0.0f}},
+    {L"Ratio R",             L"",    MPT_FLOAT, {  251.0f,    0.0f}},
+    {L"Stereo Link",         L"",    MPT_BOOL,  {    1.0f,    0.0f}},
+    {L"Stereo Link",         L"",    MPT_BOOL,  {    1.0f,    0.0f}},
+    {L"Auto Make-up Gain",   L"",    MPT_BOOL,  {    1.0f,    0.0f}},
+    {L"Auto Make-up Gain",   L"",    MPT_BOOL,  {    1.0f,    0.0f}},
+    {L"Monitor sidechain L", L"",    MPT_BOOL,  {    1.0f,    0.0f}},
+    {L"Monitor sidechain R", L"",    MPT_BOOL,  {    1.0f,    0.0f}},
+}};
+// clang-format on
+
+// Where the pairs that are plain words are kept.
+constexpr std::array kStored{&Compressor::Parameters::attack, &Compressor::Parameters::release,
+                             &Compressor::Parameters::outGain};
+
+constexpr std::int32_t kShortestTime = 1, kLongestTime = 100000;
+constexpr std::int32_t kHighestOutGain = 200;  // tenths of a decibel
+constexpr int kDefaultPreset = 1;
+constexpr int kChunkSize = 16112;
+constexpr double kHighestRatioShown = 100.0;
+
+bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
+bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kCompressorPresets.size()); }
+Pair PairOf(int index) { return static_cast<Pair>(index / 2); }
+std::size_t SideOf(int index) { return static_cast<std::size_t>(index % 2); }
+FixedPoint MapOf(int index) { return kRows[static_cast<std::size_t>(index)].map; }
+
+std::int32_t Tenths(double db) { return static_cast<std::int32_t>(std::lround(db * 10.0)); }
+std::int32_t Hundredths(double ms) { return static_cast<std::int32_t>(std::lround(ms * 100.0)); }
+
+double RatioOf(const TransferCurve& curve) {
+    const double slope = curve.SlopeAboveThreshold();
+    return std::abs(slope) * kHighestRatioShown < 1.0 ? std::numeric_limits<double>::infinity() : 1.0 / slope;
+}
+
+std::wstring RatioText(const TransferCurve& curve) {
+    const double ratio = RatioOf(curve);
+    // Ratios are read from points in single precision; a hundredth of the last digit makes up for that.
+    constexpr double kTolerance = 0.01;
+    if (!(std::abs(ratio) <= kHighestRatioShown + kTolerance)) return L"Inf.:1";
+    return FormatFixed(std::trunc(ratio * 10.0 + std::copysign(kTolerance, ratio)) / 10.0, 1) + L":1";
+}
+
+std::int32_t RatioStepOf(const TransferCurve& curve) {
+    const double step = (1.0 - curve.SlopeAboveThreshold()) * kRatioSteps;
+    return static_cast<std::int32_t>(std::lround(std::clamp(step, 0.0, static_cast<double>(kRatioSteps))));
+}
+
+// The lowest step whose text is this ratio, cut to tenths.
+std::int32_t RatioStepFromText(std::string_view text) {
+    const double ratio = ParseNumber(text);
+    if (!(ratio > 1.0)) return 0;
+    if (ratio > kHighestRatioShown) return kRatioSteps;
+    const double step = kRatioSteps - 10.0 * kRatioSteps / std::round(ratio * 10.0);
+    return static_cast<std::int32_t>(std::ceil(step - 1e-6));
+}
+
+template <typename Word>
+std::int32_t Limited(Word word, std::int32_t low, std::int32_t high) {
+    return static_cast<std::int32_t>(std::clamp<Word>(word, low, high));
+}
+
+template <typename Word>
+Compressor::Parameters Repaired(const TRANSFORM_PARAMETERS<Word>& words) {
+    Compressor::Parameters good;
+    for (std::size_t side = 0; side < 2; ++side) {
+        good.attack[side] = Limited(words.attack[side], kShortestTime, kLongestTime);
+        good.release[side] = Limited(words.release[side], kShortestTime, kLongestTime);
+        good.outGain[side] = Limited(words.outGain[side], kSilentOutGain, kHighestOutGain);
+    }
+    good.stereoLink = words.stereoLink != 0;
+    good.makeUp = words.makeUp != 0;
+    good.flags = static_cast<std::int32_t>(words.flags);
+    std::ranges::transform(words.reserved, good.reserved.begin(),
+                           [](Word word) { return static_cast<std::int32_t>(word); });
+    return good;
+}
+
+bool VisitParameters(auto&& visit, auto& p) {
+    return visit(p.attack) && visit(p.release) && visit(p.outGain) && visit(p.stereoLink) &&
+           visit(p.makeUp) && visit(p.flags) && visit(p.reserved);
+}
+
+bool VisitCurves(auto&& visit, auto& map) {
+    auto& curves = map.m_comp_map;
+    if (!(visit(curves[0].count) && visit(curves[1].count) && visit(map.reserved))) return false;
+    for (auto& curve : curves)
+        for (auto& point : curve.points)
+            if (!(visit(point.x) && visit(point.y) && visit(point.slope))) return false;
+    return true;
+}
+
+}  // namespace
+
+Compressor::Compressor()
+    : m_ui(std::make_unique<UserInterfaceSide>()),
+      m_audio(std::make_unique<AudioSide>()),
+      m_hand_over(std::make_unique<HandOver>()) {
+    m_audio->current.settings = GetPresetData(kDefaultPreset);
+    SetPreset(kDefaultPreset);
+}
+
+Compressor::~Compressor() = default;
+
+bool Compressor::HasNativeEditor() { return true; }
+int Compressor::GetSettingsChunkSize() { return kChunkSize; }
+void Compressor::Cleanup() {}
+int Compressor::NumPresets() { return static_cast<int>(kCompressorPresets.size()); }
+int Compressor::GetParamCountReal() { return static_cast<int>(kRows.size()); }
+std::string Compressor::GetName() { return "Compressor"; }
+int Compressor::GetDefaultPreset() { return kDefaultPreset; }
+int Compressor::GetNumSidechainBusses() { return 1; }
+int Compressor::GetSidechainBusNumChannelsMax(int) { return 2; }
+bool Compressor::IsUsingSideChain() const { return m_hand_over->usingSideChain; }
+void Compressor::SetGainMeterOn(bool on) { m_hand_over->meterOn = on; }
+bool Compressor::IsGainMeterOn() const { return m_hand_over->meterOn; }
+
+double Compressor::GetGainReduction(int channel) const {
+    return channel == 0 || channel == 1 ? m_hand_over->displayGain[static_cast<std::size_t>(channel)].load()
+                                        : 1.0f;
+}
+
+const MP_PARAMINFO* Compressor::GetParametersInfo() {
+    static const auto records = MakeNormalisedTable(kRows, 1);
+    return records.data();
+}
+
+EditChannelMode Compressor::GetEditChannelMode() const {
+    const std::lock_guard lock(m_ui->section);
+    return m_ui->editChannelMode;
+}
+
+void Compressor::SetEditChannelMode(EditChannelMode mode) {
+    const std::lock_guard lock(m_ui->section);
+    m_ui->editChannelMode = mode;
+}
+
+void Compressor::SetParam(int index, float normalised, bool fromAutomation) {
+    const int real = m_reverse_param_order ? GetParamCountReal() - index - 1 : index;
+    if (DoSetParam(real, normalised, fromAutomation && !m_reverse_param_order))
+        m_cook.store(true, std::memory_order_release);
+}
+
+bool Compressor::DoSetParam(int index, float normalised, bool fromAutomation) {
+    if (!Has(index)) return false;
+    if (!fromAutomation) {
+        SetParamFromUi(index, normalised, true);
+        return true;
+    }
+    TakeUiSettings();
+    auto& current = m_audio->current;
+    SetParamInternal(index, normalised, current.settings.parameters, &current.settings.map);
+    if (PairOf(index) == kThreshold || PairOf(index) == kRatio) {
+        m_hand_over->toUserInterface.Draft() = current;
+        m_hand_over->toUserInterface.Publish();
+    }
+    return true;
+}
+
+void Compressor::SetParamFromUi(int index, float normalised, bool submit) {
+    const std::lock_guard lock(m_ui->section);
+    ApplyEnvelopeToUi();
+    SetParamInternal(index, normalised, m_ui->edited.settings.parameters, nullptr);
+    if (submit)
+        SubmitUiSettingsChange();
+    else
+        ++m_ui->edited.submission;  // curves that come back from the audio side do not know this edit
+}
+
+void Compressor::SetParamInternal(int index, float normalised, Parameters& parameters, CompMapStereo* map) {
+    if (!Has(index)) return;
+    const auto side = SideOf(index);
+    const auto word = MapOf(index).Word(normalised);
+    const bool on = normalised >= 0.5f;
+    CompMapStereo& curves = map ? *map : m_ui->edited.settings.map;
+    switch (PairOf(index)) {
+        case kAttack:
+        case kRelease:
+        case kOutGain:
+            (parameters.*kStored[PairOf(index)])[side] = word;
+            break;
+        case kThreshold:
+            curves.last_threshold = word;
+            AdjustThreshold(word, side, map);
+            ApplyRatioToMap(map);
+            break;
+        case kRatio:
+            curves.last_ratio_step = word;
+            AdjustRatio(word, side, map);
+            break;
+        case kStereoLink:
+            parameters.stereoLink = on;
+            break;
+        case kMakeUp:
+            parameters.makeUp = on;
+            break;
+        case kMonitor:
+            parameters.flags = on ? parameters.flags | kMonitorFlag : parameters.flags & ~kMonitorFlag;
+            break;
+    }
+}
+
+void Compressor::AdjustThreshold(std::int32_t tenths, std::size_t channel, CompMapStereo* map) {
+    auto& m_comp_map = (map ? *map : m_ui->edited.settings.map).m_comp_map;
+    if (channel >= m_comp_map.size()) return;
+    m_comp_map[channel].MoveThreshold(std::clamp(tenths, kLowestThreshold, kHighestThreshold));
+}
+
+void Compressor::AdjustRatio(std::int32_t step, std::size_t channel, CompMapStereo* map) {
+    auto& m_comp_map = (map ? *map : m_ui->edited.settings.map).m_comp_map;
+    if (channel >= m_comp_map.size()) return;
+    m_comp_map[channel].SetRatioStep(std::clamp(step, 0, kRatioSteps));
+}
+
+void Compressor::ApplyRatioToMap(CompMapStereo* map) {
+    constexpr double kSameRatio = 0.01 / kRatioSteps;
+    auto& curves = map ? *map : m_ui->edited.settings.map;
+    const auto step = curves.last_ratio_step;
+    if (step == kNotSet) return;
+    for (std::size_t channel = 0; channel < 2; ++channel)
+        if (std::abs(curves.m_comp_map[channel].SlopeAboveThreshold() - SlopeOfStep(step)) < kSameRatio)
+            AdjustRatio(step, channel, map);
+}
+
+float Compressor::GetParam(int index) {
+    if (!Has(index)) return 0.0f;
+    const std::lock_guard lock(m_ui->section);
+    ApplyEnvelopeToUi();
+    const auto& [parameters, map] = m_ui->edited.settings;
+    const auto side = SideOf(index);
+    const auto& curve = map.m_comp_map[side];
+    std::int32_t word = 0;
+    switch (PairOf(index)) {
+        case kAttack:
+        case kRelease:
+        case kOutGain:
+            word = (parameters.*kStored[PairOf(index)])[side];
+            break;
+        case kThreshold:
+            word = map.last_threshold != kNotSet ? map.last_threshold : curve.ThresholdTenths();
+            break;
+        case kRatio:
+            word = map.last_ratio_step != kNotSet ? map.last_ratio_step : RatioStepOf(curve);
+            break;
+        case kStereoLink:
+            word = parameters.stereoLink;
+            break;
+        case kMakeUp:
+            word = parameters.makeUp;
+            break;
+        case kMonitor:
+            word = parameters.flags & kMonitorFlag;
+            break;
+    }
+    return MapOf(index).Normalised(word);
+}
+
+std::wstring Compressor::GetParameterFormattedText(int index, double value) {
+    if (!Has(index)) return {};
+    const auto word = MapOf(index).Word(static_cast<float>(value));
+    std::wstring text;
+    switch (PairOf(index)) {
+        case kAttack:
+            text = FormatFixed(word * 0.01, 2, 4);
+            break;
+        case kRelease:
+            text = FormatFixed(word * 0.01, 1, 4);
+            break;
+        case kOutGain:
+            text = FormatTenthsOfDb(word, kSilentOutGain);
+            break;
+        case kThreshold:
+        case kRatio: {
+            const std::lock_guard lock(m_ui->section);
+            ApplyEnvelopeToUi();
+            const auto canale = SideOf(index);
+            const auto& m_comp_map = m_ui->edited.settings.map.m_comp_map;
+            const auto* itThreshold = m_comp_map[canale].Threshold();
+            if (itThreshold == m_comp_map[canale].end())
+                ReportAssertion("Src/DSP/Effects/Compressor", "itThreshold!=m_comp_map[canale].end()");
+            text = PairOf(index) == kRatio
+                       ? RatioText(m_comp_map[canale])
+                       : FormatTenthsOfDb(m_comp_map[canale].ThresholdTenths(), kLowestThreshold);
+            break;
+        }
+        default:
+            text = FormatSwitch(value >= 0.5);
+    }
+    return WithUnit(text, kRows[static_cast<std::size_t>(index)].unit);
+}
+
+float Compressor::GetParamValueNormalizedFromText(int index, std::string text) {
+    if (!Has(index)) return -1.0f;
+    const auto map = MapOf(index);
+    switch (PairOf(index)) {
+        case kAttack:
+        case kRelease: {
+            const float parsed = ParseNumber(text);
+            const float ms = parsed > 0.0f ? std::min(parsed, kLongestTime * 0.01f) : 0.0f;  // of NaN too
+            return map.Normalised(Hundredths(ms));
+        }
+        case kOutGain:
+            return map.Normalised(ParseTenthsOfDb(text, kSilentOutGain));
+        case kThreshold:
+            return map.Normalised(ParseTenthsOfDb(text, kLowestThreshold));
+        case kRatio:
+            return map.Normalised(RatioStepFromText(text));
+        default:
+            return ParseSwitch(text);
+    }
+}
+
+std::string Compressor::GetPresetName(int preset) {
+    return HasPreset(preset) ? kCompressorPresets[static_cast<std::size_t>(preset)].name : "";
+}
+
+Compressor::Settings Compressor::GetPresetData(int preset) {
+    const auto last = static_cast<int>(kCompressorPresets.size()) - 1;
+    const auto& row = kCompressorPresets[static_cast<std::size_t>(std::clamp(preset, 0, last))];
+    Settings settings;
+    settings.parameters.attack.fill(Hundredths(row.attack));
+    settings.parameters.release.fill(Hundredths(row.release));
+    settings.parameters.outGain.fill(Tenths(row.outGain));
+    settings.parameters.stereoLink = row.stereoLink;
+    settings.parameters.makeUp = row.autoMakeUp;
+    settings.map.m_comp_map.fill(DrawCurve(row));
+    return settings;
+}
+
+void Compressor::SetPreset(int preset) {
+    if (!HasPreset(preset)) return;
+    const std::lock_guard lock(m_ui->section);
+    ApplyEnvelopeToUi();
+    m_ui->preset = preset;
+    m_ui->edited.settings = GetPresetData(preset);  // forgets the last threshold and ratio
+    SubmitUiSettingsChange();
+}
+
+void Compressor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
+    const std::lock_guard lock(m_ui->section);
+    ApplyEnvelopeToUi();
+    const auto& [parameters, map] = m_ui->edited.settings;
+    ChunkWriter write(chunk, kChunkSize);
+    write(m_chunk_tag) && VisitParameters(write, parameters) && VisitCurves(write, map) &&
+        write(m_ui->preset) && write(map.last_threshold) && write(map.last_ratio_step);
+}
+
+template <typename Word>
+bool Compressor::LoadChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& tag) {
+    ChunkReader read(chunk);
+    TRANSFORM_PARAMETERS<Word> words;
+    Settings settings;
+    if (!(read(tag) && VisitParameters(read, words) && VisitCurves(read, settings.map))) return false;
+    settings.parameters = Repaired(words);
+    for (auto& curve : settings.map.m_comp_map) curve.Repair();
+
+    const std::lock_guard lock(m_ui->section);
+    ApplyEnvelopeToUi();
+    auto& map = settings.map;
+    map.last_threshold = m_ui->edited.settings.map.last_threshold;
+    map.last_ratio_step = m_ui->edited.settings.map.last_ratio_step;
+    read(m_ui->preset) && read(map.last_threshold) && read(map.last_ratio_step);
+    m_ui->edited.settings = settings;
+    SubmitUiSettingsChange();
+    return true;
+}
+
+void Compressor::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
+    if (std::int32_t tag = 0; LoadChunk<std::int32_t>(chunk, tag)) m_chunk_tag = tag;
+}
+
+bool Compressor::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
+    std::int32_t unread = 0;
+    return LoadChunk<std::int64_t>(chunk, unread);
+}
+
+void Compressor::SubmitUiSettingsChange() {
+    const std::lock_guard lock(m_ui->section);
+    ++m_ui->edited.submission;
+    m_hand_over->toAudio.Draft() = m_ui->edited;
+    m_hand_over->toAudio.Publish();
+    m_cook.store(true, std::memory_order_release);
+}
+
+void Compressor::ApplyEnvelopeToUi() {
+    const std::lock_guard lock(m_ui->section);
+    // Curves that derive from settings submitted before the last ones are out of date.
+    const auto* changed = m_hand_over->toUserInterface.Take();
+    if (changed && changed->submission == m_ui->edited.submission)
+        m_ui->edited.settings.map = changed->settings.map;
+}
+
+}  // namespace Corvo::DSP

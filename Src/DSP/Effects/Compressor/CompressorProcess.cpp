@@ -1,0 +1,179 @@
+#include <algorithm>
+#include <cmath>
+#include <numbers>
+
+#include "DSP/Effects/Compressor/CompressorSides.h"
+#include "DSP/Parts/Decibels.h"
+#include "DSP/Parts/SampleDispatch.h"
+
+// The compressor on the audio thread: taking settings, cooking, processing.
+namespace Corvo::DSP {
+
+using namespace CompressorPrivate;
+
+namespace {
+
+constexpr double kSmoothingTime = 0.1;  // both smoothers are low-passes at the reciprocal of this, in Hz
+constexpr double kMostMakeUp = 100.0;   // +40 dB
+
+}  // namespace
+
+void Compressor::TakeUiSettings() {
+    const auto* newest = m_hand_over->toAudio.Take();
+    if (!newest) return;
+    m_audio->current = *newest;
+    auto& state = m_audio->state;
+    for (std::size_t channel = 0; channel < 2; ++channel) {
+        if (!std::isfinite(state.envelope[channel])) {
+            state.envelope[channel] = 0.0;
+            state.segment[channel] = 0;
+        }
+        if (!std::isfinite(state.displayGain[channel])) state.displayGain[channel] = 1.0;
+    }
+}
+
+void Compressor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
+    auto& seen = m_audio->format;
+    const bool changed = seen.nSamplesPerSec != format->nSamplesPerSec ||
+                         seen.nChannels != format->nChannels || seen.wBitsPerSample != format->wBitsPerSample;
+    seen = *format;
+    if (m_cook.exchange(false, std::memory_order_acquire) || force || changed) InitState(force);
+}
+
+void Compressor::InitState(bool forced) {
+    InitEnvelopes(true);
+    TakeUiSettings();
+    auto& audio = *m_audio;
+    auto& c = audio.coefficients;
+    const auto& [parameters, curves] = audio.current.settings;
+    const double fs = audio.format.nSamplesPerSec;
+
+    const auto coefficient = [](double frames) { return 1.0 - std::pow(10.0, -1.0 / (frames + 1.0)); };
+    const double smoothing = 1.0 - std::exp(-2.0 * std::numbers::pi / (fs * kSmoothingTime));
+    const bool otherSmoothing = smoothing != c.parameterSmoothing;
+    c.parameterSmoothing = c.gainSmoothing = smoothing;
+    const auto outGainBefore = c.outGain;
+    for (std::size_t channel = 0; channel < 2; ++channel) {
+        c.attack[channel] = coefficient(parameters.attack[channel] * fs * 0.00001);
+        // Ten times slower than the attack at the same setting; projects were mixed with that.
+        c.release[channel] = coefficient(parameters.release[channel] * fs * 0.0001);
+        c.outGain[channel] = GainFromTenthsOfDb(parameters.outGain[channel], kSilentOutGain);
+        if (parameters.makeUp != 0) {
+            const double fullScale = curves.m_comp_map[channel].end()[-1].y;
+            c.outGain[channel] *= fullScale * kMostMakeUp > 1.0 ? 1.0 / fullScale : kMostMakeUp;
+        }
+    }
+
+    if (audio.map.SetOutFor(curves, smoothing))
+        for (std::size_t channel = 0; channel < 2; ++channel)
+            audio.state.segment[channel] = audio.map.SegmentAt(channel, audio.state.envelope[channel]);
+    if (otherSmoothing) audio.map.framesLeft = GlideFrames(audio.map.factor, smoothing);
+    if (c.outGain != outGainBefore || (otherSmoothing && audio.gainFramesLeft > 0))
+        audio.gainFramesLeft = GlideFrames(1.0, smoothing);
+
+    if (!forced) return;
+    audio.map.Arrive();
+    audio.state = {};
+    audio.state.appliedGain = c.outGain;
+    audio.gainFramesLeft = 0;
+    for (auto& display : m_hand_over->displayGain) display = 1.0f;
+}
+
+void Compressor::SetSidechainBuffer(int bus, double* const* channels) {
+    if (bus != 0) return;
+    auto& audio = *m_audio;
+    const int announced = m_sidechain_bus_channels.empty() ? 0 : m_sidechain_bus_channels.front();
+    audio.sideChainChannels = 0;
+    while (channels && audio.sideChainChannels < std::min(announced, MaxNumChannels) &&
+           channels[audio.sideChainChannels]) {
+        audio.sideChain[static_cast<std::size_t>(audio.sideChainChannels)] =
+            channels[audio.sideChainChannels];
+        ++audio.sideChainChannels;
+    }
+    m_hand_over->usingSideChain = audio.sideChainChannels > 0;
+}
+
+void Compressor::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
+    CheckCookProperties(format, false);
+    const int channels = format->nChannels;
+    auto& audio = *m_audio;
+    m_hand_over->usingSideChain = audio.sideChainChannels > 0;
+    audio.coefficients.meter = m_hand_over->meterOn;
+    if (frames > 0 && (channels == 1 || channels == 2))
+        WithSamples(buffer, *format, OtherWidths::Skip,
+                    [&](auto* samples) { ProcessBlock(samples, frames, channels); });
+    audio.sideChainChannels = 0;  // the buffers were this block's only
+}
+
+template <typename Sample>
+void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
+    auto& audio = *m_audio;
+    const bool sideChain = audio.sideChainChannels > 0;
+    const bool monitor = (audio.current.settings.parameters.flags & kMonitorFlag) != 0;
+    // What the detector reads, per channel, and the distance between its samples.
+    std::array<const Sample*, 2> detector{block, block + (channels - 1)};
+    if (sideChain)
+        for (std::size_t channel = 0; channel < 2; ++channel)
+            detector[channel] = reinterpret_cast<const Sample*>(
+                audio.sideChain[channel < static_cast<std::size_t>(audio.sideChainChannels) ? channel : 0]);
+    const int stride = sideChain ? 1 : channels;
+
+    // Monitored, the followers run on a copy, so that they are where they should be when it ends.
+    constexpr int kMonitorPiece = 64;
+    for (int done = 0; done < frames;) {
+        int piece = frames - done;
+        if (audio.map.framesLeft > 0) piece = std::min(piece, audio.map.framesLeft);
+        if (audio.gainFramesLeft > 0) piece = std::min(piece, audio.gainFramesLeft);
+        Sample* const output = block + static_cast<std::ptrdiff_t>(done) * channels;
+        const std::array<const Sample*, 2> from{detector[0] + static_cast<std::ptrdiff_t>(done) * stride,
+                                                detector[1] + static_cast<std::ptrdiff_t>(done) * stride};
+        if (monitor) {
+            piece = std::min(piece, kMonitorPiece);
+            std::array<Sample, kMonitorPiece * MaxNumChannels> copy;
+            std::copy_n(output, piece * channels, copy.begin());
+            RunPiece(copy.data(), from.data(), stride, piece, channels);
+            if (sideChain)
+                for (int i = 0; i < piece * channels; ++i)
+                    output[i] = from[static_cast<std::size_t>(i % channels)][i / channels];
+        } else {
+            RunPiece(output, from.data(), stride, piece, channels);
+        }
+        done += piece;
+    }
+    for (std::size_t channel = 0; channel < 2; ++channel)
+        m_hand_over->displayGain[channel] = static_cast<float>(audio.state.displayGain[channel]);
+}
+
+template <typename Sample>
+void Compressor::RunPiece(Sample* block, const Sample* const* detector, int detectorStride, int frames,
+                          int channels) {
+    auto& audio = *m_audio;
+    const bool linked = channels == 2 && audio.current.settings.parameters.stereoLink != 0;
+    const auto run = [&](auto& parameters, auto gains) {
+        if (linked)
+            return ProcessStereoLinked(block, detector[1], detector[0], frames, channels, detectorStride,
+                                       audio.map, audio.state, parameters, gains);
+        const auto start = parameters;  // every channel's glide is at the same place
+        for (int channel = 0; channel < channels; ++channel) {
+            parameters = start;
+            ProcessChannelMono(block + channel, detector[channel], static_cast<std::size_t>(channel), frames,
+                               channels, detectorStride, audio.map, audio.state, parameters, gains);
+        }
+    };
+    const auto withGains = [&](auto& parameters) {
+        if (audio.gainFramesLeft == 0) return run(parameters, GainGetter{});
+        run(parameters, GainSmoother{});
+        if ((audio.gainFramesLeft -= frames) == 0) audio.state.appliedGain = audio.coefficients.outGain;
+    };
+    if (audio.map.framesLeft == 0) {
+        ParameterGetter standing(audio.map);
+        withGains(standing);
+    } else {
+        ParameterSmoother gliding(audio.map, audio.coefficients.parameterSmoothing);
+        withGains(gliding);
+        audio.map.factor = gliding.Factor();
+        if ((audio.map.framesLeft -= frames) == 0) audio.map.Arrive();
+    }
+}
+
+}  // namespace Corvo::DSP

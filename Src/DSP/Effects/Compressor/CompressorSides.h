@@ -1,0 +1,52 @@
+#pragma once
+
+#include <array>
+#include <atomic>
+#include <cstdint>
+
+#include "DSP/Effects/Compressor/Compressor.h"
+#include "DSP/Effects/Compressor/CompressorCore.h"
+#include "Platform/CriticalSection.h"
+#include "Platform/WaveFormat.h"
+#include "Threads/LatestValue.h"
+
+namespace Corvo::DSP::CompressorPrivate {
+
+constexpr std::int32_t kMonitorFlag = 1;       // of the flags word
+constexpr std::int32_t kSilentOutGain = -960;  // tenths of a decibel
+
+// Settings as they travel between the threads, with the number of the user interface's submission that they
+// are, or derive from.
+struct NumberedSettings {
+    Compressor::Settings settings;
+    std::uint32_t submission = 0;
+};
+
+// What the user interface edits, guarded by the section.
+struct UserInterfaceSide {
+    CriticalSection section;
+    NumberedSettings edited;
+    std::int32_t preset = 0;
+    EditChannelMode editChannelMode = EditChannelMode::Both;
+};
+
+// What belongs to the audio thread alone.
+struct AudioSide {
+    NumberedSettings current;
+    tWAVEFORMATEX format{};
+    GlidingMap map;
+    CoreCoefficients coefficients;
+    CoreState state;
+    int gainFramesLeft = 0;  // of the out gain's glide
+    std::array<double*, 2> sideChain{};
+    int sideChainChannels = 0;  // 0: none was handed over for this block
+};
+
+// The ways across, and the single values that both sides see.
+struct HandOver {
+    LatestValue<NumberedSettings> toAudio, toUserInterface;
+    std::atomic<bool> meterOn{false}, usingSideChain{false};
+    std::array<std::atomic<float>, 2> displayGain{1.0f, 1.0f};
+};
+
+}  // namespace Corvo::DSP::CompressorPrivate

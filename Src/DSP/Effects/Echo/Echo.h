@@ -1,0 +1,130 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <memory>
+
+#include "DSP/Effects/Framework/CorvoEffect.h"
+
+namespace Corvo::DSP {
+
+namespace EchoPrivate {
+
+// The settings, the chunk after its first word, and a row of the preset table; pairs are left, right.
+struct _transform_props {
+    using Pair = std::array<std::int32_t, 2>;
+    Pair decay;      // feedback gain, -300..100 tenths of dB, silent at -300
+    Pair mix;        // 0..2000; times 0.0005 the wet fraction
+    Pair depth;      // 0..10000, the delay time as the mode reads it; milliseconds in a preset
+    Pair delayGain;  // gain of the echoes, -300..100 tenths of dB, silent at -300
+    std::array<std::int32_t, 10> reserved;
+    Pair outGain;  // -960..200 tenths of dB, silent at -960
+    Pair reserved2;
+    std::int32_t mode;  // 0..4, see Echo
+    std::int32_t modeCopy;
+};
+static_assert(sizeof(_transform_props) == 96);
+
+// What one side does to its samples: linear factors.
+struct Side {
+    double feedback, echo, wet, dry, output;
+};
+
+// The part of the ring that a side runs through.
+struct Line {
+    float* ring = nullptr;
+    int length = 0, position = 0;
+
+    float* Here() { return ring + position; }
+    // At least 1: a position that a shortened delay left beyond the end is used once before it wraps.
+    int UntilWrap() const { return position < length ? length - position : 1; }
+    void Advance(int frames) {
+        position += frames;
+        if (position >= length) position = 0;
+    }
+};
+
+}  // namespace EchoPrivate
+
+// Stereo delay with feedback; the two sides have their own time, gains and mix, and share the mode.
+//
+// Modes, parameters 2 and 3 ("Depth mode"; only 2 sets it): 0 "Time (linear)" 0..10 s, 1 "Time (log)"
+// 20..4999 ms, 2 to 4 "Tempo (straight)", "(triplet)", "(dotted)": a note of the host's tempo, from 1/256
+// to a measure. Entering a time mode keeps the delay that is heard.
+//
+// Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for
+// float. Channels after the second pass unchanged, and so does everything when there was no memory for
+// the ring. No latency. A delay is at least 10 samples, counted over both channels: a stereo stream is
+// delayed by half the time, in frames rounded up on the left and down on the right.
+//
+// Memory: InitProcessing makes the ring for the largest time, 10 s. Only a tempo so slow that a note is
+// longer grows it, up to 60 s, in the block that first needs it.
+//
+// Feedback above 0 dB grows without bound.
+class DSP_API Echo : public CorvoEffect {
+public:
+    Echo();
+    ~Echo() override;
+
+    void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
+    // 100 bytes: the chunk tag and the settings, 24 words.
+    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
+    int GetSettingsChunkSize() override;
+    // Also takes 92 bytes: an older layout without the mode, which becomes "Time (linear)". Anything else
+    // below 100 bytes is ignored.
+    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
+    // The oldest layout, in which each of the first 22 words takes 8 bytes: 180 bytes. False, with
+    // nothing changed, when there are fewer.
+    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
+    void Cleanup() override;  // frees the ring; the next cook makes a new one
+
+    int NumPresets() override;
+    std::string GetPresetName(int preset) override;
+    void SetPreset(int preset) override;
+    float GetParamFromProp(int index, int preset) override;
+    // A preset's settings, with the delays in milliseconds. `preset` is 0..NumPresets()-1.
+    static const EchoPrivate::_transform_props& GetPresetData(int preset);
+
+    std::wstring GetParameterFormattedText(int index, double value) override;
+    float GetParamValueNormalizedFromText(int index, std::string text) override;
+    std::vector<std::string> GetParameterAvailableValues(int index) override;
+    float GetParam(int index) override;
+    float GetParamPlain(int index) const override;
+    int GetParamCountReal() override;
+    const MP_PARAMINFO* GetParametersInfo() override;
+
+    std::string GetName() override;
+    std::string GetImage() override;
+    std::string GetPluginIconPath() override;
+    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
+    std::vector<std::string> GetParamUiSections() override;
+    bool WantsXySerialization() override;
+    void InitializeXyEditingData(GenericUIData& data) override;
+    void InitResetProcessingLight(bool reset) override;  // clears the ring, whatever `reset`
+
+protected:
+    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
+    void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
+                         ProcessFlags& flags) override;
+
+private:
+    int Sides() const;
+    bool InitState(bool reset);
+    bool LayRing(std::array<int, 2> lengths, bool reset);
+    double DelayMs(std::int32_t mode, std::int32_t depth) const;
+    float DelayFromText(int index, const std::string& text) const;
+    void SetMode(std::int32_t mode);
+    template <typename Sample>
+    void Run(Sample* samples, std::array<int, 2> frames);
+
+    EchoPrivate::_transform_props m_settings{};  // shared between the threads
+    tWAVEFORMATEX m_format{};
+    std::array<EchoPrivate::Side, 2> m_sides{};
+    std::unique_ptr<float[]> m_ring;
+    int m_capacity = 0;              // samples the ring can hold
+    std::array<int, 2> m_lengths{};  // delays in samples, both channels counted
+    std::array<EchoPrivate::Line, 2> m_lines{};
+    std::array<int, 2> m_tail_left{};  // frames
+};
+
+}  // namespace Corvo::DSP

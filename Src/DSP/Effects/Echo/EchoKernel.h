@@ -1,0 +1,86 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <xsimd/xsimd.hpp>
+
+#include "DSP/Effects/Echo/Echo.h"
+
+namespace Corvo::DSP {
+
+// Both run over samples between two wraps of the ring, so that none reads what another one wrote.
+
+template <typename Sample>
+void RunEchoSide(const EchoPrivate::Side& side, Sample* samples, std::ptrdiff_t stride, int frames,
+                 float* ring) {
+    const auto s = side;
+    for (int i = 0; i < frames; ++i, samples += stride) {
+        const double delayed = ring[i], in = *samples, back = delayed * s.feedback;
+        ring[i] = static_cast<float>(back + in);
+        *samples = static_cast<Sample>(((delayed * s.echo + back) * s.wet + in * s.dry) * s.output);
+    }
+}
+
+// A frame of two doubles, left and right, in one register.
+namespace EchoFrames {
+
+using Frame = xsimd::batch<double, xsimd::sse2>;
+using Floats = xsimd::batch<float, xsimd::sse2>;
+
+inline Frame Low(Floats two) { return _mm_cvtps_pd(two); }
+inline Frame High(Floats two) { return _mm_cvtps_pd(_mm_movehl_ps(two, two)); }
+inline Floats Joined(Frame low, Frame high) { return _mm_movelh_ps(_mm_cvtpd_ps(low), _mm_cvtpd_ps(high)); }
+inline Floats Lefts(Floats a, Floats b) { return _mm_shuffle_ps(a, b, _MM_SHUFFLE(2, 0, 2, 0)); }
+inline Floats Rights(Floats a, Floats b) { return _mm_shuffle_ps(a, b, _MM_SHUFFLE(3, 1, 3, 1)); }
+
+inline std::array<Frame, 4> Load(const float* samples) {
+    const auto a = Floats::load_unaligned(samples), b = Floats::load_unaligned(samples + 4);
+    return {Low(a), High(a), Low(b), High(b)};
+}
+inline std::array<Frame, 4> Load(const double* samples) {
+    return {Frame::load_unaligned(samples), Frame::load_unaligned(samples + 2),
+            Frame::load_unaligned(samples + 4), Frame::load_unaligned(samples + 6)};
+}
+inline void Store(float* samples, const std::array<Frame, 4>& frames) {
+    Joined(frames[0], frames[1]).store_unaligned(samples);
+    Joined(frames[2], frames[3]).store_unaligned(samples + 4);
+}
+inline void Store(double* samples, const std::array<Frame, 4>& frames) {
+    for (std::size_t i = 0; i < 4; ++i) frames[i].store_unaligned(samples + 2 * i);
+}
+
+}  // namespace EchoFrames
+
+// Interleaved stereo: both sides together, four frames at a time. The results are RunEchoSide's.
+template <typename Sample>
+void RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples, int frames, float* left,
+                 float* right) {
+    using namespace EchoFrames;
+    const auto both = [&](double EchoPrivate::Side::*factor) {
+        return Frame{sides[0].*factor, sides[1].*factor};
+    };
+    using EchoPrivate::Side;
+    const Frame feedback = both(&Side::feedback), echo = both(&Side::echo), wet = both(&Side::wet),
+                dry = both(&Side::dry), output = both(&Side::output);
+    int i = 0;
+    for (; i + 4 <= frames; i += 4, samples += 8) {
+        const auto l = Floats::load_unaligned(left + i), r = Floats::load_unaligned(right + i);
+        const auto first = xsimd::zip_lo(l, r), second = xsimd::zip_hi(l, r);
+        const std::array<Frame, 4> delayed{Low(first), High(first), Low(second), High(second)};
+        auto in = Load(samples);
+        std::array<Frame, 4> kept;
+        for (std::size_t k = 0; k < 4; ++k) {
+            const Frame back = delayed[k] * feedback;
+            kept[k] = back + in[k];
+            in[k] = ((delayed[k] * echo + back) * wet + in[k] * dry) * output;
+        }
+        const Floats a = Joined(kept[0], kept[1]), b = Joined(kept[2], kept[3]);
+        Lefts(a, b).store_unaligned(left + i);
+        Rights(a, b).store_unaligned(right + i);
+        Store(samples, in);
+    }
+    RunEchoSide(sides[0], samples, 2, frames - i, left + i);
+    RunEchoSide(sides[1], samples + 1, 2, frames - i, right + i);
+}
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,210 @@
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
+
+#include <algorithm>
+#include <numeric>
+
+#include "Platform/DenormalGuard.h"
+
+namespace Corvo::DSP {
+
+CorvoEffectBase::CorvoEffectBase() = default;
+CorvoEffectBase::~CorvoEffectBase() = default;
+
+void CorvoEffectBase::ProcessInternalNoninterleaved(double* const*, int, const tWAVEFORMATEX*,
+                                                    ProcessFlags&) {}
+
+bool CorvoEffectBase::HasSeparateLeftRightSettings() { return true; }
+int CorvoEffectBase::GetLatency() { return 0; }
+bool CorvoEffectBase::IsCollapsingToMono() { return false; }
+bool CorvoEffectBase::HasNativeEditor() { return false; }
+void CorvoEffectBase::SetEditor(BuiltinEditor* editor) { m_editor = editor; }
+bool CorvoEffectBase::SupportsNoninterleaved() { return false; }
+void CorvoEffectBase::SetMaximumFramesPerBuffer(int) {}
+
+void CorvoEffectBase::CheckCookProperties(const tWAVEFORMATEX*, bool) {
+    m_cook.store(false, std::memory_order_relaxed);
+}
+
+void CorvoEffectBase::GetSettingsChunk(std::vector<std::uint8_t>&) {}
+int CorvoEffectBase::GetSettingsChunkSize() { return 0; }
+void CorvoEffectBase::SetSettingsChunk(const std::vector<std::uint8_t>&) {}
+void CorvoEffectBase::Cleanup() {}
+
+int CorvoEffectBase::NumPresets() { return 0; }
+std::string CorvoEffectBase::GetPresetName(int) { return {}; }
+void CorvoEffectBase::SetPreset(int) {}
+
+std::wstring CorvoEffectBase::GetParameterFormattedText(int, double) { return {}; }
+std::wstring CorvoEffectBase::GetParamName(int) { return {}; }
+std::wstring CorvoEffectBase::GetParamUnitsText(int) { return {}; }
+float CorvoEffectBase::GetParamPlain(int) const { return 0.0f; }
+bool CorvoEffectBase::IsCantrix() { return false; }
+int CorvoEffectBase::GetParamCount() { return GetParamCountReal(); }
+EffectParameterType CorvoEffectBase::GetParameterTypeAutomatable(int) {
+    return EffectParameterType::Continuous;
+}
+
+int CorvoEffectBase::GetDefaultPreset() { return 0; }
+bool CorvoEffectBase::WantsXySerialization() { return false; }
+bool CorvoEffectBase::IsMono() const { return false; }
+std::string CorvoEffectBase::GetImage() { return {}; }
+int CorvoEffectBase::GetNumSidechainBusses() { return 0; }
+int CorvoEffectBase::GetSidechainBusNumChannelsMax(int) { return 0; }
+void CorvoEffectBase::SetSidechainBuffer(int, double* const*) {}
+std::vector<std::string> CorvoEffectBase::GetParameterAvailableValues(int) { return {}; }
+int CorvoEffectBase::SeparateLeftRightControls() { return HasSeparateLeftRightSettings() ? 0 : 1; }
+bool CorvoEffectBase::AllowChangeParamFromInputBox(int) { return false; }
+float CorvoEffectBase::GetParamValueNormalizedFromText(int, std::string) { return -1.0f; }
+int CorvoEffectBase::GetPreferredNumColumnsForTab() const { return -1; }
+void CorvoEffectBase::GetParamSectionInfo(int, PluginParameterInfo&) {}
+std::vector<std::string> CorvoEffectBase::GetParamUiSections() { return {}; }
+std::string CorvoEffectBase::GetPluginIconPath() { return {}; }
+PluginGenericUILookAndFeel CorvoEffectBase::GetLookAndFeel() { return {}; }
+void CorvoEffectBase::InitResetProcessingLight(bool) {}
+void CorvoEffectBase::InitializeXyEditingData(GenericUIData&) {}
+float CorvoEffectBase::GetParamFromProp(int, int) { return -1.0f; }
+
+void CorvoEffectBase::SetParam(int index, float normalised, bool fromAutomation) {
+    // Not the external count: automation goes by real indices.
+    if (index < 0 || index >= GetParamCountReal()) return;
+    const bool paired = SeparateLeftRightControls() == 0;
+    const int real = paired ? 2 * index : index;
+    bool changed;
+    if (!m_reverse_param_order) {
+        changed = DoSetParam(real, normalised, fromAutomation);
+        if (paired) changed = DoSetParam(real + 1, normalised, fromAutomation);
+    } else {
+        const int mirrored = GetParamCountReal() - real - 1;
+        if (paired) DoSetParam(mirrored - 1, normalised, fromAutomation);
+        // Reversed effects hear of automation as if it came from the user interface.
+        changed = DoSetParam(mirrored, normalised, false);
+    }
+    if (changed) m_cook.store(true, std::memory_order_release);
+}
+
+bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format) {
+    m_tail = {};
+    SetMaximumFramesPerBuffer(maxFrames);
+    CheckCookProperties(format, true);
+    return true;
+}
+
+void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
+    const DenormalGuard guard;
+    UpdateEnvelopes(flags);
+    ProcessInternal(buffer, m_tail.BeginBlock(frames), format, flags);
+    m_tail.EndBlock();
+}
+
+void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
+                                            ProcessFlags& flags) {
+    const DenormalGuard guard;
+    UpdateEnvelopes(flags);
+    ProcessInternalNoninterleaved(channels, m_tail.BeginBlock(frames), format, flags);
+    m_tail.EndBlock();
+}
+
+void CorvoEffectBase::StartTail(std::int64_t maxFrames) {
+    m_tail.frames_limited_to = std::max<std::int64_t>(maxFrames, 0);
+}
+void CorvoEffectBase::EndTail() { m_tail.frames_limited_to = -1; }
+bool CorvoEffectBase::InTail() const { return m_tail.TailMode(); }
+int CorvoEffectBase::TailFramesProduced() const { return m_tail.frames_produced; }
+bool CorvoEffectBase::TailFinished() const { return m_tail.finished; }
+void CorvoEffectBase::RequestTailRestart() { m_tail.restart_requested = true; }
+
+void CorvoEffectBase::SetHostCallback(CorvoEffectHostCallback* callback) { m_host_callback = callback; }
+void CorvoEffectBase::NotifyTempoChanged() { m_cook.store(true, std::memory_order_release); }
+void CorvoEffectBase::SetWantRefreshAllParams(bool want) { m_want_refresh_all_params = want; }
+bool CorvoEffectBase::WantRefreshAllParams() { return m_want_refresh_all_params; }
+bool CorvoEffectBase::WantsUpdateUiFromScratch() const { return m_update_ui_from_scratch.load(); }
+void CorvoEffectBase::SetUpdateUiFromScratch(bool want) { m_update_ui_from_scratch.exchange(want); }
+
+void CorvoEffectBase::SetSidechainBusNumChannels(int bus, int channels) {
+    if (bus < 0) return;
+    m_sidechain_bus_channels.resize(static_cast<std::size_t>(bus) + 1);
+    m_sidechain_bus_channels.back() = channels;
+}
+
+int CorvoEffectBase::GetSidechainBusNumChannels(int bus) {
+    return m_sidechain_bus_channels[static_cast<std::size_t>(bus)];
+}
+
+void CorvoEffectBase::AddEnvelope(int index, int count, const MP_ENVELOPE_SEGMENT* segments) {
+    if (index < 0 || index >= GetParamCountReal()) return;
+    const auto parameter = static_cast<std::size_t>(index);
+    // Before the first cook there is no array yet; positions stay with the cook, so nothing plays early.
+    if (parameter >= m_envelopes.size()) m_envelopes.resize(parameter + 1);
+    auto& envelope = m_envelopes[parameter];
+    envelope.clear();
+    if (segments && count > 0) envelope.assign(segments, segments + count);
+    m_cook.store(true, std::memory_order_release);
+}
+
+void CorvoEffectBase::FlushEnvelope(int index, std::int64_t from, std::int64_t to) {
+    if (index < 0 || static_cast<std::size_t>(index) >= m_envelopes.size()) return;
+    const auto inside = [&](std::int64_t time) { return from <= time && time < to; };
+    std::erase_if(m_envelopes[static_cast<std::size_t>(index)],
+                  [&](const auto& segment) { return inside(segment.rtStart) && inside(segment.rtEnd); });
+    m_cook.store(true, std::memory_order_release);
+}
+
+void CorvoEffectBase::SetEnvelopeTime(std::int64_t time) { m_envelope_time = time; }
+std::int64_t CorvoEffectBase::GetEnvelopeTime() const { return m_envelope_time; }
+
+void CorvoEffectBase::InitEnvelopes(bool reset) {
+    if (!reset) return;
+    const auto count = static_cast<std::size_t>(std::max(GetParamCountReal(), 0));
+    m_envelopes.resize(count);
+    m_envelope_positions.assign(count, 0);
+    m_envelope_time = 0;
+}
+
+void CorvoEffectBase::UpdateEnvelopes(ProcessFlags& flags) {
+    flags.params_changed = false;
+    for (std::size_t parameter = 0; parameter < m_envelope_positions.size(); ++parameter) {
+        const auto& envelope = m_envelopes[parameter];
+        auto& position = m_envelope_positions[parameter];
+        while (static_cast<std::size_t>(position) < envelope.size()) {
+            const auto& segment = envelope[static_cast<std::size_t>(position)];
+            if (segment.rtStart > m_envelope_time && position != 0) break;
+            SetParam(static_cast<int>(parameter), segment.valStart, true);
+            flags.params_changed = true;
+            ++position;
+        }
+    }
+}
+
+std::vector<int> CorvoEffectBase::GetAllSupportedParameterIds() {
+    std::vector<int> ids(static_cast<std::size_t>(std::max(GetParamCountReal(), 0)));
+    std::iota(ids.begin(), ids.end(), 0);
+    return ids;
+}
+
+std::vector<float> CorvoEffectBase::GetPresetValues(int preset) {
+    const int count = std::max(GetParamCountReal(), 0);
+    std::vector<float> values;
+    values.reserve(static_cast<std::size_t>(count));
+    for (int i = 0; i < count; ++i)
+        values.push_back(GetParamFromProp(m_reverse_param_order ? count - i - 1 : i, preset));
+    return values;
+}
+
+PluginParamXYGroupInfo CorvoEffectBase::MakeGroup(const std::string& name, int index,
+                                                  const std::vector<int>& xAxis,
+                                                  const std::vector<int>& yAxis) {
+    return {name, index, xAxis, yAxis};
+}
+
+CorvoEffectBase::Tempo CorvoEffectBase::HostTempo() const {
+    Tempo tempo;
+    if (!m_host_callback) return tempo;
+    if (const double bpm = m_host_callback->GetTempo(); bpm > 0.0) tempo.bpm = bpm;  // NaN is not
+    int numerator = tempo.numerator, denominator = tempo.denominator;
+    m_host_callback->GetTimeSignature(numerator, denominator);
+    if (numerator > 0) tempo.numerator = numerator;
+    if (denominator > 0) tempo.denominator = denominator;
+    return tempo;
+}
+
+}  // namespace Corvo::DSP

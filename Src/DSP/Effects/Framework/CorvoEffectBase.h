@@ -1,0 +1,220 @@
+#pragma once
+
+#include <atomic>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "DSP/Effects/Framework/ProcessFlags.h"
+#include "DSP/Effects/Framework/TailRecord.h"
+#include "Host/BuiltinEditor.h"
+#include "Host/CorvoEffectHostCallback.h"
+#include "Host/GenericUIData.h"
+#include "Host/PluginGenericUILookAndFeel.h"
+#include "Host/PluginParameterInfo.h"
+#include "Platform/Export.h"
+#include "Platform/MediaParams.h"
+#include "Platform/WaveFormat.h"
+
+namespace Corvo {
+
+// How the host automates a parameter.
+enum class EffectParameterType : int { Continuous = 0, Switch = 1, List = 2 };
+
+namespace DSP {
+
+// The contract between the host and every effect.
+//
+// Life: construct; restore a chunk or preset if there is one; InitProcessing before the first block and
+// whenever format or largest block change; Process or ProcessNoninterleaved per block; Cleanup to clear
+// running state; destroy.
+//
+// Blocks are processed in place. Buffers are declared as double and hold what the format's
+// wBitsPerSample says: 64 double samples, 32 float samples; other widths are each effect's own affair.
+// Interleaved blocks hold frames * nChannels samples, planar ones are nChannels buffers of `frames`.
+//
+// Threads: processing, envelope playback and cooking belong to the audio thread; parameter, text, preset
+// and chunk calls to the user-interface thread. Edits only store a value and raise m_cook, and the next
+// block re-derives. AddEnvelope is called while no block is being processed.
+//
+// Indices: a "real" index counts the effect's own parameters, an "external" one the host's, which may
+// stand for a left/right pair. The base checks no index; an effect ignores a real index it does not have.
+//
+// The order of the virtual operations is part of the contract.
+class DSP_API CorvoEffectBase {
+public:
+    static constexpr int MaxNumChannels = 2;
+
+    CorvoEffectBase(const CorvoEffectBase&) = delete;
+    CorvoEffectBase& operator=(const CorvoEffectBase&) = delete;
+
+protected:
+    // Storing one parameter and processing one block: what an effect is made of.
+
+    // Stores real parameter `index` from its normalised value; true when derived state became stale.
+    virtual bool DoSetParam(int index, float normalised, bool fromAutomation) = 0;
+    // Processes one interleaved block in place.
+    virtual void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
+                                 ProcessFlags& flags) = 0;
+    // Processes one planar block in place; an effect that does not support those leaves it unchanged.
+    virtual void ProcessInternalNoninterleaved(double* const* channels, int frames,
+                                               const tWAVEFORMATEX* format, ProcessFlags& flags);
+
+public:
+    // What the effect is.
+    virtual bool HasSeparateLeftRightSettings();
+    virtual int GetLatency();  // in samples
+    virtual bool IsCollapsingToMono();
+    virtual bool HasNativeEditor();
+    virtual void SetEditor(BuiltinEditor* editor);  // not owned
+    virtual bool SupportsNoninterleaved();
+
+    // Preparation.
+    virtual void SetMaximumFramesPerBuffer(int frames);
+
+    virtual ~CorvoEffectBase();
+
+    // Re-derives coefficients when they are stale, `force` is set, or the format is not the last one seen.
+    virtual void CheckCookProperties(const tWAVEFORMATEX* format, bool force);
+
+    // State: the settings chunk is a fixed little-endian layout of GetSettingsChunkSize() bytes.
+    virtual void GetSettingsChunk(std::vector<std::uint8_t>& chunk);
+    virtual int GetSettingsChunkSize();
+    virtual void SetSettingsChunk(const std::vector<std::uint8_t>& chunk);
+    virtual void Cleanup();  // clears delay lines, filters and detectors
+
+    // Presets, numbered from 0.
+    virtual int NumPresets();
+    virtual std::string GetPresetName(int preset);
+    virtual void SetPreset(int preset);
+
+    // Parameters.
+    virtual std::wstring GetParameterFormattedText(int index, double value);  // external index
+    virtual std::wstring GetParamName(int index);                             // external index
+    virtual std::wstring GetParamUnitsText(int index);                        // external index
+    virtual float GetParam(int index) = 0;                                    // 0..1
+    virtual float GetParamPlain(int index) const;                             // real index, own units
+    virtual int GetParamCountReal() = 0;
+    virtual std::string GetName() = 0;
+    virtual bool IsCantrix();
+    // Stores the normalised value of an external parameter, both sides of it where it is a pair.
+    virtual void SetParam(int index, float normalised, bool fromAutomation);
+    virtual int GetParamCount();
+    virtual EffectParameterType GetParameterTypeAutomatable(int index);  // external index
+
+    // Presentation and side-chain.
+    virtual int GetDefaultPreset();
+    virtual bool WantsXySerialization();
+    virtual bool IsMono() const;
+    virtual std::string GetImage();
+    virtual int GetNumSidechainBusses();
+    virtual int GetSidechainBusNumChannelsMax(int bus);
+    // The buffers of the next block on side-chain `bus`: planar, one per channel announced, in the
+    // block's own precision. Not owned; read by that block only.
+    virtual void SetSidechainBuffer(int bus, double* const* channels);
+    virtual std::vector<std::string> GetParameterAvailableValues(int index);  // external index
+    // 0 when left and right are joined to one external parameter.
+    virtual int SeparateLeftRightControls();
+    virtual bool AllowChangeParamFromInputBox(int index);  // external index
+    // Parses what GetParameterFormattedText shows; -1 when the effect does not understand text. Effects
+    // that parse numbers throw std::invalid_argument or std::out_of_range for text that holds none.
+    virtual float GetParamValueNormalizedFromText(int index, std::string text);  // external index
+    virtual int GetPreferredNumColumnsForTab() const;                            // -1: no preference
+    virtual void GetParamSectionInfo(int index, PluginParameterInfo& info);
+    virtual std::vector<std::string> GetParamUiSections();
+    virtual std::string GetPluginIconPath();
+    virtual PluginGenericUILookAndFeel GetLookAndFeel();
+    virtual void InitResetProcessingLight(bool reset);
+    virtual void InitializeXyEditingData(GenericUIData& data);
+    // Normalised value of real parameter `index` in a preset; -1 without preset data.
+    virtual float GetParamFromProp(int index, int preset);
+
+    // Announces the format and the largest block, and derives everything; all memory that processing
+    // needs is made here. Always true.
+    bool InitProcessing(int maxFrames, const tWAVEFORMATEX* format);
+    // Plays automation that is due, then processes one block in place. Never throws; a block of 0 frames
+    // or fewer is left alone.
+    void Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags);
+    void ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
+                               ProcessFlags& flags);
+
+    // Ringing out, on the audio thread and between blocks. When the stream has ended, the host calls
+    // StartTail and goes on with blocks of silence: of each, the first TailFramesProduced() frames are
+    // output and the rest is as it was handed in, until TailFinished(). Then EndTail.
+    //
+    // Echo, chorus and flanger know how long they ring and finish after one pass of their delay line;
+    // with feedback more is left, which ordinary blocks after EndTail bring out. Every other effect fills
+    // all blocks and finishes at the limit only. So the host that wants everything goes on after EndTail,
+    // or sets the limit, until it hears silence.
+    void StartTail(std::int64_t maxFrames);  // 0 or below finishes with the next block, without output
+    void EndTail();
+    bool InTail() const;
+    int TailFramesProduced() const;  // of the last block; outside the tail all its frames
+    bool TailFinished() const;
+    // With the next block the delay lines run from their first element again, keeping what they hold, and
+    // a whole pass is left to ring. Not needed after InitProcessing, which clears the tail; for a host that
+    // begins another stream without it.
+    void RequestTailRestart();
+
+    void SetHostCallback(CorvoEffectHostCallback* callback);  // not owned; null for none
+    // The host calls this when tempo or time signature changed: the next block derives afresh.
+    void NotifyTempoChanged();
+    void SetWantRefreshAllParams(bool want);
+    bool WantRefreshAllParams();
+    // True after the set of visible controls changed; any thread.
+    bool WantsUpdateUiFromScratch() const;
+    void SetUpdateUiFromScratch(bool want);
+
+    // Announces a side-chain bus. Buses are announced in ascending order: announcing one discards all
+    // above it.
+    void SetSidechainBusNumChannels(int bus, int channels);
+    int GetSidechainBusNumChannels(int bus);  // of a bus that was announced
+
+    // Replaces the automation of one real parameter. Segments are kept in the order given; each is a jump
+    // to valStart at rtStart, and the first applies at once whatever its start. Playback goes on from the
+    // segment it had reached. A count of 0 or below, or null, empties the envelope.
+    void AddEnvelope(int index, int count, const MP_ENVELOPE_SEGMENT* segments);
+    // The stream position of the next block, in the units of the segments. A cook rewinds it to 0, so a
+    // host that automates sets it before every block.
+    void SetEnvelopeTime(std::int64_t time);
+    std::int64_t GetEnvelopeTime() const;
+
+    std::vector<int> GetAllSupportedParameterIds();  // 0 .. real count - 1
+    // One normalised value per parameter, in external order; -1 without preset data.
+    std::vector<float> GetPresetValues(int preset);
+    static PluginParamXYGroupInfo MakeGroup(const std::string& name, int index, const std::vector<int>& xAxis,
+                                            const std::vector<int>& yAxis);
+
+protected:
+    CorvoEffectBase();
+
+    // Removes the segments of one parameter that lie wholly inside [from, to).
+    void FlushEnvelope(int index, std::int64_t from, std::int64_t to);
+    // With reset: sizes the envelope arrays for the real parameters and rewinds all of them.
+    void InitEnvelopes(bool reset);
+    // Applies every segment that is due and reports it in `flags`.
+    void UpdateEnvelopes(ProcessFlags& flags);
+
+    // Tempo and time signature of the host; 120 bpm and 4/4 where there is none.
+    struct Tempo {
+        double bpm = 120.0;
+        int numerator = 4, denominator = 4;
+    };
+    Tempo HostTempo() const;
+
+    BuiltinEditor* m_editor = nullptr;
+    bool m_want_refresh_all_params = false;
+    bool m_reverse_param_order = false;
+    std::vector<int> m_sidechain_bus_channels;
+    CorvoEffectHostCallback* m_host_callback = nullptr;
+    std::atomic<bool> m_update_ui_from_scratch{false};
+    std::vector<std::vector<MP_ENVELOPE_SEGMENT>> m_envelopes;
+    std::vector<int> m_envelope_positions;
+    std::int64_t m_envelope_time = 0;
+    // Raised with release after an edit is stored, lowered with acquire before it is read.
+    std::atomic<bool> m_cook{true};
+    TailRecord m_tail;
+};
+
+}  // namespace DSP
+}  // namespace Corvo

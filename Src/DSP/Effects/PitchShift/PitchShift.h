@@ -1,0 +1,111 @@
+#pragma once
+
+#include <array>
+#include <memory>
+
+#include "DSP/Effects/Framework/CorvoEffect.h"
+#include "DSP/Pitch/PitchAdapter.h"
+#include "Platform/CriticalSection.h"
+
+namespace Corvo::DSP {
+
+namespace PitchShiftPrivate {
+
+// The settings, and the body of the chunk.
+struct _transform_props {
+    std::array<std::int32_t, 2> pitch;  // frequency ratio * 3000 per side; 3000 leaves the pitch alone
+    std::array<std::int32_t, 2> carried2;
+    std::int32_t quality;  // PitchAdapter::SetQuality
+    std::int32_t carried5;
+    std::int32_t fftSize;  // PitchAdapter::SetFFTSize
+    std::array<std::int32_t, 14> carried7;
+    std::int32_t backEnd;  // PitchAdapter::CreateAdapter
+};
+static_assert(sizeof(_transform_props) == 88);
+
+}  // namespace PitchShiftPrivate
+
+// Transposes a stream by a fixed ratio per side. The work is done by a pitch-shift back-end, which the
+// settings choose: "New" (SoundTouch, one ratio for all channels) or "Classic" (a ratio per side, float
+// only).
+//
+// Blocks are interleaved, 1 to 16 channels; 64-bit blocks are double, all others float. The start of the
+// stream is silence until the back-end is full, so the output depends on how the stream is cut. "New"
+// allocates and locks inside its engine.
+//
+// Left and right are one external parameter, "Pitch". A new instance has an empty record, at the lowest
+// pitch: load a preset or a chunk first.
+//
+// Threads: as in CorvoEffectBase. An edit reaches the back-end at once and, with "New", restarts it under the
+// back-end's own lock, which a block may wait for briefly; for the effect's lock the audio thread only tries.
+// Back-ends are made and freed on the user-interface side, but for the one a block makes after Cleanup.
+class DSP_API PitchShift : public CorvoEffect {
+public:
+    PitchShift();
+    ~PitchShift() override;
+
+    int GetLatency() override;  // of the back-end; 0 without one
+    void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
+    // 92 bytes: the tag, then 22 words.
+    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
+    int GetSettingsChunkSize() override;
+    // A chunk below 92 bytes is ignored.
+    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
+    // The oldest layout, in which each word takes 8 bytes: 180 bytes. False, with nothing changed, when there
+    // are fewer.
+    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
+    // Frees the back-end; the next cook or block makes a new one.
+    void Cleanup() override;
+    int NumPresets() override;
+    std::string GetPresetName(int preset) override;
+    void SetPreset(int preset) override;
+    std::wstring GetParameterFormattedText(int index, double value) override;
+    float GetParam(int index) override;
+    float GetParamPlain(int index) const override;
+    int GetParamCountReal() override;
+    std::string GetName() override;
+    std::string GetImage() override;
+    int SeparateLeftRightControls() override;
+    bool AllowChangeParamFromInputBox(int index) override;
+    float GetParamValueNormalizedFromText(int index, std::string text) override;
+    std::string GetPluginIconPath() override;
+    float GetParamFromProp(int index, int preset) override;
+    const MP_PARAMINFO* GetParametersInfo() override;
+
+    // Configures the back-end for the record and the format. False when another thread holds the back-end and
+    // `force` does not allow waiting for it.
+    bool InitState(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format,
+                   bool force);
+    // Derives the pitch factors and sends them to the back-end, if there is one.
+    void CookPitchShift(const PitchShiftPrivate::_transform_props& record, int channels);
+    // Limited to the presets there are.
+    static PitchShiftPrivate::_transform_props GetPresetData(int preset);
+
+protected:
+    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
+    void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
+                         ProcessFlags& flags) override;
+
+private:
+    struct BackEnd {
+        std::unique_ptr<PitchAdapter> adapter;
+        int index = -1;
+    };
+
+    void ConfigureBackEnd(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format);
+    // User-interface side: stores a record and has the back-end it asks for ready before the audio thread
+    // looks.
+    void TakeRecord(const PitchShiftPrivate::_transform_props& record);
+
+    PitchShiftPrivate::_transform_props m_record{};  // shared between the threads
+    int m_channel_count = 1;
+    // Held to change either back-end and to send pitch factors. The audio thread only tries.
+    CriticalSection m_lock;
+    BackEnd m_back_end;
+    BackEnd m_spare;  // made for, or replaced by, the next or last one
+    std::array<double, 2> m_factors{};
+    std::atomic<bool> m_factors_pending{false};
+    tWAVEFORMATEX m_format{};
+};
+
+}  // namespace Corvo::DSP

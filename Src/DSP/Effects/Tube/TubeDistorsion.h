@@ -1,0 +1,97 @@
+#pragma once
+
+#include <array>
+#include <memory>
+
+#include "DSP/Effects/Framework/CorvoEffect.h"
+#include "DSP/Effects/Tube/VirtualTubeAmp.h"
+#include "Threads/TwoCopies.h"
+
+namespace Corvo::DSP {
+
+class TubeOversampling;
+class TubeRecentInput;
+
+// Tube-style distortion, "Valvex" to the user: per side a low-pass of order 4, a boost and one of four
+// shaping functions, which may run at up to 16 times the stream's rate.
+//
+// Blocks are interleaved, mono or stereo, and float unless they are 64 bits wide; a block of any other
+// channel count passes unchanged, and so do planar blocks. A mono stream takes the left values.
+//
+// Parameters are normalised, left and right in turn: 0 and 1 boost, 2 and 3 drive, 4 and 5 tone, 6 and 7
+// function, 8 and 9 oversampling. "Oversampling R" decides for both sides; the left one is kept and shown.
+//
+// Threads: parameters, presets and chunks belong to the user-interface thread. A new oversampling factor
+// is prepared in the copy of the processing state that is not in use, and the audio thread exchanges the
+// copies with its next block, without waiting and without a gap in the sound: the new filters first run
+// over the newest input. Cleanup and InitProcessing are not called while a block is processed.
+class DSP_API TubeDistorsion : public CorvoEffect {
+public:
+    TubeDistorsion();
+    ~TubeDistorsion() override;
+
+    // In frames: what the two converters delay low frequencies by, rounded; 0 without oversampling.
+    int GetLatency() override;
+    void SetMaximumFramesPerBuffer(int frames) override;
+    // With force: makes the buffers and starts from silence.
+    void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
+    // 44 bytes: the leading word and the ten values as floats.
+    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
+    int GetSettingsChunkSize() override;
+    // A chunk below 44 bytes is ignored. Values are stored as they come; out of range, drive, function and
+    // oversampling act like the nearest end, a boost like none, and the tone follows its formula.
+    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
+    // Clears the filters and frees the buffers; until the next InitProcessing blocks take longer.
+    void Cleanup() override;
+    int NumPresets() override;
+    std::string GetPresetName(int preset) override;
+    void SetPreset(int preset) override;
+    std::wstring GetParameterFormattedText(int index, double value) override;
+    float GetParam(int index) override;
+    float GetParamPlain(int index) const override;  // normalised, as it is stored
+    int GetParamCountReal() override;
+    std::string GetName() override;
+    bool WantsXySerialization() override;
+    std::string GetImage() override;
+    std::vector<std::string> GetParameterAvailableValues(int index) override;
+    bool AllowChangeParamFromInputBox(int index) override;
+    float GetParamValueNormalizedFromText(int index, std::string text) override;
+    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
+    std::string GetPluginIconPath() override;
+    // One group of boost against drive per kind of preset; the entries are the presets' groups.
+    void InitializeXyEditingData(GenericUIData& data) override;
+    float GetParamFromProp(int index, int preset) override;
+    const MP_PARAMINFO* GetParametersInfo() override;
+
+    // The memory for oversampled blocks of the largest size announced. InitProcessing and Cleanup call them.
+    void AllocateBuffers();
+    void FreeBuffers();
+
+protected:
+    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
+    void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
+                         ProcessFlags& flags) override;
+
+private:
+    using Values = VirtualTubeAmp::Values;
+
+    TubeOversampling& LiveState();
+    int WantedFactor() const;
+    void ApplyValues(const Values& values);
+    void PrepareOversampling();
+    void InitState(bool fromSilence);
+    void ExchangeCopies(int channels);
+
+    Values m_params{};  // shared between the threads
+    int m_max_frames = 0;
+    TwoCopies m_copies;
+    std::array<std::unique_ptr<TubeOversampling>, 2> m_states;
+    std::atomic<int> m_prepared_factor{1};  // of the copy that was published last
+
+    // Audio thread.
+    tWAVEFORMATEX m_format{};
+    Values m_cooked{};
+    std::unique_ptr<TubeRecentInput> m_recent;
+};
+
+}  // namespace Corvo::DSP

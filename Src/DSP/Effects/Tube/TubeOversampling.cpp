@@ -1,0 +1,96 @@
+#include "DSP/Effects/Tube/TubeOversampling.h"
+
+#include <algorithm>
+#include <limits>
+#include <new>
+#include <type_traits>
+
+namespace Corvo::DSP {
+namespace {
+
+// Filters of every factor, designed once for all instances.
+struct Designs {
+    std::array<SamplingFrequencyConverter, TubeOversampling::kLargestFactor + 1> up, down;
+
+    Designs() {
+        for (const int factor : {2, 4, 8, 12, 16}) {
+            up[static_cast<std::size_t>(factor)].InitConversionByFactors(factor, 1);
+            down[static_cast<std::size_t>(factor)].InitConversionByFactors(1, factor);
+        }
+    }
+};
+
+const Designs& AllDesigns() {
+    static const Designs designs;
+    return designs;
+}
+
+template <typename In, typename Out>
+int Convert(SamplingFrequencyConverter& converter, int frames, void* in, void* out, int channels) {
+    return converter.sfreq_conversion_core_block<In, Out>(
+        frames, static_cast<char*>(in), static_cast<char*>(out), channels, channels * In::kBytes,
+        channels * Out::kBytes, nullptr);
+}
+
+}  // namespace
+
+TubeOversampling::TubeOversampling() {
+    // Designs that live on, so that Restart never drops the last reference to one while audio runs.
+    m_up = AllDesigns().up[kLargestFactor];
+    m_up.Init(kMaxChannels);
+    m_down = AllDesigns().down[kLargestFactor];
+    m_down.Init(kMaxChannels);
+}
+
+TubeOversampling::~TubeOversampling() {
+    m_up.FreeRings();
+    m_down.FreeRings();
+}
+
+void TubeOversampling::AllocateBuffer(int maxFrames) {
+    constexpr std::size_t kPerFrame = kLargestFactor * kMaxChannels;
+    constexpr std::size_t kMost = std::numeric_limits<std::ptrdiff_t>::max() / sizeof(double) / kPerFrame;
+    const auto frames = std::min(static_cast<std::size_t>(std::max(maxFrames, 0)), kMost);
+    if (frames <= static_cast<std::size_t>(m_capacity)) return;
+    m_buffer.reset(new (std::nothrow) double[frames * kPerFrame]);
+    m_capacity = m_buffer ? static_cast<int>(frames) : 0;
+}
+
+void TubeOversampling::FreeBuffer() {
+    m_buffer.reset();
+    m_capacity = 0;
+}
+
+void TubeOversampling::Restart(int factor) {
+    m_factor = factor;
+    if (factor == 1) return;
+    m_up.Restart(AllDesigns().up[static_cast<std::size_t>(factor)]);
+    m_down.Restart(AllDesigns().down[static_cast<std::size_t>(factor)]);
+}
+
+double TubeOversampling::Delay(int factor) {
+    const auto index = static_cast<std::size_t>(factor);
+    return (AllDesigns().up[index].GroupDelay() + AllDesigns().down[index].GroupDelay()) / factor;
+}
+
+template <typename Sample>
+void TubeOversampling::Shape(Sample* samples, int frames, int channels) {
+    using In = std::conditional_t<std::is_same_v<Sample, float>, tipo_floatbit, tipo_doublebit>;
+    using Out = std::conditional_t<std::is_same_v<Sample, float>, tipo_floatbit_outd, tipo_doublebit_outd>;
+    if (m_factor == 1) return amp.Shape(samples, frames, channels);
+    double* const raised = m_buffer ? m_buffer.get() : m_reserve.data();
+    const int most = m_buffer ? m_capacity : kReserveFrames;
+    while (frames > 0) {
+        const int piece = std::min(frames, most);
+        const int raisedFrames = Convert<In, tipo_doublebit_outd>(m_up, piece, samples, raised, channels);
+        amp.Shape(raised, raisedFrames, channels);
+        Convert<tipo_doublebit, Out>(m_down, raisedFrames, raised, samples, channels);
+        samples += static_cast<std::ptrdiff_t>(piece) * channels;
+        frames -= piece;
+    }
+}
+
+template void TubeOversampling::Shape(float*, int, int);
+template void TubeOversampling::Shape(double*, int, int);
+
+}  // namespace Corvo::DSP

@@ -1,4 +1,0 @@
-#include "Drawing/DrawingGdiPlus.h"
-#include "Drawing/Views.h"
-
-DSP_INSTANTIATE_VIEWS(Corvo::DrawingGdiPlus)

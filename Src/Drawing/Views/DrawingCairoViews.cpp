@@ -1,0 +1,4 @@
+#include "Drawing/Backends/DrawingCairo.h"
+#include "Drawing/Views/Views.h"
+
+DSP_INSTANTIATE_VIEWS(Corvo::DrawingCairo)

@@ -1,0 +1,328 @@
+#include <gtest/gtest.h>
+
+#include <numbers>
+
+#include "DSP/Effects/Parameters/SettingsChunk.h"
+#include "Plain/PlainCompressor.h"
+#include "Support/CompressorProbe.h"
+
+using namespace TestSupport;
+
+// What happens from sample to sample.
+namespace {
+
+constexpr double kRate = 48000.0;
+
+double AttackCoefficient(int hundredths) {
+    return 1.0 - std::pow(10.0, -1.0 / (hundredths * kRate * 0.00001 + 1.0));
+}
+double ReleaseCoefficient(int hundredths) {
+    return 1.0 - std::pow(10.0, -1.0 / (hundredths * kRate * 0.0001 + 1.0));
+}
+double Smoothing() { return 1.0 - std::exp(-2.0 * std::numbers::pi / (kRate * 0.1)); }
+
+// The plain core with the settings that a chunk holds, standing.
+Plain::Compressor PlainFrom(Compressor& effect) {
+    const auto chunk = Chunk(effect);
+    std::int32_t tag;
+    std::array<std::int32_t, 24> words;
+    std::array<std::int32_t, 4> counts;
+    Corvo::DSP::ChunkReader read(chunk);
+    read(tag) && read(words) && read(counts);
+    Plain::Compressor plain;
+    for (std::size_t channel = 0; channel < 2; ++channel) {
+        std::array<std::array<float, 3>, 666> points;
+        read(points[0]);
+        for (std::size_t i = 1; i < points.size(); ++i) read(points[i]);
+        for (std::size_t i = 0; i < static_cast<std::size_t>(counts[channel]); ++i)
+            plain.curve[channel].push_back({points[i][0], points[i][1]});
+        plain.attack[channel] = AttackCoefficient(words[channel]);
+        plain.release[channel] = ReleaseCoefficient(words[2 + channel]);
+        plain.outGain[channel] = plain.appliedGain[channel] = std::pow(10.0, words[4 + channel] * 0.005);
+    }
+    plain.kp = plain.kg = Smoothing();
+    return plain;
+}
+
+// Noise whose level wanders over the whole curve, left and right differently.
+template <typename Sample>
+std::vector<Sample> Wandering(std::size_t frames) {
+    auto samples = Noise<Sample>(2 * frames, 1.0);
+    for (std::size_t i = 0; i < samples.size(); ++i)
+        samples[i] *= static_cast<Sample>(
+            Amplitude(-40.0 + 45.0 * std::sin(static_cast<double>(i / 2) * (i % 2 ? 0.0013 : 0.0007))));
+    return samples;
+}
+
+template <typename Sample>
+void RunPlain(Plain::Compressor& plain, std::vector<Sample>& samples, bool linked, std::size_t from,
+              std::size_t to) {
+    const int frames = static_cast<int>(to - from);
+    if (linked) return plain.Linked(samples.data() + 2 * from, frames);
+    plain.Channel(samples.data() + 2 * from, 0, 2, frames);
+    plain.Channel(samples.data() + 2 * from + 1, 1, 2, frames);
+}
+
+void Prepare(Compressor& effect, bool linked) {
+    effect.SetPreset(26);  // a soft knee, a ratio and a gate
+    effect.SetParam(kAttack, TimePosition(30), false);
+    effect.SetParam(kAttack + 1, TimePosition(700), false);
+    effect.SetParam(kRelease + 1, TimePosition(300), false);
+    effect.SetParam(kOutGain + 1, OutGainPosition(-35), false);
+    effect.SetParam(kThreshold + 1, ThresholdPosition(-350), false);
+    effect.SetParam(kStereoLink, linked ? 1.0f : 0.0f, false);
+}
+
+template <typename Sample>
+void ExpectPlainBits() {
+    const auto format = Format<Sample>();
+    const auto input = Wandering<Sample>(30000);
+    for (const bool linked : {true, false}) {
+        Compressor effect;
+        Prepare(effect, linked);
+        auto plain = PlainFrom(effect);
+        auto expected = input;
+        RunPlain(plain, expected, linked, 0, 30000);
+        const auto output = Render(effect, input, format, {512});
+        for (std::size_t i = 0; i < output.size(); ++i)
+            ASSERT_EQ(output[i], expected[i]) << "sample " << i << (linked ? ", linked" : "");
+    }
+}
+
+// A flat curve above -80 dB, so that envelopes can be read from the output.
+void MakeFlat(Compressor& effect) {
+    effect.SetPreset(0);
+    SetBoth(effect, kThreshold, 0.0f);
+    SetBoth(effect, kRatio, 1.0f);
+}
+
+}  // namespace
+
+// Catches wrong times, a linked pair that does not follow the left ones, a wrong order of operations, a
+// segment search that loses its place, right and left mixed up.
+TEST(CompressorCore, StandingHasTheBitsOfThePlainForm) {
+    ExpectPlainBits<float>();
+    ExpectPlainBits<double>();
+}
+
+// Catches glides of another length or shape than every point's own one-pole, and a step at their end.
+TEST(ParameterSmootherTester, GlidesLikeThePlainForm) {
+    constexpr std::size_t kEdit = 1000, kFrames = 60000;
+    const auto format = Format<double>();
+    const auto input = Wandering<double>(kFrames);
+    for (const bool linked : {true, false}) {
+        Compressor effect;
+        Prepare(effect, linked);
+        const std::vector<Edit> edits{{kEdit, kThreshold + 1, ThresholdPosition(-120)},
+                                      {kEdit, kRatio + 1, RatioPosition(251)},
+                                      {kEdit, kOutGain, OutGainPosition(85)}};
+        auto plain = PlainFrom(effect);
+        Compressor edited;
+        Prepare(edited, linked);
+        for (const auto& edit : edits) edited.SetParam(edit.index, edit.value, false);
+        const auto target = PlainFrom(edited);
+
+        auto expected = input;
+        RunPlain(plain, expected, linked, 0, kEdit);
+        for (std::size_t channel = 0; channel < 2; ++channel) {
+            ASSERT_EQ(plain.curve[channel].size(), target.curve[channel].size());
+            for (std::size_t i = 0; i < target.curve[channel].size(); ++i) {
+                plain.curve[channel][i].targetX = target.curve[channel][i].x;
+                plain.curve[channel][i].targetY = target.curve[channel][i].y;
+            }
+        }
+        plain.outGain = target.outGain;
+        plain.smoothParameters = plain.smoothGain = true;
+        RunPlain(plain, expected, linked, kEdit, kFrames);
+        const auto output = Render(effect, input, format, {512}, edits);
+        for (std::size_t i = 0; i < output.size(); ++i)
+            ASSERT_NEAR(output[i], expected[i], 1e-9) << "sample " << i << (linked ? ", linked" : "");
+    }
+}
+
+// Catches clicks when a preset with other points takes over.
+TEST(CompressorCore, ChangesPresetsWithoutAStep) {
+    const auto format = Format<double>();
+    constexpr int kBlock = 480;
+    for (const auto& [from, to] : {std::pair{8, 0}, {0, 8}, {26, 6}, {5, 29}}) {
+        Compressor effect;
+        effect.SetPreset(from);
+        effect.InitProcessing(kBlock, &format);
+        std::vector<double> block(2 * kBlock);
+        double last = 0.0;
+        for (int round = 0; round < 60; ++round) {
+            if (round == 20) effect.SetPreset(to);
+            std::ranges::fill(block, Amplitude(-7.0));
+            ProcessBlock(effect, block.data(), kBlock, format);
+            for (int i = 0; i < kBlock; ++i, last = block[2 * static_cast<std::size_t>(i) - 2]) {
+                if (round < 20) continue;
+                ASSERT_NEAR(Decibels(block[2 * static_cast<std::size_t>(i)] / last), 0.0, 0.2)
+                    << from << " to " << to << ", block " << round << ", frame " << i;
+            }
+        }
+        Compressor steady;
+        steady.SetPreset(to);
+        EXPECT_NEAR(Decibels(last) + 7.0, SteadyGains(steady, {-7.0}).front(), 0.05) << from << " to " << to;
+    }
+}
+
+TEST(CompressorCore, OutGainGlidesAtTenHertz) {
+    const auto format = Format<double>(1);
+    Compressor effect;
+    effect.SetPreset(0);
+    std::vector<double> ones(48000, 1.0);
+    const auto output = Render(effect, ones, format, {100}, {{9600, kOutGain, OutGainPosition(-60)}});
+    const double target = Amplitude(-6.0);
+    EXPECT_EQ(output[9599], 1.0);
+    EXPECT_NEAR(output[9600 + 763], target + (1.0 - target) / std::numbers::e, 1e-3);
+    EXPECT_NEAR(output.back(), target, 1e-15);
+}
+
+// Catches a limiter that lets peaks out above what came in.
+TEST(CompressorCore, TheHeavyLimiterNeverRaisesAPeak) {
+    Compressor effect;
+    effect.SetPreset(8);
+    const auto input = Wandering<float>(48000);
+    const auto output = Render(effect, input, Format<float>(), {512});
+    for (std::size_t i = 0; i < input.size(); ++i)
+        ASSERT_LE(std::abs(output[i]), std::abs(input[i])) << "sample " << i;
+}
+
+// Catches a make-up gain that misses full scale or exceeds its limit.
+TEST(CompressorCore, MakesUpToFullScale) {
+    Compressor effect;
+    effect.SetPreset(0);
+    effect.SetParam(kMakeUp, 1.0f, false);
+    EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), 0.0, 1e-6);
+    for (const int tenths : {-200, -300, -700}) {
+        SetBoth(effect, kThreshold, ThresholdPosition(tenths));
+        SetBoth(effect, kRatio, 1.0f);
+        EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), std::min(0.0, 40.0 + tenths / 10.0), 1e-3) << tenths;
+    }
+}
+
+// Catches a detector that listens to the wrong signal, or goes on reading buffers it was lent for one block.
+TEST(CompressorCore, ListensToTheSideChain) {
+    const auto format = Format<float>();
+    constexpr int kFrames = 4000;
+    std::vector<float> loud(kFrames, 1.0f), silent(kFrames, 0.0f), block;
+    auto* const loudChannel = reinterpret_cast<double*>(loud.data());
+    auto* const silentChannel = reinterpret_cast<double*>(silent.data());
+    double* const mono[] = {loudChannel, nullptr};
+    double* const stereo[] = {silentChannel, loudChannel};
+    double* const none[] = {nullptr, nullptr};
+    const double limited =
+        -20.0 + 6.0206;  // the gain for full scale at a threshold of -20 dB, or for half of it
+    struct Case {
+        const char* what;
+        int announced;
+        double* const* channels;
+        double left, right;  // gains in dB of a quiet block
+        bool used;
+    } const cases[] = {
+        {"no side-chain", 0, mono, 0.0, 0.0, false},
+        {"mono serves both channels", 1, mono, -20.0, -20.0, true},
+        {"fewer buffers than announced", 2, mono, -20.0, -20.0, true},
+        {"each channel has its own", 2, stereo, 0.0, -20.0, true},
+        {"announced, but null", 2, nullptr, 0.0, 0.0, false},
+        {"announced, but of null channels", 2, none, 0.0, 0.0, false},
+    };
+    for (const auto& c : cases) {
+        Compressor effect;
+        effect.SetPreset(0);
+        SetBoth(effect, kThreshold, ThresholdPosition(-200));
+        SetBoth(effect, kRatio, 1.0f);
+        effect.SetParam(kStereoLink, 0.0f, false);
+        effect.SetParam(kRelease, 0.0f, false);
+        if (c.announced > 0) effect.SetSidechainBusNumChannels(0, c.announced);
+        effect.InitProcessing(kFrames, &format);
+        effect.SetSidechainBuffer(0, c.channels);
+        effect.SetSidechainBuffer(1, mono);
+        block.assign(2 * kFrames, 0.001f);
+        ProcessBlock(effect, block.data(), kFrames, format);
+        EXPECT_NEAR(Decibels(block[2 * kFrames - 2] / 0.001), c.left, 0.01) << c.what;
+        EXPECT_NEAR(Decibels(block[2 * kFrames - 1] / 0.001), c.right, 0.01) << c.what;
+        EXPECT_EQ(effect.IsUsingSideChain(), c.used) << c.what;
+        block.assign(2 * kFrames, 0.001f);
+        ProcessBlock(effect, block.data(), kFrames, format);
+        EXPECT_NEAR(Decibels(block[2 * kFrames - 2] / 0.001), 0.0, 0.01) << c.what << ", the block after";
+        EXPECT_FALSE(effect.IsUsingSideChain());
+    }
+    // Linked, the mean of both counts: half of full scale.
+    Compressor effect;
+    effect.SetPreset(0);
+    SetBoth(effect, kThreshold, ThresholdPosition(-200));
+    SetBoth(effect, kRatio, 1.0f);
+    effect.SetSidechainBusNumChannels(0, 2);
+    effect.InitProcessing(kFrames, &format);
+    effect.SetSidechainBuffer(0, stereo);
+    block.assign(2 * kFrames, 0.001f);
+    ProcessBlock(effect, block.data(), kFrames, format);
+    EXPECT_NEAR(Decibels(block.back() / 0.001), limited, 0.05);
+}
+
+// Catches a monitor that plays the wrong signal, or that leaves the followers behind.
+TEST(CompressorCore, MonitorsTheDetector) {
+    const auto format = Format<float>();
+    constexpr int kFrames = 333;
+    const auto key = Noise<float>(2 * kFrames, 0.8, 9), input = Noise<float>(2 * kFrames);
+    auto left = std::vector(key.begin(), key.begin() + kFrames),
+         right = std::vector(key.begin() + kFrames, key.end());
+    double* const buffers[] = {reinterpret_cast<double*>(left.data()),
+                               reinterpret_cast<double*>(right.data())};
+    std::vector<std::vector<float>> afterwards;
+    for (const float monitor : {1.0f, 0.0f}) {
+        Compressor effect;
+        effect.SetSidechainBusNumChannels(0, 2);
+        effect.SetParam(kMonitor + 1, monitor, false);
+        effect.InitProcessing(kFrames, &format);
+        effect.SetSidechainBuffer(0, buffers);
+        auto block = input;
+        ProcessBlock(effect, block.data(), kFrames, format);
+        for (std::size_t i = 0; monitor == 1.0f && i < kFrames; ++i) {
+            ASSERT_EQ(block[2 * i], left[i]);
+            ASSERT_EQ(block[2 * i + 1], right[i]);
+        }
+        block = input;
+        effect.SetParam(kMonitor, monitor, false);
+        ProcessBlock(effect, block.data(), kFrames, format);
+        if (monitor == 1.0f) {
+            EXPECT_EQ(block, input) << "without a side-chain the block is the detector's signal";
+        }
+        effect.SetParam(kMonitor, 0.0f, false);
+        block = input;
+        ProcessBlock(effect, block.data(), kFrames, format);
+        afterwards.push_back(block);
+    }
+    EXPECT_EQ(afterwards[0], afterwards[1]);
+}
+
+TEST(CompressorCore, MetersTheGainWhileTheMeterIsOn) {
+    Compressor effect;
+    MakeFlat(effect);
+    SetBoth(effect, kThreshold, ThresholdPosition(-200));
+    SteadyGains(effect, {0.0}, 8000);
+    EXPECT_EQ(effect.GetGainReduction(0), 1.0);
+    effect.SetGainMeterOn(true);
+    SteadyGains(effect, {0.0}, 8000);
+    EXPECT_NEAR(effect.GetGainReduction(0), 0.1, 1e-4);
+    EXPECT_NEAR(effect.GetGainReduction(1), 0.1, 1e-4);
+}
+
+// Catches poison that outlives new settings.
+TEST(CompressorCore, NewSettingsCureAPoisonedFollower) {
+    const auto format = Format<float>();
+    for (const float link : {0.0f, 1.0f}) {
+        Compressor effect;
+        effect.SetParam(kStereoLink, link, false);
+        effect.InitProcessing(64, &format);
+        auto block = Noise<float>(128);
+        block[3] = std::numeric_limits<float>::quiet_NaN();
+        block[40] = std::numeric_limits<float>::infinity();
+        ProcessBlock(effect, block.data(), 64, format);
+        effect.SetPreset(2);
+        block = Noise<float>(128);
+        ProcessBlock(effect, block.data(), 64, format);
+        for (const float sample : block) ASSERT_TRUE(std::isfinite(sample));
+    }
+}

@@ -1,0 +1,166 @@
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <set>
+
+#include "DSP/Effects/Compressor/CompressorPresets.h"
+#include "Support/CompressorProbe.h"
+
+using namespace TestSupport;
+using Corvo::DSP::CompressorPrivate::CompressorPreset;
+using Corvo::DSP::CompressorPrivate::kCompressorPresets;
+
+// What the curves do to steady levels, and how the parameters edit them.
+namespace {
+
+double Ramp(double distance, double width) {
+    if (std::abs(distance) < width / 2.0) return std::pow(distance + width / 2.0, 2.0) / (2.0 * width);
+    return std::max(distance, 0.0);
+}
+
+// The gain that a preset's row means.
+double DesignedGain(const CompressorPreset& row, double level) {
+    const double reduction = (1.0 - 1.0 / row.ratio) * Ramp(level - row.threshold, row.knee);
+    const double gate = (row.gate.slope - 1.0) * Ramp(row.gate.threshold - level, row.gate.knee);
+    const double atFullScale = (1.0 - 1.0 / row.ratio) * -row.threshold;
+    return row.outGain + (row.autoMakeUp ? std::min(atFullScale, 40.0) : 0.0) - reduction -
+           std::min(gate, row.gate.range);
+}
+
+std::string Formatted(const char* format, double value) {
+    char text[32];
+    std::snprintf(text, sizeof text, format, value);
+    return text;
+}
+
+}  // namespace
+
+// Catches a preset that does not do what its row says, and rows that contradict their names.
+TEST(CompressorCurve, EveryPresetFollowsItsRow) {
+    const auto levels = Levels(-80.0, 0.0, 1.7);
+    for (int preset = 0; preset < 42; ++preset) {
+        const auto& row = kCompressorPresets[static_cast<std::size_t>(preset)];
+        Compressor effect;
+        effect.SetPreset(preset);
+        const std::string name = effect.GetPresetName(preset);
+        EXPECT_EQ(name, row.name);
+        const auto gains = SteadyGains(effect, levels);
+        bool falls = false;
+        for (std::size_t i = 0; i < levels.size(); ++i) {
+            EXPECT_NEAR(gains[i], DesignedGain(row, levels[i]), 0.1) << name << " at " << levels[i] << " dB";
+            falls = falls || (i > 0 && levels[i] + gains[i] < levels[i - 1] + gains[i - 1] - 1e-6);
+        }
+        EXPECT_EQ(falls, name == "Inverted dynamic") << name;
+        if (name.find("Soft") != name.npos) {
+            EXPECT_GT(row.knee + row.gate.knee, 0.0) << name;
+        }
+        if (name.ends_with("Gate") || name.ends_with("gate")) {
+            EXPECT_GE(row.gate.range, 20.0) << name;
+        }
+        if (name.find("Limiter") != name.npos) {
+            EXPECT_GT(row.ratio, 100.0) << name;
+        }
+        if (row.ratio != 1.0) {
+            EXPECT_EQ(Text(effect, kThreshold + 1), Formatted("%.1f dB", row.threshold)) << name;
+            EXPECT_EQ(Text(effect, kRatio), row.ratio > 100.0 ? "Inf.:1 " : Formatted("%.1f:1 ", row.ratio))
+                << name;
+        }
+    }
+}
+
+TEST(CompressorCurve, NoTwoPresetsAreAlike) {
+    std::set<std::string> records;
+    Compressor effect;
+    for (int preset = 0; preset < effect.NumPresets(); ++preset) {
+        effect.SetPreset(preset);
+        const auto chunk = Chunk(effect);
+        // Without the preset's number.
+        EXPECT_TRUE(records.emplace(chunk.begin(), chunk.begin() + 16100).second)
+            << effect.GetPresetName(preset);
+    }
+}
+
+// Catches thresholds and ratios that are drawn too coarsely, or mean something else than they say.
+TEST(CompressorCurve, FollowsThresholdAndRatio) {
+    const auto levels = Levels(-90.0, 0.0, 1.3);
+    for (const int tenths : {-800, -613, -400, -155, -10})
+        for (const int step : {0, 40, 125, 188, 240, 251}) {
+            Compressor effect;
+            SetBoth(effect, kThreshold, ThresholdPosition(tenths));
+            SetBoth(effect, kRatio, RatioPosition(step));
+            effect.SetParam(kAttack, TimePosition(100), false);
+            const auto gains = SteadyGains(effect, levels, 200);
+            const double threshold = tenths / 10.0, slope = 1.0 - step / 251.0;
+            for (std::size_t i = 0; i < levels.size(); ++i) {
+                const double above = std::max(levels[i] - threshold, 0.0);
+                ASSERT_NEAR(gains[i], (slope - 1.0) * above, 0.05)
+                    << threshold << " dB, step " << step << ", at " << levels[i] << " dB";
+            }
+        }
+}
+
+// Catches texts that differ from what was set, for every threshold and every ratio.
+TEST(CompressorCurve, ShowsWhatWasSet) {
+    Compressor effect;
+    for (int tenths = -799; tenths <= -10; ++tenths) {
+        effect.SetParam(kThreshold, ThresholdPosition(tenths), false);
+        ASSERT_EQ(Text(effect, kThreshold), Formatted("%.1f dB", tenths / 10.0));
+    }
+    effect.SetParam(kThreshold, 0.0f, false);
+    EXPECT_EQ(Text(effect, kThreshold), "-Inf. dB");
+    for (const int threshold : {-800, -300, -10})
+        for (int step = 0; step <= 251; ++step) {
+            effect.SetParam(kRatio + 1, RatioPosition(step), false);
+            effect.SetParam(kThreshold + 1, ThresholdPosition(threshold), false);
+            const int left = 251 - step;
+            const bool infinite = left == 0 || 251 > 100 * left;
+            ASSERT_EQ(Text(effect, kRatio + 1),
+                      infinite ? "Inf.:1 " : Formatted("%.1f:1 ", 2510 / left / 10.0))
+                << step;
+        }
+}
+
+// Catches edits of the knee that reach the gate under it.
+TEST(CompressorCurve, AGateSurvivesTheThreshold) {
+    Compressor effect;
+    effect.SetPreset(5);  // gate at -48 dB, 5 dB per dB, 50 dB deep
+    for (const int tenths : {-100, -400, -10, -300}) {
+        SetBoth(effect, kThreshold, ThresholdPosition(tenths));
+        const auto gains = SteadyGains(effect, {-70.0, -54.0, -47.0, 0.0});
+        EXPECT_NEAR(gains[0], -50.0, 0.1) << tenths;
+        EXPECT_NEAR(gains[1], -24.0, 0.1) << tenths;
+        EXPECT_NEAR(gains[2], 0.0, 0.1) << tenths;
+        EXPECT_NEAR(gains[3], tenths / 10.0 * 0.75, 0.1) << "the ratio of 4 stays";
+    }
+    SetBoth(effect, kThreshold, ThresholdPosition(-600));
+    const auto pushed = SteadyGains(effect, {-66.0, -60.0, 0.0});
+    EXPECT_NEAR(pushed[0], -24.0, 0.1) << "a knee below the gate pushes it down whole";
+    EXPECT_NEAR(pushed[1], 0.0, 0.1);
+    EXPECT_NEAR(pushed[2], -45.0, 0.1);
+}
+
+// Catches curves that drift while automation moves them, and edits of one side that reach the other.
+TEST(CompressorCurve, StaysPutHoweverOftenItIsEdited) {
+    Compressor effect;
+    effect.SetPreset(15);  // 8:1, which is between two steps
+    const auto right = Text(effect, kRatio + 1) + Text(effect, kThreshold + 1);
+    Random random(3);
+    for (int i = 0; i < 2000; ++i) effect.SetParam(kThreshold, static_cast<float>(random.Unit()), false);
+    effect.SetParam(kThreshold, ThresholdPosition(-200), false);
+    EXPECT_EQ(Text(effect, kRatio), "8.0:1 ");
+    EXPECT_EQ(Text(effect, kRatio + 1) + Text(effect, kThreshold + 1), right);
+    EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), -20.0 * 7.0 / 8.0 + 7.0, 0.05);
+}
+
+// Catches a neutral preset that is only nearly neutral, at levels above full scale too.
+TEST(CompressorCurve, TheNeutralPresetChangesNoBit) {
+    for (const float link : {0.0f, 1.0f}) {
+        Compressor effect;
+        effect.SetPreset(0);
+        effect.SetParam(kStereoLink, link, false);
+        const auto input = Noise<double>(2 * 20000, 5.0);
+        EXPECT_EQ(Render(effect, input, Format<double>(), {512}), input);
+        const auto single = Noise<float>(2 * 20000, 1e-3);
+        EXPECT_EQ(Render(effect, single, Format<float>(), {512}), single);
+    }
+}

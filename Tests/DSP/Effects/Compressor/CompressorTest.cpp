@@ -1,0 +1,262 @@
+#include "DSP/Effects/Compressor/Compressor.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstring>
+#include <limits>
+#include <thread>
+
+#include "Support/CompressorProbe.h"
+
+using namespace TestSupport;
+
+// Parameters, chunks and the hand-over between the threads.
+namespace {
+
+using Bytes = std::vector<std::uint8_t>;
+
+template <typename T>
+T At(const Bytes& chunk, std::size_t offset) {
+    T value;
+    std::memcpy(&value, chunk.data() + offset, sizeof value);
+    return value;
+}
+
+template <typename T>
+void Put(Bytes& chunk, std::size_t offset, T value) {
+    std::memcpy(chunk.data() + offset, &value, sizeof value);
+}
+
+constexpr std::size_t kRecord = 4, kCounts = kRecord + 96, kPoints = kRecord + 112, kChannelPoints = 666 * 12,
+                      kPreset = 16100, kLastThreshold = 16104, kLastRatio = 16108;
+
+}  // namespace
+
+TEST(Compressor, StoresWordsAndShowsThem) {
+    Compressor effect;
+    struct Case {
+        int index;
+        float value;
+        std::size_t offset;
+        std::int32_t word;
+        const char* text;
+    } const cases[] = {
+        {0, 0.0f, 4, 1, "0.01 ms"},
+        {1, 1.0f, 8, 100000, "1000.00 ms"},
+        {2, 0.5f, 12, 50000, "500.0 ms"},
+        {3, 0.0f, 16, 1, " 0.0 ms"},
+        {4, 0.0f, 20, -960, "-Inf. dB"},
+        {5, 1.0f, 24, 200, "20.0 dB"},
+        {4, OutGainPosition(-5), 20, -5, "-0.5 dB"},
+        {11, 0.499f, 28, 0, "Off "},
+        {10, 0.5f, 28, 1, "On "},
+        {13, 0.5f, 32, 1, "On "},
+        {15, 1.0f, 36, 1, "On "},
+        {14, 0.0f, 36, 0, "Off "},
+        {6, 0.0f, kLastThreshold, -800, "-Inf. dB"},
+        {7, 1.0f, kLastThreshold, -10, "-1.0 dB"},
+        {8, 1.0f, kLastRatio, 251, "Inf.:1 "},
+        {9, std::numeric_limits<float>::quiet_NaN(), kLastRatio, 0, "1.0:1 "},
+    };
+    for (const auto& c : cases) {
+        effect.SetParam(c.index, c.value, false);
+        EXPECT_EQ(At<std::int32_t>(Chunk(effect), c.offset), c.word) << c.index << " at " << c.value;
+        EXPECT_EQ(Text(effect, c.index), c.text) << c.index << " at " << c.value;
+    }
+    EXPECT_EQ(effect.GetParam(11), 1.0f) << "the pair is one switch";
+    effect.SetPreset(3);
+    EXPECT_EQ(At<std::int32_t>(Chunk(effect), kPreset), 3);
+    EXPECT_EQ(At<std::int32_t>(Chunk(effect), kLastThreshold), -9999);
+    EXPECT_EQ(At<std::int32_t>(Chunk(effect), kLastRatio), -9999);
+    EXPECT_EQ(effect.GetParam(6), effect.GetParamValueNormalizedFromText(6, "-8.0 dB"))
+        << "read from the curve";
+}
+
+// Catches a boundary off by one and fields that a short chunk should leave alone.
+TEST(Compressor, ReadsChunksAsFarAsTheyGo) {
+    Compressor source;
+    source.SetPreset(12);
+    SetBoth(source, kThreshold, ThresholdPosition(-300));
+    SetBoth(source, kRatio, RatioPosition(100));
+    auto full = Chunk(source);
+    Put<std::int32_t>(full, 0, 77);
+    Put<std::int32_t>(full, kRecord + 40, 4711);  // reserved
+    ASSERT_EQ(full.size(), 16112u);
+    for (const std::size_t length :
+         {16099u, 16100u, 16103u, 16104u, 16107u, 16108u, 16111u, 16112u, 16300u}) {
+        Compressor effect;
+        SetBoth(effect, kThreshold, ThresholdPosition(-50));
+        const auto before = Chunk(effect);
+        auto chunk = full;
+        chunk.resize(length, 0xAA);
+        effect.SetSettingsChunk(chunk);
+        auto expected = before;
+        if (length >= 16100) {
+            expected = full;
+            for (std::size_t at = kPreset; at < 16112; at += 4)
+                if (length < at + 4) Put(expected, at, At<std::int32_t>(before, at));
+        }
+        EXPECT_EQ(Chunk(effect), expected) << length;
+    }
+}
+
+// Catches offsets of the older layout, whose words are twice as wide.
+TEST(Compressor, ReadsTheOlderLayout) {
+    Compressor source;
+    source.SetPreset(19);
+    SetBoth(source, kRatio, RatioPosition(30));
+    const auto today = Chunk(source);
+    Bytes old(16208);
+    for (std::size_t i = 0; i < 24; ++i)
+        Put<std::int64_t>(old, 4 + 8 * i, At<std::int32_t>(today, kRecord + 4 * i));
+    std::copy(today.begin() + kCounts, today.end(), old.begin() + 196);
+    Compressor effect;
+    EXPECT_TRUE(effect.FitsOldChunk(old));
+    EXPECT_EQ(Chunk(effect), today);
+    effect.SetPreset(0);
+    const auto neutral = Chunk(effect);
+    old.resize(16195);
+    EXPECT_FALSE(effect.FitsOldChunk(old));
+    EXPECT_EQ(Chunk(effect), neutral);
+}
+
+// Catches trust in numbers from outside: counts, levels, words.
+TEST(Compressor, RepairsWhatAChunkHolds) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    struct Case {
+        const char* what;
+        std::size_t offset;
+        float value;
+    } const cases[] = {
+        {"no number as x", kPoints + 12 * 20, nan},
+        {"no number as y", kPoints + 12 * 20 + 4, nan},
+        {"infinite y", kPoints + 12 * 20 + 4, std::numeric_limits<float>::infinity()},
+        {"descending x", kPoints + 12 * 20, 1e-3f},
+        {"x above full scale", kPoints + 12 * 20, 3.0f},
+        {"an origin with a level", kPoints + 4, 0.5f},
+        {"no origin", kPoints, 1e-5f},
+        {"a negative level", kPoints + 12 * 20 + 4, -1.0f},
+    };
+    Compressor source;
+    const auto good = Chunk(source);
+    const auto check = [&](const Bytes& chunk, const std::string& what) {
+        Compressor effect;
+        effect.SetSettingsChunk(chunk);
+        const auto repaired = Chunk(effect);
+        for (std::size_t channel = 0; channel < 2; ++channel) {
+            const auto count = At<std::int32_t>(repaired, kCounts + 4 * channel);
+            ASSERT_TRUE(count >= 2 && count <= 666) << what;
+            float last = 0.0f;
+            for (std::size_t i = 0; i < static_cast<std::size_t>(count); ++i) {
+                const auto x = At<float>(repaired, kPoints + channel * kChannelPoints + 12 * i);
+                ASSERT_TRUE(x >= last && x <= 1.0f) << what;
+                last = x;
+            }
+            ASSERT_EQ(last, 1.0f) << what;
+        }
+        for (const double gain : SteadyGains(effect, Levels(-100.0, 6.0, 3.0), 50))
+            ASSERT_LT(gain, 150.0) << what;
+    };
+    for (const auto& c : cases) {
+        auto chunk = good;
+        Put(chunk, c.offset, c.value);
+        check(chunk, c.what);
+    }
+    for (const std::int32_t count : {-1, 0, 1, 666, 667, std::numeric_limits<std::int32_t>::max()}) {
+        auto chunk = good;
+        Put(chunk, kCounts, count);
+        check(chunk, "a count of " + std::to_string(count));
+    }
+    for (const std::int32_t word : {0, -1, std::numeric_limits<std::int32_t>::min()}) {
+        auto chunk = good;
+        for (std::size_t i = 0; i < 4; ++i) Put(chunk, kRecord + 4 * i, word);
+        check(chunk, "times of " + std::to_string(word));
+    }
+    Random random(21);
+    for (std::size_t length = 0; length < 16300; length += 97) {
+        Bytes bytes(length);
+        for (auto& value : bytes) value = static_cast<std::uint8_t>(random.Next());
+        check(bytes, std::to_string(length) + " random bytes");
+    }
+}
+
+TEST(Compressor, UnderstandsTexts) {
+    Compressor effect;
+    struct Case {
+        int index;
+        const char* text;
+        float value;
+    } const cases[] = {
+        {0, "0.01 ms", 0.0f}, {0, "1000.00 ms", 1.0f}, {2, " 1000.0 ms", 1.0f}, {4, "-Inf. dB", 0.0f},
+        {4, "20.0 dB", 1.0f}, {7, "-Inf.", 0.0f},      {6, "-1.0", 1.0f},       {8, "1.0:1", 0.0f},
+        {9, "Inf.:1 ", 1.0f}, {8, "250:1", 1.0f},      {10, "On", 1.0f},        {12, "off", 0.0f},
+        {15, "On ", 1.0f},
+    };
+    for (const auto& c : cases)
+        EXPECT_EQ(effect.GetParamValueNormalizedFromText(c.index, c.text), c.value) << c.text;
+    EXPECT_THROW(effect.GetParamValueNormalizedFromText(0, "soon"), std::invalid_argument);
+}
+
+// Catches automation that the editor never sees, and one that overtakes a preset loaded meanwhile.
+TEST(Compressor, AutomationReachesTheEditor) {
+    const auto format = Format<float>();
+    Compressor effect;
+    effect.InitProcessing(64, &format);
+    effect.SetParam(kThreshold, ThresholdPosition(-333), true);
+    EXPECT_EQ(Text(effect, kThreshold), "-33.3 dB");
+    effect.SetParam(kThreshold, ThresholdPosition(-444), true);
+    effect.SetPreset(2);
+    EXPECT_EQ(Text(effect, kThreshold), "-20.0 dB");
+    auto block = Noise<float>(128);
+    ProcessBlock(effect, block.data(), 64, format);
+    effect.SetParam(kRatio, 1.0f, true);
+    EXPECT_EQ(Text(effect, kRatio), "Inf.:1 ");
+    EXPECT_EQ(Text(effect, kThreshold), "-20.0 dB");
+    const float attack = effect.GetParam(kAttack);
+    effect.SetParam(kAttack, 0.9f, true);
+    EXPECT_EQ(effect.GetParam(kAttack), attack) << "only curves come back";
+    effect.SetParamFromUi(kAttack, 0.7f, false);
+    EXPECT_NEAR(effect.GetParam(kAttack), 0.7f, 1e-5);
+}
+
+// Catches races (under the thread sanitizer) and edits that get lost between the threads.
+TEST(Compressor, TakesEditsPresetsAndChunksWhileAutomated) {
+    const auto format = Format<float>();
+    Compressor effect;
+    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.4f, 0.4f, MP_CURVE_JUMP, 0},
+                                            {100, 100, 0.8f, 0.8f, MP_CURVE_JUMP, 0}};
+    for (const int index : {0, 4, 6, 9}) effect.AddEnvelope(index, 2, segments);
+    effect.InitProcessing(32, &format);
+    std::atomic<bool> done{false};
+    std::jthread userInterface([&] {
+        Random random(17);
+        const auto chunk = Chunk(effect);
+        for (int round = 0; !done; ++round) {
+            effect.SetParam(random.Below(16), static_cast<float>(random.Unit()), false);
+            if (round % 3 == 0) effect.SetPreset(random.Below(42));
+            if (round % 5 == 0) effect.SetSettingsChunk(chunk);
+            effect.SetGainMeterOn(round % 2 == 0);
+            for (int index = 0; index < 16; ++index) Text(effect, index);
+            effect.GetGainReduction(0);
+            effect.IsUsingSideChain();
+            Chunk(effect);
+            std::this_thread::yield();
+        }
+    });
+    const auto input = Noise<float>(64);
+    for (int i = 0; i < 2000; ++i) {
+        auto block = input;
+        effect.SetEnvelopeTime(i % 200);
+        ProcessBlock(effect, block.data(), 32, format);
+    }
+    done = true;
+    userInterface.join();
+
+    // At rest, what is shown is what is heard.
+    for (const int index : {0, 4, 6, 9}) effect.AddEnvelope(index, 0, nullptr);
+    effect.SetPreset(0);
+    SetBoth(effect, kThreshold, ThresholdPosition(-250));
+    SetBoth(effect, kRatio, 1.0f);
+    EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), -25.0, 0.05);
+}

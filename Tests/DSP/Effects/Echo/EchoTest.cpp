@@ -1,0 +1,270 @@
+#include "DSP/Effects/Echo/Echo.h"
+
+#include <gtest/gtest.h>
+
+#include <climits>
+#include <cmath>
+#include <cstring>
+
+#include "Plain/PlainEcho.h"
+#include "Platform/DenormalGuard.h"
+#include "Support/EffectRun.h"
+
+using namespace Corvo::DSP;
+using namespace TestSupport;
+
+namespace {
+
+enum Index {
+    kDepthL,
+    kDepthR,
+    kMode,
+    kModeR,
+    kDecayL,
+    kDecayR,
+    kDelayL,
+    kDelayR,
+    kMixL,
+    kMixR,
+    kOutL,
+    kOutR
+};
+
+struct Host : CorvoEffectHostCallback {
+    double bpm;
+    int above, below;
+    Host(double tempo = 120.0, int numerator = 4, int denominator = 4)
+        : bpm(tempo), above(numerator), below(denominator) {}
+    double GetTempo() override { return bpm; }
+    void GetTimeSignature(int& numerator, int& denominator) override {
+        numerator = above;
+        denominator = below;
+    }
+};
+
+using Words = std::array<std::int32_t, 25>;  // the tag and the settings
+
+Words ChunkWords(Echo& echo) {
+    Words words;
+    const auto chunk = Chunk(echo);
+    std::memcpy(words.data(), chunk.data(), sizeof words);
+    return words;
+}
+
+std::vector<std::uint8_t> Bytes(const std::vector<std::int32_t>& words) {
+    std::vector<std::uint8_t> bytes(4 * words.size());
+    std::memcpy(bytes.data(), words.data(), bytes.size());
+    return bytes;
+}
+
+// Mode and depths left and right; decay -6 dB left and -12 dB right, echo gain 0 dB, all wet, output 0 dB.
+void Load(Echo& echo, std::int32_t mode, std::int32_t left, std::int32_t right) {
+    std::vector<std::int32_t> words{0, -60, -120, 2000, 2000, left, right, 0, 0};
+    words.resize(25);
+    words[23] = words[24] = mode;
+    echo.SetSettingsChunk(Bytes(words));
+}
+
+std::vector<std::size_t> NonZero(const std::vector<double>& samples, std::size_t first) {
+    std::vector<std::size_t> found;
+    for (std::size_t i = first; i < samples.size(); i += 2)
+        if (samples[i] != 0.0) found.push_back(i / 2);
+    return found;
+}
+
+std::string Text(Echo& echo, int index, double value) {
+    const auto wide = echo.GetParameterFormattedText(index, value);
+    return {wide.begin(), wide.end()};
+}
+
+}  // namespace
+
+// Catches a wrong note, curve or unit, and a tap that is late or has the wrong gain.
+TEST(Echo, RepeatsAnImpulseAfterTheDelayOfEveryMode) {
+    struct Case {
+        const char* what;
+        std::int32_t mode, depth;
+        Host host;
+        double ms;
+    };
+    const Case cases[] = {
+        {"linear", 0, 300, {}, 300.0},
+        {"linear, every word its millisecond", 0, 1009, {}, 1009.0},
+        {"log, start", 1, 0, {}, 20.0},
+        {"log, middle", 1, 5000, {}, 19.0 + std::sqrt(4980.0)},
+        {"eighth of a bar's quarter", 2, 6999, {}, 125.0},
+        {"beat at 100", 2, 8000, {100.0}, 600.0},
+        {"beat triplet: a third", 3, 8500, {}, 500.0 / 3.0},
+        {"beat dotted", 4, 8999, {}, 750.0},
+        {"measure of 3/8", 2, 10000, {240.0, 3, 8}, 375.0},
+        {"no tempo counts as 120", 2, 8000, {-1.0}, 500.0},
+        {"no number counts as 120", 2, 8000, {NAN}, 500.0},
+        {"at least 10 samples", 0, 0, {}, 10.0 / 48.0},
+        {"an unknown mode is a millisecond", 7, 5000, {}, 1.0},
+        {"a word from nowhere is the longest time", 0, INT_MAX, {}, 10000.0},
+    };
+    const auto format = Format<double>();
+    for (auto c : cases) {
+        Echo echo;
+        echo.SetHostCallback(&c.host);
+        Load(echo, c.mode, c.depth, c.depth);
+        // The ring counts both channels' samples; constants rounded to single precision lose one at most.
+        const double frames = c.ms * 48.0 / 2.0;
+        std::vector<double> samples(2 * static_cast<std::size_t>(2.0 * frames + 8));
+        samples[0] = samples[1] = 1.0;
+        samples = Render(echo, samples, format, {512});
+        const auto left = NonZero(samples, 0);
+        ASSERT_GE(left.size(), 2u) << c.what;
+        EXPECT_NEAR(static_cast<double>(left[0]), frames, 1.0) << c.what;
+        EXPECT_EQ(left[1], 2 * left[0]) << c.what;
+        for (std::size_t side = 0; side < 2; ++side) {
+            const double back = std::pow(10.0, side == 0 ? -0.3 : -0.6);
+            const auto taps = NonZero(samples, side);
+            EXPECT_NEAR(samples[2 * taps[0] + side], 1.0 + back, 1e-12) << c.what;
+            EXPECT_NEAR(samples[2 * taps[1] + side], (1.0 + back) * back, 1e-7) << c.what;
+        }
+    }
+}
+
+// Catches lanes mixed up, a run over a wrap, and a ring that forgets or keeps what it should not when a
+// delay changes.
+template <typename Sample>
+void ExpectThePlainEcho(int channels) {
+    constexpr int kFrames = 700;
+    const auto format = Format<Sample>(channels, 1000);  // a word of the linear mode is a sample
+    const std::array<int, 2> depths[] = {{400, 400}, {401, 401}, {30, 401},  {401, 12},
+                                         {10, 11},   {13, 13},   {600, 601}, {601, 600}};
+    Echo echo;
+    Plain::Echo plain;
+    echo.InitProcessing(kFrames, &format);
+    std::uint64_t seed = 1;
+    for (const auto& [left, right] : depths) {
+        Load(echo, 0, left, right);
+        plain.SetSides(
+            {{{std::pow(10.0, -0.3), 1.0, 1.0, 1.0, left}, {std::pow(10.0, -0.6), 1.0, 1.0, 1.0, right}}});
+        auto samples = Noise<Sample>(static_cast<std::size_t>(channels * kFrames), 0.25, ++seed);
+        auto expected = samples;
+        ProcessBlock(echo, samples.data(), kFrames, format);
+        const Corvo::DenormalGuard guard;
+        plain.Run(expected.data(), kFrames, static_cast<std::size_t>(channels));
+        ASSERT_EQ(samples, expected) << channels << " channels, " << left << " and " << right;
+    }
+}
+
+TEST(Echo, HasTheBitsOfThePlainOne) {
+    for (const int channels : {1, 2}) {
+        ExpectThePlainEcho<float>(channels);
+        ExpectThePlainEcho<double>(channels);
+    }
+}
+
+// Catches a wrong table entry, floor or unit; what is shown is also what is parsed.
+TEST(Echo, ShowsAndReadsItsTexts) {
+    struct Case {
+        std::int32_t mode;
+        int index;
+        float value;
+        const char* text;
+    };
+    constexpr Case kCases[] = {
+        {0, kDepthL, 0.03f, "300 ms"},
+        {1, kDepthR, 0.0f, "20 ms"},
+        {1, kDepthR, 1.0f, "4999 ms"},
+        {2, kDepthL, 0.05f, "1/256 (1 ms)"},
+        {2, kDepthL, 0.6f, "1/4 (124 ms)"},
+        {2, kDepthL, 0.8f, "Beat (499 ms)"},
+        {2, kDepthL, 1.0f, "Measure (2000 ms)"},
+        {3, kDepthL, 0.8f, "Beat Triplet (166 ms)"},
+        {4, kDepthL, 0.7f, "1/2 Dot (374 ms)"},
+        {0, kMode, 0.5f, "Tempo (straight)"},
+        {0, kModeR, 1.0f, "Tempo (dotted)"},
+        {0, kDecayL, 0.0f, "-Inf. dB"},
+        {0, kDecayL, 1.0f, "10.0 dB"},
+        {0, kDelayR, 0.0f, "-30.0 dB"},
+        {0, kMixL, 0.5f, "100.0 %"},
+        {0, kOutR, 0.0f, "-Inf. dB"},
+        {0, kOutR, 0.5f, "-38.0 dB"},
+    };
+    for (const auto& c : kCases) {
+        Echo echo;
+        Load(echo, c.mode, 5000, 5000);
+        EXPECT_EQ(Text(echo, c.index, c.value), c.text);
+        const float read = echo.GetParamValueNormalizedFromText(c.index, c.text);
+        EXPECT_EQ(Text(echo, c.index, read), c.text) << read;
+    }
+    Echo echo;
+    Load(echo, 2, 0, 0);
+    EXPECT_EQ(Text(echo, kDepthL, echo.GetParamValueNormalizedFromText(kDepthL, "260")), "1/2 (249 ms)");
+    EXPECT_EQ(echo.GetParamValueNormalizedFromText(kMode, "Space"), -1.0f);
+    EXPECT_EQ(echo.GetParameterAvailableValues(kModeR).size(), 5u);
+}
+
+// Catches a delay that jumps when the mode does, and the odd rule for choosing the same mode again.
+TEST(Echo, KeepsTheDelayWhenTheModeBecomesATime) {
+    struct Case {
+        const char* what;
+        std::int32_t from, to, left, right, leftAfter, rightAfter;
+    };
+    const auto log = [](double ms) {
+        return static_cast<std::int32_t>(1.0 + 1174.6484375 * std::log(ms - 19.0));
+    };
+    const Case cases[] = {
+        {"linear to log", 0, 1, 300, 120, log(300), log(120)},
+        {"linear to log, beyond its knob", 0, 1, 10000, 6000, log(10000), log(6000)},
+        {"below 20 ms there is no logarithm", 0, 1, 7, 19, 1, 1},
+        {"log to linear", 1, 0, 0, 10000, 20, 4999},
+        {"note to linear", 2, 0, 8000, 6000, 499, 124},
+        {"dotted to log", 4, 1, 8000, 6000, log(749.9999), log(187.499975)},
+        {"to a note: the words stay", 0, 3, 300, 120, 300, 120},
+        {"linear again: right becomes left", 0, 0, 300, 120, 300, 300},
+        {"log again: right becomes left", 1, 1, 300, 120, 300, 300},
+        {"note again: the words stay", 2, 2, 300, 120, 300, 120},
+    };
+    for (const auto& c : cases) {
+        Echo echo;
+        Load(echo, c.from, c.left, c.right);
+        echo.SetParam(kModeR, static_cast<float>(c.to) / 4.0f, false);
+        EXPECT_EQ(ChunkWords(echo)[23], c.from) << c.what;
+        echo.SetParam(kMode, static_cast<float>(c.to) / 4.0f, false);
+        const auto words = ChunkWords(echo);
+        EXPECT_EQ(words[5], c.leftAfter) << c.what;
+        EXPECT_EQ(words[6], c.rightAfter) << c.what;
+        EXPECT_EQ(words[23], c.to) << c.what;
+        EXPECT_EQ(words[24], c.to) << c.what;
+    }
+}
+
+// Catches the layout without modes taken at another length, or read from the wrong offset.
+TEST(Echo, ReadsTheChunkWithoutModes) {
+    Words expected{};
+    for (std::int32_t i = 0; i < 23; ++i) expected[static_cast<std::size_t>(i)] = 1000 + i;
+    Echo echo;
+    echo.SetSettingsChunk(Bytes({expected.begin(), expected.begin() + 23}));
+    EXPECT_EQ(ChunkWords(echo), expected) << "92 bytes";
+    echo.SetPreset(1);
+    echo.SetSettingsChunk(std::vector<std::uint8_t>(96));
+    EXPECT_EQ(ChunkWords(echo)[5], 1 + static_cast<int>(1174.6484375 * std::log(481.0))) << "preset 1 stays";
+    EXPECT_EQ(Text(echo, kDepthL, echo.GetParamFromProp(kDepthL, 0)), "300 ms");
+}
+
+// Catches a tail that is cut, that never ends, or that starts from the wrong place.
+TEST(Echo, RingsOutOnePassOfItsRing) {
+    const auto format = Format<float>(2, 1000);
+    Echo echo;
+    Load(echo, 0, 100, 61);
+    echo.InitProcessing(64, &format);
+    auto block = Noise<float>(2 * 64);
+    ProcessBlock(echo, block.data(), 64, format);
+    EXPECT_EQ(echo.TailFramesProduced(), 64);
+    echo.StartTail(LLONG_MAX);
+    std::vector<float> tail;
+    while (!echo.TailFinished()) {
+        std::vector<float> silence(2 * 16);
+        ProcessBlock(echo, silence.data(), 16, format);
+        tail.insert(tail.end(), silence.begin(), silence.begin() + 2 * echo.TailFramesProduced());
+        ASSERT_LE(tail.size(), 100u);
+    }
+    EXPECT_EQ(tail.size(), 100u);
+    EXPECT_EQ(NonZero({tail.begin(), tail.end()}, 0).back(), 49u);
+    EXPECT_EQ(NonZero({tail.begin(), tail.end()}, 1).back(), 29u);
+}

@@ -1,0 +1,135 @@
+#include "DSP/Effects/Framework/MemoryFile.h"
+
+#include <gtest/gtest.h>
+
+#include <limits>
+
+#include "Support/VirtualSlot.h"
+
+using Corvo::CorvoException;
+using KivFiles::CMemoryFile;
+
+namespace {
+
+constexpr std::int64_t kFar = std::numeric_limits<std::int64_t>::max();
+
+}  // namespace
+
+// Catches a virtual operation that was moved: hosts call by number.
+TEST(MemoryFile, KeepsEveryOperationInItsSlot) {
+    using F = KivFiles::CFileBase;
+    using TestSupport::Slot;
+    const int slots[] = {
+        Slot(&F::Write),       Slot(&F::Read),     Slot(&F::Seek),      4 /* destructor, with 3 */,
+        Slot(&F::GetPosition), Slot(&F::Truncate), Slot(&F::GetLength), Slot(&F::IsReadable),
+        Slot(&F::IsWritable)};
+    for (int slot = 0; slot < 9; ++slot)
+        EXPECT_EQ(slots[slot], slot < 3 ? slot : slot + 1) << "operation " << slot;
+}
+
+TEST(MemoryFile, GrowsInFixedSteps) {
+    CMemoryFile file;
+    const std::vector<std::uint8_t> bytes(102400, 7);
+    file.Write(bytes.data(), 1);
+    EXPECT_EQ(file.Capacity(), 102400);
+    file.Write(bytes.data(), 102399);
+    EXPECT_EQ(file.Capacity(), 102400);
+    file.Write(bytes.data(), 1);
+    EXPECT_EQ(file.Capacity(), 204800);
+    EXPECT_EQ(file.GetLength(), 102401);
+}
+
+// Catches positions and counts that reach outside the buffer.
+TEST(MemoryFile, ReadsOnlyWhatIsThere) {
+    CMemoryFile file;
+    const char text[] = "hello";
+    file.Seek(1000, CMemoryFile::FromStart);
+    EXPECT_EQ(file.Write(text, 5), 5);
+    EXPECT_EQ(file.GetLength(), 1005);
+    EXPECT_EQ(file.GetPosition(), 1005) << "asking for the length leaves the position";
+
+    struct Case {
+        std::int64_t position, count, expected;
+    } const cases[] = {{1000, 5, 5}, {1003, 5, 2},  {1005, 5, 0},    {2000, 5, 0},   {-1, 5, 0},
+                       {1000, 0, 0}, {1000, -1, 0}, {1004, kFar, 1}, {kFar, kFar, 0}};
+    for (const auto& c : cases) {
+        char read[8] = "-------";
+        file.Seek(c.position, CMemoryFile::FromStart);
+        EXPECT_EQ(file.Read(read, c.count), c.expected) << c.position << ", " << c.count;
+        EXPECT_EQ(file.GetPosition(), c.position + c.expected);
+        EXPECT_EQ(read[c.expected], '-') << "wrote past what it returned";
+    }
+    file.Seek(-5, CMemoryFile::FromStart);
+    EXPECT_EQ(file.Write(text, 5), 0);
+    file.Seek(999, CMemoryFile::FromStart);
+    char gap = 'x';
+    EXPECT_EQ(file.Read(&gap, 1), 1);
+    EXPECT_EQ(gap, '\0');
+}
+
+TEST(MemoryFile, SeeksBackFromTheEnd) {
+    CMemoryFile file;
+    file.Write(std::vector<char>(100).data(), 100);
+    EXPECT_EQ(file.Seek(10, CMemoryFile::FromEnd), 90);
+    EXPECT_EQ(file.Seek(5, CMemoryFile::FromCurrent), 95);
+    EXPECT_EQ(file.Seek(5, 9), 95) << "an unknown origin leaves the position";
+    file.SetUnbounded(true);
+    EXPECT_EQ(file.Seek(10, CMemoryFile::FromEnd), 95);
+}
+
+TEST(MemoryFile, RunsOutOfMemoryWithAMessage) {
+    CMemoryFile file;
+    const char byte = 1;
+    file.Seek(kFar - 10, CMemoryFile::FromStart);
+    EXPECT_THROW(file.Write(&byte, 1), CorvoException);
+    file.Seek(0, CMemoryFile::FromStart);
+    EXPECT_THROW(file.Write(&byte, kFar), CorvoException) << "a count beyond memory, from a valid byte";
+}
+
+TEST(MemoryFile, StreamsArraysOfDoubles) {
+    const std::vector<double> values{0.0, -1.5, 1e300};
+    CMemoryFile file;
+    KivFiles::WriteDoubles(file, values);
+    EXPECT_EQ(file.GetLength(), 4 + 3 * 8);
+    EXPECT_EQ(file.Data()[0], 3) << "little-endian";
+    std::vector<double> read;
+    file.Seek(0, CMemoryFile::FromStart);
+    KivFiles::ReadDoubles(file, read);
+    EXPECT_EQ(read, values);
+
+    read.clear();
+    file.SetUnbounded(true);  // such a file does not know its length
+    file.Seek(0, CMemoryFile::FromStart);
+    KivFiles::ReadDoubles(file, read);
+    EXPECT_EQ(read, values);
+    file.SetUnbounded(false);
+
+    // A count that the bytes cannot hold must neither be believed nor spoil what the caller has.
+    for (const std::int32_t count : {4, std::numeric_limits<std::int32_t>::max(), -1}) {
+        file.Seek(0, CMemoryFile::FromStart);
+        file.Write(&count, 4);
+        file.Seek(0, CMemoryFile::FromStart);
+        try {
+            KivFiles::ReadDoubles(file, read);
+            FAIL() << count;
+        } catch (const CorvoException& error) {
+            EXPECT_STREQ(error.what(), "Error reading data");
+        }
+        EXPECT_EQ(read, values);
+    }
+}
+
+TEST(CorvoException, CarriesTheTextAppendedToIt) {
+    CMemoryFile file;
+    try {
+        file.Truncate();
+        FAIL();
+    } catch (const CorvoException& error) {
+        EXPECT_STREQ(error.what(), "Not implemented");
+    }
+    try {
+        throw CorvoException("Error reading data") << ": profile " << 3;
+    } catch (const std::exception& error) {
+        EXPECT_STREQ(error.what(), "Error reading data: profile 3");
+    }
+}

@@ -1,0 +1,115 @@
+#include <gtest/gtest.h>
+
+#include <dlfcn.h>
+
+#include <cairo.h>
+#include <fontconfig/fontconfig.h>
+
+#include "Drawing/DrawingFont.h"
+#include "Drawing/Views/ShownAnalyser.h"
+
+using namespace Corvo;
+using TestSupport::DrawingSurface;
+
+namespace {
+
+int g_layouts = 0;
+
+}  // namespace
+
+// In front of Pango's own: every text that is laid out comes through here.
+extern "C" struct _PangoLayout* pango_layout_new(struct _PangoContext* context) {
+    using Function = _PangoLayout*(_PangoContext*);
+    static const auto next = reinterpret_cast<Function*>(dlsym(RTLD_NEXT, "pango_layout_new"));
+    ++g_layouts;
+    return next(context);
+}
+
+namespace {
+
+class CairoBackend : public ViewTest {};
+
+// Catches a back-end that keeps fewer texts than a picture has, and so lays all of them out for every one.
+TEST_F(CairoBackend, LaysOutNothingTwice) {
+    ShownAnalyser shown;
+    shown.analyser.SetTunerOn(true);
+    shown.analyser.ObserverUpdate();
+    shown.analyser.ShowSonogram(true);
+    shown.Hear(440.0, 0.5);
+    for (const int scale : {0, 1, 4})
+        for (const bool notes : {false, true}) {
+            DrawingSurface<DrawingCairo> surface(16, 16);
+            kivspectrum::settings.view_option_a = scale;
+            kivspectrum::settings.view_flag_d = notes;
+            const auto draw = [&] {
+                g_layouts = 0;
+                surface.Paint(96.0f, [&](auto& target) {
+                    shown.analyser.DoDraw<DrawingCairo>(target, {0, 0, 3840, 2160});
+                });
+                return g_layouts;
+            };
+            EXPECT_GT(draw(), 50);
+            EXPECT_EQ(draw(), 0) << "scale " << scale << (notes ? ", notes" : "");
+        }
+}
+
+// Catches a typeface's file that joins the program's once more with every back-end.
+TEST_F(CairoBackend, AddsATypefacesFileOnce) {
+    const FcFontSet* const system = FcConfigGetFonts(nullptr, FcSetSystem);
+    FcChar8* file = nullptr;
+    ASSERT_TRUE(system && system->nfont > 0);
+    ASSERT_EQ(FcPatternGetString(system->fonts[0], FC_FILE, 0, &file), FcResultMatch);
+    DrawingFont::SetFile(reinterpret_cast<const char*>(file));
+    const auto fonts = [] {
+        const DrawingCairo drawing;
+        const FcFontSet* const added = FcConfigGetFonts(nullptr, FcSetApplication);
+        return added ? added->nfont : 0;
+    };
+    const int once = fonts();
+    EXPECT_GE(once, 1);
+    EXPECT_EQ(fonts(), once);
+    DrawingFont::SetFile("");
+}
+
+// Catches "own size" taken in the context's units: two black and two white pixels, drawn off the grid by less
+// than half a pixel, are copied where they cover as many pixels of the surface, and else run together.
+TEST_F(CairoBackend, CopiesBitmapsPixelByPixel) {
+    struct Case {
+        const char* what;
+        double deviceScale, contextScale;
+        float width;
+        bool copied;
+    };
+    DrawingBitmap bitmap;
+    bitmap.Size(4, 4);
+    for (int y = 0; y < 4; ++y)
+        for (int x = 0; x < 4; ++x) bitmap.Row(y)[x] = x < 2 ? 0xFF000000u : 0xFFFFFFFFu;
+    for (const Case& c :
+         {Case{"plain", 1.0, 1.0, 4.0f, true}, Case{"larger", 1.0, 1.0, 8.0f, false},
+          Case{"dense surface", 2.0, 1.0, 2.0f, true}, Case{"dense surface, larger", 2.0, 1.0, 4.0f, false},
+          Case{"scaled context", 1.0, 2.0, 2.0f, true}, Case{"scaled context, larger", 1.0, 2.0, 4.0f, false},
+          Case{"they cancel out", 2.0, 0.5, 4.0f, true}}) {
+        cairo_surface_t* const surface = cairo_image_surface_create(CAIRO_FORMAT_RGB24, 16, 16);
+        cairo_surface_set_device_scale(surface, c.deviceScale, c.deviceScale);
+        cairo_t* const context = cairo_create(surface);
+        cairo_scale(context, c.contextScale, c.contextScale);
+        {
+            DrawingCairo drawing;
+            DrawingCairo::DrawTarget target(drawing, context, 96.0f);
+            const auto at = static_cast<float>(2.3 / (c.deviceScale * c.contextScale));
+            target.Bitmap(bitmap, {at, at, c.width, c.width}, 255);
+        }
+        cairo_destroy(context);
+        cairo_surface_flush(surface);
+        const auto* const row = reinterpret_cast<const std::uint32_t*>(
+            cairo_image_surface_get_data(surface) + 4 * cairo_image_surface_get_stride(surface));
+        int between = 0;
+        for (int x = 3; x < 6; ++x) between += (row[x] & 0xFF) > 0x08 && (row[x] & 0xFF) < 0xF8 ? 1 : 0;
+        for (int x = 6; x < 9 && !c.copied; ++x)
+            between += (row[x] & 0xFF) > 0x08 && (row[x] & 0xFF) < 0xF8 ? 1 : 0;
+        EXPECT_EQ(between == 0, c.copied) << c.what;
+        cairo_surface_destroy(surface);
+    }
+}
+
+}  // namespace
