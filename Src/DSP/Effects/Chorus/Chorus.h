@@ -39,43 +39,18 @@ struct Side;
 // Memory: InitProcessing makes a ring for 10 s. Settings from a chunk beyond that, or beyond the ring when
 // the format changed without InitProcessing, are limited to what the ring holds. The ring keeps its contents
 // through edits and preparation.
+//
+// Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API Chorus : public CorvoEffect {
 public:
     Chorus();
     ~Chorus() override;
 
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 92 bytes: the chunk tag and the settings, 22 words.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;  // ignored below 92 bytes
-    // The older layout, in which each of the 22 words takes 8 bytes: 180 bytes. False, with nothing changed,
-    // when there are fewer.
-    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
-    void Cleanup() override;  // frees the ring; the next cook makes a new one
-
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
-    void SetPreset(int preset) override;
-    float GetParamFromProp(int index, int preset) override;
-
-    std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    float GetParam(int index) override;
-    float GetParamPlain(int index) const override;
-    int GetParamCountReal() override;
-    const MP_PARAMINFO* GetParametersInfo() override;
-
-    std::string GetName() override;
-    std::string GetImage() override;
-    std::string GetPluginIconPath() override;
-    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
-    bool WantsXySerialization() override;
-    void InitializeXyEditingData(GenericUIData& data) override;
+    void Cleanup() override;                             // frees the ring; the next cook makes a new one
     void InitResetProcessingLight(bool reset) override;  // clears the ring, whatever `reset`
 
 protected:
-    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
     void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
                          ProcessFlags& flags) override;
 

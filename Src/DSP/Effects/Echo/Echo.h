@@ -60,6 +60,9 @@ struct Line {
 // Memory: InitProcessing makes the ring for the largest time, 10 s. Only a tempo so slow that a note is
 // longer grows it, up to 60 s, in the block that first needs it.
 //
+// Settings chunk: 100 bytes, the chunk tag and the settings, 24 words. Older layouts: exactly 92 bytes,
+// without the mode, which becomes "Time (linear)"; and the oldest of 180 bytes, likewise.
+//
 // Feedback above 0 dB grows without bound.
 class DSP_API Echo : public CorvoEffect {
 public:
@@ -67,40 +70,12 @@ public:
     ~Echo() override;
 
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 100 bytes: the chunk tag and the settings, 24 words.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    // Also takes 92 bytes: an older layout without the mode, which becomes "Time (linear)". Anything else
-    // below 100 bytes is ignored.
-    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
-    // The oldest layout, in which each of the first 22 words takes 8 bytes: 180 bytes. False, with
-    // nothing changed, when there are fewer.
-    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
-    void Cleanup() override;  // frees the ring; the next cook makes a new one
-
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
-    void SetPreset(int preset) override;
-    float GetParamFromProp(int index, int preset) override;
-    // A preset's settings, with the delays in milliseconds. `preset` is 0..NumPresets()-1.
-    static const EchoPrivate::_transform_props& GetPresetData(int preset);
-
+    void Cleanup() override;                             // frees the ring; the next cook makes a new one
+    void InitResetProcessingLight(bool reset) override;  // clears the ring, whatever `reset`
     std::wstring GetParameterFormattedText(int index, double value) override;
     float GetParamValueNormalizedFromText(int index, std::string text) override;
-    std::vector<std::string> GetParameterAvailableValues(int index) override;
-    float GetParam(int index) override;
-    float GetParamPlain(int index) const override;
-    int GetParamCountReal() override;
-    const MP_PARAMINFO* GetParametersInfo() override;
-
-    std::string GetName() override;
-    std::string GetImage() override;
-    std::string GetPluginIconPath() override;
-    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
-    std::vector<std::string> GetParamUiSections() override;
-    bool WantsXySerialization() override;
-    void InitializeXyEditingData(GenericUIData& data) override;
-    void InitResetProcessingLight(bool reset) override;  // clears the ring, whatever `reset`
+    // A preset's settings, with the delays in milliseconds. `preset` is 0..NumPresets()-1.
+    static const EchoPrivate::_transform_props& GetPresetData(int preset);
 
 protected:
     bool DoSetParam(int index, float normalised, bool fromAutomation) override;
@@ -112,7 +87,6 @@ private:
     bool InitState(bool reset);
     bool LayRing(std::array<int, 2> lengths, bool reset);
     double DelayMs(std::int32_t mode, std::int32_t depth) const;
-    float DelayFromText(int index, const std::string& text) const;
     void SetMode(std::int32_t mode);
     template <typename Sample>
     void Run(Sample* samples, std::array<int, 2> frames);

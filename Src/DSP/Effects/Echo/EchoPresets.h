@@ -4,6 +4,7 @@
 
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Echo/EchoDelay.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 
 namespace Corvo::DSP::EchoPresets {
 
@@ -49,11 +50,15 @@ inline constexpr auto kPresetData = [] {
     return data;
 }();
 
-// The settings that a preset stands for: its delays as words of its mode.
-inline EchoPrivate::_transform_props Applied(int preset) {
-    auto props = kPresetData[static_cast<std::size_t>(preset)];
-    for (auto& depth : props.depth) depth = EchoDelay::Word(EchoDelay::kLog, depth);
-    return props;
+// What the presets stand for: their delays as words of their mode.
+inline std::vector<PresetRow> AppliedPresets() {
+    std::vector<PresetRow> rows;
+    for (const auto& preset : kPresets) {
+        auto props = preset.Settings();
+        for (auto& depth : props.depth) depth = EchoDelay::Word(EchoDelay::kLog, depth);
+        rows.push_back({preset.name, WordsOf(props)});
+    }
+    return rows;
 }
 
 }  // namespace Corvo::DSP::EchoPresets

@@ -17,8 +17,21 @@ std::wstring_view Text(const wchar_t (&field)[32]) {
 CorvoEffect::CorvoEffect() = default;
 
 const MP_PARAMINFO& CorvoEffect::Record(int externalIndex) {
-    const int real = SeparateLeftRightControls() == 0 ? 2 * externalIndex : externalIndex;
-    return GetParametersInfo()[m_reverse_param_order ? GetParamCountReal() - real - 1 : real];
+    return GetParametersInfo()[RealIndex(externalIndex)];
+}
+
+bool CorvoEffect::DoSetParam(int index, float normalised, bool fromAutomation) {
+    return CorvoEffectBase::DoSetParam(index, normalised, fromAutomation);
+}
+float CorvoEffect::GetParam(int index) { return CorvoEffectBase::GetParam(index); }
+int CorvoEffect::GetParamCountReal() { return CorvoEffectBase::GetParamCountReal(); }
+std::string CorvoEffect::GetName() { return CorvoEffectBase::GetName(); }
+const MP_PARAMINFO* CorvoEffect::GetParametersInfo() { return TableRecords(); }
+
+void CorvoEffect::GetSettingsChunk(std::vector<std::uint8_t>& chunk) { WriteChunk(chunk, m_chunk_tag); }
+void CorvoEffect::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) { TakeChunk(chunk, m_chunk_tag); }
+bool CorvoEffect::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
+    return TakeWideChunk(chunk, m_chunk_tag);
 }
 
 std::wstring CorvoEffect::GetParamName(int index) {

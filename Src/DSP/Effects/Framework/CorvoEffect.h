@@ -4,7 +4,7 @@
 
 namespace Corvo::DSP {
 
-// An effect whose parameters are named, counted and typed by one static table.
+// An effect whose parameters are named, counted and typed by one static table of records.
 class DSP_API CorvoEffect : public CorvoEffectBase {
 public:
     // The record's label; a trailing " L" or " R" is dropped.
@@ -13,17 +13,28 @@ public:
     int GetParamCount() override;
     EffectParameterType GetParameterTypeAutomatable(int index) override;
     int SeparateLeftRightControls() override;
+    float GetParam(int index) override;
+    int GetParamCountReal() override;
+    std::string GetName() override;
+    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
+    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
 
     // The first of GetParamCountReal() records, which live as long as the library.
-    virtual const MP_PARAMINFO* GetParametersInfo() = 0;
+    virtual const MP_PARAMINFO* GetParametersInfo();
+
+    // The record of an external parameter below GetParamCount().
+    const MP_PARAMINFO& Record(int externalIndex);
+    // Takes the effect's oldest layout of the settings chunk, in which each word has 8 bytes. False, with
+    // nothing changed, when there are too few or the effect never had it.
+    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
 
 protected:
+    using CorvoEffectBase::CorvoEffectBase;
     CorvoEffect();
 
-    std::int32_t m_chunk_tag = 0;  // stored first in most chunks; kept and given back, never interpreted
+    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
 
-private:
-    const MP_PARAMINFO& Record(int externalIndex);
+    std::int32_t m_chunk_tag = 0;  // stored first in most chunks; kept and given back, never interpreted
 };
 
 }  // namespace Corvo::DSP

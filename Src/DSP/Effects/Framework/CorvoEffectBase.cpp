@@ -25,44 +25,23 @@ void CorvoEffectBase::CheckCookProperties(const tWAVEFORMATEX*, bool) {
     m_cook.store(false, std::memory_order_relaxed);
 }
 
-void CorvoEffectBase::GetSettingsChunk(std::vector<std::uint8_t>&) {}
-int CorvoEffectBase::GetSettingsChunkSize() { return 0; }
-void CorvoEffectBase::SetSettingsChunk(const std::vector<std::uint8_t>&) {}
 void CorvoEffectBase::Cleanup() {}
 
-int CorvoEffectBase::NumPresets() { return 0; }
-std::string CorvoEffectBase::GetPresetName(int) { return {}; }
-void CorvoEffectBase::SetPreset(int) {}
-
-std::wstring CorvoEffectBase::GetParameterFormattedText(int, double) { return {}; }
-std::wstring CorvoEffectBase::GetParamName(int) { return {}; }
-std::wstring CorvoEffectBase::GetParamUnitsText(int) { return {}; }
-float CorvoEffectBase::GetParamPlain(int) const { return 0.0f; }
 bool CorvoEffectBase::IsCantrix() { return false; }
 int CorvoEffectBase::GetParamCount() { return GetParamCountReal(); }
 EffectParameterType CorvoEffectBase::GetParameterTypeAutomatable(int) {
     return EffectParameterType::Continuous;
 }
 
-int CorvoEffectBase::GetDefaultPreset() { return 0; }
-bool CorvoEffectBase::WantsXySerialization() { return false; }
 bool CorvoEffectBase::IsMono() const { return false; }
-std::string CorvoEffectBase::GetImage() { return {}; }
 int CorvoEffectBase::GetNumSidechainBusses() { return 0; }
 int CorvoEffectBase::GetSidechainBusNumChannelsMax(int) { return 0; }
 void CorvoEffectBase::SetSidechainBuffer(int, double* const*) {}
-std::vector<std::string> CorvoEffectBase::GetParameterAvailableValues(int) { return {}; }
 int CorvoEffectBase::SeparateLeftRightControls() { return HasSeparateLeftRightSettings() ? 0 : 1; }
 bool CorvoEffectBase::AllowChangeParamFromInputBox(int) { return false; }
-float CorvoEffectBase::GetParamValueNormalizedFromText(int, std::string) { return -1.0f; }
 int CorvoEffectBase::GetPreferredNumColumnsForTab() const { return -1; }
-void CorvoEffectBase::GetParamSectionInfo(int, PluginParameterInfo&) {}
-std::vector<std::string> CorvoEffectBase::GetParamUiSections() { return {}; }
-std::string CorvoEffectBase::GetPluginIconPath() { return {}; }
 PluginGenericUILookAndFeel CorvoEffectBase::GetLookAndFeel() { return {}; }
 void CorvoEffectBase::InitResetProcessingLight(bool) {}
-void CorvoEffectBase::InitializeXyEditingData(GenericUIData&) {}
-float CorvoEffectBase::GetParamFromProp(int, int) { return -1.0f; }
 
 void CorvoEffectBase::SetParam(int index, float normalised, bool fromAutomation) {
     // Not the external count: automation goes by real indices.
@@ -79,7 +58,13 @@ void CorvoEffectBase::SetParam(int index, float normalised, bool fromAutomation)
         // Reversed effects hear of automation as if it came from the user interface.
         changed = DoSetParam(mirrored, normalised, false);
     }
-    if (changed) m_cook.store(true, std::memory_order_release);
+    if (changed) MarkStale();
+}
+
+CorvoEffectBase::Cook CorvoEffectBase::TakeCook(tWAVEFORMATEX& seen, const tWAVEFORMATEX& now, bool force) {
+    const bool afresh = force || now.nChannels != seen.nChannels || now.nSamplesPerSec != seen.nSamplesPerSec;
+    seen = now;
+    return {m_cook.exchange(false, std::memory_order_acquire) || afresh, afresh};
 }
 
 bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format) {
@@ -114,7 +99,7 @@ bool CorvoEffectBase::TailFinished() const { return m_tail.finished; }
 void CorvoEffectBase::RequestTailRestart() { m_tail.restart_requested = true; }
 
 void CorvoEffectBase::SetHostCallback(CorvoEffectHostCallback* callback) { m_host_callback = callback; }
-void CorvoEffectBase::NotifyTempoChanged() { m_cook.store(true, std::memory_order_release); }
+void CorvoEffectBase::NotifyTempoChanged() { MarkStale(); }
 void CorvoEffectBase::SetWantRefreshAllParams(bool want) { m_want_refresh_all_params = want; }
 bool CorvoEffectBase::WantRefreshAllParams() { return m_want_refresh_all_params; }
 bool CorvoEffectBase::WantsUpdateUiFromScratch() const { return m_update_ui_from_scratch.load(); }
@@ -138,7 +123,7 @@ void CorvoEffectBase::AddEnvelope(int index, int count, const MP_ENVELOPE_SEGMEN
     auto& envelope = m_envelopes[parameter];
     envelope.clear();
     if (segments && count > 0) envelope.assign(segments, segments + count);
-    m_cook.store(true, std::memory_order_release);
+    MarkStale();
 }
 
 void CorvoEffectBase::FlushEnvelope(int index, std::int64_t from, std::int64_t to) {
@@ -146,7 +131,7 @@ void CorvoEffectBase::FlushEnvelope(int index, std::int64_t from, std::int64_t t
     const auto inside = [&](std::int64_t time) { return from <= time && time < to; };
     std::erase_if(m_envelopes[static_cast<std::size_t>(index)],
                   [&](const auto& segment) { return inside(segment.rtStart) && inside(segment.rtEnd); });
-    m_cook.store(true, std::memory_order_release);
+    MarkStale();
 }
 
 void CorvoEffectBase::SetEnvelopeTime(std::int64_t time) { m_envelope_time = time; }

@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "DSP/Effects/Framework/ParameterDescription.h"
 #include "DSP/Effects/Framework/ProcessFlags.h"
 #include "DSP/Effects/Framework/TailRecord.h"
 #include "Host/BuiltinEditor.h"
@@ -16,12 +17,10 @@
 #include "Platform/MediaParams.h"
 #include "Platform/WaveFormat.h"
 
-namespace Corvo {
+namespace Corvo::DSP {
 
-// How the host automates a parameter.
-enum class EffectParameterType : int { Continuous = 0, Switch = 1, List = 2 };
-
-namespace DSP {
+struct EffectTable;
+struct ParameterRow;
 
 // The contract between the host and every effect.
 //
@@ -30,7 +29,7 @@ namespace DSP {
 // running state; destroy.
 //
 // Blocks are processed in place. Buffers are declared as double and hold what the format's
-// wBitsPerSample says: 64 double samples, 32 float samples; other widths are each effect's own affair.
+// wBitsPerSample says: 64 double samples, 32 float samples; every effect says what it does with other widths.
 // Interleaved blocks hold frames * nChannels samples, planar ones are nChannels buffers of `frames`.
 //
 // Threads: processing, envelope playback and cooking belong to the audio thread; parameter, text, preset
@@ -39,6 +38,9 @@ namespace DSP {
 //
 // Indices: a "real" index counts the effect's own parameters, an "external" one the host's, which may
 // stand for a left/right pair. The base checks no index; an effect ignores a real index it does not have.
+//
+// Most effects are described by a table: names, texts, choices, presets and the layout of the settings chunk.
+// The operations below answer from it; an effect without one has the answers given here.
 //
 // The order of the virtual operations is part of the contract.
 class DSP_API CorvoEffectBase {
@@ -179,6 +181,14 @@ public:
     void SetEnvelopeTime(std::int64_t time);
     std::int64_t GetEnvelopeTime() const;
 
+    // What the host needs to know of an external parameter below GetParamCount(), choices included.
+    ParameterDescription Describe(int index);
+    // False when envelopes are kept but never played.
+    bool PlaysAutomation() const;
+    // Seconds that may pass between two echoes of one sound with the settings and format of the last block or
+    // InitProcessing; 0 when there are none. A host that waits for silence waits as long. Between blocks.
+    double LongestGap() const;
+
     std::vector<int> GetAllSupportedParameterIds();  // 0 .. real count - 1
     // One normalised value per parameter, in external order; -1 without preset data.
     std::vector<float> GetPresetValues(int preset);
@@ -187,6 +197,32 @@ public:
 
 protected:
     CorvoEffectBase();
+    // For an effect that is described by a table. `settings` is its record of `table.chunk.words` 32-bit
+    // words, which the two threads share; both live as long as the effect.
+    CorvoEffectBase(const EffectTable& table, void* settings);
+
+    // The row of an external parameter, and of a real one; null without a table or where there is none.
+    const ParameterRow* RowOf(int external);
+    const ParameterRow* RealRow(int real) const;
+    int RealIndex(int external);
+    const MP_PARAMINFO* TableRecords() const;
+
+    // Settings as a whole: stores those of a preset, or of a chunk in today's layout or the oldest one, and
+    // marks the effect stale. False, with nothing changed, when there is no such preset or the chunk does not
+    // fit; the chunk's leading word goes to `leading`.
+    bool TakePreset(int preset);
+    bool TakeChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading);
+    bool TakeWideChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading);
+    void WriteChunk(std::vector<std::uint8_t>& chunk, std::int32_t leading) const;
+
+    void MarkStale() { m_cook.store(true, std::memory_order_release); }
+    // Lowers the flag and takes note of the format. `due`: derived state is stale, because the flag was up,
+    // the number of channels or the rate is not that of `seen`, or the host forces it. `afresh`: for either
+    // of the last two.
+    struct Cook {
+        bool due, afresh;
+    };
+    Cook TakeCook(tWAVEFORMATEX& seen, const tWAVEFORMATEX& now, bool force);
 
     // Removes the segments of one parameter that lie wholly inside [from, to).
     void FlushEnvelope(int index, std::int64_t from, std::int64_t to);
@@ -214,7 +250,13 @@ protected:
     // Raised with release after an edit is stored, lowered with acquire before it is read.
     std::atomic<bool> m_cook{true};
     TailRecord m_tail;
+    double m_longest_gap = 0.0;  // what LongestGap says; kept by cooks
+
+private:
+    void Store(const std::vector<std::uint32_t>& settings);
+
+    const EffectTable* m_table = nullptr;
+    void* m_words = nullptr;
 };
 
-}  // namespace DSP
-}  // namespace Corvo
+}  // namespace Corvo::DSP

@@ -4,9 +4,8 @@
 #include <numbers>
 
 #include "DSP/Effects/Gain/GainKernel.h"
-#include "DSP/Effects/Parameters/ParameterTable.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
-#include "DSP/Effects/Parameters/SettingsChunk.h"
 #include "DSP/Parts/SampleDispatch.h"
 #include "Threads/SharedRecord.h"
 
@@ -15,61 +14,87 @@ namespace {
 
 enum Index : std::size_t { kGain, kWidth, kPan, kFlipLeft, kFlipRight, kCount };
 
-struct Row {
-    const wchar_t *label, *unit;
-    MP_TYPE type;
-    float minimum, maximum, neutral, fallback;
-    bool stereoOnly;
-    int stereoGroup;
-};
-
-// clang-format off
-constexpr std::array<Row, kCount> kRows{{
-    // label          unit   type      min      max    neutral default  stereo only, group
-    {L"Gain",         L"dB", MPT_INT,  0.0001f, 10.0f, 1.0f,   1.0f,    false, 1},
-    {L"Stereo width", L"",   MPT_INT,  0.0f,     2.0f, 1.0f,   1.0f,    true,  0},
-    {L"Pan",          L"",   MPT_INT, -1.0f,     1.0f, 0.0f,   0.0f,    true,  0},
-    {L"Flip phase L", L"",   MPT_BOOL, 0.0f,     1.0f, 0.0f,   0.0f,    false, 2},
-    {L"Flip phase R", L"",   MPT_BOOL, 0.0f,     1.0f, 0.0f,   0.0f,    true,  2},
-}};
-// clang-format on
-
-constexpr int kChunkSize = kCount * sizeof(float);
 constexpr std::int32_t kSilentTenths = -800;
 // +3 dB makes up for the constant-power law's loss; not the square root of two.
 constexpr double kPanMakeUp = 1.4125375446227544;
 
-bool Has(int index) { return index >= 0 && index < static_cast<int>(kCount); }
+constexpr PlainRange kGainRange{0.0001f, 10.0f, 1.0f}, kWidthRange{0.0f, 2.0f, 1.0f},
+    kPanRange{-1.0f, 1.0f, 0.0f}, kFlipRange{0.0f, 1.0f, 0.0f};
 
-float Limited(float normalised) { return normalised > 0.0f ? (normalised < 1.0f ? normalised : 1.0f) : 0.0f; }
+// Linear over the range; what lies beyond the knob's ends is stored as it comes.
+template <const PlainRange& kRange>
+constexpr Storage Linear() {
+    return {[](const Storage&, float n) {
+                return std::bit_cast<std::uint32_t>(kRange.minimum + (kRange.maximum - kRange.minimum) * n);
+            },
+            PlainOfReal,
+            [](const Storage&, std::uint32_t word) {
+                return Limited((PlainOfReal(word) - kRange.minimum) / (kRange.maximum - kRange.minimum));
+            }};
+}
 
 // "Gain" is linear in amplitude on each half of the knob, so that its middle is exactly unity.
-float GainPlain(const Row& row, float n) {
-    return n > 0.5f ? 1.0f + (row.maximum - 1.0f) * (n - 0.5f) / 0.5f
-                    : row.minimum + (1.0f - row.minimum) * n / 0.5f;
+float GainPlain(float n) {
+    const auto& [minimum, maximum, unity] = kGainRange;
+    return n > 0.5f ? 1.0f + (maximum - 1.0f) * (n - 0.5f) / 0.5f : minimum + (1.0f - minimum) * n / 0.5f;
 }
 
-float GainNormalised(const Row& row, float plain) {
-    return plain > 1.0f ? 0.5f + 0.5f * (plain - 1.0f) / (row.maximum - 1.0f)
-                        : 0.5f * (plain - row.minimum) / (1.0f - row.minimum);
+float GainNormalised(float plain) {
+    const auto& [minimum, maximum, unity] = kGainRange;
+    return Limited(plain > 1.0f ? 0.5f + 0.5f * (plain - 1.0f) / (maximum - 1.0f)
+                                : 0.5f * (plain - minimum) / (1.0f - minimum));
 }
 
-float Plain(std::size_t index, float n) {
-    const Row& row = kRows[index];
-    return index == kGain ? GainPlain(row, n) : row.minimum + (row.maximum - row.minimum) * n;
-}
-
-float Normalised(std::size_t index, float plain) {
-    const Row& row = kRows[index];
-    return Limited(index == kGain ? GainNormalised(row, plain)
-                                  : (plain - row.minimum) / (row.maximum - row.minimum));
-}
+constexpr Storage kGainHalves{
+    [](const Storage&, float n) { return std::bit_cast<std::uint32_t>(GainPlain(n)); }, PlainOfReal,
+    [](const Storage&, std::uint32_t word) { return GainNormalised(PlainOfReal(word)); }};
 
 std::wstring GainText(float plain) {
     const double tenths = std::log10(static_cast<double>(plain)) * 200.0;
     // Text of NaN and of anything at or below the floor; the cast would be undefined.
     if (!(tenths > kSilentTenths - 1)) return FormatTenthsOfDb(kSilentTenths, kSilentTenths);
     return FormatTenthsOfDb(static_cast<std::int32_t>(std::min(tenths, 1e6)), kSilentTenths);
+}
+
+// The texts show what is stored, whatever value the host asks for; GainEfx hands it over.
+constexpr Shown kGainShown{
+    [](const ParameterRow& row, double plain) {
+        return WithUnit(GainText(static_cast<float>(plain)), row.unit);
+    },
+    [](const ParameterRow&, const std::string& text) {
+        return GainNormalised(static_cast<float>(std::pow(10.0, ParseNumber(text) * 0.05)));
+    }};
+
+float ReadPlain(const ParameterRow& row, const std::string& text) {
+    return row.storage.normalised(row.storage, std::bit_cast<std::uint32_t>(ParseNumber(text)));
+}
+constexpr Shown kNumberShown{
+    [](const ParameterRow& row, double plain) { return WithUnit(FormatFixed(plain, 2), row.unit); },
+    ReadPlain};
+constexpr Shown kFlipShown{[](const ParameterRow&, double value) { return FormatSwitch(value >= 0.5); },
+                           ReadPlain};
+
+// clang-format off
+constexpr std::array<ParameterRow, kCount> kRows{{
+    // label          unit   type      kept as               shown as      word    group in stereo, range
+    {L"Gain",         L"dB", MPT_INT,  kGainHalves,          kGainShown,   kGain,      1, kGainRange},
+    {L"Stereo width", L"",   MPT_INT,  Linear<kWidthRange>(), kNumberShown, kWidth,     0, kWidthRange},
+    {L"Pan",          L"",   MPT_INT,  Linear<kPanRange>(),  kNumberShown, kPan,       0, kPanRange},
+    {L"Flip phase L", L"",   MPT_BOOL, Linear<kFlipRange>(), kFlipShown,   kFlipLeft,  2, kFlipRange},
+    {L"Flip phase R", L"",   MPT_BOOL, Linear<kFlipRange>(), kFlipShown,   kFlipRight, 2, kFlipRange},
+}};
+// clang-format on
+constexpr bool IsStereoOnly(std::size_t index) { return index != kGain && index != kFlipLeft; }
+
+const EffectTable& Table() {
+    static const EffectTable table{
+        .name = "Gain",
+        .rows = kRows,
+        .chunk = {.words = kCount, .leadingWord = false},
+        .caps = 0,
+        .playsAutomation = false,
+    };
+    return table;
 }
 
 // The pan law's factors. Centre and ends are pinned: the law itself would miss unity at the centre.
@@ -89,12 +114,12 @@ double PanRight(double pan) {
 
 }  // namespace
 
-GainEfx::GainEfx() { InitializeParamsFromDefault(); }
+GainEfx::GainEfx() : CorvoEffect(Table(), &m_params) { InitializeParamsFromDefault(); }
 GainEfx::~GainEfx() = default;
 
 void GainEfx::InitializeParamsFromDefault() {
     for (std::size_t i = 0; i < kCount; ++i) {
-        StoreShared(m_params[i], kRows[i].fallback);
+        StoreShared(m_params[i], kRows[i].range.neutral);
         m_knobs[i] = {};
         m_knobs[i].param_index = m_knobs[i].layout_group = static_cast<int>(i);
         m_knobs[i].is_switch = kRows[i].type == MPT_BOOL;
@@ -106,75 +131,35 @@ void GainEfx::InitializeParamsFromDefault() {
 void GainEfx::SetKnobsLayout(bool mono, std::array<PluginParameterInfo, 5>& knobs) {
     knobs[kFlipLeft].label = mono ? "Flip phase" : "Flip phase L";
     if (!mono) knobs[kFlipRight].label = "Flip phase R";
-    for (std::size_t i = 0; i < kCount; ++i) knobs[i].layout_group = mono ? -1 : kRows[i].stereoGroup;
+    for (std::size_t i = 0; i < kCount; ++i) knobs[i].layout_group = mono ? -1 : kRows[i].section;
 }
 
 bool GainEfx::HasSeparateLeftRightSettings() { return m_separate_settings; }
 bool GainEfx::SupportsNoninterleaved() { return true; }
-int GainEfx::GetSettingsChunkSize() { return kChunkSize; }
-int GainEfx::GetParamCountReal() { return kCount; }
-std::string GainEfx::GetName() { return "Gain"; }
 
-const MP_PARAMINFO* GainEfx::GetParametersInfo() {
-    static const auto records = [] {
-        std::array<MP_PARAMINFO, kCount> table;
-        std::ranges::transform(kRows, table.begin(), [](const Row& row) {
-            return MakeParamInfo(row.label, row.unit, row.type, 0, row.minimum, row.maximum, row.neutral);
-        });
-        return table;
-    }();
-    return records.data();
-}
-
-bool GainEfx::DoSetParam(int index, float normalised, bool) {
-    if (!Has(index)) return false;
-    const auto parameter = static_cast<std::size_t>(index);
-    StoreShared(m_params[parameter], Plain(parameter, normalised));
-    m_coef_dirty.store(true, std::memory_order_release);
-    return true;
-}
-
-float GainEfx::GetParam(int index) {
-    return Has(index) ? Normalised(static_cast<std::size_t>(index), GetParamPlain(index)) : 0.0f;
-}
-
-float GainEfx::GetParamPlain(int index) const {
-    return Has(index) ? LoadShared(m_params[static_cast<std::size_t>(index)]) : 0.0f;
+bool GainEfx::DoSetParam(int index, float normalised, bool fromAutomation) {
+    const bool stored = CorvoEffect::DoSetParam(index, normalised, fromAutomation);
+    if (stored) m_coef_dirty.store(true, std::memory_order_release);
+    return stored;
 }
 
 std::wstring GainEfx::GetParameterFormattedText(int index, double value) {
-    if (!Has(index)) return {};
-    const Row& row = kRows[static_cast<std::size_t>(index)];
-    if (row.type == MPT_BOOL) return FormatSwitch(value >= 0.5);
-    const float plain = GetParamPlain(index);
-    return WithUnit(index == kGain ? GainText(plain) : FormatFixed(plain, 2), row.unit);
-}
-
-float GainEfx::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Has(index)) return -1.0f;
-    const auto parameter = static_cast<std::size_t>(index);
-    const float number = ParseNumber(text);
-    return Normalised(parameter, index == kGain ? static_cast<float>(std::pow(10.0, number * 0.05)) : number);
+    return CorvoEffect::GetParameterFormattedText(
+        index, index < static_cast<int>(kFlipLeft) ? GetParamPlain(index) : value);
 }
 
 void GainEfx::GetParamSectionInfo(int index, PluginParameterInfo& info) {
-    if (!Has(index)) return;
+    if (!RowOf(index)) return;
     const auto parameter = static_cast<std::size_t>(index);
     auto knobs = m_knobs;
     if (m_had_stereo.load(std::memory_order_relaxed)) SetKnobsLayout(false, knobs);  // a label that stays
     SetKnobsLayout(m_mono_layout.load(std::memory_order_relaxed), knobs);
     info = knobs[parameter];
-    info.hidden = kRows[parameter].stereoOnly && m_stereo_hidden.load(std::memory_order_relaxed);
-}
-
-void GainEfx::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    ChunkWriter(chunk, kChunkSize)(Snapshot(m_params));
+    info.hidden = IsStereoOnly(parameter) && m_stereo_hidden.load(std::memory_order_relaxed);
 }
 
 void GainEfx::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    std::array<float, kCount> params;
-    if (!ChunkReader(chunk)(params)) return;
-    Assign(m_params, params);
+    if (std::int32_t unused; !TakeChunk(chunk, unused)) return;
     m_layout_dirty.store(true, std::memory_order_release);
     m_coef_dirty.store(true, std::memory_order_release);
 }

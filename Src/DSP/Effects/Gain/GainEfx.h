@@ -14,6 +14,8 @@ namespace Corvo::DSP::GainEfx {
 //
 // Parameters (plain range): 0 "Gain" 0.0001..10, unity at the middle of the knob; 1 "Stereo width" 0..2;
 // 2 "Pan" -1..1; 3 and 4 "Flip phase" left and right.
+//
+// Settings chunk: 20 bytes, the five plain values as floats.
 class DSP_API GainEfx : public CorvoEffect {
 public:
     GainEfx();
@@ -22,19 +24,9 @@ public:
     bool HasSeparateLeftRightSettings() override;
     bool SupportsNoninterleaved() override;
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 20 bytes: the five plain values as floats.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    // A chunk below 20 bytes is ignored.
     void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
     std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParam(int index) override;
-    float GetParamPlain(int index) const override;
-    int GetParamCountReal() override;
-    std::string GetName() override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
     void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
-    const MP_PARAMINFO* GetParametersInfo() override;
 
     // Default values and layout; the constructor calls it.
     void InitializeParamsFromDefault();

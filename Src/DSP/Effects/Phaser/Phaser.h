@@ -27,7 +27,8 @@ static_assert(sizeof(PhaserSettings) == 28);
 //
 // Parameters: 0 "Rate", 1 "Feedback", 2 "Wet", 3 "Minimum frequency", 4 "Maximum frequency", 5 "Stereo
 // width", 6 "Stages" (1..30). Presets come without stages: until some are set, only the feedback acts. Values
-// of a chunk beyond these ranges are kept and given back, and limited where they are used.
+// of a chunk beyond these ranges are kept and given back, and limited where they are used. The chunk has 32
+// bytes: the number 1, then the settings.
 //
 // Blocks are interleaved or planar, mono or stereo; 64-bit samples are double, every other width is taken for
 // float. Channels after the second pass unchanged. No latency. The sweep runs on through edits and
@@ -40,31 +41,11 @@ public:
     bool HasSeparateLeftRightSettings() override;
     bool SupportsNoninterleaved() override;
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 32 bytes: the number 1, then the settings.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;  // ignored below 32 bytes
     void Cleanup() override;
-
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
-    void SetPreset(int preset) override;
-    float GetParamFromProp(int index, int preset) override;
-
     std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    std::wstring GetParamName(int index) override;
-    std::wstring GetParamUnitsText(int index) override;
     float GetParam(int index) override;
-    float GetParamPlain(int index) const override;
     int GetParamCountReal() override;
-
     std::string GetName() override;
-    std::string GetImage() override;
-    std::string GetPluginIconPath() override;
-    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
-    bool WantsXySerialization() override;
-    void InitializeXyEditingData(GenericUIData& data) override;
 
 protected:
     bool DoSetParam(int index, float normalised, bool fromAutomation) override;

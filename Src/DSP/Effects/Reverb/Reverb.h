@@ -33,12 +33,14 @@ static_assert(sizeof(_transform_props) == 72);
 //
 // Blocks are interleaved or planar, mono or stereo, 32- or 64-bit float; any other width passes unchanged,
 // and so do channels after the second, and everything when there was no memory. 32-bit blocks are computed
-// in single precision, the input filter apart. No latency.
+// in single precision, except for the input filter. No latency.
 //
 // Parameters come in pairs, left and right; external indices run backwards: external 0 is real 15.
 //
 // Memory: InitProcessing makes the largest buffers for its format. A format that was not announced makes
 // its own in the first block that has it. An edit that changes the length of a buffer clears it.
+//
+// Settings chunk: 76 bytes, the chunk tag and the settings, 18 words; the oldest layout has 148 bytes.
 class DSP_API Reverb : public CorvoEffect {
 public:
     Reverb();
@@ -46,35 +48,10 @@ public:
 
     bool SupportsNoninterleaved() override;
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 76 bytes: the chunk tag and the settings, 18 words. Shorter chunks are ignored.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
-    // An older layout, in which each word takes 8 bytes: 148 bytes. False, with nothing changed, when
-    // there are fewer.
-    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
     void Cleanup() override;  // frees the buffers; the next cook makes new ones
     void ClearMemory();       // clears buffers, combs and filters; on the audio thread, between blocks
 
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
-    void SetPreset(int preset) override;
-    float GetParamFromProp(int index, int preset) override;
-
-    std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    float GetParam(int index) override;  // external index
-    float GetParamPlain(int index) const override;
-    int GetParamCountReal() override;
-    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;  // external index
-    const MP_PARAMINFO* GetParametersInfo() override;
-
-    std::string GetName() override;
-    std::string GetImage() override;
-    std::string GetPluginIconPath() override;
-
 protected:
-    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
     void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
                          ProcessFlags& flags) override;
     void ProcessInternalNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,

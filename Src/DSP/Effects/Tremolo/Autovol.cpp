@@ -4,11 +4,8 @@
 #include <string_view>
 #include <utility>
 
-#include "DSP/Effects/Parameters/FixedPoint.h"
-#include "DSP/Effects/Parameters/PairedWords.h"
-#include "DSP/Effects/Parameters/ParameterTable.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
-#include "DSP/Effects/Parameters/WordChunk.h"
 #include "DSP/Effects/Tremolo/AutovolPresets.h"
 #include "DSP/Parts/Decibels.h"
 #include "DSP/Parts/SampleDispatch.h"
@@ -37,49 +34,54 @@ namespace {
 
 using Props = AutovolPrivate::_transform_props;
 using Sides = std::array<AutovolPrivate::Side, 2>;
-using AutovolPresets::kPresets;
 
-enum class Show { Steps, TenthsOfDb, Choice };
+constexpr std::int32_t kSilent = -960;
 
-struct Row {
-    const wchar_t *label, *unit;
-    MP_TYPE type;
-    FixedPoint map;
-    Show show;
-    double step;  // of the value shown, per unit of the word
-    Props::Pair Props::*field;
-    std::size_t side;
-};
+// Anything off the end of the knob reads "Enabled", though only its other end enables.
+constexpr std::array<Choice, 2> kInvert{{{"Disabled", 0.0f}, {"Enabled", 1.0f}}};
+constexpr Shown kInverted{[](const ParameterRow& row, double value) {
+                              return WithUnit(Widen(kInvert[value != 0.0].text), row.unit);
+                          },
+                          ParameterTexts::ReadChoice,
+                          1.0,
+                          0,
+                          0,
+                          kInvert};
+constexpr PlainRange kSwitched{.neutral = 0.0f};
 
 // clang-format off
-constexpr std::array<Row, 10> kRows{{
-    // label             unit   type        span      floor     shown as          step  field            side
-    {L"Depth L",         L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Show::Steps,      0.1,  &Props::depth,   0},
-    {L"Depth R",         L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Show::Steps,      0.1,  &Props::depth,   1},
-    {L"Frequency L",     L"Hz", MPT_FLOAT, {3000.0f,    0.0f}, Show::Steps,      0.01, &Props::rate,    0},
-    {L"Frequency R",     L"Hz", MPT_FLOAT, {3000.0f,    0.0f}, Show::Steps,      0.01, &Props::rate,    1},
-    {L"Mix L",           L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Show::Steps,      0.1,  &Props::mix,     0},
-    {L"Mix R",           L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Show::Steps,      0.1,  &Props::mix,     1},
-    {L"Out gain L",      L"dB", MPT_FLOAT, {1160.0f, -960.0f}, Show::TenthsOfDb, 0.1,  &Props::outGain, 0},
-    {L"Out gain R",      L"dB", MPT_FLOAT, {1160.0f, -960.0f}, Show::TenthsOfDb, 0.1,  &Props::outGain, 1},
-    {L"Invert Phase L",  L"",   MPT_ENUM,  {   1.0f,    0.0f}, Show::Choice,     1.0,  &Props::invert,  0},
-    {L"Invert Phase R",  L"",   MPT_ENUM,  {   1.0f,    0.0f}, Show::Choice,     1.0,  &Props::invert,  1},
+constexpr std::array<ParameterRow, 10> kRows{{
+    // label             unit   type        span      floor     shown as             word of the settings
+    {L"Depth L",         L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Steps(0.1),          WordAt(&Props::depth, 0)},
+    {L"Depth R",         L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Steps(0.1),          WordAt(&Props::depth, 1)},
+    {L"Frequency L",     L"Hz", MPT_FLOAT, {3000.0f,    0.0f}, Steps(0.01),         WordAt(&Props::rate, 0)},
+    {L"Frequency R",     L"Hz", MPT_FLOAT, {3000.0f,    0.0f}, Steps(0.01),         WordAt(&Props::rate, 1)},
+    {L"Mix L",           L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Steps(0.1),          WordAt(&Props::mix, 0)},
+    {L"Mix R",           L"%",  MPT_FLOAT, {1000.0f,    0.0f}, Steps(0.1),          WordAt(&Props::mix, 1)},
+    {L"Out gain L",      L"dB", MPT_FLOAT, {1160.0f, -960.0f}, TenthsOfDb(kSilent), WordAt(&Props::outGain, 0)},
+    {L"Out gain R",      L"dB", MPT_FLOAT, {1160.0f, -960.0f}, TenthsOfDb(kSilent), WordAt(&Props::outGain, 1)},
+    {L"Invert Phase L",  L"",   MPT_ENUM,  {   1.0f,    0.0f}, kInverted,           WordAt(&Props::invert, 0), 0, kSwitched},
+    {L"Invert Phase R",  L"",   MPT_ENUM,  {   1.0f,    0.0f}, kInverted,           WordAt(&Props::invert, 1), 0, kSwitched},
 }};
 // clang-format on
 
-constexpr std::array<std::string_view, 2> kChoices{"Disabled", "Enabled"};
-constexpr std::int32_t kSilent = -960;
+const EffectTable& Table() {
+    static const EffectTable table{
+        .name = "Tremolo",
+        .image = "builtinTremolo.png",
+        .icon = "BuiltinPlugins/Tremolo@3x.png",
+        .rows = kRows,
+        .chunk = {.words = 22, .wideWords = 22},
+        .presets = PresetsOf(AutovolPresets::kPresets),
+        .pads = {{"Default", {0, 2}, {4, 6}}, {"Default", {1, 3}, {5, 7}}},  // a side each
+        .padNames = {"Default"},
+    };
+    return table;
+}
+
 constexpr std::int32_t kLoudest = 200, kWhole = 1000;
 constexpr double kPerMille = 0.001;
 constexpr double kRadiansPerRateStep = 0.06283185307179587;  // 2 pi / 100
-
-using Words = PairedWords<kRows, kPresets>;
-
-constexpr auto kVisitWords = [](auto&& visit, auto& s) {
-    return visit(s.depth) && visit(s.mix) && visit(s.rate) && visit(s.ringMod) && visit(s.invert) &&
-           visit(s.reserved) && visit(s.outGain) && visit(s.reserved2);
-};
-using SettingsChunk = WordChunk<Props, kVisitWords>;
 
 template <typename Sample>
 void Modulate(Sample* samples, double factor) {
@@ -116,113 +118,11 @@ void RunSide(AutovolPrivate::Side& side, Sample* samples, int frames, int stride
 
 }  // namespace
 
-Autovol::Autovol() : m_sides(std::make_unique<Sides>()) { SetPreset(0); }
+Autovol::Autovol() : CorvoEffect(Table(), &m_settings), m_sides(std::make_unique<Sides>()) { SetPreset(0); }
 Autovol::~Autovol() = default;
 
-int Autovol::GetParamCountReal() { return Words::kCount; }
-int Autovol::GetSettingsChunkSize() { return SettingsChunk::kSize; }
-int Autovol::NumPresets() { return Words::kPresetCount; }
-std::string Autovol::GetName() { return "Tremolo"; }
-std::string Autovol::GetImage() { return "builtinTremolo.png"; }
-std::string Autovol::GetPluginIconPath() { return "BuiltinPlugins/Tremolo@3x.png"; }
-bool Autovol::WantsXySerialization() { return true; }
-
-const MP_PARAMINFO* Autovol::GetParametersInfo() {
-    static const auto records = [] {
-        auto table = MakeNormalisedTable(kRows, 1);
-        for (auto& record : table)
-            if (record.mpType == MPT_ENUM) record.mpdNeutralValue = 0.0f;
-        return table;
-    }();
-    return records.data();
-}
-
-bool Autovol::DoSetParam(int index, float normalised, bool) {
-    return Words::Set(m_settings, index, normalised);
-}
-
-float Autovol::GetParamPlain(int index) const { return Words::Plain(m_settings, index); }
-float Autovol::GetParam(int index) { return Words::Normalised(m_settings, index); }
-float Autovol::GetParamFromProp(int index, int preset) { return Words::InPreset(index, preset); }
-
-std::wstring Autovol::GetParameterFormattedText(int index, double value) {
-    if (!Words::Has(index)) return {};
-    const Row& row = Words::RowAt(index);
-    const auto word = row.map.Word(static_cast<float>(value));
-    switch (row.show) {
-        case Show::Steps:
-            return WithUnit(FormatFixed(word * row.step, 1), row.unit);
-        case Show::TenthsOfDb:
-            return WithUnit(FormatTenthsOfDb(word, kSilent), row.unit);
-        case Show::Choice:
-            break;
-    }
-    // Anything off the end of the knob reads "Enabled", though only its other end enables.
-    return WithUnit(Widen(kChoices[value == 0.0 ? 0 : 1]), row.unit);
-}
-
-float Autovol::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Words::Has(index)) return -1.0f;
-    const Row& row = Words::RowAt(index);
-    switch (row.show) {
-        case Show::Steps:
-            return row.map.Normalised(ParseSteps(text, row.step));
-        case Show::TenthsOfDb:
-            return row.map.Normalised(ParseTenthsOfDb(text, kSilent));
-        case Show::Choice:
-            break;
-    }
-    return static_cast<float>(FindName(text, kChoices));
-}
-
-std::vector<std::string> Autovol::GetParameterAvailableValues(int index) {
-    if (!Words::Has(index) || Words::RowAt(index).show != Show::Choice) return {};
-    return {kChoices.begin(), kChoices.end()};
-}
-
-void Autovol::GetParamSectionInfo(int index, PluginParameterInfo& info) {
-    if (!Words::Has(index)) return;
-    info = {};
-    info.param_index = index;
-    info.values = GetParameterAvailableValues(index);
-    info.label = Narrow(Words::RowAt(index).label);
-}
-
-void Autovol::InitializeXyEditingData(GenericUIData& data) {
-    enum { kDepth, kRate = 2, kMix = 4, kOutGain = 6 };
-    data.groups.clear();
-    for (const int side : {0, 1})
-        data.groups.push_back(
-            MakeGroup("Default", side, {kDepth + side, kRate + side}, {kMix + side, kOutGain + side}));
-    data.entries = {"Default"};
-}
-
-std::string Autovol::GetPresetName(int preset) { return Words::PresetName(preset); }
-
-void Autovol::SetPreset(int preset) {
-    if (Words::TakePreset(m_settings, preset)) m_cook.store(true, std::memory_order_release);
-}
-
-void Autovol::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    SettingsChunk::Write(chunk, m_chunk_tag, m_settings);
-}
-
-void Autovol::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (SettingsChunk::Read(chunk, m_chunk_tag, m_settings)) m_cook.store(true, std::memory_order_release);
-}
-
-bool Autovol::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    const bool fits = SettingsChunk::ReadOld(chunk, m_chunk_tag, m_settings);
-    if (fits) m_cook.store(true, std::memory_order_release);
-    return fits;
-}
-
 void Autovol::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
-    const bool changed =
-        format->nChannels != m_format.nChannels || format->nSamplesPerSec != m_format.nSamplesPerSec;
-    m_format = *format;
-    if (m_cook.exchange(false, std::memory_order_acquire) || force || changed)
-        InitState(Snapshot(m_settings), *format, force);
+    if (TakeCook(m_format, *format, force).due) InitState(Snapshot(m_settings), *format, force);
 }
 
 void Autovol::InitState(const Props& settings, const tWAVEFORMATEX& format, bool force) {

@@ -34,42 +34,16 @@ struct Side;
 // Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for float.
 // Channels after the second pass unchanged. No latency. The oscillators run on through parameter changes;
 // InitProcessing starts both from 0.
+//
+// Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API Autovol : public CorvoEffect {
 public:
     Autovol();
     ~Autovol() override;
 
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 92 bytes: the chunk tag and the settings, 22 words.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;  // ignored below 92 bytes
-    // The older layout, in which each of the 22 words takes 8 bytes: 180 bytes. False, with nothing changed,
-    // when there are fewer.
-    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
-
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
-    void SetPreset(int preset) override;
-    float GetParamFromProp(int index, int preset) override;
-
-    std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    std::vector<std::string> GetParameterAvailableValues(int index) override;
-    float GetParam(int index) override;
-    float GetParamPlain(int index) const override;
-    int GetParamCountReal() override;
-    const MP_PARAMINFO* GetParametersInfo() override;
-
-    std::string GetName() override;
-    std::string GetImage() override;
-    std::string GetPluginIconPath() override;
-    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
-    bool WantsXySerialization() override;
-    void InitializeXyEditingData(GenericUIData& data) override;
 
 protected:
-    bool DoSetParam(int index, float normalised, bool fromAutomation) override;
     void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
                          ProcessFlags& flags) override;
 
