@@ -7,11 +7,11 @@
 
 #include "DSP/Effects/Compressor/CompressorPresets.h"
 #include "DSP/Effects/Compressor/CompressorSides.h"
-#include "DSP/Effects/Parameters/FixedPoint.h"
-#include "DSP/Effects/Parameters/ParameterTable.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 #include "DSP/Effects/Parameters/SettingsChunk.h"
 #include "Platform/Assertion.h"
+#include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
 
@@ -22,49 +22,14 @@ namespace {
 // Parameters come as pairs of this order.
 enum Pair { kAttack, kRelease, kOutGain, kThreshold, kRatio, kStereoLink, kMakeUp, kMonitor };
 
-struct Row {
-    const wchar_t *label, *unit;
-    MP_TYPE type;
-    FixedPoint map;
-};
-
-// clang-format off
-constexpr std::array<Row, 16> kRows{{
-    // label                 unit    type        span      floor
-    {L"Attack L",            L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
-    {L"Attack R",            L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
-    {L"Release L",           L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
-    {L"Release R",           L"ms",  MPT_FLOAT, {99999.0f,    1.0f}},
-    {L"Out gain L",          L"dB",  MPT_FLOAT, { 1160.0f, -960.0f}},
-    {L"Out gain R",          L"dB",  MPT_FLOAT, { 1160.0f, -960.0f}},
-    {L"Threshold L",         L"dB",  MPT_FLOAT, {  790.0f, -800.0f}},
-    {L"Threshold R",         L"dB",  MPT_FLOAT, {  790.0f, -800.0f}},
-    {L"Ratio L",             L"",    MPT_FLOAT, {  251.0f,    0.0f}},
-    {L"Ratio R",             L"",    MPT_FLOAT, {  251.0f,    0.0f}},
-    {L"Stereo Link",         L"",    MPT_BOOL,  {    1.0f,    0.0f}},
-    {L"Stereo Link",         L"",    MPT_BOOL,  {    1.0f,    0.0f}},
-    {L"Auto Make-up Gain",   L"",    MPT_BOOL,  {    1.0f,    0.0f}},
-    {L"Auto Make-up Gain",   L"",    MPT_BOOL,  {    1.0f,    0.0f}},
-    {L"Monitor sidechain L", L"",    MPT_BOOL,  {    1.0f,    0.0f}},
-    {L"Monitor sidechain R", L"",    MPT_BOOL,  {    1.0f,    0.0f}},
-}};
-// clang-format on
-
-// Where the pairs that are plain words are kept.
-constexpr std::array kStored{&Compressor::Parameters::attack, &Compressor::Parameters::release,
-                             &Compressor::Parameters::outGain};
-
 constexpr std::int32_t kShortestTime = 1, kLongestTime = 100000;
 constexpr std::int32_t kHighestOutGain = 200;  // tenths of a decibel
 constexpr int kDefaultPreset = 1;
 constexpr int kChunkSize = 16112;
 constexpr double kHighestRatioShown = 100.0;
 
-bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
-bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kCompressorPresets.size()); }
 Pair PairOf(int index) { return static_cast<Pair>(index / 2); }
 std::size_t SideOf(int index) { return static_cast<std::size_t>(index % 2); }
-FixedPoint MapOf(int index) { return kRows[static_cast<std::size_t>(index)].map; }
 
 std::int32_t Tenths(double db) { return static_cast<std::int32_t>(std::lround(db * 10.0)); }
 std::int32_t Hundredths(double ms) { return static_cast<std::int32_t>(std::lround(ms * 100.0)); }
@@ -96,8 +61,62 @@ std::int32_t RatioStepFromText(std::string_view text) {
     return static_cast<std::int32_t>(std::ceil(step - 1e-6));
 }
 
+std::wstring TimeText(const ParameterRow& row, double normalised) {
+    constexpr int kWidth = 4;
+    const auto hundredths = row.storage.map.Word(static_cast<float>(normalised));
+    return WithUnit(FormatFixed(hundredths * row.shown.step, row.shown.decimals, kWidth), row.unit);
+}
+
+float ReadTime(const ParameterRow& row, const std::string& text) {
+    const float ms = Limited(ParseNumber(text), kLongestTime * 0.01f);
+    return row.storage.map.Normalised(Hundredths(ms));
+}
+
+constexpr Shown Milliseconds(int decimals) { return {TimeText, ReadTime, 0.01, decimals}; }
+// Threshold and ratio are shown as they stand in the curve, by the effect.
+constexpr Shown kRatioShown{nullptr, [](const ParameterRow& row, const std::string& text) {
+                                return row.storage.map.Normalised(RatioStepFromText(text));
+                            }};
+
+// Both sides of a switch are one word.
+using P = Compressor::Parameters;
+// clang-format off
+constexpr std::array<ParameterRow, 16> kRows{{
+    // label                 unit   type       kept as              shown as                       word of the parameters
+    {L"Attack L",            L"ms", MPT_FLOAT, {99999.0f,    1.0f}, Milliseconds(2),  WordAt(&P::attack, 0)},
+    {L"Attack R",            L"ms", MPT_FLOAT, {99999.0f,    1.0f}, Milliseconds(2),  WordAt(&P::attack, 1)},
+    {L"Release L",           L"ms", MPT_FLOAT, {99999.0f,    1.0f}, Milliseconds(1),  WordAt(&P::release, 0)},
+    {L"Release R",           L"ms", MPT_FLOAT, {99999.0f,    1.0f}, Milliseconds(1),  WordAt(&P::release, 1)},
+    {L"Out gain L",          L"dB", MPT_FLOAT, { 1160.0f, -960.0f}, TenthsOfDb(kSilentOutGain),  WordAt(&P::outGain, 0)},
+    {L"Out gain R",          L"dB", MPT_FLOAT, { 1160.0f, -960.0f}, TenthsOfDb(kSilentOutGain),  WordAt(&P::outGain, 1)},
+    {L"Threshold L",         L"dB", MPT_FLOAT, {  790.0f, -800.0f}, TenthsOfDb(kLowestThreshold)},
+    {L"Threshold R",         L"dB", MPT_FLOAT, {  790.0f, -800.0f}, TenthsOfDb(kLowestThreshold)},
+    {L"Ratio L",             L"",   MPT_FLOAT, {  251.0f,    0.0f}, kRatioShown},
+    {L"Ratio R",             L"",   MPT_FLOAT, {  251.0f,    0.0f}, kRatioShown},
+    {L"Stereo Link",         L"",   MPT_BOOL,  SwitchWord(),        OnOff(),  WordAt(&P::stereoLink)},
+    {L"Stereo Link",         L"",   MPT_BOOL,  SwitchWord(),        OnOff(),  WordAt(&P::stereoLink)},
+    {L"Auto Make-up Gain",   L"",   MPT_BOOL,  SwitchWord(),        OnOff(),  WordAt(&P::makeUp)},
+    {L"Auto Make-up Gain",   L"",   MPT_BOOL,  SwitchWord(),        OnOff(),  WordAt(&P::makeUp)},
+    {L"Monitor sidechain L", L"",   MPT_BOOL,  SwitchWord(),        OnOff(),  WordAt(&P::flags)},
+    {L"Monitor sidechain R", L"",   MPT_BOOL,  SwitchWord(),        OnOff(),  WordAt(&P::flags)},
+}};
+// clang-format on
+
+const EffectTable& Table() {
+    static const EffectTable table = [] {
+        EffectTable made{.name = "Compressor",
+                         .rows = kRows,
+                         .chunk = {},
+                         .defaultPreset = kDefaultPreset,
+                         .sectionLabel = SectionLabel::None};
+        for (const auto& preset : kCompressorPresets) made.presets.push_back({preset.name, {}});
+        return made;
+    }();
+    return table;
+}
+
 template <typename Word>
-std::int32_t Limited(Word word, std::int32_t low, std::int32_t high) {
+std::int32_t Within(Word word, std::int32_t low, std::int32_t high) {
     return static_cast<std::int32_t>(std::clamp<Word>(word, low, high));
 }
 
@@ -105,9 +124,9 @@ template <typename Word>
 Compressor::Parameters Repaired(const TRANSFORM_PARAMETERS<Word>& words) {
     Compressor::Parameters good;
     for (std::size_t side = 0; side < 2; ++side) {
-        good.attack[side] = Limited(words.attack[side], kShortestTime, kLongestTime);
-        good.release[side] = Limited(words.release[side], kShortestTime, kLongestTime);
-        good.outGain[side] = Limited(words.outGain[side], kSilentOutGain, kHighestOutGain);
+        good.attack[side] = Within(words.attack[side], kShortestTime, kLongestTime);
+        good.release[side] = Within(words.release[side], kShortestTime, kLongestTime);
+        good.outGain[side] = Within(words.outGain[side], kSilentOutGain, kHighestOutGain);
     }
     good.stereoLink = words.stereoLink != 0;
     good.makeUp = words.makeUp != 0;
@@ -131,10 +150,15 @@ bool VisitCurves(auto&& visit, auto& map) {
     return true;
 }
 
+AnyWord& WordOf(Compressor::Parameters& parameters, const ParameterRow& row) {
+    return reinterpret_cast<AnyWord*>(&parameters)[row.word];
+}
+
 }  // namespace
 
 Compressor::Compressor()
-    : m_ui(std::make_unique<UserInterfaceSide>()),
+    : CorvoEffect(Table(), nullptr),
+      m_ui(std::make_unique<UserInterfaceSide>()),
       m_audio(std::make_unique<AudioSide>()),
       m_hand_over(std::make_unique<HandOver>()) {
     m_audio->current.settings = GetPresetData(kDefaultPreset);
@@ -146,10 +170,6 @@ Compressor::~Compressor() = default;
 bool Compressor::HasNativeEditor() { return true; }
 int Compressor::GetSettingsChunkSize() { return kChunkSize; }
 void Compressor::Cleanup() {}
-int Compressor::NumPresets() { return static_cast<int>(kCompressorPresets.size()); }
-int Compressor::GetParamCountReal() { return static_cast<int>(kRows.size()); }
-std::string Compressor::GetName() { return "Compressor"; }
-int Compressor::GetDefaultPreset() { return kDefaultPreset; }
 int Compressor::GetNumSidechainBusses() { return 1; }
 int Compressor::GetSidechainBusNumChannelsMax(int) { return 2; }
 bool Compressor::IsUsingSideChain() const { return m_hand_over->usingSideChain; }
@@ -159,11 +179,6 @@ bool Compressor::IsGainMeterOn() const { return m_hand_over->meterOn; }
 double Compressor::GetGainReduction(int channel) const {
     return channel == 0 || channel == 1 ? m_hand_over->displayGain[static_cast<std::size_t>(channel)].load()
                                         : 1.0f;
-}
-
-const MP_PARAMINFO* Compressor::GetParametersInfo() {
-    static const auto records = MakeNormalisedTable(kRows, 1);
-    return records.data();
 }
 
 EditChannelMode Compressor::GetEditChannelMode() const {
@@ -178,12 +193,11 @@ void Compressor::SetEditChannelMode(EditChannelMode mode) {
 
 void Compressor::SetParam(int index, float normalised, bool fromAutomation) {
     const int real = m_reverse_param_order ? GetParamCountReal() - index - 1 : index;
-    if (DoSetParam(real, normalised, fromAutomation && !m_reverse_param_order))
-        m_cook.store(true, std::memory_order_release);
+    if (DoSetParam(real, normalised, fromAutomation && !m_reverse_param_order)) MarkStale();
 }
 
 bool Compressor::DoSetParam(int index, float normalised, bool fromAutomation) {
-    if (!Has(index)) return false;
+    if (!RealRow(index)) return false;
     if (!fromAutomation) {
         SetParamFromUi(index, normalised, true);
         return true;
@@ -209,35 +223,21 @@ void Compressor::SetParamFromUi(int index, float normalised, bool submit) {
 }
 
 void Compressor::SetParamInternal(int index, float normalised, Parameters& parameters, CompMapStereo* map) {
-    if (!Has(index)) return;
-    const auto side = SideOf(index);
-    const auto word = MapOf(index).Word(normalised);
-    const bool on = normalised >= 0.5f;
+    const ParameterRow* const row = RealRow(index);
+    if (!row) return;
+    const auto word = row->storage.store(row->storage, normalised);
     CompMapStereo& curves = map ? *map : m_ui->edited.settings.map;
-    switch (PairOf(index)) {
-        case kAttack:
-        case kRelease:
-        case kOutGain:
-            (parameters.*kStored[PairOf(index)])[side] = word;
-            break;
-        case kThreshold:
-            curves.last_threshold = word;
-            AdjustThreshold(word, side, map);
-            ApplyRatioToMap(map);
-            break;
-        case kRatio:
-            curves.last_ratio_step = word;
-            AdjustRatio(word, side, map);
-            break;
-        case kStereoLink:
-            parameters.stereoLink = on;
-            break;
-        case kMakeUp:
-            parameters.makeUp = on;
-            break;
-        case kMonitor:
-            parameters.flags = on ? parameters.flags | kMonitorFlag : parameters.flags & ~kMonitorFlag;
-            break;
+    if (PairOf(index) == kThreshold) {
+        curves.last_threshold = static_cast<std::int32_t>(word);
+        AdjustThreshold(curves.last_threshold, SideOf(index), map);
+        ApplyRatioToMap(map);
+    } else if (PairOf(index) == kRatio) {
+        curves.last_ratio_step = static_cast<std::int32_t>(word);
+        AdjustRatio(curves.last_ratio_step, SideOf(index), map);
+    } else if (PairOf(index) == kMonitor) {
+        parameters.flags = (parameters.flags & ~kMonitorFlag) | static_cast<std::int32_t>(word);
+    } else {
+        WordOf(parameters, *row) = word;
     }
 }
 
@@ -264,95 +264,33 @@ void Compressor::ApplyRatioToMap(CompMapStereo* map) {
 }
 
 float Compressor::GetParam(int index) {
-    if (!Has(index)) return 0.0f;
+    const ParameterRow* const row = RealRow(index);
+    if (!row) return 0.0f;
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    const auto& [parameters, map] = m_ui->edited.settings;
-    const auto side = SideOf(index);
-    const auto& curve = map.m_comp_map[side];
-    std::int32_t word = 0;
-    switch (PairOf(index)) {
-        case kAttack:
-        case kRelease:
-        case kOutGain:
-            word = (parameters.*kStored[PairOf(index)])[side];
-            break;
-        case kThreshold:
-            word = map.last_threshold != kNotSet ? map.last_threshold : curve.ThresholdTenths();
-            break;
-        case kRatio:
-            word = map.last_ratio_step != kNotSet ? map.last_ratio_step : RatioStepOf(curve);
-            break;
-        case kStereoLink:
-            word = parameters.stereoLink;
-            break;
-        case kMakeUp:
-            word = parameters.makeUp;
-            break;
-        case kMonitor:
-            word = parameters.flags & kMonitorFlag;
-            break;
-    }
-    return MapOf(index).Normalised(word);
+    auto& [parameters, map] = m_ui->edited.settings;
+    const auto& curve = map.m_comp_map[SideOf(index)];
+    if (PairOf(index) == kThreshold)
+        return row->storage.map.Normalised(map.last_threshold != kNotSet ? map.last_threshold
+                                                                         : curve.ThresholdTenths());
+    if (PairOf(index) == kRatio)
+        return row->storage.map.Normalised(map.last_ratio_step != kNotSet ? map.last_ratio_step
+                                                                          : RatioStepOf(curve));
+    const auto word = WordOf(parameters, *row);
+    return row->storage.normalised(row->storage, PairOf(index) == kMonitor ? word & kMonitorFlag : word);
 }
 
 std::wstring Compressor::GetParameterFormattedText(int index, double value) {
-    if (!Has(index)) return {};
-    const auto word = MapOf(index).Word(static_cast<float>(value));
-    std::wstring text;
-    switch (PairOf(index)) {
-        case kAttack:
-            text = FormatFixed(word * 0.01, 2, 4);
-            break;
-        case kRelease:
-            text = FormatFixed(word * 0.01, 1, 4);
-            break;
-        case kOutGain:
-            text = FormatTenthsOfDb(word, kSilentOutGain);
-            break;
-        case kThreshold:
-        case kRatio: {
-            const std::lock_guard lock(m_ui->section);
-            ApplyEnvelopeToUi();
-            const auto canale = SideOf(index);
-            const auto& m_comp_map = m_ui->edited.settings.map.m_comp_map;
-            const auto* itThreshold = m_comp_map[canale].Threshold();
-            if (itThreshold == m_comp_map[canale].end())
-                ReportAssertion("Src/DSP/Effects/Compressor", "itThreshold!=m_comp_map[canale].end()");
-            text = PairOf(index) == kRatio
-                       ? RatioText(m_comp_map[canale])
-                       : FormatTenthsOfDb(m_comp_map[canale].ThresholdTenths(), kLowestThreshold);
-            break;
-        }
-        default:
-            text = FormatSwitch(value >= 0.5);
-    }
-    return WithUnit(text, kRows[static_cast<std::size_t>(index)].unit);
-}
-
-float Compressor::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Has(index)) return -1.0f;
-    const auto map = MapOf(index);
-    switch (PairOf(index)) {
-        case kAttack:
-        case kRelease: {
-            const float parsed = ParseNumber(text);
-            const float ms = parsed > 0.0f ? std::min(parsed, kLongestTime * 0.01f) : 0.0f;  // of NaN too
-            return map.Normalised(Hundredths(ms));
-        }
-        case kOutGain:
-            return map.Normalised(ParseTenthsOfDb(text, kSilentOutGain));
-        case kThreshold:
-            return map.Normalised(ParseTenthsOfDb(text, kLowestThreshold));
-        case kRatio:
-            return map.Normalised(RatioStepFromText(text));
-        default:
-            return ParseSwitch(text);
-    }
-}
-
-std::string Compressor::GetPresetName(int preset) {
-    return HasPreset(preset) ? kCompressorPresets[static_cast<std::size_t>(preset)].name : "";
+    const bool ofTheCurve = PairOf(index) == kThreshold || PairOf(index) == kRatio;
+    if (!RealRow(index) || !ofTheCurve) return CorvoEffect::GetParameterFormattedText(index, value);
+    const std::lock_guard lock(m_ui->section);
+    ApplyEnvelopeToUi();
+    const TransferCurve& curve = m_ui->edited.settings.map.m_comp_map[SideOf(index)];
+    if (curve.Threshold() == curve.end())
+        ReportAssertion("Src/DSP/Effects/Compressor", "itThreshold!=m_comp_map[canale].end()");
+    return WithUnit(PairOf(index) == kRatio ? RatioText(curve)
+                                            : FormatTenthsOfDb(curve.ThresholdTenths(), kLowestThreshold),
+                    kRows[static_cast<std::size_t>(index)].unit);
 }
 
 Compressor::Settings Compressor::GetPresetData(int preset) {
@@ -369,7 +307,7 @@ Compressor::Settings Compressor::GetPresetData(int preset) {
 }
 
 void Compressor::SetPreset(int preset) {
-    if (!HasPreset(preset)) return;
+    if (preset < 0 || preset >= NumPresets()) return;
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
     m_ui->preset = preset;
@@ -420,7 +358,7 @@ void Compressor::SubmitUiSettingsChange() {
     ++m_ui->edited.submission;
     m_hand_over->toAudio.Draft() = m_ui->edited;
     m_hand_over->toAudio.Publish();
-    m_cook.store(true, std::memory_order_release);
+    MarkStale();
 }
 
 void Compressor::ApplyEnvelopeToUi() {

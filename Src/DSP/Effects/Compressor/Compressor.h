@@ -79,20 +79,13 @@ public:
     // same three words. False, with nothing changed, below 16196 bytes.
     bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
     void Cleanup() override;
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;  // empty for a number out of range
-    void SetPreset(int preset) override;             // ignored for a number out of range
+    void SetPreset(int preset) override;
     std::wstring GetParameterFormattedText(int index, double value) override;
     float GetParam(int index) override;
-    int GetParamCountReal() override;
-    std::string GetName() override;
     void SetParam(int index, float normalised, bool fromAutomation) override;
-    int GetDefaultPreset() override;
     int GetNumSidechainBusses() override;
     int GetSidechainBusNumChannelsMax(int bus) override;
     void SetSidechainBuffer(int bus, double* const* channels) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    const MP_PARAMINFO* GetParametersInfo() override;
 
     // User-interface thread: stores one parameter and, with `submit`, hands the settings to the audio side.
     void SetParamFromUi(int index, float normalised, bool submit);

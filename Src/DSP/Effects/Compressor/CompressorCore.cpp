@@ -3,11 +3,7 @@
 #include <algorithm>
 #include <cmath>
 
-#include "DSP/Effects/Compressor/Compressor.h"
-#include "DSP/Effects/Compressor/CompressorSides.h"
-
-namespace Corvo::DSP {
-namespace CompressorPrivate {
+namespace Corvo::DSP::CompressorPrivate {
 
 int GlidingCurve::SegmentAt(double level, double factor) const {
     int i = 0;
@@ -77,39 +73,4 @@ void GlidingMap::Arrive() {
     framesLeft = 0;
 }
 
-}  // namespace CompressorPrivate
-
-using namespace CompressorPrivate;
-
-template <typename Sample, typename ParameterAccessor, typename GainAccessor>
-void Compressor::ProcessStereoLinked(Sample* output, const Sample* detectorRight, const Sample* detector,
-                                     int frames, int outputChannels, int detectorStride,
-                                     const GlidingMap& map, CoreState& state, ParameterAccessor& parameters,
-                                     GainAccessor gains) {
-    const LinkedFrame<Sample> frame{output, detector, detectorRight, outputChannels, detectorStride};
-    const auto second = static_cast<std::size_t>(outputChannels - 1);
-    RunCore(frame, frames, {0, second}, map, m_audio->coefficients, state, parameters, gains);
-}
-
-template <typename Sample, typename ParameterAccessor, typename GainAccessor>
-void Compressor::ProcessChannelMono(Sample* output, const Sample* detector, std::size_t channel, int frames,
-                                    int outputStride, int detectorStride, const GlidingMap& map,
-                                    CoreState& state, ParameterAccessor& parameters, GainAccessor gains) {
-    const ChannelFrame<Sample> frame{output, detector, outputStride, detectorStride};
-    RunCore(frame, frames, {channel, channel}, map, m_audio->coefficients, state, parameters, gains);
-}
-
-#define INSTANTIATE(Sample, Parameters, Gains)                                                          \
-    template void Compressor::ProcessStereoLinked(Sample*, const Sample*, const Sample*, int, int, int, \
-                                                  const GlidingMap&, CoreState&, Parameters&, Gains);   \
-    template void Compressor::ProcessChannelMono(Sample*, const Sample*, std::size_t, int, int, int,    \
-                                                 const GlidingMap&, CoreState&, Parameters&, Gains);
-#define INSTANTIATE_SAMPLE(Sample)                     \
-    INSTANTIATE(Sample, ParameterGetter, GainGetter)   \
-    INSTANTIATE(Sample, ParameterGetter, GainSmoother) \
-    INSTANTIATE(Sample, ParameterSmoother, GainGetter) \
-    INSTANTIATE(Sample, ParameterSmoother, GainSmoother)
-INSTANTIATE_SAMPLE(float)
-INSTANTIATE_SAMPLE(double)
-
-}  // namespace Corvo::DSP
+}  // namespace Corvo::DSP::CompressorPrivate

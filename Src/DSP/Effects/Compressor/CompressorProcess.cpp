@@ -33,11 +33,8 @@ void Compressor::TakeUiSettings() {
 }
 
 void Compressor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
-    auto& seen = m_audio->format;
-    const bool changed = seen.nSamplesPerSec != format->nSamplesPerSec ||
-                         seen.nChannels != format->nChannels || seen.wBitsPerSample != format->wBitsPerSample;
-    seen = *format;
-    if (m_cook.exchange(false, std::memory_order_acquire) || force || changed) InitState(force);
+    const bool otherWidth = format->wBitsPerSample != m_audio->format.wBitsPerSample;
+    if (TakeCook(m_audio->format, *format, force).due || otherWidth) InitState(force);
 }
 
 void Compressor::InitState(bool forced) {
@@ -103,6 +100,24 @@ void Compressor::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX
         WithSamples(buffer, *format, OtherWidths::Skip,
                     [&](auto* samples) { ProcessBlock(samples, frames, channels); });
     audio.sideChainChannels = 0;  // the buffers were this block's only
+}
+
+template <typename Sample, typename ParameterAccessor, typename GainAccessor>
+void Compressor::ProcessStereoLinked(Sample* output, const Sample* detectorRight, const Sample* detector,
+                                     int frames, int outputChannels, int detectorStride,
+                                     const GlidingMap& map, CoreState& state, ParameterAccessor& parameters,
+                                     GainAccessor gains) {
+    const LinkedFrame<Sample> frame{output, detector, detectorRight, outputChannels, detectorStride};
+    const auto second = static_cast<std::size_t>(outputChannels - 1);
+    RunCore(frame, frames, {0, second}, map, m_audio->coefficients, state, parameters, gains);
+}
+
+template <typename Sample, typename ParameterAccessor, typename GainAccessor>
+void Compressor::ProcessChannelMono(Sample* output, const Sample* detector, std::size_t channel, int frames,
+                                    int outputStride, int detectorStride, const GlidingMap& map,
+                                    CoreState& state, ParameterAccessor& parameters, GainAccessor gains) {
+    const ChannelFrame<Sample> frame{output, detector, outputStride, detectorStride};
+    RunCore(frame, frames, {channel, channel}, map, m_audio->coefficients, state, parameters, gains);
 }
 
 template <typename Sample>

@@ -43,19 +43,19 @@ int CorvoEffectBase::GetParamCountReal() { return m_table ? static_cast<int>(m_t
 
 bool CorvoEffectBase::DoSetParam(int index, float normalised, bool) {
     const ParameterRow* const row = RealRow(index);
-    if (!row) return false;
+    if (!row || !m_words) return false;
     __atomic_store_n(At(m_words, row->word), row->storage.store(row->storage, normalised), __ATOMIC_RELAXED);
     return true;
 }
 
 float CorvoEffectBase::GetParam(int index) {
     const ParameterRow* const row = RowOf(index);
-    return row ? row->storage.normalised(row->storage, Load(m_words, *row)) : 0.0f;
+    return row && m_words ? row->storage.normalised(row->storage, Load(m_words, *row)) : 0.0f;
 }
 
 float CorvoEffectBase::GetParamPlain(int index) const {
     const ParameterRow* const row = RealRow(index);
-    return row ? row->storage.plain(Load(m_words, *row)) : 0.0f;
+    return row && m_words ? row->storage.plain(Load(m_words, *row)) : 0.0f;
 }
 
 std::wstring CorvoEffectBase::GetParamName(int index) {
@@ -143,7 +143,7 @@ void CorvoEffectBase::SetPreset(int preset) { TakePreset(preset); }
 
 float CorvoEffectBase::GetParamFromProp(int index, int preset) {
     const ParameterRow* const row = RealRow(index);
-    const PresetRow* const settings = row ? m_table->Preset(preset) : nullptr;
+    const PresetRow* const settings = row && m_words ? m_table->Preset(preset) : nullptr;
     return settings ? row->storage.normalised(row->storage, settings->settings[row->word]) : -1.0f;
 }
 

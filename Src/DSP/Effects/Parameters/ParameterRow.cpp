@@ -65,6 +65,12 @@ float ReadChoice(const ParameterRow& row, const std::string& text) {
     return found < 0 ? -1.0f : choices[static_cast<std::size_t>(found)].value;
 }
 
+std::wstring OnOff(const ParameterRow& row, double normalised) {
+    return WithUnit(FormatSwitch(normalised >= 0.5), row.unit);
+}
+
+float ReadOnOff(const ParameterRow&, const std::string& text) { return ParseSwitch(text); }
+
 }  // namespace ParameterTexts
 
 }  // namespace Corvo::DSP

@@ -67,6 +67,12 @@ constexpr Storage RealWord(float span) {
             span};
 }
 
+// An integer that is 1 from the middle of the control up, else 0.
+constexpr Storage SwitchWord() {
+    return {[](const Storage&, float n) { return std::uint32_t{n >= 0.5f}; }, PlainOfInteger,
+            [](const Storage&, std::uint32_t word) { return word != 0 ? 1.0f : 0.0f; }};
+}
+
 // One entry of a list: its text, and the normalised value that chooses it.
 struct Choice {
     const char* text;
@@ -89,13 +95,16 @@ struct PlainRange {
     float minimum = 0.0f, maximum = 1.0f, neutral = 0.5f;
 };
 
+// For a parameter that is not one word of the settings.
+constexpr std::size_t kNoWord = SIZE_MAX;
+
 // One parameter. The texts live as long as the library.
 struct ParameterRow {
     const wchar_t *label, *unit;
     MP_TYPE type;
     Storage storage;
     Shown shown;
-    std::size_t word;  // which word of the settings record
+    std::size_t word = kNoWord;  // which word of the settings record
     int section = 0;
     PlainRange range{};
 };
@@ -124,6 +133,8 @@ float ReadInteger(const ParameterRow& row, const std::string& text);
 float ReadReal(const ParameterRow& row, const std::string& text);
 float ReadDecibels(const ParameterRow& row, const std::string& text);
 float ReadChoice(const ParameterRow& row, const std::string& text);
+std::wstring OnOff(const ParameterRow& row, double normalised);
+float ReadOnOff(const ParameterRow& row, const std::string& text);
 }  // namespace ParameterTexts
 
 // An integer times `step`, with so many decimals, then the unit.
@@ -142,5 +153,8 @@ constexpr Shown TenthsOfDb(std::int32_t silent) {
 constexpr Shown OneOf(std::span<const Choice> choices) {
     return {ParameterTexts::Choice, ParameterTexts::ReadChoice, 1.0, 0, 0, choices};
 }
+
+// "On" and "Off", then the unit.
+constexpr Shown OnOff() { return {ParameterTexts::OnOff, ParameterTexts::ReadOnOff}; }
 
 }  // namespace Corvo::DSP
