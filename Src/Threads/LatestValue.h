@@ -7,6 +7,9 @@ namespace Corvo::DSP {
 
 // Hands whole values from one writing thread to one reading thread. Three slots change hands through one
 // atomic index, so neither side waits, allocates or frees, and a value is never seen half written.
+//
+// Each slot belongs to one thread at a time, which may also change what is in it. A value that was replaced
+// comes back to the writer, so what it owns (a slot may hold a unique_ptr) is freed on the writer's thread.
 template <typename Value>
 class LatestValue {
 public:
@@ -17,13 +20,15 @@ public:
         m_draft = m_middle.exchange(m_draft | kFresh, std::memory_order_acq_rel) & kSlot;
     }
 
-    // Reader: the newest value, or null when none came since the last call. It stays as it is until the
+    // Reader: the newest value, or null when none came since the last call. It stays the reader's until the
     // next Take() that returns one.
-    const Value* Take() {
+    Value* Take() {
         if ((m_middle.load(std::memory_order_relaxed) & kFresh) == 0) return nullptr;
         m_taken = m_middle.exchange(m_taken, std::memory_order_acq_rel) & kSlot;
         return &m_slots[m_taken];
     }
+    // Reader: the value taken last; before the first one, a slot that the writer has not touched.
+    Value& Taken() { return m_slots[m_taken]; }
 
 private:
     static constexpr unsigned kSlot = 3, kFresh = 4;

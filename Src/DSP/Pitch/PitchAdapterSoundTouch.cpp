@@ -12,7 +12,7 @@
 namespace Corvo::DSP {
 namespace {
 
-constexpr int kMostChannels = 16;
+constexpr int kMostEngineChannels = 16;
 constexpr int kPrimingFrames = 28;
 constexpr int kFlushFrames = 128;
 // The engine can only be flushed by more input; far more than its longest sequence ends the attempt.
@@ -27,7 +27,7 @@ constexpr float kLowestSpeed = 0.01f, kHighestSpeed = 100.0f;
 // Blocks up to this size need no new memory, whatever their precision.
 constexpr std::size_t kScratchSamples = 16384;
 
-constexpr std::array<float, kFlushFrames * kMostChannels> kSilence{};
+constexpr std::array<float, kFlushFrames * kMostEngineChannels> kSilence{};
 
 std::size_t Samples(int frames, int channels) {
     return static_cast<std::size_t>(std::max(frames, 0)) * static_cast<std::size_t>(std::max(channels, 0));
@@ -38,6 +38,7 @@ std::size_t Samples(int frames, int channels) {
 PitchAdapterSoundTouch::PitchAdapterSoundTouch()
     : m_fadePosition(static_cast<std::int64_t>(static_cast<std::uint64_t>(ShortFaderNumSamples()) + 1)) {
     m_scratch.reserve(kScratchSamples);
+    TakeLatency();
 }
 PitchAdapterSoundTouch::~PitchAdapterSoundTouch() = default;
 
@@ -46,11 +47,16 @@ void PitchAdapterSoundTouch::Reset() {
     m_engine.clear();
     m_atRest = true;
     m_fadePosition = 0;
+    TakeLatency();
+}
+
+void PitchAdapterSoundTouch::TakeLatency() {
+    m_latency.store(m_engine.getSetting(SETTING_INITIAL_LATENCY), std::memory_order_relaxed);
 }
 
 // The engine takes 16 channels, but its anti-alias filter ends the process when it is given more than 15.
 void PitchAdapterSoundTouch::ApplyFilter() {
-    m_engine.setSetting(SETTING_USE_AA_FILTER, m_wantsFilter && m_engineChannels < kMostChannels);
+    m_engine.setSetting(SETTING_USE_AA_FILTER, m_wantsFilter && m_engineChannels < kMostEngineChannels);
 }
 
 void PitchAdapterSoundTouch::Put(const float* samples, int frames) {
@@ -77,6 +83,7 @@ void PitchAdapterSoundTouch::SetSampleRate(int rate) {
     Reset();
     m_rateSet = rate > 0;
     if (m_rateSet) m_engine.setSampleRate(static_cast<unsigned>(std::min(rate, kHighestRate)));
+    TakeLatency();
     Put(kSilence.data(), kPrimingFrames);
 }
 
@@ -88,6 +95,7 @@ void PitchAdapterSoundTouch::SetChannelsNum(int channels) {
     m_engine.setChannels(static_cast<unsigned>(channels));
     m_engineChannels = channels;
     ApplyFilter();
+    TakeLatency();
 }
 
 void PitchAdapterSoundTouch::SetPitchFactor(int channel, float factor) {
@@ -113,6 +121,7 @@ void PitchAdapterSoundTouch::SetQuality(int index) {
     ApplyFilter();
     m_engine.setSetting(SETTING_AA_FILTER_LENGTH, index <= 4 ? 32 : index == 5 ? 64 : 128);
     m_engine.setSetting(SETTING_USE_QUICKSEEK, index < 4);
+    TakeLatency();
 }
 
 void PitchAdapterSoundTouch::ProcessInPlace(float* buffer, int frames) {
@@ -193,6 +202,6 @@ void PitchAdapterSoundTouch::ReceiveSamples(double* buffer, int frames) {
     });
 }
 
-int PitchAdapterSoundTouch::GetLatency() { return m_engine.getSetting(SETTING_INITIAL_LATENCY); }
+int PitchAdapterSoundTouch::GetLatency() { return m_latency.load(std::memory_order_relaxed); }
 
 }  // namespace Corvo::DSP

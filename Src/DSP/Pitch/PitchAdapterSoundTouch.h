@@ -2,6 +2,7 @@
 
 #include <SoundTouch.h>
 
+#include <atomic>
 #include <vector>
 
 #include "DSP/Pitch/PitchAdapter.h"
@@ -36,6 +37,7 @@ public:
 
 private:
     void Reset();
+    void TakeLatency();
     void ApplyFilter();
     // The engine throws when it is given samples before it knows rate and channels.
     bool Ready() const { return m_rateSet && m_engineChannels > 0 && m_engineChannels == m_channels; }
@@ -55,6 +57,7 @@ private:
     bool m_rateSet = false;
     bool m_wantsFilter = true;
     std::int32_t m_engineChannels = 0;
+    std::atomic<int> m_latency;  // asked for without the lock
 };
 
 }  // namespace Corvo::DSP

@@ -14,7 +14,7 @@
 // (the change is kept instead of the value before, because P may be next to 1 and their difference would
 // drown in rounding), and the output j steps after a sample is
 //   d x [at j = 0] + sum of 2 Re(r p^j (1 - P*)) u + 2 Re(r p^j P*) c,
-// without any work for the steps that nobody reads.
+// computed for the output frames only.
 struct PolePairLowPass {
     static constexpr std::size_t kPairs = 5;
     static constexpr std::size_t kLanes = 2;  // every number stands here twice: two channels at once

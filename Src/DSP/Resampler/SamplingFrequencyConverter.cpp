@@ -228,7 +228,7 @@ int SamplingFrequencyConverter::InitConversionByFactors(int upFactor, int downFa
     return 1;
 }
 
-// The other channels keep what they hold, as hosts expect.
+// The other channels go on with what they hold.
 void SamplingFrequencyConverter::ClearFirstChannels() {
     for (int channel = 0; channel < 2; ++channel) {
         std::ranges::fill(inputHistory[channel], 0.0);

@@ -1,13 +1,14 @@
 #include "DSP/Effects/PitchShift/PitchShift.h"
 
 #include <cmath>
-#include <mutex>
 #include <new>
 
 #include "DSP/Effects/Parameters/FixedPoint.h"
 #include "DSP/Effects/Parameters/ParameterTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 #include "DSP/Effects/Parameters/SettingsChunk.h"
+#include "DSP/Pitch/PitchAdapter.h"
+#include "Threads/LatestValue.h"
 #include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
@@ -49,7 +50,7 @@ constexpr _transform_props RecordOf(std::int32_t pitch) {
 }
 
 constexpr int kChunkSize = 4 + static_cast<int>(sizeof(_transform_props));
-constexpr int kMostChannels = 16;  // of the "New" engine
+constexpr int kMostEngineChannels = 16;  // of the "New" back-end
 
 // Semitones of a ratio, and the way back to a normalised value, in the single precision of saved projects.
 constexpr float kSemitonesPerDecade = 39.863106f;
@@ -74,7 +75,66 @@ int BackEndIndex(const _transform_props& record) {
 
 }  // namespace
 
-PitchShift::PitchShift() = default;
+// The back-end in use, the one handed over, and the one that came back.
+struct PitchShift::BackEnds {
+    struct BackEnd {
+        std::unique_ptr<PitchAdapter> adapter;
+        int index = kNone;
+    };
+    static constexpr int kNone = -1;
+
+    LatestValue<BackEnd> slots;
+    // What the audio thread took, for the other thread to send pitch factors to. Only that thread frees
+    // back-ends, so what it reads here lives while it uses it.
+    std::atomic<PitchAdapter*> inUse{nullptr};
+    std::atomic<int> newest{kNone};  // index of the one in use, or of the one on its way
+    std::atomic<bool> factorsPending{false};
+    std::atomic<int> channels{1};
+    tWAVEFORMATEX format{};  // the audio thread's
+
+    // User-interface thread.
+    void HandOver(int index) {
+        if (newest.load() == index) return;
+        // The audio thread may have given the old one back without having named the new one yet.
+        auto* cameBack = slots.Draft().adapter.get();
+        inUse.compare_exchange_strong(cameBack, nullptr);
+        slots.Draft() = Make(index);
+        newest.store(index);
+        slots.Publish();
+    }
+    // No block is being processed.
+    void Clear() {
+        inUse.store(nullptr);
+        newest.store(kNone);
+        slots.Draft() = {};
+        slots.Taken() = {};
+        if (slots.Take()) slots.Taken() = {};
+    }
+
+    // Audio thread: looks for a new one. The index of the one then in use, kNone without any.
+    int Take() {
+        if (slots.Take()) NameTheOneInUse();
+        return slots.Taken().index;
+    }
+    PitchAdapter& Use(int index) {
+        BackEnd& taken = slots.Taken();
+        if (taken.index != index) {
+            int expected = taken.index;
+            newest.compare_exchange_strong(expected, index);  // not if another one is on its way
+            taken = Make(index);
+            NameTheOneInUse();
+        }
+        return *taken.adapter;
+    }
+
+private:
+    static BackEnd Make(int index) {
+        return {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(index)), index};
+    }
+    void NameTheOneInUse() { inUse.store(slots.Taken().adapter.get(), std::memory_order_release); }
+};
+
+PitchShift::PitchShift() : m_back_ends(std::make_unique<BackEnds>()) {}
 PitchShift::~PitchShift() = default;
 
 std::string PitchShift::GetName() { return "Pitch Shift"; }
@@ -123,12 +183,9 @@ float PitchShift::GetParamPlain(int index) const {
 bool PitchShift::DoSetParam(int index, float normalised, bool fromAutomation) {
     if (index == 0 || index == 1)
         StoreShared(m_record.pitch[static_cast<std::size_t>(index)], kPitch.Word(normalised));
-    // Automation runs on the audio thread, which may not wait.
-    std::unique_lock lock(m_lock, std::defer_lock);
-    if (fromAutomation ? lock.try_lock() : (lock.lock(), true))
-        CookPitchShift(Snapshot(m_record), m_channel_count);
-    else
-        m_factors_pending.store(true, std::memory_order_release);
+    // First the flag: a cook that read the record before this edit may send its factors after it.
+    m_back_ends->factorsPending.store(true, std::memory_order_release);
+    if (!fromAutomation) SendFactors();
     return false;
 }
 
@@ -169,96 +226,77 @@ bool PitchShift::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
 }
 
 void PitchShift::TakeRecord(const _transform_props& record) {
-    {
-        const std::lock_guard lock(m_lock);
-        const int wanted = BackEndIndex(record);
-        if (m_back_end.index != wanted && m_spare.index != wanted)
-            m_spare = {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(wanted)), wanted};
-        Assign(m_record, record);  // last: a cook that reads it finds the back-end ready
-    }
+    m_back_ends->HandOver(BackEndIndex(record));
+    Assign(m_record, record);  // last: a cook that reads it finds the back-end there
     m_cook.store(true, std::memory_order_release);
 }
 
-void PitchShift::Cleanup() {
-    const std::lock_guard lock(m_lock);
-    m_back_end = {};
-    m_spare = {};
-}
+void PitchShift::Cleanup() { m_back_ends->Clear(); }
 
 int PitchShift::GetLatency() {
-    const std::lock_guard lock(m_lock);
-    return m_back_end.adapter ? m_back_end.adapter->GetLatency() : 0;
+    PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_acquire);
+    return adapter ? adapter->GetLatency() : 0;
 }
 
 void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
-    const bool newFormat = format->nChannels != m_format.nChannels ||
-                           format->nSamplesPerSec != m_format.nSamplesPerSec || !m_back_end.adapter;
+    const tWAVEFORMATEX& before = m_back_ends->format;
+    const bool newFormat = format->nChannels != before.nChannels ||
+                           format->nSamplesPerSec != before.nSamplesPerSec || !m_back_ends->inUse.load();
     if (!m_cook.exchange(false, std::memory_order_acquire) && !force && !newFormat) return;
-    // Held from before the record is read: an edit in between would reach the back-end first and be
-    // overwritten.
-    std::unique_lock lock(m_lock, std::defer_lock);
-    if (force) lock.lock();
-    if ((force || lock.try_lock()) && InitState(Snapshot(m_record), format, force))
-        m_format = *format;
+    auto record = Snapshot(m_record);
+    // The back-end that came decides, never the record: one caught in mid-change may name another that is
+    // still being handed over, and its flag follows.
+    if (const int index = m_back_ends->Take(); index != BackEnds::kNone) record.backEnd = index;
+    if (InitState(record, format, force))
+        m_back_ends->format = *format;
     else
         m_cook.store(true, std::memory_order_release);  // the next block tries again
 }
 
-bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool force) {
-    std::unique_lock lock(m_lock, std::defer_lock);
-    if (force)
-        lock.lock();
-    else if (!lock.try_lock())
-        return false;
+bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool) {
     InitEnvelopes(true);
-    m_channel_count = format->nChannels;
+    const int channels = format->nChannels;
+    m_back_ends->channels.store(channels);
     try {
-        ConfigureBackEnd(record, format);
+        PitchAdapter& adapter = m_back_ends->Use(BackEndIndex(record));
+        if (channels < 1 || channels > kMostEngineChannels) return true;
+        adapter.SetChannelsNum(channels);
+        adapter.SetSampleRate(static_cast<int>(format->nSamplesPerSec));
+        CookPitchShift(record, channels);
+        adapter.SetFFTSize(record.fftSize);
+        adapter.SetQuality(record.quality);
+        adapter.CookFactors();
     } catch (const std::bad_alloc&) {
-        return false;  // the next block tries again
+        return false;
     }
     return true;
 }
 
-void PitchShift::ConfigureBackEnd(const _transform_props& record, const tWAVEFORMATEX* format) {
-    const int wanted = BackEndIndex(record);
-    if (m_back_end.index != wanted) std::swap(m_back_end, m_spare);
-    if (m_back_end.index != wanted)
-        m_back_end = {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(wanted)), wanted};
-    if (m_channel_count < 1 || m_channel_count > kMostChannels) return;
-
-    PitchAdapter& adapter = *m_back_end.adapter;
-    adapter.SetChannelsNum(m_channel_count);
-    adapter.SetSampleRate(static_cast<int>(format->nSamplesPerSec));
-    CookPitchShift(record, m_channel_count);
-    adapter.SetFFTSize(record.fftSize);
-    adapter.SetQuality(record.quality);
-    adapter.CookFactors();
-}
-
 void PitchShift::CookPitchShift(const _transform_props& record, int channels) {
-    m_factors = {Factor(record.pitch[0]), Factor(record.pitch[1])};
-    if (!m_back_end.adapter) return;
+    PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_acquire);
+    if (!adapter) return;
     for (int channel = 0; channel < std::min(channels, 2); ++channel)
-        m_back_end.adapter->SetPitchFactor(channel,
-                                           static_cast<float>(m_factors[static_cast<std::size_t>(channel)]));
+        adapter->SetPitchFactor(channel,
+                                static_cast<float>(Factor(record.pitch[static_cast<std::size_t>(channel)])));
 }
+
+void PitchShift::SendFactors() { CookPitchShift(Snapshot(m_record), m_back_ends->channels.load()); }
 
 void PitchShift::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (m_factors_pending.load(std::memory_order_relaxed)) {
-        const std::unique_lock lock(m_lock, std::try_to_lock);
-        if (lock && m_factors_pending.exchange(false, std::memory_order_acquire))
-            CookPitchShift(Snapshot(m_record), m_channel_count);
-    }
-    // A cook that has not come about yet leaves a back-end that knows other channels: skip the block.
-    if (frames < 1 || !m_back_end.adapter || m_channel_count != format->nChannels || m_channel_count < 1 ||
-        m_channel_count > kMostChannels)
+    if (m_back_ends->factorsPending.load(std::memory_order_relaxed) &&
+        m_back_ends->factorsPending.exchange(false, std::memory_order_acquire))
+        SendFactors();
+    PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_relaxed);
+    const int channels = m_back_ends->channels.load(std::memory_order_relaxed);
+    // A cook that failed leaves a back-end that knows other channels: skip the block.
+    if (frames < 1 || !adapter || channels != format->nChannels || channels < 1 ||
+        channels > kMostEngineChannels)
         return;
     if (format->wBitsPerSample == 64)
-        m_back_end.adapter->ProcessInPlace(buffer, frames);
+        adapter->ProcessInPlace(buffer, frames);
     else
-        m_back_end.adapter->ProcessInPlace(reinterpret_cast<float*>(buffer), frames);
+        adapter->ProcessInPlace(reinterpret_cast<float*>(buffer), frames);
 }
 
 }  // namespace Corvo::DSP

@@ -4,8 +4,6 @@
 #include <memory>
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
-#include "DSP/Pitch/PitchAdapter.h"
-#include "Platform/CriticalSection.h"
 
 namespace Corvo::DSP {
 
@@ -37,8 +35,9 @@ static_assert(sizeof(_transform_props) == 88);
 // pitch: load a preset or a chunk first.
 //
 // Threads: as in CorvoEffectBase. An edit reaches the back-end at once and, with "New", restarts it under the
-// back-end's own lock, which a block may wait for briefly; for the effect's lock the audio thread only tries.
-// Back-ends are made and freed on the user-interface side, but for the one a block makes after Cleanup.
+// back-end's own lock, which a block may wait for briefly; the effect itself has no lock. Back-ends are made
+// and freed on the user-interface thread, but for the one a block makes after Cleanup. Latency is asked for
+// on one of the two threads. Cleanup and InitProcessing are not called while a block is processed.
 class DSP_API PitchShift : public CorvoEffect {
 public:
     PitchShift();
@@ -72,8 +71,8 @@ public:
     float GetParamFromProp(int index, int preset) override;
     const MP_PARAMINFO* GetParametersInfo() override;
 
-    // Configures the back-end for the record and the format. False when another thread holds the back-end and
-    // `force` does not allow waiting for it.
+    // Configures the back-end that the record names for the format; it is made on the spot when another one
+    // is in use. Not while another thread edits. False without memory. `force` makes no difference.
     bool InitState(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format,
                    bool force);
     // Derives the pitch factors and sends them to the back-end, if there is one.
@@ -87,25 +86,14 @@ protected:
                          ProcessFlags& flags) override;
 
 private:
-    struct BackEnd {
-        std::unique_ptr<PitchAdapter> adapter;
-        int index = -1;
-    };
+    struct BackEnds;
 
-    void ConfigureBackEnd(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format);
-    // User-interface side: stores a record and has the back-end it asks for ready before the audio thread
-    // looks.
+    // User-interface side: stores a record and hands over the back-end it asks for.
     void TakeRecord(const PitchShiftPrivate::_transform_props& record);
+    void SendFactors();
 
     PitchShiftPrivate::_transform_props m_record{};  // shared between the threads
-    int m_channel_count = 1;
-    // Held to change either back-end and to send pitch factors. The audio thread only tries.
-    CriticalSection m_lock;
-    BackEnd m_back_end;
-    BackEnd m_spare;  // made for, or replaced by, the next or last one
-    std::array<double, 2> m_factors{};
-    std::atomic<bool> m_factors_pending{false};
-    tWAVEFORMATEX m_format{};
+    std::unique_ptr<BackEnds> m_back_ends;
 };
 
 }  // namespace Corvo::DSP

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <bit>
 #include <cmath>
+#include <utility>
 
 #include "DSP/Effects/Parameters/ParameterTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
@@ -11,6 +12,7 @@
 #include "DSP/Effects/Tube/TubePresets.h"
 #include "DSP/Effects/Tube/TubeRecentInput.h"
 #include "DSP/Parts/SampleDispatch.h"
+#include "Threads/LatestValue.h"
 #include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
@@ -72,8 +74,44 @@ float OversamplingFromNumber(float number) {
 
 }  // namespace
 
-TubeDistorsion::TubeDistorsion() : m_recent(std::make_unique<TubeRecentInput>()) {
-    for (auto& state : m_states) state = std::make_unique<TubeOversampling>();
+// What blocks are processed with. All of it is the audio thread's, but for the draft of the filters.
+struct TubeDistorsion::Processing {
+    LatestValue<TubeOversampling> filters;
+    VirtualTubeAmp amp;
+    TubeRecentInput recent;
+    TubeBuffer buffer;
+    tWAVEFORMATEX format{};
+    Values cooked{};
+
+    // Starts from silence.
+    void Clear(int factor) {
+        filters.Take();
+        filters.Taken().Clear(factor);
+        recent.Clear();
+    }
+
+    // Takes what was prepared, and comes to `factor` by itself where nobody prepared it: automation asks for
+    // it in the middle of a block.
+    void FollowFactor(int factor, int channels) {
+        const bool prepared = filters.Take() != nullptr;
+        auto& live = filters.Taken();
+        if (live.Factor() != factor)
+            live.Clear(factor);
+        else if (!prepared)
+            return;
+        auto warmUp = recent.Samples(channels);
+        live.Process(amp, buffer, warmUp.data(), TubeRecentInput::kFrames, channels);
+    }
+
+    template <typename Sample>
+    void Process(Sample* samples, int frames, int channels) {
+        amp.FilterTone(samples, frames, channels);
+        recent.Add(samples, frames, channels);
+        filters.Taken().Process(amp, buffer, samples, frames, channels);
+    }
+};
+
+TubeDistorsion::TubeDistorsion() : m_processing(std::make_unique<Processing>()) {
     SetPreset(GetDefaultPreset());
 }
 TubeDistorsion::~TubeDistorsion() = default;
@@ -115,10 +153,10 @@ int TubeDistorsion::GetLatency() {
     return factor == 1 ? 0 : static_cast<int>(std::lround(TubeOversampling::Delay(factor)));
 }
 
-bool TubeDistorsion::DoSetParam(int index, float normalised, bool) {
+bool TubeDistorsion::DoSetParam(int index, float normalised, bool fromAutomation) {
     if (!Has(index)) return false;
     StoreShared(m_params[static_cast<std::size_t>(index)], normalised);
-    if (static_cast<std::size_t>(index) == kOversamplingRight) PrepareOversampling();
+    if (static_cast<std::size_t>(index) == kOversamplingRight && !fromAutomation) PrepareOversampling();
     return true;
 }
 
@@ -193,82 +231,54 @@ void TubeDistorsion::InitializeXyEditingData(GenericUIData& data) {
     for (const auto& preset : kPresets) data.entries.push_back(TubePresets::kGroupNames[preset.group]);
 }
 
-TubeOversampling& TubeDistorsion::LiveState() { return *m_states[static_cast<std::size_t>(m_copies.Live())]; }
-
 void TubeDistorsion::PrepareOversampling() {
-    if (WantedFactor() == m_prepared_factor.load(std::memory_order_acquire)) return;
-    m_copies.Publish([this](int idle) {
-        const int factor = WantedFactor();
-        m_states[static_cast<std::size_t>(idle)]->Restart(factor);
-        m_prepared_factor.store(factor, std::memory_order_release);
-    });
+    const int factor = WantedFactor();
+    if (factor == m_prepared_factor) return;
+    m_prepared_factor = factor;
+    m_processing->filters.Draft().Clear(factor);
+    m_processing->filters.Publish();
 }
 
 void TubeDistorsion::SetMaximumFramesPerBuffer(int frames) { m_max_frames = frames; }
-
-void TubeDistorsion::AllocateBuffers() {
-    for (auto& state : m_states) state->AllocateBuffer(m_max_frames);
-}
-
-void TubeDistorsion::FreeBuffers() {
-    for (auto& state : m_states) state->FreeBuffer();
-}
+void TubeDistorsion::AllocateBuffers() { m_processing->buffer.Prepare(m_max_frames); }
+void TubeDistorsion::FreeBuffers() { m_processing->buffer.Free(); }
 
 void TubeDistorsion::Cleanup() {
     FreeBuffers();
-    LiveState().Restart(LiveState().Factor());
-    LiveState().amp.ClearMemories();
-    m_recent->Clear();
+    m_processing->Clear(WantedFactor());
+    m_processing->amp.ClearMemories();
 }
 
 void TubeDistorsion::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
+    const tWAVEFORMATEX before = std::exchange(m_processing->format, *format);
     const bool stale = m_cook.exchange(false, std::memory_order_acquire);
-    const bool fromSilence = force || format->nChannels != m_format.nChannels;
-    const bool otherRate = format->nSamplesPerSec != m_format.nSamplesPerSec;
-    m_format = *format;
+    const bool fromSilence = force || format->nChannels != before.nChannels;
     if (force) AllocateBuffers();
-    if (stale || fromSilence || otherRate) InitState(fromSilence);
+    if (stale || fromSilence || format->nSamplesPerSec != before.nSamplesPerSec) InitState(fromSilence);
 }
 
 void TubeDistorsion::InitState(bool fromSilence) {
     InitEnvelopes(true);
     const auto values = Snapshot(m_params);
-    // Edits from both threads at once may have left the preparing to each other.
-    PrepareOversampling();
-    TubeOversampling* live = &LiveState();
+    auto& amp = m_processing->amp;
     if (fromSilence) {
-        if (m_copies.Exchange()) live = &LiveState();
-        live->Restart(live->Factor());
-        live->amp.SetParameter(values, VirtualTubeAmp::kAllParameters);
-        m_recent->Clear();
+        m_processing->Clear(WantedFactor());
+        amp.SetParameter(values, VirtualTubeAmp::kAllParameters);
     }
     using Bits = std::array<std::uint32_t, std::tuple_size_v<Values>>;
-    const auto now = std::bit_cast<Bits>(values), before = std::bit_cast<Bits>(m_cooked);
+    const auto now = std::bit_cast<Bits>(values), before = std::bit_cast<Bits>(m_processing->cooked);
     for (std::size_t i = 0; i < now.size(); ++i)
-        if (now[i] != before[i]) live->amp.SetParameter(values, static_cast<int>(i));
-    m_cooked = values;
-}
-
-void TubeDistorsion::ExchangeCopies(int channels) {
-    const TubeOversampling& before = LiveState();
-    if (!m_copies.Exchange()) return;
-    TubeOversampling& live = LiveState();
-    live.amp = before.amp;
-    auto recent = m_recent->Samples(channels);
-    live.Shape(recent.data(), TubeRecentInput::kFrames, channels);
+        if (now[i] != before[i]) amp.SetParameter(values, static_cast<int>(i));
+    m_processing->cooked = values;
 }
 
 void TubeDistorsion::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     const int channels = format->nChannels;
     if (frames < 1 || channels < 1 || channels > MaxNumChannels) return;
-    ExchangeCopies(channels);
-    TubeOversampling& live = LiveState();
-    WithSamples(buffer, *format, OtherWidths::AreFloat, [&](auto* samples) {
-        live.amp.FilterTone(samples, frames, channels);
-        m_recent->Add(samples, frames, channels);
-        live.Shape(samples, frames, channels);
-    });
+    m_processing->FollowFactor(WantedFactor(), channels);
+    WithSamples(buffer, *format, OtherWidths::AreFloat,
+                [&](auto* samples) { m_processing->Process(samples, frames, channels); });
 }
 
 }  // namespace Corvo::DSP

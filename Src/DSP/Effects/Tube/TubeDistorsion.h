@@ -1,16 +1,11 @@
 #pragma once
 
-#include <array>
 #include <memory>
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
 #include "DSP/Effects/Tube/VirtualTubeAmp.h"
-#include "Threads/TwoCopies.h"
 
 namespace Corvo::DSP {
-
-class TubeOversampling;
-class TubeRecentInput;
 
 // Tube-style distortion, "Valvex" to the user: per side a low-pass of order 4, a boost and one of four
 // shaping functions, which may run at up to 16 times the stream's rate.
@@ -21,10 +16,10 @@ class TubeRecentInput;
 // Parameters are normalised, left and right in turn: 0 and 1 boost, 2 and 3 drive, 4 and 5 tone, 6 and 7
 // function, 8 and 9 oversampling. "Oversampling R" decides for both sides; the left one is kept and shown.
 //
-// Threads: parameters, presets and chunks belong to the user-interface thread. A new oversampling factor
-// is prepared in the copy of the processing state that is not in use, and the audio thread exchanges the
-// copies with its next block, without waiting and without a gap in the sound: the new filters first run
-// over the newest input. Cleanup and InitProcessing are not called while a block is processed.
+// Threads: parameters, presets and chunks belong to the user-interface thread, automation to the audio
+// thread. Filters for a new oversampling factor are prepared beside those in use, and the audio thread
+// exchanges them with its next block, without waiting and without a gap in the sound: the new filters first
+// run over the newest input. Cleanup and InitProcessing are not called while a block is processed.
 class DSP_API TubeDistorsion : public CorvoEffect {
 public:
     TubeDistorsion();
@@ -74,24 +69,17 @@ protected:
 
 private:
     using Values = VirtualTubeAmp::Values;
+    struct Processing;
 
-    TubeOversampling& LiveState();
     int WantedFactor() const;
     void ApplyValues(const Values& values);
     void PrepareOversampling();
     void InitState(bool fromSilence);
-    void ExchangeCopies(int channels);
 
     Values m_params{};  // shared between the threads
     int m_max_frames = 0;
-    TwoCopies m_copies;
-    std::array<std::unique_ptr<TubeOversampling>, 2> m_states;
-    std::atomic<int> m_prepared_factor{1};  // of the copy that was published last
-
-    // Audio thread.
-    tWAVEFORMATEX m_format{};
-    Values m_cooked{};
-    std::unique_ptr<TubeRecentInput> m_recent;
+    int m_prepared_factor = 1;  // the user-interface thread's: what it handed over last
+    std::unique_ptr<Processing> m_processing;
 };
 
 }  // namespace Corvo::DSP

@@ -10,7 +10,7 @@ namespace {
 
 // Filters of every factor, designed once for all instances.
 struct Designs {
-    std::array<SamplingFrequencyConverter, TubeOversampling::kLargestFactor + 1> up, down;
+    std::array<SamplingFrequencyConverter, TubeBuffer::kLargestFactor + 1> up, down;
 
     Designs() {
         for (const int factor : {2, 4, 8, 12, 16}) {
@@ -34,12 +34,26 @@ int Convert(SamplingFrequencyConverter& converter, int frames, void* in, void* o
 
 }  // namespace
 
+void TubeBuffer::Prepare(int maxFrames) {
+    constexpr std::size_t kPerFrame = kLargestFactor * kMaxChannels;
+    constexpr std::size_t kMost = std::numeric_limits<std::ptrdiff_t>::max() / sizeof(double) / kPerFrame;
+    const auto frames = std::min(static_cast<std::size_t>(std::max(maxFrames, 0)), kMost);
+    if (frames <= static_cast<std::size_t>(m_capacity)) return;
+    m_samples.reset(new (std::nothrow) double[frames * kPerFrame]);
+    m_capacity = m_samples ? static_cast<int>(frames) : 0;
+}
+
+void TubeBuffer::Free() {
+    m_samples.reset();
+    m_capacity = 0;
+}
+
 TubeOversampling::TubeOversampling() {
-    // Designs that live on, so that Restart never drops the last reference to one while audio runs.
-    m_up = AllDesigns().up[kLargestFactor];
-    m_up.Init(kMaxChannels);
-    m_down = AllDesigns().down[kLargestFactor];
-    m_down.Init(kMaxChannels);
+    // Designs that live on, so that Clear never drops the last reference to one while audio runs.
+    m_up = AllDesigns().up[TubeBuffer::kLargestFactor];
+    m_up.Init(TubeBuffer::kMaxChannels);
+    m_down = AllDesigns().down[TubeBuffer::kLargestFactor];
+    m_down.Init(TubeBuffer::kMaxChannels);
 }
 
 TubeOversampling::~TubeOversampling() {
@@ -47,21 +61,7 @@ TubeOversampling::~TubeOversampling() {
     m_down.FreeRings();
 }
 
-void TubeOversampling::AllocateBuffer(int maxFrames) {
-    constexpr std::size_t kPerFrame = kLargestFactor * kMaxChannels;
-    constexpr std::size_t kMost = std::numeric_limits<std::ptrdiff_t>::max() / sizeof(double) / kPerFrame;
-    const auto frames = std::min(static_cast<std::size_t>(std::max(maxFrames, 0)), kMost);
-    if (frames <= static_cast<std::size_t>(m_capacity)) return;
-    m_buffer.reset(new (std::nothrow) double[frames * kPerFrame]);
-    m_capacity = m_buffer ? static_cast<int>(frames) : 0;
-}
-
-void TubeOversampling::FreeBuffer() {
-    m_buffer.reset();
-    m_capacity = 0;
-}
-
-void TubeOversampling::Restart(int factor) {
+void TubeOversampling::Clear(int factor) {
     m_factor = factor;
     if (factor == 1) return;
     m_up.Restart(AllDesigns().up[static_cast<std::size_t>(factor)]);
@@ -74,14 +74,14 @@ double TubeOversampling::Delay(int factor) {
 }
 
 template <typename Sample>
-void TubeOversampling::Shape(Sample* samples, int frames, int channels) {
+void TubeOversampling::Process(const VirtualTubeAmp& amp, TubeBuffer& buffer, Sample* samples, int frames,
+                               int channels) {
     using In = std::conditional_t<std::is_same_v<Sample, float>, tipo_floatbit, tipo_doublebit>;
     using Out = std::conditional_t<std::is_same_v<Sample, float>, tipo_floatbit_outd, tipo_doublebit_outd>;
     if (m_factor == 1) return amp.Shape(samples, frames, channels);
-    double* const raised = m_buffer ? m_buffer.get() : m_reserve.data();
-    const int most = m_buffer ? m_capacity : kReserveFrames;
+    double* const raised = buffer.Samples();
     while (frames > 0) {
-        const int piece = std::min(frames, most);
+        const int piece = std::min(frames, buffer.Frames());
         const int raisedFrames = Convert<In, tipo_doublebit_outd>(m_up, piece, samples, raised, channels);
         amp.Shape(raised, raisedFrames, channels);
         Convert<tipo_doublebit, Out>(m_down, raisedFrames, raised, samples, channels);
@@ -90,7 +90,7 @@ void TubeOversampling::Shape(Sample* samples, int frames, int channels) {
     }
 }
 
-template void TubeOversampling::Shape(float*, int, int);
-template void TubeOversampling::Shape(double*, int, int);
+template void TubeOversampling::Process(const VirtualTubeAmp&, TubeBuffer&, float*, int, int);
+template void TubeOversampling::Process(const VirtualTubeAmp&, TubeBuffer&, double*, int, int);
 
 }  // namespace Corvo::DSP

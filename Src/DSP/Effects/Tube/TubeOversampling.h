@@ -9,43 +9,50 @@
 
 namespace Corvo::DSP {
 
-// One complete copy of what the tube distortion processes with: the amplifier, and the converters and
-// buffer for shaping at a multiple of the stream's rate. Memory is made by the constructor and by
-// AllocateBuffer, for the largest factor; nothing else allocates.
-class TubeOversampling {
+// Memory for blocks at the raised rate. Without any, they go through in short pieces.
+class TubeBuffer {
 public:
     static constexpr int kLargestFactor = 16, kMaxChannels = 2;
 
+    // For blocks of up to `maxFrames` of the stream, at any factor. Keeps what is larger already; without
+    // memory there is no buffer.
+    void Prepare(int maxFrames);
+    void Free();
+
+    double* Samples() { return m_samples ? m_samples.get() : m_reserve.data(); }
+    int Frames() const { return m_samples ? m_capacity : kReserveFrames; }  // of the stream
+
+private:
+    static constexpr int kReserveFrames = 16;
+
+    int m_capacity = 0;
+    std::unique_ptr<double[]> m_samples;
+    std::array<double, kReserveFrames * kLargestFactor * kMaxChannels> m_reserve{};
+};
+
+// The filters that take the stream up to a multiple of its rate and back. Their memory, for every factor, is
+// made by the constructor; nothing else allocates.
+class TubeOversampling {
+public:
     TubeOversampling();
     ~TubeOversampling();
     TubeOversampling(const TubeOversampling&) = delete;
     TubeOversampling& operator=(const TubeOversampling&) = delete;
 
-    // For blocks of up to `maxFrames`. Without it, or without memory, blocks go through in short pieces.
-    void AllocateBuffer(int maxFrames);
-    void FreeBuffer();
-
-    // Starts with silent filters at `factor`, one that the amplifier knows.
-    void Restart(int factor);
+    // Silent filters for `factor`, one that the amplifier knows.
+    void Clear(int factor);
     int Factor() const { return m_factor; }
 
-    // Shapes interleaved frames of one or two channels in place, at `factor` times their rate.
+    // Shapes interleaved frames of one or two channels in place, at the factor times their rate.
     template <typename Sample>
-    void Shape(Sample* samples, int frames, int channels);
+    void Process(const VirtualTubeAmp& amp, TubeBuffer& buffer, Sample* samples, int frames, int channels);
 
-    // What both converters delay low frequencies by, in frames of the stream.
+    // What both filters delay low frequencies by, in frames of the stream.
     static double Delay(int factor);
 
-    VirtualTubeAmp amp;
-
 private:
-    static constexpr int kReserveFrames = 16;  // pieces without a buffer
-
     int m_factor = 1;
     SamplingFrequencyConverter m_up, m_down;
-    int m_capacity = 0;  // in frames of the stream
-    std::unique_ptr<double[]> m_buffer;
-    std::array<double, kReserveFrames * kLargestFactor * kMaxChannels> m_reserve{};
 };
 
 }  // namespace Corvo::DSP

@@ -6,6 +6,7 @@
 #include <stdexcept>
 #include <thread>
 
+#include "DSP/Pitch/PitchAdapter.h"
 #include "Support/AudioThreadRules.h"
 #include "Support/EffectRun.h"
 
