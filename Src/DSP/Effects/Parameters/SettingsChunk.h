@@ -36,25 +36,9 @@ public:
         m_rest = enough ? m_rest.subspan(bytes) : std::span<const std::uint8_t>{};
         return enough;
     }
-    std::size_t Remaining() const { return m_rest.size(); }
 
 private:
     std::span<const std::uint8_t> m_rest;
-};
-
-// Reads 32-bit words of older layouts, in which each takes 8 bytes: the low half comes first and counts.
-class SpreadWordReader {
-public:
-    explicit SpreadWordReader(ChunkReader rest) : m_read(rest) {}
-
-    bool operator()(std::int32_t& word) { return m_read(word) && m_read.Skip(sizeof(word)); }
-    template <std::size_t N>
-    bool operator()(std::array<std::int32_t, N>& words) {
-        return std::ranges::all_of(words, [this](std::int32_t& word) { return (*this)(word); });
-    }
-
-private:
-    ChunkReader m_read;
 };
 
 // Writes from the start of `chunk`, which is first made exactly `size` bytes long (growth is zeroed).

@@ -3,10 +3,8 @@
 #include <cmath>
 #include <new>
 
-#include "DSP/Effects/Parameters/FixedPoint.h"
-#include "DSP/Effects/Parameters/ParameterTable.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
-#include "DSP/Effects/Parameters/SettingsChunk.h"
 #include "DSP/Pitch/PitchAdapter.h"
 #include "Threads/LatestValue.h"
 #include "Threads/SharedRecord.h"
@@ -16,16 +14,6 @@ namespace {
 
 using PitchShiftPrivate::_transform_props;
 
-struct Row {
-    const wchar_t *label, *unit;
-    MP_TYPE type;
-};
-
-constexpr std::array kRows{
-    Row{L"Pitch L", L"semitones", MPT_FLOAT},
-    Row{L"Pitch R", L"semitones", MPT_FLOAT},
-};
-constexpr FixedPoint kPitch{5990.0f, 10.0f};
 constexpr std::int32_t kUnchanged = 3000, kHighest = 6000;
 
 struct Preset {
@@ -39,7 +27,7 @@ constexpr std::array kPresets{
     Preset{"1 Octave Down", 1500},
 };
 
-constexpr _transform_props RecordOf(std::int32_t pitch) {
+constexpr _transform_props SettingsOf(std::int32_t pitch) {
     return {.pitch = {pitch, pitch},
             .carried2 = {1000, 1000},
             .quality = 4,
@@ -49,7 +37,6 @@ constexpr _transform_props RecordOf(std::int32_t pitch) {
             .backEnd = 1};
 }
 
-constexpr int kChunkSize = 4 + static_cast<int>(sizeof(_transform_props));
 constexpr int kMostEngineChannels = 16;  // of the "New" back-end
 
 // Semitones of a ratio, and the way back to a normalised value, in the single precision of saved projects.
@@ -58,9 +45,39 @@ constexpr float kDecadesPerSemitone = 0.025085853f;
 constexpr float kRatioPerWord = 0.00033333333f;
 constexpr float kUnityNormalised = 0.50083476f, kFloorNormalised = 0.0016694491f;
 
-bool VisitChunk(auto&& visit, auto& tag, auto& record) {
-    return visit(tag) && visit(record.pitch) && visit(record.carried2) && visit(record.quality) &&
-           visit(record.carried5) && visit(record.fftSize) && visit(record.carried7) && visit(record.backEnd);
+constexpr Shown kSemitones{
+    [](const ParameterRow& row, double value) {
+        const float ratio =
+            static_cast<float>(row.storage.map.Word(static_cast<float>(value))) * kRatioPerWord;
+        float semitones = kSemitonesPerDecade * std::log10(ratio);
+        if (semitones >= -0.01f && semitones <= 0.01f) semitones = 0.0f;
+        return WithUnit(FormatFixed(semitones, 1), row.unit) + L" - " + FormatFixed(ratio * 100.0f, 1) + L"%";
+    },
+    [](const ParameterRow&, const std::string& text) {
+        return std::pow(10.0f, ParseNumber(text) * kDecadesPerSemitone) * kUnityNormalised - kFloorNormalised;
+    }};
+
+// clang-format off
+constexpr std::array<ParameterRow, 2> kRows{{
+    // label      unit          type       span     floor   shown as    word of the settings
+    {L"Pitch L", L"semitones", MPT_FLOAT, {5990.0f, 10.0f}, kSemitones, WordAt(&_transform_props::pitch, 0)},
+    {L"Pitch R", L"semitones", MPT_FLOAT, {5990.0f, 10.0f}, kSemitones, WordAt(&_transform_props::pitch, 1)},
+}};
+// clang-format on
+
+const EffectTable& Table() {
+    static const EffectTable table = [] {
+        EffectTable made{.name = "Pitch Shift",
+                         .image = "builtinPitch.png",
+                         .icon = "BuiltinPlugins/PitchShift@3x.png",
+                         .rows = kRows,
+                         .chunk = {.words = 22, .wideWords = 22},
+                         .sectionLabel = SectionLabel::None};
+        for (const auto& preset : kPresets)
+            made.presets.push_back({preset.name, WordsOf(SettingsOf(preset.pitch))});
+        return made;
+    }();
+    return table;
 }
 
 // A record from a chunk may hold anything; beyond an octave up the engine would need more than real time.
@@ -134,101 +151,46 @@ private:
     void NameTheOneInUse() { inUse.store(slots.Taken().adapter.get(), std::memory_order_release); }
 };
 
-PitchShift::PitchShift() : m_back_ends(std::make_unique<BackEnds>()) {}
+PitchShift::PitchShift() : CorvoEffect(Table(), &m_record), m_back_ends(std::make_unique<BackEnds>()) {}
 PitchShift::~PitchShift() = default;
 
-std::string PitchShift::GetName() { return "Pitch Shift"; }
-std::string PitchShift::GetImage() { return "builtinPitch.png"; }
-std::string PitchShift::GetPluginIconPath() { return "BuiltinPlugins/PitchShift@3x.png"; }
-int PitchShift::GetParamCountReal() { return static_cast<int>(kRows.size()); }
 int PitchShift::SeparateLeftRightControls() { return 0; }
 bool PitchShift::AllowChangeParamFromInputBox(int) { return true; }
-int PitchShift::GetSettingsChunkSize() { return kChunkSize; }
-
-const MP_PARAMINFO* PitchShift::GetParametersInfo() {
-    static const auto records = MakeNormalisedTable(kRows, 1);
-    return records.data();
-}
-
-int PitchShift::NumPresets() { return static_cast<int>(kPresets.size()); }
-
-std::string PitchShift::GetPresetName(int preset) {
-    return preset >= 0 && preset < NumPresets() ? kPresets[static_cast<std::size_t>(preset)].name : "";
-}
 
 _transform_props PitchShift::GetPresetData(int preset) {
     const int last = static_cast<int>(kPresets.size()) - 1;
-    return RecordOf(kPresets[static_cast<std::size_t>(std::clamp(preset, 0, last))].pitch);
+    return SettingsOf(kPresets[static_cast<std::size_t>(std::clamp(preset, 0, last))].pitch);
 }
 
 void PitchShift::SetPreset(int preset) {
     if (preset >= 0 && preset < NumPresets()) TakeRecord(GetPresetData(preset));
 }
 
-float PitchShift::GetParamFromProp(int index, int preset) {
-    if (index < 0 || index > 1 || preset < 0 || preset >= NumPresets()) return -1.0f;
-    return kPitch.Normalised(GetPresetData(preset).pitch[static_cast<std::size_t>(index)]);
-}
-
-// The index is external: it stands for a pair, of which the left side is shown.
-float PitchShift::GetParam(int index) {
-    return index == 0 ? kPitch.Normalised(LoadShared(m_record.pitch[0])) : 0.0f;
-}
-
-float PitchShift::GetParamPlain(int index) const {
-    if (index != 0 && index != 1) return 0.0f;
-    return static_cast<float>(LoadShared(m_record.pitch[static_cast<std::size_t>(index)]));
-}
-
 bool PitchShift::DoSetParam(int index, float normalised, bool fromAutomation) {
-    if (index == 0 || index == 1)
-        StoreShared(m_record.pitch[static_cast<std::size_t>(index)], kPitch.Word(normalised));
+    CorvoEffect::DoSetParam(index, normalised, fromAutomation);
     // First the flag: a cook that read the record before this edit may send its factors after it.
     m_back_ends->factorsPending.store(true, std::memory_order_release);
     if (!fromAutomation) SendFactors();
     return false;
 }
 
-std::wstring PitchShift::GetParameterFormattedText(int index, double value) {
-    if (index != 0 && index != 1) return {};
-    const float ratio = static_cast<float>(kPitch.Word(static_cast<float>(value))) * kRatioPerWord;
-    float semitones = kSemitonesPerDecade * std::log10(ratio);
-    if (semitones >= -0.01f && semitones <= 0.01f) semitones = 0.0f;
-    return WithUnit(FormatFixed(semitones, 1), kRows[0].unit) + L" - " + FormatFixed(ratio * 100.0f, 1) +
-           L"%";
-}
-
-float PitchShift::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (index != 0 && index != 1) return -1.0f;
-    return std::pow(10.0f, ParseNumber(text) * kDecadesPerSemitone) * kUnityNormalised - kFloorNormalised;
-}
-
-void PitchShift::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    auto record = Snapshot(m_record);
-    VisitChunk(ChunkWriter(chunk, kChunkSize), m_chunk_tag, record);
-}
-
 void PitchShift::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    std::int32_t tag = 0;
-    _transform_props record{};
-    if (!VisitChunk(ChunkReader(chunk), tag, record)) return;
-    m_chunk_tag = tag;
-    TakeRecord(record);
+    SettingsWords words;
+    if (Table().chunk.Read(chunk, m_chunk_tag, words)) TakeRecord(RecordOf<_transform_props>(words));
 }
 
 bool PitchShift::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    ChunkReader reader(chunk);
-    const auto wide = [&](std::int32_t& word) { return reader(word) && reader.Skip(4); };
-    std::array<std::int32_t, sizeof(_transform_props) / 4> words;
-    if (!reader.Skip(4) || !std::ranges::all_of(words, wide)) return false;
-    TakeRecord(std::bit_cast<_transform_props>(words));
+    SettingsWords words;
+    std::int32_t unused;
+    if (!Table().chunk.ReadWide(chunk, unused, words)) return false;
+    TakeRecord(RecordOf<_transform_props>(words));
     return true;
 }
 
 void PitchShift::TakeRecord(const _transform_props& record) {
     m_back_ends->HandOver(BackEndIndex(record));
     Assign(m_record, record);  // last: a cook that reads it finds the back-end there
-    m_cook.store(true, std::memory_order_release);
+    MarkStale();
 }
 
 void PitchShift::Cleanup() { m_back_ends->Clear(); }
@@ -250,7 +212,7 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     if (InitState(record, format, force))
         m_back_ends->format = *format;
     else
-        m_cook.store(true, std::memory_order_release);  // the next block tries again
+        MarkStale();  // the next block tries again
 }
 
 bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool) {

@@ -38,6 +38,8 @@ static_assert(sizeof(_transform_props) == 88);
 // back-end's own lock, which a block may wait for briefly; the effect itself has no lock. Back-ends are made
 // and freed on the user-interface thread, but for the one a block makes after Cleanup. Latency is asked for
 // on one of the two threads. Cleanup and InitProcessing are not called while a block is processed.
+//
+// Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API PitchShift : public CorvoEffect {
 public:
     PitchShift();
@@ -45,31 +47,14 @@ public:
 
     int GetLatency() override;  // of the back-end; 0 without one
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 92 bytes: the tag, then 22 words.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    // A chunk below 92 bytes is ignored.
     void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
-    // The oldest layout, in which each word takes 8 bytes: 180 bytes. False, with nothing changed, when there
-    // are fewer.
+    // As the base does, but for the tag, which is left alone.
     bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
     // Frees the back-end; the next cook or block makes a new one.
     void Cleanup() override;
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
     void SetPreset(int preset) override;
-    std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParam(int index) override;
-    float GetParamPlain(int index) const override;
-    int GetParamCountReal() override;
-    std::string GetName() override;
-    std::string GetImage() override;
     int SeparateLeftRightControls() override;
     bool AllowChangeParamFromInputBox(int index) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    std::string GetPluginIconPath() override;
-    float GetParamFromProp(int index, int preset) override;
-    const MP_PARAMINFO* GetParametersInfo() override;
 
     // Configures the back-end that the record names for the format; it is made on the spot when another one
     // is in use. Not while another thread edits. False without memory. `force` makes no difference.

@@ -3,11 +3,9 @@
 #include <algorithm>
 #include <bit>
 #include <cmath>
-#include <utility>
 
-#include "DSP/Effects/Parameters/ParameterTable.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
-#include "DSP/Effects/Parameters/SettingsChunk.h"
 #include "DSP/Effects/Tube/TubeOversampling.h"
 #include "DSP/Effects/Tube/TubePresets.h"
 #include "DSP/Effects/Tube/TubeRecentInput.h"
@@ -18,58 +16,99 @@
 namespace Corvo::DSP {
 namespace {
 
-using TubePresets::kPresets;
+// Values are stored as they come.
+constexpr Storage kAsItComes{[](const Storage&, float n) { return std::bit_cast<std::uint32_t>(n); },
+                             PlainOfReal,
+                             [](const Storage&, std::uint32_t word) { return Limited(PlainOfReal(word)); }};
 
-struct Row {
-    const wchar_t *label, *unit;
-    MP_TYPE type;
-    std::array<const wchar_t*, 4> words;  // for the quarters of the control
-};
+// A percentage with a word for the quarter it is in, "Weak | 33"; the word follows the number shown, so that
+// a text read back shows the same word.
+template <const std::array<const char*, 4>& kQuarters>
+constexpr Shown Quarters() {
+    return {[](const ParameterRow&, double value) {
+                const auto percent = std::lround(Limited(static_cast<float>(value)) * 100.0);
+                return Widen(kQuarters[static_cast<std::size_t>(std::min(percent / 25, 3l))]) + L" | " +
+                       FormatInteger(percent);
+            },
+            [](const ParameterRow&, const std::string& text) {
+                const auto bar = text.find('|');
+                return Limited(ParseNumber(bar == text.npos ? text : text.substr(bar + 1)) / 100.0f);
+            }};
+}
+constexpr std::array kBoosts{"None", "Weak", "Tiny", "Strong"}, kDrives{"Easy", "Fast", "Angry", "Furious"},
+    kTones{"Obscure", "Cloudy", "Bright", "Holy"};
 
+constexpr std::array<Choice, 4> kFunctions{
+    {{"Martens", 0.125f}, {"Doidic S.", 0.375f}, {"Doidic A.", 0.625f}, {"Araya-S.", 0.875f}}};
+constexpr Shown kFunctionShown{[](const ParameterRow&, double value) {
+                                   const int function =
+                                       VirtualTubeAmp::FunctionIndex(static_cast<float>(value));
+                                   return Widen(kFunctions[static_cast<std::size_t>(function)].text);
+                               },
+                               ParameterTexts::ReadChoice,
+                               1.0,
+                               0,
+                               0,
+                               kFunctions};
+
+constexpr std::array<Choice, 6> kFactors{
+    {{"1", 0.0f}, {"2", 0.24f}, {"4", 0.48f}, {"8", 0.64f}, {"12", 0.76f}, {"16", 0.9f}}};
+// A number typed that is none of 2, 4, 8 and 12 is the highest factor, 1 too.
+float ReadFactor(const ParameterRow&, const std::string& text) {
+    const float number = ParseNumber(text);
+    for (const auto& choice : std::span(kFactors).subspan(1))
+        if (number == ParseNumber(choice.text)) return choice.value;
+    return kFactors.back().value;
+}
+constexpr Shown kFactorShown{[](const ParameterRow& row, double value) {
+                                 const int factor =
+                                     VirtualTubeAmp::OversamplingFactor(static_cast<float>(value));
+                                 return WithUnit(FormatInteger(factor), row.unit);
+                             },
+                             ReadFactor,
+                             1.0,
+                             0,
+                             0,
+                             kFactors};
+
+constexpr std::size_t kOversamplingRight = 9;
 // clang-format off
-constexpr std::array<Row, VirtualTubeAmp::kParameters> kRows{{
-    {L"Boost L",        L"Amount ", MPT_FLOAT, {L"None", L"Weak", L"Tiny", L"Strong"}},
-    {L"Boost R",        L"Amount ", MPT_FLOAT, {L"None", L"Weak", L"Tiny", L"Strong"}},
-    {L"Drive L",        L"Amount ", MPT_FLOAT, {L"Easy", L"Fast", L"Angry", L"Furious"}},
-    {L"Drive R",        L"Amount ", MPT_FLOAT, {L"Easy", L"Fast", L"Angry", L"Furious"}},
-    {L"Tone L",         L" ",       MPT_FLOAT, {L"Obscure", L"Cloudy", L"Bright", L"Holy"}},
-    {L"Tone R",         L" ",       MPT_FLOAT, {L"Obscure", L"Cloudy", L"Bright", L"Holy"}},
-    {L"Function L",     L"Type",    MPT_ENUM,  {L"Martens", L"Doidic S.", L"Doidic A.", L"Araya-S."}},
-    {L"Function R",     L"Type",    MPT_ENUM,  {L"Martens", L"Doidic S.", L"Doidic A.", L"Araya-S."}},
-    {L"Oversampling L", L"x ",      MPT_ENUM,  {}},
-    {L"Oversampling R", L"x ",      MPT_ENUM,  {}},
+constexpr std::array<ParameterRow, VirtualTubeAmp::kParameters> kRows{{
+    // label             unit        type       kept as     shown as              word
+    {L"Boost L",         L"Amount ", MPT_FLOAT, kAsItComes, Quarters<kBoosts>(),  0},
+    {L"Boost R",         L"Amount ", MPT_FLOAT, kAsItComes, Quarters<kBoosts>(),  1},
+    {L"Drive L",         L"Amount ", MPT_FLOAT, kAsItComes, Quarters<kDrives>(),  2},
+    {L"Drive R",         L"Amount ", MPT_FLOAT, kAsItComes, Quarters<kDrives>(),  3},
+    {L"Tone L",          L" ",       MPT_FLOAT, kAsItComes, Quarters<kTones>(),   4},
+    {L"Tone R",          L" ",       MPT_FLOAT, kAsItComes, Quarters<kTones>(),   5},
+    {L"Function L",      L"Type",    MPT_ENUM,  kAsItComes, kFunctionShown,       6},
+    {L"Function R",      L"Type",    MPT_ENUM,  kAsItComes, kFunctionShown,       7},
+    {L"Oversampling L",  L"x ",      MPT_ENUM,  kAsItComes, kFactorShown,         8},
+    {L"Oversampling R",  L"x ",      MPT_ENUM,  kAsItComes, kFactorShown,         kOversamplingRight},
 }};
 // clang-format on
 
-constexpr int kFunctionLeft = 6, kOversamplingLeft = 8;
-constexpr std::size_t kOversamplingRight = 9;
-constexpr int kChunkSize = 4 + VirtualTubeAmp::kParameters * 4;
-
-bool Has(int index) { return index >= 0 && index < static_cast<int>(kRows.size()); }
-bool HasPreset(int preset) { return preset >= 0 && preset < static_cast<int>(kPresets.size()); }
-const Row& RowAt(int index) { return kRows[static_cast<std::size_t>(index)]; }
-float Limited(float normalised) { return normalised > 0.0f ? std::min(normalised, 1.0f) : 0.0f; }
-
-VirtualTubeAmp::Values PresetValues(int preset) {
-    VirtualTubeAmp::Values values;
-    for (std::size_t i = 0; i < values.size(); ++i)
-        values[i] = kPresets[static_cast<std::size_t>(preset)].values[i / 2];
-    return values;
+EffectTable MakeTable() {
+    EffectTable table{.name = "Valvex",
+                      .image = "builtinTube.png",
+                      .icon = "BuiltinPlugins/valvex.png",
+                      .rows = kRows,
+                      .chunk = {.words = kRows.size()},
+                      .sectionLabel = SectionLabel::WithoutSide};
+    for (const auto& preset : TubePresets::kPresets) {
+        VirtualTubeAmp::Values values;
+        for (std::size_t i = 0; i < values.size(); ++i) values[i] = preset.values[i / 2];
+        table.presets.push_back({preset.name, WordsOf(values)});
+        table.padNames.emplace_back(TubePresets::kGroupNames[preset.group]);
+    }
+    // Boost against drive, for each kind of preset.
+    for (const auto* group : TubePresets::kGroupNames) table.pads.push_back({group, {0, 1}, {2, 3}});
+    return table;
 }
 
-// "Weak | 33" and "33" both mean 33 percent.
-float Percent(std::string_view text) {
-    const auto bar = text.find('|');
-    return ParseNumber(bar == text.npos ? text : text.substr(bar + 1)) / 100.0f;
-}
-
-float OversamplingFromNumber(float number) {
-    constexpr struct {
-        float factor, value;
-    } kTyped[] = {{2.0f, 0.24f}, {4.0f, 0.48f}, {8.0f, 0.64f}, {12.0f, 0.76f}};
-    for (const auto& typed : kTyped)
-        if (number == typed.factor) return typed.value;
-    return 0.9f;
+const EffectTable& Table() {
+    static const EffectTable table = MakeTable();
+    return table;
 }
 
 }  // namespace
@@ -111,38 +150,13 @@ struct TubeDistorsion::Processing {
     }
 };
 
-TubeDistorsion::TubeDistorsion() : m_processing(std::make_unique<Processing>()) {
+TubeDistorsion::TubeDistorsion()
+    : CorvoEffect(Table(), &m_params), m_processing(std::make_unique<Processing>()) {
     SetPreset(GetDefaultPreset());
 }
 TubeDistorsion::~TubeDistorsion() = default;
 
-int TubeDistorsion::GetSettingsChunkSize() { return kChunkSize; }
-int TubeDistorsion::NumPresets() { return static_cast<int>(kPresets.size()); }
-int TubeDistorsion::GetParamCountReal() { return static_cast<int>(kRows.size()); }
-std::string TubeDistorsion::GetName() { return "Valvex"; }
-bool TubeDistorsion::WantsXySerialization() { return true; }
-std::string TubeDistorsion::GetImage() { return "builtinTube.png"; }
-std::string TubeDistorsion::GetPluginIconPath() { return "BuiltinPlugins/valvex.png"; }
-bool TubeDistorsion::AllowChangeParamFromInputBox(int index) { return Has(index); }
-
-const MP_PARAMINFO* TubeDistorsion::GetParametersInfo() {
-    static const auto records = MakeNormalisedTable(kRows, 1);
-    return records.data();
-}
-
-std::string TubeDistorsion::GetPresetName(int preset) {
-    return HasPreset(preset) ? kPresets[static_cast<std::size_t>(preset)].name : std::string();
-}
-
-float TubeDistorsion::GetParamFromProp(int index, int preset) {
-    return Has(index) && HasPreset(preset) ? PresetValues(preset)[static_cast<std::size_t>(index)] : -1.0f;
-}
-
-float TubeDistorsion::GetParamPlain(int index) const {
-    return Has(index) ? LoadShared(m_params[static_cast<std::size_t>(index)]) : 0.0f;
-}
-
-float TubeDistorsion::GetParam(int index) { return Limited(GetParamPlain(index)); }
+bool TubeDistorsion::AllowChangeParamFromInputBox(int index) { return RealRow(index) != nullptr; }
 
 int TubeDistorsion::WantedFactor() const {
     return VirtualTubeAmp::OversamplingFactor(LoadShared(m_params[kOversamplingRight]));
@@ -154,81 +168,17 @@ int TubeDistorsion::GetLatency() {
 }
 
 bool TubeDistorsion::DoSetParam(int index, float normalised, bool fromAutomation) {
-    if (!Has(index)) return false;
-    StoreShared(m_params[static_cast<std::size_t>(index)], normalised);
-    if (static_cast<std::size_t>(index) == kOversamplingRight && !fromAutomation) PrepareOversampling();
-    return true;
-}
-
-void TubeDistorsion::ApplyValues(const Values& values) {
-    Assign(m_params, values);
-    PrepareOversampling();
-    m_cook.store(true, std::memory_order_release);
+    const bool stored = CorvoEffect::DoSetParam(index, normalised, fromAutomation);
+    if (index == static_cast<int>(kOversamplingRight) && !fromAutomation) PrepareOversampling();
+    return stored;
 }
 
 void TubeDistorsion::SetPreset(int preset) {
-    if (HasPreset(preset)) ApplyValues(PresetValues(preset));
-}
-
-void TubeDistorsion::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
-    ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && write(Snapshot(m_params));
+    if (TakePreset(preset)) PrepareOversampling();
 }
 
 void TubeDistorsion::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    ChunkReader read(chunk);
-    std::int32_t tag;
-    Values values;
-    if (!read(tag) || !read(values)) return;
-    m_chunk_tag = tag;
-    ApplyValues(values);
-}
-
-std::wstring TubeDistorsion::GetParameterFormattedText(int index, double value) {
-    if (!Has(index)) return {};
-    const Row& row = RowAt(index);
-    const float normalised = Limited(static_cast<float>(value));
-    if (index >= kOversamplingLeft)
-        return WithUnit(FormatInteger(VirtualTubeAmp::OversamplingFactor(normalised)), row.unit);
-    if (index >= kFunctionLeft)
-        return row.words[static_cast<std::size_t>(VirtualTubeAmp::FunctionIndex(normalised))];
-    // The word follows the number shown, so that a text read back shows the same word.
-    const auto percent = std::lround(static_cast<double>(normalised) * 100.0);
-    return row.words[static_cast<std::size_t>(std::min(percent / 25, 3l))] + std::wstring(L" | ") +
-           FormatInteger(percent);
-}
-
-float TubeDistorsion::GetParamValueNormalizedFromText(int index, std::string text) {
-    if (!Has(index)) return -1.0f;
-    if (index >= kOversamplingLeft) return OversamplingFromNumber(ParseNumber(text));
-    if (index < kFunctionLeft) return Limited(Percent(text));
-    const auto names = GetParameterAvailableValues(index);
-    const std::vector<std::string_view> views(names.begin(), names.end());
-    const int found = FindName(text, views);
-    return found < 0 ? -1.0f : (static_cast<float>(found) + 0.5f) / static_cast<float>(views.size());
-}
-
-std::vector<std::string> TubeDistorsion::GetParameterAvailableValues(int index) {
-    if (!Has(index) || index < kFunctionLeft) return {};
-    if (index >= kOversamplingLeft) return {"1", "2", "4", "8", "12", "16"};
-    std::vector<std::string> names;
-    for (const wchar_t* word : RowAt(index).words) names.push_back(Narrow(word));
-    return names;
-}
-
-void TubeDistorsion::GetParamSectionInfo(int index, PluginParameterInfo& info) {
-    if (!Has(index)) return;
-    info = {};
-    info.param_index = index;
-    info.values = GetParameterAvailableValues(index);
-    info.label = Narrow(GetParamName(index));
-}
-
-void TubeDistorsion::InitializeXyEditingData(GenericUIData& data) {
-    data = {};
-    for (std::size_t i = 0; i < TubePresets::kGroupNames.size(); ++i)
-        data.groups.push_back(MakeGroup(TubePresets::kGroupNames[i], static_cast<int>(i), {0, 1}, {2, 3}));
-    for (const auto& preset : kPresets) data.entries.push_back(TubePresets::kGroupNames[preset.group]);
+    if (TakeChunk(chunk, m_chunk_tag)) PrepareOversampling();
 }
 
 void TubeDistorsion::PrepareOversampling() {
@@ -250,11 +200,10 @@ void TubeDistorsion::Cleanup() {
 }
 
 void TubeDistorsion::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
-    const tWAVEFORMATEX before = std::exchange(m_processing->format, *format);
-    const bool stale = m_cook.exchange(false, std::memory_order_acquire);
-    const bool fromSilence = force || format->nChannels != before.nChannels;
+    const bool fromSilence = force || format->nChannels != m_processing->format.nChannels;
+    const auto cook = TakeCook(m_processing->format, *format, force);
     if (force) AllocateBuffers();
-    if (stale || fromSilence || format->nSamplesPerSec != before.nSamplesPerSec) InitState(fromSilence);
+    if (cook.due) InitState(fromSilence);
 }
 
 void TubeDistorsion::InitState(bool fromSilence) {

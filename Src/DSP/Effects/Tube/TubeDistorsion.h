@@ -20,6 +20,10 @@ namespace Corvo::DSP {
 // thread. Filters for a new oversampling factor are prepared beside those in use, and the audio thread
 // exchanges them with its next block, without waiting and without a gap in the sound: the new filters first
 // run over the newest input. Cleanup and InitProcessing are not called while a block is processed.
+//
+// Settings chunk: 44 bytes, the leading word and the ten values as floats. They are stored as they come; out
+// of range, drive, function and oversampling act like the nearest end, a boost like none, and the tone
+// follows its formula.
 class DSP_API TubeDistorsion : public CorvoEffect {
 public:
     TubeDistorsion();
@@ -30,33 +34,11 @@ public:
     void SetMaximumFramesPerBuffer(int frames) override;
     // With force: makes the buffers and starts from silence.
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
-    // 44 bytes: the leading word and the ten values as floats.
-    void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
-    int GetSettingsChunkSize() override;
-    // A chunk below 44 bytes is ignored. Values are stored as they come; out of range, drive, function and
-    // oversampling act like the nearest end, a boost like none, and the tone follows its formula.
     void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
     // Clears the filters and frees the buffers; until the next InitProcessing blocks take longer.
     void Cleanup() override;
-    int NumPresets() override;
-    std::string GetPresetName(int preset) override;
     void SetPreset(int preset) override;
-    std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParam(int index) override;
-    float GetParamPlain(int index) const override;  // normalised, as it is stored
-    int GetParamCountReal() override;
-    std::string GetName() override;
-    bool WantsXySerialization() override;
-    std::string GetImage() override;
-    std::vector<std::string> GetParameterAvailableValues(int index) override;
     bool AllowChangeParamFromInputBox(int index) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
-    void GetParamSectionInfo(int index, PluginParameterInfo& info) override;
-    std::string GetPluginIconPath() override;
-    // One group of boost against drive per kind of preset; the entries are the presets' groups.
-    void InitializeXyEditingData(GenericUIData& data) override;
-    float GetParamFromProp(int index, int preset) override;
-    const MP_PARAMINFO* GetParametersInfo() override;
 
     // The memory for oversampled blocks of the largest size announced. InitProcessing and Cleanup call them.
     void AllocateBuffers();
@@ -72,7 +54,6 @@ private:
     struct Processing;
 
     int WantedFactor() const;
-    void ApplyValues(const Values& values);
     void PrepareOversampling();
     void InitState(bool fromSilence);
 

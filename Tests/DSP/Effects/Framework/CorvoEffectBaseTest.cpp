@@ -6,7 +6,6 @@
 #include <tuple>
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
-#include "DSP/Effects/Parameters/ParameterTable.h"
 #include "Support/Signals.h"
 #include "Support/VirtualSlot.h"
 
@@ -14,6 +13,13 @@ using namespace Corvo::DSP;
 using TestSupport::Slot;
 
 namespace {
+
+MP_PARAMINFO ParameterRecord(std::wstring_view label, std::wstring_view unit, MP_TYPE type) {
+    MP_PARAMINFO record{type, 0, 0.0f, 1.0f, 0.5f, {}, {}};
+    std::ranges::copy(label.substr(0, 31), record.szLabel);
+    std::ranges::copy(unit, record.szUnitText);
+    return record;
+}
 
 // Makes the protected members reachable and records what reaches the effect.
 class Probe : public CorvoEffect {
@@ -243,14 +249,13 @@ TEST(CorvoEffect, NamesAndTypesParametersFromItsTable) {
     };
     for (const auto& c : cases) {
         Probe probe(1);
-        probe.records[0] = MakeParamInfo(c.label, L"unit", c.type, 0, 0.0f, 1.0f, 0.5f);
+        probe.records[0] = ParameterRecord(c.label, L"unit", c.type);
         EXPECT_EQ(probe.GetParamName(0), c.name);
         EXPECT_EQ(probe.GetParamUnitsText(0), L"unit");
         EXPECT_EQ(probe.GetParameterTypeAutomatable(0), c.shown) << c.type;
     }
     Probe probe(8);
-    for (std::size_t i = 0; i < 8; ++i)
-        probe.records[i] = MakeParamInfo(std::to_wstring(i), L"", MPT_INT, 0, 0.0f, 1.0f, 0.5f);
+    for (std::size_t i = 0; i < 8; ++i) probe.records[i] = ParameterRecord(std::to_wstring(i), L"", MPT_INT);
     probe.paired = true;
     EXPECT_EQ(probe.GetParamName(3), L"6");
     probe.m_reverse_param_order = true;
