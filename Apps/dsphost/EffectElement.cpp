@@ -153,44 +153,10 @@ void EffectElement::Process(double* samples, int frames, std::int64_t time) {
                       frames, m_format, flags);
 }
 
-// Asks a copy how long one pass of its delay line rings: that is how far apart its echoes can be. It runs at
-// a rate so low that the effects which do not know cost nothing either.
-double EffectElement::LongestGap() {
-    constexpr int kRate = 1000, kFrames = 256;
-    constexpr std::int64_t kLongest = 60 * kRate;
-    tWAVEFORMATEX format = m_format;
-    format.nSamplesPerSec = kRate;
-    const auto probe = CopyEffect(m_factory, *m_effect);
-    std::vector<double> silence(static_cast<std::size_t>(kFrames) * format.nChannels);
-    ProcessFlags flags;
-    probe->InitProcessing(kFrames, &format);
-    probe->RequestTailRestart();
-    probe->StartTail(kLongest);
-    std::int64_t produced = 0;
-    do {
-        std::ranges::fill(silence, 0.0);
-        probe->Process(silence.data(), kFrames, &format, flags);
-        produced += probe->TailFramesProduced();
-    } while (!probe->TailFinished() && produced < kLongest);
-    return produced < kLongest ? static_cast<double>(produced) / kRate : 0.0;
-}
-
-// An effect that plays envelopes says so at the first block that applies a segment.
-bool EffectElement::PlaysAutomation() {
-    const auto probe = m_factory();
-    tWAVEFORMATEX format{3, 2, 48000, 48000 * 8, 8, 32, 0};
-    constexpr int kFrames = 16;
-    std::array<float, 2 * kFrames> silence{};
-    const auto segment = Jump({0, probe->GetParam(0)});
-    probe->InitProcessing(kFrames, &format);
-    probe->AddEnvelope(0, 1, &segment);
-    ProcessFlags flags;
-    probe->Process(reinterpret_cast<double*>(silence.data()), kFrames, &format, flags);
-    return flags.params_changed;
-}
+double EffectElement::LongestGap() { return m_effect->LongestGap(); }
 
 std::vector<int> EffectElement::AutomationLanes(std::string_view parameter) {
-    if (!PlaysAutomation()) throw UserError(m_name + " plays no automation");
+    if (!m_effect->PlaysAutomation()) throw UserError(m_name + " plays no automation");
     std::vector<int> lanes;
     for (const auto* found : FindParameters(m_parameters, parameter, m_name)) lanes.push_back(found->index);
     return lanes;

@@ -33,7 +33,6 @@ private:
     void ChoosePreset(std::string_view name);
     void LoadChunk(const std::string& path);
     void SetParameter(std::string_view label, std::string_view text);
-    bool PlaysAutomation();
 
     EffectFactory m_factory;
     std::unique_ptr<Effect> m_effect;

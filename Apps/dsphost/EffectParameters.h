@@ -9,16 +9,8 @@
 namespace dsphost {
 
 // One parameter as a person names it.
-struct EffectParameter {
-    int index = 0;      // external: what SetParam takes
-    std::string label;  // with its side, " L" or " R", where it has one
-    std::string unit;
-    Corvo::EffectParameterType type{};
-    std::vector<std::string> values;  // the choices of a list
-    float neutral = 0.5f;             // normalised
-
-    // The label without its side.
-    std::string_view Stem() const;
+struct EffectParameter : Corvo::DSP::ParameterDescription {
+    int index = 0;  // external: what SetParam takes
 };
 
 // A new instance in the state it should start from: its default preset where it has presets.

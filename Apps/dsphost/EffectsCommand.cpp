@@ -49,6 +49,13 @@ std::vector<std::string> Presets(Effect& effect) {
     return names;
 }
 
+std::vector<std::string> ListTexts(const EffectParameter& parameter) {
+    std::vector<std::string> texts;
+    if (parameter.type == EffectParameterType::List)
+        for (const auto& choice : parameter.choices) texts.push_back(choice.text);
+    return texts;
+}
+
 Json Describe(EffectFactory factory) {
     const auto effect = Prepared(factory);
     Json parameters = Json::array();
@@ -59,7 +66,7 @@ Json Describe(EffectFactory factory) {
                               {"type", TypeName(parameter.type)},
                               {"default", effect->GetParam(parameter.index)},
                               {"text", CurrentText(*effect, parameter)},
-                              {"values", parameter.values}});
+                              {"values", ListTexts(parameter)}});
     return {{"name", effect->GetName()},
             {"latency", effect->GetLatency()},
             {"default_preset", effect->GetDefaultPreset()},
@@ -106,8 +113,8 @@ std::string Explain(EffectFactory factory) {
     std::string text = effect->GetName() + ", latency " + std::to_string(effect->GetLatency()) +
                        " frames at 48 kHz\n\n" + Table(rows);
     for (const auto& parameter : DescribeParameters(factory))
-        if (!parameter.values.empty())
-            text += "\n  " + parameter.label + ": " + Joined(parameter.values, ", ");
+        if (const auto texts = ListTexts(parameter); !texts.empty())
+            text += "\n  " + parameter.label + ": " + Joined(texts, ", ");
     const auto presets = Presets(*effect);
     text += presets.empty() ? "\nNo presets.\n" : "\nPresets (* is where a new instance starts):\n";
     for (std::size_t i = 0; i < presets.size(); ++i) {

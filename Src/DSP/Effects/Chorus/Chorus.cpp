@@ -109,6 +109,11 @@ bool Chorus::InitState(const Props& settings, bool reset) {
         if (side.channel < channels) frames = std::max(frames, side.base + 2 * side.amplitude);
     }
     m_ring_length = frames * channels;
+    m_longest_gap = 0.0;
+    for (const auto& side : *m_sides)
+        if (side.channel < channels)
+            m_longest_gap =
+                std::max(m_longest_gap, static_cast<double>(side.base / channels) / static_cast<double>(hz));
     for (std::size_t i = 0; i < 2; ++i) {
         auto& side = (*m_sides)[i];
         if (reset) side.oscillator.SetPhase(0.0);

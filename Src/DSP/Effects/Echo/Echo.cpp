@@ -160,7 +160,14 @@ bool Echo::InitState(bool reset) {
         const double ms = std::min(DelayMs(settings.mode, settings.depth[i]), longest);
         lengths[i] = static_cast<int>(std::max(ms * hz * 0.001, static_cast<double>(kShortestDelay)));
     }
-    return LayRing(lengths, reset);
+    if (!LayRing(lengths, reset)) return false;
+    m_longest_gap = std::ranges::max(PassFrames()) / std::max(hz, 1.0);
+    return true;
+}
+
+// The frames of one pass of the ring on each side.
+std::array<int, 2> Echo::PassFrames() const {
+    return Sides() == 2 ? std::array{m_lengths[0] / 2, m_lengths[1] / 2} : std::array{m_lengths[0], 0};
 }
 
 bool Echo::LayRing(std::array<int, 2> lengths, bool reset) {
@@ -204,9 +211,7 @@ void Echo::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* form
     const bool restart = m_tail.TakeRestart();
     if (restart) m_lines[0].position = m_lines[1].position = 0;
     // Until the tail begins, a whole pass of the ring is left to ring out.
-    if (restart || !m_tail.TailMode())
-        m_tail_left =
-            Sides() == 2 ? std::array{m_lengths[0] / 2, m_lengths[1] / 2} : std::array{m_lengths[0], 0};
+    if (restart || !m_tail.TailMode()) m_tail_left = PassFrames();
     const auto allowed = m_tail.Limit(frames, m_tail_left);
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&](auto* samples) { Run(samples, allowed); });
 }

@@ -85,6 +85,7 @@ protected:
 private:
     int Sides() const;
     bool InitState(bool reset);
+    std::array<int, 2> PassFrames() const;
     bool LayRing(std::array<int, 2> lengths, bool reset);
     double DelayMs(std::int32_t mode, std::int32_t depth) const;
     void SetMode(std::int32_t mode);
