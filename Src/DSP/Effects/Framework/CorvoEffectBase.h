@@ -53,80 +53,130 @@ public:
 protected:
     // Storing one parameter and processing one block: what an effect is made of.
 
-    // Stores real parameter `index` from its normalised value; true when derived state became stale.
+    // Stores real parameter `index` from its normalised value; true when derived state became stale. Called
+    // on the user-interface thread, and for automation on the audio thread, where it neither allocates nor
+    // waits.
     virtual bool DoSetParam(int index, float normalised, bool fromAutomation) = 0;
-    // Processes one interleaved block in place.
+    // Processes one interleaved block in place, `frames` of `format`; 0 frames are left alone. Audio thread.
     virtual void ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
                                  ProcessFlags& flags) = 0;
-    // Processes one planar block in place; an effect that does not support those leaves it unchanged.
+    // Processes one planar block in place; an effect that does not support those leaves it unchanged. Audio
+    // thread.
     virtual void ProcessInternalNoninterleaved(double* const* channels, int frames,
                                                const tWAVEFORMATEX* format, ProcessFlags& flags);
 
 public:
-    // What the effect is.
+    // What the effect is. Any thread, at no cost, unless said otherwise; the answers do not change unless
+    // said.
+
+    // False: left and right are always set together. Decides what SeparateLeftRightControls says.
     virtual bool HasSeparateLeftRightSettings();
-    virtual int GetLatency();  // in samples
+    // In frames at the format of InitProcessing: how much later the output is than the input. May change with
+    // parameters; ask after InitProcessing and after edits, on the user-interface thread.
+    virtual int GetLatency();
+    // True: both output channels carry the same signal, whatever comes in.
     virtual bool IsCollapsingToMono();
+    // True: the host shows an editor made for this effect instead of its generic one.
     virtual bool HasNativeEditor();
-    virtual void SetEditor(BuiltinEditor* editor);  // not owned
+    // The host's editor of this instance, or null. Not owned. User-interface thread.
+    virtual void SetEditor(BuiltinEditor* editor);
+    // False: the host hands over interleaved blocks only.
     virtual bool SupportsNoninterleaved();
 
     // Preparation.
+
+    // The largest block to come. InitProcessing calls it first; an effect only takes note of it here.
     virtual void SetMaximumFramesPerBuffer(int frames);
 
+    // No block is being processed and none follows.
     virtual ~CorvoEffectBase();
 
     // Re-derives coefficients when they are stale, `force` is set, or the format is not the last one seen.
+    // With `force`, from InitProcessing, it also makes all memory and starts afresh; then it may allocate and
+    // no block is being processed. Without, it runs in front of every block on the audio thread.
     virtual void CheckCookProperties(const tWAVEFORMATEX* format, bool force);
 
-    // State: the settings chunk is a fixed little-endian layout of GetSettingsChunkSize() bytes.
+    // State, on the user-interface thread: the settings chunk is a fixed little-endian layout of
+    // GetSettingsChunkSize() bytes.
+
+    // Makes `chunk` exactly that long and writes it.
     virtual void GetSettingsChunk(std::vector<std::uint8_t>& chunk);
     virtual int GetSettingsChunkSize();
+    // Takes a chunk as a whole, or leaves everything as it was when it is too short for any layout the effect
+    // had. Bytes after the layout are not read. What the values mean is limited where they are used.
     virtual void SetSettingsChunk(const std::vector<std::uint8_t>& chunk);
-    virtual void Cleanup();  // clears delay lines, filters and detectors
+    // Clears delay lines, filters and detectors, and frees what they use; InitProcessing follows before the
+    // next block. No block is being processed.
+    virtual void Cleanup();
 
-    // Presets, numbered from 0.
+    // Presets, numbered from 0. A number out of range has no name and changes nothing. User-interface thread.
     virtual int NumPresets();
     virtual std::string GetPresetName(int preset);
     virtual void SetPreset(int preset);
 
-    // Parameters.
+    // Parameters, on the user-interface thread.
+
+    // What a control shows at a normalised value, unit included. Empty for an index the effect does not have.
     virtual std::wstring GetParameterFormattedText(int index, double value);  // external index
-    virtual std::wstring GetParamName(int index);                             // external index
-    virtual std::wstring GetParamUnitsText(int index);                        // external index
-    virtual float GetParam(int index) = 0;                                    // 0..1
-    virtual float GetParamPlain(int index) const;                             // real index, own units
+    // Without the side of a pair.
+    virtual std::wstring GetParamName(int index);       // external index
+    virtual std::wstring GetParamUnitsText(int index);  // external index
+    // The value last set, 0..1; setting it again changes nothing. 0 for an index the effect does not have.
+    virtual float GetParam(int index) = 0;  // external index
+    // As the effect keeps it, in its own units.
+    virtual float GetParamPlain(int index) const;  // real index
     virtual int GetParamCountReal() = 0;
+    // As the host shows it; different for every effect.
     virtual std::string GetName() = 0;
+    // True for pitch correction only, which the host offers under a name of its own.
     virtual bool IsCantrix();
-    // Stores the normalised value of an external parameter, both sides of it where it is a pair.
+    // Stores the normalised value of an external parameter, both sides of it where it is a pair. Automation
+    // calls it on the audio thread.
     virtual void SetParam(int index, float normalised, bool fromAutomation);
     virtual int GetParamCount();
     virtual EffectParameterType GetParameterTypeAutomatable(int index);  // external index
 
-    // Presentation and side-chain.
+    // Presentation and side-chain, on the user-interface thread.
+
+    // The preset that a new instance starts from.
     virtual int GetDefaultPreset();
+    // True: the host keeps its XY editor's state with the effect; see InitializeXyEditingData.
     virtual bool WantsXySerialization();
+    // True: the effect processes one channel only.
     virtual bool IsMono() const;
+    // The file name of the picture that the host shows for the effect; empty: none.
     virtual std::string GetImage();
     virtual int GetNumSidechainBusses();
     virtual int GetSidechainBusNumChannelsMax(int bus);
     // The buffers of the next block on side-chain `bus`: planar, one per channel announced, in the
-    // block's own precision. Not owned; read by that block only.
+    // block's own precision. Not owned; read by that block only. Audio thread.
     virtual void SetSidechainBuffer(int bus, double* const* channels);
+    // The texts of a list's choices, in order; empty for everything else.
     virtual std::vector<std::string> GetParameterAvailableValues(int index);  // external index
     // 0 when left and right are joined to one external parameter.
     virtual int SeparateLeftRightControls();
+    // True: the host lets its user type a value, which GetParamValueNormalizedFromText reads.
     virtual bool AllowChangeParamFromInputBox(int index);  // external index
-    // Parses what GetParameterFormattedText shows; -1 when the effect does not understand text. Effects
-    // that parse numbers throw std::invalid_argument or std::out_of_range for text that holds none.
+    // Parses what GetParameterFormattedText shows, limited to 0..1; -1 when the effect does not understand
+    // the text. Effects that parse numbers throw std::invalid_argument or std::out_of_range for text that
+    // holds none.
     virtual float GetParamValueNormalizedFromText(int index, std::string text);  // external index
-    virtual int GetPreferredNumColumnsForTab() const;                            // -1: no preference
-    virtual void GetParamSectionInfo(int index, PluginParameterInfo& info);
+    // Columns of the generic editor's tab; -1: no preference.
+    virtual int GetPreferredNumColumnsForTab() const;
+    // How the generic editor lays out one parameter. `info` is left alone by effects that leave that to the
+    // host. The layout may change with the format: see WantsUpdateUiFromScratch.
+    virtual void GetParamSectionInfo(int index, PluginParameterInfo& info);  // external index
+    // Titles of the generic editor's sections, which PluginParameterInfo::layout_group numbers; empty: one
+    // section without a title.
     virtual std::vector<std::string> GetParamUiSections();
+    // The icon's path within the host's resources; empty: none.
     virtual std::string GetPluginIconPath();
     virtual PluginGenericUILookAndFeel GetLookAndFeel();
+    // Between blocks, when the host starts to play from another place: effects with a delay line clear it,
+    // all others do nothing. `reset` is the host's word for whether the stream begins anew; no effect needs
+    // it.
     virtual void InitResetProcessingLight(bool reset);
+    // Fills the pads of the host's XY editor; `data` is left alone by effects without pads.
     virtual void InitializeXyEditingData(GenericUIData& data);
     // Normalised value of real parameter `index` in a preset; -1 without preset data.
     virtual float GetParamFromProp(int index, int preset);
