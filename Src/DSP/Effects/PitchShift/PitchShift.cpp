@@ -168,10 +168,8 @@ void PitchShift::SetPreset(int preset) {
 
 bool PitchShift::DoSetParam(int index, float normalised, bool fromAutomation) {
     CorvoEffect::DoSetParam(index, normalised, fromAutomation);
-    // First the flag: a cook that read the record before this edit may send its factors after it.
     m_back_ends->factorsPending.store(true, std::memory_order_release);
-    if (!fromAutomation) SendFactors();
-    return false;
+    return false;  // the next block sends the factors; the rest of the back-end stays as it is
 }
 
 void PitchShift::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
@@ -205,6 +203,8 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const bool newFormat = format->nChannels != before.nChannels ||
                            format->nSamplesPerSec != before.nSamplesPerSec || !m_back_ends->inUse.load();
     if (!m_cook.exchange(false, std::memory_order_acquire) && !force && !newFormat) return;
+    // Lowered before the record is read: an edit after that raises it again.
+    m_back_ends->factorsPending.exchange(false, std::memory_order_acquire);
     auto record = Snapshot(m_record);
     // The back-end that came decides, never the record: one caught in mid-change may name another that is
     // still being handed over, and its flag follows.
@@ -242,13 +242,10 @@ void PitchShift::CookPitchShift(const _transform_props& record, int channels) {
                                 static_cast<float>(Factor(record.pitch[static_cast<std::size_t>(channel)])));
 }
 
-void PitchShift::SendFactors() { CookPitchShift(Snapshot(m_record), m_back_ends->channels.load()); }
-
 void PitchShift::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (m_back_ends->factorsPending.load(std::memory_order_relaxed) &&
-        m_back_ends->factorsPending.exchange(false, std::memory_order_acquire))
-        SendFactors();
+    if (m_back_ends->factorsPending.exchange(false, std::memory_order_acquire))
+        CookPitchShift(Snapshot(m_record), m_back_ends->channels.load());
     PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_relaxed);
     const int channels = m_back_ends->channels.load(std::memory_order_relaxed);
     // A cook that failed leaves a back-end that knows other channels: skip the block.

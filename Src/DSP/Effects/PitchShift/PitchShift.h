@@ -34,10 +34,10 @@ static_assert(sizeof(_transform_props) == 88);
 // Left and right are one external parameter, "Pitch". A new instance has an empty record, at the lowest
 // pitch: load a preset or a chunk first.
 //
-// Threads: as in CorvoEffectBase. An edit reaches the back-end at once and, with "New", restarts it under the
-// back-end's own lock, which a block may wait for briefly; the effect itself has no lock. Back-ends are made
-// and freed on the user-interface thread, but for the one a block makes after Cleanup. Latency is asked for
-// on one of the two threads. Cleanup and InitProcessing are not called while a block is processed.
+// Threads: as in CorvoEffectBase. An edit reaches the back-end with the next block, once, and restarts the
+// one called "New". The effect itself has no lock. Back-ends are made and freed on the user-interface thread,
+// but for the one a block makes after Cleanup. Latency is asked for on one of the two threads. Cleanup and
+// InitProcessing are not called while a block is processed.
 //
 // Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API PitchShift : public CorvoEffect {
@@ -75,7 +75,6 @@ private:
 
     // User-interface side: stores a record and hands over the back-end it asks for.
     void TakeRecord(const PitchShiftPrivate::_transform_props& record);
-    void SendFactors();
 
     PitchShiftPrivate::_transform_props m_record{};  // shared between the threads
     std::unique_ptr<BackEnds> m_back_ends;
