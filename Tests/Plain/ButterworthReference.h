@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <complex>
 #include <cstddef>
 #include <numbers>
 #include <vector>
@@ -54,10 +55,14 @@ inline std::vector<double> Convert(const std::vector<double>& input, int up, int
     return output;
 }
 
-// The low-pass's magnitude at a fraction of the raised rate.
-inline double ButterworthMagnitude(double frequency, double cutoff) {
+// The analogue low-pass at what a fraction of the raised rate stands for: its ten poles lie on the left half
+// of the unit circle.
+inline std::complex<double> ButterworthResponse(double frequency, double cutoff) {
     using std::numbers::pi;
-    return 1.0 / std::sqrt(1.0 + std::pow(std::tan(pi * frequency) / std::tan(pi * cutoff), 20.0));
+    const std::complex<double> s(0.0, std::tan(pi * frequency) / std::tan(pi * cutoff));
+    std::complex<double> response = 1.0;
+    for (int k = 0; k < 10; ++k) response /= s - std::polar(1.0, pi * (11 + 2 * k) / 20);
+    return response;
 }
 
 }  // namespace Plain

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <memory>
 #include <thread>
 
 using Corvo::DSP::LatestValue;
@@ -14,24 +15,30 @@ TEST(LatestValue, GivesTheNewestOnce) {
         slot.Draft() = value;
         slot.Publish();
     }
-    const int* taken = slot.Take();
-    ASSERT_NE(taken, nullptr);
-    EXPECT_EQ(*taken, 3);
+    ASSERT_NE(slot.Take(), nullptr);
+    EXPECT_EQ(slot.Taken(), 3);
     EXPECT_EQ(slot.Take(), nullptr);
     slot.Draft() = 4;
     slot.Publish();
     slot.Draft() = 5;
-    EXPECT_EQ(*taken, 3) << "what was taken stays while the writer goes on";
+    EXPECT_EQ(slot.Taken(), 3) << "what was taken stays while the writer goes on";
     EXPECT_EQ(*slot.Take(), 4);
 }
 
-// Catches a slot that both threads have at once: a value half written, an old one after a new one.
+// Catches a slot that both threads have at once: a value half written, an old one after a new one, one that
+// is freed on the reader's thread or never.
 TEST(LatestValue, KeepsTheThreadsApart) {
+    struct Owned {
+        std::array<int, 64> values{};
+        std::thread::id owner = std::this_thread::get_id();
+        ~Owned() { EXPECT_EQ(owner, std::this_thread::get_id()); }
+    };
     constexpr int kLast = 20000;
-    LatestValue<std::array<int, 64>> slot;
-    const std::jthread writer([&] {
+    LatestValue<std::unique_ptr<Owned>> slot;
+    std::jthread writer([&] {
         for (int value = 1; value <= kLast; ++value) {
-            slot.Draft().fill(value);
+            slot.Draft() = std::make_unique<Owned>();
+            slot.Draft()->values.fill(value);
             slot.Publish();
         }
     });
@@ -41,8 +48,14 @@ TEST(LatestValue, KeepsTheThreadsApart) {
             std::this_thread::yield();
             continue;
         }
-        ASSERT_TRUE(std::ranges::all_of(*taken, [&](int value) { return value == taken->front(); }));
-        ASSERT_GT(taken->front(), newest);
-        newest = taken->front();
+        const auto& values = (*taken)->values;
+        ASSERT_TRUE(std::ranges::all_of(values, [&](int value) { return value == values.front(); }));
+        ASSERT_GT(values.front(), newest);
+        newest = values.front();
     }
+    writer.join();
+    for (auto* rest : {&slot.Draft(), &slot.Taken()})
+        if (*rest) (*rest)->owner = std::this_thread::get_id();
+    slot.Publish();
+    if (slot.Draft()) slot.Draft()->owner = std::this_thread::get_id();
 }

@@ -5,11 +5,11 @@
 namespace Corvo::DSP {
 namespace {
 
-const bool kWide = __builtin_cpu_supports("avx2");
+bool wideKernels = __builtin_cpu_supports("avx2");
 
 template <typename Sample>
 const EqKernels<Sample>& Kernels() {
-    if (kWide) return EqAvx2Kernels<Sample>();
+    if (wideKernels) return EqAvx2Kernels<Sample>();
     return EqBaselineKernels<Sample>();
 }
 
@@ -20,6 +20,8 @@ bool Moves(const EqCascade<Sample>& cascade, int band) {
 }
 
 }  // namespace
+
+bool& UsesWideEqKernels() { return wideKernels; }
 
 bool MayRunTogether(const EqBands& first, const EqBands& second, int numBands, std::int32_t counter) {
     int movingFirst = 0, movingSecond = 0;

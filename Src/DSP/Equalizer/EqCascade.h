@@ -37,6 +37,9 @@ const EqKernels<Sample>& EqBaselineKernels();
 template <typename Sample>
 const EqKernels<Sample>& EqAvx2Kernels();  // for processors that have it
 
+// Which of them RunCascade takes. A test may turn the wide ones off.
+bool& UsesWideEqKernels();
+
 // Runs the first `numBands` bands, as far as they are active, of one channel or of two neighbouring ones.
 // `counter` counts the coefficients on the move; while it is 0 nothing moves.
 template <typename Sample>

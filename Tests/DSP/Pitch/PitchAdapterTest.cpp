@@ -4,13 +4,12 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <atomic>
 #include <memory>
 #include <ranges>
-#include <thread>
 
 #include "Plain/PlainClassicPitch.h"
 #include "Support/Signals.h"
+#include "Support/TwoThreads.h"
 #include "Support/VirtualSlot.h"
 
 using namespace Corvo::DSP;
@@ -75,10 +74,6 @@ double Frequency(const std::vector<float>& samples, int channels, int rate) {
 // Catches a virtual operation that was moved: hosts call by number.
 TEST(PitchAdapter, KeepsEveryOperationInItsSlot) {
     using A = PitchAdapter;
-    using Doubles = void (A::*)(double*, int);
-    using Floats = void (A::*)(float*, int);
-    using DoublesCounted = int (A::*)(double*, int);
-    using FloatsCounted = int (A::*)(float*, int);
     const int slots[] = {Slot(&A::Clear),
                          Slot(&A::SetSampleRate),
                          Slot(&A::SetChannelsNum),
@@ -87,14 +82,14 @@ TEST(PitchAdapter, KeepsEveryOperationInItsSlot) {
                          Slot(&A::CookFactors),
                          Slot(&A::SetFFTSize),
                          Slot(&A::SetQuality),
-                         Slot<Doubles>(&A::ProcessInPlace),
-                         Slot<Floats>(&A::ProcessInPlace),
-                         Slot<DoublesCounted>(&A::ProcessInPlaceNoPadding),
-                         Slot<FloatsCounted>(&A::ProcessInPlaceNoPadding),
+                         Slot<void (A::*)(double*, int)>(&A::ProcessInPlace),
+                         Slot<void (A::*)(float*, int)>(&A::ProcessInPlace),
+                         Slot<int (A::*)(double*, int)>(&A::ProcessInPlaceNoPadding),
+                         Slot<int (A::*)(float*, int)>(&A::ProcessInPlaceNoPadding),
                          Slot(&A::Flush),
                          Slot(&A::GetNumSamplesAvailable),
-                         Slot<Doubles>(&A::ReceiveSamples),
-                         Slot<Floats>(&A::ReceiveSamples)};
+                         Slot<void (A::*)(double*, int)>(&A::ReceiveSamples),
+                         Slot<void (A::*)(float*, int)>(&A::ReceiveSamples)};
     for (int i = 0; i < 16; ++i) EXPECT_EQ(slots[i], i);
     EXPECT_EQ(Slot(&A::GetLatency), 18) << "behind the destructor's two places";
 }
@@ -213,18 +208,17 @@ TEST(PitchAdapterNew, KeepsItsBooks) {
 // Catches races between configuring and processing, under the thread sanitizer.
 TEST(PitchAdapterNew, IsConfiguredWhileItProcesses) {
     const auto adapter = Make(kNew);
-    std::atomic<bool> done{false};
-    std::thread configure([&] {
-        for (int i = 0; !done; ++i) {
-            adapter->SetPitchFactor(0, 0.5f + 0.01f * static_cast<float>(i % 100));
-            adapter->SetQuality(i % 10);
+    WhileAnotherThread(
+        [&](int round) {
+            adapter->SetPitchFactor(0, 0.5f + 0.01f * static_cast<float>(round % 100));
+            adapter->SetQuality(round % 10);
             adapter->GetNumSamplesAvailable();
-        }
-    });
-    auto block = Noise<double>(2 * 256);
-    for (int i = 0; i < 200; ++i) adapter->ProcessInPlace(block.data(), 256);
-    done = true;
-    configure.join();
+            adapter->GetLatency();
+        },
+        [&] {
+            auto block = Noise<double>(2 * 256);
+            for (int i = 0; i < 200; ++i) adapter->ProcessInPlace(block.data(), 256);
+        });
 }
 
 // Catches the tables of sign changes, the wrapped phases and the short cosine drifting from the definition.

@@ -131,7 +131,9 @@ struct TubeDistorsion::Processing {
 
     // Takes what was prepared, and comes to `factor` by itself where nobody prepared it: automation asks for
     // it in the middle of a block.
-    void FollowFactor(int factor, int channels) {
+    void FollowFactor(int factor) {
+        const int channels = format.nChannels;
+        if (channels < 1 || channels > MaxNumChannels) return;  // blocks pass unchanged
         const bool prepared = filters.Take() != nullptr;
         auto& live = filters.Taken();
         if (live.Factor() != factor)
@@ -210,8 +212,9 @@ void TubeDistorsion::InitState(bool fromSilence) {
     InitEnvelopes(true);
     const auto values = Snapshot(m_params);
     auto& amp = m_processing->amp;
+    const int factor = VirtualTubeAmp::OversamplingFactor(values[kOversamplingRight]);
     if (fromSilence) {
-        m_processing->Clear(WantedFactor());
+        m_processing->Clear(factor);
         amp.SetParameter(values, VirtualTubeAmp::kAllParameters);
     }
     using Bits = std::array<std::uint32_t, std::tuple_size_v<Values>>;
@@ -219,13 +222,13 @@ void TubeDistorsion::InitState(bool fromSilence) {
     for (std::size_t i = 0; i < now.size(); ++i)
         if (now[i] != before[i]) amp.SetParameter(values, static_cast<int>(i));
     m_processing->cooked = values;
+    if (!fromSilence) m_processing->FollowFactor(factor);
 }
 
 void TubeDistorsion::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     const int channels = format->nChannels;
     if (frames < 1 || channels < 1 || channels > MaxNumChannels) return;
-    m_processing->FollowFactor(WantedFactor(), channels);
     WithSamples(buffer, *format, OtherWidths::AreFloat,
                 [&](auto* samples) { m_processing->Process(samples, frames, channels); });
 }

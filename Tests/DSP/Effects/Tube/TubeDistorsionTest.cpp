@@ -62,6 +62,9 @@ TEST(TubeDistorsionTest, ShapesLikeThePlainForm) {
         {{0.1f, 0.3f, 1}, {0.1f, 0.3f, 1}, 0.5f, 4},   {{0.1f, 0.5f, 2}, {0.1f, 0.3f, 3}, 0.7f, 8},
         {{0.1f, 0.5f, 3}, {0.1f, 0.3f, 3}, 0.75f, 12}, {{0.1f, 0.3f, 0}, {0.1f, 0.3f, 0}, 0.8f, 16},
     };
+    std::vector<double> input;
+    TubeDistorsion untouched;
+    EXPECT_EQ(RenderNoise(untouched, input), input);
     for (const auto& c : kCases) {
         TubeDistorsion tube;
         const Side* sides[] = {&c.left, &c.right};
@@ -73,7 +76,6 @@ TEST(TubeDistorsionTest, ShapesLikeThePlainForm) {
         // The left one is kept, and that is all.
         tube.SetParam(kOversampling, 0.6f, false);
         tube.SetParam(kOversampling + 1, c.oversampling, false);
-        std::vector<double> input;
         const auto output = RenderNoise(tube, input);
         SCOPED_TRACE("factor " + std::to_string(c.factor));
         // Boost and drive are floats; "Martens" multiplies their rounding by its factor.
@@ -92,13 +94,6 @@ TEST(TubeDistorsionTest, VirtualShapersGiveTheFunctions) {
         EXPECT_NEAR(amp.DoidicA(x, 0.5), Plain::TubeShape(2, x, 0.5), 1e-14);
         EXPECT_NEAR(amp.ArayaS(x, 0.5), Plain::TubeShape(3, x, 0.5), 1e-15);
     }
-}
-
-TEST(TubeDistorsionTest, PassesTheSignalByDefault) {
-    TubeDistorsion tube;
-    std::vector<double> input;
-    EXPECT_EQ(RenderNoise(tube, input), input);
-    EXPECT_EQ(tube.GetLatency(), 0);
 }
 
 // At drive 0.9901 the sine is 1 and its shape factor would be infinite.
@@ -179,8 +174,30 @@ TEST(TubeDistorsionTest, ChangesItsFactorWithoutAClick) {
     EXPECT_GT(steepest, 0.01);
 }
 
+// Catches filters that automation does not reach, and a restart for factors that came and went before a
+// block.
+TEST(TubeDistorsionTest, AutomationChangesTheFactorAsAnEditDoes) {
+    const auto format = Format<double>();
+    const auto input = Noise<double>(2 * 600, 0.5);
+    const auto render = [&](bool fromAutomation, std::initializer_list<float> factors) {
+        TubeDistorsion tube;
+        SetBoth(tube, kDrive, 0.4f);
+        SetBoth(tube, kOversampling, 0.5f);
+        tube.InitProcessing(300, &format);
+        auto samples = input;
+        ProcessBlock(tube, samples.data(), 300, format);
+        for (const float factor : factors) tube.SetParam(kOversampling + 1, factor, fromAutomation);
+        ProcessBlock(tube, samples.data() + 600, 300, format);
+        return samples;
+    };
+    EXPECT_EQ(render(true, {1.0f, 0.3f}), render(false, {0.3f}));
+    EXPECT_NE(render(true, {0.3f}), render(true, {}));
+    EXPECT_EQ(render(true, {1.0f, 0.5f}), render(true, {}));
+}
+
 TEST(TubeDistorsionTest, LatencyIsTheDelayOfBothFilters) {
     TubeDistorsion tube;
+    EXPECT_EQ(tube.GetLatency(), 0);
     SetBoth(tube, kOversampling, 1.0f);
     // Group delay at DC of a Butterworth of order 10 behind the bilinear transform, up and down.
     const double delay =
