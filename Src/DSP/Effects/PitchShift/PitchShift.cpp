@@ -104,8 +104,9 @@ struct PitchShift::BackEnds {
     // What the audio thread took, for the other thread to send pitch factors to. Only that thread frees
     // back-ends, so what it reads here lives while it uses it.
     std::atomic<PitchAdapter*> inUse{nullptr};
-    std::atomic<int> newest{kNone};  // index of the one in use, or of the one on its way
-    std::atomic<bool> factorsPending{false};
+    std::atomic<int> newest{kNone};           // index of the one in use, or of the one on its way
+    std::atomic<bool> factorsPending{false};  // automation stored some, on the audio thread
+    std::atomic<unsigned> edits{0};           // of the pitch, by the user-interface thread
     std::atomic<int> channels{1};
     tWAVEFORMATEX format{};  // the audio thread's
 
@@ -168,8 +169,13 @@ void PitchShift::SetPreset(int preset) {
 
 bool PitchShift::DoSetParam(int index, float normalised, bool fromAutomation) {
     CorvoEffect::DoSetParam(index, normalised, fromAutomation);
-    m_back_ends->factorsPending.store(true, std::memory_order_release);
-    return false;  // the next block sends the factors; the rest of the back-end stays as it is
+    if (fromAutomation) {
+        m_back_ends->factorsPending.store(true, std::memory_order_relaxed);
+    } else {
+        m_back_ends->edits.fetch_add(1, std::memory_order_acq_rel);
+        CookPitchShift(Snapshot(m_record), m_back_ends->channels.load());
+    }
+    return false;  // nothing else of the back-end is stale
 }
 
 void PitchShift::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
@@ -203,8 +209,8 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const bool newFormat = format->nChannels != before.nChannels ||
                            format->nSamplesPerSec != before.nSamplesPerSec || !m_back_ends->inUse.load();
     if (!m_cook.exchange(false, std::memory_order_acquire) && !force && !newFormat) return;
-    // Lowered before the record is read: an edit after that raises it again.
-    m_back_ends->factorsPending.exchange(false, std::memory_order_acquire);
+    m_back_ends->factorsPending.store(false, std::memory_order_relaxed);  // the cook sends them
+    const unsigned edits = m_back_ends->edits.load(std::memory_order_acquire);
     auto record = Snapshot(m_record);
     // The back-end that came decides, never the record: one caught in mid-change may name another that is
     // still being handed over, and its flag follows.
@@ -213,6 +219,9 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
         m_back_ends->format = *format;
     else
         MarkStale();  // the next block tries again
+    // An edit after the record was read may have reached the back-end first.
+    if (m_back_ends->edits.fetch_add(0, std::memory_order_acq_rel) != edits)
+        m_back_ends->factorsPending.store(true, std::memory_order_relaxed);
 }
 
 bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool) {
@@ -244,7 +253,7 @@ void PitchShift::CookPitchShift(const _transform_props& record, int channels) {
 
 void PitchShift::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (m_back_ends->factorsPending.exchange(false, std::memory_order_acquire))
+    if (m_back_ends->factorsPending.exchange(false, std::memory_order_relaxed))
         CookPitchShift(Snapshot(m_record), m_back_ends->channels.load());
     PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_relaxed);
     const int channels = m_back_ends->channels.load(std::memory_order_relaxed);

@@ -176,11 +176,17 @@ bool TubeDistorsion::DoSetParam(int index, float normalised, bool fromAutomation
 }
 
 void TubeDistorsion::SetPreset(int preset) {
-    if (TakePreset(preset)) PrepareOversampling();
+    if (TakePreset(preset)) FollowSettings();
 }
 
 void TubeDistorsion::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (TakeChunk(chunk, m_chunk_tag)) PrepareOversampling();
+    if (TakeChunk(chunk, m_chunk_tag)) FollowSettings();
+}
+
+// A cook that came in between found settings without their filters; it runs again.
+void TubeDistorsion::FollowSettings() {
+    PrepareOversampling();
+    MarkStale();
 }
 
 void TubeDistorsion::PrepareOversampling() {

@@ -54,6 +54,7 @@ private:
     struct Processing;
 
     int WantedFactor() const;
+    void FollowSettings();
     void PrepareOversampling();
     void InitState(bool fromSilence);
 
