@@ -8,7 +8,7 @@ namespace Corvo {
 namespace {
 
 constexpr float kFloorPerMean = 2.0f;
-// Less than this amplitude is a filter ringing out or rounding, whatever stands above whatever.
+// Peaks below this amplitude are rounding or a filter's ringing; ignored.
 constexpr double kSilentAmplitude = 1e-6;
 constexpr double kTypicalWindowMean = 0.42;
 // Leakage within this many bins of the window counts; further off it is weaker than any partial.
