@@ -19,7 +19,7 @@ namespace Corvo {
 namespace {
 
 using Lock = std::lock_guard<CriticalSection>;
-using enum SpectrumDisplay::_display_mode;
+using Mode = SpectrumDisplay;
 
 constexpr int kNoOrder = 100;  // of a length that is not a power of two
 constexpr float kCalm = 0.035f, kBrisk = 0.15f;
@@ -66,6 +66,15 @@ void Analyser::SetTunerOn(bool on) {
     state.tunerVisible = on;
 }
 
+bool Analyser::ToggleTuner() {
+    const bool start = !(state.tunerOn && state.on);
+    SetTunerOn(start);
+    if (!start) return false;
+    SetOn(true);
+    state.frozen = false;
+    return true;
+}
+
 void Analyser::SetSamplingRate(int samplingRate) {
     if (samplingRate > 0) state.samplingRate = samplingRate;
 }
@@ -77,17 +86,18 @@ void Analyser::SetPointer(float x, float y) {
 
 void Analyser::ToggleDisplayMode() {
     const Lock lock(m_lock);
-    const auto next = static_cast<DisplayMode>((state.displayMode + 1) % (display_tuner + 1));
+    const auto next = static_cast<DisplayMode>((state.displayMode + 1) % (Mode::display_tuner + 1));
     state.displayMode = next;
-    state.showSonogram = next == display_sonogram || next == display_both;
+    state.showSonogram = next == Mode::display_sonogram || next == Mode::display_both;
 }
 
 void Analyser::ShowSonogram(bool show) {
     const Lock lock(m_lock);
     state.showSonogram = show;
     const DisplayMode mode = state.displayMode;
-    if (show && mode == display_spectrum) state.displayMode = display_both;
-    if (!show && (mode == display_sonogram || mode == display_both)) state.displayMode = display_spectrum;
+    if (show && mode == Mode::display_spectrum) state.displayMode = Mode::display_both;
+    if (!show && (mode == Mode::display_sonogram || mode == Mode::display_both))
+        state.displayMode = Mode::display_spectrum;
 }
 
 void Analyser::ResetPeaks() {

@@ -57,6 +57,8 @@ public:
     void SetOn(bool on);
     // Switched on, the tuner has forgotten what it heard.
     void SetTunerOn(bool on);
+    // Off when tuner and analyser run, else both on and thawed, and true: the buffers are to be built again.
+    bool ToggleTuner();
     // Below 1 is ignored.
     void SetSamplingRate(int samplingRate);
     // In the coordinates of the drawing.

@@ -8,8 +8,7 @@
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/MessagePoster.h"
 
-using Corvo::Analyser;
-using Corvo::AnalyserLock;
+using Corvo::Analyser, Corvo::AnalyserLock;
 using Lock = std::lock_guard<Corvo::CriticalSection>;
 
 namespace {
@@ -75,14 +74,12 @@ kivspectrum::kivspectrum()
     ObserverAdd(this, true);
 }
 kivspectrum::~kivspectrum() { ObserverAdd(this, false); }
-
 void kivspectrum::Feed(const float* samples, int frames, int stride, int channels) {
     m_analyser->GetCapture().Feed(samples, frames, stride, channels);
 }
 void kivspectrum::Feed(const double* samples, int frames, int stride, int channels) {
     m_analyser->GetCapture().Feed(samples, frames, stride, channels);
 }
-
 void kivspectrum::set_parameters(int samplingRate) { m_analyser->SetSamplingRate(samplingRate); }
 
 void kivspectrum::init() {
@@ -99,7 +96,6 @@ void kivspectrum::allocate(int reset) {
     const Lock classLock(AnalyserLock());
     m_analyser->Allocate(settings, reset != 0);
 }
-
 bool kivspectrum::popupmenu_process(int command) {
     const auto* const entry = Corvo::FindAnalyserMenuEntry(command);
     if (!entry) return false;
@@ -130,9 +126,9 @@ bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, boo
         if (probeOnly) return true;
         const spectrum_settings current = settings;
         classLock.unlock();
-        m_analyser->ProcessFrame(
-            current, samplingRate,
-            Analyser::SmoothingCoefficient(fastSmoothing, sonogramMode && !sonogramOverride));
+        const bool atItsSpeed = sonogramMode && !sonogramOverride;
+        m_analyser->ProcessFrame(current, samplingRate,
+                                 Analyser::SmoothingCoefficient(fastSmoothing, atItsSpeed));
     }
     Tell(kMessageFrameReady, 0);
     return true;
@@ -168,7 +164,6 @@ void kivspectrum::Tell(int message, std::intptr_t detail) {
     if (MessagePoster* const poster = GetStaticInfo().GetMessagePoster())
         poster->Post(message, reinterpret_cast<std::intptr_t>(this), detail);
 }
-
 std::vector<float>& kivspectrum::GetBufferInputPoints() { return m_analyser->GetCapture().Samples(); }
 int kivspectrum::GetBufferInputChannels() const { return 1; }
 const std::vector<float>& kivspectrum::GetPower() const { return m_analyser->GetPower(); }
@@ -177,18 +172,13 @@ SpectrumDrawer* kivspectrum::GetSpectrumDrawer() const { return m_drawer; }
 Tuner* kivspectrum::GetTuner() const { return m_tuner; }
 Corvo::Sonogram* kivspectrum::GetSonogram() const { return m_sonogram; }
 void kivspectrum::peak_reset() { m_analyser->ResetPeaks(); }
-
 void kivspectrum::SetOn(bool on) { m_analyser->SetOn(on); }
 bool kivspectrum::GetOn() const { return m_analyser->state.on; }
 void kivspectrum::SetTunerOn(bool on) { m_analyser->SetTunerOn(on); }
 bool kivspectrum::GetTunerOn() const { return m_tunerOn; }
 void kivspectrum::ToggleTuner() {
     const Lock classLock(AnalyserLock());
-    const bool running = m_tunerOn && GetOn();
-    SetTunerOn(!running);
-    if (running) return;
-    SetOn(true);
-    m_analyser->state.frozen = false;
+    if (!m_analyser->ToggleTuner()) return;
     allocate(1);
     init();
 }
@@ -197,7 +187,6 @@ void kivspectrum::SetFrozen(bool frozen) {
     if (m_analyser->state.frozen.exchange(frozen) && !frozen) allocate(1);
 }
 bool kivspectrum::GetFrozen() const { return m_analyser->state.frozen; }
-
 void kivspectrum::ToggleDisplayMode() { m_analyser->ToggleDisplayMode(); }
 void kivspectrum::ToggleDisplayMode2() { ShowSonogram(!IsShowSonogram()); }
 kivspectrum::_display_mode kivspectrum::GetDisplayMode() const { return m_displayMode; }

@@ -82,48 +82,38 @@ protected:
 
 TEST_F(SonogramTest, BringsTheColumnsOfItsSpeed) {
     m_sonogram.CheckPixelBufferSize(Size(500, 4), 0);
-    for (const auto& [index, perSecond, counter] : {std::tuple{0, 5, 6},
-                                                    {1, 10, 3},
-                                                    {2, 15, 2},
-                                                    {3, 30, 1},
-                                                    {4, 60, -1},
-                                                    {5, 90, -2},
-                                                    {6, 150, -4},
-                                                    {7, 300, -9},
-                                                    {8, 450, -14}}) {
+    constexpr int kColumns[] = {5, 10, 15, 30, 60, 90, 150, 300, 450},
+                  kCounters[] = {6, 3, 2, 1, -1, -2, -4, -9, -14};
+    for (int index = 0; index < 9; ++index) {
         Corvo::Sonogram::SetSpeedIndex(index);
-        EXPECT_EQ(Corvo::Sonogram::GetColumnsPerSecond(), perSecond);
+        EXPECT_EQ(Corvo::Sonogram::GetColumnsPerSecond(), kColumns[index]);
         m_sonogram.Clear();
         for (int refresh = 0; refresh < 30; ++refresh) Step(0.0);
-        EXPECT_EQ(m_sonogram.GetDrawCounter(), counter);
+        EXPECT_EQ(m_sonogram.GetDrawCounter(), kCounters[index]);
         int columns = 0;
         for (int back = 0; back < 500; ++back) columns += LevelAt(back, 2) > -kRange;
-        EXPECT_EQ(columns, perSecond);
+        EXPECT_EQ(columns, kColumns[index]);
     }
 }
 
 // Black, two colours and white at equal distances, 30 dB apart, blended by their codes between.
 TEST_F(SonogramTest, ColoursLevels) {
-    for (const auto& [scheme, low, high] : {std::tuple{0, 0x1E00FFu, 0xDC1400u},
-                                            {1, 0x0000FFu, 0x00FF32u},
-                                            {2, 0xFF4500u, 0xFFFF00u},
-                                            {3, 0xFF0000u, 0xFF0032u},
-                                            {4, 0x00FF00u, 0x00FF32u},
-                                            {5, 0x0000FFu, 0x0032FFu},
-                                            {6, 0x404040u, 0x919191u},
-                                            {7, 0x1E00FFu, 0xDC1400u},
-                                            {-1, 0x1E00FFu, 0xDC1400u}}) {
+    constexpr std::uint32_t kInner[][2] = {{0x1E00FF, 0xDC1400}, {0x0000FF, 0x00FF32}, {0xFF4500, 0xFFFF00},
+                                           {0xFF0000, 0xFF0032}, {0x00FF00, 0x00FF32}, {0x0000FF, 0x0032FF},
+                                           {0x404040, 0x919191}};
+    for (const int scheme : {6, 5, 4, 3, 2, 1, 0, 7, -1}) {
+        const auto& [low, high] = kInner[scheme < 0 || scheme > 6 ? 0 : scheme];
         Corvo::Sonogram::SetColourScheme(scheme);
         const std::uint32_t stops[] = {0x000000, low, high, 0xFFFFFF};
         for (int i = 0; i < 4; ++i)
             EXPECT_EQ(m_sonogram.ColorFromAmplitude(30.0f * static_cast<float>(i) - kRange, false), stops[i])
                 << scheme;
     }
-    for (const auto& [decibels, rgb, reference] : {std::tuple{-45.0f, 0x7D0A80u, 0x800A7Du},
-                                                   {-22.5f, 0xE54F40u, 0x404FE5u},
-                                                   {-200.0f, 0u, 0u},
-                                                   {std::nanf(""), 0u, 0u},
-                                                   {10.0f, 0xFFFFFFu, 0xFFFFFFu}}) {
+    // clang-format off
+    for (const auto& [decibels, rgb, reference] :
+         {std::tuple{-45.0f, 0x7D0A80u, 0x800A7Du}, {-22.5f, 0xE54F40u, 0x404FE5u}, {-200.0f, 0u, 0u},
+          {std::nanf(""), 0u, 0u}, {10.0f, 0xFFFFFFu, 0xFFFFFFu}}) {
+        // clang-format on
         EXPECT_EQ(m_sonogram.ColorFromAmplitude(decibels, false), rgb) << decibels;
         EXPECT_EQ(m_sonogram.ColorFromAmplitude(decibels, true), reference) << decibels;
     }
