@@ -11,7 +11,6 @@
 #include "Spectrum/Scales/SpectrumSettings.h"
 
 class CoordinatesAndFrequencies;
-class MessagePoster;
 class SpectrumDrawer;
 class SpectrumStaticInfo;
 class Tuner;

@@ -35,10 +35,10 @@ float PowerRatio(float decibels) { return std::pow(10.0f, 0.1f * decibels); }
 
 }  // namespace
 
-void PitchPeaks::Initialise(const SpectrumFormat& format) {
+void PitchPeaks::Prepare(const SpectrumFormat& format) {
     m_format = format;
-    m_interpolation.Initialise(format.windowType, format.windowLength, format.fftLength);
-    m_floor.Initialise(format.bins, static_cast<double>(format.fftLength) / format.windowLength);
+    m_interpolation.Prepare(format.windowType, format.windowLength, format.fftLength);
+    m_floor.Prepare(format.bins, static_cast<double>(format.fftLength) / format.windowLength);
     m_floorLevels.resize(format.bins);
     // Two neighbours are never both peaks.
     m_peaks.reserve(format.bins / 2 + 1);

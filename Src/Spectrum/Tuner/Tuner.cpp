@@ -159,7 +159,7 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
     DoAsAsked();
     const int window = windowLength >= 1 ? std::min(windowLength, fftLength) : fftLength;
     const std::size_t bins = std::min(power.size(), static_cast<std::size_t>(fftLength / 2));
-    m_detector->Initialise({fftLength, window, m_windowType, samplingRate, bins});
+    m_detector->Prepare({fftLength, window, m_windowType, samplingRate, bins});
     const std::span<const float> spectrum(power.data(), bins);
 
     m_detector->MeasureFloor(spectrum, denoise || g_choices.showDenoised);

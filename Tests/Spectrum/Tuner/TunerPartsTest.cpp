@@ -72,7 +72,7 @@ TEST(SpectrumFloorTest, FindsTheNoiseBelowThePeaks) {
     TestSupport::Random random;
     std::vector<float> power(kBins), floor(kBins);
     Corvo::SpectrumFloor measure;
-    measure.Initialise(kBins, 1.0);
+    measure.Prepare(kBins, 1.0);
     for (const bool tones : {false, true}) {
         double sum = 0.0;
         for (int frame = 0; frame < 50; ++frame) {
