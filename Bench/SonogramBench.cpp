@@ -58,7 +58,7 @@ BENCHMARK(BM_SonogramColumn)->Arg(2048)->Arg(262144);
 // By speed index, a new spectrum every refresh.
 void BM_SonogramStep(benchmark::State& state) {
     Corvo::Sonogram::SetSpeedIndex(static_cast<int>(state.range(0)));
-    kivspectrum::spectrum_settings settings;
+    Corvo::SpectrumSettings settings;
     settings.time_smoothing = 0;
     SpectrumDrawer drawer(settings);
     drawer.UpdateSamplingFrequency(48000);

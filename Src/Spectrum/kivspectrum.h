@@ -3,23 +3,20 @@
 #include <array>
 #include <atomic>
 #include <cstdint>
-#include <limits>
 #include <memory>
 #include <vector>
 
 #include "Picture/DrawingBitmap.h"
-#include "Platform/CriticalSection.h"
 #include "Platform/Export.h"
-#include "Spectrum/Fft/CorvoFFT.h"
+#include "Spectrum/Scales/SpectrumSettings.h"
 
 class CoordinatesAndFrequencies;
-class MessagePoster;
 class SpectrumDrawer;
 class SpectrumStaticInfo;
 class Tuner;
-class VectorInterpolationFilterFloat;
 namespace Corvo {
-class CaptureBuffer;
+class Analyser;
+class CriticalSection;
 class Sonogram;
 struct PointF;
 struct RectF;
@@ -32,41 +29,12 @@ struct RectF;
 //
 // Threads: one audio thread calls Feed. One display thread prepares frames and reads what the drawer and the
 // buffers hold. Menu commands and switches may come from any thread; a class-wide lock in front of the
-// analysers' own keeps them apart, and nobody holds up the audio thread. Who draws on another thread than the
-// menu's must not read the buffers while a command runs.
-class DSP_API kivspectrum {
+// analysers' own keeps them apart, and nobody holds up the audio thread. Drawing on another thread than the
+// menu's: do not read the buffers while a command runs.
+class DSP_API kivspectrum : public Corvo::SpectrumDisplay {
 public:
-    // 24 fields of 32 bits. Lengths are in samples.
-    struct spectrum_settings {
-        std::int32_t fft_length = 4096;
-        std::int32_t fft_length_auto = 1;  // 1: the transform is as long as the window
-        std::int32_t window_length = 4096;
-        std::int32_t hop_length = -1;      // samples between analyses; below 1: one window
-        std::int32_t window_type = 4;      // 0 rectangular, 1 triangular, 2 Hann, 3 Hamming, 4 Blackman
-        std::int32_t view_option_a = 1;    // frequency scale, see FrequencyScale
-        std::int32_t view_option_b = 0;    // level scale, see LevelScale
-        std::int32_t peak_decay_mode = 2;  // how long peaks stay: 0 for good, 1 long, 2 medium, 3 short
-        std::int32_t view_option_c = 1;    // grid: 0 off, 1 on
-        std::int32_t view_option_d = 1;    // vertical range: 60, 90, 120 or 144 dB
-        float gain = 1.0f;                 // scales the drawn amplitude
-        std::int32_t view_flag_a = 0;      // for the host: show the two channels' analysers apart
-        std::int32_t peak_hold_mode = 1;   // 0 no peaks, 1 peaks fall, 2 they stay until reset
-        std::int32_t view_flag_b = 1;      // labels
-        std::int32_t view_option_e = 1;    // curve style: 1 line, 2 filled, 3 bars
-        std::int32_t view_flag_c = 1;      // info box at the pointer
-        float overlap = 0.0f;              // of successive windows, kept below 1
-        std::int32_t reserved_18 = 0;
-        std::int32_t time_smoothing = 1;
-        bool view_flag_d = false;  // note names on the frequency axis
-        std::uint8_t view_flag_d_rest[3]{};
-        std::int32_t reserved_21 = 1;
-        std::int32_t reserved_22 = 0;
-        std::int32_t smoothing_type = 0;  // 0 exponential, 1 moving filter, 2 none
-        std::int32_t smoothing_filter_length = 5;
-    };
-    enum _display_mode : int { display_spectrum, display_sonogram, display_both, display_tuner };
-
-    static constexpr int window_types_num = 5;
+    using spectrum_settings = Corvo::SpectrumSettings;
+    static constexpr int window_types_num = Corvo::kWindowTypes;
 
     // Four of the tuner panel's images, nearest the centre first.
     using BarItems = std::array<Corvo::DrawingBitmap*, 4>;
@@ -82,27 +50,27 @@ public:
     // The tuner panel's images, drawn at the size needed when they are first drawn: the circle behind the
     // note, lit and unlit (Base); ripples beside it for notes too low (L) and too high (R), lit and unlit;
     // and upright bars in the place of ripples for small panels. They belong to the thread that draws.
-    static Corvo::DrawingBitmap mainWitheCirleBitmap, mainWitheCirleBitmapBase;
+    static Corvo::DrawingBitmap &mainWitheCirleBitmap, &mainWitheCirleBitmapBase;
     // clang-format off
-    static Corvo::DrawingBitmap tunerBarItem_00_L, tunerBarItem_01_L, tunerBarItem_02_L, tunerBarItem_03_L;
-    static Corvo::DrawingBitmap tunerBarItem_00_R, tunerBarItem_01_R, tunerBarItem_02_R, tunerBarItem_03_R;
-    static Corvo::DrawingBitmap tunerBarItem_Base_00_L, tunerBarItem_Base_01_L,
-                                tunerBarItem_Base_02_L, tunerBarItem_Base_03_L;
-    static Corvo::DrawingBitmap tunerBarItem_Base_00_R, tunerBarItem_Base_01_R,
-                                tunerBarItem_Base_02_R, tunerBarItem_Base_03_R;
-    static Corvo::DrawingBitmap tunerBarItem_Minimized_00_L, tunerBarItem_Minimized_01_L,
-                                tunerBarItem_Minimized_02_L, tunerBarItem_Minimized_03_L;
-    static Corvo::DrawingBitmap tunerBarItem_Minimized_00_R, tunerBarItem_Minimized_01_R,
-                                tunerBarItem_Minimized_02_R, tunerBarItem_Minimized_03_R;
-    static Corvo::DrawingBitmap tunerBarItem_Minimized_Base_00_L, tunerBarItem_Minimized_Base_01_L,
-                                tunerBarItem_Minimized_Base_02_L, tunerBarItem_Minimized_Base_03_L;
-    static Corvo::DrawingBitmap tunerBarItem_Minimized_Base_00_R, tunerBarItem_Minimized_Base_01_R,
-                                tunerBarItem_Minimized_Base_02_R, tunerBarItem_Minimized_Base_03_R;
+    static Corvo::DrawingBitmap &tunerBarItem_00_L, &tunerBarItem_01_L, &tunerBarItem_02_L, &tunerBarItem_03_L;
+    static Corvo::DrawingBitmap &tunerBarItem_00_R, &tunerBarItem_01_R, &tunerBarItem_02_R, &tunerBarItem_03_R;
+    static Corvo::DrawingBitmap &tunerBarItem_Base_00_L, &tunerBarItem_Base_01_L,
+                                &tunerBarItem_Base_02_L, &tunerBarItem_Base_03_L;
+    static Corvo::DrawingBitmap &tunerBarItem_Base_00_R, &tunerBarItem_Base_01_R,
+                                &tunerBarItem_Base_02_R, &tunerBarItem_Base_03_R;
+    static Corvo::DrawingBitmap &tunerBarItem_Minimized_00_L, &tunerBarItem_Minimized_01_L,
+                                &tunerBarItem_Minimized_02_L, &tunerBarItem_Minimized_03_L;
+    static Corvo::DrawingBitmap &tunerBarItem_Minimized_00_R, &tunerBarItem_Minimized_01_R,
+                                &tunerBarItem_Minimized_02_R, &tunerBarItem_Minimized_03_R;
+    static Corvo::DrawingBitmap &tunerBarItem_Minimized_Base_00_L, &tunerBarItem_Minimized_Base_01_L,
+                                &tunerBarItem_Minimized_Base_02_L, &tunerBarItem_Minimized_Base_03_L;
+    static Corvo::DrawingBitmap &tunerBarItem_Minimized_Base_00_R, &tunerBarItem_Minimized_Base_01_R,
+                                &tunerBarItem_Minimized_Base_02_R, &tunerBarItem_Minimized_Base_03_R;
     // clang-format on
     static const BarItems leftItems, rightItems, baseItems_L, baseItems_R;
     static const BarItems leftItemsMinimized, rightItemsMinimized, baseItemsMinimized_L, baseItemsMinimized_R;
     // Arrows that point to where the note has to go.
-    static Corvo::DrawingBitmap tunerErrorFlatBitmap, tunerErrorSharpBitmap;
+    static Corvo::DrawingBitmap &tunerErrorFlatBitmap, &tunerErrorSharpBitmap;
     // Draw the images anew when larger ones are needed, when they have been more than twice too large for a
     // while, or when needPrepareBitmap asks for it, then all kinds. Sizes in pixels, limited to 1..1024.
     // Without memory they throw std::bad_alloc, and the next call tries again.
@@ -142,8 +110,11 @@ public:
     void allocate(int reset);
     // Re-initialises every live analyser after a change of the settings. Tuners go off with this one's.
     void ObserverUpdate();
-    // Carries out a menu command, 1200..1402. False, with nothing changed, when it is none of these.
+    // Carries out a menu command, 1200..1402 (AnalyserMenu.h has the table). False, with nothing changed,
+    // when it is none of these.
     bool popupmenu_process(int command);
+    // Whether a command's entry has a tick: a choice that is the current one, or a switch that is on.
+    bool popupmenu_checked(int command) const;
 
     // Prepares a frame when new samples came; false when there is nothing to do. With probeOnly it only says
     // whether there would be a frame. sonogramMode smooths at the sonogram's speed unless overridden,
@@ -255,51 +226,20 @@ private:
     template <class Drawing>
     void DrawTunerLine(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
 
-    static constexpr float kNowhere = std::numeric_limits<float>::quiet_NaN();  // within no rectangle
-
-    bool ApplyCommand(int command);
-    void ResizeFilter();
-    void cook_window();
-    void ComputePower();
-    float SmoothingCoefficient(bool fastSmoothing, bool sonogramMode, bool sonogramOverride) const;
-    void UpdateDrawer(const spectrum_settings& current);
-    void RunTuner(int samplingRate);
-    bool LetTunerWait();
     void TellOfNote();
+    void RunTuner(int samplingRate);
     void Tell(int message, std::intptr_t detail);
 
-    mutable Corvo::CriticalSection m_instanceLock;
-    CorvoFFT m_fft;
-    int m_order;     // of the transform length, kNoOrder when it is not a power of two
-    int m_fftOrder;  // what m_fft was built for
-    std::int32_t m_builtFftLength = 0;
-    std::int32_t m_builtWindowType = -1;
-    std::int32_t m_builtWindowLength = 0;
-    std::int32_t m_builtHopLength = 0;
-    bool m_powerIsFrame = false;  // m_power was made since the buffers were built
+    std::unique_ptr<Corvo::Analyser> m_analyser;
 
-    std::unique_ptr<Corvo::CaptureBuffer> m_capture;
-    std::vector<float> m_samples;    // the copy that an analysis works on
-    std::vector<float> m_transform;  // windowed, then transformed in place
-    std::vector<float> m_window;
-    std::vector<float> m_power;
-    std::unique_ptr<SpectrumDrawer> m_drawer;
-    std::unique_ptr<VectorInterpolationFilterFloat> m_filter;
-    std::unique_ptr<Tuner> m_tuner;
-    std::unique_ptr<Corvo::Sonogram> m_sonogram;
-    bool m_frameForSonogram = false;  // prepared since its last step
-
-    std::atomic<bool> m_on{false};
-    std::atomic<bool> m_tunerOn{false};
-    std::atomic<bool> m_tunerVisible{false};
-    std::atomic<bool> m_frozen{false};
-    std::atomic<bool> m_transforming{false};
-    std::atomic<bool> m_showSonogram{false};
-    std::atomic<bool> m_showInfoBox{true};
-    std::atomic<_display_mode> m_displayMode{display_spectrum};
-    std::atomic<int> m_samplingRate{44100};
-    std::atomic<float> m_pointerX{kNowhere}, m_pointerY{kNowhere};
+    // The analyser's parts, by the names that the drawing routines know.
+    Corvo::CriticalSection& m_instanceLock;
+    SpectrumDrawer* const m_drawer;
+    Tuner* const m_tuner;
+    Corvo::Sonogram* const m_sonogram;
+    const std::atomic<bool>&m_tunerOn, &m_tunerVisible, &m_showInfoBox;
+    const std::atomic<_display_mode>& m_displayMode;
+    const std::atomic<int>& m_samplingRate;
+    const std::atomic<float>&m_pointerX, &m_pointerY;
     std::vector<Corvo::PointF> m_outline;  // of the filled curve
 };
-
-static_assert(sizeof(kivspectrum::spectrum_settings) == 24 * 4);

@@ -4,14 +4,17 @@
 
 #include <vector>
 
+#include "Spectrum/MessagePoster.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
 
-// Class-wide settings start every test at their defaults.
+// What analysers, tuners and sonograms share starts every test at its defaults.
 class AnalyserTest : public testing::Test {
 protected:
-    AnalyserTest() { kivspectrum::settings = {}; }
-    ~AnalyserTest() override { kivspectrum::settings = {}; }
+    AnalyserTest() { Reset(); }
+    ~AnalyserTest() override { Reset(); }
 
     static kivspectrum::spectrum_settings& Settings() { return kivspectrum::settings; }
 
@@ -20,5 +23,19 @@ protected:
     }
     static bool Prepare(kivspectrum& analyser, int rate = 48000) {
         return analyser.PrepareFFTForDrawing(rate, true, false, false, false);
+    }
+
+private:
+    static void Reset() {
+        kivspectrum::settings = {};
+        kivspectrum::GetStaticInfo().SetMessagePoster(nullptr);
+        Tuner::SetDetectionMethod(0);
+        Tuner::SetShowDenoisedSpectrum(false);
+        Tuner::SetTunedQuantumPreset(3);
+        Tuner::SetNoteNaming(0);
+        Tuner::SetTemperament(0);
+        TunerCalibrateReset();
+        Corvo::Sonogram::SetSpeedIndex(3);
+        Corvo::Sonogram::SetColourScheme(0);
     }
 };

@@ -7,6 +7,7 @@
 #include "Drawing/Views/AxisDrawing.h"
 #include "Drawing/Views/ShortText.h"
 #include "Drawing/Views/SpectrumView.h"
+#include "Platform/CriticalSection.h"
 #include "Spectrum/Sonogram/Sonogram.h"
 #include "Spectrum/kivspectrum.h"
 

@@ -5,6 +5,7 @@
 
 #include "Drawing/Views/AxisDrawing.h"
 #include "Drawing/Views/ShortText.h"
+#include "Platform/CriticalSection.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/Scales/SpectrumScales.h"
 #include "Spectrum/Tuner/Tuner.h"

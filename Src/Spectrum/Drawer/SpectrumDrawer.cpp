@@ -19,11 +19,11 @@ enum SmoothingType { kExponential = 0, kMovingFilter = 1 };
 
 }  // namespace
 
-SpectrumDrawer::SpectrumDrawer(kivspectrum::spectrum_settings settings) : m_settings(settings) {}
+SpectrumDrawer::SpectrumDrawer(Corvo::SpectrumSettings settings) : m_settings(settings) {}
 SpectrumDrawer::~SpectrumDrawer() = default;
 
-void SpectrumDrawer::UpdateSettings(kivspectrum::spectrum_settings settings) { m_settings = settings; }
-const kivspectrum::spectrum_settings& SpectrumDrawer::GetSettings() const { return m_settings; }
+void SpectrumDrawer::UpdateSettings(Corvo::SpectrumSettings settings) { m_settings = settings; }
+const Corvo::SpectrumSettings& SpectrumDrawer::GetSettings() const { return m_settings; }
 
 void SpectrumDrawer::Allocate() {
     const auto bins = static_cast<std::size_t>(Corvo::BufferLength(m_settings.fft_length) / 2);

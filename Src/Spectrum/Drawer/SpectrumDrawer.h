@@ -6,7 +6,8 @@
 
 #include "Platform/Export.h"
 #include "Spectrum/Scales/CoordinatesAndFrequencies.h"
-#include "Spectrum/kivspectrum.h"
+
+class VectorInterpolationFilterFloat;
 
 namespace Corvo {
 
@@ -21,11 +22,11 @@ struct SpectrumPeak {
 // memory of their peaks. Used on the display side of its analyser, which lends its lock.
 class DSP_API SpectrumDrawer {
 public:
-    explicit SpectrumDrawer(kivspectrum::spectrum_settings settings);
+    explicit SpectrumDrawer(Corvo::SpectrumSettings settings);
     ~SpectrumDrawer();
 
-    void UpdateSettings(kivspectrum::spectrum_settings settings);
-    const kivspectrum::spectrum_settings& GetSettings() const;
+    void UpdateSettings(Corvo::SpectrumSettings settings);
+    const Corvo::SpectrumSettings& GetSettings() const;
 
     // Size the spectrum, the peaks and their counters for the settings. Allocate keeps what is there;
     // ReallocateBuffers starts from zero.
@@ -63,14 +64,14 @@ public:
     // added to the levels. Draws the smoothed spectrum, and counts as a frame for the peaks; or `other`, with
     // fft_length / 2 powers. The sonogram has no points.
     int ComputeSpectrumPoints(const Corvo::RectF& rectangle, Corvo::PointF* points, int& count,
-                              const CoordinatesAndFrequencies& map, kivspectrum::_display_mode mode,
-                              int capacity, float offset, const std::vector<float>* other = nullptr);
+                              const CoordinatesAndFrequencies& map, Corvo::DisplayMode mode, int capacity,
+                              float offset, const std::vector<float>* other = nullptr);
     // All points of the last curve, and the bins that they stand for.
     const std::vector<Corvo::PointF>& GetXYPoints() const;
     const std::vector<int>& GetFFTPoints() const;
 
-    // The highest peak of the smoothed spectrum from a frequency (Hz) up, DC apart; 0 Hz and -300 dB when
-    // there is none.
+    // The highest peak of the smoothed spectrum from a frequency (Hz) up, except for DC; 0 Hz and -300 dB
+    // when there is none.
     Corvo::SpectrumPeak HighestPeak(double lowestHz = 0.0) const;
 
     void SetOn(bool on);
@@ -84,7 +85,7 @@ private:
     void AddPoint(double x, double y, std::ptrdiff_t bin);
     double RefreshRate(const std::vector<float>& power) const;
 
-    kivspectrum::spectrum_settings m_settings;
+    Corvo::SpectrumSettings m_settings;
     std::vector<float> m_smoothed;
     std::vector<float> m_peaks;
     std::vector<float> m_peakFrames;  // until each peak falls

@@ -64,15 +64,14 @@ double PowerBetween(const std::vector<float>& power, double low, double high) {
 }  // namespace
 
 int SpectrumDrawer::ComputeSpectrumPoints(const Corvo::RectF& rectangle, Corvo::PointF* points, int& count,
-                                          const CoordinatesAndFrequencies& map,
-                                          kivspectrum::_display_mode mode, int capacity, float offset,
-                                          const std::vector<float>* other) {
+                                          const CoordinatesAndFrequencies& map, Corvo::DisplayMode mode,
+                                          int capacity, float offset, const std::vector<float>* other) {
     if (!other) AgePeaks();
     m_points.clear();
     m_pointBins.clear();
     const std::vector<float>& power = other ? *other : m_smoothed;
-    const bool drawable = mode != kivspectrum::display_sonogram && m_samplingRate > 0 && !power.empty() &&
-                          m_settings.fft_length > 0 && rectangle.width > 0.0f;
+    const bool drawable = mode != Corvo::SpectrumDisplay::display_sonogram && m_samplingRate > 0 &&
+                          !power.empty() && m_settings.fft_length > 0 && rectangle.width > 0.0f;
     if (drawable) {
         const double scale = static_cast<double>(m_settings.gain) * m_settings.gain *
                              std::pow(10.0, offset * 0.1) / Corvo::FullScalePower(m_settings);

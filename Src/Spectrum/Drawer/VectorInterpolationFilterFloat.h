@@ -16,15 +16,13 @@ public:
     void Resize(int spectra, int bins);
     int GetSpectra() const;
     int GetBins() const;
-    // By age, the newest first.
-    const std::vector<float>& GetWeights() const;
 
     // Stores `newest` as the current spectrum, writes the weighted sum of all into `average` and moves on.
     // Works on as many bins as both vectors and the filter have; an empty filter does nothing.
     void Average(const std::vector<float>& newest, std::vector<float>& average);
 
 private:
-    std::vector<float> m_weights;
+    std::vector<float> m_weights;  // by age, the newest first
     std::vector<float> m_ring;
     std::size_t m_bins = 0;
     std::size_t m_current = 0;

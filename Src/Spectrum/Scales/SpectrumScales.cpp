@@ -9,7 +9,7 @@ namespace {
 struct WindowShape {
     double mean, meanSquare;
 };
-constexpr WindowShape kWindows[kivspectrum::window_types_num] = {
+constexpr WindowShape kWindows[kWindowTypes] = {
     {1.0, 1.0},
     {0.5, 1.0 / 3.0},
     {0.5, 0.5 * 0.5 + 0.5 * 0.5 / 2.0},
@@ -19,7 +19,7 @@ constexpr WindowShape kWindows[kivspectrum::window_types_num] = {
 
 const WindowShape& ShapeOf(const SpectrumSettings& settings) {
     const int type = settings.window_type;
-    return kWindows[type >= 0 && type < kivspectrum::window_types_num ? type : 0];
+    return kWindows[type >= 0 && type < kWindowTypes ? type : 0];
 }
 
 double WindowLength(const SpectrumSettings& settings) {

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "Platform/Export.h"
-#include "Spectrum/kivspectrum.h"
+#include "Spectrum/Scales/SpectrumSettings.h"
 
 namespace Corvo {
 
@@ -14,8 +14,6 @@ enum class FrequencyScale { Automatic = -1, Linear, Logarithmic, Octaves, ThirdO
 enum class LevelScale { Decibels, Power, Amplitude };
 // view_option_e.
 enum class CurveStyle { Line = 1, Filled, Bars };
-
-using SpectrumSettings = kivspectrum::spectrum_settings;
 
 // Values outside are taken as the default.
 DSP_API FrequencyScale FrequencyScaleOf(const SpectrumSettings& settings);

@@ -78,7 +78,7 @@ double PeakInterpolation::Measure(double before, double at, double after) const 
     return curvature < 0.0 ? 0.5 * (a - c) / curvature : 0.0;
 }
 
-void PeakInterpolation::Initialise(int windowType, int windowLength, int fftLength) {
+void PeakInterpolation::Prepare(int windowType, int windowLength, int fftLength) {
     m_windowType = windowType >= kRectangular && windowType <= kBlackman ? windowType : kBlackman;
     m_windowBins = std::clamp(static_cast<double>(windowLength) / fftLength, 1e-6, 1.0);
     const auto measured = [this](double offset) {

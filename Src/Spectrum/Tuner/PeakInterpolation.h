@@ -13,7 +13,7 @@ namespace Corvo {
 class PeakInterpolation {
 public:
     // Window types as in the analyser's settings, anything else being Blackman.
-    void Initialise(int windowType, int windowLength, int fftLength);
+    void Prepare(int windowType, int windowLength, int fftLength);
 
     // -0.5 .. 0.5 bins from the local maximum at `peak` to the sinusoid. peak[-1], peak[0] and peak[1] are
     // powers; 0 where these are no peak.

@@ -4,9 +4,9 @@
 
 namespace Corvo {
 
-void PitchDetector::Initialise(const SpectrumFormat& format) {
+void PitchDetector::Prepare(const SpectrumFormat& format) {
     if (format == Format()) return;
-    m_peaks.Initialise(format);
+    m_peaks.Prepare(format);
     // Made now, so that no analysis has to when the spectrum is asked for.
     m_denoised.clear();
     m_denoised.reserve(format.bins);

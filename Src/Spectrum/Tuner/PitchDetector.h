@@ -22,7 +22,7 @@ public:
     const TunerSensitivity& Sensitivity() const { return m_sensitivity; }
     // Before every analysis, in this order. The first allocates only when the format changed; the second
     // measures the floor of the spectrum to analyse, and with `keepDenoised` keeps that spectrum without it.
-    void Initialise(const SpectrumFormat& format);
+    void Prepare(const SpectrumFormat& format);
     void MeasureFloor(std::span<const float> power, bool keepDenoised);
 
     // Of the peaks above the floor, the fundamental that explains them best. With `denoise` they are those of

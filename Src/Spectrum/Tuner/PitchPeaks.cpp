@@ -8,7 +8,7 @@ namespace Corvo {
 namespace {
 
 constexpr float kFloorPerMean = 2.0f;
-// Less than this amplitude is a filter ringing out or rounding, whatever stands above whatever.
+// Peaks below this amplitude are rounding or a filter's ringing; ignored.
 constexpr double kSilentAmplitude = 1e-6;
 constexpr double kTypicalWindowMean = 0.42;
 // Leakage within this many bins of the window counts; further off it is weaker than any partial.
@@ -35,10 +35,10 @@ float PowerRatio(float decibels) { return std::pow(10.0f, 0.1f * decibels); }
 
 }  // namespace
 
-void PitchPeaks::Initialise(const SpectrumFormat& format) {
+void PitchPeaks::Prepare(const SpectrumFormat& format) {
     m_format = format;
-    m_interpolation.Initialise(format.windowType, format.windowLength, format.fftLength);
-    m_floor.Initialise(format.bins, static_cast<double>(format.fftLength) / format.windowLength);
+    m_interpolation.Prepare(format.windowType, format.windowLength, format.fftLength);
+    m_floor.Prepare(format.bins, static_cast<double>(format.fftLength) / format.windowLength);
     m_floorLevels.resize(format.bins);
     // Two neighbours are never both peaks.
     m_peaks.reserve(format.bins / 2 + 1);

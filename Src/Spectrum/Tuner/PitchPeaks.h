@@ -37,7 +37,7 @@ inline constexpr std::size_t kMostPeaks = 32;
 // is louder than they are, as in many an attack, there is none.
 class PitchPeaks {
 public:
-    void Initialise(const SpectrumFormat& format);
+    void Prepare(const SpectrumFormat& format);
     // First of all for a spectrum: finds its floor, of which the others make use.
     void MeasureFloor(std::span<const float> power);
     // Writes what stands above the floor, as many bins as the spectrum has.

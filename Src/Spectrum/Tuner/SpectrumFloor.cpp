@@ -14,7 +14,7 @@ constexpr float kMeanPerQuantile = 1.0f / 0.28768207f;
 
 }  // namespace
 
-void SpectrumFloor::Initialise(std::size_t bins, double stretch) {
+void SpectrumFloor::Prepare(std::size_t bins, double stretch) {
     m_blocks.clear();
     const double narrowest = kNarrowest * std::max(stretch, 1.0);
     // Bin 0 holds what is not noise.

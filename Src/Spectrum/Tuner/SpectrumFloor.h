@@ -14,8 +14,8 @@ namespace Corvo {
 class SpectrumFloor {
 public:
     // `stretch` is the number of bins that one bin of the window covers. Allocates.
-    void Initialise(std::size_t bins, double stretch);
-    // Writes the floor of every bin. Both spans have the initialised length.
+    void Prepare(std::size_t bins, double stretch);
+    // Writes the floor of every bin. Both spans have the length prepared for.
     void Measure(std::span<const float> power, std::span<float> floor);
 
 private:

@@ -3,6 +3,9 @@
 
 #include "Spectrum/Tuner/PitchDetector.h"
 
+// HPS: harmonic product spectrum (M. R. Schroeder, "Period histogram and product spectrum", J. Acoust. Soc.
+// Am. 43, 1968). Five spectra are multiplied; a maximum counts when it stands 55 dB above the valleys beside
+// it.
 namespace Corvo {
 namespace {
 

@@ -1,5 +1,7 @@
 #include "Spectrum/Tuner/PitchDetector.h"
 
+// HPS denoise: a harmonic product spectrum (see TuneHPS.cpp) of what stands above the noise. It has no
+// constants of its own: the sensitivity's say what stands above, HarmonicMatching's what fits a partial.
 namespace Corvo {
 
 // Levels in decibels above the weakest that counts, summed over a candidate's partials: the logarithm of a

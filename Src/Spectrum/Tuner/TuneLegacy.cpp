@@ -3,6 +3,8 @@
 
 #include "Spectrum/Tuner/PitchDetector.h"
 
+// Legacy: the oldest and simplest method, kept for those used to it: the strongest peak, or a subharmonic of
+// it. Its two constants say how deep a subharmonic is tried and how many of its partials must be there.
 namespace Corvo {
 namespace {
 

@@ -3,6 +3,8 @@
 
 #include "Spectrum/Tuner/PitchDetector.h"
 
+// Pseudo HPS: a harmonic product spectrum (see TuneHPS.cpp) made of the peaks alone, so that partials may lie
+// between bins. Its two constants say how far a peak may lie from its partial and how partials are weighed.
 namespace Corvo {
 namespace {
 

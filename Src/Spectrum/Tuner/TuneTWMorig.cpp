@@ -3,6 +3,7 @@
 
 #include "Spectrum/Tuner/PitchDetector.h"
 
+// TWM: two-way mismatch, in its original form; the constants are those of the article below.
 namespace Corvo {
 namespace {
 

@@ -10,13 +10,14 @@
 #include "Spectrum/Tuner/TunerNotes.h"
 #include "Spectrum/Tuner/TunerSensitivity.h"
 
+using Corvo::kTunedQuanta;
 using Corvo::kTunerSensitivities;
+using Corvo::TunerNotes;
 
 namespace {
 
 constexpr int kNamings = 3;
 constexpr float kDefaultQuantum = 2.0f;
-constexpr std::array kQuantumPresets{0.1f, 0.5f, 1.0f, 2.0f, 5.0f, 10.0f};
 constexpr double kRefreshRate = 30.0;
 // Of two analyses, where each refresh brings one: some displays refresh after 30 ms.
 constexpr double kShortestPeriod = 0.030;
@@ -26,6 +27,8 @@ constexpr double kStableOctaves = 10.0 / 1200.0;
 constexpr int kFirstConfirmations = 2;
 // An analysis this much later than its hop says, in refreshes, is taken to be missing: hosts feed in blocks.
 constexpr double kLate = 8.0;
+constexpr double kLargestCalibration = 50.0;  // cents
+constexpr int kPlainLines = 2, kLinesWithTuning = 3;
 
 constexpr const char* kNoteNames[kNamings][12] = {
     {"A", "A#", "B", "C", "C#", "D", "D#", "E", "F", "F#", "G", "G#"},
@@ -40,11 +43,22 @@ struct Choices {
     std::atomic<bool> showDenoised{false};
 };
 Choices g_choices;
+std::atomic<TuningListener*> g_tuningListener{nullptr};
+
+void TellOfTuning() {
+    if (TuningListener* const listener = g_tuningListener) listener->NotesMustBeRecomputed();
+}
+
+void Calibrate(double base) {
+    TunerNotes::Shared().SetBase(base);
+    TellOfTuning();
+}
 
 bool Within(int index, std::size_t count) { return index >= 0 && static_cast<std::size_t>(index) < count; }
 
 }  // namespace
 
+TuningListener::~TuningListener() = default;
 TunerDisplayListener::~TunerDisplayListener() = default;
 
 Tuner::Tuner() : m_detector(std::make_unique<Corvo::PitchDetector>()) {}
@@ -57,6 +71,18 @@ void Tuner::SetShowDenoisedSpectrum(bool show) { g_choices.showDenoised = show; 
 bool Tuner::GetShowDenoisedSpectrum() { return g_choices.showDenoised; }
 const std::vector<float>& Tuner::GetDenoisedSpectrum() const { return m_detector->Denoised(); }
 
+void Tuner::SetTemperament(int temperament) {
+    if (TunerNotes::Shared().SetTemperament(temperament)) TellOfTuning();
+}
+int Tuner::GetTemperament() { return TunerNotes::Shared().Temperament(); }
+bool Tuner::IsTemperamentChanged() { return TunerNotes::Shared().IsChanged(); }
+const char* Tuner::GetTemperamentName(int temperament) { return Corvo::TemperamentName(temperament); }
+const char* Tuner::GetCurrentTemperamentName() { return GetTemperamentName(GetTemperament()); }
+void Tuner::SetTuningListener(TuningListener* listener) { g_tuningListener = listener; }
+void Tuner::CookNotesFrequencies(bool force) { TunerNotes::Shared().Cook(force); }
+double Tuner::GetNoteFrequency(int entry) { return TunerNotes::Shared().Frequency(entry); }
+double Tuner::GetCalibrationBase() { return TunerNotes::Shared().Base(); }
+
 void Tuner::SetNoteNaming(int naming) { g_choices.naming = Within(naming, kNamings) ? naming : 0; }
 int Tuner::GetNoteNaming() { return g_choices.naming; }
 const char* Tuner::GetNoteName(int note) {
@@ -66,8 +92,8 @@ const char* Tuner::GetNoteName(int note) {
 void Tuner::SetTunedQuantum(float cents) { g_choices.quantum = cents; }
 float Tuner::GetTunedQuantum() { return g_choices.quantum; }
 void Tuner::SetTunedQuantumPreset(int preset) {
-    SetTunedQuantum(Within(preset, kQuantumPresets.size()) ? kQuantumPresets[static_cast<std::size_t>(preset)]
-                                                           : kDefaultQuantum);
+    SetTunedQuantum(Within(preset, kTunedQuanta.size()) ? kTunedQuanta[static_cast<std::size_t>(preset)]
+                                                        : kDefaultQuantum);
 }
 
 void Tuner::SetSensibilityPreset(int preset) {
@@ -133,7 +159,7 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
     DoAsAsked();
     const int window = windowLength >= 1 ? std::min(windowLength, fftLength) : fftLength;
     const std::size_t bins = std::min(power.size(), static_cast<std::size_t>(fftLength / 2));
-    m_detector->Initialise({fftLength, window, m_windowType, samplingRate, bins});
+    m_detector->Prepare({fftLength, window, m_windowType, samplingRate, bins});
     const std::span<const float> spectrum(power.data(), bins);
 
     m_detector->MeasureFloor(spectrum, denoise || g_choices.showDenoised);
@@ -188,7 +214,7 @@ void Tuner::DoAsAsked() {
 void Tuner::Follow(double hz, float prominence, double seconds) {
     const Corvo::TunerSensitivity& sensitivity = m_detector->Sensitivity();
     const bool heard = hz > 0.0;
-    const Corvo::NearestNote nearest = heard ? Corvo::FindNearestNote(hz) : Corvo::NearestNote{};
+    const Corvo::NearestNote nearest = heard ? TunerNotes::Shared().FindNearest(hz) : Corvo::NearestNote{};
     const TunedNote note{nearest.note, nearest.octave}, shown = GetTunedNote();
     const bool same = heard && note == shown;
     const bool other = heard && !same && prominence >= sensitivity.onsetDb;
@@ -261,3 +287,22 @@ void Tuner::RememberPitch(double hz, double seconds) {
     }
     m_stableFrequency = highest - lowest <= kStableOctaves ? std::exp2(sum / needed) : 0.0;
 }
+
+bool TunerCalibrateNow(const Tuner& tuner) {
+    const double heard = tuner.GetStableFrequency();
+    if (heard <= 0.0) return false;
+    const double cents = TunerNotes::Shared().FindNearest(heard).cents;
+    const double limited = std::clamp(cents, -kLargestCalibration, kLargestCalibration);
+    Calibrate(Tuner::GetCalibrationBase() * std::exp2(limited / 1200.0));
+    return true;
+}
+void TunerCalibrateReset() { Calibrate(TunerNotes::kStandardBase); }
+bool TunerIsNonstandardCalibration() { return Tuner::GetCalibrationBase() != TunerNotes::kStandardBase; }
+bool TunerCalibrationNotStandardOrNotUseEqualTemperament() {
+    return TunerIsNonstandardCalibration() || Tuner::GetTemperament() != 0;
+}
+int TunerGetNumLines() {
+    return TunerCalibrationNotStandardOrNotUseEqualTemperament() ? kLinesWithTuning : kPlainLines;
+}
+bool TunerIsTracking(const Tuner& tuner) { return tuner.IsTracking(); }
+void CookNotesFreqs() { Tuner::CookNotesFrequencies(true); }

@@ -8,8 +8,8 @@
 
 #include "Platform/Export.h"
 
-class kivspectrum;
 namespace Corvo {
+class Analyser;
 class PitchDetector;
 struct NearestNote;
 }  // namespace Corvo
@@ -46,8 +46,8 @@ struct TunedNote {
 // read anywhere, value by value: two values may stem from two analyses.
 //
 // A pitch below some 6 bins of the window (6 sampling rate / window length: 32 Hz with 8192 samples at
-// 44.1 kHz, 70 Hz at 96 kHz) is not told from its own overtones, whatever the sensitivity allows; lower ones
-// want a longer window.
+// 44.1 kHz, 70 Hz at 96 kHz) cannot be told apart from its overtones, whatever the sensitivity allows; lower
+// ones want a longer window.
 class DSP_API Tuner {
 public:
     // Silent, with the sensitivity "Standard".
@@ -168,7 +168,7 @@ public:
     const std::vector<float>& GetDenoisedSpectrum() const;
 
 private:
-    friend class kivspectrum;
+    friend class Corvo::Analyser;
     // Tune without telling the listener; true when it ought to be told. For the analyser, which does so when
     // it has let go of its lock.
     bool Analyse(const std::vector<float>& power, int fftLength, int hopLength, int windowLength,

@@ -45,4 +45,7 @@ inline constexpr std::array kTunerSensitivities{
 };
 // clang-format on
 
+// Cents within which a note counts as tuned, by preset.
+inline constexpr std::array kTunedQuanta{0.1f, 0.5f, 1.0f, 2.0f, 5.0f, 10.0f};
+
 }  // namespace Corvo

@@ -8,18 +8,6 @@ namespace {
 
 using Steps = std::array<float, 12>;
 
-constexpr char kNames[kTemperaments][30] = {"Equal",
-                                            "Pythagorean",
-                                            "Meantone (1/4 tone)",
-                                            "Werckmeister III",
-                                            "Just (Kepler)",
-                                            "Just (Fogliano I)",
-                                            "Just (Fogliano II)",
-                                            "Meantone (Romieu)",
-                                            "Meantone (Zarlino)",
-                                            "Meantone (Salinas)",
-                                            "Vallotti"};
-
 constexpr float kSyntonic = 1.0125f;                 // 81/80
 constexpr float kPythagorean = 1.0136432647705078f;  // 3^12 / 2^19
 
@@ -53,7 +41,7 @@ constexpr Row kRows[] = {
 }  // namespace
 
 const char* TemperamentName(int temperament) {
-    return temperament >= 0 && temperament < kTemperaments ? kNames[temperament] : "";
+    return temperament >= 0 && temperament < kTemperaments ? kTemperamentNames[temperament] : "";
 }
 
 std::array<double, kTableNotes> TemperedNotes(int temperament, double base) {

@@ -7,7 +7,19 @@ namespace Corvo {
 inline constexpr int kTemperaments = 11;
 inline constexpr int kTableNotes = 13;  // A to the A above
 
-// 0 Equal .. 10 Vallotti; empty outside.
+inline constexpr char kTemperamentNames[kTemperaments][30] = {"Equal",
+                                                              "Pythagorean",
+                                                              "Meantone (1/4 tone)",
+                                                              "Werckmeister III",
+                                                              "Just (Kepler)",
+                                                              "Just (Fogliano I)",
+                                                              "Just (Fogliano II)",
+                                                              "Meantone (Romieu)",
+                                                              "Meantone (Zarlino)",
+                                                              "Meantone (Salinas)",
+                                                              "Vallotti"};
+
+// Empty outside 0..10.
 const char* TemperamentName(int temperament);
 
 // The octave of notes from `base` (Hz), A, to twice it. An index outside 1..10 is tuned equally.

@@ -1,62 +1,45 @@
 #pragma once
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
 #include <cmath>
 #include <cstddef>
-#include <numbers>
-#include <span>
 #include <vector>
 
-#include "Spectrum/Fft/CorvoFFT.h"
-#include "Spectrum/Tuner/Tuner.h"
+#include "Spectrum/AnalyserFixture.h"
+#include "Spectrum/Tuner/TunerSounds.h"
 
-// Class-wide choices start every test at their defaults.
-class TunerTest : public testing::Test {
-protected:
-    TunerTest() { Reset(); }
-    ~TunerTest() override { Reset(); }
+class TunerTest : public AnalyserTest {};
 
-private:
-    static void Reset() {
-        Tuner::SetDetectionMethod(0);
-        Tuner::SetShowDenoisedSpectrum(false);
-        Tuner::SetTunedQuantumPreset(3);
-        Tuner::SetNoteNaming(0);
-        Tuner::SetTemperament(0);
-        TunerCalibrateReset();
-    }
+// What each sensitivity is defined to be.
+struct TunerSensitivityRow {
+    double lowest, highest, partial, onset, range;
+    int release, hold, confirm, harmonics, reported;
 };
+// clang-format off
+constexpr TunerSensitivityRow kSensitivityRows[] = {
+    { 30, 17000,  5, 15, 25, 60, 40, 3, 3, 2},
+    { 70, 10000, 25, 40, 20, 40, 25, 6, 3, 1},
+    { 30, 17000,  4, 11, 25, 60, 40, 2, 2, 2},
+    { 70, 15000,  8, 18, 13, 40, 30, 8, 3, 3},
+    { 40, 12000, 25, 35, 15, 50, 30, 4, 7, 4},
+    {100, 19000, 15, 35, 15, 50, 30, 4, 2, 5},
+};
+// clang-format on
 
-// A tuner behind windows and a transform of its own.
+// A tuner of its own behind an analyser's spectra.
 class TunerProbe {
 public:
-    explicit TunerProbe(int rate, int length = 8192, int window = 0, int type = 4)
-        : m_rate(rate), m_windowLength(window > 0 ? window : length) {
-        m_fft.AllocateReal(length, 0);
-        m_transform.resize(static_cast<std::size_t>(length));
-        m_power.resize(m_transform.size() / 2);
-        m_window.resize(static_cast<std::size_t>(m_windowLength));
-        constexpr double kSums[5][3] = {{1, 0, 0}, {}, {0.5, 0.5, 0}, {0.54, 0.46, 0}, {0.42, 0.5, 0.08}};
-        for (std::size_t n = 0; n < m_window.size(); ++n) {
-            const double x = static_cast<double>(n) / m_windowLength, turn = 2.0 * std::numbers::pi * x;
-            const auto& a = kSums[type];
-            m_window[n] =
-                static_cast<float>(type == 1 ? 1.0 - std::abs(2.0 * x - 1.0)
-                                             : a[0] - a[1] * std::cos(turn) + a[2] * std::cos(2.0 * turn));
-        }
-        tuner.SetWindowType(type);
+    explicit TunerProbe(int rate, int length = 8192) : m_rate(rate), m_length(length) {
+        kivspectrum::settings = {};
+        kivspectrum::settings.window_length = length;
+        kivspectrum::settings.hop_length = 1;
+        m_analyser.init();
+        m_analyser.SetOn(true);
     }
 
     const std::vector<float>& Transform(const float* samples) {
-        std::fill(m_transform.begin(), m_transform.end(), 0.0f);
-        for (std::size_t n = 0; n < m_window.size(); ++n) m_transform[n] = samples[n] * m_window[n];
-        m_fft.DoFFTReal(m_transform.data(), 0, 0);
-        for (std::size_t k = 0; k < m_power.size(); ++k)
-            m_power[k] =
-                m_transform[2 * k] * m_transform[2 * k] + m_transform[2 * k + 1] * m_transform[2 * k + 1];
-        return m_power;
+        m_analyser.Feed(samples, m_length, 1, 1);
+        m_analyser.PrepareFFTForDrawing(m_rate, true, false, false, false);
+        return m_analyser.GetPower();
     }
     // Hop 1: every analysis counts as one refresh.
     void Tune(const float* samples, bool denoise = false) { Tune(Transform(samples), denoise); }
@@ -73,14 +56,12 @@ public:
         return tuner.GetHeardFrequency();
     }
     void Tune(const std::vector<float>& power, bool denoise = false) {
-        tuner.Tune(power, m_transform, static_cast<int>(m_transform.size()), 1, m_windowLength, m_rate, true,
-                   denoise);
+        tuner.Tune(power, {}, m_length, 1, m_length, m_rate, true, denoise);
     }
 
     Tuner tuner;
 
 private:
-    int m_rate, m_windowLength;
-    CorvoFFT m_fft;
-    std::vector<float> m_transform, m_window, m_power;
+    int m_rate, m_length;
+    kivspectrum m_analyser;
 };

@@ -2,7 +2,7 @@
 
 #include <cmath>
 #include <cstddef>
-#include <initializer_list>
+#include <cstdint>
 #include <numbers>
 #include <vector>
 
@@ -76,8 +76,7 @@ inline std::vector<float> Sound(Kind kind, double f0, int rate, std::size_t fram
 }
 
 // Partials of the same amplitude; one that is named twice sounds twice as loud.
-inline std::vector<float> Partials(std::initializer_list<int> numbers, double hz, int rate,
-                                   std::size_t frames) {
+inline std::vector<float> Partials(const std::vector<int>& numbers, double hz, int rate, std::size_t frames) {
     std::vector<float> sum(frames);
     for (const int n : numbers) {
         const auto partial = TestSupport::Sine<float>(frames, n * hz, rate, 0.1);

@@ -5,8 +5,6 @@
 
 #include "Drawing/Views/Views.h"
 #include "Spectrum/AnalyserFixture.h"
-#include "Spectrum/Sonogram/Sonogram.h"
-#include "Spectrum/Tuner/Tuner.h"
 #include "Support/NoDrawing.h"
 
 namespace {
@@ -63,13 +61,6 @@ TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
     stop = true;
     for (auto& thread : threads) thread.join();
     EXPECT_GT(frames, 0);
-    Corvo::Sonogram::SetSpeedIndex(3);
-    Corvo::Sonogram::SetColourScheme(0);
-    Tuner::SetDetectionMethod(0);
-    Tuner::SetShowDenoisedSpectrum(false);
-    Tuner::SetTemperament(0);
-    Tuner::SetNoteNaming(0);
-    Tuner::SetTunedQuantumPreset(3);
 }
 
 }  // namespace

@@ -1,0 +1,267 @@
+#include "Spectrum/Analyser.h"
+
+#include <algorithm>
+#include <bit>
+#include <cmath>
+#include <cstddef>
+#include <mutex>
+#include <numbers>
+#include <utility>
+
+#include "Platform/DenormalGuard.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
+#include "Spectrum/Scales/SpectrumLimits.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
+
+namespace Corvo {
+namespace {
+
+using Lock = std::lock_guard<CriticalSection>;
+using Mode = SpectrumDisplay;
+
+constexpr int kNoOrder = 100;  // of a length that is not a power of two
+constexpr float kCalm = 0.035f, kBrisk = 0.15f;
+constexpr float kSonogramSmoothing[] = {0.155f, 0.12f, 0.1f, 0.09f, 0.08f, 0.07f, 0.065f, 0.05f, 0.035f};
+
+int OrderOf(std::int32_t length) {
+    const auto bits = static_cast<std::uint32_t>(length);
+    return length > 0 && std::has_single_bit(bits) ? std::countr_zero(bits) : kNoOrder;
+}
+
+std::size_t Entries(std::int32_t length) { return static_cast<std::size_t>(BufferLength(length)); }
+
+int FilterLength(const SpectrumSettings& settings) {
+    return std::clamp(settings.smoothing_filter_length, 0, kMaxFilterSpectra);
+}
+
+bool SameBuffers(const SpectrumSettings& a, const SpectrumSettings& b) {
+    return a.fft_length == b.fft_length && a.window_type == b.window_type &&
+           a.window_length == b.window_length && a.hop_length == b.hop_length;
+}
+
+}  // namespace
+
+Analyser::Analyser()
+    : m_order(kNoOrder),
+      m_fftOrder(kNoOrder),
+      m_drawer(std::make_unique<SpectrumDrawer>(SpectrumSettings{})),
+      m_filter(std::make_unique<VectorInterpolationFilterFloat>()),
+      m_tuner(std::make_unique<Tuner>()),
+      m_sonogram(std::make_unique<Sonogram>()) {
+    m_built.fft_length = m_built.window_length = m_built.hop_length = 0;
+    m_built.window_type = -1;
+}
+Analyser::~Analyser() = default;
+
+void Analyser::SetOn(bool on) {
+    state.on = on;
+    m_drawer->SetOn(on);
+}
+
+void Analyser::SetTunerOn(bool on) {
+    if (on) m_tuner->Forget();
+    state.tunerOn = on;
+    state.tunerVisible = on;
+}
+
+bool Analyser::ToggleTuner() {
+    const bool start = !(state.tunerOn && state.on);
+    SetTunerOn(start);
+    if (!start) return false;
+    SetOn(true);
+    state.frozen = false;
+    return true;
+}
+
+void Analyser::SetSamplingRate(int samplingRate) {
+    if (samplingRate > 0) state.samplingRate = samplingRate;
+}
+
+void Analyser::SetPointer(float x, float y) {
+    state.pointerX = x;
+    state.pointerY = y;
+}
+
+void Analyser::ToggleDisplayMode() {
+    const Lock lock(m_lock);
+    const auto next = static_cast<DisplayMode>((state.displayMode + 1) % (Mode::display_tuner + 1));
+    state.displayMode = next;
+    state.showSonogram = next == Mode::display_sonogram || next == Mode::display_both;
+}
+
+void Analyser::ShowSonogram(bool show) {
+    const Lock lock(m_lock);
+    state.showSonogram = show;
+    const DisplayMode mode = state.displayMode;
+    if (show && mode == Mode::display_spectrum) state.displayMode = Mode::display_both;
+    if (!show && (mode == Mode::display_sonogram || mode == Mode::display_both))
+        state.displayMode = Mode::display_spectrum;
+}
+
+void Analyser::ResetPeaks() {
+    const Lock lock(m_lock);
+    m_drawer->peak_reset();
+}
+
+void Analyser::Prepare(const SpectrumSettings& settings) {
+    const Lock lock(m_lock);
+    m_capture.RestartHop();
+    if (SameBuffers(settings, m_built)) {
+        const int spectra = FilterLength(settings);
+        if (spectra != m_filter->GetSpectra() && !m_power.empty()) ResizeFilter(spectra);
+        return;
+    }
+    m_order = OrderOf(settings.fft_length);
+    m_built = settings;
+    UpdateDrawer(settings);
+    try {
+        Allocate(settings, true);
+    } catch (...) {
+        m_built.hop_length = std::numeric_limits<std::int32_t>::min();  // the next call builds again
+        throw;
+    }
+    m_capture.ClearPending();
+}
+
+void Analyser::Allocate(const SpectrumSettings& settings, bool reset) {
+    const Lock lock(m_lock);
+    m_powerIsFrame = false;
+    if (m_order != m_fftOrder) {
+        m_fft.Free();
+        if (m_order != kNoOrder) m_fft.AllocateReal(m_built.fft_length, 0);
+        m_fftOrder = m_order;
+    }
+    if (!reset || state.frozen) {
+        m_capture.Resize(0, 0);
+        for (auto* buffer : {&m_samples, &m_transform, &m_window, &m_power}) *buffer = {};
+        m_drawer->Deallocate();
+        m_filter->Resize(0, 0);
+        return;
+    }
+    m_capture.Resize(BufferLength(m_built.fft_length), BufferLength(m_built.window_length));
+    m_capture.SetHop(m_built.hop_length >= 1 ? m_built.hop_length : m_built.window_length);
+    m_samples.resize(Entries(m_built.fft_length));
+    m_transform.resize(Entries(m_built.fft_length));
+    m_power.resize(Entries(m_built.fft_length) / 2);
+    m_drawer->Allocate();
+    m_window.resize(Entries(m_built.window_length));
+    ResizeFilter(FilterLength(settings));
+    CookWindow();
+}
+
+// As long as the window or half the transform, whichever is more: a padded transform has more bins than the
+// window has samples.
+void Analyser::ResizeFilter(int spectra) {
+    m_filter->Resize(spectra,
+                     std::max(BufferLength(m_built.window_length), BufferLength(m_built.fft_length) / 2));
+}
+
+void Analyser::CookWindow() {
+    const int length = std::min(m_built.window_length, m_built.fft_length);
+    if (m_window.size() < static_cast<std::size_t>(std::max(m_built.window_length, 0))) return;
+    if (m_built.window_type < 0 || m_built.window_type >= kWindowTypes) return;
+    const double turn = 2.0 * std::numbers::pi / length;
+    const auto shape = [&](int n) {
+        switch (m_built.window_type) {
+            case 0:
+                return 1.0;
+            case 1:
+                return n <= length / 2 ? 2.0 * n / length : 2.0 - 2.0 * n / length;
+            case 2:
+                return 0.5 - 0.5 * std::cos(turn * n);
+            case 3:
+                return 0.54 - 0.46 * std::cos(turn * n);
+            default:
+                return 0.42 - 0.5 * std::cos(turn * n) + 0.08 * std::cos(2.0 * turn * n);
+        }
+    };
+    for (int n = 0; n < length; ++n) m_window[static_cast<std::size_t>(n)] = static_cast<float>(shape(n));
+}
+
+bool Analyser::HasFrame() const {
+    const Lock lock(m_lock);
+    return !m_power.empty() && !state.frozen && state.on && m_capture.Pending();
+}
+
+float Analyser::SmoothingCoefficient(bool fast, bool sonogramMode) {
+    if (sonogramMode) return kSonogramSmoothing[Sonogram::GetSpeedIndex()];
+    return fast ? kCalm : kBrisk;
+}
+
+void Analyser::ProcessFrame(const SpectrumSettings& settings, int samplingRate, float coefficient) {
+    const DenormalGuard denormals;
+    PerformFFT();
+    ComputePower();
+    m_powerIsFrame = true;
+    if (samplingRate != m_drawer->GetSamplingFrequency()) m_drawer->UpdateSamplingFrequency(samplingRate);
+    UpdateDrawer(settings);
+    m_drawer->SmoothFftSpectrum(m_power, coefficient, *m_filter);
+    m_frameForSonogram = true;
+}
+
+void Analyser::PerformFFT() {
+    if (m_transforming.exchange(true)) return;
+    {
+        const Lock lock(m_lock);
+        const DenormalGuard denormals;
+        m_capture.CopyTo(m_samples);
+        // Alike, unless memory ran out while they grew.
+        const std::size_t length = std::min(m_samples.size(), m_transform.size());
+        const std::size_t windowed = std::min(m_window.size(), length);
+        for (std::size_t i = 0; i < windowed; ++i) m_transform[i] = m_samples[i] * m_window[i];
+        std::copy(m_samples.begin() + static_cast<std::ptrdiff_t>(windowed),
+                  m_samples.begin() + static_cast<std::ptrdiff_t>(length),
+                  m_transform.begin() + static_cast<std::ptrdiff_t>(windowed));
+        if (m_transform.size() == static_cast<std::size_t>(m_built.fft_length))
+            m_fft.DoFFTReal(m_transform.data(), 0, 0);
+    }
+    m_transforming = false;
+}
+
+// Entry 0 takes the Nyquist bin along with DC: the packed spectrum keeps both there. What is not a finite
+// number counts as nothing, or it would stay in the smoothed spectrum for good.
+void Analyser::ComputePower() {
+    const float* const packed = m_transform.data();
+    float* const power = m_power.data();
+    constexpr float kLargest = std::numeric_limits<float>::max();
+    for (std::size_t k = 0; k < m_power.size(); ++k) {
+        const float sum = packed[2 * k] * packed[2 * k] + packed[2 * k + 1] * packed[2 * k + 1];
+        power[k] = sum <= kLargest ? sum : 0.0f;
+    }
+}
+
+void Analyser::UpdateDrawer(const SpectrumSettings& settings) {
+    const bool resized = settings.fft_length != m_drawer->GetSettings().fft_length;
+    m_drawer->UpdateSettings(settings);
+    if (resized) m_drawer->ReallocateBuffers();
+}
+
+// A menu command may rebuild the buffers, even in answer to the frame's message: then there is nothing to
+// tune until the next frame.
+bool Analyser::Tune(int samplingRate) {
+    const Lock lock(m_lock);
+    if (!m_powerIsFrame) return false;
+    m_tuner->SetWindowType(m_built.window_type);
+    return m_tuner->Analyse(m_power, m_built.fft_length, m_built.hop_length, m_built.window_length,
+                            samplingRate, true, false);
+}
+
+bool Analyser::LetTunerWait() { return m_tuner->Wait(); }
+
+bool Analyser::AnnounceNote() {
+    m_tuner->Announce();
+    return m_tuner->IsTuned();
+}
+
+bool Analyser::AdvanceSonogram() {
+    // The smoothed spectrum is rebuilt under this lock.
+    const Lock lock(m_lock);
+    if (!state.showSonogram || !state.on || state.frozen || m_drawer->GetSamplingFrequency() <= 0)
+        return false;
+    const double pitch = state.tunerOn ? m_tuner->GetHeardFrequency() : 0.0;
+    return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch));
+}
+
+}  // namespace Corvo

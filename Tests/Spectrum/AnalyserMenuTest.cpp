@@ -1,0 +1,205 @@
+#include "Spectrum/AnalyserMenu.h"
+
+#include <climits>
+#include <cstring>
+#include <memory>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "Spectrum/AnalyserFixture.h"
+
+namespace {
+
+using Record = kivspectrum::spectrum_settings;
+
+class MenuTest : public AnalyserTest {
+protected:
+    kivspectrum m_analyser;
+};
+
+// One entry of every kind of command, where an offset or a shift by one would show; the rest is the table.
+TEST_F(MenuTest, StoresWhatACommandStandsFor) {
+    struct Case {
+        int command;
+        std::int32_t Record::*field;
+        std::int32_t value;
+    };
+    for (const Case& c :
+         {Case{1201, &Record::fft_length, 4096},  // raised to the window's length
+          {1208, &Record::fft_length, 16384},    {1200, &Record::fft_length, 4096},
+          {1225, &Record::window_length, 4096},  {1264, &Record::hop_length, 2048},
+          {1226, &Record::hop_length, 4096},  // the hop follows the new window
+          {1267, &Record::hop_length, 512},      {1262, &Record::hop_length, 8192},
+          {1241, &Record::window_type, 1},       {1253, &Record::view_option_d, 3},
+          {1254, &Record::view_option_c, 0},     {1282, &Record::view_flag_a, 1},
+          {1284, &Record::view_option_a, -1},    {1292, &Record::view_option_b, 1},
+          {1299, &Record::peak_decay_mode, 3},   {1302, &Record::peak_hold_mode, 2},
+          {1306, &Record::view_flag_b, 0},       {1307, &Record::view_option_e, 1},
+          {1312, &Record::view_flag_c, 0},       {1314, &Record::time_smoothing, 0},
+          {1395, &Record::smoothing_type, 2},    {1402, &Record::smoothing_filter_length, 15}}) {
+        EXPECT_TRUE(m_analyser.popupmenu_process(c.command)) << c.command;
+        EXPECT_EQ(Settings().*c.field, c.value) << c.command;
+    }
+    m_analyser.popupmenu_process(1316);
+    EXPECT_TRUE(Settings().view_flag_d);
+    // A negative overlap is the host's own business.
+    Settings().overlap = -0.5f;
+    m_analyser.popupmenu_process(1221);
+    EXPECT_EQ(Settings().hop_length, 8192);
+}
+
+// The table has just the commands that are carried out, groups together. A choice is ticked once it is made,
+// and of its group it alone; a switch changes its tick.
+TEST_F(MenuTest, OffersWhatItCarriesOut) {
+    const std::set<int> switches{1258, 1282, 1283, 1306, 1312, 1314}, actions{1295, 1350};
+    const std::set<std::string> severalTicks{"Analyser", "Smoothing", "Show", "Tuner", "Tuner sensitivity"};
+    Settings().window_length = 128;  // no transform is shorter
+    std::set<int> commands;
+    std::set<std::string> groups;
+    std::string group;
+    for (const auto& entry : Corvo::AnalyserMenu()) {
+        EXPECT_TRUE(commands.insert(entry.command).second) << entry.command;
+        if (group != entry.group) {
+            EXPECT_TRUE(groups.insert(group = entry.group).second) << group;
+        }
+        EXPECT_STRNE(entry.text, "") << entry.command;
+        const bool before = m_analyser.popupmenu_checked(entry.command);
+        EXPECT_TRUE(m_analyser.popupmenu_process(entry.command)) << entry.command;
+        EXPECT_EQ(m_analyser.popupmenu_checked(entry.command),
+                  switches.count(entry.command) ? !before : !actions.count(entry.command))
+            << entry.command;
+        int ticks = 0;
+        for (const auto& other : Corvo::AnalyserMenu())
+            ticks += group == other.group && m_analyser.popupmenu_checked(other.command);
+        EXPECT_TRUE(ticks == 1 || severalTicks.count(group)) << entry.command;
+    }
+    EXPECT_EQ(commands.size(), 115u);
+    const Record settings = Settings();
+    for (int command = 1190; command < 1410; ++command) {
+        if (commands.count(command)) continue;
+        EXPECT_FALSE(m_analyser.popupmenu_process(command)) << command;
+        EXPECT_FALSE(m_analyser.popupmenu_checked(command)) << command;
+    }
+    EXPECT_EQ(std::memcmp(&settings, &Settings(), sizeof settings), 0);
+}
+
+TEST_F(MenuTest, SetsTheTunersChoices) {
+    kivspectrum other;
+    for (const int command : {1321, 1323, 1334, 1337, 1338, 1345}) m_analyser.popupmenu_process(command);
+    EXPECT_EQ(Tuner::GetDetectionMethod(), 4);
+    EXPECT_TRUE(Tuner::GetShowDenoisedSpectrum());
+    EXPECT_EQ(Tuner::GetTemperament(), 10);
+    EXPECT_EQ(Tuner::GetNoteNaming(), 2);
+    EXPECT_EQ(Tuner::GetTunedQuantum(), 0.1f);
+    EXPECT_EQ(m_analyser.GetTuner()->GetSensibilityPreset(), 1);
+    EXPECT_EQ(other.GetTuner()->GetSensibilityPreset(), 2);
+}
+
+TEST_F(MenuTest, LengthensTheTransformWithTheWindow) {
+    Settings().fft_length_auto = 0;
+    Settings().fft_length = 1024;
+    m_analyser.init();
+    EXPECT_EQ(Settings().fft_length, 4096);
+    EXPECT_EQ(m_analyser.GetBufferInputPoints().size(), 4096u);
+    kivspectrum::lock_init = true;
+    Settings().window_length = 256;
+    m_analyser.init();
+    EXPECT_EQ(m_analyser.GetWindow().size(), 4096u);
+    kivspectrum::lock_init = false;
+    m_analyser.init();
+    EXPECT_EQ(m_analyser.GetWindow().size(), 256u);
+}
+
+// One change reaches every analyser; the tuner of another goes off with the caller's, and none works on less
+// than 8192 samples.
+TEST_F(MenuTest, ReachesEveryLiveAnalyser) {
+    auto gone = std::make_unique<kivspectrum>();
+    kivspectrum other;
+    gone.reset();
+    other.SetTunerOn(true);
+    m_analyser.popupmenu_process(1222);
+    EXPECT_FALSE(other.GetTunerOn());
+    EXPECT_EQ(other.GetWindow().size(), 512u);
+    other.popupmenu_process(1283);
+    EXPECT_TRUE(other.GetTunerOn());
+    other.popupmenu_process(1224);
+    EXPECT_EQ(Settings().window_length, 8192);
+    EXPECT_EQ(m_analyser.GetWindow().size(), 8192u);
+}
+
+TEST_F(MenuTest, SwitchesTunerAndAnalyser) {
+    m_analyser.SetFrozen(true);
+    m_analyser.ToggleTuner();
+    EXPECT_TRUE(m_analyser.GetTunerOn() && m_analyser.GetOn() && !m_analyser.GetFrozen());
+    EXPECT_EQ(m_analyser.GetWindow().size(), 8192u);
+    m_analyser.ToggleTuner();
+    EXPECT_TRUE(!m_analyser.GetTunerOn() && m_analyser.GetOn());
+    // Frozen, the buffers are empty; thawed, they are built again.
+    m_analyser.SetFrozen(true);
+    m_analyser.popupmenu_process(1220);
+    EXPECT_TRUE(m_analyser.GetPower().empty() && m_analyser.GetBufferInputPoints().empty());
+    Feed(m_analyser, std::vector<float>(300, 1.0f));
+    EXPECT_FALSE(Prepare(m_analyser));
+    m_analyser.PerformFFT();
+    m_analyser.SetFrozen(false);
+    EXPECT_EQ(m_analyser.GetPower().size(), 64u);
+    Feed(m_analyser, std::vector<float>(128, 1.0f));
+    EXPECT_TRUE(Prepare(m_analyser));
+}
+
+// A length that the transform cannot have shows nonsense, but nothing worse.
+TEST_F(MenuTest, SurvivesImpossibleLengths) {
+    m_analyser.SetOn(true);
+    for (const std::int32_t length : {0, -5, 1, 3, 1000, 1 << 30, INT32_MIN, INT32_MAX}) {
+        Settings().window_length = Settings().fft_length = length;
+        Settings().smoothing_filter_length = length < 0 ? length : 2;
+        Settings().smoothing_type = 1;
+        m_analyser.ObserverUpdate();
+        Feed(m_analyser, std::vector<float>(5000, 1.0f));
+        Prepare(m_analyser);
+    }
+}
+
+struct Poster : MessagePoster {
+    std::vector<std::pair<int, std::intptr_t>> messages;
+    void Post(int message, std::intptr_t, std::intptr_t detail) override {
+        messages.emplace_back(message, detail);
+    }
+    void Send(int, std::intptr_t, std::intptr_t) override {}
+};
+
+TEST_F(MenuTest, TellsTheHost) {
+    Poster poster;
+    kivspectrum::GetStaticInfo().SetMessagePoster(&poster);
+    kivspectrum::needPrepareBitmap = false;
+    m_analyser.popupmenu_process(1350);
+    EXPECT_TRUE(kivspectrum::needPrepareBitmap.exchange(false));
+    m_analyser.SetOn(true);
+    Feed(m_analyser, std::vector<float>(4096, 1.0f));
+    Prepare(m_analyser);
+    const std::vector<std::pair<int, std::intptr_t>> expected{
+        {kMessageTunerPanelRedraw, 0}, {kMessageSettingsChanged, 1350}, {kMessageFrameReady, 0}};
+    EXPECT_EQ(poster.messages, expected);
+    kivspectrum::SetDpi(144);
+    EXPECT_TRUE(kivspectrum::needPrepareBitmap.exchange(false));
+    kivspectrum::SetDpi(144);
+    EXPECT_FALSE(kivspectrum::needPrepareBitmap);
+}
+
+TEST_F(MenuTest, StepsThroughTheDisplayModes) {
+    for (const auto mode : {kivspectrum::display_sonogram, kivspectrum::display_both,
+                            kivspectrum::display_tuner, kivspectrum::display_spectrum}) {
+        m_analyser.ToggleDisplayMode();
+        EXPECT_EQ(m_analyser.GetDisplayMode(), mode);
+        EXPECT_EQ(m_analyser.IsShowSonogram(),
+                  mode == kivspectrum::display_sonogram || mode == kivspectrum::display_both);
+    }
+    for (const auto mode : {kivspectrum::display_both, kivspectrum::display_spectrum}) {
+        m_analyser.ToggleDisplayMode2();
+        EXPECT_EQ(m_analyser.GetDisplayMode(), mode);
+    }
+}
+
+}  // namespace
