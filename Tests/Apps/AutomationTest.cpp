@@ -105,13 +105,5 @@ TEST_F(Automation, RefusesWhatItCannotPlay) {
     }
 }
 
-// Found out by asking the effect, not from a list.
-TEST_F(Automation, IsRefusedByAnEffectThatPlaysNone) {
-    Save("in.wav", NoiseSound(100));
-    SaveBytes("moves.json", R"([{"parameter": "Pan", "points": [[0, 0.5]]}])");
-    ExpectRefused(Run({"render", "in.wav", "out.wav", "--fx", "Gain", "--automation", "moves.json"}), 2,
-                  {"moves.json", "Gain plays no automation"});
-}
-
 }  // namespace
 }  // namespace AppTest
