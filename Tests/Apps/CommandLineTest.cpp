@@ -123,6 +123,27 @@ const Refusal kEffects[] = {
     {"EQ: 1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;"
      "1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak", "more than 20"},
 };
+// Moves for a chain of tremolo, echo, tremolo.
+const Refusal kMoves[] = {
+    {"[", "is not JSON"},
+    {"7", "not a list of lanes"},
+    {"[7]", "lane 1: a lane is"},
+    {R"([{"effect": "Echo", "parameter": "Depth"}])", "a lane is"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": []}])", "a lane is"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0]]}])", "a point is"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[-1, 0]]}])", "time"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[1e300, 0]]}])", "time"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0, 1.5]]}])", "value"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0, "1"]]}])", "value"},
+    {R"([{"effect": "Ecco", "parameter": "Depth", "points": [[0, 1]]}])", "Ecco"},
+    {R"([{"effect": "Tremolo", "parameter": "Depth", "points": [[0, 1]]}])", "more than once"},
+    {R"([{"effect": 4, "parameter": "Depth", "points": [[0, 1]]}])", "1 to 3"},
+    {R"([{"effect": true, "parameter": "Depth", "points": [[0, 1]]}])", "a name or a place"},
+    {R"([{"parameter": "Depth", "points": [[0, 1]]}])", "\"effect\" is missing"},
+    {R"([{"effect": 1, "parameter": "Wetness", "points": [[0, 1]]}])", "Wetness"},
+    {R"([{"effect": 1, "parameter": "Depth R", "points": [[0, 1]]},
+         {"effect": 1, "parameter": "Depth", "points": [[0, 1]]}])", "lane 2: the same parameter"},
+};
 // clang-format on
 
 // Bad input: one line that names the culprit and what would do, status 2, and no file left behind.
@@ -135,6 +156,12 @@ TEST_F(CommandLine, RefusesBadInput) {
     };
     for (const auto& c : kLines) refuse(c.arguments, c.words);
     for (const auto& c : kEffects) refuse("render in.wav o.wav --fx \"" + c.arguments + "\"", c.words);
+    for (const auto& c : kMoves) {
+        SCOPED_TRACE(c.arguments);
+        SaveBytes("moves.json", c.arguments);
+        refuse("render in.wav o.wav --fx Tremolo --fx Echo --fx Tremolo --automation moves.json",
+               "moves.json: |" + c.words);
+    }
     EXPECT_EQ(Bytes("taken.wav"), "something dear");
     EXPECT_EQ(Load("in.wav").samples, NoiseSound(100).samples);
 }

@@ -86,16 +86,24 @@ TEST_F(RenderCommand, LetsALateEchoRingOut) {
     EXPECT_NEAR(out.back(), 0.25, 1e-6);
 }
 
-// A tremolo that stands still multiplies by 1 / (1 + depth); every step comes on its frame.
+// A tremolo that stands still multiplies by 1 / (1 + depth); every step comes on its frame, whatever the
+// order of the points, on both sides or on one.
 TEST_F(RenderCommand, PlaysAutomation) {
-    Save("in.wav", {1, 48000, kDouble, std::vector<double>(1000, 0.5)});
-    SaveBytes("moves.json", R"([{"parameter": "Depth", "points": [[0, 0], [0.01, 1], [0.015, 0.25]]}])");
+    Save("in.wav", {2, 48000, kDouble, std::vector<double>(2000, 0.5)});
+    SaveBytes("moves.json", R"([
+        {"effect": 1, "parameter": "Depth", "points": [[0.01, 1], [0, 0], [0.015, 0.25]]},
+        {"effect": 3, "parameter": "Depth R", "points": [{"time": 0, "value": 1}]}])");
     for (const std::string block : {"1", "64", "4096"}) {
-        Succeed("render in.wav out.wav -y --fx \"Tremolo: Frequency=0\" --automation moves.json --block " +
-                block);
+        Succeed(
+            "render in.wav out.wav -y --automation moves.json --fx \"Tremolo: Frequency=0\" --fx Gain "
+            "--fx \"Tremolo: Frequency=0, Depth=0\" --block " +
+            block);
         const auto out = Load("out.wav").samples;
-        for (std::size_t i = 0; i < out.size(); ++i)
-            ASSERT_DOUBLE_EQ(out[i], 0.5 / (i < 480 ? 1.0 : i < 720 ? 2.0 : 1.25)) << i;
+        for (std::size_t i = 0; i < out.size() / 2; ++i) {
+            const double expected = 0.5 / (i < 480 ? 1.0 : i < 720 ? 2.0 : 1.25);
+            ASSERT_NEAR(out[2 * i], expected, 1e-7) << i;
+            ASSERT_NEAR(out[2 * i + 1], expected / 2.0, 1e-7) << i;
+        }
     }
 }
 
