@@ -27,6 +27,9 @@ BUILD_PACKAGES=(g++ cmake ninja-build ccache pkg-config libxsimd-dev libsndfile1
     nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev fonts-dejavu-core)
 TEST_PACKAGES=(libgtest-dev sonic-pi-samples binutils)
 
+# What installs them by hand.
+install_command() { echo "apt-get install --no-install-recommends ${BUILD_PACKAGES[*]} ${TEST_PACKAGES[*]}"; }
+
 # Configures and builds one preset, or the named targets of it.
 build_preset() {
     local preset=$1

@@ -1,16 +1,15 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
-#include <memory>
 #include <numeric>
 #include <optional>
 #include <span>
 #include <string>
 #include <vector>
 
+#include "Arguments.h"
 #include "AudioReader.h"
 #include "AudioWriter.h"
-#include "Commands.h"
 #include "DSP/Resampler/SamplingFrequencyConverter.h"
 #include "Errors.h"
 #include "Progress.h"
@@ -22,13 +21,6 @@ namespace {
 constexpr int kLowestRate = 1000, kHighestRate = 768000;
 constexpr int kBlock = 4096;
 constexpr double kMostCents = 20.0;
-
-struct Arguments {
-    std::string input, output, format, dither = "none";
-    int rate = 0;
-    bool exact = false;
-    WritingOptions writing;
-};
 
 struct NamedCurve {
     const char* name;
@@ -126,7 +118,9 @@ void Store(std::span<double> samples, std::int64_t& clipped) {
     }
 }
 
-void Run(Arguments arguments) {
+}  // namespace
+
+void RunConvert(ConvertArguments arguments) {
     auto& rules = arguments.writing.rules;
     if (arguments.rate < kLowestRate || arguments.rate > kHighestRate)
         throw UserError("--rate cannot be " + std::to_string(arguments.rate) +
@@ -175,24 +169,6 @@ void Run(Arguments arguments) {
     }
     output.Commit();
     WarnOfClipping(output, clipped);
-}
-
-}  // namespace
-
-void AddConvertCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command =
-        app.add_subcommand("convert", "Converts an audio file to another sample rate or format");
-    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("OUT", a.output, "Audio file by its ending, or - for WAV on standard output")
-        ->required();
-    command->add_option("--rate", a.rate, "Sample rate in Hz")->required();
-    command->add_option("--format", a.format, "s16, s24, f32 or f64; the input's when left out");
-    command->add_option("--dither", a.dither, "none, tpdf, shaped or shaped-strong");
-    command->add_flag("--exact", a.exact, "By the exact ratio of the rates, whatever its factors");
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

@@ -3,13 +3,12 @@
 #include <charconv>
 #include <cmath>
 #include <complex>
-#include <memory>
 #include <numbers>
 #include <string>
 
 #include <nlohmann/json.hpp>
 
-#include "Commands.h"
+#include "Arguments.h"
 #include "EqualiserElement.h"
 #include "Errors.h"
 #include "Text.h"
@@ -22,18 +21,11 @@ constexpr double kLowestHz = 10.0;
 constexpr double kSilence = 1e-15;  // -300 dB stands for everything below, so that every row is a number
 constexpr int kLowestRate = 100, kHighestRate = 10'000'000;
 
-struct Arguments {
-    std::string effect, output;
-    int rate = 48000;
-    bool json = false;
-    WritingOptions writing;
-};
-
 struct Point {
     double hz, decibels, degrees;
 };
 
-std::array<Point, kPoints> Curve(const Arguments& arguments) {
+std::array<Point, kPoints> Curve(const EqCurveArguments& arguments) {
     const std::string_view text = arguments.effect;
     const auto colon = std::min(text.find(':'), text.size());
     if (!SameNoCase(Trimmed(text.substr(0, colon)), EqualiserElement::kName))
@@ -73,7 +65,9 @@ std::string Json(const std::array<Point, kPoints>& curve, int rate) {
     return nlohmann::ordered_json{{"rate", rate}, {"points", points}}.dump(2) + "\n";
 }
 
-void Run(const Arguments& arguments) {
+}  // namespace
+
+void RunEqCurve(EqCurveArguments arguments) {
     if (arguments.rate < kLowestRate || arguments.rate > kHighestRate)
         throw UserError("--rate cannot be " + std::to_string(arguments.rate) + "; accepted: " +
                         std::to_string(kLowestRate) + " to " + std::to_string(kHighestRate) + " Hz");
@@ -82,22 +76,6 @@ void Run(const Arguments& arguments) {
     OutputFile output(arguments.output, arguments.writing.rules);
     output.Bytes().Write(text.data(), text.size());
     output.Commit();
-}
-
-}  // namespace
-
-void AddEqCurveCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command = app.add_subcommand("eq-curve", "Writes the frequency response of the equaliser");
-    command->add_option("OUT", a.output, "CSV file, or - for standard output")->required();
-    command->add_option("--fx", a.effect, "\"EQ: FREQ TYPE [GAIN_DB] [q=Q]; ...\"")
-        ->required()
-        ->allow_extra_args(false);
-    command->add_option("--rate", a.rate, "Sample rate in Hz");
-    command->add_flag("--json", a.json, "As JSON");
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

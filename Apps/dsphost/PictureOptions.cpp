@@ -33,12 +33,6 @@ constexpr ViewOption kView[] = {
 };
 // clang-format on
 
-std::vector<std::string> ViewNames() {
-    std::vector<std::string> names;
-    for (const ViewOption& option : kView) names.push_back(option.name);
-    return names;
-}
-
 // By the first bytes of the file.
 bool IsTypeface(const std::string& path) {
     std::array<char, 4> tag{};
@@ -64,12 +58,10 @@ std::pair<int, int> Sides(const std::string& text) {
 
 }  // namespace
 
-void PictureOptions::AddTo(CLI::App& command) {
-    command.add_option("--size", size, "Of the picture, WIDTHxHEIGHT in pixels (1280x720)");
-    command.add_option("--dpi", dpi, "Dots per inch that texts and lines are sized for (96)");
-    command.add_option("--font", font, "The typeface's file, where Montserrat is not installed");
-    command.add_option("--scale", scale, "Frequency scale: log or linear");
-    command.add_option("--view", view, "Display options: " + Joined(ViewNames(), ", "))->delimiter(',');
+std::vector<std::string> ViewNames() {
+    std::vector<std::string> names;
+    for (const ViewOption& option : kView) names.push_back(option.name);
+    return names;
 }
 
 std::unique_ptr<Picture> PictureOptions::Make(int narrower) const {

@@ -4,8 +4,6 @@
 #include <string>
 #include <vector>
 
-#include <CLI/CLI.hpp>
-
 #include "Picture.h"
 
 class kivspectrum;
@@ -20,13 +18,15 @@ struct PictureOptions {
     std::vector<std::string> view;
     float dpi = 96.0f;
 
-    void AddTo(CLI::App& command);
     // An empty picture. Throws UserError for a size or resolution that cannot be.
     // `narrower` takes pixels from the width where the user chose none.
     std::unique_ptr<Picture> Make(int narrower = 0) const;
     // Chooses the analyser's display options, as its menu does. Throws UserError for an unknown one.
     void ApplyTo(kivspectrum& analyser) const;
 };
+
+// What a display option may be.
+std::vector<std::string> ViewNames();
 
 void Save(Picture& picture, OutputFile& output);
 

@@ -4,9 +4,9 @@
 #include <string>
 #include <vector>
 
+#include "Arguments.h"
 #include "AudioReader.h"
 #include "AudioWriter.h"
-#include "Commands.h"
 #include "DSP/Pitch/PitchAdapter.h"
 #include "Errors.h"
 #include "Progress.h"
@@ -24,22 +24,15 @@ constexpr double kMostSemitones = 36.0;
 constexpr double kLowestSpeed = 0.1, kHighestSpeed = 10.0;
 constexpr int kClassicSizeIndex = 3;
 
-struct Arguments {
-    std::string input, output, engine = "new", format;
-    double semitones = 0.0, speed = 1.0;
-    int quality = 4;
-    WritingOptions writing;
-};
+bool IsNew(const PitchArguments& arguments) { return SameNoCase(arguments.engine, "new"); }
 
-bool IsNew(const Arguments& arguments) { return SameNoCase(arguments.engine, "new"); }
-
-PitchAdapterInfo* Engine(const Arguments& arguments) {
+PitchAdapterInfo* Engine(const PitchArguments& arguments) {
     if (IsNew(arguments)) return PitchAdapterInfo::SoundTouch;
     if (SameNoCase(arguments.engine, "classic")) return PitchAdapterInfo::OldCorvo;
     throw UserError("--engine cannot be \"" + arguments.engine + "\"; accepted: new, classic");
 }
 
-void CheckNumbers(const Arguments& arguments, const PitchAdapterInfo& engine) {
+void CheckNumbers(const PitchArguments& arguments, const PitchAdapterInfo& engine) {
     if (!(std::abs(arguments.semitones) <= kMostSemitones)) throw UserError("--semitones accepts -36 to 36");
     if (!(arguments.speed >= kLowestSpeed && arguments.speed <= kHighestSpeed))
         throw UserError("--speed accepts 0.1 to 10");
@@ -53,13 +46,13 @@ void CheckNumbers(const Arguments& arguments, const PitchAdapterInfo& engine) {
 
 // "New" makes up for its own delay in the path without padding. "Classic" delays by all of its frame but one
 // step, which is dropped here and made up for with silence behind the input.
-int DelayFrames(const Arguments& arguments, const PitchAdapterInfo& engine) {
+int DelayFrames(const PitchArguments& arguments, const PitchAdapterInfo& engine) {
     if (IsNew(arguments)) return 0;
     const int size = engine.GetFFTSizes()[kClassicSizeIndex];
     return size - size / engine.GetQualities()[static_cast<std::size_t>(arguments.quality)];
 }
 
-std::unique_ptr<PitchAdapter> Prepare(const Arguments& arguments, PitchAdapterInfo* engine,
+std::unique_ptr<PitchAdapter> Prepare(const PitchArguments& arguments, PitchAdapterInfo* engine,
                                       const AudioReader& input) {
     std::unique_ptr<PitchAdapter> adapter(PitchAdapter::CreateAdapter(engine));
     adapter->SetChannelsNum(input.Channels());
@@ -97,7 +90,7 @@ private:
     std::vector<double> m_samples;
 };
 
-void Shift(AudioReader& input, PitchAdapter& adapter, AudioWriter& output, const Arguments& arguments,
+void Shift(AudioReader& input, PitchAdapter& adapter, AudioWriter& output, const PitchArguments& arguments,
            int delay) {
     const auto width = static_cast<std::size_t>(input.Channels());
     std::vector<double> read(kBlock * width);
@@ -130,7 +123,9 @@ void Shift(AudioReader& input, PitchAdapter& adapter, AudioWriter& output, const
     }
 }
 
-void Run(Arguments arguments) {
+}  // namespace
+
+void RunPitch(PitchArguments arguments) {
     PitchAdapterInfo* const engine = Engine(arguments);
     CheckNumbers(arguments, *engine);
     std::optional<SampleFormat> asked;
@@ -148,25 +143,6 @@ void Run(Arguments arguments) {
     Shift(input, *adapter, output, arguments, DelayFrames(arguments, *engine));
     output.Commit();
     WarnOfClipping(output);
-}
-
-}  // namespace
-
-void AddPitchCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command =
-        app.add_subcommand("pitch", "Transposes an audio file, aligned and as long as it was");
-    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("OUT", a.output, "Audio file by its ending, or - for WAV on standard output")
-        ->required();
-    command->add_option("--semitones", a.semitones, "How far, -36 to 36")->required();
-    command->add_option("--engine", a.engine, "new (default) or classic");
-    command->add_option("--quality", a.quality, "new: 0 to 9; classic: 0 to 13; default 4");
-    command->add_option("--speed", a.speed, "new only: playback speed, 0.1 to 10; moves the pitch along");
-    command->add_option("--format", a.format, "s16, s24, f32 or f64; the input's when left out");
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

@@ -3,11 +3,11 @@
 #include <string>
 #include <vector>
 
+#include "Arguments.h"
 #include "AudioReader.h"
 #include "AudioWriter.h"
 #include "Automation.h"
 #include "Chain.h"
-#include "Commands.h"
 #include "Errors.h"
 #include "Progress.h"
 #include "Render.h"
@@ -20,13 +20,6 @@ constexpr int kMostChannels = 2;
 constexpr int kLargestBlock = 1 << 20;
 constexpr double kLongestTail = 3600.0;
 
-struct Arguments {
-    std::string input, output, format, automation, tail = "0";
-    std::vector<std::string> effects, chunks;
-    RenderOptions options;
-    WritingOptions writing;
-};
-
 std::optional<double> ParseTail(const std::string& text) {
     if (SameNoCase(text, "auto")) return {};
     const auto seconds = ToNumber(text);
@@ -35,7 +28,7 @@ std::optional<double> ParseTail(const std::string& text) {
     return seconds;
 }
 
-void CheckNumbers(const Arguments& arguments) {
+void CheckNumbers(const RenderArguments& arguments) {
     if (arguments.options.precision != 32 && arguments.options.precision != 64)
         throw UserError("--precision cannot be " + std::to_string(arguments.options.precision) +
                         "; accepted: 32, 64");
@@ -49,7 +42,7 @@ void CheckNumbers(const Arguments& arguments) {
 }
 
 // The state of each effect as rendering begins, in files that wait for their Commit.
-std::vector<std::unique_ptr<OutputFile>> PrepareChunks(const Arguments& arguments, Chain& chain) {
+std::vector<std::unique_ptr<OutputFile>> PrepareChunks(const RenderArguments& arguments, Chain& chain) {
     std::vector<std::unique_ptr<OutputFile>> files;
     for (std::size_t i = 0; i < arguments.chunks.size(); ++i) {
         files.push_back(std::make_unique<OutputFile>(arguments.chunks[i], arguments.writing.rules));
@@ -59,7 +52,9 @@ std::vector<std::unique_ptr<OutputFile>> PrepareChunks(const Arguments& argument
     return files;
 }
 
-void Run(Arguments arguments) {
+}  // namespace
+
+void RunRender(RenderArguments arguments) {
     auto& options = arguments.options;
     auto& rules = arguments.writing.rules;
     CheckNumbers(arguments);
@@ -91,31 +86,6 @@ void Run(Arguments arguments) {
     output.Commit();
     for (const auto& chunk : chunks) chunk->Commit();
     WarnOfClipping(output);
-}
-
-}  // namespace
-
-void AddRenderCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command = app.add_subcommand("render", "Renders an audio file through a chain of effects");
-    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("OUT", a.output, "Audio file by its ending, or - for WAV on standard output")
-        ->required();
-    command
-        ->add_option("--fx", a.effects,
-                     "\"NAME: label=value, ...\"; once per effect, in the order of processing")
-        ->allow_extra_args(false);
-    command->add_option("--automation", a.automation, "JSON file of parameter moves");
-    command->add_option("--save-chunk", a.chunks, "Writes the effect's settings; once per --fx")
-        ->allow_extra_args(false);
-    command->add_option("--format", a.format, "s16, s24, f32 or f64; the input's when left out");
-    command->add_option("--tail", a.tail, "Seconds after the input's end, or auto: until it has died away");
-    command->add_option("--precision", a.options.precision, "Bits of the samples in the chain, 32 or 64");
-    command->add_option("--block", a.options.block, "Most frames per block");
-    command->add_flag("--planar", a.options.planar, "One buffer per channel, where an effect supports it");
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

@@ -1,11 +1,10 @@
 #include <algorithm>
 #include <cmath>
-#include <memory>
 #include <optional>
 #include <string>
 
+#include "Arguments.h"
 #include "AudioReader.h"
-#include "Commands.h"
 #include "Errors.h"
 #include "PictureOptions.h"
 #include "Playback.h"
@@ -17,15 +16,6 @@ namespace dsphost {
 namespace {
 
 constexpr int kSlowest = 0, kFastest = 8, kLastScheme = 6;
-
-struct Arguments {
-    std::string input, output;
-    int scheme = 0;
-    std::optional<int> speed;
-    bool spectrum = false, pitch = false;
-    PictureOptions drawing;
-    WritingOptions writing;
-};
 
 void Check(int value, int first, int last, const std::string& option) {
     if (value < first || value > last)
@@ -54,7 +44,9 @@ int SpareColumns(const AudioReader& input, int columns) {
     return std::max(columns - static_cast<int>(std::min(std::max(needed, kLeastColumns), 1.0 * columns)), 0);
 }
 
-void Run(Arguments arguments) {
+}  // namespace
+
+void RunSonogram(SonogramArguments arguments) {
     if (arguments.speed) Check(*arguments.speed, kSlowest, kFastest, "--speed");
     Check(arguments.scheme, 0, kLastScheme, "--scheme");
     arguments.writing.rules.inputs = {arguments.input};
@@ -93,26 +85,6 @@ void Run(Arguments arguments) {
     });
     picture->Paint(draw);
     Save(*picture, output);
-}
-
-}  // namespace
-
-void AddSonogramCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command = app.add_subcommand("sonogram", "Draws how the spectrum of an audio file changes");
-    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("OUT", a.output, "PNG picture")->required();
-    command->add_option("--scheme", a.scheme, "Colours, 0 to 6");
-    command->add_option(
-        "--speed", a.speed,
-        "0 to 8: 5, 10, 15, 30, 60, 90, 150, 300 or 450 columns a second; the picture then ends "
-        "with the file. Without it the whole file is in the picture where it fits");
-    command->add_flag("--spectrum", a.spectrum, "With the last spectrum above");
-    command->add_flag("--pitch", a.pitch, "With the pitch that the tuner hears");
-    a.drawing.AddTo(*command);
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

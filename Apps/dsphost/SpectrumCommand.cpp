@@ -7,8 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "Arguments.h"
 #include "AudioReader.h"
-#include "Commands.h"
 #include "Errors.h"
 #include "PictureOptions.h"
 #include "Playback.h"
@@ -27,15 +27,7 @@ constexpr int kPeaksStay = 2;
 constexpr int kShortest = 128, kLongest = 524288;
 const std::vector<std::string> kWindows{"rectangular", "triangular", "hann", "hamming", "blackman"};
 
-struct Arguments {
-    std::string input, picture, csv, window = kWindows.back();
-    int length = 4096;
-    float overlap = 0.5f;
-    PictureOptions drawing;
-    WritingOptions writing;
-};
-
-void Check(const Arguments& arguments) {
+void Check(const SpectrumArguments& arguments) {
     if (arguments.picture == "-" && arguments.csv == "-")
         throw UserError("picture and table cannot both go to standard output");
     if (arguments.picture.empty() && arguments.csv.empty())
@@ -51,7 +43,8 @@ void Check(const Arguments& arguments) {
 
 // The mean power spectrum of all whole windows of the input; an input shorter than one is followed by
 // silence.
-std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser, const Arguments& arguments) {
+std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser,
+                                 const SpectrumArguments& arguments) {
     const auto channels = static_cast<std::ptrdiff_t>(input.Channels());
     std::vector<double> sum(analyser.GetPower().size());
     std::vector<double> samples(static_cast<std::size_t>(arguments.length * channels));
@@ -104,7 +97,9 @@ void Draw(kivspectrum& analyser, const std::vector<double>& power, Picture& pict
     picture.Paint([&](auto& target) { analyser.DoDrawSpectrum<PictureDrawing>(target, picture.Whole()); });
 }
 
-void Run(Arguments arguments) {
+}  // namespace
+
+void RunSpectrum(SpectrumArguments arguments) {
     Check(arguments);
     arguments.writing.rules.inputs = {arguments.input};
     auto& settings = kivspectrum::settings;
@@ -136,24 +131,6 @@ void Run(Arguments arguments) {
     }
     if (picture) Save(*picture, *drawing);
     if (table) table->Commit();
-}
-
-}  // namespace
-
-void AddSpectrumCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command =
-        app.add_subcommand("spectrum", "Writes the mean spectrum of an audio file, its channels mixed");
-    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("OUT", a.picture, "PNG picture: the mean, and the highest levels as a thin line");
-    command->add_option("--csv", a.csv, "Table of frequencies and mean levels, 0 dB a full-scale sine");
-    command->add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
-    command->add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
-    command->add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
-    a.drawing.AddTo(*command);
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

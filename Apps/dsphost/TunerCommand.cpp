@@ -1,5 +1,4 @@
 #include <cmath>
-#include <memory>
 #include <optional>
 #include <string>
 #include <utility>
@@ -7,8 +6,8 @@
 
 #include <nlohmann/json.hpp>
 
+#include "Arguments.h"
 #include "AudioReader.h"
-#include "Commands.h"
 #include "Errors.h"
 #include "File.h"
 #include "PictureOptions.h"
@@ -19,17 +18,6 @@
 
 namespace dsphost {
 namespace {
-
-const std::vector<std::string> kMethods{"denoised", "harmonic-product", "pseudo-harmonic-product", "legacy",
-                                        "two-way-mismatch"};
-
-struct Arguments {
-    std::string input, output, method = kMethods.front(), temperament = "Equal", sensitivity = "Standard";
-    std::optional<double> at;
-    bool json = false;
-    PictureOptions drawing;
-    WritingOptions writing;
-};
 
 std::vector<std::string> Names(const char* (*nameOf)(int)) {
     std::vector<std::string> names;
@@ -96,7 +84,7 @@ private:
 
 class Listener {
 public:
-    explicit Listener(const Arguments& arguments) : m_arguments(arguments), m_input(arguments.input) {
+    explicit Listener(const TunerArguments& arguments) : m_arguments(arguments), m_input(arguments.input) {
         RequireFormat(m_input, kMostChannels, "the analyser takes the mean of up to 64");
         m_analyser.set_parameters(m_input.Rate());
         m_analyser.SetOn(true);
@@ -116,16 +104,24 @@ public:
     kivspectrum& Analyser() { return m_analyser; }
 
 private:
-    const Arguments& m_arguments;
+    const TunerArguments& m_arguments;
     AudioReader m_input;
     kivspectrum m_analyser;
 };
 
-void Run(Arguments arguments) {
+}  // namespace
+
+const std::vector<std::string>& DetectionMethods() {
+    static const std::vector<std::string> methods{"denoised", "harmonic-product", "pseudo-harmonic-product",
+                                                  "legacy", "two-way-mismatch"};
+    return methods;
+}
+
+void RunTuner(TunerArguments arguments) {
     arguments.writing.rules.inputs = {arguments.input};
     const auto temperaments = Names(Tuner::GetTemperamentName);
     const auto sensitivities = Names(Tuner::GetSensibilityPresetName);
-    Tuner::SetDetectionMethod(static_cast<int>(FindName(arguments.method, kMethods, "method")));
+    Tuner::SetDetectionMethod(static_cast<int>(FindName(arguments.method, DetectionMethods(), "method")));
     Tuner::SetTemperament(static_cast<int>(FindName(arguments.temperament, temperaments, "temperament")));
     const auto sensitivity = static_cast<int>(FindName(arguments.sensitivity, sensitivities, "sensitivity"));
     if (arguments.at && !(*arguments.at >= 0.0))
@@ -154,25 +150,6 @@ void Run(Arguments arguments) {
     if (!drawn) draw();
     Save(*picture, output);
     if (arguments.json) Print(Json(all));
-}
-
-}  // namespace
-
-void AddTunerCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto& a = *arguments;
-    auto* const command = app.add_subcommand("tuner", "Names the notes of an audio file and draws the tuner");
-    command->add_option("IN", a.input, "Audio file, or - for standard input")->required();
-    command->add_option("OUT", a.output, "PNG picture of the panel while the longest note sounds")
-        ->required();
-    command->add_flag("--json", a.json, "What was heard 30 times a second, on standard output");
-    command->add_option("--at", a.at, "The moment to draw instead, in seconds");
-    command->add_option("--method", a.method, "Of detection: " + Joined(kMethods, ", "));
-    command->add_option("--temperament", a.temperament, "Equal, Pythagorean, Vallotti, ...");
-    command->add_option("--sensitivity", a.sensitivity, "Standard, Noisy environment, Sensitive, ...");
-    a.drawing.AddTo(*command);
-    a.writing.AddTo(*command);
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

@@ -7,6 +7,7 @@
 #include <fstream>
 #include <iterator>
 #include <random>
+#include <sstream>
 
 #include "Support/Signals.h"
 
@@ -66,12 +67,16 @@ void SaveBytes(const std::string& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary) << bytes;
 }
 
+namespace {
+
 std::vector<std::string> Files() {
     std::vector<std::string> names;
     for (const auto& entry : fs::directory_iterator(".")) names.push_back(entry.path().filename().string());
     std::ranges::sort(names);
     return names;
 }
+
+}  // namespace
 
 Program::Program() : m_before(fs::current_path()) {
     m_directory = fs::temp_directory_path() / ("dsphost-test-" + std::to_string(std::random_device()()));
@@ -101,20 +106,26 @@ Result Program::Shell(std::string line) {
     return result;
 }
 
-Result Program::Run(const std::vector<std::string>& arguments, const std::string& input) {
-    std::string line = "DSPHOST";
-    for (const auto& argument : arguments) line += " \"" + argument + "\"";
+Result Program::Run(const std::string& arguments, const std::string& input) {
     const std::string place = m_directory.string() + "-in";
     SaveBytes(place, input);
-    const Result result = Shell(line + " < \"" + place + "\"");
+    const Result result = Shell("DSPHOST " + arguments + " < \"" + place + "\"");
     fs::remove(place);
     return result;
 }
 
-void Program::ExpectRefused(const Result& result, int status, const std::vector<std::string>& words) {
+std::string Program::Succeed(const std::string& arguments, const std::string& input) {
+    const Result result = Run(arguments, input);
+    EXPECT_EQ(result.status, 0) << arguments << ": " << result.err;
+    EXPECT_EQ(result.err, "") << arguments;
+    return result.out;
+}
+
+void Program::ExpectRefused(const Result& result, const std::string& words, int status) {
     EXPECT_EQ(result.status, status) << result.err;
     EXPECT_EQ(std::ranges::count(result.err, '\n'), 1) << result.err;
-    for (const auto& word : words)
+    std::istringstream list(words);
+    for (std::string word; std::getline(list, word, '|');)
         EXPECT_NE(result.err.find(word), std::string::npos) << word << " in " << result.err;
     EXPECT_EQ(Files(), m_files);
 }

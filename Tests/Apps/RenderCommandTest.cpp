@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -11,16 +12,14 @@ namespace {
 
 class RenderCommand : public Program {};
 
-struct MixCase {
-    const char* fault;
-    std::string fx;
-    double leftFromLeft, leftFromRight, rightFromLeft, rightFromRight;
-};
-
-// What each setting must do to a stereo stream, as a mixing matrix.
+// What each setting must do to a stereo stream, as a mixing matrix; effects run in the order of their --fx.
 TEST_F(RenderCommand, SetsParametersByLabelAndText) {
     const double half = std::pow(10.0, -6.0 / 20.0), makeUp = std::pow(10.0, 3.0 / 20.0);
-    const MixCase cases[] = {
+    const struct {
+        const char* fault;
+        std::string fx;
+        double leftFromLeft, leftFromRight, rightFromLeft, rightFromRight;
+    } cases[] = {
         {"the effect alone is not neutral", "Gain", 1, 0, 0, 1},
         {"number and unit", "Gain: Gain=-6 dB", half, 0, 0, half},
         {"case, blanks, no unit", "gain:  gAIN = -6 ", half, 0, 0, half},
@@ -30,14 +29,13 @@ TEST_F(RenderCommand, SetsParametersByLabelAndText) {
         {"both sides", "Gain: Flip phase=on", -1, 0, 0, -1},
         {"later settings win", "Gain: Flip phase=On, Flip phase R=Off", -1, 0, 0, 1},
         {"two settings", "Gain: Stereo width=0, Gain=-6 dB", half, half, half, half},
+        {"order", "Gain: Pan=n:1\" --fx \"Gain: Stereo width=0", 0, makeUp, 0, makeUp},
     };
-    const Sound in = NoiseSound(100, 2, SF_FORMAT_WAV | SF_FORMAT_DOUBLE);
+    const Sound in = NoiseSound(100, 2, kDouble);
     Save("in.wav", in);
     for (const auto& c : cases) {
         SCOPED_TRACE(c.fault);
-        const auto result = Run({"render", "in.wav", "out.wav", "-y", "--fx", c.fx});
-        ASSERT_EQ(result.status, 0) << result.err;
-        EXPECT_EQ(result.err, "");
+        Succeed("render --fx \"" + c.fx + "\" in.wav out.wav -y");
         const Sound out = Load("out.wav");
         ASSERT_EQ(out.Frames(), in.Frames());
         for (std::size_t i = 0; i < in.samples.size(); i += 2) {
@@ -46,112 +44,135 @@ TEST_F(RenderCommand, SetsParametersByLabelAndText) {
             ASSERT_NEAR(out.samples[i + 1], c.rightFromLeft * l + c.rightFromRight * r, 1e-6);
         }
     }
-}
-
-// Each effect gets the next --fx, in order, and IN and OUT may follow them.
-TEST_F(RenderCommand, RunsAChainInOrder) {
-    Sound in = NoiseSound(10, 1, SF_FORMAT_WAV | SF_FORMAT_DOUBLE);
-    Save("in.wav", in);
-    const auto result =
-        Run({"render", "--fx", "Gain: Gain=-6 dB", "--fx", "Gain: Flip phase L=On", "in.wav", "out.wav"});
-    ASSERT_EQ(result.status, 0) << result.err;
-    const Sound out = Load("out.wav");
-    for (std::size_t i = 0; i < in.samples.size(); ++i)
-        ASSERT_NEAR(out.samples[i], -in.samples[i] * std::pow(10.0, -0.3), 1e-6);
+    const auto beyond = Run("render in.wav out.wav -y --fx \"Gain: Gain=40 dB\"");
+    EXPECT_EQ(beyond.status, 0);
+    EXPECT_NE(beyond.err.find("Gain=40 dB is beyond the range; 20.0 dB is used"), std::string::npos);
 }
 
 TEST_F(RenderCommand, GivesTheSameBytesForEveryBlockAndLayout) {
     Save("in.wav", NoiseSound(5000));
-    const std::vector<std::string> command{"render", "in.wav", "out.wav",
-                                           "-y",     "--fx",   "Gain: Pan=0.3, Gain=-1"};
-    ASSERT_EQ(Run(command).status, 0);
+    const std::string command = "render in.wav out.wav -y --fx \"Gain: Pan=0.3, Gain=-1\" ";
+    Succeed(command);
     const std::string expected = Bytes("out.wav");
-    for (const std::vector<std::string>& extra : {std::vector<std::string>{"--block", "1"},
-                                                  {"--block", "7"},
-                                                  {"--block", "4096"},
-                                                  {"--planar"},
-                                                  {"--precision", "32"},
-                                                  {"--precision", "32", "--planar", "--block", "64"}}) {
-        auto varied = command;
-        varied.insert(varied.end(), extra.begin(), extra.end());
-        ASSERT_EQ(Run(varied).status, 0);
-        EXPECT_EQ(Bytes("out.wav"), expected) << extra.back();
+    for (const std::string extra : {"--block 1", "--block 7", "--block 4096", "--planar", "--precision 32",
+                                    "--precision 32 --planar --block 64"}) {
+        Succeed(command + extra);
+        EXPECT_EQ(Bytes("out.wav"), expected) << extra;
     }
 }
 
 TEST_F(RenderCommand, SavesAndLoadsTheState) {
     const Sound in = NoiseSound(50, 2, SF_FORMAT_WAV | SF_FORMAT_FLOAT);
     Save("in.wav", in);
-    ASSERT_EQ(
-        Run({"render", "in.wav", "a.wav", "--fx", "Gain: Gain=-3.5 dB, Pan=-0.5", "--save-chunk", "state"})
-            .status,
-        0);
+    Succeed("render in.wav a.wav --fx \"Gain: Gain=-3.5 dB, Pan=-0.5\" --save-chunk state");
     EXPECT_EQ(Bytes("state").size(), 20u);
-    ASSERT_EQ(Run({"render", "in.wav", "b.wav", "--fx", "Gain: chunk=state"}).status, 0);
+    Succeed("render in.wav b.wav --fx \"Gain: chunk=state\"");
     EXPECT_EQ(Bytes("a.wav"), Bytes("b.wav"));
     // A setting beside the chunk changes it, wherever it stands.
-    ASSERT_EQ(Run({"render", "in.wav", "c.wav", "--fx", "Gain: Pan=0, Gain=n:0.5, chunk=state"}).status, 0);
+    Succeed("render in.wav c.wav --fx \"Gain: Pan=0, Gain=n:0.5, chunk=state\"");
     EXPECT_EQ(Load("c.wav").samples, in.samples);
-
-    SaveBytes("short", Bytes("state").substr(0, 19));
-    ExpectRefused(Run({"render", "in.wav", "d.wav", "--fx", "Gain: chunk=short"}), 2,
-                  {"short", "19 bytes", "20"});
-    ExpectRefused(Run({"render", "in.wav", "d.wav", "--fx", "Gain", "--save-chunk", "state"}), 2,
-                  {"state", "-y"});
-}
-
-TEST_F(RenderCommand, AddsATailOfSilenceWhenAskedAndTrimsAnAutomaticOne) {
-    Save("in.wav", NoiseSound(1000, 1));
-    ASSERT_EQ(Run({"render", "in.wav", "a.wav", "--fx", "Gain", "--tail", "0.5"}).status, 0);
-    EXPECT_EQ(Load("a.wav").Frames(), 25000u);
-    ASSERT_EQ(Run({"render", "in.wav", "b.wav", "--fx", "Gain", "--tail", "auto"}).status, 0);
-    EXPECT_EQ(Load("b.wav").Frames(), 1000u);
 }
 
 // Lists by their texts, values as the effect shows them, and a tail that outlives the silence before an echo.
 TEST_F(RenderCommand, LetsALateEchoRingOut) {
-    Sound in{1, 48000, SF_FORMAT_WAV | SF_FORMAT_DOUBLE, std::vector<double>(1000)};
+    Sound in{1, 48000, kDouble, std::vector<double>(1000)};
     in.samples[999] = 0.5;
     Save("in.wav", in);
-    const std::string fx =
-        "Echo: preset=single, Depth mode=time (linear), Depth=5000 ms, Delay=0, Mix=100 %, Out gain=0 dB";
-    const auto result = Run({"render", "in.wav", "out.wav", "--tail", "auto", "--fx", fx});
-    ASSERT_EQ(result.status, 0) << result.err;
+    Succeed(
+        "render in.wav out.wav --tail auto --fx \"Echo: preset=single, Depth mode=time (linear), "
+        "Depth=5000 ms, Delay=0, Mix=100 %, Out gain=0 dB\"");
     const auto out = Load("out.wav").samples;
     EXPECT_NEAR(static_cast<double>(out.size()), 1000 + 5 * 48000, 1);
     EXPECT_NEAR(out.back(), 0.25, 1e-6);
-    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: Depth=5 apples"}), 2,
-                  {"5 apples", "4999 ms"});
-    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: Depth mode=slow"}), 2,
-                  {"slow", "Time (log)"});
-    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Valvex: Oversampling=5"}), 2,
-                  {"5", "1, 2, 4, 8"});
-    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Echo: preset=e, preset=s"}), 2, {"one preset"});
-    ExpectRefused(Run({"render", "in.wav", "x.wav", "--fx", "Tremolo: preset=f00"}), 2,
-                  {"f00", "Fast Tremolo"});
 }
 
-// A tremolo that stands still multiplies by 1 / (1 + depth); every step comes on its frame.
+// A tremolo that stands still multiplies by 1 / (1 + depth); every step comes on its frame, whatever the
+// order of the points, on both sides or on one.
 TEST_F(RenderCommand, PlaysAutomation) {
-    Sound in{1, 48000, SF_FORMAT_WAV | SF_FORMAT_DOUBLE, std::vector<double>(1000, 0.5)};
-    Save("in.wav", in);
-    SaveBytes("moves.json", R"([{"parameter": "Depth", "points": [[0, 0], [0.01, 1], [0.015, 0.25]]}])");
+    Save("in.wav", {2, 48000, kDouble, std::vector<double>(2000, 0.5)});
+    SaveBytes("moves.json", R"([
+        {"effect": 1, "parameter": "Depth", "points": [[0.01, 1], [0, 0], [0.015, 0.25]]},
+        {"effect": 3, "parameter": "Depth R", "points": [{"time": 0, "value": 1}]}])");
     for (const std::string block : {"1", "64", "4096"}) {
-        const auto result = Run({"render", "in.wav", "out.wav", "-y", "--fx", "Tremolo: Frequency=0",
-                                 "--automation", "moves.json", "--block", block});
-        ASSERT_EQ(result.status, 0) << result.err;
+        Succeed(
+            "render in.wav out.wav -y --automation moves.json --fx \"Tremolo: Frequency=0\" --fx Gain "
+            "--fx \"Tremolo: Frequency=0, Depth=0\" --block " +
+            block);
         const auto out = Load("out.wav").samples;
-        for (std::size_t i = 0; i < out.size(); ++i)
-            ASSERT_DOUBLE_EQ(out[i], 0.5 / (i < 480 ? 1.0 : i < 720 ? 2.0 : 1.25)) << i;
+        for (std::size_t i = 0; i < out.size() / 2; ++i) {
+            const double expected = 0.5 / (i < 480 ? 1.0 : i < 720 ? 2.0 : 1.25);
+            ASSERT_NEAR(out[2 * i], expected, 1e-7) << i;
+            ASSERT_NEAR(out[2 * i + 1], expected / 2.0, 1e-7) << i;
+        }
     }
 }
 
-TEST_F(RenderCommand, WarnsOfSettingsBeyondTheRange) {
-    Save("in.wav", NoiseSound(10, 2, SF_FORMAT_WAV | SF_FORMAT_FLOAT));
-    const auto result = Run({"render", "in.wav", "out.wav", "--fx", "Gain: Gain=40 dB"});
-    EXPECT_EQ(result.status, 0);
-    EXPECT_NE(result.err.find("Gain=40 dB is beyond the range; 20.0 dB is used"), std::string::npos)
-        << result.err;
+// A neutral chain returns every sample of every kind of file, in the same sample format.
+TEST_F(RenderCommand, KeepsTheInputsSamplesAndFormat) {
+    const struct {
+        std::string name;
+        int format;
+    } cases[] = {
+        {"a.wav", SF_FORMAT_WAV | SF_FORMAT_PCM_U8},   {"b.wav", SF_FORMAT_WAV | SF_FORMAT_PCM_16},
+        {"c.wav", SF_FORMAT_WAV | SF_FORMAT_PCM_24},   {"d.wav", SF_FORMAT_WAV | SF_FORMAT_PCM_32},
+        {"e.wav", SF_FORMAT_WAV | SF_FORMAT_FLOAT},    {"f.wav", SF_FORMAT_WAV | SF_FORMAT_DOUBLE},
+        {"g.flac", SF_FORMAT_FLAC | SF_FORMAT_PCM_S8}, {"h.flac", SF_FORMAT_FLAC | SF_FORMAT_PCM_16},
+        {"i.flac", SF_FORMAT_FLAC | SF_FORMAT_PCM_24}, {"j.aiff", SF_FORMAT_AIFF | SF_FORMAT_PCM_24},
+        {"k.aif", SF_FORMAT_AIFF | SF_FORMAT_FLOAT},   {"l.w64", SF_FORMAT_W64 | SF_FORMAT_PCM_16},
+        {"m.rf64", SF_FORMAT_RF64 | SF_FORMAT_PCM_24}, {"n.caf", SF_FORMAT_CAF | SF_FORMAT_PCM_16},
+        {"o.au", SF_FORMAT_AU | SF_FORMAT_PCM_16},
+    };
+    for (const auto& [name, format] : cases) {
+        SCOPED_TRACE(name);
+        // An odd number of odd-sized samples: chunks need their padding.
+        Save("in-" + name, NoiseSound(333, 1, format));
+        Succeed("render in-" + name + " out-" + name + " --fx Gain");
+        const Sound in = Load("in-" + name), out = Load("out-" + name);
+        EXPECT_EQ(out.samples, in.samples);
+        EXPECT_EQ(out.rate, in.rate);
+        constexpr int kMask = SF_FORMAT_TYPEMASK | SF_FORMAT_SUBMASK;
+        EXPECT_EQ(out.format & kMask, in.format & kMask);
+        // The outermost size counts everything behind it, padding too.
+        const std::string bytes = Bytes("out-" + name);
+        std::uint32_t size = 8;
+        for (std::size_t i = 0; i < 4; ++i)
+            size += std::uint32_t{static_cast<std::uint8_t>(bytes[4 + i])} << 8 * i;
+        EXPECT_TRUE(!bytes.starts_with("RIFF") || size == bytes.size());
+    }
+    // The same samples give the same bytes: no time stamps.
+    Succeed("render in-e.wav again.wav --fx Gain");
+    EXPECT_EQ(Bytes("again.wav"), Bytes("out-e.wav"));
+}
+
+TEST_F(RenderCommand, RoundsToNearestEvenAndClips) {
+    const double step = 0x1p-15;
+    const std::vector<double> samples{
+        0.5 * step,        1.5 * step, -0.5 * step, -2.5 * step,       0.49 * step,      0.51 * step,
+        1.0 - step,        -1.0,       1.0,         1.0 - 0.51 * step, 1.0 - 0.4 * step, -1.0 - 0.4 * step,
+        -1.0 - 0.6 * step, 7.0,        -7.0,        std::nan("")};
+    const std::vector<double> expected{0,     2,     0,     -2,     0,      1,     32767,  -32768,
+                                       32767, 32767, 32767, -32768, -32768, 32767, -32768, 0};
+    Save("in.wav", {1, 48000, kDouble, samples});
+    // 1.0, 1 - 0.4 steps, -1 - 0.6 steps, the two sevens, and what is no number.
+    EXPECT_EQ(Run("render in.wav out.wav --format s16").err,
+              "dsphost: warning: out.wav: 6 samples were clipped\n");
+    const Sound out = Load("out.wav");
+    ASSERT_EQ(out.samples.size(), expected.size());
+    for (std::size_t i = 0; i < expected.size(); ++i) EXPECT_EQ(out.samples[i], expected[i] * step) << i;
+    // Floats go beyond full scale without harm.
+    Succeed("render in.wav loud.wav --format f32");
+    EXPECT_EQ(Load("loud.wav").samples[13], 7.0);
+}
+
+TEST_F(RenderCommand, MakesFloatsOfLossyInput) {
+    Save("in.ogg", NoiseSound(5000, 2, SF_FORMAT_OGG | SF_FORMAT_VORBIS));
+    Succeed("render in.ogg out.wav");
+    EXPECT_EQ(Load("out.wav").format, SF_FORMAT_WAV | SF_FORMAT_FLOAT);
+    EXPECT_EQ(Load("out.wav").samples, Load("in.ogg").samples);
+    Succeed("render in.ogg out.flac");
+    EXPECT_EQ(Load("out.flac").format, SF_FORMAT_FLAC | SF_FORMAT_PCM_24);
+    Succeed("render out.wav again.ogg");
+    EXPECT_EQ(Load("again.ogg").Frames(), 5000u);
 }
 
 }  // namespace

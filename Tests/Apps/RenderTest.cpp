@@ -69,7 +69,7 @@ protected:
 
     std::vector<double> Render(const std::vector<double>& input, dsphost::Chain& chain,
                                const dsphost::RenderOptions& options) {
-        Save("in.wav", {1, Model::kRate, SF_FORMAT_WAV | SF_FORMAT_DOUBLE, input});
+        Save("in.wav", {1, Model::kRate, kDouble, input});
         dsphost::AudioReader reader("in.wav");
         chain.Prepare(options.block, dsphost::ChainFormat(1, Model::kRate, options.precision),
                       options.planar);

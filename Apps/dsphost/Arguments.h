@@ -1,0 +1,83 @@
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "OutputFile.h"
+#include "PictureOptions.h"
+#include "Render.h"
+
+namespace dsphost {
+
+// What each command is asked for, with its defaults, and the function that does it. CommandLine.cpp fills the
+// records. A command throws UserError, IoError or Interrupted.
+
+// What every command that writes takes.
+struct WritingOptions {
+    OutputRules rules;
+    bool quiet = false;
+};
+
+struct ConvertArguments {
+    std::string input, output, format, dither = "none";
+    int rate = 0;
+    bool exact = false;
+    WritingOptions writing;
+};
+void RunConvert(ConvertArguments arguments);
+
+struct EqCurveArguments {
+    std::string effect, output;
+    int rate = 48000;
+    bool json = false;
+    WritingOptions writing;
+};
+void RunEqCurve(EqCurveArguments arguments);
+
+struct PitchArguments {
+    std::string input, output, engine = "new", format;
+    double semitones = 0.0, speed = 1.0;
+    int quality = 4;
+    WritingOptions writing;
+};
+void RunPitch(PitchArguments arguments);
+
+struct RenderArguments {
+    std::string input, output, format, automation, tail = "0";
+    std::vector<std::string> effects, chunks;
+    RenderOptions options;
+    WritingOptions writing;
+};
+void RunRender(RenderArguments arguments);
+
+struct SonogramArguments {
+    std::string input, output;
+    int scheme = 0;
+    std::optional<int> speed;
+    bool spectrum = false, pitch = false;
+    PictureOptions drawing;
+    WritingOptions writing;
+};
+void RunSonogram(SonogramArguments arguments);
+
+struct SpectrumArguments {
+    std::string input, picture, csv, window = "blackman";
+    int length = 4096;
+    float overlap = 0.5f;
+    PictureOptions drawing;
+    WritingOptions writing;
+};
+void RunSpectrum(SpectrumArguments arguments);
+
+struct TunerArguments {
+    std::string input, output, method = "denoised", temperament = "Equal", sensitivity = "Standard";
+    std::optional<double> at;
+    bool json = false;
+    PictureOptions drawing;
+    WritingOptions writing;
+};
+void RunTuner(TunerArguments arguments);
+const std::vector<std::string>& DetectionMethods();
+
+}  // namespace dsphost

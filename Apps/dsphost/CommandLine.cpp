@@ -1,0 +1,187 @@
+#include "CommandLine.h"
+
+#include <algorithm>
+#include <functional>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <CLI/CLI.hpp>
+
+#include "Arguments.h"
+#include "Commands.h"
+#include "Errors.h"
+#include "Text.h"
+
+// Every command and its options. The parser's header takes seconds to compile: no other file includes it.
+namespace dsphost {
+namespace {
+
+// The command, and the record that its options fill and `run` gets.
+template <typename Arguments>
+std::pair<CLI::App&, Arguments&> Add(CLI::App& app, const char* name, const char* what,
+                                     void (*run)(Arguments)) {
+    const auto arguments = std::make_shared<Arguments>();
+    auto* const command = app.add_subcommand(name, what);
+    command->callback([arguments, run] { run(std::move(*arguments)); });
+    return {*command, *arguments};
+}
+
+void AddInput(CLI::App& command, std::string& input) {
+    command.add_option("IN", input, "Audio file, or - for standard input")->required();
+}
+
+void AddAudioOutput(CLI::App& command, std::string& output) {
+    command.add_option("OUT", output, "Audio file by its ending, or - for WAV on standard output")
+        ->required();
+}
+
+void AddFormat(CLI::App& command, std::string& format) {
+    command.add_option("--format", format, "s16, s24, f32 or f64; the input's when left out");
+}
+
+void AddWriting(CLI::App& command, WritingOptions& writing) {
+    command.add_flag("-y", writing.rules.overwrite, "Overwrite an existing output");
+    command.add_flag("-q", writing.quiet, "No progress");
+}
+
+void AddDrawing(CLI::App& command, PictureOptions& o) {
+    command.add_option("--size", o.size, "Of the picture, WIDTHxHEIGHT in pixels (1280x720)");
+    command.add_option("--dpi", o.dpi, "Dots per inch that texts and lines are sized for (96)");
+    command.add_option("--font", o.font, "The typeface's file, where Montserrat is not installed");
+    command.add_option("--scale", o.scale, "Frequency scale: log or linear");
+    command.add_option("--view", o.view, "Display options: " + Joined(ViewNames(), ", "))->delimiter(',');
+}
+
+void AddConvert(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "convert", "Converts an audio file to another sample rate or format", RunConvert);
+    AddInput(command, a.input);
+    AddAudioOutput(command, a.output);
+    command.add_option("--rate", a.rate, "Sample rate in Hz")->required();
+    AddFormat(command, a.format);
+    command.add_option("--dither", a.dither, "none, tpdf, shaped or shaped-strong");
+    command.add_flag("--exact", a.exact, "By the exact ratio of the rates, whatever its factors");
+    AddWriting(command, a.writing);
+}
+
+void AddPitch(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "pitch", "Transposes an audio file, aligned and as long as it was", RunPitch);
+    AddInput(command, a.input);
+    AddAudioOutput(command, a.output);
+    command.add_option("--semitones", a.semitones, "How far, -36 to 36")->required();
+    command.add_option("--engine", a.engine, "new (default) or classic");
+    command.add_option("--quality", a.quality, "new: 0 to 9; classic: 0 to 13; default 4");
+    command.add_option("--speed", a.speed, "new only: playback speed, 0.1 to 10; moves the pitch along");
+    AddFormat(command, a.format);
+    AddWriting(command, a.writing);
+}
+
+void AddEqCurve(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "eq-curve", "Writes the frequency response of the equaliser", RunEqCurve);
+    command.add_option("OUT", a.output, "CSV file, or - for standard output")->required();
+    command.add_option("--fx", a.effect, "\"EQ: FREQ TYPE [GAIN_DB] [q=Q]; ...\"")
+        ->required()
+        ->allow_extra_args(false);
+    command.add_option("--rate", a.rate, "Sample rate in Hz");
+    command.add_flag("--json", a.json, "As JSON");
+    AddWriting(command, a.writing);
+}
+
+void AddRender(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "render", "Renders an audio file through a chain of effects", RunRender);
+    AddInput(command, a.input);
+    AddAudioOutput(command, a.output);
+    command
+        .add_option("--fx", a.effects,
+                    "\"NAME: label=value, ...\"; once per effect, in the order of processing")
+        ->allow_extra_args(false);
+    command.add_option("--automation", a.automation, "JSON file of parameter moves");
+    command.add_option("--save-chunk", a.chunks, "Writes the effect's settings; once per --fx")
+        ->allow_extra_args(false);
+    AddFormat(command, a.format);
+    command.add_option("--tail", a.tail, "Seconds after the input's end, or auto: until it has died away");
+    command.add_option("--precision", a.options.precision, "Bits of the samples in the chain, 32 or 64");
+    command.add_option("--block", a.options.block, "Most frames per block");
+    command.add_flag("--planar", a.options.planar, "One buffer per channel, where an effect supports it");
+    AddWriting(command, a.writing);
+}
+
+void AddSonogram(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "sonogram", "Draws how the spectrum of an audio file changes", RunSonogram);
+    AddInput(command, a.input);
+    command.add_option("OUT", a.output, "PNG picture")->required();
+    command.add_option("--scheme", a.scheme, "Colours, 0 to 6");
+    command.add_option(
+        "--speed", a.speed,
+        "0 to 8: 5, 10, 15, 30, 60, 90, 150, 300 or 450 columns a second; the picture then ends "
+        "with the file. Without it the whole file is in the picture where it fits");
+    command.add_flag("--spectrum", a.spectrum, "With the last spectrum above");
+    command.add_flag("--pitch", a.pitch, "With the pitch that the tuner hears");
+    AddDrawing(command, a.drawing);
+    AddWriting(command, a.writing);
+}
+
+void AddSpectrum(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "spectrum", "Writes the mean spectrum of an audio file, its channels mixed", RunSpectrum);
+    AddInput(command, a.input);
+    command.add_option("OUT", a.picture, "PNG picture: the mean, and the highest levels as a thin line");
+    command.add_option("--csv", a.csv, "Table of frequencies and mean levels, 0 dB a full-scale sine");
+    command.add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
+    command.add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
+    command.add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
+    AddDrawing(command, a.drawing);
+    AddWriting(command, a.writing);
+}
+
+void AddTuner(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "tuner", "Names the notes of an audio file and draws the tuner", RunTuner);
+    AddInput(command, a.input);
+    command.add_option("OUT", a.output, "PNG picture of the panel while the longest note sounds")->required();
+    command.add_flag("--json", a.json, "What was heard 30 times a second, on standard output");
+    command.add_option("--at", a.at, "The moment to draw instead, in seconds");
+    command.add_option("--method", a.method, "Of detection: " + Joined(DetectionMethods(), ", "));
+    command.add_option("--temperament", a.temperament, "Equal, Pythagorean, Vallotti, ...");
+    command.add_option("--sensitivity", a.sensitivity, "Standard, Noisy environment, Sensitive, ...");
+    AddDrawing(command, a.drawing);
+    AddWriting(command, a.writing);
+}
+
+// Told here, because the parser would only say that a command is missing.
+void CheckCommand(const CLI::App& app, int count, char** arguments) {
+    std::vector<std::string> names;
+    for (const auto* command : app.get_subcommands({})) names.push_back(command->get_name());
+    if (count < 2) throw UserError("a command is missing; " + Suggestion("", names));
+    const std::string name = arguments[1];
+    if (!name.starts_with('-') && std::ranges::find(names, name) == names.end())
+        throw UserError("there is no command \"" + name + "\"; " + Suggestion(name, names));
+}
+
+}  // namespace
+
+void RunCommandLine(int count, char** arguments) {
+    CLI::App app("Renders and examines audio files with the effects of DSPDll.", "dsphost");
+    app.require_subcommand(1);
+    app.set_version_flag("--version", DSPHOST_VERSION);
+    // In the order in which help lists them.
+    for (const auto add :
+         {AddConvert, AddEffectsCommand, AddPitch, AddEqCurve, AddRender, AddSonogram, AddSpectrum, AddTuner})
+        add(app);
+    CheckCommand(app, count, arguments);
+    try {
+        app.parse(count, arguments);
+    } catch (const CLI::Success& help) {  // --help, --version
+        app.exit(help);
+    } catch (const CLI::ParseError& error) {
+        throw UserError(std::string(error.what()) + "; see --help");
+    }
+}
+
+}  // namespace dsphost

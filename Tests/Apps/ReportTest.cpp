@@ -1,0 +1,239 @@
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <complex>
+#include <cstdint>
+#include <numbers>
+#include <set>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include <nlohmann/json.hpp>
+
+#include "Apps/Program.h"
+#include "Chain.h"
+#include "Support/Signals.h"
+
+// What the commands tell of effects and files: listings, tables, notes, pictures.
+namespace AppTest {
+namespace {
+
+using nlohmann::json;
+
+constexpr int kRate = 48000;
+
+class Reports : public Program {
+protected:
+    // A second of silence, then two of a saw-tooth 20 cents above A3.
+    static void SaveTone() {
+        constexpr int kToneRate = 44100;
+        const double turn = 2.0 * std::numbers::pi * 220.0 * std::exp2(20.0 / 1200.0) / kToneRate;
+        std::vector<double> tone(kToneRate, 0.0);
+        for (int i = 0; i < 2 * kToneRate; ++i) {
+            double sum = 0.0;
+            for (int h = 1; h <= 20; ++h) sum += std::sin(turn * h * i) / h;
+            tone.push_back(0.2 * sum);
+        }
+        Save("in.wav", {1, kToneRate, kDouble, tone});
+    }
+    static void SaveSine(std::size_t frames, double hz) {
+        Save("in.wav", {2, kRate, kDouble, TestSupport::Sine<double>(frames, hz, kRate, 1.0, 2)});
+    }
+    // "1280x720" by the file's header.
+    static std::string PngSize(const std::string& path) {
+        const std::string bytes = Bytes(path);
+        if (bytes.size() < 24 || !bytes.starts_with("\x89PNG\r\n\x1a\n")) return "no PNG";
+        const auto number = [&](std::size_t at) {
+            std::uint32_t value = 0;
+            for (std::size_t i = at; i < at + 4; ++i)
+                value = value << 8 | static_cast<std::uint8_t>(bytes[i]);
+            return std::to_string(value);
+        };
+        return number(16).append("x").append(number(20));
+    }
+};
+
+using Table = std::vector<std::vector<double>>;
+
+Table ParseCsv(const std::string& csv, const std::string& heading) {
+    std::istringstream lines(csv);
+    std::string line;
+    std::getline(lines, line);
+    EXPECT_EQ(line, heading);
+    Table rows;
+    while (std::getline(lines, line)) {
+        std::istringstream cells(line);
+        auto& row = rows.emplace_back();
+        for (std::string cell; std::getline(cells, cell, ',');) row.push_back(std::stod(cell));
+    }
+    return rows;
+}
+
+TEST_F(Reports, DescribeOneEffect) {
+    const auto gain = json::parse(Succeed("effects gain --json")).at(0);
+    EXPECT_EQ(gain.at("name"), "Gain");
+    EXPECT_EQ(gain.at("latency"), 0);
+    EXPECT_EQ(gain.at("default_preset"), 0);
+    EXPECT_EQ(gain.at("presets"), json::array());
+    const auto& parameters = gain.at("parameters");
+    ASSERT_EQ(parameters.size(), 5u);
+    EXPECT_EQ(parameters[0], json::parse(R"({"index": 0, "name": "Gain", "unit": "dB", "default": 0.5,
+                                             "type": "continuous", "text": "0.0 dB", "values": []})"));
+    // The full label, side included.
+    EXPECT_EQ(parameters[4]["name"], "Flip phase R");
+    EXPECT_EQ(parameters[4]["type"], "switch");
+    const auto text = Succeed("effects Gain");
+    for (const std::string words : {"-Inf. dB", "20.0 dB", "-1.00", "Flip phase R", "Off", "On", "latency 0"})
+        EXPECT_NE(text.find(words), std::string::npos) << words << " in\n" << text;
+}
+
+// Whatever effects there are: complete records, distinct names, defaults in range, texts in UTF-8 (the parser
+// throws otherwise), and every effect and preset can be named in a chain.
+TEST_F(Reports, DescribeEveryEffect) {
+    std::set<std::string> names;
+    for (const auto& effect : json::parse(Succeed("effects --json"))) {
+        const std::string name = effect.at("name");
+        SCOPED_TRACE(name);
+        EXPECT_TRUE(names.insert(name).second);
+        EXPECT_FALSE(effect.at("parameters").empty());
+        int index = 0;
+        for (const auto& parameter : effect.at("parameters")) {
+            EXPECT_EQ(parameter.at("index"), index++);
+            EXPECT_NE(parameter.at("name"), "");
+            EXPECT_NE(parameter.at("text"), "");
+            EXPECT_TRUE(parameter.at("default") >= 0.0 && parameter.at("default") <= 1.0) << parameter;
+            EXPECT_TRUE(parameter.at("type") != "list" || parameter.at("values").size() > 1) << parameter;
+        }
+        std::vector<std::string> chain{name};
+        for (const std::string preset : effect.at("presets")) chain.push_back(name + ": preset=" + preset);
+        EXPECT_NO_THROW(dsphost::Chain{chain});
+    }
+    EXPECT_TRUE(names.contains("Gain"));
+    for (const auto& name : names) EXPECT_NE(Succeed("effects").find(name), std::string::npos);
+}
+
+std::complex<double> SpectrumAt(double hz, const std::vector<double>& samples) {
+    const auto turn = std::polar(1.0, -2.0 * std::numbers::pi * hz / kRate);
+    std::complex<double> sum = 0.0;
+    for (auto sample = samples.rbegin(); sample != samples.rend(); ++sample) sum = sum * turn + *sample;
+    return sum;
+}
+
+TEST_F(Reports, EqCurveAgreesWithASineSweptThroughRender) {
+    // From 5 Hz to half the rate in a second.
+    Sound sweep{1, kRate, kDouble, {}};
+    const double rise = std::log(kRate / 2.0 / 5.0);
+    for (int i = 0; i < kRate; ++i)
+        sweep.samples.push_back(
+            0.1 * std::sin(2.0 * std::numbers::pi * 5.0 / rise * (std::exp(rise * i / kRate) - 1.0)));
+    Save("sweep.wav", sweep);
+    for (const std::string bands :
+         {"80 highpass q=50", "3000 lowpass -2.5 q=90", "2500 peak -3 q=200", "150 lowshelf 7.5",
+          "6000 highshelf -9 q=120", "200 lowshelf-butterworth 12", "5000 highshelf-butterworth 4",
+          "40000 peak 6; 30000 highshelf 6", "80 highpass q=50; 2500 peak -3 q=200; 9000 lowpass"}) {
+        SCOPED_TRACE(bands);
+        const std::string fx = " --fx \"EQ: " + bands + "\" ";
+        Succeed("eq-curve -y --rate 48000 curve.csv" + fx);
+        Succeed("render -y --tail 1 sweep.wav out.wav" + fx);
+        const auto curve = ParseCsv(Bytes("curve.csv"), "frequency_hz,gain_db,phase_deg");
+        ASSERT_EQ(curve.size(), 512u);
+        EXPECT_EQ(curve.front()[0], 10.0);
+        EXPECT_EQ(curve.back()[0], 24000.0);
+        EXPECT_NEAR(curve[256][0], 10.0 * std::pow(2400.0, 256.0 / 511.0), 1e-6);
+        const Sound out = Load("out.wav");
+        for (std::size_t i = 0; i < curve.size(); i += 17) {
+            const double hz = curve[i][0], decibels = curve[i][1], degrees = curve[i][2];
+            if (decibels < -120.0) continue;
+            const auto measured = SpectrumAt(hz, out.samples) / SpectrumAt(hz, sweep.samples);
+            EXPECT_NEAR(20.0 * std::log10(std::abs(measured)), decibels, 0.01) << hz;
+            const double apart = std::arg(measured) * 180.0 / std::numbers::pi - degrees;
+            EXPECT_NEAR(std::remainder(apart, 360.0), 0.0, 0.1) << hz;
+        }
+    }
+}
+
+TEST_F(Reports, EqCurveIsTheSameAsJson) {
+    const std::string fx = "eq-curve --fx \"eq: 12000 LOWPASS\" ";
+    const auto curve = ParseCsv(Succeed(fx + "-"), "frequency_hz,gain_db,phase_deg");
+    const auto points = json::parse(Succeed(fx + "--json -")).at("points");
+    ASSERT_EQ(points.size(), curve.size());
+    EXPECT_EQ(points[100].at("gain_db"), curve.at(100).at(1));
+    EXPECT_EQ(points[511].at("gain_db"), -300.0) << "a number even where nothing is left";
+}
+
+// Whatever the window and length: 0 dB on the bin's centre, one row a bin.
+TEST_F(Reports, SpectrumReadsZeroDecibelsForAFullScaleSine) {
+    for (const int length : {128, 4096, 32768})
+        for (const std::string window : {"rectangular", "triangular", "hann", "hamming", "blackman"}) {
+            SCOPED_TRACE(window + " " + std::to_string(length));
+            const int bin = length / 8 + 3;
+            SaveSine(2 * static_cast<std::size_t>(length) + 77, 1.0 * kRate * bin / length);
+            const auto rows = ParseCsv(
+                Succeed("spectrum in.wav --csv - --window " + window + " --length " + std::to_string(length)),
+                "frequency_hz,level_db");
+            ASSERT_EQ(rows.size(), static_cast<std::size_t>(length / 2));
+            const auto top = std::ranges::max_element(rows, {}, [](const auto& row) { return row[1]; });
+            EXPECT_EQ(top - rows.begin(), bin);
+            EXPECT_NEAR((*top)[0], 1.0 * kRate * bin / length, 1e-3);
+            EXPECT_NEAR((*top)[1], 0.0, 0.002);
+        }
+}
+
+// No window is whole, or none after the first: one spectrum, not a division by zero.
+TEST_F(Reports, SpectrumTakesShortInputs) {
+    SaveSine(4100, 3750.0);
+    for (const std::string overlap : {"0", "0.27", "0.99"}) {
+        const auto rows =
+            ParseCsv(Succeed("spectrum in.wav --csv - --overlap " + overlap), "frequency_hz,level_db");
+        EXPECT_NEAR(rows.at(320).at(1), 0.0, 0.002) << overlap;
+    }
+    Succeed("spectrum in.wav --csv - --length 8192");
+}
+
+// Catches times of the window's end, notes in silence, and anything but the array on standard output.
+TEST_F(Reports, TunerTellsNotes) {
+    SaveTone();
+    const auto rows = json::parse(Succeed("tuner in.wav o.png --json"));
+    EXPECT_NEAR(static_cast<double>(rows.size()), 3.0 * 30.0, 5.0);
+    int silent = 0, heard = 0;
+    for (const auto& row : rows) {
+        const double time = row.at("time");
+        if (time < 0.8) {
+            for (const char* key : {"note", "cents", "frequency"}) EXPECT_TRUE(row.at(key).is_null());
+            ++silent;
+        } else if (time > 1.3) {
+            EXPECT_EQ(row.at("note"), "A3") << time;
+            EXPECT_NEAR(row.at("cents"), 20.0, 0.5) << time;
+            EXPECT_NEAR(row.at("frequency"), 222.56, 0.07) << time;
+            ++heard;
+        }
+    }
+    EXPECT_GT(silent, 15);
+    EXPECT_GT(heard, 40);
+    // A window too short for low notes where the rate is high.
+    Save("in.wav", {1, 192000, kDouble, TestSupport::Sine<double>(2 * 192000, 41.2, 192000)});
+    const auto low = json::parse(Succeed("tuner in.wav o.png -y --json"));
+    EXPECT_EQ(low.at(low.size() / 2).at("note"), "E1");
+}
+
+TEST_F(Reports, PicturesHaveTheSizeAskedForAndTheSameBytesAgain) {
+    SaveTone();
+    for (const std::string command : {"spectrum", "sonogram", "tuner"}) {
+        SCOPED_TRACE(command);
+        const std::string options = " -y --size 321x123 --dpi 144 --view filled,note-names";
+        for (const std::string file : {"a.png", "b.png"})
+            EXPECT_EQ(Succeed(command + " in.wav " + file + options), "");
+        EXPECT_EQ(PngSize("a.png"), "321x123");
+        EXPECT_EQ(Bytes("a.png"), Bytes("b.png"));
+        Succeed(command + " in.wav c.png -y --scale linear");
+        EXPECT_TRUE(PngSize("c.png").ends_with("x720"));
+    }
+    Succeed("spectrum in.wav o.png --csv o.csv");
+    EXPECT_EQ(PngSize("o.png"), "1280x720");
+    EXPECT_TRUE(Bytes("o.csv").starts_with("frequency_hz,level_db\n"));
+}
+
+}  // namespace
+}  // namespace AppTest
