@@ -205,9 +205,9 @@ public:
     void SetPointer(float x, float y);
     void ClearPointer();
 
-    // Drawing, once per back-end (Drawing/DrawingCairo.h, on Windows DrawingGdiPlus.h and DrawingD2D.h): into
-    // `rectangle`, in pixels of the target, whatever its size. One thread draws for all analysers; it is the
-    // display thread, or the menu's while the display thread rests.
+    // Drawing, with any back-end (its header makes these templates): into `rectangle`, in pixels of the target,
+    // whatever its size. One thread draws for all analysers; it is the display thread, or the menu's while the
+    // display thread rests.
     //
     // DoDraw draws what the display mode says, and the tuner in a strip above it while that is on.
     template <class Drawing>
@@ -239,22 +239,10 @@ public:
     void DrawNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
     template <class Drawing>
     void DrawNeedleInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // What the drawing routines read of the inside.
+    struct ViewAccess;
 
 private:
-    template <class Drawing>
-    void DrawSpectrumAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
-                        const spectrum_settings& view);
-    template <class Drawing>
-    void DrawSonogramAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
-                        const spectrum_settings& view);
-    template <class Drawing>
-    void DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
-                          const CoordinatesAndFrequencies& map);
-    template <class Drawing>
-    void DrawSonogramInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot);
-    template <class Drawing>
-    void DrawTunerLine(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
-
     static constexpr float kNowhere = std::numeric_limits<float>::quiet_NaN();  // within no rectangle
 
     bool ApplyCommand(int command);
