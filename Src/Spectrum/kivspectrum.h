@@ -205,9 +205,9 @@ public:
     void SetPointer(float x, float y);
     void ClearPointer();
 
-    // Drawing, with any back-end (its header makes these templates): into `rectangle`, in pixels of the target,
-    // whatever its size. One thread draws for all analysers; it is the display thread, or the menu's while the
-    // display thread rests.
+    // Drawing, with any back-end (its header makes these templates): into `rectangle`, in pixels of the
+    // target, whatever its size. One thread draws for all analysers; it is the display thread, or the menu's
+    // while the display thread rests.
     //
     // DoDraw draws what the display mode says, and the tuner in a strip above it while that is on.
     template <class Drawing>

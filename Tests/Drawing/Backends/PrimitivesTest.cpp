@@ -25,8 +25,8 @@ constexpr Stroke kThick{{kWhite}, 2.0f}, kThin{{kWhite}, 1.0f};
 struct Figure {
     const char* fault;
     std::function<void(DrawTarget&)> draw;
-    // Rows with # white, . black, ? either at an edge; the rest is black. With 8 for half and B for three
-    // quarters of white it is drawn only where edges are smoothed, and may be off by a sixteenth.
+    // Rows with # white, 8 half and B three quarters of it, . black, ? any at an edge; the rest is black.
+    // With an 8 it is drawn only where edges are smoothed.
     std::string_view picture;
 };
 
@@ -84,6 +84,9 @@ const Figure kFigures[] = {
          t.Clear(kWhite);
      },
      ".......... .......... ..###..... ..###..... ..###..... "},
+    {"bitmap in steps, or mixed with what is beside it",
+     [](DrawTarget& t) { t.Bitmap({2, 1, {0xFF000000, 0xFFFFFFFF}}, {0, 0, 10, 3}, 255); },
+     "..??++??## ..??++??## ..??++??## "},
     {"edge in steps", [](DrawTarget& t) { t.FillRectangle({0.5f, 0, 2.25f, 2}, {kWhite}); },
      "8#B....... 8#B....... "},
     {"thin line too strong",
@@ -102,10 +105,12 @@ const Figure kFigures[] = {
 };
 // clang-format on
 
-char SignOf(std::uint32_t pixel, int slack) {
-    const std::pair<char, int> signs[] = {{'.', 0}, {'8', 0x80}, {'B', 0xBF}, {'#', 0xFF}};
-    for (const auto& [sign, value] : signs)
-        if (std::abs(static_cast<int>(pixel & 0xFF) - value) <= slack) return sign;
+int ChannelOf(std::uint32_t pixel, int shift) { return static_cast<int>(pixel >> shift & 0xFF); }
+
+// Other greys are '+'.
+char SignOf(std::uint32_t pixel) {
+    for (const auto& [sign, grey] : {std::pair{'.', 0}, {'8', 0x80}, {'B', 0xBF}, {'#', 0xFF}})
+        if (std::abs(ChannelOf(pixel, 8) - grey) <= 16) return sign;
     return '+';
 }
 
@@ -123,8 +128,7 @@ TYPED_TEST_SUITE(Primitives, TestSupport::DrawingBackends);
 TYPED_TEST(Primitives, LightTheirPixels) {
     for (const Figure& figure : kFigures) {
         std::string expected(figure.picture), picture;
-        const bool smooth = expected.find('8') != std::string::npos;
-        if (smooth && !DrawingSurface<TypeParam>::Smooths()) continue;
+        if (expected.find('8') != std::string::npos && !DrawingSurface<TypeParam>::Smooths()) continue;
         while (expected.size() < kHeight * (kWidth + 1)) expected += ".......... ";
         this->m_surface.Paint(96.0f, [&](DrawTarget& target) {
             target.Clear(0);
@@ -132,9 +136,7 @@ TYPED_TEST(Primitives, LightTheirPixels) {
         });
         for (int y = 0; y < kHeight; ++y, picture += ' ')
             for (int x = 0; x < kWidth; ++x)
-                picture += expected[picture.size()] == '?'
-                               ? '?'
-                               : SignOf(this->m_surface.Pixel(x, y), smooth ? 16 : 0);
+                picture += expected[picture.size()] == '?' ? '?' : SignOf(this->m_surface.Pixel(x, y));
         EXPECT_EQ(picture, expected) << figure.fault;
     }
 }
@@ -155,7 +157,7 @@ TYPED_TEST(Primitives, TakeRedFromTheLowByteOfAColour) {
     surface.PaintWith(brush);
     drawing.ReleaseBrush(brush);
     for (const auto& [shift, expected] : {std::pair{16, 0}, {8, 0x40}, {0, 0x80}})
-        EXPECT_NEAR(static_cast<int>(surface.Pixel(3, 3) >> shift & 0xFF), expected, 1);
+        EXPECT_NEAR(ChannelOf(surface.Pixel(3, 3), shift), expected, 1);
 
     DrawingPen* pen = surface.Drawing().CreatePen(kThick);
     ASSERT_TRUE(pen && pen->object);
@@ -163,6 +165,54 @@ TYPED_TEST(Primitives, TakeRedFromTheLowByteOfAColour) {
     EXPECT_EQ(pen, nullptr);
     drawing.ReleasePen(pen);
     drawing.ReleaseBrush({});
+}
+
+// Catches rows or colours exchanged, an alpha that is multiplied twice or not at all, and a blend with the
+// wrong share of the ground: each pixel is source + ground * (1 - alpha), all of it times the opacity.
+TYPED_TEST(Primitives, BlendBitmapsByTheirAlpha) {
+    constexpr std::uint32_t kGround = 0x4080C0;  // as Pixel() gives it
+    const DrawingBitmap bitmap{3, 2, {0xFF102030, 0, 0x80800000, 0x80004000, 0x40000040, 0xFFFFFFFF}};
+    DrawingSurface<TypeParam> surface(6, 5);
+    for (const int opacity : {255, 128, 0}) {
+        surface.Paint(96.0f, [&](DrawTarget& target) {
+            target.Clear(ColourFromRgb(kGround));
+            target.Bitmap(bitmap, {2, 1, 3, 2}, static_cast<std::uint8_t>(opacity));
+        });
+        for (int i = 0; i < 30; ++i) {
+            const int x = i % 6, y = i / 6;
+            const bool inside = x >= 2 && x < 5 && y >= 1 && y < 3;
+            const std::uint32_t source = inside ? bitmap.Row(y - 1)[x - 2] : 0;
+            for (const int shift : {0, 8, 16}) {
+                const double alpha = ChannelOf(source, 24) / 255.0, share = opacity / 255.0;
+                const double expected =
+                    ChannelOf(source, shift) * share + ChannelOf(kGround, shift) * (1.0 - alpha * share);
+                EXPECT_NEAR(ChannelOf(surface.Pixel(x, y), shift), expected, inside ? 2.0 : 0.0)
+                    << x << ", " << y << ", channel " << shift << ", opacity " << opacity;
+            }
+        }
+    }
+}
+
+// Catches a copy that is kept after the bitmap has changed (its pixels, its kind, its size), the unused top
+// byte taken for an alpha, and rounding of what should be copied.
+TYPED_TEST(Primitives, CopyEveryVersionOfABitmap) {
+    DrawingSurface<TypeParam> surface(4, 4);
+    DrawingBitmap bitmap;
+    for (const DrawingBitmap& next : {DrawingBitmap{1, 1, {0xFF112233}},
+                                      {1, 1, {0x00445566}, true},
+                                      {1, 1, {0x00778899}, true},
+                                      {2, 2, {0x00FF0102, 0x80030405, 0xFF060708, 0x01FFFFFF}, true}}) {
+        bitmap = next;
+        bitmap.Changed();
+        const auto side = static_cast<float>(bitmap.width);
+        surface.Paint(96.0f, [&](DrawTarget& target) {
+            target.Clear(0x808080);
+            target.Bitmap(bitmap, {1, 1, side, side}, 255);
+        });
+        for (int y = 0; y < bitmap.height; ++y)
+            for (int x = 0; x < bitmap.width; ++x)
+                EXPECT_EQ(surface.Pixel(1 + x, 1 + y), bitmap.Row(y)[x] & 0xFFFFFF) << x << ", " << y;
+    }
 }
 
 // Catches a slot inserted or exchanged. The destructor takes two places in this ABI.
