@@ -139,6 +139,49 @@ TEST_F(Readings, SonogramLabelsStandAtTheirPlaces) {
     EXPECT_EQ(colour, Look::kPlot);
     EXPECT_EQ(empty.x, m_plot.x);
     EXPECT_NEAR(Right(empty), SonogramX(-1.0), 3.0f);
+
+    // The parts alone, as hosts draw them.
+    Sonogram& sonogram = *analyser.GetSonogram();
+    Target picture, times, notes, levels;
+    sonogram.Draw<Recording>(picture, kWhole);
+    sonogram.DrawTimeline<Recording>(times, kWhole);
+    sonogram.DrawFrequencyScale<Recording>(notes, kWhole, true);
+    sonogram.DrawIntensityScale<Recording>(levels, kWhole);
+    const auto has = [](const Target& t, std::string_view label) {
+        return std::ranges::count(t.texts, label, &Recording::Text::text) == 1;
+    };
+    EXPECT_EQ(picture.images.at(0).bitmap, &sonogram.GetBitmap());
+    EXPECT_TRUE(has(times, "0 s"));
+    EXPECT_TRUE(has(notes, "C4"));
+    EXPECT_TRUE(has(levels, "0 dB"));
+}
+
+// Catches an area that is not closed on the ground, bars of another height than the curve, and a grid that is
+// there when it is off.
+TEST_F(Readings, CurveHasItsStyle) {
+    kivspectrum::settings.time_smoothing = 0;
+    m_shown.Hear(1000.0, 0.1);
+    for (const std::int32_t style : {1, 2, 3}) {
+        kivspectrum::settings.view_option_e = style;
+        kivspectrum::settings.view_option_c = style == 1 ? 1 : 0;
+        const auto drawn = ShowSpectrum();
+        float top = Bottom(m_plot);
+        int grid = 0;
+        for (const auto& [box, colour] : drawn.rectangles) {
+            grid += colour == Look::kGrid ? 1 : 0;
+            if (colour == Look::kCurve) top = std::min(top, box.y);
+        }
+        EXPECT_EQ(grid > 0, style == 1);
+        EXPECT_NEAR(top, style == 3 ? LevelY(-20.0) : Bottom(m_plot), 5.0f);
+        ASSERT_EQ(drawn.polygons.size(), style == 2 ? 1u : 0u);
+        if (style != 2) continue;
+        const auto& area = drawn.polygons[0].points;
+        const auto& curve = drawn.lines.back().points;
+        ASSERT_EQ(area.size(), curve.size() + 2);
+        EXPECT_EQ(area[curve.size()].x, curve.back().x);
+        EXPECT_EQ(area.back().x, curve.front().x);
+        EXPECT_EQ(area.back().y, Bottom(m_plot));
+    }
 }
 
 // Catches a trace that is missing, upside down or without regard to time.
@@ -173,8 +216,10 @@ TEST_F(Readings, NeedleAndArrowAreOnTheErrorsSide) {
         const PointF tip = dial.polygons.back().points.at(0);
         EXPECT_GT(pivot.y, tip.y);
         EXPECT_NEAR(degrees(tip), cents, 1.5);
-        for (const auto& [text, box, middle] : dial.texts)
+        for (const auto& [text, box, middle] : dial.texts) {
             EXPECT_NEAR(degrees(middle), ValueOf(text), 1.0) << text;
+            EXPECT_GE(box.y, 0.0f) << text;
+        }
         EXPECT_GE(dial.texts.size(), 3u);
 
         const auto info = Show(&kivspectrum::DrawNeedleInfo<Recording>);
@@ -237,7 +282,8 @@ TEST_F(Readings, PointerReadsWhatTheLabelsSay) {
     for (const auto& [hz, level] : {std::pair{1000.0, -40.0}, {50.0, -10.0}, {10000.0, -80.0}}) {
         ShowSpectrum();
         analyser.SetPointer(Map().FrequencyToX(hz), Map().LevelToY(level));
-        const std::string text = ShowSpectrum().texts.back().text;
+        const auto [text, box, middle] = ShowSpectrum().texts.back();
+        EXPECT_EQ(middle.x > Map().FrequencyToX(hz), hz < 500.0) << "on the side with less room";
         EXPECT_NEAR(Reading(text, "Hz"), hz, 0.01 * hz) << text;
         EXPECT_NEAR(Reading(text, "dB"), level, 0.5) << text;
     }
@@ -261,8 +307,10 @@ TEST_F(Readings, PeakIsTheSines) {
             kivspectrum::settings.view_option_a = scale;
             m_shown.Hear(hz, std::pow(10.0, level / 20.0));
             const auto drawn = ShowSpectrum();
-            const std::string text = drawn.texts.back().text;
+            const auto& [text, box, middle] = drawn.texts.back();
             EXPECT_TRUE(text.starts_with("Peak")) << text;
+            EXPECT_TRUE(box.y < m_plot.y + 40.0f && Right(box) > Right(m_plot) - 40.0f)
+                << "not in the corner";
             EXPECT_NEAR(Reading(text, "Hz"), hz, 2.0) << text;
             EXPECT_NEAR(Reading(text, "dB"), level, 0.3) << text;
             const auto& [curve, colour] = drawn.lines.back();
