@@ -27,6 +27,12 @@ struct ConvertArguments {
 };
 void RunConvert(ConvertArguments arguments);
 
+struct EffectsArguments {
+    std::string effect;
+    bool json = false;
+};
+void RunEffects(EffectsArguments arguments);
+
 struct EqCurveArguments {
     std::string effect, output;
     int rate = 48000;

@@ -10,7 +10,6 @@
 #include <CLI/CLI.hpp>
 
 #include "Arguments.h"
-#include "Commands.h"
 #include "Errors.h"
 #include "Text.h"
 
@@ -64,6 +63,13 @@ void AddConvert(CLI::App& app) {
     command.add_option("--dither", a.dither, "none, tpdf, shaped or shaped-strong");
     command.add_flag("--exact", a.exact, "By the exact ratio of the rates, whatever its factors");
     AddWriting(command, a.writing);
+}
+
+void AddEffects(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "effects", "Lists the effects, or one effect's parameters and presets", RunEffects);
+    command.add_option("NAME", a.effect, "One effect");
+    command.add_flag("--json", a.json, "As JSON");
 }
 
 void AddPitch(CLI::App& app) {
@@ -172,7 +178,7 @@ void RunCommandLine(int count, char** arguments) {
     app.set_version_flag("--version", DSPHOST_VERSION);
     // In the order in which help lists them.
     for (const auto add :
-         {AddConvert, AddEffectsCommand, AddPitch, AddEqCurve, AddRender, AddSonogram, AddSpectrum, AddTuner})
+         {AddConvert, AddEffects, AddPitch, AddEqCurve, AddRender, AddSonogram, AddSpectrum, AddTuner})
         add(app);
     CheckCommand(app, count, arguments);
     try {

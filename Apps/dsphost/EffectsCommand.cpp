@@ -5,7 +5,7 @@
 
 #include <nlohmann/json.hpp>
 
-#include "Commands.h"
+#include "Arguments.h"
 #include "EffectParameters.h"
 #include "EffectTable.h"
 #include "File.h"
@@ -16,11 +16,6 @@ namespace {
 
 using Corvo::EffectParameterType;
 using Json = nlohmann::ordered_json;
-
-struct Arguments {
-    std::string effect;
-    bool json = false;
-};
 
 constexpr int kFrames = 512;
 constexpr tWAVEFORMATEX kFormat{3, 2, 48000, 48000 * 16, 16, 64, 0};
@@ -135,7 +130,9 @@ std::string Overview() {
     return Table(rows);
 }
 
-void Run(const Arguments& arguments) {
+}  // namespace
+
+void RunEffects(EffectsArguments arguments) {
     auto factories = EffectFactories();
     if (!arguments.effect.empty())
         factories = factories.subspan(FindName(arguments.effect, EffectNames(), "effect"), 1);
@@ -145,17 +142,6 @@ void Run(const Arguments& arguments) {
         return Print(all.dump(2) + "\n");
     }
     Print(arguments.effect.empty() ? Overview() : Explain(factories.front()));
-}
-
-}  // namespace
-
-void AddEffectsCommand(CLI::App& app) {
-    const auto arguments = std::make_shared<Arguments>();
-    auto* const command =
-        app.add_subcommand("effects", "Lists the effects, or one effect's parameters and presets");
-    command->add_option("NAME", arguments->effect, "One effect");
-    command->add_flag("--json", arguments->json, "As JSON");
-    command->callback([arguments] { Run(*arguments); });
 }
 
 }  // namespace dsphost

@@ -1,12 +1,12 @@
 #pragma once
 
-#include <concepts>
 #include <cstdint>
 #include <string_view>
 
 #include "Picture/DrawingBitmap.h"
 #include "Picture/DrawingColour.h"
 #include "Picture/Geometry.h"
+#include "Platform/Export.h"
 
 namespace Corvo {
 
@@ -31,39 +31,48 @@ struct TextMetrics {
 // Height of capitals and digits as a share of the text's size; close enough for every plain sans-serif.
 constexpr float kCapHeight = 0.7f;
 
-// The primitives that every back-end's DrawTarget has; the drawing routines use nothing else.
+// One surface while one picture is drawn: the primitives that every back-end has. The drawing routines use
+// nothing else, so a host may also write a target of its own.
 //
-// A target stands for one surface while one picture is drawn. Coordinates are device pixels, x to the right,
-// y down; whole numbers are pixel edges. Edges are smoothed, and what lies outside the clip is left alone.
-// Text is UTF-8 without line breaks, cut after the last whole character of 95 bytes; `size` is its em in
-// pixels. A size, width or rectangle that is empty or not a number draws nothing.
-//
-//   Scale()              pixels per 1/96 inch
-//   Clear                fills the whole surface, the clip apart
-//   Line, Polyline       stroked; fewer than two points draw nothing
-//   FillPolygon          closed, even-odd
-//   OutlineRectangle     the line lies within the rectangle
-//   FillRoundedRectangle the radius is limited to half the shorter side
-//   Text                 from, around or up to `baseline`
-//   Bitmap               stretched over `destination`, smoothly unless at its own size
-//   PushClip, PopClip    clips nest, each within the one before
-template <typename T>
-concept IsDrawTarget = requires(T& target, PointF point, const PointF* points, int count,
-                                const RectF& rectangle, Ink ink, const Stroke& stroke, std::string_view text,
-                                float number, const DrawingBitmap& bitmap) {
-    { target.Scale() } -> std::convertible_to<float>;
-    target.Clear(ink.colour);
-    target.Line(point, point, stroke);
-    target.Polyline(points, count, stroke);
-    target.FillPolygon(points, count, ink);
-    target.FillRectangle(rectangle, ink);
-    target.OutlineRectangle(rectangle, stroke);
-    target.FillRoundedRectangle(rectangle, number, ink);
-    { target.MeasureText(text, number) } -> std::convertible_to<TextMetrics>;
-    target.Text(text, point, TextAlign::Left, number, ink);
-    target.Bitmap(bitmap, rectangle, ink.opacity);
-    target.PushClip(rectangle);
-    target.PopClip();
+// Coordinates are device pixels, x to the right, y down; whole numbers are pixel edges. Edges are smoothed,
+// and what lies outside the clip is left alone. Text is UTF-8 without line breaks, cut after the last whole
+// character of 95 bytes; `size` is its em in pixels. A size, width or rectangle that is empty, not a number
+// or beyond 32767 draws nothing. Used on the thread that draws; nothing is kept of the arguments.
+class DSP_API DrawTarget {
+public:
+    // `dpi` is the surface's dots per inch; what is not above 0 counts as 96.
+    explicit DrawTarget(float dpi);
+    virtual ~DrawTarget();
+    DrawTarget(const DrawTarget&) = delete;
+    DrawTarget& operator=(const DrawTarget&) = delete;
+
+    // Pixels per 1/96 inch.
+    float Scale() const { return m_scale; }
+
+    // Fills the whole surface, except for what the clip protects.
+    virtual void Clear(ColourReference colour) = 0;
+    // Stroked. As a polyline of two points, unless the back-end knows better.
+    virtual void Line(PointF from, PointF to, const Stroke& stroke);
+    // Stroked; fewer than two points draw nothing.
+    virtual void Polyline(const PointF* points, int count, const Stroke& stroke) = 0;
+    // Closed, filled by the even-odd rule.
+    virtual void FillPolygon(const PointF* points, int count, Ink ink) = 0;
+    virtual void FillRectangle(const RectF& rectangle, Ink ink) = 0;
+    // The line lies within the rectangle.
+    virtual void OutlineRectangle(const RectF& rectangle, const Stroke& stroke) = 0;
+    // The radius is limited to half the shorter side.
+    virtual void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink) = 0;
+    virtual TextMetrics MeasureText(std::string_view text, float size) = 0;
+    // From, around or up to `baseline`.
+    virtual void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink) = 0;
+    // Stretched over `destination`, smoothly unless at its own size.
+    virtual void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity) = 0;
+    // Clips nest, each within the one before.
+    virtual void PushClip(const RectF& rectangle) = 0;
+    virtual void PopClip() = 0;
+
+private:
+    float m_scale;
 };
 
 }  // namespace Corvo

@@ -50,24 +50,12 @@ void kivspectrum::ObserverUpdate() {
     // The class-wide lock alone: with this analyser's own held as well, two walks could wait for each other.
     const Lock classLock(AnalyserLock());
     for (kivspectrum* const observer : Observers()) {
-        if (!m_tunerOn) observer->SetTunerOn(false);
+        if (!m_analyser->state.tunerOn) observer->SetTunerOn(false);
         observer->init();
     }
 }
 
-kivspectrum::kivspectrum()
-    : m_analyser(std::make_unique<Analyser>()),
-      m_instanceLock(m_analyser->GetLock()),
-      m_drawer(&m_analyser->GetDrawer()),
-      m_tuner(&m_analyser->GetTuner()),
-      m_sonogram(&m_analyser->GetSonogram()),
-      m_tunerOn(m_analyser->state.tunerOn),
-      m_tunerVisible(m_analyser->state.tunerVisible),
-      m_showInfoBox(m_analyser->state.showInfoBox),
-      m_displayMode(m_analyser->state.displayMode),
-      m_samplingRate(m_analyser->state.samplingRate),
-      m_pointerX(m_analyser->state.pointerX),
-      m_pointerY(m_analyser->state.pointerY) {
+kivspectrum::kivspectrum() : m_analyser(std::make_unique<Analyser>()) {
     // Together: a menu command in between would not reach this analyser.
     const Lock classLock(AnalyserLock());
     init();
@@ -85,7 +73,7 @@ void kivspectrum::set_parameters(int samplingRate) { m_analyser->SetSamplingRate
 void kivspectrum::init() {
     const Lock classLock(AnalyserLock());
     if (lock_init) return;
-    if (m_tunerOn && settings.window_length < kShortestTunerWindow) {
+    if (m_analyser->state.tunerOn && settings.window_length < kShortestTunerWindow) {
         settings.window_length = kShortestTunerWindow;
         return ObserverUpdate();
     }
@@ -121,7 +109,7 @@ bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, boo
         // The analyser's lock is taken before the class-wide one is let go, so that settings and buffers
         // belong together; the work itself holds up nobody else.
         std::unique_lock classLock(AnalyserLock());
-        const Lock instanceLock(m_instanceLock);
+        const Lock instanceLock(m_analyser->GetLock());
         if (!m_analyser->HasFrame()) return false;
         if (probeOnly) return true;
         const spectrum_settings current = settings;
@@ -134,21 +122,22 @@ bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, boo
     return true;
 }
 bool kivspectrum::PrepareFFTForDrawingHelper(bool sonogramMode, bool sonogramOverride) {
-    return PrepareFFTForDrawing(m_samplingRate, true, sonogramMode, sonogramOverride, false);
+    return PrepareFFTForDrawing(m_analyser->state.samplingRate, true, sonogramMode, sonogramOverride, false);
 }
 bool kivspectrum::GetFFTFor3DSonogram(int samplingRate, const std::vector<float>** spectrum,
                                       bool fastSmoothing, bool probeOnly) {
     if (!m_analyser->IsTransforming()) {
         if (!PrepareFFTForDrawing(samplingRate, fastSmoothing, false, false, probeOnly)) return false;
-        if (!probeOnly && m_tunerOn) RunTuner(samplingRate);
+        if (!probeOnly && m_analyser->state.tunerOn) RunTuner(samplingRate);
     }
-    if (spectrum) *spectrum = &m_drawer->GetPowerSmoothed();
+    if (spectrum) *spectrum = &m_analyser->GetDrawer().GetPowerSmoothed();
     return true;
 }
 bool kivspectrum::Refresh() {
     const bool prepared = PrepareFFTForDrawingHelper(IsShowSonogram(), false);
-    if (m_tunerOn && prepared) RunTuner(m_samplingRate);
-    const bool noteGone = m_tunerOn && !prepared && !GetFrozen() && m_analyser->LetTunerWait();
+    if (m_analyser->state.tunerOn && prepared) RunTuner(m_analyser->state.samplingRate);
+    const bool noteGone =
+        m_analyser->state.tunerOn && !prepared && !GetFrozen() && m_analyser->LetTunerWait();
     if (noteGone) TellOfNote();
     return AdvanceSonogram() || prepared || noteGone;
 }
@@ -168,14 +157,14 @@ std::vector<float>& kivspectrum::GetBufferInputPoints() { return m_analyser->Get
 int kivspectrum::GetBufferInputChannels() const { return 1; }
 const std::vector<float>& kivspectrum::GetPower() const { return m_analyser->GetPower(); }
 const std::vector<float>& kivspectrum::GetWindow() const { return m_analyser->GetWindow(); }
-SpectrumDrawer* kivspectrum::GetSpectrumDrawer() const { return m_drawer; }
-Tuner* kivspectrum::GetTuner() const { return m_tuner; }
-Corvo::Sonogram* kivspectrum::GetSonogram() const { return m_sonogram; }
+SpectrumDrawer* kivspectrum::GetSpectrumDrawer() const { return &m_analyser->GetDrawer(); }
+Tuner* kivspectrum::GetTuner() const { return &m_analyser->GetTuner(); }
+Corvo::Sonogram* kivspectrum::GetSonogram() const { return &m_analyser->GetSonogram(); }
 void kivspectrum::peak_reset() { m_analyser->ResetPeaks(); }
 void kivspectrum::SetOn(bool on) { m_analyser->SetOn(on); }
 bool kivspectrum::GetOn() const { return m_analyser->state.on; }
 void kivspectrum::SetTunerOn(bool on) { m_analyser->SetTunerOn(on); }
-bool kivspectrum::GetTunerOn() const { return m_tunerOn; }
+bool kivspectrum::GetTunerOn() const { return m_analyser->state.tunerOn; }
 void kivspectrum::ToggleTuner() {
     const Lock classLock(AnalyserLock());
     if (!m_analyser->ToggleTuner()) return;
@@ -189,11 +178,11 @@ void kivspectrum::SetFrozen(bool frozen) {
 bool kivspectrum::GetFrozen() const { return m_analyser->state.frozen; }
 void kivspectrum::ToggleDisplayMode() { m_analyser->ToggleDisplayMode(); }
 void kivspectrum::ToggleDisplayMode2() { ShowSonogram(!IsShowSonogram()); }
-kivspectrum::_display_mode kivspectrum::GetDisplayMode() const { return m_displayMode; }
+kivspectrum::_display_mode kivspectrum::GetDisplayMode() const { return m_analyser->state.displayMode; }
 void kivspectrum::ShowSonogram(bool show) { m_analyser->ShowSonogram(show); }
 bool kivspectrum::IsShowSonogram() const { return m_analyser->state.showSonogram; }
-void kivspectrum::ToggleShowInfoBoxes() { SetShowInfoBox(!m_showInfoBox); }
+void kivspectrum::ToggleShowInfoBoxes() { SetShowInfoBox(!m_analyser->state.showInfoBox); }
 void kivspectrum::SetShowInfoBox(bool show) { m_analyser->state.showInfoBox = show; }
-bool kivspectrum::IsShowInfoBox() const { return m_showInfoBox; }
+bool kivspectrum::IsShowInfoBox() const { return m_analyser->state.showInfoBox; }
 void kivspectrum::SetPointer(float x, float y) { m_analyser->SetPointer(x, y); }
 void kivspectrum::ClearPointer() { m_analyser->ClearPointer(); }

@@ -10,13 +10,11 @@
 #include "Platform/Export.h"
 #include "Spectrum/Scales/SpectrumSettings.h"
 
-class CoordinatesAndFrequencies;
 class SpectrumDrawer;
 class SpectrumStaticInfo;
 class Tuner;
 namespace Corvo {
 class Analyser;
-class CriticalSection;
 class Sonogram;
 struct PointF;
 struct RectF;
@@ -176,9 +174,9 @@ public:
     void SetPointer(float x, float y);
     void ClearPointer();
 
-    // Drawing, once per back-end (Drawing/DrawingCairo.h, on Windows DrawingGdiPlus.h and DrawingD2D.h): into
-    // `rectangle`, in pixels of the target, whatever its size. One thread draws for all analysers; it is the
-    // display thread, or the menu's while the display thread rests.
+    // Drawing, with any back-end (its header makes these templates): into `rectangle`, in pixels of the
+    // target, whatever its size. One thread draws for all analysers; it is the display thread, or the menu's
+    // while the display thread rests.
     //
     // DoDraw draws what the display mode says, and the tuner in a strip above it while that is on.
     template <class Drawing>
@@ -210,36 +208,14 @@ public:
     void DrawNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
     template <class Drawing>
     void DrawNeedleInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
+    // What the drawing routines read of the inside.
+    struct ViewAccess;
 
 private:
-    template <class Drawing>
-    void DrawSpectrumAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
-                        const spectrum_settings& view);
-    template <class Drawing>
-    void DrawSonogramAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
-                        const spectrum_settings& view);
-    template <class Drawing>
-    void DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
-                          const CoordinatesAndFrequencies& map);
-    template <class Drawing>
-    void DrawSonogramInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot);
-    template <class Drawing>
-    void DrawTunerLine(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
-
     void TellOfNote();
     void RunTuner(int samplingRate);
     void Tell(int message, std::intptr_t detail);
 
     std::unique_ptr<Corvo::Analyser> m_analyser;
-
-    // The analyser's parts, by the names that the drawing routines know.
-    Corvo::CriticalSection& m_instanceLock;
-    SpectrumDrawer* const m_drawer;
-    Tuner* const m_tuner;
-    Corvo::Sonogram* const m_sonogram;
-    const std::atomic<bool>&m_tunerOn, &m_tunerVisible, &m_showInfoBox;
-    const std::atomic<_display_mode>& m_displayMode;
-    const std::atomic<int>& m_samplingRate;
-    const std::atomic<float>&m_pointerX, &m_pointerY;
-    std::vector<Corvo::PointF> m_outline;  // of the filled curve
+    std::vector<Corvo::PointF> m_outline;  // memory that one picture leaves to the next
 };

@@ -1,32 +1,35 @@
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <string_view>
 
 #include "Drawing/DrawTarget.h"
+#include "Drawing/Views/Views.h"
 
 namespace TestSupport {
 
-// A back-end that only measures, so that what a graphics library allocates does not count.
+// A back-end that only measures, so that no graphics library has a say. Every character is 0.6 sizes wide.
 struct NoDrawing {
-    struct DrawTarget {
-        float Scale() const { return 1.0f; }
-        void Clear(Corvo::ColourReference) {}
-        void Line(Corvo::PointF, Corvo::PointF, const Corvo::Stroke&) {}
-        void Polyline(const Corvo::PointF*, int, const Corvo::Stroke&) {}
-        void FillPolygon(const Corvo::PointF*, int, Corvo::Ink) {}
-        void FillRectangle(const Corvo::RectF&, Corvo::Ink) {}
-        void OutlineRectangle(const Corvo::RectF&, const Corvo::Stroke&) {}
-        void FillRoundedRectangle(const Corvo::RectF&, float, Corvo::Ink) {}
-        Corvo::TextMetrics MeasureText(std::string_view text, float size) {
-            return {0.6f * size * static_cast<float>(text.size()), size, 0.25f * size};
+    class DrawTarget : public Corvo::DrawTarget {
+    public:
+        explicit DrawTarget(float dpi = 96.0f) : Corvo::DrawTarget(dpi) {}
+
+        void Clear(Corvo::ColourReference) override {}
+        void Polyline(const Corvo::PointF*, int, const Corvo::Stroke&) override {}
+        void FillPolygon(const Corvo::PointF*, int, Corvo::Ink) override {}
+        void FillRectangle(const Corvo::RectF&, Corvo::Ink) override {}
+        void OutlineRectangle(const Corvo::RectF&, const Corvo::Stroke&) override {}
+        void FillRoundedRectangle(const Corvo::RectF&, float, Corvo::Ink) override {}
+        Corvo::TextMetrics MeasureText(std::string_view text, float size) override {
+            const auto characters = std::ranges::count_if(text, [](char c) { return (c & 0xC0) != 0x80; });
+            return {0.6f * size * static_cast<float>(characters), size, 0.25f * size};
         }
-        void Text(std::string_view, Corvo::PointF, Corvo::TextAlign, float, Corvo::Ink) {}
-        void Bitmap(const Corvo::DrawingBitmap&, const Corvo::RectF&, std::uint8_t) {}
-        void PushClip(const Corvo::RectF&) {}
-        void PopClip() {}
+        void Text(std::string_view, Corvo::PointF, Corvo::TextAlign, float, Corvo::Ink) override {}
+        void Bitmap(const Corvo::DrawingBitmap&, const Corvo::RectF&, std::uint8_t) override {}
+        void PushClip(const Corvo::RectF&) override {}
+        void PopClip() override {}
     };
 };
-static_assert(Corvo::IsDrawTarget<NoDrawing::DrawTarget>);
 
 }  // namespace TestSupport

@@ -10,10 +10,10 @@
 #include <fontconfig/fontconfig.h>
 #include <pango/pangocairo.h>
 
-#include "Drawing/Backends/PrimitiveArguments.h"
 #include "Drawing/Backends/ResourceKeys.h"
 #include "Drawing/Backends/SlotCache.h"
 #include "Drawing/DrawingFont.h"
+#include "Drawing/PrimitiveArguments.h"
 #include "Platform/CriticalSection.h"
 
 namespace Corvo {
@@ -146,7 +146,7 @@ void DrawingCairo::ReleasePen(DrawingPen*& pen) {
 }
 
 DrawingCairo::DrawTarget::DrawTarget(DrawingCairo& drawing, cairo_t* context, float dpi)
-    : m_drawing(drawing), m_context(cairo_reference(context)), m_scale(ScaleOf(dpi)) {
+    : Corvo::DrawTarget(dpi), m_drawing(drawing), m_context(cairo_reference(context)) {
     cairo_save(m_context);
     cairo_new_path(m_context);
     cairo_set_line_join(m_context, CAIRO_LINE_JOIN_ROUND);
@@ -182,11 +182,6 @@ bool DrawingCairo::DrawTarget::Use(const Stroke& stroke) {
 void DrawingCairo::DrawTarget::Clear(ColourReference colour) {
     Use(Ink{colour});
     cairo_paint(m_context);
-}
-
-void DrawingCairo::DrawTarget::Line(PointF from, PointF to, const Stroke& stroke) {
-    const PointF points[] = {from, to};
-    Polyline(points, 2, stroke);
 }
 
 void DrawingCairo::DrawTarget::Polyline(const PointF* points, int count, const Stroke& stroke) {

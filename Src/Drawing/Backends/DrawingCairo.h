@@ -6,6 +6,7 @@
 
 #include "Drawing/DrawTarget.h"
 #include "Drawing/DrawingApi.h"
+#include "Drawing/Views/Views.h"
 #include "Platform/Export.h"
 
 using cairo_t = struct _cairo;
@@ -37,26 +38,22 @@ private:
 
 // The primitives (DrawTarget.h) on a Cairo context. Both arguments stay the caller's and must outlive it. The
 // context keeps its state; its transformation applies.
-class DSP_API DrawingCairo::DrawTarget {
+class DSP_API DrawingCairo::DrawTarget final : public Corvo::DrawTarget {
 public:
     DrawTarget(DrawingCairo& drawing, cairo_t* context, float dpi);
-    ~DrawTarget();
-    DrawTarget(const DrawTarget&) = delete;
-    DrawTarget& operator=(const DrawTarget&) = delete;
+    ~DrawTarget() override;
 
-    float Scale() const { return m_scale; }
-    void Clear(ColourReference colour);
-    void Line(PointF from, PointF to, const Stroke& stroke);
-    void Polyline(const PointF* points, int count, const Stroke& stroke);
-    void FillPolygon(const PointF* points, int count, Ink ink);
-    void FillRectangle(const RectF& rectangle, Ink ink);
-    void OutlineRectangle(const RectF& rectangle, const Stroke& stroke);
-    void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink);
-    TextMetrics MeasureText(std::string_view text, float size);
-    void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink);
-    void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity);
-    void PushClip(const RectF& rectangle);
-    void PopClip();
+    void Clear(ColourReference colour) override;
+    void Polyline(const PointF* points, int count, const Stroke& stroke) override;
+    void FillPolygon(const PointF* points, int count, Ink ink) override;
+    void FillRectangle(const RectF& rectangle, Ink ink) override;
+    void OutlineRectangle(const RectF& rectangle, const Stroke& stroke) override;
+    void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink) override;
+    TextMetrics MeasureText(std::string_view text, float size) override;
+    void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink) override;
+    void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity) override;
+    void PushClip(const RectF& rectangle) override;
+    void PopClip() override;
 
 private:
     void Use(Ink ink);
@@ -64,10 +61,7 @@ private:
 
     DrawingCairo& m_drawing;
     cairo_t* m_context;
-    float m_scale;
     int m_clips = 0;
 };
-
-static_assert(IsDrawTarget<DrawingCairo::DrawTarget>);
 
 }  // namespace Corvo

@@ -3,12 +3,12 @@
 #include <algorithm>
 #include <vector>
 
-#include "Drawing/Backends/PrimitiveArguments.h"
 #include "Drawing/Backends/ResourceKeys.h"
 #include "Drawing/Backends/SlotCache.h"
 #include "Drawing/Backends/TypefaceDirectWrite.h"
 #include "Drawing/Backends/UsablePoints.h"
 #include "Drawing/Backends/WideText.h"
+#include "Drawing/PrimitiveArguments.h"
 
 #include <d2d1.h>
 
@@ -207,7 +207,7 @@ void DrawingD2D::ReleasePen(DrawingPen*& pen) {
 }
 
 DrawingD2D::DrawTarget::DrawTarget(DrawingD2D& drawing, float dpi)
-    : m_drawing(drawing), m_target(drawing.m_resources->target.Get()), m_scale(ScaleOf(dpi)) {
+    : Corvo::DrawTarget(dpi), m_drawing(drawing), m_target(drawing.m_resources->target.Get()) {
     m_target->SaveDrawingState(m_drawing.m_resources->stateFound.Get());
     m_target->GetDpi(&m_xDpi, &m_yDpi);
     m_target->SetDpi(kDotsPerInch, kDotsPerInch);
@@ -233,11 +233,6 @@ ID2D1SolidColorBrush* DrawingD2D::DrawTarget::Use(Ink ink) {
 void DrawingD2D::DrawTarget::Clear(ColourReference colour) {
     const D2D1_COLOR_F opaque = ColourOf({colour});
     m_target->Clear(&opaque);
-}
-
-void DrawingD2D::DrawTarget::Line(PointF from, PointF to, const Stroke& stroke) {
-    const PointF points[] = {from, to};
-    Polyline(points, 2, stroke);
 }
 
 void DrawingD2D::DrawTarget::Polyline(const PointF* points, int count, const Stroke& stroke) {

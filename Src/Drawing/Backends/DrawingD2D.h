@@ -6,6 +6,7 @@
 
 #include "Drawing/DrawTarget.h"
 #include "Drawing/DrawingApi.h"
+#include "Drawing/Views/Views.h"
 #include "Platform/Export.h"
 
 struct ID2D1RenderTarget;
@@ -44,37 +45,30 @@ private:
 // The primitives (DrawTarget.h) on the back-end's render target, one DrawTarget at a time, between the host's
 // BeginDraw and EndDraw. Coordinates are the target's pixels whatever its own resolution is; its
 // transformation applies. The target keeps its state.
-class DSP_API DrawingD2D::DrawTarget {
+class DSP_API DrawingD2D::DrawTarget final : public Corvo::DrawTarget {
 public:
     DrawTarget(DrawingD2D& drawing, float dpi);
-    ~DrawTarget();
-    DrawTarget(const DrawTarget&) = delete;
-    DrawTarget& operator=(const DrawTarget&) = delete;
+    ~DrawTarget() override;
 
-    float Scale() const { return m_scale; }
-    void Clear(ColourReference colour);
-    void Line(PointF from, PointF to, const Stroke& stroke);
-    void Polyline(const PointF* points, int count, const Stroke& stroke);
-    void FillPolygon(const PointF* points, int count, Ink ink);
-    void FillRectangle(const RectF& rectangle, Ink ink);
-    void OutlineRectangle(const RectF& rectangle, const Stroke& stroke);
-    void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink);
-    TextMetrics MeasureText(std::string_view text, float size);
-    void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink);
-    void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity);
-    void PushClip(const RectF& rectangle);
-    void PopClip();
+    void Clear(ColourReference colour) override;
+    void Polyline(const PointF* points, int count, const Stroke& stroke) override;
+    void FillPolygon(const PointF* points, int count, Ink ink) override;
+    void FillRectangle(const RectF& rectangle, Ink ink) override;
+    void OutlineRectangle(const RectF& rectangle, const Stroke& stroke) override;
+    void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink) override;
+    TextMetrics MeasureText(std::string_view text, float size) override;
+    void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink) override;
+    void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity) override;
+    void PushClip(const RectF& rectangle) override;
+    void PopClip() override;
 
 private:
     ID2D1SolidColorBrush* Use(Ink ink);
 
     DrawingD2D& m_drawing;
     ID2D1RenderTarget* m_target;
-    float m_scale;
     float m_xDpi = 0.0f, m_yDpi = 0.0f;  // the target's own
     int m_clips = 0;
 };
-
-static_assert(IsDrawTarget<DrawingD2D::DrawTarget>);
 
 }  // namespace Corvo

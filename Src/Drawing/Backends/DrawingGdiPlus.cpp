@@ -3,12 +3,12 @@
 #include <algorithm>
 
 #include "Drawing/Backends/GdiPlusHeader.h"
-#include "Drawing/Backends/PrimitiveArguments.h"
 #include "Drawing/Backends/ResourceKeys.h"
 #include "Drawing/Backends/SlotCache.h"
 #include "Drawing/Backends/TypefaceGdiPlus.h"
 #include "Drawing/Backends/UsablePoints.h"
 #include "Drawing/Backends/WideText.h"
+#include "Drawing/PrimitiveArguments.h"
 
 namespace Corvo {
 namespace {
@@ -126,7 +126,7 @@ void DrawingGdiPlus::ReleasePen(DrawingPen*& pen) {
 }
 
 DrawingGdiPlus::DrawTarget::DrawTarget(DrawingGdiPlus& drawing, Gdiplus::Graphics* graphics, float dpi)
-    : m_drawing(drawing), m_graphics(graphics), m_scale(ScaleOf(dpi)) {
+    : Corvo::DrawTarget(dpi), m_drawing(drawing), m_graphics(graphics) {
     m_states.swap(m_drawing.m_resources->states);
     m_states.push_back(m_graphics->Save());
     m_graphics->SetPageUnit(Gdiplus::UnitPixel);

@@ -7,6 +7,7 @@
 
 #include "Drawing/DrawTarget.h"
 #include "Drawing/DrawingApi.h"
+#include "Drawing/Views/Views.h"
 #include "Platform/Export.h"
 
 namespace Gdiplus {
@@ -44,26 +45,23 @@ private:
 // The primitives (DrawTarget.h) on a GDI+ graphics object; a host with a device context makes one of it. Both
 // arguments stay the caller's and must outlive it. The graphics object keeps its state; its transformation
 // applies. Clips end at whole pixels.
-class DSP_API DrawingGdiPlus::DrawTarget {
+class DSP_API DrawingGdiPlus::DrawTarget final : public Corvo::DrawTarget {
 public:
     DrawTarget(DrawingGdiPlus& drawing, Gdiplus::Graphics* graphics, float dpi);
-    ~DrawTarget();
-    DrawTarget(const DrawTarget&) = delete;
-    DrawTarget& operator=(const DrawTarget&) = delete;
+    ~DrawTarget() override;
 
-    float Scale() const { return m_scale; }
-    void Clear(ColourReference colour);
-    void Line(PointF from, PointF to, const Stroke& stroke);
-    void Polyline(const PointF* points, int count, const Stroke& stroke);
-    void FillPolygon(const PointF* points, int count, Ink ink);
-    void FillRectangle(const RectF& rectangle, Ink ink);
-    void OutlineRectangle(const RectF& rectangle, const Stroke& stroke);
-    void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink);
-    TextMetrics MeasureText(std::string_view text, float size);
-    void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink);
-    void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity);
-    void PushClip(const RectF& rectangle);
-    void PopClip();
+    void Clear(ColourReference colour) override;
+    void Line(PointF from, PointF to, const Stroke& stroke) override;
+    void Polyline(const PointF* points, int count, const Stroke& stroke) override;
+    void FillPolygon(const PointF* points, int count, Ink ink) override;
+    void FillRectangle(const RectF& rectangle, Ink ink) override;
+    void OutlineRectangle(const RectF& rectangle, const Stroke& stroke) override;
+    void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink) override;
+    TextMetrics MeasureText(std::string_view text, float size) override;
+    void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink) override;
+    void Bitmap(const DrawingBitmap& bitmap, const RectF& destination, std::uint8_t opacity) override;
+    void PushClip(const RectF& rectangle) override;
+    void PopClip() override;
 
 private:
     const Gdiplus::SolidBrush* Use(Ink ink);
@@ -71,10 +69,7 @@ private:
 
     DrawingGdiPlus& m_drawing;
     Gdiplus::Graphics* m_graphics;
-    float m_scale;
     std::vector<unsigned> m_states;  // of the graphics object: as found, then before each clip
 };
-
-static_assert(IsDrawTarget<DrawingGdiPlus::DrawTarget>);
 
 }  // namespace Corvo

@@ -77,7 +77,7 @@ bool TypefaceGdiPlus::UseFile(const std::wstring& path) {
 }
 
 // By way of the list, for a system that names families there and does not find them by that name. An empty
-// name is anybody's.
+// name takes the first family that can be used.
 bool TypefaceGdiPlus::UseListed(const std::wstring& name) {
     const Gdiplus::InstalledFontCollection installed;
     const int count = installed.GetFamilyCount();

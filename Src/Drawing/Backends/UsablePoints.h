@@ -2,7 +2,7 @@
 
 #include <vector>
 
-#include "Drawing/Backends/PrimitiveArguments.h"
+#include "Drawing/PrimitiveArguments.h"
 
 namespace Corvo {
 

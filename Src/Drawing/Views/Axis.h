@@ -15,6 +15,7 @@ struct AxisTick {
     static constexpr int kUnlabelled = 3;
     double value = 0.0;
     int rank = kUnlabelled;
+    float at = 0.0f;              // the place of the value, x or y
     std::array<char, 16> text{};  // UTF-8, ended by a zero
 
     std::string_view Label() const { return text.data(); }
@@ -28,6 +29,11 @@ public:
     void Add(double value, int rank, std::string_view label);
     // Appends the unit to the label of the first or the last line that has one, and gives it rank 0.
     void AddUnit(std::string_view unit, bool toTheLast);
+    // Gives every line its place, at(value).
+    template <typename At>
+    void Place(At at) {
+        for (std::size_t i = 0; i < m_count; ++i) m_ticks[i].at = at(m_ticks[i].value);
+    }
 
 private:
     std::array<AxisTick, 192> m_ticks{};

@@ -4,6 +4,7 @@
 #include <cmath>
 
 #include "Drawing/DrawTarget.h"
+#include "Drawing/PrimitiveArguments.h"
 
 // Colours and sizes of everything drawn. Texts keep a contrast of 4.5:1 or more on the ground they stand on.
 namespace Corvo::Look {
@@ -61,11 +62,7 @@ inline RectF Snapped(const RectF& r) {
     return {x, y, std::round(Right(r)) - x, std::round(Bottom(r)) - y};
 }
 
-// Nothing to draw on: empty, not a number, or beyond any surface.
-inline bool IsDrawable(const RectF& r) {
-    constexpr float kFarthest = 32767.0f;
-    return r.width >= 1.0f && r.height >= 1.0f && r.width <= kFarthest && r.height <= kFarthest &&
-           std::abs(r.x) <= kFarthest && std::abs(r.y) <= kFarthest;
-}
+// False for what a view draws nothing on: less than a pixel, not a number, or beyond any surface.
+inline bool IsDrawable(const RectF& r) { return IsUsable(r) && r.width >= 1.0f && r.height >= 1.0f; }
 
 }  // namespace Corvo

@@ -1,17 +1,11 @@
 #pragma once
 
-#include <mutex>
-#include <vector>
-
-#include "Drawing/Views/AxisDrawing.h"
+#include "Drawing/DrawTarget.h"
 #include "Drawing/Views/ShortText.h"
-#include "Platform/CriticalSection.h"
-#include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/Scales/SpectrumScales.h"
-#include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 
-// The spectrum's curve with its scales.
+// The spectrum's curve with its scales: what the other views share with it.
 namespace Corvo {
 
 // Where the plot of a spectrum stands, and whether there are labels to its left and below it: where they are
@@ -21,162 +15,13 @@ struct SpectrumLayout {
     bool labels;
 };
 
-inline bool IsLargeEnough(const RectF& plot, float scale) {
-    return plot.width >= Look::kLeastPlot * scale && plot.height >= Look::kLeastPlot * scale;
-}
+SpectrumLayout LayOutSpectrum(DrawTarget& target, const RectF& rectangle, const SpectrumSettings& settings);
+bool IsLargeEnough(const RectF& plot, float scale);
+bool ShowsNotes(const SpectrumSettings& settings);
+// "1.000 kHz   B5 +21c   -20.0 dB": what the pointer is over or, without one, the highest peak.
+ShortText DescribeSpectrum(double hz, double level, LevelScale scale);
 
-inline bool ShowsNotes(const SpectrumSettings& settings) {
-    return settings.view_flag_d || FrequencyScaleOf(settings) == FrequencyScale::Notes;
-}
-
-template <typename Target>
-SpectrumLayout LayOutSpectrum(Target& target, const RectF& rectangle, const SpectrumSettings& settings) {
-    const LabelMargins margins = MarginsFor(target, ShowsNotes(settings));
-    const RectF inner = Snapped(Shrunk(rectangle, margins.left, margins.top, margins.right, margins.bottom));
-    if (settings.view_flag_b == 0 || !IsLargeEnough(inner, target.Scale()))
-        return {Snapped(rectangle), false};
-    return {inner, true};
-}
-
-template <typename Target>
-void DrawSpectrumScales(Target& target, const RectF& rectangle, const SpectrumLayout& layout,
-                        const CoordinatesAndFrequencies& map, const SpectrumSettings& settings) {
-    const RectF& plot = layout.plot;
-    const AxisTicks frequencies = FrequencyTicks(map, RoomAlong(target, plot.width), settings.view_flag_d);
-    const AxisTicks levels = LevelTicks(map, RoomForLevels(target, plot.height));
-    const auto xOf = [&](double hz) { return map.FrequencyToX(hz); };
-    const auto yOf = [&](double level) { return map.LevelToY(level); };
-    if (settings.view_option_c != 0) {
-        DrawGrid(target, plot, frequencies, true, xOf);
-        DrawGrid(target, plot, levels, false, yOf);
-    }
-    if (!layout.labels) return;
-    DrawLabelRow(target, frequencies, rectangle.x, Right(rectangle), RowBaseline(target, Bottom(plot)), xOf);
-    DrawLabelColumn(target, levels, rectangle.y, Bottom(rectangle), plot.x - Look::kGap * target.Scale(),
-                    TextAlign::Right, yOf);
-}
-
-inline bool ShowsBands(const CoordinatesAndFrequencies& map) {
-    return map.GetFrequencyScale() == FrequencyScale::Octaves ||
-           map.GetFrequencyScale() == FrequencyScale::ThirdOctaves;
-}
-
-// The area under the points, down to `ground`.
-inline void CloseToGround(const std::vector<PointF>& points, float ground, std::vector<PointF>& outline) {
-    outline.assign(points.begin(), points.end());
-    outline.push_back({points.back().x, ground});
-    outline.push_back({points.front().x, ground});
-}
-
-// Bars of equal width, each as high as the highest point over it; bands are bars already.
-template <typename Target>
-void DrawBars(Target& target, const RectF& plot, const std::vector<PointF>& points, bool bands, Ink ink) {
-    const float gap = std::max(std::round(target.Scale()), 1.0f);
-    const float pitch = bands ? 0.0f : 5.0f * gap;
-    for (std::size_t i = 0; i < points.size();) {
-        std::size_t end = i + 1;
-        float top = points[i].y, right = points[i].x;
-        const auto within = [&](const PointF& p) { return bands ? end % 2 == 1 : p.x < points[i].x + pitch; };
-        while (end < points.size() && within(points[end])) {
-            top = std::min(top, points[end].y);
-            right = points[end].x;
-            ++end;
-        }
-        const float left = std::floor(points[i].x);
-        const float width = bands ? std::floor(right) - left - gap : pitch - gap;
-        target.FillRectangle({left, top, std::max(width, 1.0f), Bottom(plot) - top}, ink);
-        i = end;
-    }
-}
-
-template <typename Target>
-void DrawCurve(Target& target, const RectF& plot, const CoordinatesAndFrequencies& map,
-               const std::vector<PointF>& points, CurveStyle style, std::vector<PointF>& outline) {
-    if (points.empty()) return;
-    const auto count = static_cast<int>(points.size());
-    if (style == CurveStyle::Bars) {
-        DrawBars(target, plot, points, ShowsBands(map), {Look::kCurve, 200});
-        return;
-    }
-    if (style == CurveStyle::Filled) {
-        CloseToGround(points, Bottom(plot), outline);
-        target.FillPolygon(outline.data(), static_cast<int>(outline.size()), {Look::kCurve, 70});
-    }
-    target.Polyline(points.data(), count, {{Look::kCurve}, Look::kCurveWidth * target.Scale()});
-}
-
-// What the pointer is over or, without one, the highest peak.
-inline ShortText DescribeSpectrum(double hz, double level, LevelScale scale) {
-    ShortText text;
-    text.AddFrequency(hz).Add("   ");
-    const std::size_t before = text.View().size();
-    text.AddNote(hz);
-    if (text.View().size() > before) text.Add("   ");
-    if (scale == LevelScale::Decibels) return text.AddNumber(level, 1).Add(" dB");
-    return text.AddNumber(level, 4);
-}
+void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle,
+                    const SpectrumSettings& view);
 
 }  // namespace Corvo
-
-template <class Drawing>
-void kivspectrum::DoDrawSpectrum(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    DrawSpectrumAs<Drawing>(target, rectangle, GetSettings());
-}
-
-template <class Drawing>
-void kivspectrum::DrawSpectrumAs(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle,
-                                 const spectrum_settings& view) {
-    using namespace Corvo;
-    if (!IsDrawable(rectangle)) return;
-    const std::lock_guard lock(m_instanceLock);
-    const SpectrumLayout layout = LayOutSpectrum(target, rectangle, view);
-    const RectF& plot = layout.plot;
-    const int prepared = m_drawer->GetSamplingFrequency();
-    const CoordinatesAndFrequencies map =
-        SpectrumMap(plot, view, prepared > 0 ? prepared : m_samplingRate.load());
-    target.PushClip(rectangle);
-    target.FillRectangle(rectangle, {Look::kGround});
-    target.FillRectangle(plot, {Look::kPlot});
-    DrawSpectrumScales(target, rectangle, layout, map, view);
-    target.PushClip(plot);
-    int count = 0;
-    const auto other = [&](const std::vector<float>& power, ColourReference colour) {
-        m_drawer->ComputeSpectrumPoints(plot, nullptr, count, map, display_spectrum, 0, 0.0f, &power);
-        const auto& points = m_drawer->GetXYPoints();
-        target.Polyline(points.data(), static_cast<int>(points.size()),
-                        {{colour}, Look::kHairline * target.Scale()});
-    };
-    if (view.peak_hold_mode != 0) other(m_drawer->GetPeaks(), Look::kPeaks);
-    if (m_tunerOn && Tuner::GetShowDenoisedSpectrum() && !m_tuner->GetDenoisedSpectrum().empty())
-        other(m_tuner->GetDenoisedSpectrum(), Look::kTrace);
-    m_drawer->ComputeSpectrumPoints(plot, nullptr, count, map, display_spectrum, 0, 0.0f);
-    DrawCurve(target, plot, map, m_drawer->GetXYPoints(), CurveStyleOf(view), m_outline);
-    target.PopClip();
-    if (m_showInfoBox && view.view_flag_c != 0) DrawSpectrumInfo<Drawing>(target, plot, map);
-    target.PopClip();
-}
-
-// The pointer's frequency and level, with a hair-cross; without a pointer over the plot the curve's highest
-// peak, in its colour, where that does not hide much of it. A band's level is not its highest bin's.
-template <class Drawing>
-void kivspectrum::DrawSpectrumInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& plot,
-                                   const CoordinatesAndFrequencies& map) {
-    using namespace Corvo;
-    const PointF pointer{m_pointerX, m_pointerY};
-    if (Contains(plot, pointer)) {
-        const Stroke hair{{Look::kPointer, 110}, std::max(std::round(target.Scale()), 1.0f)};
-        target.Line({pointer.x, plot.y}, {pointer.x, Bottom(plot)}, hair);
-        target.Line({plot.x, pointer.y}, {Right(plot), pointer.y}, hair);
-        const ShortText text =
-            DescribeSpectrum(map.XToFrequency(pointer.x), map.YToLevel(pointer.y), map.GetLevelScale());
-        return DrawPointerBox(target, plot, pointer, text.View());
-    }
-    const SpectrumPeak peak = m_drawer->HighestPeak(map.GetLowest());
-    if (ShowsBands(map) || !(peak.level > -VerticalRangeOf(m_drawer->GetSettings()))) return;
-    ShortText text;
-    text.Add("Peak   ").Add(DescribeSpectrum(peak.frequency, peak.level, LevelScale::Decibels).View());
-    constexpr float kMostOfWidth = 0.35f;
-    if (InfoBoxOf(target, text.View()).width > kMostOfWidth * plot.width) return;
-    const float gap = Look::kGap * target.Scale();
-    DrawInfoBox(target, Shrunk(plot, gap, gap, gap, gap), {Right(plot), plot.y}, text.View(), {Look::kCurve});
-}

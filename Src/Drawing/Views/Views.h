@@ -1,29 +1,52 @@
 #pragma once
 
-#include "Drawing/Views/WholeView.h"
+#include "Drawing/DrawTarget.h"
 #include "Platform/Export.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/kivspectrum.h"
 
-// Makes all drawing routines for one back-end; in one source file each.
+// What can be drawn of an analyser and of its sonogram, on any target. Every back-end's header includes this
+// file: it makes the drawing templates of both classes, which say what each of them draws.
+namespace Corvo {
+
+DSP_API void DrawWhole(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawSpectrum(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawSonogramAndSpectrum(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawSonogram(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawIntensityScale(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+
+DSP_API void DrawTuner(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawNote(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawNoteAndRipples(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawNeedleAndInfo(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawNeedle(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawNeedleInfo(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
+
+DSP_API void DrawPicture(const Sonogram& sonogram, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawIntensityScale(Sonogram& sonogram, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawFrequencyScale(const Sonogram& sonogram, DrawTarget& target, const RectF& rectangle,
+                                bool notes);
+DSP_API void DrawTimeline(const Sonogram& sonogram, DrawTarget& target, const RectF& rectangle);
+DSP_API void DrawPitchTrace(Sonogram& sonogram, DrawTarget& target, const RectF& rectangle);
+
+}  // namespace Corvo
+
 // clang-format off
-#define DSP_INSTANTIATE_VIEW(Class, Routine, Drawing) \
-    template DSP_API void Class::Routine<Drawing>(Drawing::DrawTarget&, const Corvo::RectF&);
+template <class D> void kivspectrum::DoDraw(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawWhole(*this, t, r); }
+template <class D> void kivspectrum::DoDrawSpectrum(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawSpectrum(*this, t, r); }
+template <class D> void kivspectrum::DoDrawSonogramAndSpectrum(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawSonogramAndSpectrum(*this, t, r); }
+template <class D> void kivspectrum::DrawSonogramComponents(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawSonogram(*this, t, r); }
+template <class D> void kivspectrum::DrawSonogramIntensityScale(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawIntensityScale(*this, t, r); }
+template <class D> void kivspectrum::DrawTuner(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawTuner(*this, t, r); }
+template <class D> void kivspectrum::DoDrawBigLetter(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawNote(*this, t, r); }
+template <class D> void kivspectrum::DrawTunerBigLetter(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawNoteAndRipples(*this, t, r); }
+template <class D> void kivspectrum::DrawTunerWithNeedle(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawNeedleAndInfo(*this, t, r); }
+template <class D> void kivspectrum::DrawNeedle(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawNeedle(*this, t, r); }
+template <class D> void kivspectrum::DrawNeedleInfo(typename D::DrawTarget& t, const Corvo::RectF& r) { Corvo::DrawNeedleInfo(*this, t, r); }
 
-#define DSP_INSTANTIATE_VIEWS(Drawing)                                           \
-    DSP_INSTANTIATE_VIEW(Corvo::Sonogram, Draw, Drawing)                         \
-    DSP_INSTANTIATE_VIEW(Corvo::Sonogram, DrawIntensityScale, Drawing)           \
-    DSP_INSTANTIATE_VIEW(Corvo::Sonogram, DrawTimeline, Drawing)                 \
-    DSP_INSTANTIATE_VIEW(Corvo::Sonogram, DrawPitchTrace, Drawing)               \
-    template DSP_API void Corvo::Sonogram::DrawFrequencyScale<Drawing>(          \
-        Drawing::DrawTarget&, const Corvo::RectF&, bool);                        \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DoDrawSpectrum, Drawing)                   \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawSonogramIntensityScale, Drawing)       \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawSonogramComponents, Drawing)           \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DoDrawSonogramAndSpectrum, Drawing)        \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DoDrawBigLetter, Drawing)                  \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawTunerBigLetter, Drawing)               \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawNeedle, Drawing)                       \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawNeedleInfo, Drawing)                   \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawTunerWithNeedle, Drawing)              \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DrawTuner, Drawing)                        \
-    DSP_INSTANTIATE_VIEW(kivspectrum, DoDraw, Drawing)
+template <class D> void Corvo::Sonogram::Draw(typename D::DrawTarget& t, const RectF& r) { DrawPicture(*this, t, r); }
+template <class D> void Corvo::Sonogram::DrawIntensityScale(typename D::DrawTarget& t, const RectF& r) { Corvo::DrawIntensityScale(*this, t, r); }
+template <class D> void Corvo::Sonogram::DrawFrequencyScale(typename D::DrawTarget& t, const RectF& r, bool noteNames) { Corvo::DrawFrequencyScale(*this, t, r, noteNames); }
+template <class D> void Corvo::Sonogram::DrawTimeline(typename D::DrawTarget& t, const RectF& r) { Corvo::DrawTimeline(*this, t, r); }
+template <class D> void Corvo::Sonogram::DrawPitchTrace(typename D::DrawTarget& t, const RectF& r) { Corvo::DrawPitchTrace(*this, t, r); }
 // clang-format on

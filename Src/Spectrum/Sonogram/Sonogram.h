@@ -101,7 +101,7 @@ public:
     void SetTimeAtRightEdge(double seconds);
     double GetTimeAtRightEdge() const;
 
-    // Drawing, once per back-end, into `rectangle`: the picture; its scale of colours with levels;
+    // Drawing, with any back-end, into `rectangle`: the picture; its scale of colours with levels;
     // frequencies or notes, up to the rectangle's right edge; seconds before now, for a picture as wide as
     // the rectangle; what the tuner heard, over a picture that fills it. One thread at a time.
     template <class Drawing>
@@ -114,6 +114,8 @@ public:
     void DrawTimeline(typename Drawing::DrawTarget& target, const RectF& rectangle);
     template <class Drawing>
     void DrawPitchTrace(typename Drawing::DrawTarget& target, const RectF& rectangle);
+    // What the drawing routines keep inside.
+    struct ViewAccess;
 
 private:
     static constexpr int kShades = 1024;

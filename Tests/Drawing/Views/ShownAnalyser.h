@@ -2,14 +2,11 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <cstddef>
-#include <vector>
 
 #include "Spectrum/Sonogram/Sonogram.h"
 #include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
-#include "Support/DrawingSurface.h"
 #include "Support/Signals.h"
 
 // Everything that all analysers share starts every test at its defaults.
@@ -50,13 +47,3 @@ public:
 
     kivspectrum analyser;
 };
-
-// How far a pixel is from a colour (0xRRGGBB), at most 255.
-inline int ColourDistance(std::uint32_t a, std::uint32_t b) {
-    int most = 0;
-    for (const int shift : {0, 8, 16}) {
-        const int difference = static_cast<int>(a >> shift & 0xFFu) - static_cast<int>(b >> shift & 0xFFu);
-        most = std::max(most, std::abs(difference));
-    }
-    return most;
-}

@@ -1,164 +1,135 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <limits>
+#include <string>
 
 #include "Drawing/Views/Look.h"
 #include "Drawing/Views/ShownAnalyser.h"
-#include "Spectrum/Scales/CoordinatesAndFrequencies.h"
-#include "Spectrum/Scales/SpectrumScales.h"
+#include "Support/AudioThreadRules.h"
+#include "Support/RecordingDrawing.h"
+
+// What holds for every view, whatever it shows.
 
 using namespace Corvo;
-using TestSupport::DrawingSurface;
+using TestSupport::NoDrawing;
+using Recording = TestSupport::RecordingDrawing;
 
 namespace {
 
-constexpr int kWidth = 640, kHeight = 360;
-constexpr RectF kWhole{0, 0, kWidth, kHeight};
+constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+constexpr float kInfinite = std::numeric_limits<float>::infinity();
 
-void OnlyTheCurve() {
-    auto& view = kivspectrum::settings;
-    view.view_flag_b = view.view_option_c = view.view_flag_c = view.peak_hold_mode = 0;
-    view.time_smoothing = 0;
+class Views : public ViewTest {
+protected:
+    Views() {
+        analyser.SetTunerOn(true);
+        analyser.ObserverUpdate();
+        analyser.ShowSonogram(true);
+    }
+
+    ShownAnalyser m_shown;
+    kivspectrum& analyser = m_shown.analyser;
+};
+
+// Boxes may touch.
+bool Overlap(const RectF& a, const RectF& b) {
+    const RectF shared{std::max(a.x, b.x), std::max(a.y, b.y), std::min(Right(a), Right(b)),
+                       std::min(Bottom(a), Bottom(b))};
+    return shared.width - shared.x > 0.51f && shared.height - shared.y > 0.51f;
 }
 
-}  // namespace
-
-template <typename Drawing>
-class Views : public ViewTest {};
-TYPED_TEST_SUITE(Views, TestSupport::DrawingBackends);
-
-// Catches scales that run the wrong way, are off by a margin, or are not what the drawer uses.
-TYPED_TEST(Views, SpectrumPeaksAtTheFrequencyAndLevelOfASine) {
-    for (const int scale : {0, 1, 4})
-        for (const auto& [hz, level] : {std::pair{1000.0, -20.0}, {6000.0, 0.0}, {187.5, -60.0}}) {
-            SCOPED_TRACE(testing::Message() << "scale " << scale << ", " << hz << " Hz, " << level << " dB");
-            OnlyTheCurve();
-            kivspectrum::settings.view_option_a = scale;
-            ShownAnalyser shown;
-            shown.Hear(hz, std::pow(10.0, level / 20.0));
-            DrawingSurface<TypeParam> surface(kWidth, kHeight);
-            surface.Paint(96.0f, [&](auto& target) {
-                shown.analyser.template DoDrawSpectrum<TypeParam>(target, kWhole);
-            });
-            const auto map = SpectrumMap(kWhole, kivspectrum::settings, ShownAnalyser::kRate);
-            int topX = -1, topY = kHeight;
-            for (int y = kHeight - 1; y >= 0; --y)
-                for (int x = 0; x < kWidth; ++x)
-                    if (ColourDistance(surface.Pixel(x, y), RgbFromColour(Look::kCurve)) < 64) {
-                        topX = x;
-                        topY = y;
-                    }
-            EXPECT_NEAR(topX, map.FrequencyToX(hz), 3.0);
-            EXPECT_NEAR(topY, map.LevelToY(level), 2.5);
-        }
+void ExpectApartAndInside(const std::vector<Recording::Text>& texts, const RectF& whole) {
+    for (std::size_t i = 0; i < texts.size(); ++i) {
+        const auto& [text, box, middle] = texts[i];
+        EXPECT_TRUE(box.x >= whole.x - 0.5f && Right(box) <= Right(whole) + 0.5f) << text;
+        EXPECT_TRUE(box.y >= whole.y - 0.5f && Bottom(box) <= Bottom(whole) + 0.5f) << text;
+        for (std::size_t j = 0; j < i; ++j)
+            EXPECT_FALSE(Overlap(box, texts[j].box)) << "\"" << text << "\" and \"" << texts[j].text << "\"";
+    }
 }
 
-// Catches rows upside down, columns at the wrong end, and colours of another level, order or scheme.
-TYPED_TEST(Views, SonogramLightsTheRowOfASineInTheColourOfItsLevel) {
-    for (const int scheme : {0, 2})
-        for (const double level : {0.0, -60.0}) {
-            SCOPED_TRACE(testing::Message() << "scheme " << scheme << ", " << level << " dB");
-            OnlyTheCurve();
-            Sonogram::SetColourScheme(scheme);
-            ShownAnalyser shown;
-            shown.analyser.ShowSonogram(true);
-            DrawingSurface<TypeParam> surface(kWidth, kHeight);
-            const auto draw = [&](auto& target) {
-                shown.analyser.template DrawSonogramComponents<TypeParam>(target, kWhole);
-            };
-            surface.Paint(96.0f, draw);
-            shown.Hear(3000.0, std::pow(10.0, level / 20.0));
-            surface.Paint(96.0f, draw);
-            const auto& map = shown.analyser.GetSonogram()->GetFrequencyMap();
-            const int row = kHeight - 1 - static_cast<int>(map.FrequencyToX(3000.0));
-            const auto expected =
-                shown.analyser.GetSonogram()->ColorFromAmplitude(static_cast<float>(level), false);
-            EXPECT_LE(ColourDistance(surface.Pixel(kWidth - 1, row), expected), 6);
-            EXPECT_EQ(surface.Pixel(kWidth - 1, row / 2), 0u) << "above";
-            EXPECT_EQ(surface.Pixel(0, row), RgbFromColour(Look::kPlot)) << "never heard";
-        }
+// Catches labels cut at an edge or over each other, at any size, resolution and scale.
+TEST_F(Views, TextsStayApartAndInside) {
+    Tuner::SetTemperament(10);
+    m_shown.Hear(466.16, 0.5, 0.6);
+    ASSERT_TRUE(analyser.GetTuner()->IsTuned());
+    std::size_t texts = 0;
+    for (const RectF& size : {RectF{0, 0, 1280, 720}, {0, 0, 420, 260}, {7, 11, 160, 120}})
+        for (const float dpi : {96.0f, 144.0f, 192.0f})
+            for (int scale = -1; scale <= 5; ++scale)
+                for (const bool notes : {false, true}) {
+                    SCOPED_TRACE(testing::Message() << size.width << "x" << size.height << " at " << dpi
+                                                    << " dpi, scale " << scale << (notes ? ", notes" : ""));
+                    kivspectrum::settings.view_option_a = scale;
+                    kivspectrum::settings.view_flag_d = notes;
+                    m_shown.Hear(466.16, 0.5, 0.04);
+                    Recording::DrawTarget both(dpi), tuner(dpi);
+                    analyser.DoDrawSonogramAndSpectrum<Recording>(both, size);
+                    analyser.DrawTuner<Recording>(tuner, size);
+                    ExpectApartAndInside(both.texts, size);
+                    ExpectApartAndInside(tuner.texts, size);
+                    texts += both.texts.size() + tuner.texts.size();
+                }
+    EXPECT_GT(texts, 1000u);
 }
 
 // Catches divisions by nothing, casts of what is not a number, and buffers sized by either.
-TYPED_TEST(Views, EveryRoutineTakesEveryRectangle) {
-    constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
-    constexpr float kInfinite = std::numeric_limits<float>::infinity();
-    const RectF rectangles[] = {{0, 0, 0, 0},         {3, 3, 1, 1},          {0, 0, 1, 200},
-                                {0, 0, 200, 1},       {0, 0, -5, 20},        {kNan, 0, 10, 10},
-                                {0, 0, kNan, 10},     {0, 0, kInfinite, 10}, {-1e30f, 0, 10, 10},
-                                {0, 0, 1e30f, 1e30f}, {0, 0, 17, 9},         {-50, -50, 90, 90},
-                                {600, 300, 400, 400}, {0, 0, 60, 300},       {0, 0, 300, 60}};
-    ShownAnalyser shown;
-    kivspectrum& analyser = shown.analyser;
-    analyser.SetTunerOn(true);
-    analyser.ShowSonogram(true);
+TEST_F(Views, EveryRoutineTakesEveryRectangle) {
+    const RectF rectangles[] = {{0, 0, 0, 0},     {3, 3, 1, 1},          {0, 0, 1, 200},
+                                {0, 0, 200, 1},   {0, 0, -5, 20},        {kNan, 0, 10, 10},
+                                {0, 0, kNan, 10}, {0, 0, kInfinite, 10}, {-1e30f, 0, 1e30f, 1e30f},
+                                {0, 0, 17, 9},    {-50, -50, 90, 90},    {0, 0, 300, 60}};
     analyser.SetPointer(20, 20);
-    shown.Hear(440.0, 0.5);
-    DrawingSurface<TypeParam> surface(64, 48);
+    m_shown.Hear(440.0, 0.5);
+    Sonogram& sonogram = *analyser.GetSonogram();
     for (const RectF& r : rectangles)
-        for (const float dpi : {96.0f, 192.0f, 384.0f, 0.0f, kNan, 1e9f})
-            surface.Paint(dpi, [&](auto& target) {
-                analyser.template DoDraw<TypeParam>(target, r);
-                analyser.template DoDrawSonogramAndSpectrum<TypeParam>(target, r);
-                analyser.template DrawSonogramIntensityScale<TypeParam>(target, r);
-                analyser.template DrawTuner<TypeParam>(target, r);
-                analyser.template DoDrawBigLetter<TypeParam>(target, r);
-                analyser.template DrawTunerBigLetter<TypeParam>(target, r);
-                analyser.template DrawTunerWithNeedle<TypeParam>(target, r);
-                analyser.template DrawNeedle<TypeParam>(target, r);
-                analyser.template DrawNeedleInfo<TypeParam>(target, r);
-                auto& sonogram = *analyser.GetSonogram();
-                sonogram.template Draw<TypeParam>(target, r);
-                sonogram.template DrawFrequencyScale<TypeParam>(target, r, true);
-                sonogram.template DrawTimeline<TypeParam>(target, r);
-                sonogram.template DrawPitchTrace<TypeParam>(target, r);
-            });
-    // What lies outside the rectangle stays as it was.
-    DrawingSurface<TypeParam> other(64, 48);
-    other.Paint(96.0f, [&](auto& target) {
-        analyser.template DoDrawSpectrum<TypeParam>(target, {10, 10, 30, 20});
-    });
-    EXPECT_EQ(other.Pixel(9, 15), 0u);
-    EXPECT_EQ(other.Pixel(40, 15), 0u);
-    EXPECT_EQ(other.Pixel(15, 30), 0u);
-    EXPECT_NE(other.Pixel(15, 28), 0u);
+        for (const float dpi : {96.0f, 192.0f, 384.0f, 0.0f, kNan, 1e9f}) {
+            Recording::DrawTarget target(dpi);
+            analyser.DoDraw<Recording>(target, r);
+            analyser.DoDrawSonogramAndSpectrum<Recording>(target, r);
+            analyser.DrawSonogramIntensityScale<Recording>(target, r);
+            analyser.DrawTuner<Recording>(target, r);
+            analyser.DoDrawBigLetter<Recording>(target, r);
+            analyser.DrawTunerBigLetter<Recording>(target, r);
+            analyser.DrawTunerWithNeedle<Recording>(target, r);
+            analyser.DrawNeedle<Recording>(target, r);
+            analyser.DrawNeedleInfo<Recording>(target, r);
+            sonogram.Draw<Recording>(target, r);
+            sonogram.DrawFrequencyScale<Recording>(target, r, true);
+            sonogram.DrawTimeline<Recording>(target, r);
+            sonogram.DrawPitchTrace<Recording>(target, r);
+            for (const auto& [b, colour] : target.rectangles)
+                ASSERT_TRUE(std::isfinite(b.x + b.y + b.width + b.height));
+        }
 }
 
-// Catches bars lit on the wrong side, the circle that stays dark in tune, and a panel without a note that
-// still shows one.
-TYPED_TEST(Views, TunerLightsTheSideOfTheError) {
-    struct Case {
-        const char* what;
-        double hz;
-        bool left, right, centre;
+// Catches vectors and strings made anew for every picture, whatever the style of the curve.
+TEST_F(Views, NothingIsAllocatedPerFrame) {
+    if (!TestSupport::AudioThreadRules::CanCount()) GTEST_SKIP() << "a sanitizer counts instead";
+    const auto sine = TestSupport::Sine<float>(30 * 1600, 445.0, ShownAnalyser::kRate);
+    NoDrawing::DrawTarget target;
+    const auto play = [&] {
+        for (int refresh = 0; refresh < 30; ++refresh) {
+            analyser.Feed(sine.data() + refresh * 1600, 1600, 1, 1);
+            analyser.Refresh();
+            for (const std::int32_t style : {1, 2, 3}) {
+                kivspectrum::settings.view_option_e = style;
+                analyser.DoDraw<NoDrawing>(target, {0, 0, 1280, 720});
+            }
+            analyser.DrawTuner<NoDrawing>(target, {0, 0, 600, 300});
+            analyser.DrawTuner<NoDrawing>(target, {0, 0, 100, 30});
+        }
     };
-    for (const Case& c :
-         {Case{"flat", 440.0 * std::exp2(-20.0 / 1200.0), true, false, false},
-          Case{"sharp", 440.0 * std::exp2(20.0 / 1200.0), false, true, false},
-          Case{"in tune", 440.0, false, false, true}, Case{"silence", 0.0, false, false, false}}) {
-        SCOPED_TRACE(c.what);
-        ShownAnalyser shown;
-        shown.analyser.SetTunerOn(true);
-        shown.analyser.ObserverUpdate();
-        shown.Hear(c.hz, 0.5, 1.0);
-        DrawingSurface<TypeParam> surface(kWidth, kHeight);
-        surface.Paint(96.0f, [&](auto& target) {
-            shown.analyser.template DrawTunerBigLetter<TypeParam>(target, kWhole);
-        });
-        const auto brightness = [&](int x, int y) {
-            const std::uint32_t pixel = surface.Pixel(x, y);
-            return std::max({pixel >> 16, pixel >> 8 & 0xFFu, pixel & 0xFFu});
-        };
-        const auto brightest = [&](int from, int to) {
-            std::uint32_t most = 0;
-            for (int x = from; x < to; ++x) most = std::max(most, brightness(x, kHeight / 2));
-            return most > 160;
-        };
-        constexpr int kRipples = kHeight * 45 / 100;  // from the centre to before the innermost
-        EXPECT_EQ(brightest(0, kWidth / 2 - kRipples), c.left);
-        EXPECT_EQ(brightest(kWidth / 2 + kRipples, kWidth), c.right);
-        EXPECT_EQ(brightness(kWidth / 2, kHeight / 2 - kHeight / 5) > 160, c.centre);
-    }
+    play();
+    ASSERT_TRUE(analyser.GetTuner()->IsTuned());
+    const TestSupport::AudioThreadRules rules;
+    play();
+    const std::string broken = rules.Broken();
+    EXPECT_EQ(broken.find("alloc"), std::string::npos) << broken;
+    EXPECT_EQ(broken.find("free"), std::string::npos) << broken;
 }
+
+}  // namespace

@@ -189,6 +189,10 @@ public:
     void Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags);
     void ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                ProcessFlags& flags);
+    // The same for a block of floats; the format says 32 bits.
+    void Process(float* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
+        Process(reinterpret_cast<double*>(buffer), frames, format, flags);
+    }
 
     // Ringing out, on the audio thread and between blocks. When the stream has ended, the host calls
     // StartTail and goes on with blocks of silence: of each, the first TailFramesProduced() frames are

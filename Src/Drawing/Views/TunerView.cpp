@@ -1,19 +1,19 @@
-#pragma once
-
 #include <algorithm>
+#include <array>
 #include <cmath>
-#include <mutex>
 #include <numbers>
 #include <string>
+#include <string_view>
 
-#include "Drawing/Views/AxisDrawing.h"
+#include "Drawing/Views/Look.h"
 #include "Drawing/Views/ShortText.h"
+#include "Drawing/Views/Views.h"
 #include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/Tuner/TunerPanelBitmaps.h"
-#include "Spectrum/kivspectrum.h"
 
 // The tuner's panel.
 namespace Corvo {
+namespace {
 
 constexpr float kDialCents = 50.0f;
 constexpr float kDialHalfAngle = std::numbers::pi_v<float> * 50.0f / 180.0f;
@@ -21,13 +21,12 @@ constexpr float kLeastInfoLine = 15.0f;  // in 1/96 inch; its text is 0.62 of th
 constexpr const char* kNoNote = "\u2013";
 
 // On the circle around `centre`, `angle` to the right of upright.
-inline PointF OnCircle(PointF centre, float radius, float angle) {
+PointF OnCircle(PointF centre, float radius, float angle) {
     return {centre.x + radius * std::sin(angle), centre.y - radius * std::cos(angle)};
 }
 
 // A band of the dial between two angles.
-template <typename Target>
-void FillArc(Target& target, PointF centre, float inner, float outer, float from, float to, Ink ink) {
+void FillArc(DrawTarget& target, PointF centre, float inner, float outer, float from, float to, Ink ink) {
     constexpr int kSteps = 48;
     std::array<PointF, 2 * (kSteps + 1)> outline;
     for (int i = 0; i <= kSteps; ++i) {
@@ -39,14 +38,13 @@ void FillArc(Target& target, PointF centre, float inner, float outer, float from
 }
 
 // Below full size when the text would be wider than the room for it.
-template <typename Target>
-float FittingSize(Target& target, std::string_view text, float size, float width) {
+float FittingSize(DrawTarget& target, std::string_view text, float size, float width) {
     const float wide = target.MeasureText(text, size).width;
     return wide > width && wide > 0.0f ? size * width / wide : size;
 }
 
 // How many of the four ripples an error lights.
-inline int LitBars(float cents) {
+int LitBars(float cents) {
     constexpr float kFrom[] = {0.0f, 8.0f, 18.0f, 32.0f};
     int lit = 0;
     for (const float from : kFrom) lit += std::abs(cents) >= from ? 1 : 0;
@@ -62,7 +60,7 @@ struct DialLayout {
 constexpr float kHub = 0.05f;       // of the radius
 constexpr float kLabelRoom = 2.4f;  // around the arc, of the labels' size
 
-inline DialLayout LayOutDial(const RectF& r, float scale) {
+DialLayout LayOutDial(const RectF& r, float scale) {
     const float size = std::clamp(r.height * 0.08f, Look::kSmallest * scale, 15.0f * scale);
     const float room = kLabelRoom * size;
     const float byWidth = (r.width / 2.0f - room) / std::sin(kDialHalfAngle);
@@ -71,12 +69,11 @@ inline DialLayout LayOutDial(const RectF& r, float scale) {
     return {{Centre(r).x, Bottom(r) - kHub * radius}, radius, size};
 }
 
-inline float DialAngle(float cents) {
+float DialAngle(float cents) {
     return std::clamp(cents, -kDialCents, kDialCents) / kDialCents * kDialHalfAngle;
 }
 
-template <typename Target>
-void DrawDialScale(Target& target, const DialLayout& dial) {
+void DrawDialScale(DrawTarget& target, const DialLayout& dial) {
     const float scale = target.Scale(), size = dial.labelSize;
     const float inner = dial.radius * 0.90f;
     FillArc(target, dial.pivot, dial.radius - 1.5f * scale, dial.radius, -kDialHalfAngle, kDialHalfAngle,
@@ -103,22 +100,56 @@ void DrawDialScale(Target& target, const DialLayout& dial) {
     }
 }
 
-}  // namespace Corvo
+// A small panel: bars, the note, bars.
+void DrawTunerLine(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
+    const Tuner& tuner = *analyser.GetTuner();
+    const bool tuned = tuner.IsTuned(), centred = tuned && tuner.IsTunedCentered();
+    const ShortText name = tuned ? ShortText().Add(tuner.GetTunedNoteName()).AddNumber(tuner.GetOctave(), 0)
+                                 : ShortText().Add(kNoNote);
+    const float height = std::floor(std::min(rectangle.height * 0.6f, rectangle.width / 8.0f));
+    if (height < 4.0f) return;
+    kivspectrum::SetupMinimizedTunerBitmaps(static_cast<int>(height));
+    const PointF centre = Centre(rectangle);
+    const float letter = FittingSize(target, name.View(), height * 1.1f, 2.4f * height);
+    target.Text(name.View(), {centre.x, centre.y + kCapHeight * letter / 2.0f}, TextAlign::Centre, letter,
+                {centred ? Look::kInTune
+                 : tuned ? Look::kText
+                         : Look::kLabel});
+    // Whole pixels, as the images are.
+    const float pitch = std::round(height * 0.55f), width = std::floor(height / 4.0f);
+    const float first = std::round(1.5f * height), middle = std::round(centre.x);
+    const float cents = tuner.GetErrorCents();
+    for (int bar = 0; bar < kTunerBars; ++bar)
+        for (const bool left : {true, false}) {
+            const bool lit = tuned && !centred && (cents < 0.0f) == left && bar < LitBars(cents);
+            const kivspectrum::BarItems& items =
+                lit    ? left ? kivspectrum::leftItemsMinimized : kivspectrum::rightItemsMinimized
+                : left ? kivspectrum::baseItemsMinimized_L
+                       : kivspectrum::baseItemsMinimized_R;
+            const float away = first + pitch * static_cast<float>(bar);
+            target.Bitmap(
+                *items[static_cast<std::size_t>(bar)],
+                {middle + (left ? -away - width : away), std::round(centre.y - height / 2.0f), width, height},
+                255);
+        }
+}
 
-template <class Drawing>
-void kivspectrum::DoDrawBigLetter(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
+}  // namespace
+
+void DrawNote(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
+    const Tuner& tuner = *analyser.GetTuner();
     const float radius = std::min(rectangle.width, rectangle.height) / 2.0f;
     const PointF centre = Centre(rectangle);
-    const bool tuned = m_tuner->IsTuned(), centred = tuned && m_tuner->IsTunedCentered();
-    SetupTunerBitmaps(static_cast<int>(std::ceil(radius)));
+    const bool tuned = tuner.IsTuned(), centred = tuned && tuner.IsTunedCentered();
+    kivspectrum::SetupTunerBitmaps(static_cast<int>(std::ceil(radius)));
     const RectF circle = Snapped({centre.x - radius, centre.y - radius, 2.0f * radius, 2.0f * radius});
-    target.Bitmap(centred ? mainWitheCirleBitmap : mainWitheCirleBitmapBase, circle, 255);
+    target.Bitmap(centred ? kivspectrum::mainWitheCirleBitmap : kivspectrum::mainWitheCirleBitmapBase, circle,
+                  255);
 
     const Ink ink{centred ? Look::kGround : tuned ? Look::kText : Look::kLabel};
-    const std::string_view name = tuned ? m_tuner->GetTunedNoteName() : kNoNote;
-    const ShortText octave = tuned ? ShortText().AddNumber(m_tuner->GetOctave(), 0) : ShortText();
+    const std::string_view name = tuned ? tuner.GetTunedNoteName() : kNoNote;
+    const ShortText octave = tuned ? ShortText().AddNumber(tuner.GetOctave(), 0) : ShortText();
     constexpr float kOctave = 0.36f;  // of the letter's size
     const auto width = [&](float size) {
         return target.MeasureText(name, size).width + target.MeasureText(octave.View(), kOctave * size).width;
@@ -131,10 +162,9 @@ void kivspectrum::DoDrawBigLetter(typename Drawing::DrawTarget& target, const Co
     target.Text(octave.View(), {octaveX, start.y + 0.08f * size}, TextAlign::Left, kOctave * size, ink);
 }
 
-template <class Drawing>
-void kivspectrum::DrawTunerBigLetter(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
+void DrawNoteAndRipples(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
+    const Tuner& tuner = *analyser.GetTuner();
     const TunerBarShape outermost = TunerBarOf(kTunerBars - 1, false);
     const float halfWidth = outermost.left + outermost.width, halfHeight = -outermost.top;
     const float radius = std::floor(
@@ -142,13 +172,15 @@ void kivspectrum::DrawTunerBigLetter(typename Drawing::DrawTarget& target, const
     if (radius < 1.0f) return;
     // Between pixels, so that images made for this radius are copied as they are.
     const PointF centre{std::round(Centre(rectangle).x), std::round(Centre(rectangle).y)};
-    DoDrawBigLetter<Drawing>(target, {centre.x - radius, centre.y - radius, 2.0f * radius, 2.0f * radius});
-    const bool tuned = m_tuner->IsTuned() && !m_tuner->IsTunedCentered();
-    const float cents = m_tuner->GetErrorCents();
+    DrawNote(analyser, target, {centre.x - radius, centre.y - radius, 2.0f * radius, 2.0f * radius});
+    const bool tuned = tuner.IsTuned() && !tuner.IsTunedCentered();
+    const float cents = tuner.GetErrorCents();
     for (int bar = 0; bar < kTunerBars; ++bar)
         for (const bool left : {true, false}) {
             const bool lit = tuned && (cents < 0.0f) == left && bar < LitBars(cents);
-            const BarItems& items = lit ? left ? leftItems : rightItems : left ? baseItems_L : baseItems_R;
+            const kivspectrum::BarItems& items = lit ? left ? kivspectrum::leftItems : kivspectrum::rightItems
+                                                 : left ? kivspectrum::baseItems_L
+                                                        : kivspectrum::baseItems_R;
             const TunerBarPixels pixels = TunerBarPixelsOf(bar, left, static_cast<int>(radius));
             target.Bitmap(
                 *items[static_cast<std::size_t>(bar)],
@@ -158,18 +190,17 @@ void kivspectrum::DrawTunerBigLetter(typename Drawing::DrawTarget& target, const
         }
 }
 
-template <class Drawing>
-void kivspectrum::DrawNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
+void DrawNeedle(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
+    const Tuner& tuner = *analyser.GetTuner();
     const DialLayout dial = LayOutDial(rectangle, target.Scale());
     if (dial.radius < 8.0f) return;
     DrawDialScale(target, dial);
-    const bool tuned = m_tuner->IsTuned();
-    const float angle = DialAngle(tuned ? m_tuner->GetErrorCents() : -kDialCents);
-    const ColourReference colour = !tuned                       ? Look::kGrid
-                                   : m_tuner->IsTunedCentered() ? Look::kInTune
-                                                                : Look::kNeedle;
+    const bool tuned = tuner.IsTuned();
+    const float angle = DialAngle(tuned ? tuner.GetErrorCents() : -kDialCents);
+    const ColourReference colour = !tuned                    ? Look::kGrid
+                                   : tuner.IsTunedCentered() ? Look::kInTune
+                                                             : Look::kNeedle;
     const float half = std::max(dial.radius * 0.018f, 1.0f);
     const PointF needle[] = {OnCircle(dial.pivot, dial.radius * 0.97f, angle),
                              OnCircle(dial.pivot, half, angle + std::numbers::pi_v<float> / 2.0f),
@@ -180,32 +211,31 @@ void kivspectrum::DrawNeedle(typename Drawing::DrawTarget& target, const Corvo::
                                 {colour});
 }
 
-template <class Drawing>
-void kivspectrum::DrawNeedleInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
+void DrawNeedleInfo(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
+    const Tuner& tuner = *analyser.GetTuner();
     // The error comes first; the other lines only where they stay large enough to read.
     const int lines = std::clamp(static_cast<int>(rectangle.height / (kLeastInfoLine * target.Scale())), 1,
                                  TunerGetNumLines());
     const float middle = Centre(rectangle).x;
     const float pitch = rectangle.height / (static_cast<float>(lines) + 0.4f);
     const auto baseline = [&](int line) { return rectangle.y + pitch * (static_cast<float>(line) + 0.85f); };
-    const bool tuned = m_tuner->IsTuned();
+    const bool tuned = tuner.IsTuned();
     const float room = 0.94f * rectangle.width;
 
-    const std::string error = tuned ? m_tuner->GetTuningErrorStr() : kNoNote;
+    const std::string error = tuned ? tuner.GetTuningErrorStr() : kNoNote;
     const float arrow = 0.5f * pitch;
     const float size = FittingSize(target, error, 0.82f * pitch, std::max(room - 4.0f * arrow, 0.4f * room));
-    const bool centred = tuned && m_tuner->IsTunedCentered();
+    const bool centred = tuned && tuner.IsTunedCentered();
     target.Text(error, {middle, baseline(0)}, TextAlign::Centre, size,
                 {!tuned    ? Look::kLabel
                  : centred ? Look::kInTune
                            : Look::kText});
     const float away = target.MeasureText(error, size).width / 2.0f + arrow;
     if (tuned && !centred && away + arrow / 2.0f <= rectangle.width / 2.0f) {
-        SetupErrorBitmaps(static_cast<int>(std::ceil(arrow)));
-        const bool flat = m_tuner->GetErrorCents() < 0.0f;
-        target.Bitmap(flat ? tunerErrorFlatBitmap : tunerErrorSharpBitmap,
+        kivspectrum::SetupErrorBitmaps(static_cast<int>(std::ceil(arrow)));
+        const bool flat = tuner.GetErrorCents() < 0.0f;
+        target.Bitmap(flat ? kivspectrum::tunerErrorFlatBitmap : kivspectrum::tunerErrorSharpBitmap,
                       {middle + (flat ? -away : away) - arrow / 2.0f,
                        baseline(0) - kCapHeight * size / 2.0f - arrow / 2.0f, arrow, arrow},
                       255);
@@ -215,7 +245,7 @@ void kivspectrum::DrawNeedleInfo(typename Drawing::DrawTarget& target, const Cor
             target.Text(text.View(), {middle, baseline(index)}, TextAlign::Centre,
                         FittingSize(target, text.View(), 0.62f * pitch, room), {Look::kLabel});
     };
-    if (tuned) line(1, ShortText().AddFrequency(m_tuner->GetFrequency()));
+    if (tuned) line(1, ShortText().AddFrequency(tuner.GetFrequency()));
     if (TunerCalibrationNotStandardOrNotUseEqualTemperament())
         line(2, ShortText()
                     .Add(Tuner::GetCurrentTemperamentName())
@@ -224,9 +254,7 @@ void kivspectrum::DrawNeedleInfo(typename Drawing::DrawTarget& target, const Cor
                     .Add(" Hz"));
 }
 
-template <class Drawing>
-void kivspectrum::DrawTunerWithNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
+void DrawNeedleAndInfo(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
     const float scale = target.Scale(), lines = static_cast<float>(TunerGetNumLines()) + 0.4f;
     const float pitch = std::clamp(rectangle.height * 0.11f, (kLeastInfoLine + 0.5f) * scale, 40.0f * scale);
@@ -236,48 +264,11 @@ void kivspectrum::DrawTunerWithNeedle(typename Drawing::DrawTarget& target, cons
     const float needed = (1.0f + kHub) * dial.radius + kLabelRoom * dial.labelSize;
     const float height = std::min(needed, above.height);
     const float top = rectangle.y + (above.height - height) / 2.0f;
-    DrawNeedle<Drawing>(target, {rectangle.x, top, rectangle.width, height});
-    DrawNeedleInfo<Drawing>(target, {rectangle.x, top + height, rectangle.width, info});
+    DrawNeedle(analyser, target, {rectangle.x, top, rectangle.width, height});
+    DrawNeedleInfo(analyser, target, {rectangle.x, top + height, rectangle.width, info});
 }
 
-// A small panel: bars, the note, bars.
-template <class Drawing>
-void kivspectrum::DrawTunerLine(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
-    const bool tuned = m_tuner->IsTuned(), centred = tuned && m_tuner->IsTunedCentered();
-    const ShortText name =
-        tuned ? ShortText().Add(m_tuner->GetTunedNoteName()).AddNumber(m_tuner->GetOctave(), 0)
-              : ShortText().Add(kNoNote);
-    const float height = std::floor(std::min(rectangle.height * 0.6f, rectangle.width / 8.0f));
-    if (height < 4.0f) return;
-    SetupMinimizedTunerBitmaps(static_cast<int>(height));
-    const PointF centre = Centre(rectangle);
-    const float letter = FittingSize(target, name.View(), height * 1.1f, 2.4f * height);
-    target.Text(name.View(), {centre.x, centre.y + kCapHeight * letter / 2.0f}, TextAlign::Centre, letter,
-                {centred ? Look::kInTune
-                 : tuned ? Look::kText
-                         : Look::kLabel});
-    // Whole pixels, as the images are.
-    const float pitch = std::round(height * 0.55f), width = std::floor(height / 4.0f);
-    const float first = std::round(1.5f * height), middle = std::round(centre.x);
-    const float cents = m_tuner->GetErrorCents();
-    for (int bar = 0; bar < kTunerBars; ++bar)
-        for (const bool left : {true, false}) {
-            const bool lit = tuned && !centred && (cents < 0.0f) == left && bar < LitBars(cents);
-            const BarItems& items = lit    ? left ? leftItemsMinimized : rightItemsMinimized
-                                    : left ? baseItemsMinimized_L
-                                           : baseItemsMinimized_R;
-            const float away = first + pitch * static_cast<float>(bar);
-            target.Bitmap(
-                *items[static_cast<std::size_t>(bar)],
-                {middle + (left ? -away - width : away), std::round(centre.y - height / 2.0f), width, height},
-                255);
-        }
-}
-
-template <class Drawing>
-void kivspectrum::DrawTuner(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle) {
-    using namespace Corvo;
+void DrawTuner(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
     const float scale = target.Scale();
     constexpr float kSmallWidth = 180.0f, kSmallHeight = 110.0f, kSideBySide = 1.7f, kWidestHalf = 2.0f;
@@ -286,17 +277,19 @@ void kivspectrum::DrawTuner(typename Drawing::DrawTarget& target, const Corvo::R
     const float gap = 2.0f * Look::kGap * scale;
     const RectF inner = Shrunk(rectangle, gap, gap, gap, gap);
     if (rectangle.width < kSmallWidth * scale || rectangle.height < kSmallHeight * scale) {
-        DrawTunerLine<Drawing>(target, rectangle);
+        DrawTunerLine(analyser, target, rectangle);
     } else if (rectangle.width > kSideBySide * rectangle.height) {
         // In a long strip they stay together in the middle.
         const float half = std::min((inner.width - gap) / 2.0f, kWidestHalf * inner.height);
         const float middle = Centre(inner).x;
-        DrawTunerBigLetter<Drawing>(target, {middle - gap / 2.0f - half, inner.y, half, inner.height});
-        DrawTunerWithNeedle<Drawing>(target, {middle + gap / 2.0f, inner.y, half, inner.height});
+        DrawNoteAndRipples(analyser, target, {middle - gap / 2.0f - half, inner.y, half, inner.height});
+        DrawNeedleAndInfo(analyser, target, {middle + gap / 2.0f, inner.y, half, inner.height});
     } else {
         const float upper = 0.5f * inner.height;
-        DrawTunerBigLetter<Drawing>(target, {inner.x, inner.y, inner.width, upper});
-        DrawTunerWithNeedle<Drawing>(target, {inner.x, inner.y + upper, inner.width, inner.height - upper});
+        DrawNoteAndRipples(analyser, target, {inner.x, inner.y, inner.width, upper});
+        DrawNeedleAndInfo(analyser, target, {inner.x, inner.y + upper, inner.width, inner.height - upper});
     }
     target.PopClip();
 }
+
+}  // namespace Corvo

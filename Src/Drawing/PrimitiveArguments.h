@@ -7,7 +7,8 @@
 
 namespace Corvo {
 
-// What every back-end asks of the arguments of a primitive. Not a number is nothing that can be drawn.
+// What every back-end asks of the arguments of a primitive, and a view of its rectangle. What is not a number
+// cannot be drawn.
 
 constexpr float kDotsPerInch = 96.0f;
 // Far beyond any surface, and within what the fixed-point numbers of drawing systems hold.
@@ -22,14 +23,12 @@ inline bool IsUsable(const RectF& r) {
 // Of a line's width and a text's size.
 inline bool IsUsableSize(float size) { return size > 0.0f && IsUsable(size); }
 
-// Its fields are anybody's to change.
+// The caller may have changed its fields.
 inline bool IsUsable(const DrawingBitmap& bitmap) {
     return bitmap.width > 0 && bitmap.height > 0 &&
            bitmap.pixels.size() / static_cast<std::size_t>(bitmap.width) >=
                static_cast<std::size_t>(bitmap.height);
 }
-
-inline float ScaleOf(float dpi) { return IsUsableSize(dpi) ? dpi / kDotsPerInch : 1.0f; }
 
 // The share of a text's width that lies left of its point.
 inline float ShareBefore(TextAlign align) {

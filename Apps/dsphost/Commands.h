@@ -1,9 +1,0 @@
-#pragma once
-
-#include <CLI/CLI.hpp>
-
-namespace dsphost {
-
-void AddEffectsCommand(CLI::App& app);
-
-}  // namespace dsphost
