@@ -292,13 +292,13 @@ std::uint32_t WordAt(const Bytes& chunk, std::size_t at) {
     return word;
 }
 
-// Word w is w - 3; the bytes above the lower four do not count.
+// Word w is w + 5; the bytes above the lower four do not count.
 Bytes CountingChunk(std::size_t leading, std::size_t words, std::size_t width) {
     Bytes chunk(leading + words * width, 0xEE);
     for (std::size_t at = 0; at < leading; ++at) chunk[at] = static_cast<std::uint8_t>(9 + at);
     for (std::size_t i = 0; i < 4 * words; ++i)
         chunk[leading + i / 4 * width + i % 4] =
-            static_cast<std::uint8_t>((static_cast<std::uint32_t>(i / 4) - 3) >> (8 * (i % 4)));
+            static_cast<std::uint8_t>((static_cast<std::uint32_t>(i / 4) + 5) >> (8 * (i % 4)));
     return chunk;
 }
 
@@ -459,9 +459,9 @@ TEST_P(EveryEffectContract, TakesChunksWordByWord) {
     EXPECT_EQ(Chunk(*effect), today);
     ForEachParameter([&](const Row& row, std::size_t side, int real, int) {
         const auto bits = WordAt(today, row.at[side]);
-        const bool real32 = row.words[2].bits == std::bit_cast<std::uint32_t>(row.words[2].plain);
+        const bool isFloat = row.words[2].bits == std::bit_cast<std::uint32_t>(row.words[2].plain);
         EXPECT_EQ(effect->GetParamPlain(real),
-                  real32 ? std::bit_cast<float>(bits) : static_cast<float>(std::bit_cast<std::int32_t>(bits)))
+                  isFloat ? std::bit_cast<float>(bits) : static_cast<float>(bits))
             << "parameter " << real;
     });
     if (contract.oldWords == 0) return;
