@@ -59,7 +59,7 @@ struct Preset {
 enum class Leading { None, Kept, Version1 };
 
 struct Contract {
-    const char *effect, *name, *image, *icon;  // null where any will do
+    const char *effect, *name, *image, *icon;  // the effect's row in EffectCases; null where any will do
     int chunkSize;
     Leading leading;
     std::size_t
@@ -331,34 +331,6 @@ protected:
 
 INSTANTIATE_TEST_SUITE_P(All, EveryEffectContract, testing::ValuesIn(AllEffects()), EffectTestName);
 
-TEST_P(EveryEffectContract, NamesItselfAndItsParameters) {
-    const auto& contract = Promised();
-    const auto effect = Make();
-    EXPECT_EQ(effect->GetName(), contract.name);
-    if (contract.image) {
-        EXPECT_EQ(effect->GetImage(), contract.image);
-        EXPECT_EQ(effect->GetPluginIconPath(), contract.icon);
-    }
-    EXPECT_EQ(effect->GetParamUiSections(), contract.sections);
-    auto* const tabled = dynamic_cast<Corvo::DSP::CorvoEffect*>(effect.get());
-    const auto* const records = tabled ? tabled->GetParametersInfo() : nullptr;
-    int count = 0;
-    ForEachParameter([&](const Row& row, std::size_t side, int real, int external) {
-        SCOPED_TRACE(real);
-        ++count;
-        EXPECT_EQ(effect->GetParamName(external), row.Name());
-        EXPECT_EQ(effect->GetParamUnitsText(external), row.unit);
-        EXPECT_EQ(effect->GetParameterTypeAutomatable(external), row.type);
-        if (!records) return;
-        EXPECT_EQ(records[real].szLabel, row.Label(side));
-        EXPECT_EQ(records[real].mopCaps, contract.plainRange ? 0u : 1u);
-        EXPECT_EQ(records[real].mpdMinValue, contract.plainRange ? row.words[0].plain : 0.0f);
-        EXPECT_EQ(records[real].mpdMaxValue, contract.plainRange ? row.words[2].plain : 1.0f);
-    });
-    EXPECT_EQ(effect->GetParamCountReal(), count);
-    EXPECT_EQ(effect->GetParamCount(), contract.paired ? count / 2 : count);
-}
-
 // Catches a wrong span, floor, unit or place in the chunk.
 TEST_P(EveryEffectContract, StoresAndShowsEveryParameter) {
     const auto& contract = Promised();
@@ -375,34 +347,48 @@ TEST_P(EveryEffectContract, StoresAndShowsEveryParameter) {
     });
 }
 
-// What a host is told of a parameter, and that the choices select what they name.
-TEST_P(EveryEffectContract, DescribesEveryParameter) {
-    if (std::string(GetParam().name) == "Tube distortion")
-        GTEST_SKIP() << "describes neither its sides nor its choices yet";
+// Names and ranges; the choices select what they name.
+TEST_P(EveryEffectContract, DescribesItselfAndItsParameters) {
+    const auto& contract = Promised();
+    const auto effect = Make();
+    EXPECT_EQ(effect->GetName(), contract.name);
+    if (contract.image) {
+        EXPECT_EQ(effect->GetImage(), contract.image);
+        EXPECT_EQ(effect->GetPluginIconPath(), contract.icon);
+    }
+    EXPECT_EQ(effect->GetParamUiSections(), contract.sections);
+    auto* const recorded = dynamic_cast<Corvo::DSP::CorvoEffect*>(effect.get());
+    // The tube describes neither its sides nor its choices yet.
+    const bool whole = contract.name != std::string("Valvex");
+    int count = 0;
     ForEachParameter([&](const Row& row, std::size_t side, int real, int external) {
         SCOPED_TRACE(real);
-        const auto effect = Make();
+        ++count;
         const auto description = effect->Describe(external);
-        const auto label = Promised().paired ? row.Name() : row.Label(side), name = row.Name();
-        EXPECT_EQ(description.real, Promised().paired ? real / 2 * 2 : real);
-        EXPECT_EQ(description.label, std::string(label.begin(), label.end()));
-        EXPECT_EQ(description.name, std::string(name.begin(), name.end()));
-        EXPECT_EQ(std::wstring(description.unit.begin(), description.unit.end()), row.unit);
+        const auto wide = [](const std::string& text) { return std::wstring(text.begin(), text.end()); };
+        EXPECT_EQ(description.real, contract.paired ? real / 2 * 2 : real);
+        EXPECT_EQ(wide(description.name), row.Name());
+        EXPECT_EQ(wide(description.unit), row.unit);
         EXPECT_EQ(description.type, row.type);
         EXPECT_EQ(description.neutral, row.neutral);
-        EXPECT_EQ(description.choices.empty(), row.type == Continuous);
-        std::vector<std::string> texts;
+        if (whole) {
+            EXPECT_EQ(wide(description.label), contract.paired ? row.Name() : row.Label(side));
+            EXPECT_EQ(description.choices.empty(), row.type == Continuous);
+        }
+        float last = -1.0f;
         for (const auto& [text, value] : description.choices) {
-            texts.push_back(text);
-            const auto shown = effect->GetParameterFormattedText(external, value);
-            EXPECT_EQ(shown.substr(0, text.size()), std::wstring(text.begin(), text.end()));
-            EXPECT_TRUE(&text == &description.choices.front().text ||
-                        value > description.choices[texts.size() - 2].normalised);
+            EXPECT_TRUE(effect->GetParameterFormattedText(external, value).starts_with(wide(text))) << text;
+            EXPECT_GT(value, std::exchange(last, value));
         }
-        if (row.type == List) {
-            EXPECT_EQ(effect->GetParameterAvailableValues(external), texts);
-        }
+        if (!recorded) return;
+        const auto& record = recorded->GetParametersInfo()[real];
+        EXPECT_EQ(record.szLabel, row.Label(side));
+        EXPECT_EQ(record.mopCaps, contract.plainRange ? 0u : 1u);
+        EXPECT_EQ(record.mpdMinValue, contract.plainRange ? row.words[0].plain : 0.0f);
+        EXPECT_EQ(record.mpdMaxValue, contract.plainRange ? row.words[2].plain : 1.0f);
     });
+    EXPECT_EQ(effect->GetParamCountReal(), count);
+    EXPECT_EQ(effect->GetParamCount(), contract.paired ? count / 2 : count);
 }
 
 TEST_P(EveryEffectContract, HasItsPresets) {

@@ -2,10 +2,8 @@
 
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <cstring>
 #include <limits>
-#include <thread>
 
 #include "Support/CompressorProbe.h"
 
@@ -150,12 +148,6 @@ TEST(Compressor, RepairsWhatAChunkHolds) {
         for (std::size_t i = 0; i < 4; ++i) Put(chunk, kRecord + 4 * i, word);
         check(chunk, "times of " + std::to_string(word));
     }
-    Random random(21);
-    for (std::size_t length = 0; length < 16300; length += 97) {
-        Bytes bytes(length);
-        for (auto& value : bytes) value = static_cast<std::uint8_t>(random.Next());
-        check(bytes, std::to_string(length) + " random bytes");
-    }
 }
 
 TEST(Compressor, UnderstandsTexts) {
@@ -191,45 +183,4 @@ TEST(Compressor, AutomationReachesTheEditor) {
     EXPECT_EQ(effect.GetParam(kAttack), attack) << "only curves come back";
     effect.SetParamFromUi(kAttack, 0.7f, false);
     EXPECT_NEAR(effect.GetParam(kAttack), 0.7f, 1e-5);
-}
-
-// Catches races (under the thread sanitizer) and edits that get lost between the threads.
-TEST(Compressor, TakesEditsPresetsAndChunksWhileAutomated) {
-    const auto format = Format<float>();
-    Compressor effect;
-    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.4f, 0.4f, MP_CURVE_JUMP, 0},
-                                            {100, 100, 0.8f, 0.8f, MP_CURVE_JUMP, 0}};
-    for (const int index : {0, 4, 6, 9}) effect.AddEnvelope(index, 2, segments);
-    effect.InitProcessing(32, &format);
-    std::atomic<bool> done{false};
-    std::jthread userInterface([&] {
-        Random random(17);
-        const auto chunk = Chunk(effect);
-        for (int round = 0; !done; ++round) {
-            effect.SetParam(random.Below(16), static_cast<float>(random.Unit()), false);
-            if (round % 3 == 0) effect.SetPreset(random.Below(42));
-            if (round % 5 == 0) effect.SetSettingsChunk(chunk);
-            effect.SetGainMeterOn(round % 2 == 0);
-            for (int index = 0; index < 16; ++index) Text(effect, index);
-            effect.GetGainReduction(0);
-            effect.IsUsingSideChain();
-            Chunk(effect);
-            std::this_thread::yield();
-        }
-    });
-    const auto input = Noise<float>(64);
-    for (int i = 0; i < 2000; ++i) {
-        auto block = input;
-        effect.SetEnvelopeTime(i % 200);
-        ProcessBlock(effect, block.data(), 32, format);
-    }
-    done = true;
-    userInterface.join();
-
-    // At rest, what is shown is what is heard.
-    for (const int index : {0, 4, 6, 9}) effect.AddEnvelope(index, 0, nullptr);
-    effect.SetPreset(0);
-    SetBoth(effect, kThreshold, ThresholdPosition(-250));
-    SetBoth(effect, kRatio, 1.0f);
-    EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), -25.0, 0.05);
 }

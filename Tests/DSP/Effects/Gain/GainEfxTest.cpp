@@ -117,9 +117,10 @@ TEST(GainEfx, LaysItsControlsOutForTheStream) {
     gain.CheckCookProperties(&stereo, false);
     EXPECT_TRUE(gain.WantsUpdateUiFromScratch());
     EXPECT_EQ(knob(kFlipLeft).label, "Flip phase L");
+    EXPECT_TRUE(knob(kFlipLeft).is_switch && !knob(kPan).is_switch);
     EXPECT_EQ(knob(kFlipLeft).layout_group, 2);
-    EXPECT_TRUE(knob(kFlipLeft).is_switch);
     EXPECT_EQ(knob(kGain).layout_group, 1);
+    EXPECT_EQ(knob(kPan).layout_group, 0);
     EXPECT_FALSE(knob(kPan).hidden);
 
     gain.SetUpdateUiFromScratch(false);
@@ -129,8 +130,7 @@ TEST(GainEfx, LaysItsControlsOutForTheStream) {
     EXPECT_TRUE(gain.WantsUpdateUiFromScratch());
     EXPECT_EQ(knob(kFlipLeft).label, "Flip phase");
     EXPECT_EQ(knob(kFlipLeft).layout_group, -1);
-    EXPECT_TRUE(knob(kPan).hidden && knob(kWidth).hidden && knob(kFlipRight).hidden);
-    EXPECT_FALSE(knob(kGain).hidden);
+    EXPECT_TRUE(knob(kPan).hidden && knob(kWidth).hidden && knob(kFlipRight).hidden && !knob(kGain).hidden);
 
     gain.SetUpdateUiFromScratch(false);
     gain.SetSettingsChunk(std::vector<std::uint8_t>(20));
