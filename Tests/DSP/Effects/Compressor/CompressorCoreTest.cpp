@@ -273,21 +273,3 @@ TEST(CompressorCore, MetersTheGainWhileTheMeterIsOn) {
     EXPECT_NEAR(effect.GetGainReduction(0), 0.1, 1e-4);
     EXPECT_NEAR(effect.GetGainReduction(1), 0.1, 1e-4);
 }
-
-// Catches poison that outlives new settings.
-TEST(CompressorCore, NewSettingsCureAPoisonedFollower) {
-    const auto format = Format<float>();
-    for (const float link : {0.0f, 1.0f}) {
-        Compressor effect;
-        effect.SetParam(kStereoLink, link, false);
-        effect.InitProcessing(64, &format);
-        auto block = Noise<float>(128);
-        block[3] = std::numeric_limits<float>::quiet_NaN();
-        block[40] = std::numeric_limits<float>::infinity();
-        ProcessBlock(effect, block.data(), 64, format);
-        effect.SetPreset(2);
-        block = Noise<float>(128);
-        ProcessBlock(effect, block.data(), 64, format);
-        for (const float sample : block) ASSERT_TRUE(std::isfinite(sample));
-    }
-}
