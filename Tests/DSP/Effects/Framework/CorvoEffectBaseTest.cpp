@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <limits>
-#include <tuple>
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
 #include "DSP/Effects/Parameters/ParameterTable.h"
@@ -41,9 +40,6 @@ public:
     const MP_PARAMINFO* GetParametersInfo() override { return records.data(); }
     void SetMaximumFramesPerBuffer(int frames) override {
         calls.push_back("maximum " + std::to_string(frames));
-    }
-    float GetParamFromProp(int index, int preset) override {
-        return preset < 0 ? CorvoEffect::GetParamFromProp(index, preset) : static_cast<float>(index);
     }
     void CheckCookProperties(const tWAVEFORMATEX*, bool force) override {
         calls.push_back(force ? "forced cook" : "cook");
@@ -178,14 +174,6 @@ TEST(CorvoEffectBase, AnnouncesSidechainBusesInAscendingOrder) {
     EXPECT_EQ(probe.GetSidechainBusNumChannels(0), 2);
 }
 
-TEST(CorvoEffectBase, ListsPresetValuesInExternalOrder) {
-    Probe probe(4);
-    EXPECT_EQ(probe.GetPresetValues(0), (std::vector<float>{0, 1, 2, 3}));
-    EXPECT_EQ(probe.GetPresetValues(-1), std::vector<float>(4, -1.0f));
-    probe.m_reverse_param_order = true;
-    EXPECT_EQ(probe.GetPresetValues(0), (std::vector<float>{3, 2, 1, 0}));
-}
-
 // Catches a label that loses more than its side, or that runs out of its field.
 TEST(CorvoEffect, NamesParametersByTheirLabelsWithoutTheSide) {
     const std::pair<const wchar_t*, const wchar_t*> cases[] = {
@@ -200,13 +188,6 @@ TEST(CorvoEffect, NamesParametersByTheirLabelsWithoutTheSide) {
         probe.records[0] = MakeParamInfo(label, L"unit", MPT_INT, 0, 0.0f, 1.0f, 0.5f);
         EXPECT_EQ(probe.GetParamName(0), name);
     }
-    Probe probe(8);
-    for (std::size_t i = 0; i < 8; ++i)
-        probe.records[i] = MakeParamInfo(std::to_wstring(i), L"", MPT_INT, 0, 0.0f, 1.0f, 0.5f);
-    probe.paired = true;
-    EXPECT_EQ(probe.GetParamName(3), L"6");
-    probe.m_reverse_param_order = true;
-    EXPECT_EQ(probe.GetParamName(3), L"1");
 }
 
 // Catches nonsense from the host getting into delay lengths.
