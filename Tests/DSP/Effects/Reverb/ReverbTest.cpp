@@ -153,3 +153,13 @@ TEST(Reverb, LimitsWhatWouldNotDecay) {
             ASSERT_LE(std::abs(sample), 0.25) << length;
     }
 }
+
+// Catches an input filter that goes on ringing with what it kept before an edit.
+TEST(Reverb, StartsItsInputFilterAfreshWithEveryEdit) {
+    Reverb reverb;
+    Load(reverb, {0, 0, 0, 0, 700, 700, -450, -450, 0, 0, 0, 0, 1000, 1000, 1000, 1000});
+    const auto output = Render(reverb, std::vector<double>(8000, 1.0), Format<double>(1, 8000), {1000},
+                               {{4000, kLength, 0.5f}});
+    EXPECT_NEAR(output[3999], 0.0, 1e-6);
+    EXPECT_GT(output[4000], 0.9);
+}
