@@ -1,7 +1,10 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <bit>
 #include <cmath>
+#include <stdexcept>
+#include <utility>
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
 #include "Support/EveryEffect.h"
