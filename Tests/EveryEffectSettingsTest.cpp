@@ -149,11 +149,26 @@ TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
     }
 }
 
-// Catches defaults that differ from the preset a new instance should start from.
-TEST_P(EveryEffectSettings, StartsFromItsDefaultPreset) {
+// Catches a new instance that differs from what it should start from.
+TEST_P(EveryEffectSettings, StartsFromItsDefaults) {
     const auto effect = GetParam().make();
-    if (effect->NumPresets() == 0 || GetParam().startsBlank) GTEST_SKIP() << "has no presets or starts blank";
+    if (GetParam().startsBlank) GTEST_SKIP() << "the host loads a preset or a chunk first";
     const auto fresh = AllParams(*effect);
     effect->SetPreset(effect->GetDefaultPreset());
     EXPECT_EQ(AllParams(*effect), fresh);
+    for (int i = 0; effect->NumPresets() == 0 && i < effect->GetParamCount(); ++i)
+        EXPECT_EQ(effect->GetParam(i), effect->Describe(i).neutral) << "parameter " << i;
+}
+
+// Catches automation that an effect says it plays and does not, or the reverse.
+TEST_P(EveryEffectSettings, PlaysAutomationIfItSaysSo) {
+    const auto effect = Make();
+    const auto format = Format<float>();
+    const MP_ENVELOPE_SEGMENT segment{0, 0, 0.8125f, 0.8125f, MP_CURVE_JUMP, 0};
+    for (int index = 0; index < effect->GetParamCountReal(); ++index) effect->AddEnvelope(index, 1, &segment);
+    effect->InitProcessing(64, &format);
+    const auto before = AllParams(*effect);
+    auto block = Noise<float>(2 * 64);
+    ProcessBlock(*effect, block.data(), 64, format);
+    EXPECT_EQ(AllParams(*effect) != before, effect->PlaysAutomation());
 }

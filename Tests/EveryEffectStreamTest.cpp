@@ -10,14 +10,14 @@ using namespace TestSupport;
 // What every effect promises about streams of audio.
 namespace {
 
-// Every parameter moved once, spread over the middle of the stream, so that glides are cut as well.
+// Every parameter moved once in the last third, when delay lines are full, so that glides are cut as well.
 std::vector<Edit> MoveEverything(CorvoEffectBase& effect, std::size_t frames, std::uint64_t seed) {
     Random random(seed);
     const int count = effect.GetParamCount();
     std::vector<Edit> edits;
     for (int i = 0; i < count; ++i)
         edits.push_back(
-            {frames / 3 + static_cast<std::size_t>(i) * frames / static_cast<std::size_t>(4 * count), i,
+            {2 * frames / 3 + static_cast<std::size_t>(i) * frames / static_cast<std::size_t>(4 * count), i,
              static_cast<float>(random.Unit())});
     return edits;
 }
@@ -39,9 +39,9 @@ bool Close(Sample a, Sample b, Cuts cuts) {
 }
 
 template <typename Sample>
-void ExpectTheSameHoweverCut(const EffectCase& row) {
+void ExpectTheSameHoweverCut(const EffectCase& row, int rate) {
     constexpr std::size_t kFrames = 5000;
-    const auto format = Format<Sample>();
+    const auto format = Format<Sample>(2, rate);
     const auto input = Noise<Sample>(2 * kFrames);
     std::vector<int> random(40);
     Random source(7);
@@ -66,11 +66,12 @@ bool AllFinite(std::span<const float> samples) {
 
 INSTANTIATE_TEST_SUITE_P(All, EveryEffect, testing::ValuesIn(AllEffects()), EffectTestName);
 
-// Catches state lost, advanced twice or rounded at a block's edge.
+// Catches state lost, advanced twice or rounded at a block's edge. At 8 kHz the stream is several passes of
+// every delay line.
 TEST_P(EveryEffect, GivesTheSameOutputHoweverTheStreamIsCut) {
     if (GetParam().cuts == Cuts::Exempt) GTEST_SKIP() << "its engine works in pieces of its own";
-    ExpectTheSameHoweverCut<float>(GetParam());
-    ExpectTheSameHoweverCut<double>(GetParam());
+    ExpectTheSameHoweverCut<float>(GetParam(), 8000);
+    ExpectTheSameHoweverCut<double>(GetParam(), 8000);
 }
 
 // Catches a per-channel path that lags behind the interleaved one, or that touches what it does not support.

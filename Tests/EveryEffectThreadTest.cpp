@@ -95,10 +95,15 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
         }
 }
 
-// Catches races between edits and processing (under the thread sanitizer) and edits that get lost.
+// Catches races between edits, automation and processing (under the thread sanitizer) and edits that get
+// lost.
 TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     const auto effect = Make();
     const auto format = Format<float>();
+    const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.4f, 0.4f, MP_CURVE_JUMP, 0},
+                                            {100, 100, 0.8f, 0.8f, MP_CURVE_JUMP, 0}};
+    for (int index = 0; index < effect->GetParamCountReal(); index += 3)
+        effect->AddEnvelope(index, 2, segments);
     effect->InitProcessing(32, &format);
     std::atomic<bool> done{false};
     std::thread userInterface([&] {
@@ -114,6 +119,7 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
             if (round % 5 == 0 && effect->NumPresets() > 0)
                 effect->SetPreset(random.Below(effect->NumPresets()));
             if (round % 7 == 0) effect->SetSettingsChunk(good);
+            Chunk(*effect);
             if (effect->WantsUpdateUiFromScratch()) effect->SetUpdateUiFromScratch(false);
             std::this_thread::yield();
         }
@@ -121,6 +127,7 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     const auto input = Noise<float>(2 * 32);
     for (int i = 0; i < 500; ++i) {
         auto block = input;
+        effect->SetEnvelopeTime(i % 200);
         ProcessBlock(*effect, block.data(), 32, format);
     }
     done = true;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <atomic>
+#include <concepts>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -190,7 +191,8 @@ public:
     void ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                ProcessFlags& flags);
     // The same for a block of floats; the format says 32 bits.
-    void Process(float* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
+    template <std::same_as<float> Float>
+    void Process(Float* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
         Process(reinterpret_cast<double*>(buffer), frames, format, flags);
     }
 

@@ -166,37 +166,13 @@ TEST(CompressorCore, ChangesPresetsWithoutAStep) {
     }
 }
 
-TEST(CompressorCore, OutGainGlidesAtTenHertz) {
-    const auto format = Format<double>(1);
-    Compressor effect;
-    effect.SetPreset(0);
-    std::vector<double> ones(48000, 1.0);
-    const auto output = Render(effect, ones, format, {100}, {{9600, kOutGain, OutGainPosition(-60)}});
-    const double target = Amplitude(-6.0);
-    EXPECT_EQ(output[9599], 1.0);
-    EXPECT_NEAR(output[9600 + 763], target + (1.0 - target) / std::numbers::e, 1e-3);
-    EXPECT_NEAR(output.back(), target, 1e-15);
-}
-
-// Catches a limiter that lets peaks out above what came in.
-TEST(CompressorCore, TheHeavyLimiterNeverRaisesAPeak) {
-    Compressor effect;
-    effect.SetPreset(8);
-    const auto input = Wandering<float>(48000);
-    const auto output = Render(effect, input, Format<float>(), {512});
-    for (std::size_t i = 0; i < input.size(); ++i)
-        ASSERT_LE(std::abs(output[i]), std::abs(input[i])) << "sample " << i;
-}
-
 // Catches a make-up gain that misses full scale or exceeds its limit.
 TEST(CompressorCore, MakesUpToFullScale) {
     Compressor effect;
-    effect.SetPreset(0);
+    MakeFlat(effect);
     effect.SetParam(kMakeUp, 1.0f, false);
-    EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), 0.0, 1e-6);
     for (const int tenths : {-200, -300, -700}) {
         SetBoth(effect, kThreshold, ThresholdPosition(tenths));
-        SetBoth(effect, kRatio, 1.0f);
         EXPECT_NEAR(SteadyGains(effect, {0.0}).front(), std::min(0.0, 40.0 + tenths / 10.0), 1e-3) << tenths;
     }
 }
@@ -211,54 +187,43 @@ TEST(CompressorCore, ListensToTheSideChain) {
     double* const mono[] = {loudChannel, nullptr};
     double* const stereo[] = {silentChannel, loudChannel};
     double* const none[] = {nullptr, nullptr};
-    const double limited =
-        -20.0 + 6.0206;  // the gain for full scale at a threshold of -20 dB, or for half of it
     struct Case {
         const char* what;
         int announced;
         double* const* channels;
-        double left, right;  // gains in dB of a quiet block
+        float link;
+        double left, right;  // gains in dB of a quiet block; full scale is 20 dB above the threshold
         bool used;
     } const cases[] = {
-        {"no side-chain", 0, mono, 0.0, 0.0, false},
-        {"mono serves both channels", 1, mono, -20.0, -20.0, true},
-        {"fewer buffers than announced", 2, mono, -20.0, -20.0, true},
-        {"each channel has its own", 2, stereo, 0.0, -20.0, true},
-        {"announced, but null", 2, nullptr, 0.0, 0.0, false},
-        {"announced, but of null channels", 2, none, 0.0, 0.0, false},
+        {"no side-chain", 0, mono, 0.0f, 0.0, 0.0, false},
+        {"mono serves both channels", 1, mono, 0.0f, -20.0, -20.0, true},
+        {"fewer buffers than announced", 2, mono, 0.0f, -20.0, -20.0, true},
+        {"each channel has its own", 2, stereo, 0.0f, 0.0, -20.0, true},
+        {"linked, the mean of both: half of full scale", 2, stereo, 1.0f, -13.98, -13.98, true},
+        {"announced, but null", 2, nullptr, 0.0f, 0.0, 0.0, false},
+        {"announced, but of null channels", 2, none, 0.0f, 0.0, 0.0, false},
     };
     for (const auto& c : cases) {
         Compressor effect;
-        effect.SetPreset(0);
+        MakeFlat(effect);
         SetBoth(effect, kThreshold, ThresholdPosition(-200));
-        SetBoth(effect, kRatio, 1.0f);
-        effect.SetParam(kStereoLink, 0.0f, false);
-        effect.SetParam(kRelease, 0.0f, false);
+        effect.SetParam(kStereoLink, c.link, false);
+        SetBoth(effect, kRelease, 0.0f);
         if (c.announced > 0) effect.SetSidechainBusNumChannels(0, c.announced);
         effect.InitProcessing(kFrames, &format);
         effect.SetSidechainBuffer(0, c.channels);
         effect.SetSidechainBuffer(1, mono);
-        block.assign(2 * kFrames, 0.001f);
-        ProcessBlock(effect, block.data(), kFrames, format);
-        EXPECT_NEAR(Decibels(block[2 * kFrames - 2] / 0.001), c.left, 0.01) << c.what;
-        EXPECT_NEAR(Decibels(block[2 * kFrames - 1] / 0.001), c.right, 0.01) << c.what;
+        const auto expect = [&](double left, double right, const char* when) {
+            block.assign(2 * kFrames, 0.001f);
+            ProcessBlock(effect, block.data(), kFrames, format);
+            EXPECT_NEAR(Decibels(block[2 * kFrames - 2] / 0.001), left, 0.05) << c.what << when;
+            EXPECT_NEAR(Decibels(block[2 * kFrames - 1] / 0.001), right, 0.05) << c.what << when;
+        };
+        expect(c.left, c.right, "");
         EXPECT_EQ(effect.IsUsingSideChain(), c.used) << c.what;
-        block.assign(2 * kFrames, 0.001f);
-        ProcessBlock(effect, block.data(), kFrames, format);
-        EXPECT_NEAR(Decibels(block[2 * kFrames - 2] / 0.001), 0.0, 0.01) << c.what << ", the block after";
+        expect(0.0, 0.0, ", the block after");
         EXPECT_FALSE(effect.IsUsingSideChain());
     }
-    // Linked, the mean of both counts: half of full scale.
-    Compressor effect;
-    effect.SetPreset(0);
-    SetBoth(effect, kThreshold, ThresholdPosition(-200));
-    SetBoth(effect, kRatio, 1.0f);
-    effect.SetSidechainBusNumChannels(0, 2);
-    effect.InitProcessing(kFrames, &format);
-    effect.SetSidechainBuffer(0, stereo);
-    block.assign(2 * kFrames, 0.001f);
-    ProcessBlock(effect, block.data(), kFrames, format);
-    EXPECT_NEAR(Decibels(block.back() / 0.001), limited, 0.05);
 }
 
 // Catches a monitor that plays the wrong signal, or that leaves the followers behind.
@@ -307,22 +272,4 @@ TEST(CompressorCore, MetersTheGainWhileTheMeterIsOn) {
     SteadyGains(effect, {0.0}, 8000);
     EXPECT_NEAR(effect.GetGainReduction(0), 0.1, 1e-4);
     EXPECT_NEAR(effect.GetGainReduction(1), 0.1, 1e-4);
-}
-
-// Catches poison that outlives new settings.
-TEST(CompressorCore, NewSettingsCureAPoisonedFollower) {
-    const auto format = Format<float>();
-    for (const float link : {0.0f, 1.0f}) {
-        Compressor effect;
-        effect.SetParam(kStereoLink, link, false);
-        effect.InitProcessing(64, &format);
-        auto block = Noise<float>(128);
-        block[3] = std::numeric_limits<float>::quiet_NaN();
-        block[40] = std::numeric_limits<float>::infinity();
-        ProcessBlock(effect, block.data(), 64, format);
-        effect.SetPreset(2);
-        block = Noise<float>(128);
-        ProcessBlock(effect, block.data(), 64, format);
-        for (const float sample : block) ASSERT_TRUE(std::isfinite(sample));
-    }
 }

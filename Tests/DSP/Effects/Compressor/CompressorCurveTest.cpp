@@ -1,7 +1,6 @@
 #include <gtest/gtest.h>
 
 #include <cstdio>
-#include <set>
 
 #include "DSP/Effects/Compressor/CompressorPresets.h"
 #include "Support/CompressorProbe.h"
@@ -51,32 +50,11 @@ TEST(CompressorCurve, EveryPresetFollowsItsRow) {
             falls = falls || (i > 0 && levels[i] + gains[i] < levels[i - 1] + gains[i - 1] - 1e-6);
         }
         EXPECT_EQ(falls, name == "Inverted dynamic") << name;
-        if (name.find("Soft") != name.npos) {
-            EXPECT_GT(row.knee + row.gate.knee, 0.0) << name;
-        }
-        if (name.ends_with("Gate") || name.ends_with("gate")) {
-            EXPECT_GE(row.gate.range, 20.0) << name;
-        }
-        if (name.find("Limiter") != name.npos) {
-            EXPECT_GT(row.ratio, 100.0) << name;
-        }
         if (row.ratio != 1.0) {
             EXPECT_EQ(Text(effect, kThreshold + 1), Formatted("%.1f dB", row.threshold)) << name;
             EXPECT_EQ(Text(effect, kRatio), row.ratio > 100.0 ? "Inf.:1 " : Formatted("%.1f:1 ", row.ratio))
                 << name;
         }
-    }
-}
-
-TEST(CompressorCurve, NoTwoPresetsAreAlike) {
-    std::set<std::string> records;
-    Compressor effect;
-    for (int preset = 0; preset < effect.NumPresets(); ++preset) {
-        effect.SetPreset(preset);
-        const auto chunk = Chunk(effect);
-        // Without the preset's number.
-        EXPECT_TRUE(records.emplace(chunk.begin(), chunk.begin() + 16100).second)
-            << effect.GetPresetName(preset);
     }
 }
 

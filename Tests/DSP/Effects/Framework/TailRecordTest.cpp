@@ -2,78 +2,97 @@
 
 #include <climits>
 
-#include "DSP/Effects/Framework/CorvoEffectBase.h"
-#include "Support/Signals.h"
+#include "DSP/Effects/Chorus/Chorus.h"
+#include "DSP/Effects/Echo/Echo.h"
+#include "DSP/Effects/Gain/GainEfx.h"
+#include "Support/EffectRun.h"
 
 using namespace Corvo::DSP;
+using namespace TestSupport;
 
 namespace {
 
-// Writes 1 wherever it may; with `counts` it rings 100 frames on the left and 70 on the right.
-class Ringer : public CorvoEffectBase {
-public:
-    explicit Ringer(bool counts) : m_counts(counts) {}
-    float GetParam(int) override { return 0.0f; }
-    int GetParamCountReal() override { return 0; }
-    std::string GetName() override { return "ringer"; }
+constexpr int kBlock = 16;
 
-    // Frames of output per channel since the start.
-    std::array<int, 2> written{};
-
-protected:
-    bool DoSetParam(int, float, bool) override { return false; }
-    void ProcessInternal(double*, int frames, const tWAVEFORMATEX*, ProcessFlags&) override {
-        if (m_tail.TakeRestart()) m_left = {100, 70};
-        const auto allowed = m_counts ? m_tail.Limit(frames, m_left) : std::array{frames, frames};
-        for (std::size_t channel = 0; channel < 2; ++channel) written[channel] += allowed[channel];
-    }
-
-private:
-    bool m_counts;
-    std::array<int, 2> m_left{};
-};
+// At 1 kHz the echo's delays are 100 and 61 samples of both channels: 50 and 30 frames.
+std::unique_ptr<CorvoEffectBase> Echoing() {
+    auto echo = std::make_unique<Echo>();
+    echo->SetParam(2, 0.0f, false);  // milliseconds
+    echo->SetParam(0, 0.01005f, false);
+    echo->SetParam(1, 0.00615f, false);
+    return echo;
+}
+// Of the chorus's delays, 200 frames and 100 of which half are swept, 200 and 50 count; over two channels.
+std::unique_ptr<CorvoEffectBase> Chorusing() {
+    auto chorus = std::make_unique<Chorus>();
+    chorus->SetParam(0, 0.20005f, false);
+    chorus->SetParam(1, 0.10005f, false);
+    chorus->SetParam(4, 0.0f, false);
+    chorus->SetParam(5, 0.5f, false);
+    return chorus;
+}
+std::unique_ptr<CorvoEffectBase> Uncounted() { return std::make_unique<GainEfx::GainEfx>(); }
 
 struct Case {
     const char* fault;
-    bool counts;
+    std::unique_ptr<CorvoEffectBase> (*make)();
     std::int64_t limit;
-    std::array<int, 2> written;
-    int blocks;
+    int frames, blocks;
+    std::array<int, 2> left;  // frames of each side that are not silence any more; 0 where that is not known
 };
 
 }  // namespace
 
 TEST(TailRecord, RingsAsLongAsTheEffectAndTheHostAllow) {
     constexpr Case kCases[] = {
-        {"the longer channel is cut or the shorter one goes on", true, LLONG_MAX, {100, 70}, 4},
-        {"the host's limit is overlooked", true, 50, {50, 50}, 2},
-        {"an effect that does not count never ends", false, 50, {50, 50}, 2},
-        {"a tail of nothing never ends", true, 0, {0, 0}, 1},
-        {"a limit below 0 reads as no tail", false, -5, {0, 0}, 1},
+        {"the longer side is cut or the shorter one goes on", Echoing, LLONG_MAX, 50, 4, {50, 30}},
+        {"a delay is counted in another way", Chorusing, LLONG_MAX, 100, 7, {}},
+        {"the host's limit is overlooked", Echoing, 20, 20, 2, {20, 20}},
+        {"an effect that does not count never ends", Uncounted, 50, 50, 4, {}},
+        {"a tail of nothing never ends", Echoing, 0, 0, 1, {}},
+        {"a limit below 0 reads as no tail", Uncounted, -5, 0, 1, {}},
     };
-    const auto format = TestSupport::Format<double>();
-    ProcessFlags flags;
+    const auto format = Format<double>(2, 1000);
     for (const auto& c : kCases) {
-        Ringer effect(c.counts);
-        effect.InitProcessing(32, &format);
-        effect.RequestTailRestart();
-        effect.Process(nullptr, 32, &format, flags);  // the stream: uncounted, never finished
-        EXPECT_EQ(effect.TailFramesProduced(), 32) << c.fault;
-        EXPECT_FALSE(effect.TailFinished()) << c.fault;
-        effect.written = {};
+        const auto effect = c.make();
+        effect->InitProcessing(64, &format);
+        auto block = Noise<double>(2 * 64);
+        ProcessBlock(*effect, block.data(), 64, format);  // the stream: uncounted, never finished
+        EXPECT_EQ(effect->TailFramesProduced(), 64) << c.fault;
+        EXPECT_FALSE(effect->TailFinished()) << c.fault;
 
-        effect.StartTail(c.limit);
+        effect->StartTail(c.limit);
         int blocks = 0, produced = 0;
+        std::array<int, 2> sounding{};
         do {
-            effect.Process(nullptr, 32, &format, flags);
-            produced += effect.TailFramesProduced();
-        } while (++blocks < 10 && !effect.TailFinished());
+            std::vector<double> silence(2 * kBlock);
+            ProcessBlock(*effect, silence.data(), kBlock, format);
+            for (std::size_t i = 0; i < silence.size(); ++i) sounding[i % 2] += silence[i] != 0.0;
+            produced += effect->TailFramesProduced();
+        } while (++blocks < 10 && !effect->TailFinished());
         EXPECT_EQ(blocks, c.blocks) << c.fault;
-        EXPECT_EQ(effect.written, c.written) << c.fault;
-        EXPECT_EQ(produced, c.written[0]) << c.fault;
-
-        effect.EndTail();
-        effect.Process(nullptr, 32, &format, flags);
-        EXPECT_EQ(effect.TailFramesProduced(), 32) << c.fault;
+        EXPECT_EQ(produced, c.frames) << c.fault;
+        if (c.left[0] > 0) {
+            EXPECT_EQ(sounding, c.left) << c.fault;
+        }
+        effect->EndTail();
+        ProcessBlock(*effect, block.data(), 32, format);
+        EXPECT_EQ(effect->TailFramesProduced(), 32) << c.fault;
     }
+}
+
+TEST(TailRecord, RestartsWithAWholePass) {
+    const auto format = Format<double>(2, 1000);
+    const auto effect = Echoing();
+    effect->InitProcessing(64, &format);
+    std::vector<double> silence(2 * kBlock);
+    ProcessBlock(*effect, silence.data(), kBlock, format);
+    effect->StartTail(LLONG_MAX);
+    int produced = 0;
+    for (int blocks = 0; blocks < 10 && !effect->TailFinished(); ++blocks) {
+        if (blocks == 2) effect->RequestTailRestart();
+        ProcessBlock(*effect, silence.data(), kBlock, format);
+        produced += effect->TailFramesProduced();
+    }
+    EXPECT_EQ(produced, 2 * kBlock + 50);
 }
