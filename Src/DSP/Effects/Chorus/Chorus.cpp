@@ -6,6 +6,7 @@
 
 #include "DSP/Effects/Chorus/ChorusKernel.h"
 #include "DSP/Effects/Chorus/ChorusPresets.h"
+#include "DSP/Effects/Framework/TailRecord.h"
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Parts/Decibels.h"
 #include "DSP/Parts/SampleDispatch.h"
@@ -136,15 +137,15 @@ void Chorus::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* fo
     CheckCookProperties(format, false);
     if (!m_ring || frames < 1 || format->nChannels == 0) return;
     const int channels = Channels();
-    const bool restart = m_tail.TakeRestart();
+    const bool restart = m_tail->TakeRestart();
     // Until the tail begins, all of it is left to ring out.
-    if (restart || !m_tail.TailMode()) m_tail_left = {};
+    if (restart || !m_tail->TailMode()) m_tail_left = {};
     for (std::size_t i = 0; i < static_cast<std::size_t>(channels); ++i) {
         auto& side = (*m_sides)[i];
         if (restart) side.write = side.channel;
-        if (restart || !m_tail.TailMode()) m_tail_left[i] = side.base / channels;
+        if (restart || !m_tail->TailMode()) m_tail_left[i] = side.base / channels;
     }
-    const auto allowed = m_tail.Limit(frames, m_tail_left);
+    const auto allowed = m_tail->Limit(frames, m_tail_left);
     const ChorusPrivate::Ring ring{m_ring.get(), m_ring_length, channels};
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&](auto* samples) {
         for (std::size_t i = 0; i < static_cast<std::size_t>(channels); ++i)

@@ -8,6 +8,7 @@
 #include "DSP/Effects/Echo/EchoDelay.h"
 #include "DSP/Effects/Echo/EchoKernel.h"
 #include "DSP/Effects/Echo/EchoPresets.h"
+#include "DSP/Effects/Framework/TailRecord.h"
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 #include "DSP/Parts/Decibels.h"
@@ -77,7 +78,9 @@ constexpr double kFastestHz = 768e3;  // upper bound for memory; faster formats 
 
 }  // namespace
 
-Echo::Echo() : CorvoEffect(Table(), &m_settings) { SetPreset(0); }
+Echo::Echo() : CorvoEffect(Table(), &m_settings), m_delay(std::make_unique<EchoPrivate::Delay>()) {
+    SetPreset(0);
+}
 Echo::~Echo() = default;
 
 int Echo::Sides() const { return m_format.nChannels >= 2 ? 2 : 1; }
@@ -151,11 +154,11 @@ bool Echo::InitState(bool reset) {
     std::array<int, 2> lengths;
     for (std::size_t i = 0; i < 2; ++i) {
         const double wet = settings.mix[i] * kMixStep;
-        m_sides[i] = {.feedback = GainFromTenthsOfDb(settings.decay[i], kFeedbackFloor),
-                      .echo = GainFromTenthsOfDb(settings.delayGain[i], kEchoFloor),
-                      .wet = wet,
-                      .dry = 1.0 - wet,
-                      .output = GainFromTenthsOfDb(settings.outGain[i], kOutputFloor)};
+        m_delay->sides[i] = {.feedback = GainFromTenthsOfDb(settings.decay[i], kFeedbackFloor),
+                             .echo = GainFromTenthsOfDb(settings.delayGain[i], kEchoFloor),
+                             .wet = wet,
+                             .dry = 1.0 - wet,
+                             .output = GainFromTenthsOfDb(settings.outGain[i], kOutputFloor)};
         // Settings of any origin: a delay beyond its mode's range is the longest there is.
         const double ms = std::min(DelayMs(settings.mode, settings.depth[i]), longest);
         lengths[i] = static_cast<int>(std::max(ms * hz * 0.001, static_cast<double>(kShortestDelay)));
@@ -185,13 +188,13 @@ bool Echo::LayRing(std::array<int, 2> lengths, bool reset) {
             m_capacity = wanted;
         }
         std::fill_n(m_ring.get(), wanted, 0.0f);
-        m_lines[0].ring = m_ring.get();
-        m_lines[1].ring = m_ring.get() + (sides == 2 ? (used + 1) / 2 : 0);
-        m_lines[0].position = m_lines[1].position = 0;
+        m_delay->lines[0].ring = m_ring.get();
+        m_delay->lines[1].ring = m_ring.get() + (sides == 2 ? (used + 1) / 2 : 0);
+        m_delay->lines[0].position = m_delay->lines[1].position = 0;
     }
     m_lengths = lengths;
-    m_lines[0].length = (lengths[0] + sides - 1) / sides;
-    m_lines[1].length = lengths[1] / 2;
+    m_delay->lines[0].length = (lengths[0] + sides - 1) / sides;
+    m_delay->lines[1].length = lengths[1] / 2;
     return true;
 }
 
@@ -208,11 +211,11 @@ void Echo::Cleanup() {
 void Echo::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     if (!m_ring || frames <= 0 || format->nChannels == 0) return;
-    const bool restart = m_tail.TakeRestart();
-    if (restart) m_lines[0].position = m_lines[1].position = 0;
+    const bool restart = m_tail->TakeRestart();
+    if (restart) m_delay->lines[0].position = m_delay->lines[1].position = 0;
     // Until the tail begins, a whole pass of the ring is left to ring out.
-    if (restart || !m_tail.TailMode()) m_tail_left = PassFrames();
-    const auto allowed = m_tail.Limit(frames, m_tail_left);
+    if (restart || !m_tail->TailMode()) m_tail_left = PassFrames();
+    const auto allowed = m_tail->Limit(frames, m_tail_left);
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&](auto* samples) { Run(samples, allowed); });
 }
 
@@ -220,21 +223,21 @@ template <typename Sample>
 void Echo::Run(Sample* samples, std::array<int, 2> frames) {
     const int channels = m_format.nChannels;
     int done = 0;
-    auto& [left, right] = m_lines;
+    auto& [left, right] = m_delay->lines;
     for (const int both = channels == 2 ? std::min(frames[0], frames[1]) : 0; done < both;) {
         const int run = std::min({both - done, left.UntilWrap(), right.UntilWrap()});
-        RunEchoPair(m_sides, samples + 2 * done, run, left.Here(), right.Here());
+        RunEchoPair(m_delay->sides, samples + 2 * done, run, left.Here(), right.Here());
         left.Advance(run);
         right.Advance(run);
         done += run;
     }
     for (int side = 0; side < Sides(); ++side) {
         const auto i = static_cast<std::size_t>(side);
-        auto& line = m_lines[i];
+        auto& line = m_delay->lines[i];
         for (int at = done; at < frames[i];) {
             const int run = std::min(frames[i] - at, line.UntilWrap());
-            RunEchoSide(m_sides[i], samples + static_cast<std::ptrdiff_t>(at) * channels + side, channels,
-                        run, line.Here());
+            RunEchoSide(m_delay->sides[i], samples + static_cast<std::ptrdiff_t>(at) * channels + side,
+                        channels, run, line.Here());
             line.Advance(run);
             at += run;
         }

@@ -25,24 +25,7 @@ struct _transform_props {
 };
 static_assert(sizeof(_transform_props) == 96);
 
-// What one side does to its samples: linear factors.
-struct Side {
-    double feedback, echo, wet, dry, output;
-};
-
-// The part of the ring that a side runs through.
-struct Line {
-    float* ring = nullptr;
-    int length = 0, position = 0;
-
-    float* Here() { return ring + position; }
-    // At least 1: a position that a shortened delay left beyond the end is used once before it wraps.
-    int UntilWrap() const { return position < length ? length - position : 1; }
-    void Advance(int frames) {
-        position += frames;
-        if (position >= length) position = 0;
-    }
-};
+struct Delay;
 
 }  // namespace EchoPrivate
 
@@ -94,11 +77,10 @@ private:
 
     EchoPrivate::_transform_props m_settings{};  // shared between the threads
     tWAVEFORMATEX m_format{};
-    std::array<EchoPrivate::Side, 2> m_sides{};
+    std::unique_ptr<EchoPrivate::Delay> m_delay;
     std::unique_ptr<float[]> m_ring;
-    int m_capacity = 0;              // samples the ring can hold
-    std::array<int, 2> m_lengths{};  // delays in samples, both channels counted
-    std::array<EchoPrivate::Line, 2> m_lines{};
+    int m_capacity = 0;                // samples the ring can hold
+    std::array<int, 2> m_lengths{};    // delays in samples, both channels counted
     std::array<int, 2> m_tail_left{};  // frames
 };
 

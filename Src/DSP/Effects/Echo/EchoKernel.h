@@ -8,6 +8,34 @@
 
 namespace Corvo::DSP {
 
+namespace EchoPrivate {
+
+// What one side does to its samples: linear factors.
+struct Side {
+    double feedback, echo, wet, dry, output;
+};
+
+// The part of the ring that a side runs through.
+struct Line {
+    float* ring = nullptr;
+    int length = 0, position = 0;
+
+    float* Here() { return ring + position; }
+    // At least 1: a position that a shortened delay left beyond the end is used once before it wraps.
+    int UntilWrap() const { return position < length ? length - position : 1; }
+    void Advance(int frames) {
+        position += frames;
+        if (position >= length) position = 0;
+    }
+};
+
+struct Delay {
+    std::array<Side, 2> sides{};
+    std::array<Line, 2> lines{};
+};
+
+}  // namespace EchoPrivate
+
 // Both run over samples between two wraps of the ring, so that none reads what another one wrote.
 
 template <typename Sample>

@@ -31,7 +31,7 @@ const MP_PARAMINFO* CorvoEffect::GetParametersInfo() { return TableRecords(); }
 void CorvoEffect::GetSettingsChunk(std::vector<std::uint8_t>& chunk) { WriteChunk(chunk, m_chunk_tag); }
 void CorvoEffect::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) { TakeChunk(chunk, m_chunk_tag); }
 bool CorvoEffect::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
-    return TakeWideChunk(chunk, m_chunk_tag);
+    return TakeChunk(chunk, m_chunk_tag, true);
 }
 
 std::wstring CorvoEffect::GetParamName(int index) {

@@ -3,11 +3,12 @@
 #include <algorithm>
 #include <numeric>
 
+#include "DSP/Effects/Framework/TailRecord.h"
 #include "Platform/DenormalGuard.h"
 
 namespace Corvo::DSP {
 
-CorvoEffectBase::CorvoEffectBase() = default;
+CorvoEffectBase::CorvoEffectBase() : m_tail(std::make_unique<TailRecord>()) {}
 CorvoEffectBase::~CorvoEffectBase() = default;
 
 void CorvoEffectBase::ProcessInternalNoninterleaved(double* const*, int, const tWAVEFORMATEX*,
@@ -68,7 +69,7 @@ CorvoEffectBase::Cook CorvoEffectBase::TakeCook(tWAVEFORMATEX& seen, const tWAVE
 }
 
 bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format) {
-    m_tail = {};
+    *m_tail = {};
     SetMaximumFramesPerBuffer(maxFrames);
     CheckCookProperties(format, true);
     return true;
@@ -77,26 +78,26 @@ bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format)
 void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
-    ProcessInternal(buffer, m_tail.BeginBlock(frames), format, flags);
-    m_tail.EndBlock();
+    ProcessInternal(buffer, m_tail->BeginBlock(frames), format, flags);
+    m_tail->EndBlock();
 }
 
 void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                             ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
-    ProcessInternalNoninterleaved(channels, m_tail.BeginBlock(frames), format, flags);
-    m_tail.EndBlock();
+    ProcessInternalNoninterleaved(channels, m_tail->BeginBlock(frames), format, flags);
+    m_tail->EndBlock();
 }
 
 void CorvoEffectBase::StartTail(std::int64_t maxFrames) {
-    m_tail.frames_limited_to = std::max<std::int64_t>(maxFrames, 0);
+    m_tail->frames_limited_to = std::max<std::int64_t>(maxFrames, 0);
 }
-void CorvoEffectBase::EndTail() { m_tail.frames_limited_to = -1; }
-bool CorvoEffectBase::InTail() const { return m_tail.TailMode(); }
-int CorvoEffectBase::TailFramesProduced() const { return m_tail.frames_produced; }
-bool CorvoEffectBase::TailFinished() const { return m_tail.finished; }
-void CorvoEffectBase::RequestTailRestart() { m_tail.restart_requested = true; }
+void CorvoEffectBase::EndTail() { m_tail->frames_limited_to = -1; }
+bool CorvoEffectBase::InTail() const { return m_tail->TailMode(); }
+int CorvoEffectBase::TailFramesProduced() const { return m_tail->frames_produced; }
+bool CorvoEffectBase::TailFinished() const { return m_tail->finished; }
+void CorvoEffectBase::RequestTailRestart() { m_tail->restart_requested = true; }
 
 void CorvoEffectBase::SetHostCallback(CorvoEffectHostCallback* callback) { m_host_callback = callback; }
 void CorvoEffectBase::NotifyTempoChanged() { MarkStale(); }

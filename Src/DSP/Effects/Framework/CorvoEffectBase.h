@@ -3,12 +3,12 @@
 #include <atomic>
 #include <concepts>
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "DSP/Effects/Framework/ParameterDescription.h"
 #include "DSP/Effects/Framework/ProcessFlags.h"
-#include "DSP/Effects/Framework/TailRecord.h"
 #include "Host/BuiltinEditor.h"
 #include "Host/CorvoEffectHostCallback.h"
 #include "Host/GenericUIData.h"
@@ -22,6 +22,7 @@ namespace Corvo::DSP {
 
 struct EffectTable;
 struct ParameterRow;
+struct TailRecord;
 
 // The contract between the host and every effect.
 //
@@ -263,12 +264,11 @@ protected:
     int RealIndex(int external);
     const MP_PARAMINFO* TableRecords() const;
 
-    // Settings as a whole: stores those of a preset, or of a chunk in today's layout or the oldest one, and
-    // marks the effect stale. False, with nothing changed, when there is no such preset or the chunk does not
-    // fit; the chunk's leading word goes to `leading`.
+    // Settings as a whole: stores those of a preset, or of a chunk in today's layout or the oldest one
+    // (`wide`), and marks the effect stale. False, with nothing changed, when there is no such preset or the
+    // chunk does not fit; the chunk's leading word goes to `leading`.
     bool TakePreset(int preset);
-    bool TakeChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading);
-    bool TakeWideChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading);
+    bool TakeChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading, bool wide = false);
     void WriteChunk(std::vector<std::uint8_t>& chunk, std::int32_t leading) const;
 
     void MarkStale() { m_cook.store(true, std::memory_order_release); }
@@ -305,7 +305,7 @@ protected:
     std::int64_t m_envelope_time = 0;
     // Raised with release after an edit is stored, lowered with acquire before it is read.
     std::atomic<bool> m_cook{true};
-    TailRecord m_tail;
+    std::unique_ptr<TailRecord> m_tail;
     double m_longest_gap = 0.0;  // what LongestGap says; kept by cooks
 
 private:

@@ -16,8 +16,10 @@ std::uint32_t Load(void* settings, const ParameterRow& row) {
 
 }  // namespace
 
-CorvoEffectBase::CorvoEffectBase(const EffectTable& table, void* settings)
-    : m_table(&table), m_words(settings) {}
+CorvoEffectBase::CorvoEffectBase(const EffectTable& table, void* settings) : CorvoEffectBase() {
+    m_table = &table;
+    m_words = settings;
+}
 
 const ParameterRow* CorvoEffectBase::RealRow(int real) const {
     return m_table ? m_table->Row(real) : nullptr;
@@ -173,16 +175,10 @@ bool CorvoEffectBase::TakePreset(int preset) {
     return row != nullptr;
 }
 
-bool CorvoEffectBase::TakeChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading) {
+bool CorvoEffectBase::TakeChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading, bool wide) {
     SettingsWords settings;
-    if (!m_table || !m_table->chunk.Read(chunk, leading, settings)) return false;
-    Store(settings);
-    return true;
-}
-
-bool CorvoEffectBase::TakeWideChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading) {
-    SettingsWords settings;
-    if (!m_table || !m_table->chunk.ReadWide(chunk, leading, settings)) return false;
+    const auto read = wide ? &ChunkLayout::ReadWide : &ChunkLayout::Read;
+    if (!m_table || !(m_table->chunk.*read)(chunk, leading, settings)) return false;
     Store(settings);
     return true;
 }
