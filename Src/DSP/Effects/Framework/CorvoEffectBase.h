@@ -31,8 +31,9 @@ struct TailRecord;
 // running state; destroy.
 //
 // Blocks are processed in place. Buffers are declared as double and hold what the format's
-// wBitsPerSample says: 64 double samples, 32 float samples; every effect says what it does with other widths.
-// Interleaved blocks hold frames * nChannels samples, planar ones are nChannels buffers of `frames`.
+// wBitsPerSample says: doubles at 64, floats at 32 whatever the pointer's type; every effect says what it
+// does with other widths. Interleaved blocks hold frames * nChannels samples, planar ones are nChannels
+// buffers of `frames`.
 //
 // Threads: processing, envelope playback and cooking belong to the audio thread; parameter, text, preset
 // and chunk calls to the user-interface thread. Edits only store a value and raise m_cook, and the next
@@ -71,7 +72,7 @@ public:
     // What the effect is. Any thread, at no cost, unless said otherwise; the answers do not change unless
     // said.
 
-    // False: left and right are always set together. Decides what SeparateLeftRightControls says.
+    // False: the effect has no sides to set apart, and SeparateLeftRightControls says 1.
     virtual bool HasSeparateLeftRightSettings();
     // In frames at the format of InitProcessing: how much later the output is than the input. May change with
     // parameters; ask after InitProcessing and after edits, on the user-interface thread.
@@ -90,7 +91,7 @@ public:
     // The largest block to come. InitProcessing calls it first; an effect only takes note of it here.
     virtual void SetMaximumFramesPerBuffer(int frames);
 
-    // No block is being processed and none follows.
+    // Called when processing has ended.
     virtual ~CorvoEffectBase();
 
     // Re-derives coefficients when they are stale, `force` is set, or the format is not the last one seen.
@@ -120,12 +121,12 @@ public:
 
     // What a control shows at a normalised value, unit included. Empty for an index the effect does not have.
     virtual std::wstring GetParameterFormattedText(int index, double value);  // external index
-    // Without the side of a pair.
+    // The label without its " L" or " R".
     virtual std::wstring GetParamName(int index);       // external index
     virtual std::wstring GetParamUnitsText(int index);  // external index
     // The value last set, 0..1; setting it again changes nothing. 0 for an index the effect does not have.
     virtual float GetParam(int index) = 0;  // external index
-    // As the effect keeps it, in its own units.
+    // The stored value, not normalised; 0 for an index the effect does not have.
     virtual float GetParamPlain(int index) const;  // real index
     virtual int GetParamCountReal() = 0;
     // As the host shows it; different for every effect.
@@ -133,7 +134,7 @@ public:
     // True for pitch correction only, which the host offers under a name of its own.
     virtual bool IsCantrix();
     // Stores the normalised value of an external parameter, both sides of it where it is a pair. Automation
-    // calls it on the audio thread.
+    // calls it on the audio thread, with real indices.
     virtual void SetParam(int index, float normalised, bool fromAutomation);
     virtual int GetParamCount();
     virtual EffectParameterType GetParameterTypeAutomatable(int index);  // external index
@@ -155,7 +156,7 @@ public:
     virtual void SetSidechainBuffer(int bus, double* const* channels);
     // The texts of a list's choices, in order; empty for everything else.
     virtual std::vector<std::string> GetParameterAvailableValues(int index);  // external index
-    // 0 when left and right are joined to one external parameter.
+    // 0: one external parameter stands for the left and the right real one; 1: every real one has its own.
     virtual int SeparateLeftRightControls();
     // True: the host lets its user type a value, which GetParamValueNormalizedFromText reads.
     virtual bool AllowChangeParamFromInputBox(int index);  // external index
@@ -197,22 +198,22 @@ public:
         Process(reinterpret_cast<double*>(buffer), frames, format, flags);
     }
 
-    // Ringing out, on the audio thread and between blocks. When the stream has ended, the host calls
-    // StartTail and goes on with blocks of silence: of each, the first TailFramesProduced() frames are
-    // output and the rest is as it was handed in, until TailFinished(). Then EndTail.
-    //
-    // Echo, chorus and flanger know how long they ring and finish after one pass of their delay line;
-    // with feedback more is left, which ordinary blocks after EndTail bring out. Every other effect fills
-    // all blocks and finishes at the limit only. So the host that wants everything goes on after EndTail,
-    // or sets the limit, until it hears silence.
+    // Ringing out, on the audio thread and between blocks. When the stream has ended:
+    //   1. StartTail, with the most frames that the tail may have;
+    //   2. blocks of silence, of each of which the first TailFramesProduced() frames are output and the rest
+    //   is
+    //      untouched, until TailFinished();
+    //   3. EndTail.
+    // Echo, chorus and flanger know how long one pass of their delay line rings and finish after it; feedback
+    // leaves more, which blocks of silence after EndTail bring out. Every other effect finishes at the limit.
+    // So a host that wants all of it goes on after EndTail until it hears silence.
     void StartTail(std::int64_t maxFrames);  // 0 or below finishes with the next block, without output
     void EndTail();
     bool InTail() const;
     int TailFramesProduced() const;  // of the last block; outside the tail all its frames
     bool TailFinished() const;
-    // With the next block the delay lines run from their first element again, keeping what they hold, and
-    // a whole pass is left to ring. Not needed after InitProcessing, which clears the tail; for a host that
-    // begins another stream without it.
+    // For a host that begins another stream without InitProcessing: the next block starts at the beginning of
+    // the delay lines, which keep what they hold, and a whole pass is left to ring.
     void RequestTailRestart();
 
     void SetHostCallback(CorvoEffectHostCallback* callback);  // not owned; null for none

@@ -41,8 +41,8 @@ std::vector<PresetRow> PresetsOf(const Presets& presets) {
 struct ChunkLayout {
     std::size_t words;
     bool leadingWord = true;
-    // Older layouts, which lack words that are 0 then: one of exactly `wordsBefore` words, and one of
-    // `wideWords` words of 8 bytes, of which the low half comes first and counts. 0: there was none.
+    // Older layouts, 0 where there was none: chunks of exactly `wordsBefore` words, and chunks of `wideWords`
+    // words of 8 bytes each, of which the first 4 count. Words that they lack are 0.
     std::size_t wordsBefore = 0, wideWords = 0;
 
     int Size() const { return static_cast<int>(Size(words, 4)); }
@@ -66,13 +66,13 @@ struct Pad {
     std::vector<int> x, y;
 };
 
-// What GetParamSectionInfo calls a parameter: nothing, its label, or its label without the side.
+// The name that GetParamSectionInfo gives a parameter: none, its label, or its label without the side.
 enum class SectionLabel { None, Whole, WithoutSide };
 
-// The rows as the system's records, their texts cut to the records' fields.
+// The rows as records of the system, texts cut to the length of their fields.
 std::vector<MP_PARAMINFO> RecordsOf(std::span<const ParameterRow> rows, MP_CAPS caps);
 
-// Everything that is said of an effect rather than computed by it. Made once, when the first instance is, and
+// All that is constant about an effect. Made once, when the first instance is, and
 // there for the life of the library; the rows are static data of the effect.
 struct EffectTable {
     std::string name, image{}, icon{};

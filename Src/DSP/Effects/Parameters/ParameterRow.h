@@ -20,8 +20,7 @@ constexpr float Limited(float value, float limit = 1.0f) {
     return value > 0.0f ? (value < limit ? value : limit) : 0.0f;
 }
 
-// How the normalised value of a parameter is kept in a 32-bit word of the settings: three functions over the
-// bits of that word and, for those that are linear, two numbers.
+// How the normalised value of a parameter is kept in a 32-bit word of the settings. Linear ones use `map`.
 struct Storage {
     using Store = std::uint32_t (*)(const Storage&, float normalised);
     using Plain = float (*)(std::uint32_t word);
@@ -51,8 +50,8 @@ constexpr Storage::Storage(float span, float floor)
       }),
       map{span, floor} {}
 
-// The normalised value that `map` makes `wanted` of, close to `guess`: the division may have rounded to a
-// neighbour of it.
+// A normalised value n close to `guess` with map(n, span) == wanted: the division that gave the guess may
+// have rounded to its neighbour.
 float Inverse(float (*map)(float n, float span), float span, float wanted, float guess);
 
 // A float: n * span.
@@ -67,7 +66,7 @@ constexpr Storage RealWord(float span) {
             span};
 }
 
-// An integer that is 1 from the middle of the control up, else 0.
+// An integer: 1 from 0.5 up, else 0.
 constexpr Storage SwitchWord() {
     return {[](const Storage&, float n) { return std::uint32_t{n >= 0.5f}; }, PlainOfInteger,
             [](const Storage&, std::uint32_t word) { return word != 0 ? 1.0f : 0.0f; }};
@@ -84,13 +83,13 @@ struct Choice {
 struct Shown {
     std::wstring (*text)(const ParameterRow&, double normalised);
     float (*read)(const ParameterRow&, const std::string& text);
-    double step = 1.0;  // of the number shown, per unit of the stored value
+    double step = 1.0;  // number shown = stored value * step
     int decimals = 0;
-    std::int32_t silent = 0;  // tenths of a decibel shown as "-Inf."
+    std::int32_t silent = 0;  // "-Inf." at or below so many tenths of a decibel
     std::span<const Choice> choices{};
 };
 
-// What a host's generic controls span.
+// The range of a host's generic controls, in plain values.
 struct PlainRange {
     float minimum = 0.0f, maximum = 1.0f, neutral = 0.5f;
 };
@@ -109,7 +108,7 @@ struct ParameterRow {
     PlainRange range{};
 };
 
-// Which word of a record a field, or one side of a pair, is.
+// The place of the word that holds a field, or one side of a pair: word i of a numbered record is i.
 template <typename Record>
 consteval Record Numbered() {
     std::array<std::int32_t, sizeof(Record) / 4> words;
