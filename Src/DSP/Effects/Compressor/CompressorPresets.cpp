@@ -56,7 +56,7 @@ public:
     }
 
     // A point per octave where output equals input. At powers of two the curve's arithmetic is exact, so
-    // the gain is 1 to the last bit; with none, a curve that glides there would lose its shape at once.
+    // the gain is 1 to the last bit.
     void Unity(double fromLevel, double toLevel) {
         for (int octave = kUnityOctaves; octave >= 0; --octave)
             if (const double level = std::ldexp(1.0, -octave); level > fromLevel && level < toLevel)

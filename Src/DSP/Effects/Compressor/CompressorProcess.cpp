@@ -61,9 +61,7 @@ void Compressor::InitState(bool forced) {
         }
     }
 
-    if (audio.map.SetOutFor(curves, smoothing))
-        for (std::size_t channel = 0; channel < 2; ++channel)
-            audio.state.segment[channel] = audio.map.SegmentAt(channel, audio.state.envelope[channel]);
+    if (audio.map.SetOutFor(curves, smoothing)) audio.FindSegments();
     if (otherSmoothing) audio.map.framesLeft = GlideFrames(audio.map.factor, smoothing);
     if (c.outGain != outGainBefore || (otherSmoothing && audio.gainFramesLeft > 0))
         audio.gainFramesLeft = GlideFrames(1.0, smoothing);
@@ -187,7 +185,10 @@ void Compressor::RunPiece(Sample* block, const Sample* const* detector, int dete
         ParameterSmoother gliding(audio.map, audio.coefficients.parameterSmoothing);
         withGains(gliding);
         audio.map.factor = gliding.Factor();
-        if ((audio.map.framesLeft -= frames) == 0) audio.map.Arrive();
+        if ((audio.map.framesLeft -= frames) == 0) {
+            audio.map.Arrive();
+            audio.FindSegments();
+        }
     }
 }
 
