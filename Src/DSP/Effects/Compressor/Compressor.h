@@ -51,8 +51,9 @@ struct CoreState;
 // soft knee keeps its width, and a value that the curve shows already changes nothing. Texts and GetParam are
 // read from each side's own curve. A ratio between two steps reads as the lowest step with the same text.
 //
-// Side-chain: bus 0. The block after SetSidechainBuffer takes its detector signal from there; a mono
-// side-chain serves both channels. A null buffer, or none, means the block itself.
+// Side-chain: bus 0. The block after SetSidechainBuffer takes its detector signal from there. A mono
+// side-chain serves both channels; a mono block listens to the mean of a stereo one. A null buffer, or none,
+// means the block itself.
 //
 // Threads: the user-interface thread edits its own copy of the settings under a critical section and
 // publishes it whole; the audio thread takes the newest at the next block and neither waits, allocates nor

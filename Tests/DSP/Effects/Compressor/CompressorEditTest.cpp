@@ -163,3 +163,38 @@ TEST(CompressorEdit, FirstEditsDoNotStep) {
         }
     }
 }
+
+// Catches a mono block that hears one channel of its side-chain only.
+TEST(CompressorEdit, AMonoBlockFollowsTheMeanOfAStereoSideChain) {
+    const auto format = Format<float>(1);
+    constexpr int kFrames = 4000;
+    std::vector<float> full(kFrames, 1.0f), silent(kFrames, 0.0f), opposite(kFrames, -1.0f);
+    struct Case {
+        std::vector<float>*left, *right;
+        double gain;  // in dB, under a limiter at -20 dB
+        float monitored;
+    } const cases[] = {{&silent, &full, -13.979, 0.5f},
+                       {&full, &silent, -13.979, 0.5f},
+                       {&full, &opposite, -20.0, 0.0f},
+                       {&silent, &silent, 0.0, 0.0f}};
+    for (const auto& c : cases)
+        for (const bool monitor : {false, true}) {
+            Compressor effect;
+            effect.SetPreset(0);
+            SetBoth(effect, kThreshold, ThresholdPosition(-200));
+            SetBoth(effect, kRatio, 1.0f);
+            SetBoth(effect, kStereoLink, 0.0f);
+            SetBoth(effect, kMonitor, monitor ? 1.0f : 0.0f);
+            effect.SetSidechainBusNumChannels(0, 2);
+            effect.InitProcessing(kFrames, &format);
+            double* const channels[] = {reinterpret_cast<double*>(c.left->data()),
+                                        reinterpret_cast<double*>(c.right->data())};
+            effect.SetSidechainBuffer(0, channels);
+            std::vector<float> block(kFrames, 0.001f);
+            ProcessBlock(effect, block.data(), kFrames, format);
+            if (monitor)
+                EXPECT_EQ(block.back(), c.monitored);
+            else
+                EXPECT_NEAR(Decibels(block.back() / 0.001), c.gain, 0.05);
+        }
+}
