@@ -79,6 +79,17 @@ TEST(CompressorEdit, ADrawnBendMovesAlong) {
     }
 }
 
+// Catches a gate that is lost when the knee that pushed it down goes up again.
+TEST(CompressorEdit, APushedGateStaysWhereItWasPushed) {
+    Compressor effect;
+    effect.SetPreset(5);  // gate at -48 dB, 5 dB per dB
+    for (const int tenths : {-600, -100}) SetBoth(effect, kThreshold, ThresholdPosition(tenths));
+    const auto gains = SteadyGains(effect, {-66.0, -58.0, -12.0});
+    EXPECT_NEAR(gains[0], -24.0, 0.1);
+    EXPECT_NEAR(gains[1], 0.0, 0.1);
+    EXPECT_NEAR(gains[2], 0.0, 0.1);
+}
+
 // Catches controls that read back another position than they were set to, or than the curve's text; and one
 // that redraws the curve when it is written back.
 TEST(CompressorEdit, WritingBackChangesNothing) {
