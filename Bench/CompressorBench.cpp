@@ -9,7 +9,7 @@ namespace {
 
 using Corvo::DSP::Compressor;
 
-enum Glide { kStanding, kCurve, kGain, kBoth };
+enum Glide { kStanding, kCurve, kGain, kBoth, kMerged };
 
 // The left parameters of threshold, ratio and out gain; the right ones follow.
 constexpr int kOutGain = 4, kThreshold = 6, kRatio = 8, kStereoLink = 10;
@@ -19,7 +19,8 @@ void SetBoth(Compressor& compressor, int index, float value) {
     compressor.SetParam(index + 1, value, false);
 }
 
-// Blocks of noise while nothing glides, or while edits keep the curve or the out gain on their way.
+// Blocks of noise while nothing glides, while edits keep the curve or the out gain on their way, or while
+// presets of other points do: then the curve has the points of both.
 template <typename Sample>
 void BM_Compressor(benchmark::State& state) {
     const auto frames = static_cast<int>(state.range(0));
@@ -37,8 +38,9 @@ void BM_Compressor(benchmark::State& state) {
         // A glide lasts half a second, so an edit every 32 blocks of 512 keeps it going.
         if (glide != kStanding && round++ % 32 == 0) {
             const float value = round % 64 < 32 ? 0.6f : 0.7f;
-            if (glide != kGain) SetBoth(compressor, kThreshold, value);
-            if (glide != kCurve) SetBoth(compressor, kOutGain, value);
+            if (glide == kMerged) compressor.SetPreset(round % 64 < 32 ? 1 : 13);
+            if (glide == kCurve || glide == kBoth) SetBoth(compressor, kThreshold, value);
+            if (glide == kGain || glide == kBoth) SetBoth(compressor, kOutGain, value);
         }
         compressor.Process(reinterpret_cast<double*>(block.Fresh()), frames, &format, flags);
         benchmark::ClobberMemory();
@@ -48,6 +50,7 @@ void BM_Compressor(benchmark::State& state) {
 BENCHMARK_TEMPLATE(BM_Compressor, float)
     ->ArgNames({"", "linked", "glide"})
     ->ArgsProduct({{512}, {0, 1}, {kStanding, kCurve, kGain, kBoth}})
+    ->Args({512, 1, kMerged})
     ->Args({64, 1, kStanding});
 BENCHMARK_TEMPLATE(BM_Compressor, double)
     ->ArgNames({"", "linked", "glide"})

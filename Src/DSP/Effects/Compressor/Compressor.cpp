@@ -27,6 +27,7 @@ constexpr std::int32_t kHighestOutGain = 200;  // tenths of a decibel
 constexpr int kDefaultPreset = 1;
 constexpr int kChunkSize = 16112;
 constexpr double kHighestRatioShown = 100.0;
+constexpr double kSameSlope = 0.01 / kRatioSteps;
 
 Pair PairOf(int index) { return static_cast<Pair>(index / 2); }
 std::size_t SideOf(int index) { return static_cast<std::size_t>(index % 2); }
@@ -34,31 +35,43 @@ std::size_t SideOf(int index) { return static_cast<std::size_t>(index % 2); }
 std::int32_t Tenths(double db) { return static_cast<std::int32_t>(std::lround(db * 10.0)); }
 std::int32_t Hundredths(double ms) { return static_cast<std::int32_t>(std::lround(ms * 100.0)); }
 
-double RatioOf(const TransferCurve& curve) {
-    const double slope = curve.SlopeAboveThreshold();
-    return std::abs(slope) * kHighestRatioShown < 1.0 ? std::numeric_limits<double>::infinity() : 1.0 / slope;
+// The ratio of a slope as it is shown: cut to tenths, infinite beyond what can be shown.
+double RatioShown(double slope) {
+    // Ratios are read from points in single precision; a hundredth of the last digit makes up for that.
+    constexpr double kTolerance = 0.01;
+    const double ratio = 1.0 / slope;
+    if (!(std::abs(ratio) <= kHighestRatioShown)) return std::numeric_limits<double>::infinity();
+    return std::trunc(ratio * 10.0 + std::copysign(kTolerance, ratio)) / 10.0;
 }
 
 std::wstring RatioText(const TransferCurve& curve) {
-    const double ratio = RatioOf(curve);
-    // Ratios are read from points in single precision; a hundredth of the last digit makes up for that.
-    constexpr double kTolerance = 0.01;
-    if (!(std::abs(ratio) <= kHighestRatioShown + kTolerance)) return L"Inf.:1";
-    return FormatFixed(std::trunc(ratio * 10.0 + std::copysign(kTolerance, ratio)) / 10.0, 1) + L":1";
+    const double ratio = RatioShown(curve.SlopeAboveThreshold());
+    return std::isinf(ratio) ? L"Inf.:1" : FormatFixed(ratio, 1) + L":1";
 }
 
-std::int32_t RatioStepOf(const TransferCurve& curve) {
-    const double step = (1.0 - curve.SlopeAboveThreshold()) * kRatioSteps;
-    return static_cast<std::int32_t>(std::lround(std::clamp(step, 0.0, static_cast<double>(kRatioSteps))));
-}
-
-// The lowest step whose text is this ratio, cut to tenths.
-std::int32_t RatioStepFromText(std::string_view text) {
-    const double ratio = ParseNumber(text);
+// The lowest step whose text is this ratio, rounded to tenths.
+std::int32_t LowestRatioStep(double ratio) {
     if (!(ratio > 1.0)) return 0;
     if (ratio > kHighestRatioShown) return kRatioSteps;
     const double step = kRatioSteps - 10.0 * kRatioSteps / std::round(ratio * 10.0);
     return static_cast<std::int32_t>(std::ceil(step - 1e-6));
+}
+
+// The step that drew the curve; for any other curve the lowest one that shows its text. One that falls counts
+// as flat.
+std::int32_t RatioStepOf(const TransferCurve& curve) {
+    const double slope = curve.SlopeAboveThreshold(), ratio = RatioShown(slope);
+    if (ratio < 0.0) return kRatioSteps;
+    const auto nearest =
+        static_cast<std::int32_t>(std::lround((1.0 - std::clamp(slope, 0.0, 1.0)) * kRatioSteps));
+    const bool drawn =
+        std::abs(slope - SlopeOfStep(nearest)) < kSameSlope && RatioShown(SlopeOfStep(nearest)) == ratio;
+    return drawn ? nearest : LowestRatioStep(ratio);
+}
+
+// Where the threshold's control stands.
+std::int32_t ThresholdOf(const TransferCurve& curve) {
+    return std::clamp(curve.ThresholdTenths(), kLowestThreshold, kHighestThreshold);
 }
 
 std::wstring TimeText(const ParameterRow& row, double normalised) {
@@ -75,7 +88,7 @@ float ReadTime(const ParameterRow& row, const std::string& text) {
 constexpr Shown Milliseconds(int decimals) { return {TimeText, ReadTime, 0.01, decimals}; }
 // Threshold and ratio are shown as they stand in the curve, by the effect.
 constexpr Shown kRatioShown{nullptr, [](const ParameterRow& row, const std::string& text) {
-                                return row.storage.map.Normalised(RatioStepFromText(text));
+                                return row.storage.map.Normalised(LowestRatioStep(ParseNumber(text)));
                             }};
 
 // Both sides of a switch are one word.
@@ -241,25 +254,27 @@ void Compressor::SetParamInternal(int index, float normalised, Parameters& param
     }
 }
 
+// A threshold or ratio that the curve shows already leaves it alone: no control is as fine as a curve.
 void Compressor::AdjustThreshold(std::int32_t tenths, std::size_t channel, CompMapStereo* map) {
     auto& m_comp_map = (map ? *map : m_ui->edited.settings.map).m_comp_map;
     if (channel >= m_comp_map.size()) return;
-    m_comp_map[channel].MoveThreshold(std::clamp(tenths, kLowestThreshold, kHighestThreshold));
+    tenths = std::clamp(tenths, kLowestThreshold, kHighestThreshold);
+    if (auto& curve = m_comp_map[channel]; tenths != ThresholdOf(curve)) curve.MoveThreshold(tenths);
 }
 
 void Compressor::AdjustRatio(std::int32_t step, std::size_t channel, CompMapStereo* map) {
     auto& m_comp_map = (map ? *map : m_ui->edited.settings.map).m_comp_map;
     if (channel >= m_comp_map.size()) return;
-    m_comp_map[channel].SetRatioStep(std::clamp(step, 0, kRatioSteps));
+    step = std::clamp(step, 0, kRatioSteps);
+    if (auto& curve = m_comp_map[channel]; step != RatioStepOf(curve)) curve.SetRatioStep(step);
 }
 
 void Compressor::ApplyRatioToMap(CompMapStereo* map) {
-    constexpr double kSameRatio = 0.01 / kRatioSteps;
     auto& curves = map ? *map : m_ui->edited.settings.map;
     const auto step = curves.last_ratio_step;
     if (step == kNotSet) return;
     for (std::size_t channel = 0; channel < 2; ++channel)
-        if (std::abs(curves.m_comp_map[channel].SlopeAboveThreshold() - SlopeOfStep(step)) < kSameRatio)
+        if (std::abs(curves.m_comp_map[channel].SlopeAboveThreshold() - SlopeOfStep(step)) < kSameSlope)
             AdjustRatio(step, channel, map);
 }
 
@@ -270,12 +285,8 @@ float Compressor::GetParam(int index) {
     ApplyEnvelopeToUi();
     auto& [parameters, map] = m_ui->edited.settings;
     const auto& curve = map.m_comp_map[SideOf(index)];
-    if (PairOf(index) == kThreshold)
-        return row->storage.map.Normalised(map.last_threshold != kNotSet ? map.last_threshold
-                                                                         : curve.ThresholdTenths());
-    if (PairOf(index) == kRatio)
-        return row->storage.map.Normalised(map.last_ratio_step != kNotSet ? map.last_ratio_step
-                                                                          : RatioStepOf(curve));
+    if (PairOf(index) == kThreshold) return row->storage.map.Normalised(ThresholdOf(curve));
+    if (PairOf(index) == kRatio) return row->storage.map.Normalised(RatioStepOf(curve));
     const auto word = WordOf(parameters, *row);
     return row->storage.normalised(row->storage, PairOf(index) == kMonitor ? word & kMonitorFlag : word);
 }

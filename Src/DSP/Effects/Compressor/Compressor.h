@@ -47,12 +47,13 @@ struct CoreState;
 // switch "Stereo Link", "Auto Make-up Gain" (full scale comes out at full scale, +40 dB at most) and "Monitor
 // sidechain" (the detector's signal is the output).
 //
-// Threshold and ratio are edits of the curve: above the threshold it becomes a straight line in decibels,
-// so a soft knee turns hard. Their texts are read from the curve. GetParam gives the last value set, which
-// both sides share, and reads the curve when none was set since the last preset.
+// Threshold and ratio are edits of the curve: above the threshold it becomes a straight line in decibels, a
+// soft knee keeps its width, and a value that the curve shows already changes nothing. Texts and GetParam are
+// read from each side's own curve. A ratio between two steps reads as the lowest step with the same text.
 //
-// Side-chain: bus 0. The block after SetSidechainBuffer takes its detector signal from there; a mono
-// side-chain serves both channels. A null buffer, or none, means the block itself.
+// Side-chain: bus 0. The block after SetSidechainBuffer takes its detector signal from there. A mono
+// side-chain serves both channels; a mono block listens to the mean of a stereo one. A null buffer, or none,
+// means the block itself.
 //
 // Threads: the user-interface thread edits its own copy of the settings under a critical section and
 // publishes it whole; the audio thread takes the newest at the next block and neither waits, allocates nor
@@ -99,8 +100,7 @@ public:
     void SetParamInternal(int index, float normalised, Parameters& parameters, CompMapStereo* map);
     void AdjustThreshold(std::int32_t tenths, std::size_t channel, CompMapStereo* map);
     void AdjustRatio(std::int32_t step, std::size_t channel, CompMapStereo* map);
-    // Draws the line above the threshold afresh on every channel that has the ratio last set, so that it
-    // does not drift however often the threshold moves.
+    // Sees to it that the channels which have the ratio last set show it still after the threshold moved.
     void ApplyRatioToMap(CompMapStereo* map);
 
     // The settings of a preset, of the nearest one for a number out of range.

@@ -6,59 +6,12 @@
 #include <limits>
 #include <xsimd/xsimd.hpp>
 
-#include "DSP/Effects/Compressor/CompressorCurve.h"
+#include "DSP/Effects/Compressor/CompressorGlide.h"
 
 namespace Corvo::DSP::CompressorPrivate {
 
 // Left and right, or one channel twice: two doubles in the register that both targets have.
 using Lanes = xsimd::batch<double, xsimd::sse2>;
-
-// A curve on the audio thread: where its points are going, and how far each was from there when it set out.
-// All glide alike, so one factor that shrinks every frame tells where they are: target + factor * offset.
-struct GlidingCurve {
-    using Values = std::array<double, TransferCurve::kMaxPoints>;
-    Values x{}, y{}, offsetX{}, offsetY{};
-    Values slope{};  // between the targets
-    int count = 0;
-
-    double X(int i, double factor) const { return Value(x, offsetX, i, factor); }
-    double Y(int i, double factor) const { return Value(y, offsetY, i, factor); }
-    // The segment that holds an input level, and the output level there, the points being where `factor`
-    // says.
-    int SegmentAt(double level, double factor) const;
-    double LevelAt(double level, double factor) const;
-
-private:
-    static double Value(const Values& target, const Values& offset, int i, double factor) {
-        const auto at = static_cast<std::size_t>(i);
-        return target[at] + factor * offset[at];
-    }
-};
-
-// Frames until a one-pole glide with `factor` of its way to go has 1e-14 to go: far below anything audible.
-int GlideFrames(double factor, double smoothing);
-
-// Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
-// targets exactly.
-struct GlidingMap {
-    std::array<GlidingCurve, 2> m_comp_map;
-    double factor = 0.0;
-    int framesLeft = 0;
-
-    // Sets out for new curves from wherever the points are; nothing changes when these are the targets
-    // already. A curve with another number of points is read off at the new points' places first. True
-    // when any channel's points were replaced that way, so that the segments must be found afresh.
-    bool SetOutFor(const CompMapStereo& target, double smoothing);
-    // Stands on the targets at once.
-    void Arrive();
-    // The segment that holds `level`.
-    int SegmentAt(std::size_t channel, double level) const {
-        return m_comp_map[channel].SegmentAt(level, factor);
-    }
-
-private:
-    GlidingCurve::Values m_levels{};  // of a curve that is being replaced
-};
 
 struct CoreCoefficients {
     std::array<double, 2> attack{}, release{}, outGain{};

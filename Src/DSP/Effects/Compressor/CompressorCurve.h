@@ -27,6 +27,9 @@ struct CurvePoint {
 // and is marked by its point standing twice. A curve without the mark (drawn by hand) has its threshold
 // where its topmost straight line begins, and at x = 1 when that line is unity.
 //
+// A knee is hard, or soft: a parabola in decibels centred on the threshold, from unity to the line. An edit
+// doubles the point where a soft knee begins, so that its width is known when the ratio is 1 as well.
+//
 // Operations allocate nothing and run on either thread, on that thread's own curve.
 struct DSP_API TransferCurve {
     static constexpr std::size_t kMaxPoints = 666;
@@ -50,8 +53,8 @@ struct DSP_API TransferCurve {
     // Decibels out per decibel in, above the threshold; the ratio is its reciprocal.
     double SlopeAboveThreshold() const;
 
-    // Moves the knee and keeps the slope above it and what lies below: a gate stays where it is, or is
-    // pushed down whole by a knee that meets it. The knee is hard afterwards.
+    // Moves the knee and keeps its width, the slope above it and what lies below: a gate stays where it is,
+    // or is pushed down whole by a knee that meets it. A bend of another shape moves along as it is.
     void MoveThreshold(std::int32_t tenths);
     // Turns the part above the knee. A curve without a threshold gets one at its highest setting.
     void SetRatioStep(std::int32_t step);
@@ -59,8 +62,15 @@ struct DSP_API TransferCurve {
     bool operator==(const TransferCurve& other) const;
 
 private:
-    void Redraw(float knee, double slope);
+    struct Knee;
+    Knee FindKnee() const;
+    void Redraw(const Knee& knee, float threshold, double slope);
+    void KeepBelow(std::size_t unityBegin, double highest);
+    double KeepDetached(const Knee& knee, float threshold);
 };
+
+// How far above the start of a knee of this width, whose middle is at 0: a parabola, then straight.
+double KneeRamp(double distance, double width);
 
 // The curves of both channels and the edits last made to them.
 struct CompMapStereo {

@@ -17,21 +17,13 @@ constexpr int kUnityOctaves = 15;
 
 double Level(double db) { return std::exp(db / kDbPerNeper); }
 
-// How far above the start of a knee of this width, whose middle is at 0: a parabola, then straight.
-double Ramp(double distance, double width) {
-    if (distance <= -width / 2.0) return 0.0;
-    if (distance >= width / 2.0) return distance;
-    const double into = distance + width / 2.0;
-    return into * into / (2.0 * width);
-}
-
 double OutputDb(const CompressorPreset& preset, double inputDb) {
     double output = inputDb;
     if (preset.ratio != 1.0)
-        output += (1.0 / preset.ratio - 1.0) * Ramp(inputDb - preset.threshold, preset.knee);
+        output += (1.0 / preset.ratio - 1.0) * KneeRamp(inputDb - preset.threshold, preset.knee);
     const auto& gate = preset.gate;
     if (gate.range > 0.0)
-        output -= std::min((gate.slope - 1.0) * Ramp(gate.threshold - inputDb, gate.knee), gate.range);
+        output -= std::min((gate.slope - 1.0) * KneeRamp(gate.threshold - inputDb, gate.knee), gate.range);
     return output;
 }
 
@@ -56,7 +48,7 @@ public:
     }
 
     // A point per octave where output equals input. At powers of two the curve's arithmetic is exact, so
-    // the gain is 1 to the last bit; with none, a curve that glides there would lose its shape at once.
+    // the gain is 1 to the last bit.
     void Unity(double fromLevel, double toLevel) {
         for (int octave = kUnityOctaves; octave >= 0; --octave)
             if (const double level = std::ldexp(1.0, -octave); level > fromLevel && level < toLevel)

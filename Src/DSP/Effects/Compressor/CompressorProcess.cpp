@@ -61,9 +61,7 @@ void Compressor::InitState(bool forced) {
         }
     }
 
-    if (audio.map.SetOutFor(curves, smoothing))
-        for (std::size_t channel = 0; channel < 2; ++channel)
-            audio.state.segment[channel] = audio.map.SegmentAt(channel, audio.state.envelope[channel]);
+    if (audio.map.SetOutFor(curves, smoothing)) audio.FindSegments();
     if (otherSmoothing) audio.map.framesLeft = GlideFrames(audio.map.factor, smoothing);
     if (c.outGain != outGainBefore || (otherSmoothing && audio.gainFramesLeft > 0))
         audio.gainFramesLeft = GlideFrames(1.0, smoothing);
@@ -147,9 +145,10 @@ void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
             std::array<Sample, kMonitorPiece * MaxNumChannels> copy;
             std::copy_n(output, piece * channels, copy.begin());
             RunPiece(copy.data(), from.data(), stride, piece, channels);
-            if (sideChain)
-                for (int i = 0; i < piece * channels; ++i)
-                    output[i] = from[static_cast<std::size_t>(i % channels)][i / channels];
+            if (sideChain && channels == 1)
+                for (int i = 0; i < piece; ++i) output[i] = (from[0][i] + from[1][i]) * Sample(0.5);
+            else if (sideChain)
+                for (int i = 0; i < piece * 2; ++i) output[i] = from[static_cast<std::size_t>(i % 2)][i / 2];
         } else {
             RunPiece(output, from.data(), stride, piece, channels);
         }
@@ -163,7 +162,9 @@ template <typename Sample>
 void Compressor::RunPiece(Sample* block, const Sample* const* detector, int detectorStride, int frames,
                           int channels) {
     auto& audio = *m_audio;
-    const bool linked = channels == 2 && audio.current.settings.parameters.stereoLink != 0;
+    // One channel under two detectors follows their mean.
+    const bool linked =
+        channels == 2 ? audio.current.settings.parameters.stereoLink != 0 : audio.sideChainChannels == 2;
     const auto run = [&](auto& parameters, auto gains) {
         if (linked)
             return ProcessStereoLinked(block, detector[1], detector[0], frames, channels, detectorStride,
@@ -187,7 +188,10 @@ void Compressor::RunPiece(Sample* block, const Sample* const* detector, int dete
         ParameterSmoother gliding(audio.map, audio.coefficients.parameterSmoothing);
         withGains(gliding);
         audio.map.factor = gliding.Factor();
-        if ((audio.map.framesLeft -= frames) == 0) audio.map.Arrive();
+        if ((audio.map.framesLeft -= frames) == 0) {
+            audio.map.Arrive();
+            audio.FindSegments();
+        }
     }
 }
 

@@ -40,6 +40,12 @@ struct AudioSide {
     int gainFramesLeft = 0;  // of the out gain's glide
     std::array<double*, 2> sideChain{};
     int sideChainChannels = 0;  // 0: none was handed over for this block
+
+    // Where the curves have other points than before.
+    void FindSegments() {
+        for (std::size_t channel = 0; channel < 2; ++channel)
+            state.segment[channel] = map.SegmentAt(channel, state.envelope[channel]);
+    }
 };
 
 // The ways across, and the single values that both sides see.

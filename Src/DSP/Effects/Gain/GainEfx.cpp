@@ -49,21 +49,32 @@ constexpr Storage kGainHalves{
     [](const Storage&, float n) { return std::bit_cast<std::uint32_t>(GainPlain(n)); }, PlainOfReal,
     [](const Storage&, std::uint32_t word) { return GainNormalised(PlainOfReal(word)); }};
 
-std::wstring GainText(float plain) {
-    const double tenths = std::log10(static_cast<double>(plain)) * 200.0;
-    // Text of NaN and of anything at or below the floor; the cast would be undefined.
-    if (!(tenths > kSilentTenths - 1)) return FormatTenthsOfDb(kSilentTenths, kSilentTenths);
-    return FormatTenthsOfDb(static_cast<std::int32_t>(std::min(tenths, 1e6)), kSilentTenths);
+// As shown: cut towards 0 dB.
+std::int32_t GainTenths(double tenths) {
+    // NaN and anything at or below the floor; the cast would be undefined.
+    if (!(tenths > kSilentTenths - 1)) return kSilentTenths;
+    return static_cast<std::int32_t>(std::min(tenths, 1e6));
+}
+std::int32_t GainTenthsOf(float plain) { return GainTenths(std::log10(static_cast<double>(plain)) * 200.0); }
+
+// A tenth of a decibel lies on the edge of what shows it, so that rounding may lead to its neighbour: then
+// the next position that shows it, away from 0 dB.
+float GainPosition(double db) {
+    const double tenths = db * 10.0;
+    const std::int32_t wanted = GainTenths(tenths + std::copysign(1e-4, tenths));  // `db` is rounded as well
+    float n = GainNormalised(static_cast<float>(std::pow(10.0, db * 0.05)));
+    if (wanted == kSilentTenths) return n;
+    const float end = wanted < 0 ? 0.0f : 1.0f;
+    while (n != end && std::abs(GainTenthsOf(GainPlain(n))) < std::abs(wanted)) n = std::nextafter(n, end);
+    return n;
 }
 
 // The texts show what is stored, whatever value the host asks for; GainEfx hands it over.
 constexpr Shown kGainShown{
     [](const ParameterRow& row, double plain) {
-        return WithUnit(GainText(static_cast<float>(plain)), row.unit);
+        return WithUnit(FormatTenthsOfDb(GainTenthsOf(static_cast<float>(plain)), kSilentTenths), row.unit);
     },
-    [](const ParameterRow&, const std::string& text) {
-        return GainNormalised(static_cast<float>(std::pow(10.0, ParseNumber(text) * 0.05)));
-    }};
+    [](const ParameterRow&, const std::string& text) { return GainPosition(ParseNumber(text)); }};
 
 float ReadPlain(const ParameterRow& row, const std::string& text) {
     return row.storage.normalised(row.storage, std::bit_cast<std::uint32_t>(ParseNumber(text)));

@@ -64,6 +64,7 @@ TEST(CompressorCurve, FollowsThresholdAndRatio) {
     for (const int tenths : {-800, -613, -400, -155, -10})
         for (const int step : {0, 40, 125, 188, 240, 251}) {
             Compressor effect;
+            effect.SetPreset(2);  // a hard knee
             SetBoth(effect, kThreshold, ThresholdPosition(tenths));
             SetBoth(effect, kRatio, RatioPosition(step));
             effect.SetParam(kAttack, TimePosition(100), false);

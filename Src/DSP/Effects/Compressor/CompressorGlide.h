@@ -1,0 +1,82 @@
+#pragma once
+
+#include <array>
+#include <cstddef>
+
+#include "DSP/Effects/Compressor/CompressorCurve.h"
+
+namespace Corvo::DSP::CompressorPrivate {
+
+// A curve on the audio thread: where its points are going, and how far each was from there when it set out.
+// All glide alike, so one factor that shrinks every frame tells where they are: target + factor * offset.
+// On the way there may be points that the target does not have: corners of what was heard before.
+struct GlidingCurve {
+    // Room for the points of what is heard and of a new target.
+    static constexpr std::size_t kRoom = 2 * TransferCurve::kMaxPoints;
+    using Values = std::array<double, kRoom>;
+    Values x{}, y{}, offsetX{}, offsetY{};
+    Values place{};  // on the target: the number of its point, and how far on to the next one
+    Values slope{};  // of the segments, once the points stand
+    int count = 0;
+
+    double X(int i, double factor) const { return Value(x, offsetX, i, factor); }
+    double Y(int i, double factor) const { return Value(y, offsetY, i, factor); }
+    // The segment that holds an input level, the points being where `factor` says.
+    int SegmentAt(double level, double factor) const;
+
+private:
+    static double Value(const Values& target, const Values& offset, int i, double factor) {
+        const auto at = static_cast<std::size_t>(i);
+        return target[at] + factor * offset[at];
+    }
+};
+
+// A curve as it is heard at one moment.
+struct HeardCurve {
+    GlidingCurve::Values x{}, y{};
+    std::size_t count = 0;
+
+    void Add(double level, double output);
+    // The output level for an input level that is at the point `next`, or between it and the one before.
+    double LevelAt(double level, std::size_t next) const;
+    // Drops points that lie almost on the line between those that stay, until at most `most` are left: with
+    // the smallest error that does it, up to 0.1 dB. A curve that would need more is a saw of hundreds of
+    // teeth; it loses every second point.
+    void Thin(std::size_t most);
+
+private:
+    void DropWithin(double tolerance);
+    void Move(std::size_t from, std::size_t to);
+};
+
+// Frames until a one-pole glide with `factor` of its way to go has 1e-14 to go: far below anything audible.
+int GlideFrames(double factor, double smoothing);
+
+// Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
+// targets exactly.
+struct GlidingMap {
+    std::array<GlidingCurve, 2> m_comp_map;
+    double factor = 0.0;
+    int framesLeft = 0;
+
+    // Sets out for new curves from wherever the points are; nothing changes when these are the targets
+    // already. What is heard stays the same until the factor shrinks. Where the last target's points have
+    // only been moved, each goes its own way. To any other curve what is heard bends over, on the places of
+    // both; then the result is true, and the segments must be found afresh.
+    bool SetOutFor(const CompMapStereo& target, double smoothing);
+    // Stands on the targets at once, with their points only; the segments must be found afresh.
+    void Arrive();
+    // The segment that holds `level`.
+    int SegmentAt(std::size_t channel, double level) const {
+        return m_comp_map[channel].SegmentAt(level, factor);
+    }
+
+private:
+    void MoveTargets(GlidingCurve& curve, const TransferCurve& target);
+    void MergePoints(GlidingCurve& curve, const TransferCurve& target);
+
+    std::array<TransferCurve, 2> m_target;
+    HeardCurve m_heard;  // while a curve sets out
+};
+
+}  // namespace Corvo::DSP::CompressorPrivate
