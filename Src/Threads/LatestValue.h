@@ -30,6 +30,12 @@ public:
     // Reader: the value taken last; before the first one, a slot that the writer has not touched.
     Value& Taken() { return m_slots[m_taken]; }
 
+    // With neither thread at work: no value at all, and nothing that one of the slots still owns.
+    void Clear() {
+        m_slots = {};
+        m_middle.fetch_and(kSlot);
+    }
+
 private:
     static constexpr unsigned kSlot = 3, kFresh = 4;
 

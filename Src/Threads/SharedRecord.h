@@ -31,19 +31,25 @@ concept SharedRecord = std::is_trivially_copyable_v<Record> && sizeof(Record) % 
 // Words of any type are copied as bits; the attribute allows that for floats too.
 using AnyWord [[gnu::may_alias]] = std::uint32_t;
 
+// One word of a record by its place, for records that are known by a table only.
+inline std::uint32_t LoadWord(const void* record, std::size_t place) {
+    return __atomic_load_n(static_cast<const AnyWord*>(record) + place, __ATOMIC_RELAXED);
+}
+inline void StoreWord(void* record, std::size_t place, std::uint32_t word) {
+    __atomic_store_n(static_cast<AnyWord*>(record) + place, word, __ATOMIC_RELAXED);
+}
+
 template <SharedRecord Record>
 Record Snapshot(const Record& shared) {
     std::array<std::uint32_t, sizeof(Record) / 4> words;
-    const auto* word = reinterpret_cast<const AnyWord*>(&shared);
-    for (auto& copy : words) copy = __atomic_load_n(word++, __ATOMIC_RELAXED);
+    for (std::size_t place = 0; place < words.size(); ++place) words[place] = LoadWord(&shared, place);
     return std::bit_cast<Record>(words);
 }
 
 template <SharedRecord Record>
 void Assign(Record& shared, const Record& value) {
     const auto words = std::bit_cast<std::array<std::uint32_t, sizeof(Record) / 4>>(value);
-    auto* word = reinterpret_cast<AnyWord*>(&shared);
-    for (const auto copy : words) __atomic_store_n(word++, copy, __ATOMIC_RELAXED);
+    for (std::size_t place = 0; place < words.size(); ++place) StoreWord(&shared, place, words[place]);
 }
 
 }  // namespace Corvo::DSP

@@ -9,6 +9,7 @@
 #include "DSP/Effects/Framework/TailRecord.h"
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Parts/Decibels.h"
+#include "DSP/Parts/Limits.h"
 #include "DSP/Parts/SampleDispatch.h"
 #include "Threads/SharedRecord.h"
 
@@ -44,18 +45,16 @@ const EffectTable& Table() {
         .image = "builtinChorus.png",
         .icon = "BuiltinPlugins/Chorus.png",
         .rows = kRows,
-        .chunk = {.words = 22, .wideWords = 22},
+        .chunk = {.words = kWordsOf<Props>, .wideWords = kWordsOf<Props>},
         .presets = PresetsOf(kPresets),
         .pads = {{"Default", {0, 1}, {4, 5}}, {"Choruses", {2, 3}, {4, 5}}, {"Flangers", {0, 1}, {2, 3}}},
-        .padNames = {"Default", "Choruses", "Flangers"},
     };
     return table;
 }
 
-constexpr double kRadiansPerStep = 0.06283185307179587;  // 2 pi / 100
-constexpr int kFirstCapacity = 480000;                   // floats
+constexpr double kRadiansPerStep = SineOscillator::kTwoPi / 100.0;
+constexpr int kFirstCapacity = 480000;  // floats
 constexpr double kLongestSeconds = 10.0;
-constexpr double kFastestHz = 768e3;  // bounds the memory for formats that nobody has
 
 }  // namespace
 

@@ -45,6 +45,7 @@ class DSP_API Chorus : public CorvoEffect {
 public:
     Chorus();
     ~Chorus() override;
+    using CorvoEffect::FitsOldChunk;
 
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
     void Cleanup() override;                             // frees the ring; the next cook makes a new one

@@ -12,6 +12,7 @@
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 #include "DSP/Parts/Decibels.h"
+#include "DSP/Parts/Limits.h"
 #include "DSP/Parts/SampleDispatch.h"
 #include "Threads/SharedRecord.h"
 
@@ -61,10 +62,9 @@ const EffectTable& Table() {
         .image = "builtinEcho.png",
         .icon = "BuiltinPlugins/Echo@3x.png",
         .rows = kRows,
-        .chunk = {.words = 24, .wordsBefore = 22, .wideWords = 22},
+        .chunk = {.words = kWordsOf<Props>, .wordsBefore = 22, .wideWords = 22},
         .presets = AppliedPresets(),
         .pads = {{"Default", {0, 1}, {4, 5}}},
-        .padNames = {"Default"},
         .sections = {"Delays", "Output"},
         .sectionLabel = SectionLabel::WithoutSide,
     };
@@ -73,8 +73,7 @@ const EffectTable& Table() {
 
 constexpr double kMixStep = 0.0005;
 constexpr double kLongestTimeMs = 10000.0, kLongestNoteMs = 60000.0;
-constexpr int kShortestDelay = 10;    // samples
-constexpr double kFastestHz = 768e3;  // upper bound for memory; faster formats share this ring
+constexpr int kShortestDelay = 10;  // samples
 
 }  // namespace
 

@@ -51,6 +51,7 @@ class DSP_API Echo : public CorvoEffect {
 public:
     Echo();
     ~Echo() override;
+    using CorvoEffect::FitsOldChunk;
 
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
     void Cleanup() override;                             // frees the ring; the next cook makes a new one

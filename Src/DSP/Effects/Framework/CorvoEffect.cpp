@@ -17,7 +17,9 @@ std::wstring_view Text(const wchar_t (&field)[32]) {
 CorvoEffect::CorvoEffect() = default;
 
 const MP_PARAMINFO& CorvoEffect::Record(int externalIndex) {
-    return GetParametersInfo()[RealIndex(externalIndex)];
+    static constexpr MP_PARAMINFO kNone{};
+    const MP_PARAMINFO* const records = GetParametersInfo();
+    return records ? records[RealIndex(externalIndex)] : kNone;
 }
 
 bool CorvoEffect::DoSetParam(int index, float normalised, bool fromAutomation) {

@@ -19,20 +19,20 @@ public:
     void GetSettingsChunk(std::vector<std::uint8_t>& chunk) override;
     void SetSettingsChunk(const std::vector<std::uint8_t>& chunk) override;
 
-    // The first of GetParamCountReal() records, which live as long as the library.
+    // The first of GetParamCountReal() records, which live as long as the library; null when there are none.
     virtual const MP_PARAMINFO* GetParametersInfo();
 
     // The record of an external parameter below GetParamCount().
     const MP_PARAMINFO& Record(int externalIndex);
-    // Takes the effect's oldest layout of the settings chunk, in which each word has 8 bytes. False, with
-    // nothing changed, when there are too few or the effect never had it.
-    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
 
 protected:
     using CorvoEffectBase::CorvoEffectBase;
     CorvoEffect();
 
     bool DoSetParam(int index, float normalised, bool fromAutomation) override;
+    // Takes the oldest layout of the settings chunk, in which each word has 8 bytes. False, with nothing
+    // changed, when there are too few. Public in the effects that had it.
+    bool FitsOldChunk(const std::vector<std::uint8_t>& chunk);
 
     std::int32_t m_chunk_tag = 0;  // stored first in most chunks; kept and given back, never interpreted
 };

@@ -121,10 +121,10 @@ public:
 
     // What a control shows at a normalised value, unit included. Empty for an index the effect does not have.
     virtual std::wstring GetParameterFormattedText(int index, double value);  // external index
-    // The label without its " L" or " R".
+    // What the host calls it; a side, " L" or " R", is left out.
     virtual std::wstring GetParamName(int index);       // external index
     virtual std::wstring GetParamUnitsText(int index);  // external index
-    // The value last set, 0..1; setting it again changes nothing. 0 for an index the effect does not have.
+    // 0..1; setting it again changes nothing. 0 for an index the effect does not have.
     virtual float GetParam(int index) = 0;  // external index
     // The stored value, not normalised; 0 for an index the effect does not have.
     virtual float GetParamPlain(int index) const;  // real index
@@ -200,9 +200,7 @@ public:
 
     // Ringing out, on the audio thread and between blocks. When the stream has ended:
     //   1. StartTail, with the most frames that the tail may have;
-    //   2. blocks of silence, of each of which the first TailFramesProduced() frames are output and the rest
-    //   is
-    //      untouched, until TailFinished();
+    //   2. blocks of silence until TailFinished(): of each, the first TailFramesProduced() frames are output;
     //   3. EndTail.
     // Echo, chorus and flanger know how long one pass of their delay line rings and finish after it; feedback
     // leaves more, which blocks of silence after EndTail bring out. Every other effect finishes at the limit.
@@ -262,6 +260,8 @@ protected:
     // The row of an external parameter, and of a real one; null without a table or where there is none.
     const ParameterRow* RowOf(int external);
     const ParameterRow* RealRow(int real) const;
+    const ParameterRow* WordRow(
+        int real) const;  // null where the parameter is not a word of the settings, too
     int RealIndex(int external);
     const MP_PARAMINFO* TableRecords() const;
 

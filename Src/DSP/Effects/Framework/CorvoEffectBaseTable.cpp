@@ -7,14 +7,6 @@
 
 // What an effect's table answers.
 namespace Corvo::DSP {
-namespace {
-
-AnyWord* At(void* settings, std::size_t word) { return static_cast<AnyWord*>(settings) + word; }
-std::uint32_t Load(void* settings, const ParameterRow& row) {
-    return __atomic_load_n(At(settings, row.word), __ATOMIC_RELAXED);
-}
-
-}  // namespace
 
 CorvoEffectBase::CorvoEffectBase(const EffectTable& table, void* settings) : CorvoEffectBase() {
     m_table = &table;
@@ -23,6 +15,10 @@ CorvoEffectBase::CorvoEffectBase(const EffectTable& table, void* settings) : Cor
 
 const ParameterRow* CorvoEffectBase::RealRow(int real) const {
     return m_table ? m_table->Row(real) : nullptr;
+}
+const ParameterRow* CorvoEffectBase::WordRow(int real) const {
+    const ParameterRow* const row = m_words ? RealRow(real) : nullptr;
+    return row && row->word != kNoWord ? row : nullptr;
 }
 const ParameterRow* CorvoEffectBase::RowOf(int external) { return RealRow(RealIndex(external)); }
 
@@ -44,20 +40,19 @@ double CorvoEffectBase::LongestGap() const { return m_longest_gap; }
 int CorvoEffectBase::GetParamCountReal() { return m_table ? static_cast<int>(m_table->rows.size()) : 0; }
 
 bool CorvoEffectBase::DoSetParam(int index, float normalised, bool) {
-    const ParameterRow* const row = RealRow(index);
-    if (!row || !m_words) return false;
-    __atomic_store_n(At(m_words, row->word), row->storage.store(row->storage, normalised), __ATOMIC_RELAXED);
-    return true;
+    const ParameterRow* const row = WordRow(index);
+    if (row) StoreWord(m_words, row->word, row->storage.store(row->storage, normalised));
+    return row != nullptr;
 }
 
 float CorvoEffectBase::GetParam(int index) {
-    const ParameterRow* const row = RowOf(index);
-    return row && m_words ? row->storage.normalised(row->storage, Load(m_words, *row)) : 0.0f;
+    const ParameterRow* const row = WordRow(RealIndex(index));
+    return row ? row->storage.normalised(row->storage, LoadWord(m_words, row->word)) : 0.0f;
 }
 
 float CorvoEffectBase::GetParamPlain(int index) const {
-    const ParameterRow* const row = RealRow(index);
-    return row && m_words ? row->storage.plain(Load(m_words, *row)) : 0.0f;
+    const ParameterRow* const row = WordRow(index);
+    return row ? row->storage.plain(LoadWord(m_words, row->word)) : 0.0f;
 }
 
 std::wstring CorvoEffectBase::GetParamName(int index) {
@@ -72,12 +67,12 @@ std::wstring CorvoEffectBase::GetParamUnitsText(int index) {
 
 std::wstring CorvoEffectBase::GetParameterFormattedText(int index, double value) {
     const ParameterRow* const row = RowOf(index);
-    return row ? row->shown.text(*row, value) : L"";
+    return row && row->shown.text ? row->shown.text(*row, value) : L"";
 }
 
 float CorvoEffectBase::GetParamValueNormalizedFromText(int index, std::string text) {
     const ParameterRow* const row = RowOf(index);
-    return row ? row->shown.read(*row, text) : -1.0f;
+    return row && row->shown.read ? row->shown.read(*row, text) : -1.0f;
 }
 
 std::vector<std::string> CorvoEffectBase::GetParameterAvailableValues(int index) {
@@ -109,6 +104,9 @@ void CorvoEffectBase::InitializeXyEditingData(GenericUIData& data) {
     for (const auto& pad : m_table->pads)
         data.groups.push_back(MakeGroup(pad.name, static_cast<int>(data.groups.size()), pad.x, pad.y));
     data.entries = m_table->padNames;
+    if (!data.entries.empty()) return;
+    for (const auto& pad : m_table->pads)
+        if (data.entries.empty() || data.entries.back() != pad.name) data.entries.push_back(pad.name);
 }
 
 ParameterDescription CorvoEffectBase::Describe(int index) {
@@ -144,8 +142,8 @@ std::string CorvoEffectBase::GetPresetName(int preset) {
 void CorvoEffectBase::SetPreset(int preset) { TakePreset(preset); }
 
 float CorvoEffectBase::GetParamFromProp(int index, int preset) {
-    const ParameterRow* const row = RealRow(index);
-    const PresetRow* const settings = row && m_words ? m_table->Preset(preset) : nullptr;
+    const ParameterRow* const row = WordRow(index);
+    const PresetRow* const settings = row ? m_table->Preset(preset) : nullptr;
     return settings ? row->storage.normalised(row->storage, settings->settings[row->word]) : -1.0f;
 }
 
@@ -164,8 +162,7 @@ void CorvoEffectBase::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
 void CorvoEffectBase::WriteChunk(std::vector<std::uint8_t>& chunk, std::int32_t leading) const {
     if (!m_table) return;
     SettingsWords settings(m_table->chunk.words);
-    for (std::size_t word = 0; word < settings.size(); ++word)
-        settings[word] = __atomic_load_n(At(m_words, word), __ATOMIC_RELAXED);
+    for (std::size_t word = 0; word < settings.size(); ++word) settings[word] = LoadWord(m_words, word);
     m_table->chunk.Write(chunk, leading, settings);
 }
 
@@ -184,8 +181,7 @@ bool CorvoEffectBase::TakeChunk(const std::vector<std::uint8_t>& chunk, std::int
 }
 
 void CorvoEffectBase::Store(const std::vector<std::uint32_t>& settings) {
-    for (std::size_t word = 0; word < settings.size(); ++word)
-        __atomic_store_n(At(m_words, word), settings[word], __ATOMIC_RELAXED);
+    for (std::size_t word = 0; word < settings.size(); ++word) StoreWord(m_words, word, settings[word]);
     MarkStale();
 }
 

@@ -87,12 +87,12 @@ constexpr Shown kFlipShown{[](const ParameterRow&, double value) { return Format
 
 // clang-format off
 constexpr std::array<ParameterRow, kCount> kRows{{
-    // label          unit   type      kept as               shown as      word    group in stereo, range
-    {L"Gain",         L"dB", MPT_INT,  kGainHalves,          kGainShown,   kGain,      1, kGainRange},
+    // label          unit   type      kept as                shown as      word        group in stereo, range
+    {L"Gain",         L"dB", MPT_INT,  kGainHalves,           kGainShown,   kGain,      1, kGainRange},
     {L"Stereo width", L"",   MPT_INT,  Linear<kWidthRange>(), kNumberShown, kWidth,     0, kWidthRange},
-    {L"Pan",          L"",   MPT_INT,  Linear<kPanRange>(),  kNumberShown, kPan,       0, kPanRange},
-    {L"Flip phase L", L"",   MPT_BOOL, Linear<kFlipRange>(), kFlipShown,   kFlipLeft,  2, kFlipRange},
-    {L"Flip phase R", L"",   MPT_BOOL, Linear<kFlipRange>(), kFlipShown,   kFlipRight, 2, kFlipRange},
+    {L"Pan",          L"",   MPT_INT,  Linear<kPanRange>(),   kNumberShown, kPan,       0, kPanRange},
+    {L"Flip phase L", L"",   MPT_BOOL, Linear<kFlipRange>(),  kFlipShown,   kFlipLeft,  2, kFlipRange},
+    {L"Flip phase R", L"",   MPT_BOOL, Linear<kFlipRange>(),  kFlipShown,   kFlipRight, 2, kFlipRange},
 }};
 // clang-format on
 constexpr bool IsStereoOnly(std::size_t index) { return index != kGain && index != kFlipLeft; }

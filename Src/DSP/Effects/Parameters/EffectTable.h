@@ -24,6 +24,9 @@ Record RecordOf(const SettingsWords& words) {
     return std::bit_cast<Record>(whole);
 }
 
+template <typename Record>
+constexpr std::size_t kWordsOf = sizeof(Record) / 4;
+
 struct PresetRow {
     std::string name;
     SettingsWords settings;
@@ -81,7 +84,7 @@ struct EffectTable {
     std::vector<PresetRow> presets{};
     int defaultPreset = 0;
     std::vector<Pad> pads{};
-    std::vector<std::string> padNames{};  // under which the host shows them
+    std::vector<std::string> padNames{};  // in the host's list; the pads' own where it is empty
     std::vector<std::string> sections{};
     SectionLabel sectionLabel = SectionLabel::Whole;
     MP_CAPS caps = 1;

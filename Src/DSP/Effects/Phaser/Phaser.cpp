@@ -58,10 +58,9 @@ const EffectTable& Table() {
         .image = "builtinPhaser.png",
         .icon = "BuiltinPlugins/Phaser@3x.png",
         .rows = kRows,
-        .chunk = {.words = 7},
+        .chunk = {.words = kWordsOf<PhaserSettings>},
         .presets = PresetsOf(PhaserPresets::kPresets),
         .pads = {{"Default", {0}, {1}}},
-        .padNames = {"Default"},
     };
     return table;
 }

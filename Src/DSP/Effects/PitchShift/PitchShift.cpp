@@ -67,12 +67,13 @@ constexpr std::array<ParameterRow, 2> kRows{{
 
 const EffectTable& Table() {
     static const EffectTable table = [] {
-        EffectTable made{.name = "Pitch Shift",
-                         .image = "builtinPitch.png",
-                         .icon = "BuiltinPlugins/PitchShift@3x.png",
-                         .rows = kRows,
-                         .chunk = {.words = 22, .wideWords = 22},
-                         .sectionLabel = SectionLabel::None};
+        EffectTable made{
+            .name = "Pitch Shift",
+            .image = "builtinPitch.png",
+            .icon = "BuiltinPlugins/PitchShift@3x.png",
+            .rows = kRows,
+            .chunk = {.words = kWordsOf<_transform_props>, .wideWords = kWordsOf<_transform_props>},
+            .sectionLabel = SectionLabel::None};
         for (const auto& preset : kPresets)
             made.presets.push_back({preset.name, WordsOf(SettingsOf(preset.pitch))});
         return made;
@@ -124,9 +125,7 @@ struct PitchShift::BackEnds {
     void Clear() {
         inUse.store(nullptr);
         newest.store(kNone);
-        slots.Draft() = {};
-        slots.Taken() = {};
-        if (slots.Take()) slots.Taken() = {};
+        slots.Clear();
     }
 
     // Audio thread: looks for a new one. The index of the one then in use, kNone without any.
@@ -156,6 +155,17 @@ PitchShift::PitchShift() : CorvoEffect(Table(), &m_record), m_back_ends(std::mak
 PitchShift::~PitchShift() = default;
 
 int PitchShift::SeparateLeftRightControls() { return 0; }
+
+std::wstring PitchShift::GetParameterFormattedText(int index, double value) {
+    const ParameterRow* const row = RealRow(index);
+    return row ? row->shown.text(*row, value) : L"";
+}
+
+float PitchShift::GetParamValueNormalizedFromText(int index, std::string text) {
+    const ParameterRow* const row = RealRow(index);
+    return row ? row->shown.read(*row, text) : -1.0f;
+}
+
 bool PitchShift::AllowChangeParamFromInputBox(int) { return true; }
 
 _transform_props PitchShift::GetPresetData(int preset) {

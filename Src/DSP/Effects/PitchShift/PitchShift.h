@@ -34,10 +34,11 @@ static_assert(sizeof(_transform_props) == 88);
 // Left and right are one external parameter, "Pitch". A new instance has an empty record, at the lowest
 // pitch: load a preset or a chunk first.
 //
-// Threads: as in CorvoEffectBase. An edit reaches the back-end with the next block, once, and restarts the
-// one called "New". The effect itself has no lock. Back-ends are made and freed on the user-interface thread,
-// but for the one a block makes after Cleanup. Latency is asked for on one of the two threads. Cleanup and
-// InitProcessing are not called while a block is processed.
+// Threads: as in CorvoEffectBase. An edit reaches the back-end at once, again with the next block when a cook
+// overtook it, and restarts "New" under that engine's own lock, which a block may wait for briefly; the
+// effect has no lock. Back-ends are made and freed on the user-interface thread, except for one that a block
+// makes after Cleanup. Latency is asked for on one of the two threads. Cleanup and InitProcessing are not
+// called while a block is processed.
 //
 // Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API PitchShift : public CorvoEffect {
@@ -54,6 +55,9 @@ public:
     void Cleanup() override;
     void SetPreset(int preset) override;
     int SeparateLeftRightControls() override;
+    // Of either side, 0 or 1, though both are one external parameter.
+    std::wstring GetParameterFormattedText(int index, double value) override;
+    float GetParamValueNormalizedFromText(int index, std::string text) override;
     bool AllowChangeParamFromInputBox(int index) override;
 
     // Configures the back-end that the record names for the format; it is made on the spot when another one

@@ -8,6 +8,7 @@
 #include "DSP/Effects/Reverb/ReverbDesign.h"
 #include "DSP/Effects/Reverb/ReverbEngine.h"
 #include "DSP/Effects/Reverb/ReverbPresets.h"
+#include "DSP/Parts/Limits.h"
 #include "DSP/Parts/SampleDispatch.h"
 #include "Threads/SharedRecord.h"
 
@@ -47,14 +48,12 @@ const EffectTable& Table() {
         .image = "builtinReverb.png",
         .icon = "BuiltinPlugins/Reverb@3x.png",
         .rows = kRows,
-        .chunk = {.words = 18, .wideWords = 18},
+        .chunk = {.words = kWordsOf<Props>, .wideWords = kWordsOf<Props>},
         .presets = PresetsOf(ReverbPresets::kPresets),
         .sectionLabel = SectionLabel::WithoutSide,
     };
     return table;
 }
-
-constexpr double kFastestHz = 768e3;  // upper bound for memory; faster formats share these buffers
 
 int Sides(const tWAVEFORMATEX& format) {
     return std::min<int>(format.nChannels, CorvoEffectBase::MaxNumChannels);

@@ -45,6 +45,7 @@ class DSP_API Reverb : public CorvoEffect {
 public:
     Reverb();
     ~Reverb() override;
+    using CorvoEffect::FitsOldChunk;
 
     bool SupportsNoninterleaved() override;
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;

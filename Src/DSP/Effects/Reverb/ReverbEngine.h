@@ -11,7 +11,7 @@
 
 namespace Corvo::DSP {
 
-// Turns a square of samples, one register per comb, into one register per moment, and back.
+// Transposes 4 by 4: from one register per comb to one per frame, and back.
 inline void Transpose(std::array<xsimd::batch<float, xsimd::sse2>, 4>& v) {
     const auto a = xsimd::zip_lo(v[0], v[2]), b = xsimd::zip_hi(v[0], v[2]);
     const auto c = xsimd::zip_lo(v[1], v[3]), d = xsimd::zip_hi(v[1], v[3]);
@@ -36,7 +36,7 @@ struct ReverbData {
 };
 
 // The reverb's processing in one precision, in pieces no longer than the shortest loop, so that no sample
-// of a piece depends on another one of it, the recursions of the filters apart.
+// of a piece depends on another one of it, except for the recursions of the filters.
 template <typename T>
 class ReverbEngine {
 public:

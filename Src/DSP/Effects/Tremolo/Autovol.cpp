@@ -71,17 +71,16 @@ const EffectTable& Table() {
         .image = "builtinTremolo.png",
         .icon = "BuiltinPlugins/Tremolo@3x.png",
         .rows = kRows,
-        .chunk = {.words = 22, .wideWords = 22},
+        .chunk = {.words = kWordsOf<Props>, .wideWords = kWordsOf<Props>},
         .presets = PresetsOf(AutovolPresets::kPresets),
         .pads = {{"Default", {0, 2}, {4, 6}}, {"Default", {1, 3}, {5, 7}}},  // a side each
-        .padNames = {"Default"},
     };
     return table;
 }
 
 constexpr std::int32_t kLoudest = 200, kWhole = 1000;
 constexpr double kPerMille = 0.001;
-constexpr double kRadiansPerRateStep = 0.06283185307179587;  // 2 pi / 100
+constexpr double kRadiansPerRateStep = SineOscillator::kTwoPi / 100.0;
 
 template <typename Sample>
 void Modulate(Sample* samples, double factor) {

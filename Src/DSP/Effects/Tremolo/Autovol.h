@@ -40,6 +40,7 @@ class DSP_API Autovol : public CorvoEffect {
 public:
     Autovol();
     ~Autovol() override;
+    using CorvoEffect::FitsOldChunk;
 
     void CheckCookProperties(const tWAVEFORMATEX* format, bool force) override;
 

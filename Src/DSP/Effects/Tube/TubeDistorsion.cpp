@@ -170,27 +170,27 @@ int TubeDistorsion::GetLatency() {
 }
 
 bool TubeDistorsion::DoSetParam(int index, float normalised, bool fromAutomation) {
-    const bool stored = CorvoEffect::DoSetParam(index, normalised, fromAutomation);
-    if (index == static_cast<int>(kOversamplingRight) && !fromAutomation) PrepareOversampling();
-    return stored;
+    if (index == static_cast<int>(kOversamplingRight) && !fromAutomation) PrepareOversampling(normalised);
+    return CorvoEffect::DoSetParam(index, normalised, fromAutomation);
 }
 
 void TubeDistorsion::SetPreset(int preset) {
-    if (TakePreset(preset)) FollowSettings();
+    if (const float wanted = GetParamFromProp(kOversamplingRight, preset); wanted >= 0.0f)
+        PrepareOversampling(wanted);
+    TakePreset(preset);
 }
 
 void TubeDistorsion::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
-    if (TakeChunk(chunk, m_chunk_tag)) FollowSettings();
+    SettingsWords settings;
+    std::int32_t leading;
+    if (!Table().chunk.Read(chunk, leading, settings)) return;
+    PrepareOversampling(PlainOfReal(settings[kOversamplingRight]));
+    TakeChunk(chunk, m_chunk_tag);
 }
 
-// A cook that came in between found settings without their filters; it runs again.
-void TubeDistorsion::FollowSettings() {
-    PrepareOversampling();
-    MarkStale();
-}
-
-void TubeDistorsion::PrepareOversampling() {
-    const int factor = WantedFactor();
+// Before the value is stored: a cook that sees it finds the filters there.
+void TubeDistorsion::PrepareOversampling(float wanted) {
+    const int factor = VirtualTubeAmp::OversamplingFactor(wanted);
     if (factor == m_prepared_factor) return;
     m_prepared_factor = factor;
     m_processing->filters.Draft().Clear(factor);

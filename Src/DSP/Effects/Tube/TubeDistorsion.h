@@ -54,8 +54,7 @@ private:
     struct Processing;
 
     int WantedFactor() const;
-    void FollowSettings();
-    void PrepareOversampling();
+    void PrepareOversampling(float wanted);
     void InitState(bool fromSilence);
 
     Values m_params{};  // shared between the threads
