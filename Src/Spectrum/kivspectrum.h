@@ -40,7 +40,8 @@ public:
     // Class-wide. Written by menu commands and init; a host that stores or restores it does so while no
     // command runs and calls ObserverUpdate afterwards.
     static spectrum_settings settings;
-    // While set, init does nothing.
+    // While set, init does nothing; of the menu's choices, only the length of the moving average reaches the
+    // buffers.
     static std::atomic<bool> lock_init;
     // The tuner panel's bitmaps must be made again: command 1350 was chosen or the resolution changed.
     static std::atomic<bool> needPrepareBitmap;
@@ -102,7 +103,8 @@ public:
 
     // The rate for PrepareFFTForDrawingHelper; below 1 is ignored.
     void set_parameters(int samplingRate);
-    // Brings buffers and window in line with the settings.
+    // Brings buffers and window in line with the settings. Where they are already, the frames go on as
+    // before.
     void init();
     // Sizes the buffers for what init found, or empties them when `reset` is 0 or the analyser is frozen.
     void allocate(int reset);
