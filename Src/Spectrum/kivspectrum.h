@@ -80,7 +80,10 @@ public:
     static SpectrumStaticInfo& GetStaticInfo();
     // A copy that no menu command changes half way. Any thread.
     static spectrum_settings GetSettings();
-    // Milliseconds between display refreshes.
+    // Milliseconds between display refreshes: 30, while everything that is counted in refreshes counts 30 of
+    // them to a second. A host that takes the period for its timer makes 33.3 a second: peaks are held 10 %
+    // shorter and then sink by 33.3 dB a second, the sonogram moves 11 % faster than its scale says,
+    // and a note that has ended goes 10 % sooner. One that refreshes every 33.3 ms gets all times as stated.
     static int GetRefreshRatePeriod();
     // Stores the overlap, 1 and more as 0.99, and the hop length that follows from it. Values below 0 leave
     // gaps between the windows.

@@ -44,9 +44,9 @@ public:
                            VectorInterpolationFilterFloat& filter);
     const std::vector<float>& GetPowerSmoothed() const;
 
-    // Milliseconds between display refreshes.
+    // Milliseconds between display refreshes; kivspectrum's function of that name has what follows from it.
     static int GetRefreshRatePeriod();
-    // Refreshes per second: the display's with time smoothing, else as many as there are new spectra.
+    // Refreshes per second: 30 with time smoothing, else as many as there are new spectra.
     int GetActualRefreshRate(const std::vector<float>& power) const;
     // How many frames a peak stays before it falls: 1 without peak memory, 0 when it never falls.
     int power_decay_length(const std::vector<float>& power) const;
