@@ -225,6 +225,7 @@ TEST_F(Readings, NeedleAndArrowAreOnTheErrorsSide) {
         const auto info = Show(&kivspectrum::DrawNeedleInfo<Recording>);
         const auto& error = info.texts.at(0);
         EXPECT_NEAR(ValueOf(error.text), cents, 1.5) << error.text;
+        EXPECT_EQ(error.text.starts_with("\u2212"), cents < 0.0) << "not the dial's sign: " << error.text;
         EXPECT_NEAR(ValueOf(info.texts.at(1).text), Cents(440.0, cents), 1.0);
         ASSERT_EQ(info.images.size(), cents == 0.0 ? 0u : 1u);
         if (cents == 0.0) continue;
