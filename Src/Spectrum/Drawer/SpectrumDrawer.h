@@ -70,8 +70,8 @@ public:
     const std::vector<Corvo::PointF>& GetXYPoints() const;
     const std::vector<int>& GetFFTPoints() const;
 
-    // The highest peak of the smoothed spectrum from a frequency (Hz) up, except for DC; 0 Hz and -300 dB
-    // when there is none.
+    // The highest peak of the smoothed spectrum from a frequency (Hz) up, except for DC and half the rate; 0
+    // Hz and -300 dB when there is none.
     Corvo::SpectrumPeak HighestPeak(double lowestHz = 0.0) const;
 
     void SetOn(bool on);
