@@ -219,8 +219,8 @@ const Contract kContracts[] = {
         {L"Mix with early reflections L", L"dB", Continuous, {12, 16}, {0, 1000, 2000},   {L"0.0 dB", L"50.0 dB", L"100.0 dB"}},
         {L"Length L",                     L"ms", Continuous, {20, 24}, {0, 5000, 10000},  {L"0 ms", L"5000 ms", L"10000 ms"}},
         {L"Damping L",                    L"%",  Continuous, {44, 48}, {0, 1250, 2500},   {L"0.0 %", L"50.0 %", L"100.0 %"}},
-        {L"Early reflections L",          L"",   Continuous, {52, 56}, {0, 2500, 5000},   {L"0.00 ", L"2.50 ", L"5.00 "}},
-        {L"Room size L",                  L"",   Continuous, {60, 64}, {1, 2000, 4000},   {L"0.00 ", L"2.00 ", L"4.00 "}},
+        {L"Early reflections L",          L"",   Continuous, {52, 56}, {0, 2500, 5000},   {L"0.00", L"2.50", L"5.00"}},
+        {L"Room size L",                  L"",   Continuous, {60, 64}, {1, 2000, 4000},   {L"0.00", L"2.00", L"4.00"}},
         {L"Wet level L",                  L"dB", Continuous, {28, 32}, {-450, -175, 100}, {L"-Inf. dB", L"-17.5 dB", L"10.0 dB"}},
         {L"Dry level L",                  L"dB", Continuous, {36, 40}, {-450, -175, 100}, {L"-Inf. dB", L"-17.5 dB", L"10.0 dB"}}},
      .presets = {

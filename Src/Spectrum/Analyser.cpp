@@ -107,12 +107,7 @@ void Analyser::ResetPeaks() {
 
 void Analyser::Prepare(const SpectrumSettings& settings) {
     const Lock lock(m_lock);
-    m_capture.RestartHop();
-    if (SameBuffers(settings, m_built)) {
-        const int spectra = FilterLength(settings);
-        if (spectra != m_filter->GetSpectra() && !m_power.empty()) ResizeFilter(spectra);
-        return;
-    }
+    if (SameBuffers(settings, m_built)) return FitFilter(settings);
     m_order = OrderOf(settings.fft_length);
     m_built = settings;
     UpdateDrawer(settings);
@@ -149,6 +144,12 @@ void Analyser::Allocate(const SpectrumSettings& settings, bool reset) {
     m_window.resize(Entries(m_built.window_length));
     ResizeFilter(FilterLength(settings));
     CookWindow();
+}
+
+void Analyser::FitFilter(const SpectrumSettings& settings) {
+    const Lock lock(m_lock);
+    const int spectra = FilterLength(settings);
+    if (spectra != m_filter->GetSpectra() && !m_power.empty()) ResizeFilter(spectra);
 }
 
 // As long as the window or half the transform, whichever is more: a padded transform has more bins than the

@@ -70,8 +70,11 @@ public:
     void ShowSonogram(bool show);
     void ResetPeaks();
 
-    // Brings buffers and window in line with the settings; allocates where they changed.
+    // Brings buffers and window in line with the settings; allocates where they changed. Where nothing did,
+    // the next frame comes when it would have come: a host may prepare more often than a hop lasts.
     void Prepare(const SpectrumSettings& settings);
+    // The moving average's length alone.
+    void FitFilter(const SpectrumSettings& settings);
     // Sizes the buffers for the lengths last prepared, or empties them: without `reset`, and while frozen.
     void Allocate(const SpectrumSettings& settings, bool reset);
 

@@ -68,7 +68,7 @@ void CaptureBuffer::Resize(int length, int window) {
 
 void CaptureBuffer::SetHop(int hop) {
     m_hop.store(std::max(hop, 1), std::memory_order_relaxed);
-    RestartHop();
+    m_sinceHop.store(0, std::memory_order_relaxed);
 }
 
 void CaptureBuffer::CopyTo(std::vector<float>& to) {

@@ -28,7 +28,6 @@ public:
     void Resize(int length, int window);
     // New data is announced every `hop` samples, counted from here.
     void SetHop(int hop);
-    void RestartHop() { m_sinceHop.store(0, std::memory_order_relaxed); }
 
     bool Pending() const { return m_pending.load(std::memory_order_acquire); }
     void ClearPending() { m_pending.store(false, std::memory_order_relaxed); }

@@ -40,7 +40,8 @@ public:
     // Class-wide. Written by menu commands and init; a host that stores or restores it does so while no
     // command runs and calls ObserverUpdate afterwards.
     static spectrum_settings settings;
-    // While set, init does nothing.
+    // While set, init does nothing; of the menu's choices, only the length of the moving average reaches the
+    // buffers.
     static std::atomic<bool> lock_init;
     // The tuner panel's bitmaps must be made again: command 1350 was chosen or the resolution changed.
     static std::atomic<bool> needPrepareBitmap;
@@ -79,7 +80,10 @@ public:
     static SpectrumStaticInfo& GetStaticInfo();
     // A copy that no menu command changes half way. Any thread.
     static spectrum_settings GetSettings();
-    // Milliseconds between display refreshes.
+    // Milliseconds between display refreshes: 30, while everything that is counted in refreshes counts 30 of
+    // them to a second. A host that takes the period for its timer makes 33.3 a second: peaks are held 10 %
+    // shorter and then sink by 33.3 dB a second, the sonogram moves 11 % faster than its scale says,
+    // and a note that has ended goes 10 % sooner. One that refreshes every 33.3 ms gets all times as stated.
     static int GetRefreshRatePeriod();
     // Stores the overlap, 1 and more as 0.99, and the hop length that follows from it. Values below 0 leave
     // gaps between the windows.
@@ -102,7 +106,8 @@ public:
 
     // The rate for PrepareFFTForDrawingHelper; below 1 is ignored.
     void set_parameters(int samplingRate);
-    // Brings buffers and window in line with the settings.
+    // Brings buffers and window in line with the settings. Where they are already, the frames go on as
+    // before.
     void init();
     // Sizes the buffers for what init found, or empties them when `reset` is 0 or the analyser is frozen.
     void allocate(int reset);

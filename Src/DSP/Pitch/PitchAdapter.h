@@ -55,7 +55,8 @@ public:
     // Drops the audio held.
     virtual void Clear();
     // Configuration. "New" takes 1 to 16 channels (16 without the anti-alias filter) and lets its engine's
-    // std::runtime_error out for others.
+    // std::runtime_error out for others. Its rates from 1 to 999 Hz count as 1000, those above 192000 as
+    // that; from 0 down there is no rate, and it stays silent.
     virtual void SetSampleRate(int rate) = 0;
     virtual void SetChannelsNum(int channels);
     // "New" shifts all channels by channel 0's factor, at least 0.02; "Classic" has one for each of two.

@@ -17,8 +17,9 @@ constexpr int kPrimingFrames = 28;
 constexpr int kFlushFrames = 128;
 // The engine can only be flushed by more input; far more than its longest sequence ends the attempt.
 constexpr int kMostFlushBlocks = 1 << 16;
-// The engine throws at higher rates. It only sizes its sequences by the rate, so they become shorter.
-constexpr int kHighestRate = 192000;
+// The engine throws at higher rates, and at a few Hz its sequences are too short to move on by a frame. It
+// only sizes them by the rate, so they become shorter or longer.
+constexpr int kLowestRate = 1000, kHighestRate = 192000;
 constexpr float kLowestPitch = 0.02f;
 // Above this the engine would make thousands of frames of every one it is given.
 constexpr float kHighestPitch = 64.0f;
@@ -82,7 +83,7 @@ void PitchAdapterSoundTouch::SetSampleRate(int rate) {
     const std::lock_guard lock(m_lock);
     Reset();
     m_rateSet = rate > 0;
-    if (m_rateSet) m_engine.setSampleRate(static_cast<unsigned>(std::min(rate, kHighestRate)));
+    if (m_rateSet) m_engine.setSampleRate(static_cast<unsigned>(std::clamp(rate, kLowestRate, kHighestRate)));
     TakeLatency();
     Put(kSilence.data(), kPrimingFrames);
 }

@@ -155,11 +155,12 @@ void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
         target.Polyline(points.data(), static_cast<int>(points.size()),
                         {{colour}, Look::kHairline * target.Scale()});
     };
+    drawer.AgePeaks();
     if (view.peak_hold_mode != 0) other(drawer.GetPeaks(), Look::kPeaks);
     const std::vector<float>& denoised = analyser.GetTuner()->GetDenoisedSpectrum();
     if (analyser.GetTunerOn() && Tuner::GetShowDenoisedSpectrum() && !denoised.empty())
         other(denoised, Look::kTrace);
-    drawer.ComputeSpectrumPoints(plot, nullptr, count, map, kMode, 0, 0.0f);
+    drawer.ComputeSpectrumPoints(plot, nullptr, count, map, kMode, 0, 0.0f, &drawer.GetPowerSmoothed());
     DrawCurve(target, plot, map, drawer.GetXYPoints(), CurveStyleOf(view), Access::Outline(analyser));
     target.PopClip();
     if (analyser.IsShowInfoBox() && view.view_flag_c != 0) DrawSpectrumInfo(analyser, target, plot, map);

@@ -44,9 +44,9 @@ public:
                            VectorInterpolationFilterFloat& filter);
     const std::vector<float>& GetPowerSmoothed() const;
 
-    // Milliseconds between display refreshes.
+    // Milliseconds between display refreshes; kivspectrum's function of that name has what follows from it.
     static int GetRefreshRatePeriod();
-    // Refreshes per second: the display's with time smoothing, else as many as there are new spectra.
+    // Refreshes per second: 30 with time smoothing, else as many as there are new spectra.
     int GetActualRefreshRate(const std::vector<float>& power) const;
     // How many frames a peak stays before it falls: 1 without peak memory, 0 when it never falls.
     int power_decay_length(const std::vector<float>& power) const;
@@ -70,8 +70,8 @@ public:
     const std::vector<Corvo::PointF>& GetXYPoints() const;
     const std::vector<int>& GetFFTPoints() const;
 
-    // The highest peak of the smoothed spectrum from a frequency (Hz) up, except for DC; 0 Hz and -300 dB
-    // when there is none.
+    // The highest peak of the smoothed spectrum from a frequency (Hz) up, except for DC and half the rate; 0
+    // Hz and -300 dB when there is none.
     Corvo::SpectrumPeak HighestPeak(double lowestHz = 0.0) const;
 
     void SetOn(bool on);

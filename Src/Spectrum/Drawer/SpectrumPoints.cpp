@@ -47,6 +47,17 @@ void ToLevels(const std::vector<float>& power, std::vector<float>& levels, doubl
     }
 }
 
+// Half the rate has no bin of its own. What its lobe leaves in the last ones, which rise towards it, would
+// end the curve in a spike.
+std::ptrdiff_t ShownBins(const std::vector<float>& power, const Corvo::SpectrumSettings& settings) {
+    constexpr double kWidestLobe = 3.0;  // to either side, of all windows
+    const auto bins = static_cast<std::ptrdiff_t>(power.size());
+    const double fewest = std::max(static_cast<double>(bins) - kWidestLobe * Corvo::Padding(settings), 1.0);
+    const float* end = power.data() + bins;
+    while (static_cast<double>(end - power.data()) > fewest && end[-1] > end[-2]) --end;
+    return end - power.data();
+}
+
 // The power between two frequencies, given in bins, a bin reaching half a step to either side.
 double PowerBetween(const std::vector<float>& power, double low, double high) {
     const double last = static_cast<double>(power.size()) - 1.0;
@@ -92,11 +103,11 @@ void SpectrumDrawer::AddCurve(const Corvo::RectF& rectangle, const CoordinatesAn
     m_levels.resize(power.size());
     ToLevels(power, m_levels, scale, map);
     const double perHz = static_cast<double>(m_settings.fft_length) / m_samplingRate;
-    const auto bins = static_cast<std::ptrdiff_t>(power.size());
+    const auto bins = ShownBins(power, m_settings);
     const int columns = static_cast<int>(std::ceil(std::min(rectangle.width, kWidest)));
     const double left = rectangle.x, right = left + rectangle.width;
     double from = map.XToFrequency(left) * perHz;
-    for (int column = 0; column < columns && from <= static_cast<double>(bins); ++column) {
+    for (int column = 0; column < columns && from <= static_cast<double>(power.size()); ++column) {
         const double edge = std::min(left + column + 1.0, right);
         const double to = map.XToFrequency(edge) * perHz;
         const auto shown = Corvo::LevelOf(Corvo::BinsBetween(from, to, bins), m_levels.data(), bins);

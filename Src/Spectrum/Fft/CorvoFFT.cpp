@@ -75,7 +75,7 @@ void CorvoFFT::ReleaseReal() {
 }
 
 void CorvoFFT::Free() {
-    Allocate(0, 0);
+    Allocate(0, 1);
     ReleaseReal();
 }
 
@@ -85,16 +85,15 @@ void* CorvoFFT::intelRealloc(void* p, int bytes) {
 }
 
 void CorvoFFT::Allocate(int length, int withInverse) {
-    Release(m_complexForward32);
-    Release(m_complexForward64);
-    Release(m_complexInverse32);
-    Release(m_complexInverse64);
-    if (length < 1 || length > kMaxLength) return;
-    Build(m_complexForward32, length, false);
-    Build(m_complexForward64, length, false);
+    const auto replace = [&](auto& setUp) {
+        Release(setUp);
+        if (length >= 1 && length <= kMaxLength) Build(setUp, length, false);
+    };
+    replace(m_complexForward32);
+    replace(m_complexForward64);
     if (withInverse == 0) return;
-    Build(m_complexInverse32, length, false);
-    Build(m_complexInverse64, length, false);
+    replace(m_complexInverse32);
+    replace(m_complexInverse64);
 }
 
 void CorvoFFT::AllocateReal(int length, int withInverse) {

@@ -33,8 +33,9 @@ public:
     void* intelRealloc(void* p, int bytes);
 
     // Build the transforms of one kind, the inverse ones only when `withInverse` is non-zero (complex) or
-    // greater than 0 (real), and release those of that kind that were there. A length below 1 or above
-    // 524288, or a lack of memory, leaves the kind unbuilt.
+    // greater than 0 (real). What they replace is released: without `withInverse` an inverse complex
+    // transform stays as it was, while the real ones all go, as they share their scratch. Where the length is
+    // below 1 or above 524288, or memory is lacking, nothing takes its place.
     void Allocate(int length, int withInverse);
     void AllocateReal(int length, int withInverse);
 

@@ -54,10 +54,13 @@ double FullScalePower(const SpectrumSettings& settings) {
     return peak * peak;
 }
 
+double Padding(const SpectrumSettings& settings) {
+    return std::max(settings.fft_length, 1) / WindowLength(settings);
+}
+
 double NoiseBandwidth(const SpectrumSettings& settings) {
     const WindowShape& shape = ShapeOf(settings);
-    const double padding = std::max(settings.fft_length, 1) / WindowLength(settings);
-    return shape.meanSquare / (shape.mean * shape.mean) * padding;
+    return shape.meanSquare / (shape.mean * shape.mean) * Padding(settings);
 }
 
 }  // namespace Corvo

@@ -24,6 +24,8 @@ DSP_API float VerticalRangeOf(const SpectrumSettings& settings);
 
 // The power that a full-scale sine on a bin's centre has in the analyser's power spectrum.
 DSP_API double FullScalePower(const SpectrumSettings& settings);
+// How many bins the transform has for each of the window's: above 1 where it is longer.
+double Padding(const SpectrumSettings& settings);
 // How many bins' worth of a sine's peak power its windowed spectrum sums to.
 DSP_API double NoiseBandwidth(const SpectrumSettings& settings);
 

@@ -140,8 +140,8 @@ std::string Tuner::GetTuningErrorStr(float cents) {
     constexpr float kMost = 9999.9f;
     const float shown = std::abs(cents) <= kMost ? cents : std::copysign(kMost, cents);
     const int tenths = static_cast<int>(std::lround(10.0f * std::abs(shown)));
-    const char* const sign = tenths == 0 ? "" : cents < 0.0f ? "-" : "+";
-    std::array<char, 16> text;
+    const char* const sign = tenths == 0 ? "" : cents < 0.0f ? "\u2212" : "+";
+    std::array<char, 24> text;
     std::snprintf(text.data(), text.size(), "%s%d.%dc", sign, tenths / 10, tenths % 10);
     return text.data();
 }

@@ -157,8 +157,8 @@ public:
 
     // The name of the note shown; empty for none.
     const char* GetTunedNoteName() const;
-    // The error as "+12.3c"; without a sign when it rounds to nothing. Empty without a note. Too short to
-    // allocate.
+    // The error as "+12.3c"; without a sign when it rounds to nothing. UTF-8: a flat note's sign is U+2212,
+    // as on the dial. Empty without a note. Too short to allocate.
     std::string GetTuningErrorStr() const;
     static std::string GetTuningErrorStr(float cents);
 

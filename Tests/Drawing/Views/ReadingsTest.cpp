@@ -225,6 +225,7 @@ TEST_F(Readings, NeedleAndArrowAreOnTheErrorsSide) {
         const auto info = Show(&kivspectrum::DrawNeedleInfo<Recording>);
         const auto& error = info.texts.at(0);
         EXPECT_NEAR(ValueOf(error.text), cents, 1.5) << error.text;
+        EXPECT_EQ(error.text.starts_with("\u2212"), cents < 0.0) << "not the dial's sign: " << error.text;
         EXPECT_NEAR(ValueOf(info.texts.at(1).text), Cents(440.0, cents), 1.0);
         ASSERT_EQ(info.images.size(), cents == 0.0 ? 0u : 1u);
         if (cents == 0.0) continue;
@@ -299,7 +300,8 @@ TEST_F(Readings, PointerReadsWhatTheLabelsSay) {
     }
 }
 
-// Catches a curve or a readout that has its peak at another frequency or level than the sine.
+// Catches a curve or a readout that has its peak at another frequency or level than the sine, and a memory of
+// peaks that is one picture late.
 TEST_F(Readings, PeakIsTheSines) {
     kivspectrum::settings.time_smoothing = 0;
     for (const int scale : {0, 1, 4})
@@ -318,6 +320,29 @@ TEST_F(Readings, PeakIsTheSines) {
             const PointF top = *std::ranges::min_element(curve, {}, &PointF::y);
             EXPECT_NEAR(top.x, Map().FrequencyToX(hz), 6.0f);
             EXPECT_NEAR(top.y, LevelY(level), 5.0f);  // between bins it is 0.5 dB lower
+            const auto peaks = std::ranges::find(drawn.lines, Look::kPeaks, &Recording::Path::colour);
+            ASSERT_NE(peaks, drawn.lines.end());
+            for (std::size_t i = 0; i < curve.size(); ++i) ASSERT_LE(peaks->points[i].y, curve[i].y + 2.0f);
+        }
+}
+
+// Catches a spike where the curve ends: half the rate has no bin there, but its neighbours get some of it.
+TEST_F(Readings, CurveEndsWithoutASpike) {
+    std::vector<float> alternating(4096, 0.001f);
+    for (std::size_t i = 1; i < alternating.size(); i += 2) alternating[i] *= -1.0f;
+    kivspectrum::settings.time_smoothing = kivspectrum::settings.fft_length_auto = 0;
+    for (const std::int32_t length : {4096, 32768})
+        for (const int scale : {0, 1}) {
+            kivspectrum::settings.view_option_a = scale;
+            kivspectrum::settings.fft_length = length;
+            analyser.init();
+            analyser.Feed(alternating.data(), 4096, 1, 1);
+            ASSERT_TRUE(analyser.Refresh());
+            const auto drawn = ShowSpectrum();
+            auto end = drawn.lines.back().points;
+            std::erase_if(end, [&](const PointF& p) { return p.x < Centre(m_plot).x; });
+            for (const PointF& point : end) EXPECT_EQ(point.y, Bottom(m_plot)) << point.x;
+            EXPECT_FALSE(drawn.texts.back().text.starts_with("Peak"));
         }
 }
 

@@ -290,7 +290,7 @@ TEST_F(Curve, FindsTheHighestPeak) {
         peak.frequency /= kPerBin;
         return peak;
     };
-    for (const double bin : {1.0, 2.0, 3.0, 2046.0, 2047.0}) {
+    for (const double bin : {1.0, 2.0, 3.0, 2046.0}) {
         const auto peak = peakOf({{bin, -50.0}});
         EXPECT_NEAR(peak.frequency, bin, 0.35) << bin;
         EXPECT_NEAR(peak.level, -50.0, 1.0) << bin;

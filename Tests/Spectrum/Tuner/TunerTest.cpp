@@ -93,8 +93,8 @@ TEST_F(TunerTest, NamesWhatItShows) {
         for (const int none : {-1, 12}) EXPECT_STREQ(Tuner::GetNoteName(none), "");
     }
     // clang-format off
-    for (const auto& [cents, text] : {std::pair{12.34f, "+12.3c"}, {-0.26f, "-0.3c"}, {0.04f, "0.0c"},
-                                      {-0.04f, "0.0c"}, {9.96f, "+10.0c"}, {-49.95f, "-50.0c"}})
+    for (const auto& [cents, text] : {std::pair{12.34f, "+12.3c"}, {-0.26f, "\u22120.3c"}, {0.04f, "0.0c"},
+                                      {-0.04f, "0.0c"}, {9.96f, "+10.0c"}, {-49.95f, "\u221250.0c"}})
         // clang-format on
         EXPECT_EQ(Tuner::GetTuningErrorStr(cents), text) << cents;
     Tuner tuner;
