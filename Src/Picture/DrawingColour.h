@@ -11,7 +11,6 @@ using ColourReference = std::uint32_t;
 constexpr ColourReference ColourFromRgb(std::uint32_t rgb) {
     return (rgb & 0x0000FFu) << 16 | (rgb & 0x00FF00u) | (rgb & 0xFF0000u) >> 16;
 }
-constexpr std::uint32_t RgbFromColour(ColourReference colour) { return ColourFromRgb(colour); }
 
 constexpr std::uint8_t RedOf(ColourReference colour) { return static_cast<std::uint8_t>(colour); }
 constexpr std::uint8_t GreenOf(ColourReference colour) { return static_cast<std::uint8_t>(colour >> 8); }

@@ -6,9 +6,6 @@
 
 namespace Corvo {
 
-class Analyser;
-struct SpectrumSettings;
-
 // The analyser's pop-up menu, for hosts that do not write their own.
 //
 // A host makes a submenu for each group, in the table's order, with the group's name for its title and the
@@ -21,11 +18,8 @@ struct AnalyserMenuEntry {
     const char* text;
 
     // How the library carries it out; not for hosts.
-    struct Action {
-        void (*apply)(Analyser&, SpectrumSettings&, int value);
-        bool (*chosen)(const Analyser&, const SpectrumSettings&, int value);
-    };
-    Action action;
+    struct Action;
+    const Action* action;
     int value;
 };
 

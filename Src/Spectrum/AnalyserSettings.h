@@ -13,7 +13,7 @@ CriticalSection& AnalyserLock();
 
 // Stores the overlap, 1 and more (and what is not a number) as 0.99, and the hop length that follows from it.
 void StoreOverlap(SpectrumSettings& settings, float overlap);
-// The hop follows unless the overlap is negative, which is the host's own business.
+// The hop follows; a negative overlap leaves it as it is.
 void StoreWindowLength(SpectrumSettings& settings, int length);
 // The transform is never shorter than the window.
 void FitTransform(SpectrumSettings& settings);

@@ -2,8 +2,7 @@
 
 #include <mutex>
 
-#include "Spectrum/Analyser.h"
-#include "Spectrum/AnalyserMenu.h"
+#include "Spectrum/AnalyserAction.h"
 #include "Spectrum/AnalyserSettings.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/MessagePoster.h"
@@ -91,7 +90,7 @@ bool kivspectrum::popupmenu_process(int command) {
         const Lock classLock(AnalyserLock());
         if (command == kRedrawTunerPanel) needPrepareBitmap = true;
         const auto spectra = settings.smoothing_filter_length;
-        entry->action.apply(*m_analyser, settings, entry->value);
+        entry->action->apply(*m_analyser, settings, entry->value);
         // At once, even while lock_init is set.
         if (spectra != settings.smoothing_filter_length)
             for (const kivspectrum* const observer : Observers()) observer->m_analyser->FitFilter(settings);
@@ -104,7 +103,7 @@ bool kivspectrum::popupmenu_process(int command) {
 bool kivspectrum::popupmenu_checked(int command) const {
     const Lock classLock(AnalyserLock());
     const auto* const entry = Corvo::FindAnalyserMenuEntry(command);
-    return entry && entry->action.chosen(*m_analyser, settings, entry->value);
+    return entry && entry->action->chosen(*m_analyser, settings, entry->value);
 }
 
 bool kivspectrum::PrepareFFTForDrawing(int samplingRate, bool fastSmoothing, bool sonogramMode,

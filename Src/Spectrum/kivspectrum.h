@@ -16,6 +16,7 @@ class Tuner;
 namespace Corvo {
 class Analyser;
 class Sonogram;
+struct ViewAccess;
 struct PointF;
 struct RectF;
 }  // namespace Corvo
@@ -213,10 +214,10 @@ public:
     void DrawNeedle(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
     template <class Drawing>
     void DrawNeedleInfo(typename Drawing::DrawTarget& target, const Corvo::RectF& rectangle);
-    // What the drawing routines read of the inside.
-    struct ViewAccess;
 
 private:
+    friend struct Corvo::ViewAccess;  // what the drawing routines read of the inside
+
     void TellOfNote();
     void RunTuner(int samplingRate);
     void Tell(int message, std::intptr_t detail);

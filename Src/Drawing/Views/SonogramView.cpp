@@ -20,7 +20,7 @@ namespace {
 float MarkAt(float at, float first, float last) { return std::max(std::min(std::floor(at), last), first); }
 
 void DrawSonogramInfo(kivspectrum& analyser, DrawTarget& target, const RectF& plot) {
-    const PointF pointer = kivspectrum::ViewAccess::Pointer(analyser);
+    const PointF pointer = ViewAccess::Pointer(analyser);
     if (!Contains(plot, pointer)) return;
     const Sonogram& sonogram = *analyser.GetSonogram();
     const double rows = sonogram.GetBitmap().height;
@@ -126,7 +126,7 @@ void DrawPitchTrace(Sonogram& sonogram, DrawTarget& target, const RectF& rectang
     const DrawingBitmap& bitmap = sonogram.GetBitmap();
     if (!IsDrawable(rectangle) || bitmap.IsEmpty()) return;
     const CoordinatesAndFrequencies& map = sonogram.GetFrequencyMap();
-    std::vector<PointF>& trace = Sonogram::ViewAccess::Trace(sonogram);
+    std::vector<PointF>& trace = ViewAccess::Trace(sonogram);
     constexpr float kLargestStep = 1.09f;  // one and a half semitones from column to column is another note
     const float perRow = rectangle.height / static_cast<float>(bitmap.height);
     const float perColumn = rectangle.width / static_cast<float>(bitmap.width);
@@ -157,7 +157,7 @@ void DrawPitchTrace(Sonogram& sonogram, DrawTarget& target, const RectF& rectang
 void DrawSonogramAs(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle,
                     const SpectrumSettings& view) {
     if (!IsDrawable(rectangle)) return;
-    const std::lock_guard lock(kivspectrum::ViewAccess::Lock(analyser));
+    const std::lock_guard lock(ViewAccess::Lock(analyser));
     Sonogram& sonogram = *analyser.GetSonogram();
     const SonogramLayout layout = LayOutSonogram(target, rectangle, view);
     sonogram.CheckPixelBufferSize(layout.plot, 0);
@@ -177,7 +177,7 @@ void DrawSonogram(kivspectrum& analyser, DrawTarget& target, const RectF& rectan
 }
 
 void DrawIntensityScale(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
-    const std::lock_guard lock(kivspectrum::ViewAccess::Lock(analyser));
+    const std::lock_guard lock(ViewAccess::Lock(analyser));
     DrawIntensityScale(*analyser.GetSonogram(), target, rectangle);
 }
 

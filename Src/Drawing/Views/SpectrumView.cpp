@@ -83,7 +83,7 @@ void DrawCurve(DrawTarget& target, const RectF& plot, const CoordinatesAndFreque
 // peak, in its colour, where that does not hide much of it. A band's level is not its highest bin's.
 void DrawSpectrumInfo(kivspectrum& analyser, DrawTarget& target, const RectF& plot,
                       const CoordinatesAndFrequencies& map) {
-    const PointF pointer = kivspectrum::ViewAccess::Pointer(analyser);
+    const PointF pointer = ViewAccess::Pointer(analyser);
     if (Contains(plot, pointer)) {
         const Stroke hair{{Look::kPointer, 110}, std::max(std::round(target.Scale()), 1.0f)};
         target.Line({pointer.x, plot.y}, {pointer.x, Bottom(plot)}, hair);
@@ -133,15 +133,14 @@ ShortText DescribeSpectrum(double hz, double level, LevelScale scale) {
 
 void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle,
                     const SpectrumSettings& view) {
-    using Access = kivspectrum::ViewAccess;
     if (!IsDrawable(rectangle)) return;
-    const std::lock_guard lock(Access::Lock(analyser));
+    const std::lock_guard lock(ViewAccess::Lock(analyser));
     SpectrumDrawer& drawer = *analyser.GetSpectrumDrawer();
     const SpectrumLayout layout = LayOutSpectrum(target, rectangle, view);
     const RectF& plot = layout.plot;
     const int prepared = drawer.GetSamplingFrequency();
     const CoordinatesAndFrequencies map =
-        SpectrumMap(plot, view, prepared > 0 ? prepared : Access::SamplingRate(analyser));
+        SpectrumMap(plot, view, prepared > 0 ? prepared : ViewAccess::SamplingRate(analyser));
     target.PushClip(rectangle);
     target.FillRectangle(rectangle, {Look::kGround});
     target.FillRectangle(plot, {Look::kPlot});
@@ -161,7 +160,7 @@ void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     if (analyser.GetTunerOn() && Tuner::GetShowDenoisedSpectrum() && !denoised.empty())
         other(denoised, Look::kTrace);
     drawer.ComputeSpectrumPoints(plot, nullptr, count, map, kMode, 0, 0.0f, &drawer.GetPowerSmoothed());
-    DrawCurve(target, plot, map, drawer.GetXYPoints(), CurveStyleOf(view), Access::Outline(analyser));
+    DrawCurve(target, plot, map, drawer.GetXYPoints(), CurveStyleOf(view), ViewAccess::Outline(analyser));
     target.PopClip();
     if (analyser.IsShowInfoBox() && view.view_flag_c != 0) DrawSpectrumInfo(analyser, target, plot, map);
     target.PopClip();

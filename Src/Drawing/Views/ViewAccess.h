@@ -8,19 +8,20 @@
 #include "Spectrum/kivspectrum.h"
 
 // What the views need of an analyser beside its public operations. Only this file knows where it is kept.
-struct kivspectrum::ViewAccess {
+namespace Corvo {
+
+struct ViewAccess {
     // Held while what the display thread prepares is drawn.
-    static Corvo::CriticalSection& Lock(const kivspectrum& a) { return a.m_analyser->GetLock(); }
-    static Corvo::PointF Pointer(const kivspectrum& a) {
-        const Corvo::AnalyserState& state = a.m_analyser->state;
+    static CriticalSection& Lock(const kivspectrum& a) { return a.m_analyser->GetLock(); }
+    static PointF Pointer(const kivspectrum& a) {
+        const AnalyserState& state = a.m_analyser->state;
         return {state.pointerX, state.pointerY};
     }
     static int SamplingRate(const kivspectrum& a) { return a.m_analyser->state.samplingRate; }
     static bool IsTunerVisible(const kivspectrum& a) { return a.m_analyser->state.tunerVisible; }
     // Memory that one picture leaves to the next.
-    static std::vector<Corvo::PointF>& Outline(kivspectrum& a) { return a.m_outline; }
-};
-
-struct Corvo::Sonogram::ViewAccess {
+    static std::vector<PointF>& Outline(kivspectrum& a) { return a.m_outline; }
     static std::vector<PointF>& Trace(Sonogram& sonogram) { return sonogram.m_trace; }
 };
+
+}  // namespace Corvo

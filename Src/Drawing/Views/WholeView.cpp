@@ -32,7 +32,7 @@ void DrawWhole(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle
     constexpr float kShare = 0.25f, kLeast = 36.0f, kMost = 180.0f;
     const float wanted =
         std::clamp(kShare * rectangle.height, kLeast * target.Scale(), kMost * target.Scale());
-    const bool tuner = kivspectrum::ViewAccess::IsTunerVisible(analyser);
+    const bool tuner = ViewAccess::IsTunerVisible(analyser);
     const float strip = tuner ? std::min(std::round(wanted), rectangle.height) : 0.0f;
     const RectF rest = Shrunk(rectangle, 0.0f, strip, 0.0f, 0.0f);
     DrawTuner(analyser, target, {rectangle.x, rectangle.y, rectangle.width, strip});

@@ -27,7 +27,6 @@ void VectorInterpolationFilterFloat::Resize(int spectra, int bins) {
 }
 
 int VectorInterpolationFilterFloat::GetSpectra() const { return static_cast<int>(m_weights.size()); }
-int VectorInterpolationFilterFloat::GetBins() const { return static_cast<int>(m_bins); }
 
 void VectorInterpolationFilterFloat::Average(const std::vector<float>& newest, std::vector<float>& average) {
     const std::size_t spectra = m_weights.size();

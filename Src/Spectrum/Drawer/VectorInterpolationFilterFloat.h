@@ -15,7 +15,6 @@ public:
     // Room for `spectra` spectra of `bins` values, all zero; 0 or less empties the filter.
     void Resize(int spectra, int bins);
     int GetSpectra() const;
-    int GetBins() const;
 
     // Stores `newest` as the current spectrum, writes the weighted sum of all into `average` and moves on.
     // Works on as many bins as both vectors and the filter have; an empty filter does nothing.

@@ -13,6 +13,8 @@ class SpectrumDrawer;
 
 namespace Corvo {
 
+struct ViewAccess;
+
 class SonogramColumn;
 class SonogramRows;
 struct SonogramAxis;
@@ -114,10 +116,10 @@ public:
     void DrawTimeline(typename Drawing::DrawTarget& target, const RectF& rectangle);
     template <class Drawing>
     void DrawPitchTrace(typename Drawing::DrawTarget& target, const RectF& rectangle);
-    // What the drawing routines keep inside.
-    struct ViewAccess;
 
 private:
+    friend struct ViewAccess;  // what the drawing routines keep inside
+
     static constexpr int kShades = 1024;
 
     SonogramAxis Axis() const;
