@@ -82,26 +82,24 @@ TEST_F(kivspectrumTest, DerivesTheHopFromTheOverlap) {
 // half the rate share entry 0.
 TEST_F(kivspectrumTest, TransformsTheNewestWindow) {
     Settings().window_length = 256;
-    Settings().window_type = 0;
-    Settings().time_smoothing = 0;
+    Settings().window_type = Settings().time_smoothing = 0;
     kivspectrum analyser;
-    Feed(analyser, Values(256, 1.0f));
-    EXPECT_FALSE(Prepare(analyser)) << "not on";
-    analyser.SetOn(true);
-    EXPECT_TRUE(analyser.PrepareFFTForDrawing(48000, true, false, false, true)) << "a look takes nothing";
-    EXPECT_TRUE(Prepare(analyser));
-    EXPECT_FALSE(Prepare(analyser));
-    Values expected(128, 0.0f);
+    Values expected(128, 0.0f), constant(256, 1.0f), alternating = constant;
     expected[0] = 256.0f * 256.0f;
-    EXPECT_EQ(analyser.GetPower(), expected);
-    EXPECT_EQ(analyser.GetSpectrumDrawer()->GetPowerSmoothed(), expected);
-    Values nyquist(255);
-    for (std::size_t i = 0; i < nyquist.size(); ++i) nyquist[i] = i % 2 ? 1.0f : -1.0f;
-    Feed(analyser, nyquist);
-    EXPECT_FALSE(Prepare(analyser));
-    Feed(analyser, {1.0f});
-    EXPECT_TRUE(Prepare(analyser));
-    EXPECT_EQ(analyser.GetPower(), expected);
+    for (std::size_t i = 0; i < 256; i += 2) alternating[i] = -1.0f;
+    for (const auto& samples : {constant, alternating}) {
+        analyser.SetOn(false);
+        Feed(analyser, {samples.begin(), samples.end() - 1});
+        analyser.SetOn(true);
+        EXPECT_FALSE(Prepare(analyser)) << "one is missing";
+        Feed(analyser, {samples.back()});
+        analyser.SetOn(false);
+        EXPECT_FALSE(Prepare(analyser)) << "not on";
+        analyser.SetOn(true);
+        EXPECT_TRUE(analyser.PrepareFFTForDrawing(48000, true, false, false, true)) << "a look takes nothing";
+        EXPECT_TRUE(Prepare(analyser));
+        EXPECT_EQ(analyser.GetPower(), expected);
+    }
 }
 
 }  // namespace

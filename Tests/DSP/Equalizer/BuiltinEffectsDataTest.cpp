@@ -48,18 +48,6 @@ Words BandOf(Data& data, int i) {
     return {data.GetEqType(i), data.GetEqFreq(i), data.GetEqBoost(i), data.GetEqQ(i)};
 }
 
-TEST(BuiltinEffectsData, StartsWithThreeFlatBands) {
-    Data data;
-    EXPECT_EQ(BandOf(data, 0), (Words{6, 100, 0, 50}));
-    EXPECT_EQ(BandOf(data, 1), (Words{2, 2500, 0, 200}));
-    EXPECT_EQ(BandOf(data, 2), (Words{5, 6000, 0, 50}));
-    // Only the boost goes for a number that names no default, and bands behind the third stay.
-    data.SetEqData(5, {4, 77, 30, 9});
-    data.defaults(5, 3);
-    data.defaults();
-    EXPECT_EQ(BandOf(data, 5), (Words{4, 77, 0, 9}));
-}
-
 // Who is told what by which operation; from a band 1 that is a bypassed peak of 2500 Hz, 6 dB, Q 300. The
 // setters are called twice: the second call changes nothing.
 TEST(BuiltinEffectsData, TellsTheRightListeners) {
@@ -111,8 +99,6 @@ TEST(BuiltinEffectsData, CopiesHaveListenersOfTheirOwn) {
         Data data;
         for (const char letter : {'1', '2', '3'})
             data.structure_changed.Add(std::make_unique<Scribe<>>(log, letter));
-        data.reserved = {1, 2, 3, 4};
-        data.SetPhaseShift(true);
         Data copy(data), assigned;
         assigned.structure_changed.Add(std::make_unique<Scribe<>>(log, 'x'));
         assigned = copy;
@@ -122,8 +108,6 @@ TEST(BuiltinEffectsData, CopiesHaveListenersOfTheirOwn) {
         assigned.SetNumBands(1);
         EXPECT_EQ(log, "123") << "in the order of their addition, the head last";
         EXPECT_EQ(copy.GetNumBands(), 3);
-        EXPECT_EQ(assigned.reserved, data.reserved);
-        EXPECT_TRUE(assigned.GetPhaseShift());
     }
     EXPECT_EQ(Scribe<>::s_alive.use_count(), 1);
 }

@@ -107,25 +107,16 @@ TEST_F(TunerAnalyserTest, LetsTimePassWithoutFrames) {
     EXPECT_FALSE(m_tuner.IsTuned());
 }
 
-// However it is switched on, the tuner has forgotten old notes. The harmonic product's overtones count half.
+// However it is switched on, the tuner has forgotten old notes.
 TEST_F(TunerAnalyserTest, ForgetsOldNotesWhenSwitchedOn) {
-    Tuner::SetDetectionMethod(1);
     void (*const switches[])(kivspectrum&, bool) = {[](kivspectrum& a, bool on) { a.SetTunerOn(on); },
                                                     [](kivspectrum& a, bool) { a.ToggleTuner(); },
                                                     [](kivspectrum& a, bool) { a.popupmenu_process(1283); }};
-    const auto sound = TunerSounds::Sound(Kind::Sawtooth, 441.0, kRate, 8192, 0.3);
     for (const auto& turn : switches) {
-        for (int i = 0; i < 2; ++i) Tune(sound);
+        for (int i = 0; i < 2; ++i) Tune(TestSupport::Sine<float>(8192, 441.0, kRate));
         EXPECT_TRUE(m_tuner.IsTuned());
-        for (const bool halve : {true, false}) {
-            Tuner other;
-            for (int i = 0; i < 2; ++i)
-                other.Tune(m_analyser.GetPower(), {}, 8192, 1, 8192, kRate, halve, false);
-            EXPECT_EQ(m_tuner.GetProminence() == other.GetProminence(), halve);
-        }
         for (const bool on : {false, true}) turn(m_analyser, on);
-        EXPECT_TRUE(m_analyser.GetTunerOn());
-        EXPECT_FALSE(m_tuner.IsTuned());
+        EXPECT_TRUE(m_analyser.GetTunerOn() && !m_tuner.IsTuned());
     }
 }
 

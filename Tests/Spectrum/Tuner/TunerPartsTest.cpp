@@ -36,7 +36,6 @@ TEST(HarmonicProductTest, SearchesAPeakBetweenValleys) {
     for (const Case& c : {
              Case{"misses the peak",                      {9, 1, 5, 100, 4, 1, 9},         0, 7, 20.0,    3, 20.0},
              Case{"accepts less than the limit",          {9, 1, 5, 100, 4, 1, 9},         0, 7, 20.001, -1, 0.0},
-             Case{"stops before the valley",              {9, 1, 10, 20, 1000, 20, 10, 9}, 0, 8, 0.0,    -1, 0.0},
              Case{"takes the deeper of two valleys",      {9, 1, 8, 4, 100, 2, 8, 1, 9},   0, 9, 0.0,     4, kUneven},
              Case{"wants valleys deeper than both sides", {9, 4, 4, 100, 2, 2, 9},         0, 7, 0.0,     3, kUneven},
              Case{"takes the last bin for a valley",      {9, 1, 5, 100, 4},               0, 5, 0.0,    -1, 0.0},
@@ -65,16 +64,15 @@ TEST(SpectrumFloorTest, FindsTheNoiseBelowThePeaks) {
     for (const bool tones : {false, true}) {
         double sum = 0.0;
         for (int frame = 0; frame < 50; ++frame) {
-            for (std::size_t k = 0; k < kBins; ++k) {
-                power[k] = static_cast<float>(-3.0 * std::log(1.0 - random.Unit()));
-                if (tones && k % 10 < 5) power[k] = 1e6f;
-            }
+            for (std::size_t k = 0; k < kBins; ++k)
+                power[k] =
+                    tones && k % 10 < 5 ? 1e6f : static_cast<float>(-3.0 * std::log(1.0 - random.Unit()));
             measure.Measure(power, floor);
-            for (const float value : floor) sum += value;
+            for (const float value : floor) sum += value / (50.0 * kBins * 3.0);
         }
-        const double decibels = 10.0 * std::log10(sum / (50.0 * kBins) / 3.0);
         // Half the bins gone, the quarter is the half of those that are left: ln 2 instead of ln 4/3.
-        EXPECT_NEAR(decibels, tones ? 10.0 * std::log10(std::log(2.0) / std::log(4.0 / 3.0)) : 0.0, 1.0);
+        const double expected = tones ? std::log(2.0) / std::log(4.0 / 3.0) : 1.0;
+        EXPECT_NEAR(10.0 * std::log10(sum / expected), 0.0, 1.0);
     }
 }
 

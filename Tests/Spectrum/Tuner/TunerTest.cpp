@@ -79,10 +79,6 @@ TEST_F(TunerTest, NamesWhatItShows) {
         EXPECT_EQ(Tuner::GetTuningErrorStr(cents), text) << cents;
     Tuner tuner;
     EXPECT_EQ(tuner.GetTuningErrorStr(), "");
-    for (int preset = 0; preset < 7; ++preset) {
-        tuner.SetSensibilityPreset(preset);
-        EXPECT_EQ(tuner.GetSensibilityPreset(), kSensitivityRows[std::min(preset, 5)].reported);
-    }
 }
 
 // Notes by frequency over the octaves, which change at C; positive is sharp.
@@ -135,6 +131,7 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
         Display display;
         tuner.SetDisplayListener(&display);
         tuner.SetSensibilityPreset(preset);
+        EXPECT_EQ(tuner.GetSensibilityPreset(), row.reported);
         const auto times = [&](int count, const std::vector<float>& samples) {
             for (int i = 0; i < count; ++i) probe.Tune(samples.data());
         };

@@ -9,7 +9,6 @@
 
 using namespace TestSupport;
 using Corvo::DSP::TubeDistorsion;
-using Corvo::DSP::VirtualTubeAmp;
 
 namespace {
 
@@ -80,18 +79,6 @@ TEST(TubeDistorsionTest, ShapesLikeThePlainForm) {
     }
 }
 
-// The virtual operations are what a host may call itself; here the exact digits of each function.
-TEST(TubeDistorsionTest, VirtualShapersGiveTheFunctions) {
-    const VirtualTubeAmp amp;
-    for (double x = -1.5; x <= 1.5; x += 0.01) {
-        EXPECT_NEAR(amp.Martens(x, 3.0), 4 * std::clamp(x, -1.0, 1.0) / (3 * std::min(std::abs(x), 1.0) + 1),
-                    1e-15);
-        EXPECT_NEAR(amp.DoidicS(x, 0.5), Plain::TubeShape(1, x, 0.5), 1e-15);
-        EXPECT_NEAR(amp.DoidicA(x, 0.5), Plain::TubeShape(2, x, 0.5), 1e-14);
-        EXPECT_NEAR(amp.ArayaS(x, 0.5), Plain::TubeShape(3, x, 0.5), 1e-15);
-    }
-}
-
 // At drive 0.9901 the sine is 1 and its shape factor would be infinite.
 TEST(TubeDistorsionTest, MartensStaysFiniteAtItsSteepest) {
     for (float drive = 0.9890f; drive < 0.9912f; drive += 0.00001f) {
@@ -128,13 +115,12 @@ TEST(TubeDistorsionTest, ToneIsALowPassOfOrderFour) {
 TEST(TubeDistorsionTest, FloatsAndMonoGetTheSame) {
     TubeDistorsion stereo, mono, floats;
     for (auto* tube : {&stereo, &mono, &floats}) tube->SetPreset(3);
-    const auto left = Channel(RenderNoise(stereo), 0);
-    EXPECT_EQ(Render(mono, Channel(kNoise, 0), Format<double>(1), {128}), left);
-    const auto single =
-        Render(floats, std::vector<float>(kNoise.begin(), kNoise.end()), Format<float>(), {128});
+    const auto output = RenderNoise(stereo);
+    EXPECT_EQ(Render(mono, Channel(kNoise, 0), Format<double>(1), {128}), Channel(output, 0));
+    const auto single = Render<float>(floats, {kNoise.begin(), kNoise.end()}, Format<float>(), {128});
     // "70s Muff" amplifies small samples about 40 times.
-    for (std::size_t i = 0; i < left.size(); ++i)
-        ASSERT_NEAR(static_cast<double>(single[2 * i]), left[i], 2e-5);
+    for (std::size_t i = 0; i < single.size(); ++i)
+        ASSERT_NEAR(static_cast<double>(single[i]), output[i], 2e-5);
 }
 
 // A change of the factor in mid-stream: the new filters must come in warm, so that a slow sine goes on
@@ -184,13 +170,8 @@ TEST(TubeDistorsionTest, LatencyIsTheDelayOfBothFilters) {
     TubeDistorsion tube;
     EXPECT_EQ(tube.GetLatency(), 0);
     SetBoth(tube, kOversampling, 1.0f);
-    // Group delay at DC of a Butterworth of order 10 behind the bilinear transform, up and down.
-    const double delay =
-        2 / std::sin(std::numbers::pi / 20) / (2 * std::tan(std::numbers::pi * 0.455 / 16)) / 16;
-    EXPECT_EQ(tube.GetLatency(), std::lround(delay));
     std::vector<double> ramp(2 * 400);
     for (std::size_t i = 0; i < ramp.size(); ++i) ramp[i] = static_cast<double>(i / 2) * 1e-3;
     const auto output = Render(tube, ramp, Format<double>(), {400});
-    // The first filter's images come back through the second one, 130 dB down.
-    EXPECT_NEAR((ramp.back() - output.back()) / 1e-3, delay, 1e-3);
+    EXPECT_EQ(tube.GetLatency(), std::lround((ramp.back() - output.back()) / 1e-3));
 }
