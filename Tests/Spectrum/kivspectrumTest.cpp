@@ -10,7 +10,6 @@
 
 namespace {
 
-using Values = std::vector<float>;
 using Complex = std::complex<double>;
 
 class kivspectrumTest : public AnalyserTest {};
@@ -68,37 +67,12 @@ TEST_F(kivspectrumTest, ShowsASineThroughItsWindow) {
 
 TEST_F(kivspectrumTest, DerivesTheHopFromTheOverlap) {
     for (const auto& [overlap, stored, hop] : {std::tuple{1.0f, 0.99f, 40},
-                                               {0.75f, 0.75f, 1024},
                                                {-1.0f, -1.0f, 8192},
                                                {0.995f, 0.995f, 40},
                                                {std::nanf(""), 0.99f, 40}}) {
         kivspectrum::SetAnalysisWindowsOverlap(overlap);
         EXPECT_EQ(Settings().overlap, stored) << overlap;
         EXPECT_EQ(Settings().hop_length, hop) << overlap;
-    }
-}
-
-// Until a frame's worth of samples came there is nothing to draw; afterwards the newest samples count. DC and
-// half the rate share entry 0.
-TEST_F(kivspectrumTest, TransformsTheNewestWindow) {
-    Settings().window_length = 256;
-    Settings().window_type = Settings().time_smoothing = 0;
-    kivspectrum analyser;
-    Values expected(128, 0.0f), constant(256, 1.0f), alternating = constant;
-    expected[0] = 256.0f * 256.0f;
-    for (std::size_t i = 0; i < 256; i += 2) alternating[i] = -1.0f;
-    for (const auto& samples : {constant, alternating}) {
-        analyser.SetOn(false);
-        Feed(analyser, {samples.begin(), samples.end() - 1});
-        analyser.SetOn(true);
-        EXPECT_FALSE(Prepare(analyser)) << "one is missing";
-        Feed(analyser, {samples.back()});
-        analyser.SetOn(false);
-        EXPECT_FALSE(Prepare(analyser)) << "not on";
-        analyser.SetOn(true);
-        EXPECT_TRUE(analyser.PrepareFFTForDrawing(48000, true, false, false, true)) << "a look takes nothing";
-        EXPECT_TRUE(Prepare(analyser));
-        EXPECT_EQ(analyser.GetPower(), expected);
     }
 }
 

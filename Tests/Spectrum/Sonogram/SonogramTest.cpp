@@ -83,13 +83,11 @@ protected:
 
 TEST_F(SonogramTest, BringsTheColumnsOfItsSpeed) {
     m_sonogram.CheckPixelBufferSize(Size(500, 4), 0);
-    constexpr int kColumns[] = {5, 10, 15, 30, 60, 90, 150, 300, 450},
-                  kCounters[] = {6, 3, 2, 1, -1, -2, -4, -9, -14};
+    constexpr int kColumns[] = {5, 10, 15, 30, 60, 90, 150, 300, 450};
     for (int index = 0; index < 9; ++index) {
         Corvo::Sonogram::SetSpeedIndex(index);
         m_sonogram.Clear();
         for (int refresh = 0; refresh < 30; ++refresh) Step(0.0);
-        EXPECT_EQ(m_sonogram.GetDrawCounter(), kCounters[index]);
         int columns = 0;
         for (int back = 0; back < 500; ++back) columns += LevelAt(back, 2) > -kRange;
         EXPECT_EQ(columns, kColumns[index]);
@@ -107,7 +105,6 @@ TEST_F(SonogramTest, ColoursLevels) {
         EXPECT_EQ(m_sonogram.ColorFromAmplitude(-60.0f, false), low) << scheme;
         EXPECT_EQ(m_sonogram.ColorFromAmplitude(-30.0f, false), high) << scheme;
     }
-    EXPECT_EQ(m_sonogram.ColorFromAmplitude(-45.0f, false), 0x7D0A80u);
     EXPECT_EQ(m_sonogram.ColorFromAmplitude(kNan, false), 0u);
     EXPECT_EQ(m_sonogram.ColorFromAmplitude(10.0f, false), 0xFFFFFFu);
     EXPECT_EQ(m_sonogram.ColorFromAmplitude(-22.5f, true), 0x404FE5u) << "blue comes first";
@@ -138,37 +135,34 @@ TEST_F(SonogramTest, LosesNoBin) {
         }
 }
 
-// From the samples to the pixel: 60 dB below full scale is the colour of a third of the range.
-TEST_F(SonogramTest, LightsASineInItsRow) {
-    Settings() = m_record;
+// While it is shown and not frozen, with each refresh; with the pitch while the tuner is on.
+TEST_F(SonogramTest, AdvancesWithTheAnalyser) {
+    constexpr double kHz = 56.0 * kRate / 8192.0;
+    const auto sine = TestSupport::Sine<float>(8192, kHz, kRate, 1.0);
+    Settings().time_smoothing = 0;
     kivspectrum analyser;
-    analyser.SetOn(true);
-    auto& sonogram = *analyser.GetSonogram();
-    sonogram.CheckPixelBufferSize(Size(20, 300), 0);
-    Feed(analyser, TestSupport::Sine<float>(2 * kBins, 3750.0, kRate, 0.001));
-    ASSERT_TRUE(Prepare(analyser, kRate));
-    EXPECT_FALSE(analyser.AdvanceSonogram()) << "not shown";
-    analyser.ShowSonogram(true);
-    EXPECT_TRUE(analyser.AdvanceSonogram());
-    EXPECT_TRUE(analyser.Refresh()) << "no new frame: the column again";
-    const auto& picture = sonogram.GetBitmap();
-    const int row = 299 - static_cast<int>(300.0 * std::log(3750.0 / 20.0) / std::log(24000.0 / 20.0));
-    for (const int column : {18, 19}) EXPECT_LE(Difference(picture.Row(row)[column], 0x1E00FF), 1);
-    EXPECT_EQ(picture.Row(row)[17] | (picture.Row(row - 60)[19] & 0xFFFFFF), 0u);
-    analyser.SetFrozen(true);
-    EXPECT_FALSE(analyser.AdvanceSonogram());
-    // And the pitch, while the tuner is on.
     analyser.ToggleTuner();
     analyser.set_parameters(kRate);
-    Feed(analyser, TestSupport::Sine<float>(8192, 330.0, kRate));
+    auto& sonogram = *analyser.GetSonogram();
+    sonogram.CheckPixelBufferSize(Size(20, 300), 0);
+    Feed(analyser, sine);
+    EXPECT_TRUE(analyser.Refresh());
+    EXPECT_FALSE(analyser.AdvanceSonogram()) << "not shown";
+    analyser.ShowSonogram(true);
     for (const bool on : {true, false}) {
         analyser.SetTunerOn(on);
-        EXPECT_TRUE(analyser.Refresh());
-        EXPECT_NEAR(sonogram.GetPitch(19), on ? 330.0 : 0.0, 0.1);
+        Feed(analyser, sine);
+        for (int i = 0; i < 2; ++i) EXPECT_TRUE(analyser.Refresh());
+        EXPECT_NEAR(sonogram.GetPitch(18), on ? kHz : 0.0, 0.1);
     }
+    const int row = 299 - static_cast<int>(300.0 * std::log(kHz / 20.0) / std::log(24000.0 / 20.0));
+    for (const int column : {16, 17, 18, 19}) EXPECT_EQ(sonogram.GetBitmap().Row(row)[column], 0xFFFFFFFF);
+    EXPECT_EQ(sonogram.GetBitmap().Row(row)[15], 0u);
+    analyser.SetFrozen(true);
+    EXPECT_FALSE(analyser.AdvanceSonogram());
 }
 
-// A frame that comes between two columns waits for the next one; those after it repeat it.
+// A frame that comes between two columns waits for the next one.
 TEST_F(SonogramTest, LeadsFromOneSpectrumToTheNext) {
     Corvo::Sonogram::SetSpeedIndex(7);
     Step(-80.0);

@@ -91,14 +91,11 @@ TEST_F(TunerTest, FindsTheNearestNote) {
         EXPECT_NEAR(probe.tuner.GetErrorCents(), cents, 0.1) << semitones;
         EXPECT_NEAR(CentsBetween(probe.tuner.GetFrequency(), 440.0), 100.0 * semitones, 0.1);
     };
-    for (const auto& [semitones, name, octave, cents] : {std::tuple{-9.0, "C", 4, 0.0},
-                                                         {-10.0, "B", 3, 0.0},
-                                                         {0.3, "A", 4, 30.0},
-                                                         {-0.3, "A", 4, -30.0},
-                                                         {0.7, "A#", 4, -30.0},
-                                                         {-37.0, "G#", 1, 0.0},
-                                                         {39.0, "C", 8, 0.0}})
-        expectNote(semitones, name, octave, cents);
+    expectNote(-9, "C", 4, 0);
+    expectNote(-10, "B", 3, 0);
+    expectNote(0.3, "A", 4, 30);
+    expectNote(0.7, "A#", 4, -30);
+    expectNote(-37, "G#", 1, 0);
     TunerProbe probe;
     EXPECT_FALSE(probe.tuner.IsTuned() || probe.tuner.IsTunedCentered());
     probe.Show(Sharp(-1.5).data());
@@ -217,21 +214,19 @@ TEST_F(TunerTest, HearsNothingInNoise) {
 }
 
 TEST_F(TunerTest, SurvivesBadSpectraAndAllocatesNothing) {
-    Tuner tuner;
-    tuner.Tune({}, {}, 8192, -1, 8192, kTunerRate, true, false);
+    Tuner::SetShowDenoisedSpectrum(true);
     for (int method = 0; method < 5; ++method) {
         Tuner::SetDetectionMethod(method);
+        TunerProbe probe;
         for (const float value : {0.0f, -1.0f, INFINITY, NAN, 1e-40f})
-            for (const std::size_t size : {1u, 2u, 40u, 10000u})
+            for (const std::size_t size : {0u, 1u, 2u, 40u, 10000u})
                 for (const int length : {-1, 1, 2, 8192, 1 << 30}) {
                     std::vector<float> power(size, value);
                     if (size > 20) power[20] = 1e6f;
                     for (const int rate : {0, 1, 1 << 30})
-                        tuner.Tune(power, {}, length, length, length / 2, rate, true, size % 2 == 0);
-                    EXPECT_TRUE(std::isfinite(tuner.GetFrequency()) && std::isfinite(tuner.GetErrorCents()));
+                        probe.tuner.Tune(power, {}, length, length, length / 2, rate, true, size % 2 == 0);
+                    EXPECT_TRUE(std::isfinite(probe.tuner.GetFrequency() + probe.tuner.GetErrorCents()));
                 }
-        Tuner::SetShowDenoisedSpectrum(true);
-        TunerProbe probe;
         const auto sound = TunerSounds::Sound(TunerSounds::Kind::Sawtooth, 110.0, kTunerRate, kLength, 0.0);
         const auto& power = probe.Transform(sound.data());
         probe.Tune(power);
