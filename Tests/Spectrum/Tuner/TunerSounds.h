@@ -31,7 +31,8 @@ inline double Amplitude(Kind kind, int n) {
 // simple ratio.
 inline std::vector<float> Sound(Kind kind, double f0, int rate, std::size_t frames, double phase) {
     std::vector<double> sum(frames);
-    for (int n = 1; Ratio(kind, n) * f0 < 0.45 * rate; ++n, phase += 0.51) {
+    for (int n = 1; Ratio(kind, n) * f0 < 0.45 * rate; ++n, phase += 0.382) {
+        if (Amplitude(kind, n) == 0.0) continue;
         const double decay = kind == Kind::Piano ? 0.5 * n / rate : 0.0;
         // A rotating vector stays exact enough over some ten thousand samples.
         const auto step = std::polar(std::exp(-decay), 2.0 * std::numbers::pi * Ratio(kind, n) * f0 / rate);
