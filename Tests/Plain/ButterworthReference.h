@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <complex>
 #include <cstddef>
 #include <numbers>
 #include <vector>
@@ -53,16 +52,6 @@ inline std::vector<double> Convert(const std::vector<double>& input, int up, int
             untilRead = untilRead == 0 ? down - 1 : untilRead - 1;
         }
     return output;
-}
-
-// The analogue low-pass at what a fraction of the raised rate stands for: its ten poles lie on the left half
-// of the unit circle.
-inline std::complex<double> ButterworthResponse(double frequency, double cutoff) {
-    using std::numbers::pi;
-    const std::complex<double> s(0.0, std::tan(pi * frequency) / std::tan(pi * cutoff));
-    std::complex<double> response = 1.0;
-    for (int k = 0; k < 10; ++k) response /= s - std::polar(1.0, pi * (11 + 2 * k) / 20);
-    return response;
 }
 
 }  // namespace Plain

@@ -18,12 +18,11 @@ public:
           m_rover(m_latency),
           m_expected(m_step * 2.0 * kPi / size),
           m_binWidth(static_cast<double>(rate) / size) {
-        const auto n = static_cast<std::size_t>(size);
-        for (auto* array : {&m_input, &m_output, &m_magnitude, &m_frequency, &m_real}) array->resize(n);
-        m_accumulator.resize(2 * n);
-        m_lastPhase.resize(n);
-        m_phaseSum.resize(n);
         for (int k = 0; k < size; ++k) m_window.push_back(0.5 - 0.5 * std::cos(2.0 * kPi * k / size));
+        const auto n = m_window.size();
+        for (auto* array : {&m_input, &m_output}) array->resize(n);
+        for (auto* array : {&m_lastPhase, &m_phaseSum}) array->resize(n);
+        m_accumulator.resize(2 * n);
     }
 
     void Run(float* samples, int frames, int stride, float factor) {
@@ -41,48 +40,39 @@ private:
     static constexpr double kPi = std::numbers::pi;
 
     void Frame() {
-        const auto bins = static_cast<std::size_t>(m_size / 2) + 1, size = static_cast<std::size_t>(m_size);
-        m_magnitude.assign(size, 0.0f);
-        m_frequency.assign(size, 0.0f);
+        const auto bins = static_cast<std::size_t>(m_size / 2) + 1, step = static_cast<std::size_t>(m_step);
+        std::vector<float> magnitudes(bins), frequencies(bins);
         for (std::size_t k = 0; k < bins; ++k) {
             const auto bin = static_cast<double>(k);
             const double re = static_cast<float>(m_input[k] * m_window[k]), im = 0.0;
-            const auto magnitude = static_cast<float>(2.0 * std::sqrt(re * re + im * im));
             const double phase = std::atan2(im, re);
-            double d = phase - m_lastPhase[k];
+            double d = phase - m_lastPhase[k] - bin * m_expected;
             m_lastPhase[k] = phase;
-            d -= bin * m_expected;
             int q = static_cast<int>(d / kPi);
             q += q >= 0 ? q & 1 : -(q & 1);
-            d -= kPi * q;
-            d = m_oversampling * d / (2.0 * kPi);
-            const auto frequency = static_cast<float>(bin * m_binWidth + d * m_binWidth);
+            d = m_oversampling * (d - kPi * q) / (2.0 * kPi);
             const auto j = static_cast<std::size_t>(static_cast<float>(k) * m_pitch);
             if (j >= bins) continue;
-            m_magnitude[j] += magnitude;
-            m_frequency[j] = frequency * m_pitch;
+            magnitudes[j] += static_cast<float>(2.0 * std::sqrt(re * re + im * im));
+            frequencies[j] = static_cast<float>(bin * m_binWidth + d * m_binWidth) * m_pitch;
         }
-        m_real.assign(size, 0.0f);
         for (std::size_t k = 0; k < bins; ++k) {
             const auto bin = static_cast<double>(k);
-            const double t = (m_frequency[k] - bin * m_binWidth) / m_binWidth * 2.0 * kPi / m_oversampling;
-            m_phaseSum[k] += t + bin * m_expected;
-            m_real[k] = static_cast<float>(m_magnitude[k] * std::cos(m_phaseSum[k]));
+            const double off = (frequencies[k] - bin * m_binWidth) / m_binWidth;
+            m_phaseSum[k] += off * 2.0 * kPi / m_oversampling + bin * m_expected;
+            const auto real = static_cast<float>(magnitudes[k] * std::cos(m_phaseSum[k]));
+            const double scale = static_cast<double>(m_size / 2) * m_oversampling;
+            m_accumulator[k] = static_cast<float>(m_accumulator[k] + 2.0 * m_window[k] * real / scale);
         }
-        for (std::size_t k = 0; k < size; ++k)
-            m_accumulator[k] =
-                static_cast<float>(m_accumulator[k] + 2.0 * m_window[k] * m_real[k] /
-                                                          (static_cast<double>(m_size / 2) * m_oversampling));
-        const auto step = static_cast<std::size_t>(m_step);
         for (std::size_t k = 0; k < step; ++k) m_output[k] = m_accumulator[k];
-        for (std::size_t k = 0; k < size; ++k) m_accumulator[k] = m_accumulator[k + step];
-        for (std::size_t k = 0; k + step < size; ++k) m_input[k] = m_input[k + step];
+        for (std::size_t k = 0; k < m_window.size(); ++k) m_accumulator[k] = m_accumulator[k + step];
+        for (std::size_t k = 0; k + step < m_window.size(); ++k) m_input[k] = m_input[k + step];
     }
 
     int m_size, m_oversampling, m_step, m_latency, m_rover;
     double m_expected, m_binWidth;
     float m_pitch = 1.0f;
-    std::vector<float> m_input, m_output, m_magnitude, m_frequency, m_real, m_accumulator;
+    std::vector<float> m_input, m_output, m_accumulator;
     std::vector<double> m_window, m_lastPhase, m_phaseSum;
 };
 

@@ -1,6 +1,5 @@
 #pragma once
 
-#include <cmath>
 #include <complex>
 #include <cstddef>
 #include <numbers>
@@ -10,22 +9,14 @@ namespace Plain {
 
 // The discrete Fourier transform by the textbook's halving, in long double.
 inline std::vector<std::complex<long double>> Fft(const std::vector<std::complex<long double>>& x) {
-    const std::size_t n = x.size();
-    if (n == 1) return x;
-    std::vector<std::complex<long double>> even(n / 2), odd(n / 2), out(n);
-    for (std::size_t i = 0; i < n / 2; ++i) {
-        even[i] = x[2 * i];
-        odd[i] = x[2 * i + 1];
-    }
-    even = Fft(even);
-    odd = Fft(odd);
-    for (std::size_t k = 0; k < n / 2; ++k) {
-        const long double angle =
-            -2 * std::numbers::pi_v<long double> * static_cast<long double>(k) / static_cast<long double>(n);
-        const auto turned = odd[k] * std::complex<long double>(std::cos(angle), std::sin(angle));
-        out[k] = even[k] + turned;
-        out[k + n / 2] = even[k] - turned;
-    }
+    if (x.size() == 1) return x;
+    std::vector<std::complex<long double>> halves[2], out;
+    for (std::size_t i = 0; i < x.size(); ++i) halves[i % 2].push_back(x[i]);
+    const auto even = Fft(halves[0]), odd = Fft(halves[1]);
+    const long double turn = -2 * std::numbers::pi_v<long double> / static_cast<long double>(x.size());
+    for (std::size_t k = 0; k < x.size(); ++k)
+        out.push_back(even[k % even.size()] +
+                      std::polar<long double>(1, turn * static_cast<long double>(k)) * odd[k % odd.size()]);
     return out;
 }
 

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <vector>
 
 #include "Spectrum/MessagePoster.h"
@@ -9,6 +10,12 @@
 #include "Spectrum/Tuner/Tuner.h"
 #include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
+
+struct HookedPoster : MessagePoster {
+    void Post(int message, std::intptr_t, std::intptr_t detail) override { post(message, detail); }
+    void Send(int, std::intptr_t, std::intptr_t) override {}
+    std::function<void(int message, std::intptr_t detail)> post;
+};
 
 // What analysers, tuners and sonograms share starts every test at its defaults.
 class AnalyserTest : public testing::Test {

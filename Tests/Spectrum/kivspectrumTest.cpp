@@ -3,30 +3,16 @@
 #include <cmath>
 #include <complex>
 #include <numbers>
-#include <string>
+#include <tuple>
 
 #include "Spectrum/AnalyserFixture.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 
 namespace {
 
-using Values = std::vector<float>;
 using Complex = std::complex<double>;
 
 class kivspectrumTest : public AnalyserTest {};
-
-TEST_F(kivspectrumTest, ShapesPeriodicWindows) {
-    const auto window = [](int type) {
-        Settings().window_type = type;
-        Settings().window_length = 8;
-        return kivspectrum().GetWindow();
-    };
-    EXPECT_EQ(window(0), Values(8, 1.0f));
-    EXPECT_EQ(window(1), (Values{0, 0.25f, 0.5f, 0.75f, 1, 0.75f, 0.5f, 0.25f}));
-    EXPECT_EQ(window(5), Values(8, 0.0f));
-    EXPECT_EQ(int{kivspectrum::window_types_num}, 5);  // by value: the DLL exports no constants
-    EXPECT_EQ(kivspectrum::GetRefreshRatePeriod(), 30);
-}
 
 // Transforms of the windows at `bins` bins of their own, by their definitions.
 Complex Rectangle(double bins, double length) {
@@ -80,48 +66,14 @@ TEST_F(kivspectrumTest, ShowsASineThroughItsWindow) {
 }
 
 TEST_F(kivspectrumTest, DerivesTheHopFromTheOverlap) {
-    struct Case {
-        float overlap, stored;
-        int hop;
-    };
-    for (const Case& c : {Case{1.0f, 0.99f, 40},
-                          {0.75f, 0.75f, 1024},
-                          {0.0f, 0.0f, 4096},
-                          {-1.0f, -1.0f, 8192},
-                          {0.995f, 0.995f, 40},
-                          {std::nanf(""), 0.99f, 40}}) {
-        kivspectrum::SetAnalysisWindowsOverlap(c.overlap);
-        EXPECT_EQ(Settings().overlap, c.stored) << c.overlap;
-        EXPECT_EQ(Settings().hop_length, c.hop) << c.overlap;
+    for (const auto& [overlap, stored, hop] : {std::tuple{1.0f, 0.99f, 40},
+                                               {-1.0f, -1.0f, 8192},
+                                               {0.995f, 0.995f, 40},
+                                               {std::nanf(""), 0.99f, 40}}) {
+        kivspectrum::SetAnalysisWindowsOverlap(overlap);
+        EXPECT_EQ(Settings().overlap, stored) << overlap;
+        EXPECT_EQ(Settings().hop_length, hop) << overlap;
     }
-}
-
-// Until a frame's worth of samples came there is nothing to draw; afterwards the newest samples count. DC and
-// half the rate share entry 0.
-TEST_F(kivspectrumTest, TransformsTheNewestWindow) {
-    Settings().window_length = 256;
-    Settings().window_type = 0;
-    Settings().time_smoothing = 0;
-    kivspectrum analyser;
-    EXPECT_FALSE(analyser.GetOn());
-    Feed(analyser, Values(256, 1.0f));
-    EXPECT_FALSE(Prepare(analyser));
-    analyser.SetOn(true);
-    EXPECT_TRUE(analyser.GetSpectrumDrawer()->GetOn());
-    EXPECT_TRUE(analyser.PrepareFFTForDrawing(48000, true, false, false, true));
-    EXPECT_TRUE(Prepare(analyser));
-    EXPECT_FALSE(Prepare(analyser));
-    Values expected(128, 0.0f);
-    expected[0] = 256.0f * 256.0f;
-    EXPECT_EQ(analyser.GetPower(), expected);
-    EXPECT_EQ(analyser.GetSpectrumDrawer()->GetPowerSmoothed(), expected);
-    Values nyquist(255);
-    for (std::size_t i = 0; i < nyquist.size(); ++i) nyquist[i] = i % 2 ? 1.0f : -1.0f;
-    Feed(analyser, nyquist);
-    EXPECT_FALSE(Prepare(analyser));
-    Feed(analyser, {1.0f});
-    EXPECT_TRUE(Prepare(analyser));
-    EXPECT_EQ(analyser.GetPower(), expected);
 }
 
 }  // namespace

@@ -9,9 +9,8 @@ using Corvo::DSP::SineOscillator;
 TEST(SineOscillator, MovesThePhaseExactlyAsSteppingDoes) {
     const double increments[] = {0.0, 1e-9, 7.85398163397448e-4,        0.003926990816987241, 0.11,
                                  3.0, -0.2, std::ldexp(1.0, -52) * 1.5, std::ldexp(3.0, -51)};
-    const double starts[] = {0.0, 1e-300, 0.5, 0.999, 1.9999, 3.9, 4.0, 6.28, 7.99, 12.0, -3.0};
     for (const double increment : increments)
-        for (const double start : starts)
+        for (const double start : {0.0, 1e-300, 0.5, 0.999, 1.9999, 3.9, 4.0, 6.28, 7.99, 12.0, -3.0})
             for (double stepped = start; const int steps : {1, 2, 3, 63, 64, 64}) {
                 const double begin = stepped;
                 for (int i = 0; i < steps; ++i) stepped += increment;
@@ -23,8 +22,8 @@ TEST(SineOscillator, MovesThePhaseExactlyAsSteppingDoes) {
 // Catches a turn by the wrong number of increments and sines that drift.
 TEST(SineOscillator, StaysOnTheLibrarysSine) {
     double sines[SineOscillator::kPiece];
-    for (const double hz : {0.01, 0.5, 6.0, 30.0, 1000.0})
-        for (const int frames : {1, 7, 63, 64}) {
+    for (const double hz : {0.01, 6.0, 1000.0})
+        for (const int frames : {1, 7, 64}) {
             const double increment = SineOscillator::kTwoPi * hz / 48000.0, cycle = 6.283180236816406;
             SineOscillator first, last;
             first.SetIncrement(increment);
@@ -32,10 +31,8 @@ TEST(SineOscillator, StaysOnTheLibrarysSine) {
             double ahead = 0.0, behind = 0.0;
             for (int block = 0; block < 200; ++block) {
                 first.StepAndTakeSines(sines, frames);
-                for (int i = 0; i < frames; ++i) {
-                    ahead += increment;
-                    ASSERT_NEAR(sines[i], std::sin(ahead), 1e-13) << hz << " Hz";
-                }
+                for (int i = 0; i < frames; ++i)
+                    ASSERT_NEAR(sines[i], std::sin(ahead += increment), 1e-13) << hz << " Hz";
                 first.ReducePhase();
                 ahead = std::fmod(ahead, SineOscillator::kTwoPi);
                 ASSERT_EQ(first.Phase(), ahead);

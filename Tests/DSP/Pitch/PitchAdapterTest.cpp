@@ -5,11 +5,9 @@
 
 #include <algorithm>
 #include <memory>
-#include <ranges>
 
 #include "Plain/PlainClassicPitch.h"
 #include "Support/Signals.h"
-#include "Support/TwoThreads.h"
 #include "Support/VirtualSlot.h"
 
 using namespace Corvo::DSP;
@@ -30,43 +28,36 @@ std::unique_ptr<PitchAdapter> Make(int index, int channels = 2, float factor = 1
     return adapter;
 }
 
-// Through the path without padding: as many frames as went in.
+// One channel through the path without padding: as many frames as went in.
 template <typename Sample>
-std::vector<Sample> Offline(PitchAdapter& adapter, const std::vector<Sample>& input, int channels,
-                            int block) {
+std::vector<Sample> Offline(PitchAdapter& adapter, const std::vector<Sample>& input, int block) {
     std::vector<Sample> output, buffer;
-    const auto width = static_cast<std::size_t>(channels);
-    for (std::size_t done = 0; done < input.size();) {
-        const auto count = std::min(input.size() - done, static_cast<std::size_t>(block) * width);
-        const auto at = input.begin() + static_cast<std::ptrdiff_t>(done);
-        buffer.assign(at, at + static_cast<std::ptrdiff_t>(count));
-        const int got = adapter.ProcessInPlaceNoPadding(buffer.data(), static_cast<int>(count / width));
-        output.insert(output.end(), buffer.begin(), buffer.begin() + got * channels);
-        done += count;
+    const int frames = static_cast<int>(input.size());
+    for (int done = 0; done < frames; done += block) {
+        const int count = std::min(frames - done, block);
+        buffer.assign(input.begin() + done, input.begin() + done + count);
+        const int got = adapter.ProcessInPlaceNoPadding(buffer.data(), count);
+        output.insert(output.end(), buffer.begin(), buffer.begin() + got);
     }
     adapter.Flush();
-    while (const int available = adapter.GetNumSamplesAvailable()) {
-        if (available < 0) break;
-        const int count = std::min(available, block);
-        buffer.assign(static_cast<std::size_t>(count) * width, Sample(9));
+    for (int count; (count = std::min(adapter.GetNumSamplesAvailable(), block)) > 0;) {
+        buffer.assign(static_cast<std::size_t>(count), Sample(9));
         adapter.ReceiveSamples(buffer.data(), count);
         output.insert(output.end(), buffer.begin(), buffer.end());
     }
     return output;
 }
 
-// Frequency of a steady tone, from the rising zero crossings of the first channel of a stretch in the middle.
-double Frequency(const std::vector<float>& samples, int channels, int rate) {
-    const auto frames = samples.size() / static_cast<std::size_t>(channels);
-    const auto at = [&](std::size_t i) { return samples[i * static_cast<std::size_t>(channels)]; };
+// Frequency of a steady tone, from the rising zero crossings of a stretch in the middle.
+double Frequency(const std::vector<float>& samples) {
     double first = 0.0, last = 0.0;
     int count = -1;
-    for (std::size_t i = frames / 4; i < frames * 3 / 4; ++i)
-        if (at(i - 1) < 0.0f && at(i) >= 0.0f) {
-            last = static_cast<double>(i) - at(i) / (at(i) - at(i - 1));
+    for (std::size_t i = samples.size() / 4; i < samples.size() * 3 / 4; ++i)
+        if (samples[i - 1] < 0.0f && samples[i] >= 0.0f) {
+            last = static_cast<double>(i) - samples[i] / (samples[i] - samples[i - 1]);
             if (++count == 0) first = last;
         }
-    return count * rate / (last - first);
+    return count * 48000 / (last - first);
 }
 
 }  // namespace
@@ -74,22 +65,18 @@ double Frequency(const std::vector<float>& samples, int channels, int rate) {
 // Catches a virtual operation that was moved: hosts call by number.
 TEST(PitchAdapter, KeepsEveryOperationInItsSlot) {
     using A = PitchAdapter;
-    const int slots[] = {Slot(&A::Clear),
-                         Slot(&A::SetSampleRate),
-                         Slot(&A::SetChannelsNum),
-                         Slot(&A::SetPitchFactor),
-                         Slot(&A::SetSpeed),
-                         Slot(&A::CookFactors),
-                         Slot(&A::SetFFTSize),
-                         Slot(&A::SetQuality),
-                         Slot<void (A::*)(double*, int)>(&A::ProcessInPlace),
-                         Slot<void (A::*)(float*, int)>(&A::ProcessInPlace),
-                         Slot<int (A::*)(double*, int)>(&A::ProcessInPlaceNoPadding),
-                         Slot<int (A::*)(float*, int)>(&A::ProcessInPlaceNoPadding),
-                         Slot(&A::Flush),
-                         Slot(&A::GetNumSamplesAvailable),
-                         Slot<void (A::*)(double*, int)>(&A::ReceiveSamples),
-                         Slot<void (A::*)(float*, int)>(&A::ReceiveSamples)};
+    using Double = void (A::*)(double*, int);
+    using Float = void (A::*)(float*, int);
+    using CountedDouble = int (A::*)(double*, int);
+    using CountedFloat = int (A::*)(float*, int);
+    // clang-format off
+    const int slots[] = {
+        Slot(&A::Clear), Slot(&A::SetSampleRate), Slot(&A::SetChannelsNum), Slot(&A::SetPitchFactor), Slot(&A::SetSpeed),
+        Slot(&A::CookFactors), Slot(&A::SetFFTSize), Slot(&A::SetQuality), Slot<Double>(&A::ProcessInPlace),
+        Slot<Float>(&A::ProcessInPlace), Slot<CountedDouble>(&A::ProcessInPlaceNoPadding),
+        Slot<CountedFloat>(&A::ProcessInPlaceNoPadding), Slot(&A::Flush), Slot(&A::GetNumSamplesAvailable),
+        Slot<Double>(&A::ReceiveSamples), Slot<Float>(&A::ReceiveSamples)};
+    // clang-format on
     for (int i = 0; i < 16; ++i) EXPECT_EQ(slots[i], i);
     EXPECT_EQ(Slot(&A::GetLatency), 18) << "behind the destructor's two places";
 }
@@ -97,19 +84,13 @@ TEST(PitchAdapter, KeepsEveryOperationInItsSlot) {
 TEST(PitchAdapter, IsMadeFromTheRegistry) {
     const auto adapters = PitchAdapterInfo::GetPitchAdapters();
     ASSERT_EQ(adapters.size(), 2u);
-    EXPECT_EQ(adapters[kClassic]->GetName(), "Classic");
-    EXPECT_EQ(adapters[kNew]->GetName(), "New");
-    EXPECT_EQ(adapters[kClassic]->GetFFTSizes(), (std::vector{256, 512, 1024, 2048, 4096, 8192}));
-    EXPECT_EQ(adapters[kClassic]->GetQualities(),
-              (std::vector{2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 16, 24, 32}));
-    EXPECT_TRUE(adapters[kNew]->GetFFTSizes().empty());
-    EXPECT_EQ(adapters[kNew]->GetQualities(), (std::vector{0, 1, 2, 3, 4, 5, 6, 7, 8, 9}));
+    EXPECT_EQ(adapters[kClassic]->GetName() + " " + adapters[kNew]->GetName(), "Classic New");
+    EXPECT_EQ(adapters[kClassic]->GetFFTSizes().size(), 6u);
+    EXPECT_EQ(adapters[kClassic]->GetQualities().size(), 14u);
     PitchAdapterInfo stranger("Classic");
     EXPECT_EQ(PitchAdapter::CreateAdapter(&stranger), nullptr);
-
     // Only "New" has a latency to report, which tells the two apart.
-    for (const auto& [index, latent] : {std::pair{-3, false}, {0, false}, {1, true}, {7, true}})
-        EXPECT_EQ(Make(index)->GetLatency() > 0, latent) << index;
+    for (const int index : {-3, 0, 1, 7}) EXPECT_EQ(Make(index)->GetLatency() > 0, index >= 1) << index;
 }
 
 // Catches an engine configured otherwise than each quality says, or driven in another order.
@@ -123,51 +104,45 @@ TEST(PitchAdapterNew, IsTheEngineAsConfigured) {
         engine.setSetting(SETTING_AA_FILTER_LENGTH, quality <= 4 ? 32 : quality == 5 ? 64 : 128);
         engine.setSetting(SETTING_USE_QUICKSEEK, quality < 4 ? 1 : 0);
         const auto adapter = Make(kNew, 2, 1.25f, quality);
-        const auto input = Noise<float>(2 * 512 * 40);
-        for (std::size_t at = 0; at < input.size(); at += 2 * 512) {
-            std::vector<float> block(input.begin() + static_cast<std::ptrdiff_t>(at),
-                                     input.begin() + static_cast<std::ptrdiff_t>(at + 2 * 512));
+        for (std::uint64_t i = 1; i <= 40; ++i) {
+            auto block = Noise<float>(2 * 512, 0.25, i);
             std::vector<float> expected(block.size());
             engine.putSamples(block.data(), 512);
             if (engine.numSamples() >= 512) engine.receiveSamples(expected.data(), 512);
             adapter->ProcessInPlace(block.data(), 512);
-            ASSERT_EQ(block, expected) << "quality " << quality << ", frame " << at / 2;
+            ASSERT_EQ(block, expected) << "quality " << quality << ", block " << i;
         }
     }
 }
 
 TEST(PitchAdapterNew, ShiftsTheRightDistance) {
-    for (const float semitones : {-12.0f, -2.0f, -1.0f, 1.0f, 2.0f, 12.0f}) {
+    for (const float semitones : {-12.0f, -2.0f, 0.0f, 1.0f, 12.0f}) {
         const auto adapter = Make(kNew, 1);
         adapter->SetTranspose(semitones);
-        const auto output = Offline(*adapter, Sine<float>(96000, 440.0), 1, 512);
-        const double cents = 1200.0 * std::log2(Frequency(output, 1, 48000) / 440.0);
-        EXPECT_NEAR(cents, 100.0 * static_cast<double>(semitones), 3.0);
+        adapter->SetPitchFactor(1, 2.0f);  // only the first channel's factor counts
+        const double hz = Frequency(Offline(*adapter, Sine<float>(96000, 440.0), 512));
+        EXPECT_NEAR(1200.0 * std::log2(hz / 440.0), 100.0 * static_cast<double>(semitones), 3.0);
     }
-    const auto adapter = Make(kNew, 1);
-    adapter->SetPitchFactor(1, 2.0f);  // only the first channel's factor counts
-    const auto output = Offline(*adapter, Sine<float>(48000, 440.0), 1, 512);
-    EXPECT_NEAR(Frequency(output, 1, 48000), 440.0, 0.5);
 }
 
 // Catches frames lost or invented at the ends of an offline rendering, and a stream that comes out shifted.
 TEST(PitchAdapterNew, ReturnsAsManyFramesAsItWasGiven) {
-    for (const int frames : {1, 100, 5000, 30011})
-        for (const int block : {64, 1000, 8192})
+    for (const int frames : {1, 100, 30011})
+        for (const int block : {64, 8192})
             for (const float speed : {1.0f, 1.5f}) {
-                const auto adapter = Make(kNew, 2, 1.5f);
+                const auto adapter = Make(kNew, 1, 1.5f);
                 adapter->SetSpeed(speed);
-                const auto input = Noise<double>(2 * static_cast<std::size_t>(frames));
-                const auto expected = static_cast<std::size_t>(frames / static_cast<double>(speed));
-                const auto got = Offline(*adapter, input, 2, block).size() / 2;
-                EXPECT_EQ(got, expected) << frames << " in blocks of " << block << " at speed " << speed;
+                const auto input = Noise<double>(static_cast<std::size_t>(frames));
+                EXPECT_EQ(Offline(*adapter, input, block).size(),
+                          static_cast<std::size_t>(frames / static_cast<double>(speed)))
+                    << frames << " in blocks of " << block << " at speed " << speed;
             }
     for (const auto& [semitones, tolerance] : {std::pair{12.0f, 1500}, {-12.0f, 1500}, {0.0f, 1}}) {
         std::vector<float> click(48000);
         click[20000] = 1.0f;
         const auto adapter = Make(kNew, 1);
         adapter->SetTranspose(semitones);
-        const auto output = Offline(*adapter, click, 1, 512);
+        const auto output = Offline(*adapter, click, 512);
         const auto peak = std::ranges::max_element(output, {}, [](float s) { return std::abs(s); });
         EXPECT_NEAR(static_cast<double>(peak - output.begin()), 20000.0, tolerance) << semitones;
     }
@@ -177,8 +152,7 @@ TEST(PitchAdapterNew, KeepsItsBooks) {
     const auto adapter = Make(kNew, 1);
     auto block = Noise<float>(4096);
     adapter->ProcessInPlace(block.data(), 512);
-    EXPECT_TRUE(std::ranges::all_of(block | std::views::take(512), [](float s) { return s == 0.0f; }))
-        << "silence until the engine is full";
+    EXPECT_EQ(block[511], 0.0f) << "silence until the engine is full";
     adapter->Clear();
     adapter->Flush();
     EXPECT_EQ(adapter->GetNumSamplesAvailable(), 0) << "a flush at rest adds nothing";
@@ -194,31 +168,14 @@ TEST(PitchAdapterNew, KeepsItsBooks) {
     adapter->Flush();
     EXPECT_LT(adapter->GetNumSamplesAvailable(), 0) << "more was taken than is owed";
 
-    for (const int channels : {0, -1, 17}) {
+    for (const int channels : {0, 17}) {
         EXPECT_THROW(adapter->SetChannelsNum(channels), std::runtime_error);
         adapter->ProcessInPlace(block.data(), 16);  // refused, so it must not reach the engine
     }
     adapter->SetChannelsNum(16);
-    adapter->SetSampleRate(44100);
     adapter->ProcessInPlaceNoPadding(more.data(), 1000);
     adapter->Flush();
     EXPECT_EQ(adapter->GetNumSamplesAvailable(), 1000);
-}
-
-// Catches races between configuring and processing, under the thread sanitizer.
-TEST(PitchAdapterNew, IsConfiguredWhileItProcesses) {
-    const auto adapter = Make(kNew);
-    WhileAnotherThread(
-        [&](int round) {
-            adapter->SetPitchFactor(0, 0.5f + 0.01f * static_cast<float>(round % 100));
-            adapter->SetQuality(round % 10);
-            adapter->GetNumSamplesAvailable();
-            adapter->GetLatency();
-        },
-        [&] {
-            auto block = Noise<double>(2 * 256);
-            for (int i = 0; i < 200; ++i) adapter->ProcessInPlace(block.data(), 256);
-        });
 }
 
 // Catches the tables of sign changes, the wrapped phases and the short cosine drifting from the definition.
@@ -255,29 +212,15 @@ TEST(PitchAdapterClassic, AgreesWithTheDefinition) {
 TEST(PitchAdapterClassic, LeavesWhatItDoesNotShift) {
     const auto input = Noise<float>(4 * 5000);
     auto four = input;
-    const auto adapter = Make(kClassic, 4, 1.5f);
-    adapter->ProcessInPlace(four.data(), 5000);
-    for (std::size_t i = 0; i < four.size(); ++i)
-        if (i % 4 >= 2) {
-            ASSERT_EQ(four[i], input[i]) << "channel " << i % 4;
-        }
+    Make(kClassic, 4, 1.5f)->ProcessInPlace(four.data(), 5000);
+    for (std::size_t i = 0; i < four.size(); i += 4)
+        ASSERT_TRUE(four[i + 2] == input[i + 2] && four[i + 3] == input[i + 3]) << i;
     EXPECT_NE(four[0], input[0]);
 
     const auto doubles = Noise<double>(2 * 1000);
     auto block = doubles;
     EXPECT_EQ(Make(kClassic)->ProcessInPlaceNoPadding(block.data(), 1000), 1000);
     EXPECT_EQ(block, doubles);
-
-    std::unique_ptr<PitchAdapter> raw(PitchAdapter::CreateAdapter(kClassic));
-    auto floats = input;
-    raw->SetChannelsNum(2);
-    raw->ProcessInPlace(floats.data(), 5000);  // never cooked
-    EXPECT_EQ(floats, input);
-    for (const float wild : {-1.0f, 1e30f, std::nanf("")}) {
-        raw->SetFFTSize(0);
-        raw->SetQuality(0);
-        raw->SetPitchFactor(0, wild);
-        raw->CookFactors();
-        raw->ProcessInPlace(floats.data(), 5000);
-    }
+    for (const float wild : {-1.0f, 1e30f, std::nanf("")})
+        Make(kClassic, 2, wild)->ProcessInPlace(four.data(), 5000);
 }

@@ -2,8 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <complex>
-#include <cstdio>
 #include <limits>
 #include <numeric>
 #include <string>
@@ -15,29 +13,6 @@ namespace {
 
 using Converter = SamplingFrequencyConverter;
 using Bytes = std::vector<char>;
-using Core = int (Converter::*)(int, char*, char*, int, int, int, CDither<double>*);
-
-struct FormatPair {
-    Core core;
-    void (*write)(double value, char* sample);  // in the format of the input
-    int inBytes, outBytes;
-};
-
-template <typename... In, typename... Out>
-std::vector<FormatPair> Pairs(std::tuple<In...>, std::tuple<Out...>) {
-    std::vector<FormatPair> pairs;
-    const auto withIn = [&]<typename I>(I) {
-        (pairs.push_back(
-             {&Converter::sfreq_conversion_core_block<I, Out>, &I::Write, I::kBytes, Out::kBytes}),
-         ...);
-    };
-    (withIn(In{}), ...);
-    return pairs;
-}
-
-const auto kAllPairs =
-    Pairs(std::tuple<tipo_16bit, tipo_24bit, tipo_floatbit, tipo_doublebit>{},
-          std::tuple<tipo_16bit_outd, tipo_24bit_outd, tipo_floatbit_outd, tipo_doublebit_outd>{});
 
 // Owns its rings.
 struct Owned : Converter {
@@ -59,105 +34,91 @@ struct Owned : Converter {
     std::size_t OutputLimit(int frames) const { return static_cast<std::size_t>(frames * up / down + 1); }
 };
 
-void ExpectExact(const std::vector<double>& input, int up, int down, double& worst) {
-    const auto output = Owned(up, down, 1).Convert(input), exact = Plain::Convert(input, up, down);
-    ASSERT_EQ(output.size(), exact.size());
-    for (std::size_t i = 0; i < exact.size(); ++i) worst = std::max(worst, std::abs(output[i] - exact[i]));
-    ASSERT_LT(worst, 1e-12) << up << "/" << down;
-}
-
 // Catches a wrong pole, residue or power, a phase table read at the wrong row, and rounding that grows:
 // the direct form in double misses this bound by eight orders of magnitude.
 TEST(SamplingFrequencyConverterTest, IsTheExactFilterForEveryPairOfFactors) {
-    double worst = 0.0;
+    const auto expectExact = [](const std::vector<double>& input, int up, int down) {
+        const auto output = Owned(up, down, 1).Convert(input), exact = Plain::Convert(input, up, down);
+        ASSERT_EQ(output.size(), exact.size());
+        for (std::size_t i = 0; i < exact.size(); ++i)
+            ASSERT_NEAR(output[i], exact[i], 1e-12) << up << "/" << down;
+    };
     for (int up = 1; up <= 49; ++up)
-        for (int down = 1; down <= 49; ++down) {
-            if (std::gcd(up, down) > 1 && up != down) continue;
-            const auto frames = static_cast<std::size_t>(20 + 600 / up);
-            ASSERT_NO_FATAL_FAILURE(ExpectExact(TestSupport::Noise<double>(frames, 1.0), up, down, worst));
-        }
+        for (int down = 1; down <= 49; ++down)
+            if (std::gcd(up, down) == 1)
+                expectExact(TestSupport::Noise<double>(static_cast<std::size_t>(20 + 600 / up), 1.0), up,
+                            down);
     // A constant is the hardest for poles next to 1, and the exact ratios of files go beyond 49.
-    constexpr int kFactors[][2] = {{1, 49}, {49, 1}, {160, 147}, {147, 1280}, {1, 1000}};
-    for (const auto& [up, down] : kFactors)
-        ASSERT_NO_FATAL_FAILURE(ExpectExact(
-            std::vector<double>(static_cast<std::size_t>(500 + 40 * down / up), 1.0), up, down, worst));
-    std::printf("largest difference from the exact filter: %.2g\n", worst);
+    for (const auto& [up, down] : {std::pair{1, 49}, {49, 1}, {160, 147}, {147, 1280}, {1, 1000}})
+        expectExact(std::vector<double>(static_cast<std::size_t>(500 + 40 * down / up), 1.0), up, down);
+}
+
+// Any cuts give the bytes of the whole.
+template <typename In, typename Out>
+void ExpectTheSameBytes(int up, int down, int channels) {
+    constexpr int kFrames = 300;
+    const int inStride = channels * In::kBytes, outStride = channels * Out::kBytes;
+    // One byte off, so that no sample is aligned.
+    Bytes in(static_cast<std::size_t>(kFrames * inStride + 1));
+    for (int i = 0; i < kFrames * channels; ++i)
+        In::Write(0.3 * std::sin(i * 0.1) + 0.2 * std::sin(i * 1.7), in.data() + 1 + i * In::kBytes);
+    const auto convert = [&](const std::vector<int>& cuts) {
+        Owned converter(up, down, channels);
+        Bytes out(converter.OutputLimit(kFrames) * static_cast<std::size_t>(outStride) + 1);
+        int done = 0, written = 0;
+        for (std::size_t i = 0; done < kFrames; ++i) {
+            const int frames = std::min(cuts[i % cuts.size()], kFrames - done);
+            written += converter.sfreq_conversion_core_block<In, Out>(frames, in.data() + 1 + done * inStride,
+                                                                      out.data() + 1 + written * outStride,
+                                                                      channels, inStride, outStride, nullptr);
+            done += frames;
+        }
+        EXPECT_EQ(written, (kFrames * up + down - 1) / down);
+        return out;
+    };
+    EXPECT_EQ(convert({1, 7, 0, 64, 3}), convert({kFrames}))
+        << In::kBytes << " to " << Out::kBytes << " bytes, " << channels << " channels";
+}
+
+template <typename... In, typename... Out>
+void ExpectTheSameBytes(std::tuple<In...>, std::tuple<Out...>) {
+    for (const auto& [up, down] : {std::pair{37, 34}, {2, 1}, {3, 16}})
+        for (const int channels : {1, 2, 5})
+            ([&]<typename I>(I) { (ExpectTheSameBytes<I, Out>(up, down, channels), ...); }(In{}), ...);
 }
 
 // Catches state, position or alignment lost at a block's edge, a channel that leaks into its neighbour,
 // and a stereo kernel that differs from the mono one.
 TEST(SamplingFrequencyConverterTest, GivesTheSameBytesHoweverTheStreamIsCut) {
-    constexpr int kFrames = 300;
-    constexpr int kFactors[][2] = {{37, 34}, {2, 1}, {3, 16}};
-    for (std::size_t p = 0; p < kAllPairs.size(); ++p)
-        for (const auto& [up, down] : kFactors)
-            for (const int channels : {1, 2, 5}) {
-                const auto& pair = kAllPairs[p];
-                const int inStride = channels * pair.inBytes, outStride = channels * pair.outBytes;
-                // One byte off, so that no sample is aligned.
-                Bytes in(static_cast<std::size_t>(kFrames * inStride + 1));
-                for (int i = 0; i < kFrames * channels; ++i)
-                    pair.write(0.3 * std::sin(i * 0.1) + 0.2 * std::sin(i * 1.7),
-                               in.data() + 1 + i * pair.inBytes);
-                const auto convert = [&](const std::vector<int>& cuts) {
-                    Owned converter(up, down, channels);
-                    Bytes out(converter.OutputLimit(kFrames) * static_cast<std::size_t>(outStride) + 1);
-                    int done = 0, written = 0;
-                    for (std::size_t i = 0; done < kFrames; ++i) {
-                        const int frames = std::min(cuts[i % cuts.size()], kFrames - done);
-                        written += (converter.*pair.core)(frames, in.data() + 1 + done * inStride,
-                                                          out.data() + 1 + written * outStride, channels,
-                                                          inStride, outStride, nullptr);
-                        done += frames;
-                    }
-                    EXPECT_EQ(written, (kFrames * up + down - 1) / down);
-                    return out;
-                };
-                const auto whole = convert({kFrames});
-                ASSERT_EQ(convert({1, 7, 0, 64, 3}), whole)
-                    << "pair " << p << ", " << channels << " channels";
-                Bytes none(whole.size());
-                ASSERT_NE(whole, none);
-            }
+    ExpectTheSameBytes(
+        std::tuple<tipo_16bit, tipo_24bit, tipo_floatbit, tipo_doublebit>{},
+        std::tuple<tipo_16bit_outd, tipo_24bit_outd, tipo_floatbit_outd, tipo_doublebit_outd>{});
 }
 
 TEST(SamplingFrequencyConverterTest, ChoosesTheFirstOfTheBestFactors) {
     constexpr int kMost = std::numeric_limits<int>::max();
-    constexpr struct {
-        int in, out, result, up, down;
-    } kCases[] = {
-        {44100, 44100, 0, 0, 0},   {48000, 96000, 1, 2, 1},   {44100, 48000, 1, 37, 34},
-        {48000, 44100, 1, 34, 37}, {96000, 44100, 1, 17, 37}, {32000, 44100, 1, 40, 29},
-        {kMost, 1, 1, 1, 49},      {1, kMost, 0, 0, 0},       {0, 48000, 0, 0, 0},
-        {48000, -1, 0, 0, 0},
-    };
-    for (const auto& c : kCases) {
+    constexpr int kCases[][4] = {{44100, 44100, 0, 0}, {48000, 96000, 2, 1},   {44100, 48000, 37, 34},
+                                 {kMost, 1, 1, 49},    {96000, 44100, 17, 37}, {1, kMost, 0, 0},
+                                 {0, 48000, 0, 0},     {48000, -1, 0, 0}};
+    for (const auto& [in, out, up, down] : kCases) {
         Converter converter;
-        EXPECT_EQ(converter.InitConversion(c.in, c.out), c.result) << c.in << " " << c.out;
-        EXPECT_EQ(converter.up, c.up) << c.in << " " << c.out;
-        EXPECT_EQ(converter.down, c.down) << c.in << " " << c.out;
+        EXPECT_EQ(converter.InitConversion(in, out), up > 0) << in << " " << out;
+        EXPECT_TRUE(converter.up == up && converter.down == down) << in << " " << out;
     }
 }
 
 TEST(SamplingFrequencyConverterTest, ReadsAndWritesSamplesToTheirLimits) {
-    const double inf = std::numeric_limits<double>::infinity();
-    const struct {
-        double value;
-        int as16, as24;
-    } kCases[] = {
-        {1.0, 32767, 8388607}, {-1.0, -32768, -8388608}, {inf, 32767, 8388607},     {-inf, -32768, -8388608},
-        {std::nan(""), 0, 0},  {0.99 / 8388608, 0, 0},   {-1.99 / 32768, -1, -509}, {0.5, 16384, 4194304},
-    };
-    for (const auto& c : kCases) {
+    constexpr double kInfinite = std::numeric_limits<double>::infinity();
+    for (const auto& [value, as16, as24] : {std::tuple{-1.0, -32768, -8388608},
+                                            {kInfinite, 32767, 8388607},
+                                            {std::nan(""), 0, 0},
+                                            {-1.99 / 32768, -1, -509}}) {
         char sample[3]{};
-        tipo_16bit_outd::Write(c.value, sample);
-        EXPECT_EQ(tipo_16bit::Read(sample), c.as16 / 32768.0) << c.value;
-        tipo_24bit_outd::Write(c.value, sample);
-        EXPECT_EQ(tipo_24bit::Read(sample), c.as24 / 8388608.0) << c.value;
+        tipo_16bit_outd::Write(value, sample);
+        EXPECT_EQ(tipo_16bit::Read(sample), as16 / 32768.0) << value;
+        tipo_24bit_outd::Write(value, sample);
+        EXPECT_EQ(tipo_24bit::Read(sample), as24 / 8388608.0) << value;
     }
-    const char lowest[] = {0, 0, '\x80'};
-    EXPECT_EQ(tipo_16bit::Read(lowest + 1), -1.0);
-    EXPECT_EQ(tipo_24bit::Read(lowest), -1.0);
 }
 
 // A host that goes on with the step after a block must hear the stream continue.
@@ -182,71 +143,34 @@ TEST(SamplingFrequencyConverterTest, LeavesTheHistoriesWhereTheDirectFormWouldHa
     }
 }
 
-// Catches a wrong gain, cutoff, delay or output length, and noise of our own: a sine comes out with the gain
-// and the phase of the analogue filter, and what is left beside it are the images that one lets through.
-TEST(SamplingFrequencyConverterTest, TreatsASineAsTheAnalogueFilterDoes) {
-    constexpr struct {
-        int in, out;
-        double ofLowerRate, gainDb;
-    } kCases[] = {
-        {44100, 48000, 0.02, 0.0},    {44100, 48000, 0.35, 0.0}, {48000, 44100, 0.02, 0.0},
-        {48000, 96000, 0.35, 0.0},    {96000, 44100, 0.35, 0.0}, {44100, 48000, 0.4, -0.32},
-        {48000, 44100, 0.455, -3.01},
-    };
-    for (const auto& c : kCases) {
-        SCOPED_TRACE(testing::Message() << c.in << " -> " << c.out << ", " << c.ofLowerRate);
-        Converter chosen;
-        ASSERT_EQ(chosen.InitConversion(c.in, c.out), 1);
-        Owned converter(chosen.up, chosen.down, 1);
-        const double up = converter.up, down = converter.down, cutoff = 0.455 / std::max(up, down);
-        const double frequency = c.ofLowerRate * std::min(1.0, up / down);  // of the input rate
-        const auto output = converter.Convert(TestSupport::Sine<double>(16000, frequency, 1, 1.0));
-        EXPECT_EQ(static_cast<double>(output.size()), std::ceil(16000 * up / down));
-
-        // Least squares of sine and cosine at the frequency it must have, after the filter has settled.
-        double ss = 0, cc = 0, sc = 0, ys = 0, yc = 0, yy = 0;
-        for (std::size_t i = 2000; i < output.size(); ++i) {
-            const double angle = 2.0 * std::numbers::pi * frequency * down / up * static_cast<double>(i);
-            const double s = std::sin(angle), co = std::cos(angle), y = output[i];
-            ss += s * s, cc += co * co, sc += s * co, ys += y * s, yc += y * co, yy += y * y;
-        }
-        const double det = ss * cc - sc * sc, a = (ys * cc - yc * sc) / det, b = (yc * ss - ys * sc) / det;
-        const auto response = Plain::ButterworthResponse(frequency / up, cutoff);
-        EXPECT_NEAR(std::abs(std::complex(a, b) - response), 0.0, 1e-3);
-        EXPECT_NEAR(20 * std::log10(std::abs(response)), c.gainDb, 0.03);
-        double images = 0.0;
-        for (int m = 1; m < converter.up; ++m)
-            images += std::norm(Plain::ButterworthResponse((m + frequency) / up, cutoff)) / 2;
-        const double noise = (yy - a * ys - b * yc) / static_cast<double>(output.size() - 2000);
-        EXPECT_NEAR(10 * std::log10(noise / images), 0.0, 0.5);
-        // A low tone is late by as many steps as its phase turns per radian.
-        constexpr double kLow = 1e-6;
-        const double delay =
-            -std::arg(Plain::ButterworthResponse(kLow, cutoff)) / (2 * std::numbers::pi * kLow);
-        EXPECT_NEAR(converter.GroupDelay() / delay, 1.0, 1e-6);
+// By closed form: ten poles on a circle under the bilinear transform.
+TEST(SamplingFrequencyConverterTest, KnowsItsDelay) {
+    for (const auto& [up, down] : {std::pair{2, 1}, {34, 37}}) {
+        const double corner = 2.0 * std::tan(std::numbers::pi * 0.455 / std::max(up, down));
+        const double delay = 1.0 / std::sin(std::numbers::pi / 20) / corner;
+        EXPECT_NEAR(Owned(up, down, 1).GroupDelay() / delay, 1.0, 1e-9);
     }
 }
 
 TEST(SamplingFrequencyConverterTest, StaysQuietWhereThereIsNothingToDo) {
-    Owned converter(2, 1, 2), wide(2, 1, 48);
+    Owned converter(2, 1, 2);
     Converter fresh;
-    double in[100]{}, out[200]{};
+    char in[16]{}, out[32]{};
     const auto convert = [&](Converter& c, int frames, int channels) {
         return c.sfreq_conversion_core_block<tipo_doublebit, tipo_doublebit_outd>(
-            frames, reinterpret_cast<char*>(in), reinterpret_cast<char*>(out), channels, 8 * channels,
-            8 * channels, nullptr);
+            frames, in, out, channels, 8 * channels, 8 * channels, nullptr);
     };
-    EXPECT_EQ(convert(fresh, 1, 1), 0);
-    EXPECT_EQ(convert(wide, 2, 48), 4);
-    constexpr int kNothing[][2] = {{0, 2}, {-5, 2}, {1, 0}, {1, 3}, {1, 49}};  // Init made rings for two
-    for (const auto& [frames, channels] : kNothing) EXPECT_EQ(convert(converter, frames, channels), 0);
+    EXPECT_EQ(convert(converter, 1, 2), 2);
+    for (const auto& [frames, channels] : {std::pair{0, 2}, {-5, 2}, {1, 0}, {1, 3}, {1, 49}})
+        EXPECT_EQ(convert(converter, frames, channels), 0) << "Init made rings for two";
     converter.FreeRings();
-    EXPECT_EQ(convert(converter, 1, 2), 0);
+    EXPECT_EQ(convert(converter, 1, 2) + convert(fresh, 1, 1), 0);
     EXPECT_EQ(converter.InitConversionByFactors(0, 1), 0);
     EXPECT_EQ(converter.InitConversionByFactors(1, std::numeric_limits<int>::max()), 0);
 }
 
-// After hours the wrap counts must not have overflowed; taking off the common part does it.
+// After hours the wrap counts must not have overflowed; taking off the common part does it. A copy shares the
+// rings and goes on alike.
 TEST(SamplingFrequencyConverterTest, KeepsItsPositionsSmall) {
     Owned converter(3, 7, 1);
     const auto block = TestSupport::Noise<double>(4099);
@@ -256,19 +180,9 @@ TEST(SamplingFrequencyConverterTest, KeepsItsPositionsSmall) {
     EXPECT_EQ(converter.writePosition, 3 * 4099 * 5 % converter.ringLength);
     EXPECT_DOUBLE_EQ(converter.rings[0][converter.writePosition - 1],
                      converter.up * converter.outputHistory[0][Converter::kOrder]);
-}
-
-TEST(SamplingFrequencyConverterTest, CopiesShareRingsAndContinueAlike) {
-    const auto input = TestSupport::Noise<double>(50);
-    Owned first(5, 3, 1);
-    first.Convert(input);
-    Converter copy = first;
-    EXPECT_EQ(copy.rings[0], first.rings[0]);
-    std::vector<double> in = input, out(first.OutputLimit(50));
-    const int written = copy.sfreq_conversion_core_block<tipo_doublebit, tipo_doublebit_outd>(
-        50, reinterpret_cast<char*>(in.data()), reinterpret_cast<char*>(out.data()), 1, 8, 8, nullptr);
-    out.resize(static_cast<std::size_t>(written));
-    EXPECT_EQ(first.Convert(input), out);
+    Owned copy = converter;
+    EXPECT_EQ(copy.Convert(block), converter.Convert(block));
+    std::ranges::fill(copy.rings, nullptr);  // the original's
 }
 
 // The initialisers clear two channels; the others go on with what they hold.
@@ -277,9 +191,7 @@ TEST(SamplingFrequencyConverterTest, ClearsTheFirstTwoChannelsOnly) {
     converter.Convert(std::vector<double>(30, 0.5), 3);
     ASSERT_EQ(converter.InitConversionByFactors(2, 1), 1);
     const auto rest = converter.Convert(std::vector<double>(3), 3);
-    EXPECT_EQ(rest[0], 0.0);
-    EXPECT_EQ(rest[1], 0.0);
-    EXPECT_NE(rest[2], 0.0);
+    EXPECT_TRUE(rest[0] == 0.0 && rest[1] == 0.0 && rest[2] != 0.0);
     for (auto* history : {converter.inputHistory[2], converter.outputHistory[2]})
         std::fill_n(history, Converter::kMaxOrder + 1, 0.0);
     EXPECT_EQ(converter.Convert(std::vector<double>(3), 3)[2], 0.0);

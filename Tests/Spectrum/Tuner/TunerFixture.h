@@ -2,12 +2,18 @@
 
 #include <cmath>
 #include <cstddef>
+#include <tuple>
 #include <vector>
 
 #include "Spectrum/AnalyserFixture.h"
 #include "Spectrum/Tuner/TunerSounds.h"
 
 class TunerTest : public AnalyserTest {};
+
+constexpr int kTunerRate = 44100;
+inline std::vector<float> TunerSine(double hz, double amplitude = 0.5, std::size_t frames = 8192) {
+    return TestSupport::Sine<float>(frames, hz, kTunerRate, amplitude);
+}
 
 // What each sensitivity is defined to be.
 struct TunerSensitivityRow {
@@ -28,7 +34,7 @@ constexpr TunerSensitivityRow kSensitivityRows[] = {
 // A tuner of its own behind an analyser's spectra.
 class TunerProbe {
 public:
-    explicit TunerProbe(int rate, int length = 8192) : m_rate(rate), m_length(length) {
+    explicit TunerProbe(int rate = kTunerRate, int length = 8192) : m_rate(rate), m_length(length) {
         kivspectrum::settings = {};
         kivspectrum::settings.window_length = length;
         kivspectrum::settings.hop_length = 1;
@@ -42,11 +48,13 @@ public:
         return m_analyser.GetPower();
     }
     // Hop 1: every analysis counts as one refresh.
+    void Tune(const std::vector<float>& power, bool denoise = false) {
+        tuner.Tune(power, {}, m_length, 1, m_length, m_rate, true, denoise);
+    }
     void Tune(const float* samples, bool denoise = false) { Tune(Transform(samples), denoise); }
     // A first note needs two analyses.
     void Show(const float* samples, bool denoise = false) {
-        Tune(samples, denoise);
-        Tune(samples, denoise);
+        for (int i = 0; i < 2; ++i) Tune(samples, denoise);
     }
     // What one analysis hears, whatever came before.
     double Hear(const float* samples) { return Hear(Transform(samples)); }
@@ -54,9 +62,6 @@ public:
         tuner.Forget();
         Tune(power);
         return tuner.GetHeardFrequency();
-    }
-    void Tune(const std::vector<float>& power, bool denoise = false) {
-        tuner.Tune(power, {}, m_length, 1, m_length, m_rate, true, denoise);
     }
 
     Tuner tuner;
