@@ -27,11 +27,6 @@ void ExpectHarmless(CorvoEffectBase& effect, const Bytes& chunk, const std::stri
     }
 }
 
-std::string NarrowText(CorvoEffectBase& effect, int index) {
-    const auto wide = effect.GetParameterFormattedText(index, effect.GetParam(index));
-    return {wide.begin(), wide.end()};
-}
-
 }  // namespace
 
 using EveryEffectSettings = EveryEffect;
@@ -133,13 +128,13 @@ TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
         if (effect->GetParameterTypeAutomatable(index) != Corvo::EffectParameterType::Continuous) continue;
         for (int step = 0; step <= 100; ++step) {
             effect->SetParam(index, static_cast<float>(step) / 100.0f, false);
-            const auto shown = NarrowText(*effect, index);
+            const auto shown = Text(*effect, index);
             ASSERT_FALSE(shown.empty()) << "parameter " << index;
             const float value = effect->GetParamValueNormalizedFromText(index, shown);
             if (value == -1.0f && step == 0) break;  // this effect parses no text
             ASSERT_TRUE(value >= 0.0f && value <= 1.00001f) << shown;
             effect->SetParam(index, value, false);
-            const auto again = NarrowText(*effect, index);
+            const auto again = Text(*effect, index);
             if (!GetParam().textTruncates) {
                 ASSERT_EQ(again, shown) << "parameter " << index;
             } else if (again != shown) {

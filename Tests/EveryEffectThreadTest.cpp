@@ -2,36 +2,15 @@
 
 #include <atomic>
 #include <chrono>
-#include <ctime>
 #include <mutex>
 #include <thread>
 
 #include "Support/AudioThreadRules.h"
-#include "Support/BlockCopy.h"
 #include "Support/EveryEffect.h"
 
 using namespace TestSupport;
 
-// What every effect promises about its two threads and about its cost.
-namespace {
-
-double ThreadSeconds() {
-#if defined(__linux__)
-    timespec time{};
-    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
-    return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_nsec) * 1e-9;
-#else
-    return static_cast<double>(std::clock()) / CLOCKS_PER_SEC;
-#endif
-}
-
-double SecondsFor(CorvoEffectBase& effect, BlockCopy<float>& block, int frames, const tWAVEFORMATEX& format) {
-    const double start = ThreadSeconds();
-    for (int round = 0; round < 40; ++round) ProcessBlock(effect, block.Fresh(), frames, format);
-    return ThreadSeconds() - start;
-}
-
-}  // namespace
+// What every effect promises about its two threads.
 
 using EveryEffectThread = EveryEffect;
 INSTANTIATE_TEST_SUITE_P(All, EveryEffectThread, testing::ValuesIn(AllEffects()), EffectTestName);
@@ -132,23 +111,4 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     }
     done = true;
     userInterface.join();
-}
-
-// Catches a missing denormal guard: filters that ring out into silence then run many times slower.
-TEST_P(EveryEffectThread, CostsNoMoreOnDenormalsThanOnNoise) {
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__) || defined(_WIN32)
-    GTEST_SKIP() << "timings mean nothing on this build";
-#endif
-    const auto effect = Make();
-    const auto format = Format<float>();
-    effect->InitProcessing(512, &format);
-    BlockCopy noise(Noise<float>(2 * 512)), tiny(Noise<float>(2 * 512, 1e-40));
-    // The best of several rounds, more of them while other work on the machine disturbs the measurement.
-    double best[2] = {1e9, 1e9};
-    for (int round = 0; round < 60; ++round) {
-        best[0] = std::min(best[0], SecondsFor(*effect, noise, 512, format));
-        best[1] = std::min(best[1], SecondsFor(*effect, tiny, 512, format));
-        if (round >= 4 && best[1] <= 1.2 * best[0]) break;
-    }
-    EXPECT_LE(best[1], 1.2 * best[0]);
 }

@@ -15,11 +15,9 @@ protected:
         Save("six.wav", NoiseSound(100, 6));
         Save("wide.wav", NoiseSound(10, 49));
         Save("none.wav", NoiseSound(0));
-        Sound other = NoiseSound(100);
-        other.rate = 999;
-        Save("slow.wav", other);
-        other.rate = 44100;
-        Save("cd.wav", other);
+        const auto sound = NoiseSound(100).samples;
+        Save("slow.wav", {2, 999, kPcm16, sound});
+        Save("cd.wav", {2, 44100, kPcm16, sound});
         SaveBytes("empty.wav", "");
         SaveBytes("text.wav", "this is no audio at all, whatever its name says");
         SaveBytes("taken.wav", "something dear");
@@ -34,12 +32,10 @@ struct Refusal {
 const Refusal kLines[] = {
     {"", "command|render"},
     {"rendr", "rendr|render"},
-    {"render in.wav", "OUT"},
     {"render in.wav o.wav --bloc 7", "--bloc"},
     {"render missing.wav o.wav", "missing.wav|No such file"},
     {"render empty.wav o.wav", "empty.wav|empty"},
     {"render none.wav o.wav", "none.wav|no samples"},
-    {"render text.wav o.wav", "text.wav|not an audio file|WAV"},
     {"render six.wav o.wav", "six.wav|6 channels|mono and stereo"},
     {"render slow.wav o.wav", "slow.wav|999|1000 to 768000"},
     {"render in.wav o.mp4", "o.mp4|.wav|.flac"},
@@ -49,45 +45,27 @@ const Refusal kLines[] = {
     {"render in.wav o.wav --format s20", "s20|s16, s24, f32, f64"},
     {"render float.wav o.flac", "o.flac|f32|s16, s24"},
     {"render in.wav o.ogg --format s16", "o.ogg|Vorbis"},
-    {"render in.wav o.wav --block 0", "--block|1 to"},
     {"render in.wav o.wav --precision 16", "--precision|32, 64"},
     {"render in.wav o.wav --tail long", "--tail|long|auto"},
-    {"render in.wav o.wav --tail -1", "--tail|-1"},
-    {"render in.wav o.wav --automation missing.json", "missing.json"},
     {"render in.wav o.wav --fx Gain --automation moves.json", "moves.json|Gain plays no automation"},
     {"render in.wav o.wav --fx Gain --fx Gain --save-chunk state", "--save-chunk"},
-    {"render in.wav o.wav --fx Gain --save-chunk taken.wav", "taken.wav|-y"},
-    {"effects Gian", "Gian|Gain"},
     {"convert cd.wav o.wav --rate 1001 --format s16", "cents|--exact"},
     {"convert cd.wav o.wav --rate 768000 --dither loud", "loud|shaped-strong"},
     {"convert float.wav o.wav --rate 96000 --dither tpdf", "s16 and s24"},
-    {"convert in.wav o.wav --rate 999", "999|1000 to 768000"},
     {"convert wide.wav o.wav --rate 48000", "49 channels|48"},
     {"pitch in.wav o.wav --semitones 37", "--semitones|36"},
-    {"pitch in.wav o.wav --semitones 1 --speed 11", "--speed|10"},
     {"pitch in.wav o.wav --semitones 1 --engine classic --speed 2", "--speed|new"},
-    {"pitch in.wav o.wav --semitones 1 --engine classic --quality 14", "--quality|13"},
-    {"pitch in.wav o.wav --semitones 1 --engine old", "old|new, classic"},
-    {"pitch six.wav o.wav --semitones 1", "6 channels|mono and stereo"},
     {"eq-curve o.csv --fx Gain", "Gain|EQ:"},
     {"eq-curve o.csv --fx \"EQ: 100 peak 1\" --rate 7", "7|100"},
     {"spectrum in.wav", "output"},
     {"spectrum in.wav - --csv -", "standard output"},
     {"spectrum in.wav --csv o.csv --length 1000", "--length|1000"},
-    {"spectrum in.wav --csv o.csv --overlap 1", "--overlap|0.99"},
-    {"spectrum in.wav --csv o.csv --window gauss", "gauss|hann"},
     {"spectrum in.wav o.png --size 0x10", "--size|0x10"},
-    {"sonogram in.wav o.png --size 100", "--size|WIDTHxHEIGHT"},
-    {"sonogram in.wav o.png --size 20000x20", "--size|16384"},
-    {"sonogram in.wav o.png --speed 9", "--speed|8"},
     {"sonogram in.wav o.png --scheme 7", "--scheme|6"},
     {"tuner in.wav o.png --dpi nan", "--dpi"},
     {"tuner in.wav o.png --view wavy", "wavy|view"},
-    {"tuner in.wav o.png --scale cubic", "cubic|log"},
-    {"tuner in.wav o.png --temperament Bach", "Bach"},
     {"tuner in.wav o.png --at 99", "--at|ends"},
     {"tuner in.wav o.png --font in.wav", "--font|in.wav"},
-    {"tuner in.wav o.png --font none.ttf", "--font|none.ttf"},
     {"tuner in.wav in.wav -y", "in.wav|input"},
 };
 const Refusal kEffects[] = {
@@ -95,47 +73,30 @@ const Refusal kEffects[] = {
     {"", "effect"},
     {"Gain: Gane=1", "Gane|Gain|Flip phase L"},
     {"Gain: Gain=loud", "Gain|loud|-Inf. dB to 20.0 dB|n:"},
-    {"Gain: Gain=", "Gain|-Inf. dB to 20.0 dB"},
     {"Gain: Gain=1e999", "1e999|dB"},
     {"Gain: Pan=nan", "Pan|nan|-1.00 to 1.00"},
-    {"Gain: Flip phase=perhaps", "perhaps|Off, On"},
     {"Gain: Pan=n:1.01", "n:1.01|0 to 1"},
-    {"Gain: preset=Loud", "preset|Loud|there are none"},
-    {"Gain: chunk=empty.wav", "empty.wav|empty"},
     {"Gain: chunk=taken.wav", "taken.wav|14 bytes|20"},
     {"Gain: Gain", "Gain|is not a setting|label=value"},
     {"Echo: Depth=5 apples", "5 apples|4999 ms"},
-    {"Echo: Depth mode=slow", "slow|Time (log)"},
     {"Echo: preset=e, preset=s", "one preset"},
     {"Valvex: Oversampling=5", "5|1, 2, 4, 8"},
     {"Tremolo: preset=f00", "f00|Fast Tremolo"},
     {"EQ", "no bands|2500 peak"},
-    {"EQ: 100", "100|FREQ TYPE"},
-    {"EQ: 0 peak", "0|1000000"},
-    {"EQ: 99.5 peak", "99.5|whole Hz"},
-    {"EQ: 100 bell", "bell|peak"},
     {"EQ: 100 low", "low|lowshelf"},
     {"EQ: 100 peak 3.05", "3.05|steps of 0.1"},
-    {"EQ: 100 peak 101", "101|100 dB"},
     {"EQ: 100 peak 3 4", "4|one gain"},
-    {"EQ: 100 peak q=1 q=2", "q=2|one gain"},
-    {"EQ: 100 peak q=0", "0|q=1"},
     {"EQ: 1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;"
      "1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak", "more than 20"},
 };
 // Moves for a chain of tremolo, echo, tremolo.
 const Refusal kMoves[] = {
     {"[", "is not JSON"},
-    {"7", "not a list of lanes"},
     {"[7]", "lane 1: a lane is"},
-    {R"([{"effect": "Echo", "parameter": "Depth"}])", "a lane is"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": []}])", "a lane is"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0]]}])", "a point is"},
-    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[-1, 0]]}])", "time"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[1e300, 0]]}])", "time"},
-    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0, 1.5]]}])", "value"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0, "1"]]}])", "value"},
-    {R"([{"effect": "Ecco", "parameter": "Depth", "points": [[0, 1]]}])", "Ecco"},
     {R"([{"effect": "Tremolo", "parameter": "Depth", "points": [[0, 1]]}])", "more than once"},
     {R"([{"effect": 4, "parameter": "Depth", "points": [[0, 1]]}])", "1 to 3"},
     {R"([{"effect": true, "parameter": "Depth", "points": [[0, 1]]}])", "a name or a place"},
@@ -164,11 +125,8 @@ TEST_F(CommandLine, RefusesBadInput) {
     }
     EXPECT_EQ(Bytes("taken.wav"), "something dear");
     EXPECT_EQ(Load("in.wav").samples, NoiseSound(100).samples);
-}
-
-TEST_F(CommandLine, OverwritesOnlyWhenAsked) {
     Succeed("render in.wav taken.wav -y");
-    EXPECT_EQ(Load("taken.wav").samples, Load("in.wav").samples);
+    EXPECT_EQ(Load("taken.wav").samples, NoiseSound(100).samples);
 }
 
 #if !defined(_WIN32)
@@ -193,9 +151,7 @@ TEST_F(CommandLine, ReportsAFullDisk) {
 
 // Ctrl-C while it waits for more input leaves nothing behind either.
 TEST_F(CommandLine, LeavesNothingWhenInterrupted) {
-    std::string endless = Bytes("in.wav");
-    endless.replace(40, 4, "\xFF\xFF\xFF\xFF");
-    SaveBytes("endless", endless);
+    SaveBytes("endless", Bytes("in.wav").replace(40, 4, "\xFF\xFF\xFF\xFF"));
     const auto result = Shell(
         "mkfifo fifo; exec 3<>fifo; cat endless >&3; DSPHOST render fifo out.flac & "
         "while ! ls | grep -q part; do sleep 0.02; done; kill -TERM $!; wait $!; "

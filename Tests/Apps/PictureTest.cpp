@@ -1,5 +1,5 @@
-#include <algorithm>
-#include <cstddef>
+#include <filesystem>
+#include <fstream>
 #include <utility>
 
 #include <cairo.h>
@@ -9,23 +9,6 @@
 #include "Picture.h"
 
 using dsphost::Picture;
-
-namespace {
-
-struct Bytes {
-    const std::vector<std::uint8_t>& all;
-    std::size_t read = 0;
-};
-
-cairo_status_t Take(void* bytes, unsigned char* to, unsigned count) {
-    auto& [all, read] = *static_cast<Bytes*>(bytes);
-    if (all.size() - read < count) return CAIRO_STATUS_READ_ERROR;
-    std::copy_n(all.begin() + static_cast<std::ptrdiff_t>(read), count, to);
-    read += count;
-    return CAIRO_STATUS_SUCCESS;
-}
-
-}  // namespace
 
 // Catches red and blue exchanged, an alpha that lets the viewer's ground through, and a Paint that starts
 // over instead of going on.
@@ -38,8 +21,10 @@ TEST(Picture, IsSavedAsItWasDrawn) {
     picture.Paint([](auto& target) { target.FillRectangle({4, 2, 1, 1}, {0x00FF8000u, 128}); });
 
     const auto png = picture.Png();
-    Bytes bytes{png};
-    cairo_surface_t* const image = cairo_image_surface_create_from_png_stream(Take, &bytes);
+    const auto path = (std::filesystem::temp_directory_path() / "dsphost-picture.png").string();
+    std::ofstream(path, std::ios::binary).write(reinterpret_cast<const char*>(png.data()), std::ssize(png));
+    cairo_surface_t* const image = cairo_image_surface_create_from_png(path.c_str());
+    std::filesystem::remove(path);
     ASSERT_EQ(cairo_surface_status(image), CAIRO_STATUS_SUCCESS);
     EXPECT_EQ(cairo_image_surface_get_format(image), CAIRO_FORMAT_RGB24);
     ASSERT_EQ(cairo_image_surface_get_width(image), 5);

@@ -22,7 +22,7 @@ using dsphost::AutomationPoint;
 // by the automated gain at the frame that the points name.
 class Model : public dsphost::ChainElement {
 public:
-    Model(int latency, std::size_t echo, double level = 0.5)
+    Model(int latency, std::size_t echo = 0, double level = 0.5)
         : m_latency(latency), m_level(level), m_echo(echo), m_line(static_cast<std::size_t>(latency)) {}
 
     std::string Name() const override { return "Model"; }
@@ -60,10 +60,9 @@ private:
 
 class Rendering : public Program {
 protected:
-    template <typename... Elements>
-    static std::vector<std::unique_ptr<dsphost::ChainElement>> Models(Elements... elements) {
+    static std::vector<std::unique_ptr<dsphost::ChainElement>> Models(std::vector<Model> models) {
         std::vector<std::unique_ptr<dsphost::ChainElement>> all;
-        (all.push_back(std::make_unique<Model>(std::move(elements))), ...);
+        for (auto& model : models) all.push_back(std::make_unique<Model>(std::move(model)));
         return all;
     }
 
@@ -83,7 +82,7 @@ protected:
 TEST_F(Rendering, LinesUpWithTheInputWhateverTheLatency) {
     const auto input = NoiseSound(1000, 1).samples;
     for (const int block : {1, 7, 100, 4096}) {
-        dsphost::Chain chain(Models(Model(100, 0), Model(1, 0), Model(2000, 0)));
+        dsphost::Chain chain(Models({{100}, {1}, {2000}}));
         EXPECT_EQ(Render(input, chain, {.block = block}), input) << block;
         EXPECT_EQ(chain.Latency(), 2101);
     }
@@ -93,7 +92,7 @@ TEST_F(Rendering, LinesUpWithTheInputWhateverTheLatency) {
 TEST_F(Rendering, AutomatesToTheFrame) {
     const std::vector<double> input(1000, 1.0);
     for (const int block : {1, 64, 999, 4096}) {
-        dsphost::Chain chain(Models(Model(300, 0), Model(50, 0)));
+        dsphost::Chain chain(Models({{300}, {50}}));
         chain.Automate(0, 0, std::vector<AutomationPoint>{{0, 1.0f}, {123, 0.5f}, {700, 0.25f}});
         chain.Automate(1, 0, std::vector<AutomationPoint>{{0, 1.0f}, {456, 0.125f}});
         const auto output = Render(input, chain, {.block = block});
@@ -107,7 +106,7 @@ TEST_F(Rendering, CutsTheTailWhereToldOrWhereItHasDied) {
     std::vector<double> input(1000);
     input[990] = 1.0;
     const auto frames = [&](std::size_t echo, double level, std::optional<double> tail) {
-        dsphost::Chain chain(Models(Model(77, echo, level)));
+        dsphost::Chain chain(Models({{77, echo, level}}));
         return Render(input, chain, {.tail = tail}).size();
     };
     EXPECT_EQ(frames(48000, 0.5, 0.0), 1000u);

@@ -27,6 +27,12 @@ void Note(Kind kind) {
     if (t_counting) ++t_counts[kind];
 }
 
+template <typename Result>
+Result Counted(Kind kind, Result result) {
+    Note(kind);
+    return result;
+}
+
 template <typename Function>
 Function* Next(const char* name) {
     return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
@@ -63,7 +69,7 @@ bool AudioThreadRules::CanCount() {
 }  // namespace TestSupport
 
 #if COUNTS_CALLS
-using TestSupport::Note;
+using namespace TestSupport;
 
 extern "C" {
 void* __libc_malloc(std::size_t);
@@ -72,62 +78,41 @@ void* __libc_realloc(void*, std::size_t);
 void* __libc_memalign(std::size_t, std::size_t);
 void __libc_free(void*);
 
-void* malloc(std::size_t size) {
-    Note(TestSupport::kAllocation);
-    return __libc_malloc(size);
-}
-void* calloc(std::size_t count, std::size_t size) {
-    Note(TestSupport::kAllocation);
-    return __libc_calloc(count, size);
-}
-void* realloc(void* memory, std::size_t size) {
-    Note(TestSupport::kAllocation);
-    return __libc_realloc(memory, size);
-}
+void* malloc(std::size_t size) { return Counted(kAllocation, __libc_malloc(size)); }
+void* calloc(std::size_t count, std::size_t size) { return Counted(kAllocation, __libc_calloc(count, size)); }
+void* realloc(void* memory, std::size_t size) { return Counted(kAllocation, __libc_realloc(memory, size)); }
 void* aligned_alloc(std::size_t alignment, std::size_t size) {
-    Note(TestSupport::kAllocation);
-    return __libc_memalign(alignment, size);
+    return Counted(kAllocation, __libc_memalign(alignment, size));
 }
 int posix_memalign(void** memory, std::size_t alignment, std::size_t size) {
-    Note(TestSupport::kAllocation);
-    *memory = __libc_memalign(alignment, size);
+    *memory = Counted(kAllocation, __libc_memalign(alignment, size));
     return *memory ? 0 : ENOMEM;
 }
 void free(void* memory) {
-    if (memory) Note(TestSupport::kFree);
+    if (memory) Note(kFree);
     __libc_free(memory);
 }
 
-// Trying a lock is allowed; only a lock that can wait counts.
+// Trying a lock is allowed; only a lock that can wait counts. A condition is waited for under such a lock.
 int pthread_mutex_lock(pthread_mutex_t* mutex) {
-    static const auto next = TestSupport::Next<int(pthread_mutex_t*)>("pthread_mutex_lock");
-    Note(TestSupport::kLock);
-    return next(mutex);
-}
-int pthread_cond_wait(pthread_cond_t* condition, pthread_mutex_t* mutex) {
-    static const auto next = TestSupport::Next<int(pthread_cond_t*, pthread_mutex_t*)>("pthread_cond_wait");
-    Note(TestSupport::kWait);
-    return next(condition, mutex);
+    static const auto next = Next<int(pthread_mutex_t*)>("pthread_mutex_lock");
+    return Counted(kLock, next(mutex));
 }
 int clock_nanosleep(clockid_t clock, int flags, const timespec* time, timespec* rest) {
-    static const auto next =
-        TestSupport::Next<int(clockid_t, int, const timespec*, timespec*)>("clock_nanosleep");
-    Note(TestSupport::kWait);
-    return next(clock, flags, time, rest);
+    static const auto next = Next<int(clockid_t, int, const timespec*, timespec*)>("clock_nanosleep");
+    return Counted(kWait, next(clock, flags, time, rest));
 }
 int nanosleep(const timespec* time, timespec* rest) {
-    static const auto next = TestSupport::Next<int(const timespec*, timespec*)>("nanosleep");
-    Note(TestSupport::kWait);
-    return next(time, rest);
+    static const auto next = Next<int(const timespec*, timespec*)>("nanosleep");
+    return Counted(kWait, next(time, rest));
 }
 int sched_yield() noexcept {
-    static const auto next = TestSupport::Next<int()>("sched_yield");
-    Note(TestSupport::kWait);
-    return next();
+    static const auto next = Next<int()>("sched_yield");
+    return Counted(kWait, next());
 }
 [[noreturn]] void __cxa_throw(void* object, std::type_info* type, void (*destroy)(void*)) {
-    static const auto next = TestSupport::Next<void(void*, std::type_info*, void (*)(void*))>("__cxa_throw");
-    Note(TestSupport::kThrow);
+    static const auto next = Next<void(void*, std::type_info*, void (*)(void*))>("__cxa_throw");
+    Note(kThrow);
     next(object, type, destroy);
     __builtin_unreachable();
 }

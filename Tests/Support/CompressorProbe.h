@@ -1,7 +1,6 @@
 #pragma once
 
 #include <cmath>
-#include <string>
 #include <vector>
 
 #include "DSP/Effects/Compressor/Compressor.h"
@@ -33,11 +32,6 @@ inline float RatioPosition(int step) { return (static_cast<float>(step) + 0.5f) 
 inline float TimePosition(int hundredths) { return (static_cast<float>(hundredths) - 0.5f) / 99999.0f; }
 inline float OutGainPosition(int tenths) {
     return (static_cast<float>(tenths) + (tenths < 0 ? 959.5f : 960.5f)) / 1160.0f;
-}
-
-inline std::string Text(Compressor& effect, int index) {
-    const auto wide = effect.GetParameterFormattedText(index, effect.GetParam(index));
-    return {wide.begin(), wide.end()};
 }
 
 inline double Amplitude(double db) { return std::pow(10.0, db / 20.0); }

@@ -2,13 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#if defined(_WIN32)
-#include "Support/DrawingSurfaceD2D.h"
-#include "Support/DrawingSurfaceGdiPlus.h"
-#else
-#include "Support/DrawingSurfaceCairo.h"
-#endif
-
 namespace TestSupport {
 
 // A picture in memory, black at first, and one back-end that draws on it.
@@ -20,11 +13,18 @@ namespace TestSupport {
 template <typename Drawing>
 class DrawingSurface;
 
-// Every back-end of this system: what a typed suite about drawing runs over.
-#if defined(_WIN32)
-using DrawingBackends = testing::Types<Corvo::DrawingGdiPlus, Corvo::DrawingD2D>;
-#else
-using DrawingBackends = testing::Types<Corvo::DrawingCairo>;
-#endif
-
 }  // namespace TestSupport
+
+// DrawingBackends: every back-end of this system, what a typed suite about drawing runs over.
+#if defined(_WIN32)
+#include "Support/DrawingSurfaceD2D.h"
+#include "Support/DrawingSurfaceGdiPlus.h"
+namespace TestSupport {
+using DrawingBackends = testing::Types<Corvo::DrawingGdiPlus, Corvo::DrawingD2D>;
+}
+#else
+#include "Support/DrawingSurfaceCairo.h"
+namespace TestSupport {
+using DrawingBackends = testing::Types<Corvo::DrawingCairo>;
+}
+#endif

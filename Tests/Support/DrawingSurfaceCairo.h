@@ -8,9 +8,6 @@
 
 namespace TestSupport {
 
-template <typename Drawing>
-class DrawingSurface;
-
 template <>
 class DrawingSurface<Corvo::DrawingCairo> {
 public:

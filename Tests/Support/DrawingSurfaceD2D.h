@@ -14,9 +14,6 @@
 
 namespace TestSupport {
 
-template <typename Drawing>
-class DrawingSurface;
-
 // The one render target of all surfaces, made once: a device is slow to make, and some systems that stand in
 // for Windows have room for a few only.
 class SharedRenderTarget {

@@ -7,9 +7,6 @@
 
 namespace TestSupport {
 
-template <typename Drawing>
-class DrawingSurface;
-
 template <>
 class DrawingSurface<Corvo::DrawingGdiPlus> {
 public:

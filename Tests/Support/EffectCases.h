@@ -3,7 +3,6 @@
 #include <cstdint>
 #include <memory>
 #include <span>
-#include <string>
 
 #include "DSP/Effects/Framework/CorvoEffectBase.h"
 
@@ -13,15 +12,7 @@ namespace TestSupport {
 enum class Cuts {
     SameBits,
     PhasePerBlock,  // an oscillator's phase is reduced per block: 1e-12 in double, one rounding in float
-    Glides,         // 1e-9: coefficients that glide are sampled per block
     Exempt,         // the engine behind it works in pieces of its own
-};
-
-// How far another build of the library (other compiler, other mathematics library) may be off.
-enum class OtherBuild {
-    SameBits,   // basic arithmetic only
-    Relative,   // 1e-12 relative in double: sines, powers and logarithms differ in the last bit
-    Character,  // length, level and pitch only
 };
 
 // One row per effect; every suite over all effects, the comparison with the Windows build and the
@@ -30,8 +21,8 @@ struct EffectCase {
     const char* name;
     std::unique_ptr<Corvo::DSP::CorvoEffectBase> (*make)();
     Cuts cuts = Cuts::SameBits;
-    OtherBuild otherBuild = OtherBuild::SameBits;
-    const char* otherBuildReason = "basic arithmetic only";
+    // The engine's splices are choices between near equals, which another build may make otherwise.
+    bool splices = false;
     // The engine behind the effect allocates or locks while processing; says why.
     const char* engineAllocates = nullptr;
     // Some settings have a loop gain of 1 or more, so the output may grow without bound.
@@ -49,6 +40,5 @@ struct EffectCase {
 };
 
 std::span<const EffectCase> AllEffects();
-const EffectCase& FindEffect(const std::string& name);
 
 }  // namespace TestSupport

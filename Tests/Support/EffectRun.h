@@ -1,6 +1,7 @@
 #pragma once
 
 #include <algorithm>
+#include <string>
 #include <vector>
 
 #include "DSP/Effects/Framework/CorvoEffectBase.h"
@@ -66,6 +67,22 @@ inline std::vector<std::uint8_t> Chunk(CorvoEffectBase& effect) {
     std::vector<std::uint8_t> chunk;
     effect.GetSettingsChunk(chunk);
     return chunk;
+}
+
+// Loads settings by the words of the chunk in their order; those left out are 0.
+inline void LoadWords(CorvoEffectBase& effect, std::vector<std::int32_t> words) {
+    words.resize(static_cast<std::size_t>(effect.GetSettingsChunkSize()) / 4);
+    const auto* const bytes = reinterpret_cast<const std::uint8_t*>(words.data());
+    effect.SetSettingsChunk({bytes, bytes + 4 * words.size()});
+}
+
+// What the effect shows for a parameter: at a value, or as it stands.
+inline std::string Text(CorvoEffectBase& effect, int index, double value) {
+    const auto wide = effect.GetParameterFormattedText(index, value);
+    return {wide.begin(), wide.end()};
+}
+inline std::string Text(CorvoEffectBase& effect, int index) {
+    return Text(effect, index, effect.GetParam(index));
 }
 
 inline std::vector<float> AllParams(CorvoEffectBase& effect) {

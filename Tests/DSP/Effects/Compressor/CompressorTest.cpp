@@ -113,10 +113,10 @@ TEST(Compressor, RepairsWhatAChunkHolds) {
         {"no origin", kPoints, 1e-5f},
         {"a negative level", kPoints + 12 * 20 + 4, -1.0f},
     };
-    Compressor source;
-    const auto good = Chunk(source);
-    const auto check = [&](const Bytes& chunk, const std::string& what) {
+    const auto check = [](std::size_t offset, auto value, const std::string& what) {
         Compressor effect;
+        auto chunk = Chunk(effect);
+        Put(chunk, offset, value);
         effect.SetSettingsChunk(chunk);
         const auto repaired = Chunk(effect);
         for (std::size_t channel = 0; channel < 2; ++channel) {
@@ -133,34 +133,16 @@ TEST(Compressor, RepairsWhatAChunkHolds) {
         for (const double gain : SteadyGains(effect, Levels(-100.0, 6.0, 3.0), 50))
             ASSERT_LT(gain, 150.0) << what;
     };
-    for (const auto& c : cases) {
-        auto chunk = good;
-        Put(chunk, c.offset, c.value);
-        check(chunk, c.what);
-    }
-    for (const std::int32_t count : {-1, 0, 1, 666, 667, std::numeric_limits<std::int32_t>::max()}) {
-        auto chunk = good;
-        Put(chunk, kCounts, count);
-        check(chunk, "a count of " + std::to_string(count));
-    }
-    for (const std::int32_t word : {0, -1, std::numeric_limits<std::int32_t>::min()}) {
-        auto chunk = good;
-        for (std::size_t i = 0; i < 4; ++i) Put(chunk, kRecord + 4 * i, word);
-        check(chunk, "times of " + std::to_string(word));
-    }
+    for (const auto& c : cases) check(c.offset, c.value, c.what);
+    for (const std::int32_t count : {-1, 0, 1, 666, 667, std::numeric_limits<std::int32_t>::max()})
+        check(kCounts, count, "a count of " + std::to_string(count));
 }
 
-TEST(Compressor, UnderstandsTexts) {
+TEST(Compressor, UnderstandsRatiosAndWords) {
     Compressor effect;
-    struct Case {
-        int index;
-        const char* text;
-        float value;
-    } const cases[] = {{0, "1000.00 ms", 1.0f}, {7, "-Inf.", 0.0f}, {9, "Inf.:1 ", 1.0f},
-                       {8, "250:1", 1.0f},      {10, "On", 1.0f},   {12, "off", 0.0f}};
-    for (const auto& c : cases)
-        EXPECT_EQ(effect.GetParamValueNormalizedFromText(c.index, c.text), c.value) << c.text;
-    EXPECT_THROW(effect.GetParamValueNormalizedFromText(0, "soon"), std::invalid_argument);
+    EXPECT_EQ(effect.GetParamValueNormalizedFromText(kRatio, "250:1"), 1.0f);
+    EXPECT_EQ(effect.GetParamValueNormalizedFromText(kMakeUp, "off"), 0.0f);
+    EXPECT_THROW(effect.GetParamValueNormalizedFromText(kAttack, "soon"), std::invalid_argument);
 }
 
 // Catches automation that the editor never sees, and one that overtakes a preset loaded meanwhile.

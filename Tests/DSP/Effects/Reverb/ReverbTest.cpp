@@ -4,7 +4,6 @@
 
 #include <cmath>
 #include <complex>
-#include <cstring>
 #include <numbers>
 
 #include "Support/EffectRun.h"
@@ -30,9 +29,9 @@ using Words = std::array<std::int32_t, 18>;
 using Complex = std::complex<double>;
 
 void Load(Reverb& reverb, const Words& settings) {
-    std::vector<std::uint8_t> chunk(4 + sizeof settings);
-    std::memcpy(chunk.data() + 4, &settings, sizeof settings);
-    reverb.SetSettingsChunk(chunk);
+    std::vector<std::int32_t> words{0};
+    words.insert(words.end(), settings.begin(), settings.end());
+    LoadWords(reverb, words);
 }
 
 // What a frequency becomes on its way through one channel, from the meaning of the settings.
