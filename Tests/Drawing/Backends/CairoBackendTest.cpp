@@ -53,18 +53,6 @@ TEST_F(CairoBackend, LaysOutNothingTwice) {
     }
 }
 
-// Catches views that draw beside their rectangle, or nothing.
-TEST_F(CairoBackend, DrawsWithinTheRectangle) {
-    ShownAnalyser shown;
-    DrawingSurface<DrawingCairo> surface(64, 48);
-    surface.Paint(96.0f, [&](auto& target) {
-        shown.analyser.DoDrawSpectrum<DrawingCairo>(target, {10, 10, 30, 20});
-    });
-    for (const auto& [x, y] : {std::pair{9, 15}, {40, 15}, {15, 9}, {15, 30}})
-        EXPECT_EQ(surface.Pixel(x, y), 0u) << x << ", " << y;
-    EXPECT_NE(surface.Pixel(15, 28), 0u);
-}
-
 // Catches a typeface's file that joins the program's once more with every back-end.
 TEST_F(CairoBackend, AddsATypefacesFileOnce) {
     const FcFontSet* const system = FcConfigGetFonts(nullptr, FcSetSystem);
