@@ -1,4 +1,5 @@
 #include "EffectRun.h"
+#include "Support/EffectCases.h"
 
 // What does the frame itself cost per block, before any effect does anything? Bar: 60 ns.
 namespace {
@@ -41,5 +42,18 @@ void BM_BlockCopy(benchmark::State& state) {
 }
 BENCHMARK_TEMPLATE(BM_BlockCopy, float)->Arg(512);
 BENCHMARK_TEMPLATE(BM_BlockCopy, double)->Arg(512);
+
+// What does every effect cost at the preset that a host starts from? The README shows these.
+[[maybe_unused]] const bool kEveryEffect = [] {
+    for (const auto& row : TestSupport::AllEffects())
+        benchmark::RegisterBenchmark((std::string("BM_EveryEffect/") + row.name).c_str(),
+                                     [&row](benchmark::State& state) {
+                                         const auto effect = row.make();
+                                         effect->SetPreset(effect->GetDefaultPreset());
+                                         RunEffect<float>(state, *effect);
+                                     })
+            ->Arg(512);
+    return true;
+}();
 
 }  // namespace
