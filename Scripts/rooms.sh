@@ -2,8 +2,8 @@
 # Holds the table of rooms in README.md against what the sources include. A room is a folder; it may include what
 # its row names, and a row names only rooms further up, so there are no circles. Where a row says "public
 # headers", these are the ones that CMake installs.
-# Fails on: a forbidden include; an installed header that includes one that is not; a folder without a row; a row
-# without a folder; an arrow that nothing uses; an arrow that points down the table.
+# Fails on: a forbidden include; one of our own in angle brackets; an installed header that includes one that is not;
+# a folder without a row; a row without a folder; an arrow that nothing uses; an arrow that points down the table.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
@@ -72,6 +72,14 @@ FNR == 1 {
 /^[ \t]*#[ \t]*include[ \t]*"/ {
     split($0, quoted, "\"")
     check(FILENAME ":" FNR, quoted[2])
+}
+/^[ \t]*#[ \t]*include[ \t]*<[A-Za-z]+\// {
+    split($0, quoted, /[<\/]/)
+    for (room in line_of)
+        if (index(room "/", "Src/" quoted[2] "/") == 1) {
+            complain(FILENAME ":" FNR, "our own headers are included in quotes")
+            break
+        }
 }
 END {
     for (room in line_of) if (!(room in seen)) complain(line_of[room], room " has a row but no files")

@@ -51,7 +51,7 @@ compare() {
     }
     function holds() { return NF == 3 ? library ~ /^(lib)?DSPDll\./ : index(" " $4 " ", " " library " ") }
     function state(key) { return sprintf("%d %06x", members[key], sums[key]) }
-    FNR == NR {
+    FILENAME == ARGV[1] {
         if (/^(#|$)/) next
         if (holds()) { row[$1] = $2 " " $3; order[++count] = $1 }
         next
@@ -74,6 +74,7 @@ compare() {
                 failed = 1
             }
         }
+        if (!count || !total) { print "no rows, or no names, for " library; failed = 1 }
         if (!failed && !update) print library " exports " total " names, as " count " rows of exports.txt say"
         exit failed
     }' "$rows" <(names "$1")
