@@ -57,28 +57,6 @@ TEST(CompressorCurve, EveryPresetFollowsItsRow) {
     }
 }
 
-// Catches thresholds and ratios that are drawn too coarsely, or mean something else than they say, and a
-// make-up gain that misses full scale or exceeds its limit.
-TEST(CompressorCurve, FollowsThresholdAndRatio) {
-    const auto levels = Levels(-90.0, 0.0, 1.3);
-    for (const int tenths : {-800, -613, -400, -155, -10})
-        for (const int step : {0, 40, 125, 188, 240, 251}) {
-            const bool makeUp = tenths != -155;
-            Compressor effect;
-            effect.SetPreset(2);  // a hard knee
-            SetBoth(effect, kThreshold, ThresholdPosition(tenths));
-            SetBoth(effect, kRatio, RatioPosition(step));
-            effect.SetParam(kAttack, TimePosition(100), false);
-            effect.SetParam(kMakeUp, makeUp ? 1.0f : 0.0f, false);
-            const auto gains = SteadyGains(effect, levels, 200);
-            const double threshold = tenths / 10.0, fall = step / 251.0;
-            const double added = makeUp ? std::min(-fall * threshold, 40.0) : 0.0;  // up to full scale
-            for (std::size_t i = 0; i < levels.size(); ++i)
-                ASSERT_NEAR(gains[i], added - fall * std::max(levels[i] - threshold, 0.0), 0.05)
-                    << threshold << " dB, step " << step << ", at " << levels[i] << " dB";
-        }
-}
-
 // Catches edits of the knee that reach the gate under it, and a gate that is lost when the knee that pushed
 // it down whole goes up again.
 TEST(CompressorCurve, AGateSurvivesTheThreshold) {

@@ -26,22 +26,9 @@ void Put(Bytes& chunk, std::size_t offset, T value) {
     std::memcpy(chunk.data() + offset, &value, sizeof value);
 }
 
-constexpr std::size_t kRecord = 4, kCounts = kRecord + 96, kPoints = kRecord + 112, kPreset = 16100,
-                      kLastThreshold = 16104, kLastRatio = 16108;
+constexpr std::size_t kRecord = 4, kCounts = kRecord + 96, kPoints = kRecord + 112, kPreset = 16100;
 
 }  // namespace
-
-TEST(Compressor, KeepsThePresetAndWhatWasSetSince) {
-    Compressor effect;
-    const auto stored = [&](std::size_t at) { return At<std::int32_t>(Chunk(effect), at); };
-    effect.SetParam(kThreshold, 0.5f, false);
-    EXPECT_EQ(stored(kLastThreshold), -405);
-    effect.SetPreset(3);
-    EXPECT_EQ(stored(kPreset), 3);
-    EXPECT_EQ(stored(kLastThreshold), -9999);
-    effect.SetParam(kStereoLink + 1, 0.0f, false);
-    EXPECT_EQ(effect.GetParam(kStereoLink), 0.0f) << "the pair is one switch";
-}
 
 // Catches a boundary off by one and fields that a short chunk should leave alone.
 TEST(Compressor, ReadsChunksAsFarAsTheyGo) {

@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <clocale>
 #include <cmath>
 #include <stdexcept>
 
@@ -18,16 +17,6 @@ TEST(FixedPoint, TruncatesAndStaysInItsRange) {
     EXPECT_EQ(map.Word(std::nanf("")), -10);
     EXPECT_EQ(map.Word(7.0f), 990);
     EXPECT_EQ(map.Normalised(-5000), 0.0f);
-}
-
-// Catches a comma that a process with another locale would show, or expect.
-TEST(ParameterText, IgnoresTheLocale) {
-    const std::string before = std::setlocale(LC_ALL, nullptr);
-    for (const char* locale : {"de_DE.UTF-8", "fr_FR.UTF-8", "German"})
-        if (std::setlocale(LC_ALL, locale)) break;
-    EXPECT_EQ(FormatFixed(1.5, 1), L"1.5");
-    EXPECT_EQ(ParseNumber("1.5 dB"), 1.5f);
-    std::setlocale(LC_ALL, before.c_str());
 }
 
 TEST(ParameterText, ReadsWhatItShows) {

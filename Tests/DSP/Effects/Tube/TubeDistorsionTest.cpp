@@ -79,6 +79,17 @@ TEST(TubeDistorsionTest, ShapesLikeThePlainForm) {
     }
 }
 
+// At drive 0.9901 the sine is 1 and its shape factor would be infinite.
+TEST(TubeDistorsionTest, MartensStaysFiniteAtItsSteepest) {
+    for (float drive = 0.9890f; drive < 0.9912f; drive += 0.00001f) {
+        TubeDistorsion tube;
+        SetBoth(tube, kDrive, drive);
+        const auto output = Render<double>(tube, {0.0, 0.0, 0.5, -0.5}, Format<double>(), {2});
+        EXPECT_EQ(output[0], 0.0);
+        EXPECT_NEAR(output[2], 1.0, 1e-4) << drive;
+    }
+}
+
 // The filter's response against the four sections' product; -12 dB at its corner. Off above 3 radians.
 TEST(TubeDistorsionTest, ToneIsALowPassOfOrderFour) {
     const auto z = [](double radians) { return std::polar(1.0, -radians); };
