@@ -74,8 +74,8 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
         }
 }
 
-// Catches races between edits, automation and processing (under the thread sanitizer) and edits that get
-// lost.
+// Catches races between edits, automation and processing (under the thread sanitizer), and a hand-over that
+// takes no more settings after many edits: the last ones must sound as they do in a new instance.
 TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     const auto effect = Make();
     const auto format = Format<float>();
@@ -111,4 +111,20 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     }
     done = true;
     userInterface.join();
+
+    const auto donor = Make(), fresh = Make();
+    Random random(17);
+    SetAllParams(*donor, random);
+    const auto settings = Chunk(*donor);
+    std::vector<float> heard[2];
+    for (std::size_t i = 0; auto* each : {effect.get(), fresh.get()}) {
+        for (int index = 0; index < each->GetParamCountReal(); ++index) each->AddEnvelope(index, 0, nullptr);
+        each->SetSettingsChunk(settings);
+        EXPECT_EQ(Chunk(*each), settings);
+        each->Cleanup();
+        heard[i++] = Render(*each, Noise<float>(2 * 4800), format, {32});
+    }
+    if (!GetParam().phaseRunsOn) {
+        EXPECT_EQ(heard[0], heard[1]);
+    }
 }

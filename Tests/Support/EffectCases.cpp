@@ -28,7 +28,7 @@ constexpr std::array kEffects{
         .name = "Compressor", .make = Make<Compressor>, .linkedParameters = true, .shortestChunk = 16100},
     EffectCase{.name = "Tremolo", .make = Make<Autovol>, .cuts = Cuts::PhasePerBlock},
     EffectCase{.name = "Chorus", .make = Make<Chorus>, .cuts = Cuts::PhasePerBlock},
-    EffectCase{.name = "Phaser", .make = Make<Phaser>},
+    EffectCase{.name = "Phaser", .make = Make<Phaser>, .phaseRunsOn = true},
     EffectCase{
         .name = "Echo", .make = Make<Echo>, .mayGrow = true, .linkedParameters = true, .shortestChunk = 92},
     EffectCase{.name = "Tube distortion", .make = Make<TubeDistorsion>},

@@ -35,6 +35,8 @@ struct EffectCase {
     bool plainFloats = false;
     // A new instance holds an empty record; the host loads a preset or a chunk first.
     bool startsBlank = false;
+    // A sweep's phase runs on through preparation, so a used instance sounds unlike a new one.
+    bool phaseRunsOn = false;
     // Texts are truncated, so text -> value -> text may lose one unit of the last place.
     bool textTruncates = false;
 };

@@ -48,8 +48,8 @@ std::vector<TransferCurve> Presets() {
     return curves;
 }
 
-// As many points as a curve can have, at random places of a smooth bend, which `roughness` makes a saw.
-TransferCurve Full(TestSupport::Random& random, double roughness) {
+// As many points as a curve can have, at random places of a bend.
+TransferCurve Full(TestSupport::Random& random) {
     std::vector<double> levels{1.0};
     while (levels.size() + 1 < TransferCurve::kMaxPoints)
         levels.push_back(std::pow(10.0, -4.5 * random.Unit()));
@@ -57,8 +57,7 @@ TransferCurve Full(TestSupport::Random& random, double roughness) {
     const double slope = 0.3 + 0.7 * random.Unit();
     TransferCurve curve;
     curve.Add(0.0, 0.0);
-    for (const double level : levels)
-        curve.Add(level, std::pow(level, slope) * (1.0 - roughness * random.Unit()));
+    for (const double level : levels) curve.Add(level, std::pow(level, slope));
     curve.UpdateSlopes();
     return curve;
 }
@@ -105,44 +104,20 @@ TEST(CompressorGlide, BetweenAnyTwoPresetsNothingSteps) {
 TEST(CompressorGlide, EditsOnTheWayChangeNothingAtOnce) {
     const auto levels = Ladder(0.9);
     const auto presets = Presets();
-    struct Case {
-        const char* what;
-        double full, roughness;  // how many curves are full of points, and how rough they are
-        int framesBetween;
-        double apart;  // dB
-    } const cases[] = {
-        {"presets and their thresholds", 0.0, 0.0, 100, 1e-4},
-        {"the same without a pause", 0.0, 0.0, 2, 1e-4},
-        {"smooth curves full of points", 0.4, 0.0, 100, 0.1},
-        {"saws full of points", 0.6, 1.0, 100, 20.0},
-    };
-    for (const auto& c : cases) {
-        TestSupport::Random random(7);
-        GlidingMap map;
-        auto target = presets[1];
+    TestSupport::Random random(7);
+    GlidingMap map;
+    auto target = presets[1];
+    map.SetOutFor(Both(target), kSmoothing);
+    for (int edit = 0; edit < 400; ++edit) {
+        map.factor *= std::pow(1.0 - kSmoothing, random.Below(100));
+        if (edit % 3 == 0)
+            target.MoveThreshold(-800 + random.Below(790));
+        else
+            target = edit % 2 ? Full(random) : presets[static_cast<std::size_t>(random.Below(42))];
+        const auto before = Heard(map, levels);
         map.SetOutFor(Both(target), kSmoothing);
-        double worst = 0.0;
-        for (int edit = 0; edit < 400; ++edit) {
-            for (int frames = random.Below(c.framesBetween); frames > 0; --frames)
-                map.factor *= 1.0 - kSmoothing;
-            if (random.Unit() < c.full)
-                target = Full(random, c.roughness);
-            else if (edit % 3 == 0)
-                target.MoveThreshold(-800 + random.Below(790));
-            else
-                target = presets[static_cast<std::size_t>(random.Below(42))];
-            const auto before = Heard(map, levels);
-            map.SetOutFor(Both(target), kSmoothing);
-            const auto after = Heard(map, levels);
-            for (std::size_t i = 0; i < levels.size(); ++i)
-                worst = std::max(worst, DbApart(before[i], after[i]));
-            ASSERT_LE(static_cast<std::size_t>(map.m_comp_map[0].count), GlidingCurve::kRoom) << c.what;
-        }
-        EXPECT_LT(worst, c.apart) << c.what;
-        GlidingMap standing;
-        standing.SetOutFor(Both(target), kSmoothing);
-        standing.Arrive();
-        map.Arrive();
-        EXPECT_EQ(Heard(map, levels), Heard(standing, levels)) << c.what;
+        const auto after = Heard(map, levels);
+        for (std::size_t i = 0; i < levels.size(); ++i) ASSERT_LT(DbApart(before[i], after[i]), 0.1) << edit;
+        ASSERT_LE(static_cast<std::size_t>(map.m_comp_map[0].count), GlidingCurve::kRoom) << edit;
     }
 }

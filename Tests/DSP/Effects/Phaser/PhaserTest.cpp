@@ -12,7 +12,7 @@ using namespace TestSupport;
 
 namespace {
 
-enum { kFeedback = 1, kWidth = 5, kStages };
+enum { kFeedback = 1, kWidth = 5 };
 
 // The settings in the order of the chunk.
 struct Settings {
@@ -87,12 +87,4 @@ TEST(Phaser, MovesTheRightSweepOnlyWithTheWidth) {
     phaser.SetParam(kWidth, 0.75f, false);
     right.phase = left.phase + 0.75 * 6.283185307179586;
     run("after the width");
-}
-
-// The presets have none, which no position of the knob stands for.
-TEST(Phaser, ShowsThatThereAreNoStages) {
-    Phaser phaser;
-    EXPECT_EQ(Text(phaser, kStages, 0.0), "0");
-    phaser.SetParam(kStages, 0.0f, false);
-    EXPECT_EQ(Text(phaser, kStages, 0.0), "1");
 }

@@ -13,13 +13,7 @@ using TestSupport::Render;
 namespace {
 
 enum { kDepth, kRate = 2, kMix = 4, kOutGain = 6, kInvert = 8 };
-enum Preset { kAutoVol, kLeftPhaseShift, kRobot = 7 };
-
-// What the effect makes of a constant 1: the factor itself, frame by frame.
-std::vector<double> Factors(Autovol& tremolo, std::size_t frames, int channels = 1) {
-    return Render(tremolo, std::vector<double>(frames * static_cast<std::size_t>(channels), 1.0),
-                  Format<double>(channels), {512});
-}
+enum Preset { kAutoVol, kRobot = 7 };
 
 }  // namespace
 
@@ -33,10 +27,7 @@ TEST(Autovol, MultipliesEachSideByItsOwnSine) {
     } const cases[] = {
         {"full depth shuts the signal off", kAutoVol, 1.0f, 1.0f, 0.0f},
         {"no depth leaves the level", kAutoVol, 0.0f, 0.3f, 0.0f},
-        {"half depth, inverted", kAutoVol, 0.5f, 0.0f, 1.0f},
-        {"ring modulation", kRobot, 0.2f, 1.0f, 0.0f},
         {"ring modulation half mixed", kRobot, 1.0f, 0.5f, 0.0f},
-        {"ring modulation mixed out", kRobot, 1.0f, 0.0f, 0.0f},
         {"the part that is not modulated is inverted too", kRobot, 1.0f, 0.25f, 1.0f},
     };
     const auto check = []<typename Sample>(Sample, const Case& c, int channels, double tolerance) {
@@ -78,14 +69,12 @@ TEST(Autovol, MultipliesEachSideByItsOwnSine) {
 TEST(Autovol, KeepsThePhaseThroughEditsAndDropsItOnPreparation) {
     Autovol tremolo;
     const auto format = Format<double>(1);
-    Factors(tremolo, 2000);  // the phase is now a quarter of a cycle
+    const auto run = [&](std::vector<double> ones) { return Render(tremolo, ones, format, {512}); };
+    run(std::vector(2000, 1.0));  // the phase is now a quarter of a cycle
     tremolo.SetParam(kRate, 0.0f, false);
     double still[] = {1.0, 1.0};
     TestSupport::ProcessBlock(tremolo, still, 2, format);
     EXPECT_NEAR(still[0], 1.0, 1e-12) << "stands at the top";
     EXPECT_EQ(still[0], still[1]);
-    EXPECT_NEAR(Factors(tremolo, 2)[1], 0.5, 1e-12) << "prepared afresh, it stands at the start";
-
-    tremolo.SetPreset(kLeftPhaseShift);
-    EXPECT_EQ(Factors(tremolo, 2, 2), (std::vector{-1.0, 1.0, -1.0, 1.0}));
+    EXPECT_NEAR(run({1.0, 1.0})[1], 0.5, 1e-12) << "prepared afresh, it stands at the start";
 }
