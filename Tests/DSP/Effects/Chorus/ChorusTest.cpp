@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <climits>
+
 #include "Plain/PlainChorus.h"
 #include "Support/EffectRun.h"
 
@@ -75,4 +77,14 @@ TEST(Chorus, ForgetsWhenToldAndKeepsTheRingThroughPreparation) {
         const auto output = Render(chorus, std::vector<double>(200), Format<double>(1), {40});
         EXPECT_EQ(std::ranges::count(output, 1.0), cleanup ? 0 : 1);
     }
+}
+
+// Catches a ring without room for the index that a shorter one leaves at its end.
+TEST(Chorus, DelaysByTenSecondsAtMost) {
+    Chorus chorus;
+    Load(chorus, Both(0, INT_MAX, 0, -960, 0));
+    std::vector<double> samples(480010);
+    samples[0] = 1.0;
+    samples = Render(chorus, samples, Format<double>(1), {4096});
+    EXPECT_EQ(std::ranges::find(samples, 1.0) - samples.begin(), 480000);
 }

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <cfenv>
 #include <tuple>
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
@@ -13,6 +14,11 @@ using TestSupport::PlacesAround;
 using TestSupport::Slots;
 
 namespace {
+
+bool FlushesDenormals() {
+    volatile double denormal = 1e-310;
+    return denormal * 1e10 == 0.0;
+}
 
 // Makes the protected members reachable and records what reaches the effect.
 class Probe : public CorvoEffect {
@@ -33,7 +39,7 @@ public:
         if (m_cook.exchange(false) || force) InitEnvelopes(true);
     }
 
-    bool paired = false;
+    bool paired = false, flushes = false;
     std::vector<Record> edits;
 
     bool DoSetParam(int index, float value, bool automated) override {
@@ -42,6 +48,7 @@ public:
     }
     void ProcessInternal(double*, int, const tWAVEFORMATEX* format, ProcessFlags& flags) override {
         CheckCookProperties(format, flags.force_cook);
+        flushes = FlushesDenormals();
     }
     void ProcessInternalNoninterleaved(double* const*, int, const tWAVEFORMATEX*, ProcessFlags&) override {}
 
@@ -138,4 +145,18 @@ TEST(CorvoEffectBase, PlaysEnvelopes) {
     EXPECT_EQ(block(9000).first, Edits{});
     probe.NotifyTempoChanged();
     EXPECT_TRUE(probe.m_cook);
+}
+
+// Catches a block that is processed with denormals on: a filter that fades would cost twenty times as much.
+TEST(CorvoEffectBase, ProcessesWithoutDenormals) {
+    std::fenv_t before;
+    std::fegetenv(&before);
+    std::fesetenv(FE_DFL_ENV);  // some libraries flush denormals as soon as they are loaded
+    Probe probe;
+    const auto format = TestSupport::Format<double>(1);
+    ProcessFlags flags;
+    probe.Process(nullptr, 0, &format, flags);
+    EXPECT_TRUE(probe.flushes);
+    EXPECT_FALSE(FlushesDenormals()) << "the caller's mode comes back";
+    std::fesetenv(&before);
 }

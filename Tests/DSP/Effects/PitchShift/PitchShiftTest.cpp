@@ -92,4 +92,16 @@ TEST_F(PitchShiftTest, TakesBackEndsFromAnotherThread) {
     }
 }
 
+// Catches an edit that waits for the next block: a host asks for the latency right behind it.
+TEST(PitchShift, SendsAnEditAtOnce) {
+    const auto format = Format<float>();
+    PitchShift effect;
+    effect.SetPreset(0);
+    effect.InitProcessing(128, &format);
+    const int before = effect.GetLatency();
+    effect.SetParam(0, 1.0f, false);
+    EXPECT_NE(effect.GetLatency(), before);
+    EXPECT_FALSE(effect.GetParameterFormattedText(1, 0.5).empty()) << "either side has its text";
+}
+
 }  // namespace
