@@ -47,8 +47,8 @@ TEST_F(MenuTest, StoresWhatACommandStandsFor) {
     EXPECT_EQ(m_analyser.GetTuner()->GetSensibilityPreset(), 1);
 }
 
-// The table has just the commands that are carried out. A choice is ticked once it is made,
-// and of its group it alone; a switch changes its tick.
+// The table has just the commands that are carried out. A choice is ticked once it is made, and of its group
+// it alone; a switch changes its tick.
 TEST_F(MenuTest, OffersWhatItCarriesOut) {
     const std::set<int> switches{1258, 1282, 1283, 1306, 1312, 1314}, actions{1295, 1350};
     const std::set<std::string> severalTicks{"Analyser", "Smoothing", "Show", "Tuner", "Tuner sensitivity"};
@@ -131,15 +131,6 @@ TEST_F(MenuTest, TellsTheHost) {
               (std::vector<std::pair<int, std::intptr_t>>{
                   {kMessageTunerPanelRedraw, 0}, {kMessageSettingsChanged, 1350}, {kMessageFrameReady, 0}}));
     kivspectrum::GetStaticInfo().SetMessagePoster(nullptr);
-}
-
-TEST_F(MenuTest, StepsThroughTheDisplayModes) {
-    using K = kivspectrum;
-    for (const auto mode : {K::display_sonogram, K::display_both, K::display_tuner, K::display_spectrum}) {
-        m_analyser.ToggleDisplayMode();
-        EXPECT_EQ(m_analyser.GetDisplayMode(), mode);
-        EXPECT_EQ(m_analyser.IsShowSonogram(), mode == K::display_sonogram || mode == K::display_both);
-    }
 }
 
 }  // namespace
