@@ -24,6 +24,7 @@ TEST_F(MenuTest, StoresWhatACommandStandsFor) {
          {std::tuple{1201, &Record::fft_length, 4096},  // raised to the window's length
           {1208, &Record::fft_length, 16384},
           {1225, &Record::window_length, 4096},
+          {1264, &Record::hop_length, 2048},
           {1226, &Record::hop_length, 4096},  // the hop follows the new window
           {1267, &Record::hop_length, 512},
           {1241, &Record::window_type, 1},
