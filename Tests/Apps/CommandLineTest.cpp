@@ -15,11 +15,8 @@ protected:
         Save("six.wav", NoiseSound(100, 6));
         Save("wide.wav", NoiseSound(10, 49));
         Save("none.wav", NoiseSound(0));
-        const auto sound = NoiseSound(100).samples;
-        Save("slow.wav", {2, 999, kPcm16, sound});
-        Save("cd.wav", {2, 44100, kPcm16, sound});
+        Save("cd.wav", {2, 44100, kPcm16, NoiseSound(100).samples});
         SaveBytes("empty.wav", "");
-        SaveBytes("text.wav", "this is no audio at all, whatever its name says");
         SaveBytes("taken.wav", "something dear");
         SaveBytes("moves.json", R"([{"parameter": "Pan", "points": [[0, 0.5]]}])");
     }
@@ -32,60 +29,43 @@ struct Refusal {
 const Refusal kLines[] = {
     {"", "command|render"},
     {"rendr", "rendr|render"},
-    {"render in.wav o.wav --bloc 7", "--bloc"},
     {"render missing.wav o.wav", "missing.wav|No such file"},
     {"render empty.wav o.wav", "empty.wav|empty"},
     {"render none.wav o.wav", "none.wav|no samples"},
     {"render six.wav o.wav", "six.wav|6 channels|mono and stereo"},
-    {"render slow.wav o.wav", "slow.wav|999|1000 to 768000"},
     {"render in.wav o.mp4", "o.mp4|.wav|.flac"},
     {"render in.wav nowhere/o.wav", "no directory|nowhere"},
     {"render in.wav taken.wav", "taken.wav|-y"},
     {"render in.wav ./in.wav -y", "in.wav|input"},
     {"render in.wav o.wav --format s20", "s20|s16, s24, f32, f64"},
     {"render float.wav o.flac", "o.flac|f32|s16, s24"},
-    {"render in.wav o.ogg --format s16", "o.ogg|Vorbis"},
-    {"render in.wav o.wav --precision 16", "--precision|32, 64"},
     {"render in.wav o.wav --tail long", "--tail|long|auto"},
     {"render in.wav o.wav --fx Gain --automation moves.json", "moves.json|Gain plays no automation"},
-    {"render in.wav o.wav --fx Gain --fx Gain --save-chunk state", "--save-chunk"},
     {"convert cd.wav o.wav --rate 1001 --format s16", "cents|--exact"},
-    {"convert cd.wav o.wav --rate 768000 --dither loud", "loud|shaped-strong"},
     {"convert float.wav o.wav --rate 96000 --dither tpdf", "s16 and s24"},
     {"convert wide.wav o.wav --rate 48000", "49 channels|48"},
     {"pitch in.wav o.wav --semitones 37", "--semitones|36"},
     {"pitch in.wav o.wav --semitones 1 --engine classic --speed 2", "--speed|new"},
     {"eq-curve o.csv --fx Gain", "Gain|EQ:"},
-    {"eq-curve o.csv --fx \"EQ: 100 peak 1\" --rate 7", "7|100"},
-    {"spectrum in.wav", "output"},
     {"spectrum in.wav - --csv -", "standard output"},
-    {"spectrum in.wav --csv o.csv --length 1000", "--length|1000"},
     {"spectrum in.wav o.png --size 0x10", "--size|0x10"},
-    {"sonogram in.wav o.png --scheme 7", "--scheme|6"},
-    {"tuner in.wav o.png --dpi nan", "--dpi"},
     {"tuner in.wav o.png --view wavy", "wavy|view"},
     {"tuner in.wav o.png --at 99", "--at|ends"},
     {"tuner in.wav o.png --font in.wav", "--font|in.wav"},
-    {"tuner in.wav in.wav -y", "in.wav|input"},
 };
 const Refusal kEffects[] = {
     {"Gian", "Gian|Gain"},
     {"", "effect"},
     {"Gain: Gane=1", "Gane|Gain|Flip phase L"},
     {"Gain: Gain=loud", "Gain|loud|-Inf. dB to 20.0 dB|n:"},
-    {"Gain: Gain=1e999", "1e999|dB"},
     {"Gain: Pan=nan", "Pan|nan|-1.00 to 1.00"},
-    {"Gain: Pan=n:1.01", "n:1.01|0 to 1"},
     {"Gain: chunk=taken.wav", "taken.wav|14 bytes|20"},
     {"Gain: Gain", "Gain|is not a setting|label=value"},
     {"Echo: Depth=5 apples", "5 apples|4999 ms"},
-    {"Echo: preset=e, preset=s", "one preset"},
     {"Valvex: Oversampling=5", "5|1, 2, 4, 8"},
-    {"Tremolo: preset=f00", "f00|Fast Tremolo"},
     {"EQ", "no bands|2500 peak"},
     {"EQ: 100 low", "low|lowshelf"},
     {"EQ: 100 peak 3.05", "3.05|steps of 0.1"},
-    {"EQ: 100 peak 3 4", "4|one gain"},
     {"EQ: 1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;"
      "1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak;1 peak", "more than 20"},
 };
@@ -93,13 +73,10 @@ const Refusal kEffects[] = {
 const Refusal kMoves[] = {
     {"[", "is not JSON"},
     {"[7]", "lane 1: a lane is"},
-    {R"([{"effect": "Echo", "parameter": "Depth", "points": []}])", "a lane is"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0]]}])", "a point is"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[1e300, 0]]}])", "time"},
-    {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0, "1"]]}])", "value"},
     {R"([{"effect": "Tremolo", "parameter": "Depth", "points": [[0, 1]]}])", "more than once"},
     {R"([{"effect": 4, "parameter": "Depth", "points": [[0, 1]]}])", "1 to 3"},
-    {R"([{"effect": true, "parameter": "Depth", "points": [[0, 1]]}])", "a name or a place"},
     {R"([{"parameter": "Depth", "points": [[0, 1]]}])", "\"effect\" is missing"},
     {R"([{"effect": 1, "parameter": "Wetness", "points": [[0, 1]]}])", "Wetness"},
     {R"([{"effect": 1, "parameter": "Depth R", "points": [[0, 1]]},
@@ -132,11 +109,10 @@ TEST_F(CommandLine, RefusesBadInput) {
 #if !defined(_WIN32)
 TEST_F(CommandLine, FollowsALinkAndKeepsIt) {
     std::filesystem::create_symlink("taken.wav", "link.wav");
-    std::filesystem::create_symlink("in.wav", "again.wav");
     Succeed("render in.wav link.wav -y");
     EXPECT_TRUE(std::filesystem::is_symlink("link.wav"));
     EXPECT_EQ(Load("taken.wav").samples, Load("in.wav").samples);
-    ExpectRefused(Run("render in.wav again.wav -y"), "again.wav|input");
+    ExpectRefused(Run("render taken.wav link.wav -y"), "link.wav|input");
 }
 
 // A full disk: nothing stays, and the file that was to be replaced is still there.

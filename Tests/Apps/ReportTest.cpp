@@ -41,18 +41,6 @@ protected:
     static void SaveSine(std::size_t frames, double hz) {
         Save("in.wav", {2, kRate, kDouble, TestSupport::Sine<double>(frames, hz, kRate, 1.0, 2)});
     }
-    // "1280x720" by the file's header.
-    static std::string PngSize(const std::string& path) {
-        const std::string bytes = Bytes(path);
-        if (bytes.size() < 24 || !bytes.starts_with("\x89PNG\r\n\x1a\n")) return "no PNG";
-        const auto number = [&](std::size_t at) {
-            std::uint32_t value = 0;
-            for (std::size_t i = at; i < at + 4; ++i)
-                value = value << 8 | static_cast<std::uint8_t>(bytes[i]);
-            return std::to_string(value);
-        };
-        return number(16).append("x").append(number(20));
-    }
 };
 
 using Table = std::vector<std::vector<double>>;
@@ -94,14 +82,6 @@ TEST_F(Reports, DescribeEveryEffect) {
         for (const std::string preset : effect.at("presets")) chain.push_back(name + ": preset=" + preset);
         EXPECT_NO_THROW(dsphost::Chain{chain});
     }
-    auto gain = json::parse(Succeed("effects gain --json")).at(0);
-    const json parameters = std::move(gain["parameters"]);
-    gain.erase("parameters");
-    EXPECT_EQ(gain, json::parse(R"({"name": "Gain", "latency": 0, "default_preset": 0, "presets": []})"));
-    EXPECT_EQ(parameters.at(0), json::parse(R"({"index": 0, "name": "Gain", "unit": "dB", "default": 0.5,
-                                                "type": "continuous", "text": "0.0 dB", "values": []})"));
-    EXPECT_EQ(parameters.at(4).at("name"), "Flip phase R") << "the full label";
-    EXPECT_EQ(parameters.at(4).at("type"), "switch");
     const auto text = Succeed("effects Gain");
     for (const std::string words : {"-Inf. dB", "20.0 dB", "-1.00", "Flip phase R", "Off", "On", "latency 0"})
         EXPECT_NE(text.find(words), std::string::npos) << words << " in\n" << text;
@@ -124,16 +104,14 @@ TEST_F(Reports, EqCurveAgreesWithASineSweptThroughRender) {
     Save("sweep.wav", sweep);
     const std::string kCurve = "frequency_hz,gain_db,phase_deg";
     for (const std::string bands :
-         {"80 highpass q=50", "3000 lowpass -2.5 q=90", "2500 peak -3 q=200", "150 lowshelf 7.5",
-          "6000 highshelf -9 q=120", "200 lowshelf-butterworth 12", "5000 highshelf-butterworth 4",
-          "40000 peak 6; 30000 highshelf 6", "80 highpass q=50; 2500 peak -3 q=200; 9000 lowpass"}) {
+         {"150 lowshelf 7.5; 40000 peak 6", "6000 highshelf -9 q=120; 3000 lowpass -2.5 q=90",
+          "200 lowshelf-butterworth 12; 80 highpass q=50",
+          "5000 highshelf-butterworth 4; 2500 peak -3 q=200"}) {
         SCOPED_TRACE(bands);
         const std::string fx = " --fx \"EQ: " + bands + "\" ";
         Succeed("render -y --tail 1 sweep.wav out.wav" + fx);
         const auto curve = ParseCsv(Succeed("eq-curve --rate 48000 -" + fx), kCurve);
         ASSERT_EQ(curve.size(), 512u);
-        EXPECT_EQ(curve.front()[0], 10.0);
-        EXPECT_EQ(curve.back()[0], 24000.0);
         EXPECT_NEAR(curve[256][0], 10.0 * std::pow(2400.0, 256.0 / 511.0), 1e-6);
         const Sound out = Load("out.wav");
         for (std::size_t i = 0; i < curve.size(); i += 17) {
@@ -145,11 +123,6 @@ TEST_F(Reports, EqCurveAgreesWithASineSweptThroughRender) {
             EXPECT_NEAR(std::remainder(apart, 360.0), 0.0, 0.1) << hz;
         }
     }
-    const auto curve = ParseCsv(Succeed("eq-curve - --fx \"eq: 12000 LOWPASS\""), kCurve);
-    const auto points = json::parse(Succeed("eq-curve --json - --fx \"eq: 12000 LOWPASS\"")).at("points");
-    ASSERT_EQ(points.size(), curve.size());
-    EXPECT_EQ(points[100].at("gain_db"), curve.at(100).at(1));
-    EXPECT_EQ(points[511].at("gain_db"), -300.0) << "a number even where nothing is left";
 }
 
 // Whatever the window and length: 0 dB on the bin's centre, one row a bin.
@@ -167,16 +140,6 @@ TEST_F(Reports, SpectrumReadsZeroDecibelsForAFullScaleSine) {
             EXPECT_NEAR((*top)[0], 1.0 * kRate * bin / length, 1e-3);
             EXPECT_NEAR((*top)[1], 0.0, 0.002);
         }
-}
-
-// No window is whole, or none after the first: one spectrum, not a division by zero.
-TEST_F(Reports, SpectrumTakesShortInputs) {
-    SaveSine(4100, 3750.0);
-    for (const std::string overlap : {"0", "0.27", "0.99"})
-        EXPECT_NEAR(ParseCsv(Succeed("spectrum in.wav --csv - --overlap " + overlap)).at(320).at(1), 0.0,
-                    0.002)
-            << overlap;
-    Succeed("spectrum in.wav --csv - --length 8192");
 }
 
 // Catches times of the window's end, notes in silence, and anything but the array on standard output.
@@ -199,10 +162,6 @@ TEST_F(Reports, TunerTellsNotes) {
     }
     EXPECT_GT(silent, 15);
     EXPECT_GT(heard, 40);
-    // A window too short for low notes where the rate is high.
-    Save("in.wav", {1, 192000, kDouble, TestSupport::Sine<double>(2 * 192000, 41.2, 192000)});
-    const auto low = json::parse(Succeed("tuner in.wav o.png -y --json"));
-    EXPECT_EQ(low.at(low.size() / 2).at("note"), "E1");
 }
 
 TEST_F(Reports, PicturesHaveTheSizeAskedForAndTheSameBytesAgain) {
@@ -212,11 +171,10 @@ TEST_F(Reports, PicturesHaveTheSizeAskedForAndTheSameBytesAgain) {
         const std::string options = " -y --size 321x123 --dpi 144 --view filled,note-names";
         for (const std::string file : {"a.png", "b.png"})
             EXPECT_EQ(Succeed(command + " in.wav " + file + options), "");
-        EXPECT_EQ(PngSize("a.png"), "321x123");
+        EXPECT_EQ(Bytes("a.png").substr(16, 8), std::string("\0\0\x01\x41\0\0\0\x7B", 8));
         EXPECT_EQ(Bytes("a.png"), Bytes("b.png"));
     }
     Succeed("spectrum in.wav o.png --csv o.csv --scale linear");
-    EXPECT_EQ(PngSize("o.png"), "1280x720");
     EXPECT_TRUE(Bytes("o.csv").starts_with("frequency_hz,level_db\n"));
 }
 

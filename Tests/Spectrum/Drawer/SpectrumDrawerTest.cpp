@@ -48,7 +48,6 @@ TEST(SpectrumDrawer, FollowsRisesFasterThanFalls) {
     const auto smoothed = Smoothed(Small(), 0.002f, {1.0f, 1.0f, 0.0f});
     EXPECT_NEAR(smoothed[1], 0.32 + 0.68 * 0.32, 1e-6);
     EXPECT_NEAR(smoothed[2], (0.32 + 0.68 * 0.32) * 0.8, 1e-6);
-    EXPECT_EQ(Smoothed(Small(), 0.02f, {1.0f, 0.25f}), (Values{1.0f, 0.25f})) << "alpha limited to 1";
     Record held = Small();
     held.smoothing_type = 2;
     EXPECT_EQ(Smoothed(held, 0.002f, {1.0f, 0.25f}), (Values{0.0f, 0.0f}));
@@ -72,7 +71,6 @@ TEST(SpectrumDrawer, AveragesByAge) {
     }
 }
 
-// Also: what is smoothed is lost with the rate only, a peak with the reset.
 TEST(SpectrumDrawer, HoldsAndDropsPeaks) {
     const auto peakAfter = [&](int hold, int decay, int frames) {
         Record settings = Small();
@@ -85,14 +83,7 @@ TEST(SpectrumDrawer, HoldsAndDropsPeaks) {
         drawer.AgePeaks();
         drawer.SmoothFftSpectrum(Values(8, 0.5f), 1.0f, none);
         for (int i = 0; i < frames; ++i) drawer.AgePeaks();
-        const float peak = drawer.GetPeaks()[5];
-        drawer.peak_reset();
-        EXPECT_EQ(drawer.GetPeaks()[5], 0.0f);
-        for (const int rate : {kRate, 44100}) {
-            drawer.UpdateSamplingFrequency(rate);
-            EXPECT_EQ(drawer.GetPowerSmoothed(), Values(8, rate == kRate ? 0.5f : 0.0f));
-        }
-        return peak;
+        return drawer.GetPeaks()[5];
     };
     for (const auto& [decay, frames] : {std::pair{1, 90}, {2, 48}, {3, 30}}) {
         EXPECT_EQ(peakAfter(1, decay, frames), 1.0f);
@@ -115,32 +106,29 @@ TEST(PowerToDecibels, IsTenLogarithms) {
 class Curve : public AnalyserTest {
 protected:
     // The curve of a full-scale sine in the middle of `bin`.
-    void Draw(std::size_t bin, double lowest, FrequencyScale scale, LevelScale levels, int length = 4096,
-              float gain = 1.0f) {
-        Settings().window_length = length;
+    void Draw(std::size_t bin, double lowest, FrequencyScale scale, LevelScale levels, float gain = 1.0f) {
+        Settings().window_length = kLength;
         Settings().time_smoothing = 0;
         Settings().gain = gain;
         m_analyser.emplace();
         m_analyser->SetOn(true);
-        Feed(*m_analyser, TestSupport::Sine<float>(static_cast<std::size_t>(length),
-                                                   static_cast<double>(bin) * kRate / length, kRate, 1.0));
+        Feed(*m_analyser,
+             TestSupport::Sine<float>(kLength, static_cast<double>(bin) * kRate / kLength, kRate, 1.0));
         ASSERT_TRUE(Prepare(*m_analyser, kRate));
         m_map.emplace(kRectangle, lowest, 20000.0, scale, levels, 90.0f);
-        Compute(kivspectrum::display_spectrum, 1001);
+        int count = -1;
+        m_points.resize(1001);
+        Drawer().ComputeSpectrumPoints(kRectangle, m_points.data(), count, *m_map,
+                                       kivspectrum::display_spectrum, 1001, 0.0f, nullptr);
+        m_points.resize(static_cast<std::size_t>(count));
         ASSERT_GE(m_points.size(), 2u);
         const auto lower = [](const auto& a, const auto& b) { return a.y > b.y; };
         m_top = static_cast<std::size_t>(std::max_element(m_points.begin(), m_points.end(), lower) -
                                          m_points.begin());
     }
-    void Compute(kivspectrum::_display_mode mode, int capacity, const Values* other = nullptr) {
-        int count = -1;
-        m_points.resize(static_cast<std::size_t>(capacity));
-        Drawer().ComputeSpectrumPoints(kRectangle, m_points.data(), count, *m_map, mode, capacity, 0.0f,
-                                       other);
-        m_points.resize(static_cast<std::size_t>(count));
-    }
     SpectrumDrawer& Drawer() { return *m_analyser->GetSpectrumDrawer(); }
 
+    static constexpr int kLength = 4096;
     std::optional<kivspectrum> m_analyser;
     std::optional<CoordinatesAndFrequencies> m_map;
     std::vector<Corvo::PointF> m_points;
@@ -160,21 +148,10 @@ TEST_F(Curve, ShowsASineAtItsPlace) {
                 EXPECT_NEAR(m_points[m_top].x, m_map->FrequencyToX(static_cast<double>(bin) * kRate / 4096),
                             1.0);
                 EXPECT_EQ(Drawer().GetFFTPoints()[m_top], static_cast<int>(bin));
-                for (std::size_t i = 0; i < m_points.size(); ++i) {
-                    EXPECT_NEAR(m_points[i].x, 10.5 + static_cast<double>(i), 1e-3);
-                    EXPECT_TRUE(m_points[i].y >= 20.0f && m_points[i].y <= 220.0f);
-                }
+                for (const auto& point : m_points) EXPECT_TRUE(point.y >= 20.0f && point.y <= 220.0f);
             }
-    Draw(400, 20.0, FrequencyScale::Linear, LevelScale::Amplitude, 4096, 0.5f);
+    Draw(400, 20.0, FrequencyScale::Linear, LevelScale::Amplitude, 0.5f);
     EXPECT_NEAR(m_points[m_top].y, 120.0, 0.2);
-}
-
-// 128 samples over 500 pixels: the bins' own levels are met and nothing overshoots them.
-TEST_F(Curve, PassesSmoothlyBetweenWideBins) {
-    Draw(20, 0.0, FrequencyScale::Linear, LevelScale::Amplitude, 128);
-    EXPECT_NEAR(m_points[m_top].y, 20.0, 1e-3);
-    for (std::size_t i = 1; i < m_points.size(); ++i)  // a bin is 9 pixels wide and 200 high
-        EXPECT_LT(std::abs(m_points[i].y - m_points[i - 1].y), 40.0f);
 }
 
 // The sine's whole power is in its band, and only there.
@@ -188,17 +165,6 @@ TEST_F(Curve, CollectsBands) {
         EXPECT_EQ(m_points[m_top + 1].y, m_points[m_top].y);
         EXPECT_LT(m_map->YToLevel(m_points[m_top + 2].y), -60.0);
     }
-}
-
-TEST_F(Curve, DrawsWhatItIsAskedTo) {
-    Draw(100, 20.0, FrequencyScale::Linear, LevelScale::Power);
-    EXPECT_EQ(Drawer().GetPeaks()[100], Drawer().GetPowerSmoothed()[100]);
-    Compute(kivspectrum::display_sonogram, 1000);
-    EXPECT_TRUE(m_points.empty());
-    const Values silence(2048, 0.0f);
-    Compute(kivspectrum::display_both, 7, &silence);
-    EXPECT_EQ(m_points.size(), 7u);
-    EXPECT_EQ(m_points[6].y, 220.0f);
 }
 
 // What leaks from a louder sine below the lowest frequency is no peak, nor is the last bin; the first may be
@@ -218,7 +184,6 @@ TEST(SpectrumDrawer, FindsTheHighestPeak) {
          {Case{{0, 64, 1, 0, 0, 0, 0, 0}, 0.0, 1.0, 0.0},
           Case{{99, 0, 0, 0, 0, 0, 0, 6.4f}, 0.0, 0.0, -300.0},
           Case{{0, 640, 40, 1, 6.4f, 1, 0, 0}, 1.1, 4.0, -10.0},
-          Case{{0, 640, 40, 1, 6.4f, 1, 0, 0}, 1e300, 0.0, -300.0},
           Case{{0, 0, 1, 64, 64, 1, 0, 0}, 0.0, 3.5, 10.0 / 4.0 * std::log10(64.0) / 2.0}}) {
         drawer.SmoothFftSpectrum(power, 1.0f, none);
         EXPECT_NEAR(drawer.HighestPeak(lowest).frequency, hz, 1e-6);

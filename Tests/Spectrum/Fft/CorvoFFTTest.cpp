@@ -63,9 +63,6 @@ TYPED_TEST(CorvoFFTOf, RealTransformsAreExactAndReturn) {
         const auto input = Noise<TypeParam>(static_cast<std::size_t>(length));
         CorvoFFT fft;
         auto data = input;
-        fft.AllocateReal(length, 0);
-        fft.DoIFFTReal(data.data(), 0, 0);
-        EXPECT_EQ(data, input) << "no inverse was asked for";
         fft.AllocateReal(length, 1);
         fft.DoFFTReal(data.data(), 0, 0);
         EXPECT_LT(Error(data, PackedSpectrum(input)), this->kTolerance) << length;
@@ -103,16 +100,13 @@ TYPED_TEST(CorvoFFTOf, RoundsOddLengthsDown) {
     fft.AllocateReal(1000, 1);
     const auto input = Noise<TypeParam>(1000);
     auto data = input;
-    Values<TypeParam> re(500), im(500);
-    fft.DoFFTReal(input.data(), re.data(), im.data(), 1000, 0);
     fft.DoFFTReal(data.data(), 0, 0);
     const auto end = input.begin() + 512;
     EXPECT_LT(Error(data, PackedSpectrum(Values<TypeParam>(input.begin(), end))), this->kTolerance);
     EXPECT_TRUE(std::equal(end, input.end(), data.begin() + 512));
-    for (std::size_t k = 0; k < 256; ++k) ASSERT_EQ(re[k], data[2 * k]) << k;
 }
 
-// Before it is built, after lengths that it cannot have, and freed. Built, it allocates nothing.
+// After lengths that it cannot have. Built, it allocates nothing.
 TYPED_TEST(CorvoFFTOf, DoesNothingUnlessBuilt) {
     const auto input = Noise<TypeParam>(64);
     auto data = input, re = input, im = input;
@@ -125,10 +119,9 @@ TYPED_TEST(CorvoFFTOf, DoesNothingUnlessBuilt) {
         fft.DoFFTReal(input.data(), re.data(), im.data(), 64, 0);
         fft.DoFFT(data.data(), 0, 0);
     };
-    for (const int length : {0, 524289, 64}) {
+    for (const int length : {0, 524289}) {
         fft.AllocateReal(length, 1);
-        fft.Allocate(length == 64 ? 32 : length, 1);
-        if (length == 64) fft.Free();
+        fft.Allocate(length, 1);
         runAll();
         EXPECT_TRUE(data == input && re == input && im == input) << length;
     }
@@ -136,9 +129,7 @@ TYPED_TEST(CorvoFFTOf, DoesNothingUnlessBuilt) {
     fft.Allocate(32, 1);
     const TestSupport::AudioThreadRules rules;
     runAll();
-    if (TestSupport::AudioThreadRules::CanCount()) {
-        EXPECT_EQ(rules.Broken(), "");
-    }
+    EXPECT_EQ(rules.Broken(), "");
 }
 
 // The same project must sound and look the same on every machine.

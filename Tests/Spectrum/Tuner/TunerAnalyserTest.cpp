@@ -1,4 +1,3 @@
-#include <functional>
 #include <thread>
 #include <vector>
 
@@ -18,9 +17,9 @@ protected:
         m_analyser.ToggleTuner();
         m_analyser.set_parameters(kRate);
     }
-    bool Tune(const std::vector<float>& samples, bool probeOnly = false) {
+    bool Tune(const std::vector<float>& samples) {
         Feed(m_analyser, samples);
-        return m_analyser.GetFFTFor3DSonogram(kRate, nullptr, true, probeOnly);
+        return m_analyser.GetFFTFor3DSonogram(kRate, nullptr, true, false);
     }
     void Refresh(int times) {
         for (int i = 0; i < times; ++i) m_analyser.Refresh();
@@ -44,8 +43,6 @@ protected:
 TEST_F(TunerAnalyserTest, TunesEveryFrameWhileOn) {
     const auto sound = TestSupport::Sine<float>(8192, 329.6276, kRate);
     Answer(kMessageNoteChanged, 1306);
-    EXPECT_TRUE(Tune(sound, true));
-    EXPECT_EQ(m_tuner.GetHeardFrequency(), 0.0) << "asked only";
     for (int i = 0; i < 2; ++i) EXPECT_TRUE(Tune(sound));
     EXPECT_STREQ(m_tuner.GetTunedNoteName(), "E");
     EXPECT_NEAR(m_tuner.GetErrorCents(), 0.0, 0.1);
@@ -71,27 +68,16 @@ TEST_F(TunerAnalyserTest, SkipsAFrameWhoseBuffersWereRebuilt) {
     EXPECT_NEAR(m_tuner.GetHeardFrequency(), 440.0, 0.01);
 }
 
-// Windows of 8192 without overlap bring a frame at every sixth refresh. A running tuner keeps its note and
-// takes another at its first frame; when the sound stops time goes on: 40 refreshes of tracking, the note for
-// 60. Frozen, it stays.
+// Windows of 8192 without overlap bring a frame at every sixth refresh. When the
+// sound stops time goes on: 40 refreshes of tracking, the note for 60. Frozen, it stays.
 TEST_F(TunerAnalyserTest, LetsTimePassWithoutFrames) {
-    const auto play = [&](double hz, int frames) {
-        for (int frame = 0; frame < frames; ++frame) {
-            Feed(m_analyser, TestSupport::Sine<float>(8192, hz, kRate));
-            Refresh(6);
-            EXPECT_EQ(m_tuner.IsTracking(), frame > 0 || m_tuner.GetNote() >= 0) << frame;
-        }
-    };
-    play(440.0, 10);
-    EXPECT_GT(m_tuner.GetStableFrequency(), 0.0);
-    play(494.0, 1);
-    EXPECT_EQ(m_tuner.GetNote(), 2);
-    play(494.0, 10);
+    for (int frame = 0; frame < 2; ++frame) {
+        Feed(m_analyser, TestSupport::Sine<float>(8192, 440.0, kRate));
+        Refresh(6);
+    }
     // Five of the refreshes without a frame have passed.
     Refresh(40 - 5 - 1);
     EXPECT_TRUE(m_tuner.IsTracking());
-    EXPECT_FALSE(TunerCalibrateNow(m_tuner));
-    EXPECT_EQ(m_tuner.GetHeardFrequency(), 0.0);
     Refresh(1);
     EXPECT_FALSE(m_tuner.IsTracking());
     Refresh(60 - 40 - 1);
@@ -101,19 +87,6 @@ TEST_F(TunerAnalyserTest, LetsTimePassWithoutFrames) {
     m_analyser.SetFrozen(false);
     EXPECT_TRUE(m_analyser.Refresh());
     EXPECT_FALSE(m_tuner.IsTuned());
-}
-
-// However it is switched on, the tuner has forgotten old notes.
-TEST_F(TunerAnalyserTest, ForgetsOldNotesWhenSwitchedOn) {
-    void (*const switches[])(kivspectrum&, bool) = {[](kivspectrum& a, bool on) { a.SetTunerOn(on); },
-                                                    [](kivspectrum& a, bool) { a.ToggleTuner(); },
-                                                    [](kivspectrum& a, bool) { a.popupmenu_process(1283); }};
-    for (const auto& turn : switches) {
-        for (int i = 0; i < 2; ++i) Tune(TestSupport::Sine<float>(8192, 441.0, kRate));
-        EXPECT_TRUE(m_tuner.IsTuned());
-        for (const bool on : {false, true}) turn(m_analyser, on);
-        EXPECT_TRUE(m_analyser.GetTunerOn() && !m_tuner.IsTuned());
-    }
 }
 
 // Every window, whole and padded with zeros: each has lobes of its own, and its own way between the bins.

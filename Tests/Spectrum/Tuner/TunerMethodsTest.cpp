@@ -37,7 +37,6 @@ TEST_F(TunerTest, HearsWithEveryMethodWhatThatIsAbleTo) {
         {2, kSawtooth, {0, 10}}, {2, kPiano, {20}},           {3, kSine, {10}},
         {3, kSawtooth, {0, 10}}, {3, kPiano, {20}},           {4, kSine, {10}},
         {4, kSawtooth, {0, 10}}, {4, kPiano, {20}},           {0, Kind::MissingFundamental, {0, 20, 10}},
-        {7, kSawtooth, {20}},  // as 3
     };
     for (const auto& [method, kind, noises] : kAbilities)
         for (int tone = 0; tone <= 75; tone += 4) {
@@ -64,8 +63,7 @@ std::vector<float> Partials(const std::vector<int>& numbers, double hz) {
     return TunerSounds::Partials(numbers, hz, kTunerRate, kFrames);
 }
 
-// Each method is another: they part where the fundamental is missing. The denoising form is what is asked
-// for, whatever is chosen.
+// Each method is another: they part where the fundamental is missing.
 TEST_F(TunerTest, DispatchesToFiveMethods) {
     const auto sound = Partials({3, 4, 5, 6, 7, 8}, 100.0);
     for (int method = 0; method < 5; ++method) {
@@ -73,25 +71,6 @@ TEST_F(TunerTest, DispatchesToFiveMethods) {
         TunerProbe probe;
         const bool first = std::abs(probe.Hear(sound.data()) - 100.0) < 0.05;
         EXPECT_TRUE(method == 3 || first == (method == 0)) << method;
-        probe.tuner.Forget();
-        probe.Show(sound.data(), true);
-        EXPECT_NEAR(probe.tuner.GetFrequency(), 100.0, 0.05) << method;
-    }
-    // A stranger two octaves below is not the fundamental: most of its other partials are missing.
-    Tuner::SetDetectionMethod(3);
-    EXPECT_NEAR(TunerProbe().Hear(Partials({1, 4, 4, 4}, 250.0).data()), 1000.0, 0.1);
-}
-
-// Two notes at once are no deep third one whose high partials they happen to meet. (A fifth is partials 2 and
-// 3 of one, and heard so.)
-TEST_F(TunerTest, HearsOneOfTwoNotes) {
-    for (const double other : {1.26, 1.335, 1.682, 2.245}) {
-        const auto piano = [](double hz, double phase) {
-            return TunerSounds::Sound(Kind::Piano, hz, kTunerRate, kFrames, phase);
-        };
-        const auto sound = TunerSounds::Mixed(piano(329.6, 0.2), piano(329.6 * other, 0.7), 0.7f);
-        const double heard = TunerProbe().Hear(sound.data()) / 329.6;
-        EXPECT_LT(std::min(std::abs(heard - 1.0), std::abs(heard / other - 1.0)), 0.005) << other;
     }
 }
 
@@ -128,8 +107,6 @@ TEST_F(TunerTest, ShowsTheSpectrumWithoutItsFloor) {
         EXPECT_EQ(probe.Hear(power), heard) << method;
         ASSERT_EQ(clean.size(), power.size()) << method;
     }
-    // One bin of noise in seven is above the floor, give or take what one spectrum allows.
-    EXPECT_NEAR(1.0 - static_cast<double>(std::ranges::count(clean, 0.0f)) / 4096.0, std::exp(-2.0), 0.03);
     EXPECT_NEAR(clean[186] / power[186], 1.0, 0.001);
 }
 
