@@ -14,9 +14,7 @@ fi
 
 need_win32_packages
 read -r mirror release < <(debian_archive) || skip "no Debian mirror is configured"
-# debootstrap and the apt inside take the machine's proxy from the environment.
-eval "$(apt-config shell http_proxy Acquire::http::Proxy)"
-if [ -n "${http_proxy:-}" ]; then export http_proxy; fi
+export_apt_proxy
 
 part=$(mktemp -d "$cache/root.part.XXXXXX")
 trap 'rm -rf --one-file-system "$part"' EXIT

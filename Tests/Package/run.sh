@@ -18,7 +18,7 @@ awk '/^```cpp$/ {on = 1; next} /^```$/ {on = 0} on' "$source_dir/README.md" > "$
 [ -s "$work/example/example.cpp" ]
 cp "$here/CMakeLists.txt" "$here/drawing.cpp" "$work/example/"
 
-cmake -S "$work/example" -B "$work/by-cmake" -DCMAKE_PREFIX_PATH="$work/installed" \
+cmake -G Ninja -S "$work/example" -B "$work/by-cmake" -DCMAKE_PREFIX_PATH="$work/installed" \
     -DCMAKE_CXX_COMPILER="$compiler" >/dev/null
 cmake --build "$work/by-cmake" >/dev/null
 by_cmake=$("$work/by-cmake/example")
