@@ -2,8 +2,8 @@
 
 #include <benchmark/benchmark.h>
 
+#include "BlockCopy.h"
 #include "DSP/Effects/Framework/CorvoEffectBase.h"
-#include "Support/BlockCopy.h"
 #include "Support/Signals.h"
 
 // Runs an effect over stereo noise in blocks of state.range(0) frames and reports frames per second. The

@@ -65,13 +65,14 @@ run_inside() {
 
 read -r mirror release < <(debian_archive) || skip "no Debian mirror is configured"
 export_apt_proxy
-answer=$(mktemp)
+answer=$(mktemp) status=
 /usr/lib/apt/apt-helper -qq download-file "${mirror%/}/dists/$release/InRelease" "$answer" 2>/dev/null || status=$?
 rm -f "$answer"
-[ -z "${status:-}" ] || skip "the Debian mirror cannot be reached"
+[ -z "$status" ] || skip "the Debian mirror cannot be reached"
 export mirror release
 export -f make_minimal run_inside
 
+[ "$(awk '/^MemAvailable:/ { print $2 }' /proc/meminfo)" -gt 5000000 ] || skip "the root is in memory and needs 5 GB"
 alone true || skip "this machine allows no mounts"
 if ! [ -f "$minimal" ]; then
     say "making a minimal root ($release, kept in $cache)"

@@ -89,11 +89,9 @@ bool kivspectrum::popupmenu_process(int command) {
     {
         const Lock classLock(AnalyserLock());
         if (command == kRedrawTunerPanel) needPrepareBitmap = true;
-        const auto spectra = settings.smoothing_filter_length;
         entry->action->apply(*m_analyser, settings, entry->value);
-        // At once, even while lock_init is set.
-        if (spectra != settings.smoothing_filter_length)
-            for (const kivspectrum* const observer : Observers()) observer->m_analyser->FitFilter(settings);
+        // A new length of the smoothing filter takes effect at once, even while lock_init is set.
+        for (const kivspectrum* const observer : Observers()) observer->m_analyser->FitFilter(settings);
         ObserverUpdate();
     }
     if (command == kRedrawTunerPanel) Tell(kMessageTunerPanelRedraw, 0);

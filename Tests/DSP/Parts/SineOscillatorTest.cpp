@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 using Corvo::DSP::PhaseAfter;
-using Corvo::DSP::SineOscillator;
 
 // Catches a shortcut where the sums are not rounded alike: next to powers of two, from nothing, at ties.
 TEST(SineOscillator, MovesThePhaseExactlyAsSteppingDoes) {
@@ -17,34 +16,4 @@ TEST(SineOscillator, MovesThePhaseExactlyAsSteppingDoes) {
                 ASSERT_EQ(PhaseAfter(begin, increment, steps), stepped)
                     << begin << " + " << steps << " * " << increment;
             }
-}
-
-// Catches a turn by the wrong number of increments and sines that drift.
-TEST(SineOscillator, StaysOnTheLibrarysSine) {
-    double sines[SineOscillator::kPiece];
-    for (const double hz : {0.01, 6.0, 1000.0})
-        for (const int frames : {1, 7, 64}) {
-            const double increment = SineOscillator::kTwoPi * hz / 48000.0, cycle = 6.283180236816406;
-            SineOscillator first, last;
-            first.SetIncrement(increment);
-            last.SetIncrement(increment);
-            double ahead = 0.0, behind = 0.0;
-            for (int block = 0; block < 200; ++block) {
-                first.StepAndTakeSines(sines, frames);
-                for (int i = 0; i < frames; ++i)
-                    ASSERT_NEAR(sines[i], std::sin(ahead += increment), 1e-13) << hz << " Hz";
-                first.ReducePhase();
-                ahead = std::fmod(ahead, SineOscillator::kTwoPi);
-                ASSERT_EQ(first.Phase(), ahead);
-
-                const int taken = last.TakeSinesAndStep(sines, frames, cycle);
-                ASSERT_TRUE(taken >= 1 && taken <= frames);
-                for (int i = 0; i < taken; ++i) {
-                    ASSERT_NEAR(sines[i], std::sin(behind), 1e-13) << hz << " Hz";
-                    behind += increment;
-                    if (behind >= cycle) behind -= cycle;
-                }
-                ASSERT_EQ(last.Phase(), behind);
-            }
-        }
 }

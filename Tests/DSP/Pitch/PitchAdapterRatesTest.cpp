@@ -9,8 +9,8 @@ using namespace Corvo::DSP;
 
 namespace {
 
-// Catches a rate that the engine never comes back from. Its latency tells the rate it was given while it has
-// no channels, and so before it is given samples: where that is wrong, nothing runs that would hang.
+// Catches a rate at which the engine hangs. The latency depends on the rate that the engine was given, and is
+// asked for before any sample: where the rate is wrong the test fails before it could hang.
 TEST(PitchAdapterNew, PlaysAtEveryRate) {
     const auto made = [](int rate) {
         std::unique_ptr<PitchAdapter> adapter(PitchAdapter::CreateAdapter(PitchAdapterInfo::SoundTouch));

@@ -23,7 +23,9 @@ Spot SpotAt(const TransferCurve& curve, double place) {
             from.y + part * (static_cast<double>(to.y) - from.y)};
 }
 
-// Whether moving its points makes one curve of the other: as many, and the threshold at the same one.
+// Whether moving its points makes one curve of the other: as many, and the threshold at the same one. With
+// the threshold at another point, knees and straight lines would turn into each other on the way, and be
+// heard.
 bool HaveSamePoints(const TransferCurve& a, const TransferCurve& b) {
     return a.count == b.count && a.Threshold() - a.begin() == b.Threshold() - b.begin();
 }
@@ -71,7 +73,8 @@ void HeardCurve::Thin(std::size_t most) {
     }
 }
 
-// From a point that stays, goes on for as long as one line passes closely enough by every point since.
+// Keeps, after each point that stays, the farthest one whose line to it passes all between within the
+// tolerance.
 void HeardCurve::DropWithin(double tolerance) {
     constexpr double kAny = std::numeric_limits<double>::infinity();
     const std::size_t last = count - 1;

@@ -33,7 +33,8 @@ float Normalised(const ParameterRow& row, std::int32_t word) {
 
 std::wstring Number(const ParameterRow& row, double normalised) {
     const double value = row.storage.plain(Stored(row, normalised));
-    return WithUnit(FormatFixed(value * row.shown.step, row.shown.decimals), row.unit);
+    const auto number = FormatFixed(value * row.shown.step, row.shown.decimals);
+    return *row.unit ? WithUnit(number, row.unit) : number;
 }
 
 std::wstring Decibels(const ParameterRow& row, double normalised) {

@@ -136,7 +136,7 @@ std::wstring OnOff(const ParameterRow& row, double normalised);
 float ReadOnOff(const ParameterRow& row, const std::string& text);
 }  // namespace ParameterTexts
 
-// An integer times `step`, with so many decimals, then the unit.
+// An integer times `step`, with so many decimals, then the unit if there is one.
 constexpr Shown Steps(double step, int decimals = 1) {
     return {ParameterTexts::Number, ParameterTexts::ReadInteger, step, decimals};
 }

@@ -19,14 +19,6 @@ using Props = ReverbPrivate::_transform_props;
 
 constexpr std::int32_t kSilent = -450;
 
-// A number alone, without the blank that stands before a unit.
-constexpr Shown kScale{[](const ParameterRow& row, double normalised) {
-                           std::wstring text = ParameterTexts::Number(row, normalised);
-                           text.pop_back();
-                           return text;
-                       },
-                       ParameterTexts::ReadInteger, 0.001, 2};
-
 // The unit of the mix is wrong but fixed: hosts display it.
 // clang-format off
 constexpr std::array<ParameterRow, 16> kRows{{
@@ -39,10 +31,10 @@ constexpr std::array<ParameterRow, 16> kRows{{
     {L"Length R",                        L"ms", MPT_INT, {10000.0f,    0.0f}, Steps(1.0, 0),       WordAt(&Props::length, 1)},
     {L"Damping L",                       L"%",  MPT_INT, { 2500.0f,    0.0f}, Steps(0.04),         WordAt(&Props::damping, 0)},
     {L"Damping R",                       L"%",  MPT_INT, { 2500.0f,    0.0f}, Steps(0.04),         WordAt(&Props::damping, 1)},
-    {L"Early reflections L",             L"",   MPT_INT, { 5000.0f,    0.0f}, kScale,              WordAt(&Props::reflections, 0)},
-    {L"Early reflections R",             L"",   MPT_INT, { 5000.0f,    0.0f}, kScale,              WordAt(&Props::reflections, 1)},
-    {L"Room size L",                     L"",   MPT_INT, { 3999.0f,    1.0f}, kScale,              WordAt(&Props::room, 0)},
-    {L"Room size R",                     L"",   MPT_INT, { 3999.0f,    1.0f}, kScale,              WordAt(&Props::room, 1)},
+    {L"Early reflections L",             L"",   MPT_INT, { 5000.0f,    0.0f}, Steps(0.001, 2),     WordAt(&Props::reflections, 0)},
+    {L"Early reflections R",             L"",   MPT_INT, { 5000.0f,    0.0f}, Steps(0.001, 2),     WordAt(&Props::reflections, 1)},
+    {L"Room size L",                     L"",   MPT_INT, { 3999.0f,    1.0f}, Steps(0.001, 2),     WordAt(&Props::room, 0)},
+    {L"Room size R",                     L"",   MPT_INT, { 3999.0f,    1.0f}, Steps(0.001, 2),     WordAt(&Props::room, 1)},
     {L"Wet level L",                     L"dB", MPT_INT, {  550.0f, -450.0f}, TenthsOfDb(kSilent), WordAt(&Props::wet, 0)},
     {L"Wet level R",                     L"dB", MPT_INT, {  550.0f, -450.0f}, TenthsOfDb(kSilent), WordAt(&Props::wet, 1)},
     {L"Dry level L",                     L"dB", MPT_INT, {  550.0f, -450.0f}, TenthsOfDb(kSilent), WordAt(&Props::dry, 0)},

@@ -169,6 +169,14 @@ TEST(CompressorCore, ListensToTheSideChain) {
         expect(0.0, 0.0, ", the block after");
         EXPECT_FALSE(effect.IsUsingSideChain());
     }
+    const auto format = Format<float>(1);
+    Compressor monitored;
+    monitored.SetSidechainBusNumChannels(0, 2);
+    monitored.SetParam(kMonitor, 1.0f, false);
+    monitored.InitProcessing(1, &format);
+    monitored.SetSidechainBuffer(0, stereo);
+    ProcessBlock(monitored, block.data(), 1, format);
+    EXPECT_EQ(block[0], 0.5f) << "the mean of both is heard";
 }
 
 // Catches a monitor that plays the wrong signal, or that leaves the followers behind.

@@ -7,6 +7,7 @@
 
 using namespace TestSupport;
 using Corvo::DSP::CompressorPrivate::kCompressorPresets;
+using Corvo::DSP::CompressorPrivate::TransferCurve;
 
 // What threshold and ratio do to the shapes that are there, and what they read back.
 namespace {
@@ -109,5 +110,51 @@ TEST(CompressorEdit, EachSideReadsItsOwnCurve) {
         EXPECT_EQ(effect.GetParam(kThreshold + 1), threshold);
         EXPECT_EQ(effect.GetParam(kRatio + 1), ratio);
         EXPECT_NE(effect.GetParam(kThreshold), threshold);
+    }
+}
+
+// Catches a first edit, or a glide's end, that is heard as a step. At a rate where a glide is 4100 frames.
+TEST(CompressorEdit, FirstEditsDoNotStep) {
+    const auto format = Format<double>(2, 8000);
+    Random random(5);
+    for (int round = 0; round < 60; ++round) {
+        const double level = Amplitude(-75.0 * random.Unit());
+        const int preset = random.Below(42), other = random.Below(42);
+        Compressor effect;
+        effect.SetPreset(preset);
+        SetBoth(effect, kStereoLink, round % 2 == 0 ? 1.0f : 0.0f);
+        SetBoth(effect, kAttack, 0.0f);
+        effect.InitProcessing(6000, &format);
+        std::vector<double> before(2 * 6000, level), block = before;
+        ProcessBlock(effect, before.data(), 6000, format);
+        if (round % 3 == 0)
+            effect.SetPreset(other);
+        else
+            SetBoth(effect, round % 3 == 1 ? kThreshold : kRatio, static_cast<float>(random.Unit()));
+        ProcessBlock(effect, block.data(), 6000, format);
+        const double louder = std::max(before.back(), block.back());
+        double last = before.back();
+        for (std::size_t i = 1; i < block.size(); i += 2) {
+            ASSERT_LT(Decibels(1.0 + std::abs(block[i] - last) / louder), 0.1)
+                << preset << ", round " << round << ", level " << level << ", frame " << i / 2;
+            last = block[i];
+        }
+    }
+}
+
+// Catches a bend drawn by hand that an edit flattens. Its threshold is where its straight line begins.
+TEST(CompressorEdit, ADrawnBendMovesAlong) {
+    TransferCurve curve;
+    curve.Add(0.0, 0.0);
+    for (const auto& [in, out] : {std::pair{-60, -60}, {-40, -40}, {-30, -33}, {-20, -28}, {0, -23}})
+        curve.Add(Amplitude(in), Amplitude(out));
+    curve.UpdateSlopes();
+    curve.MoveThreshold(-300);
+    const std::pair<double, double> moved[] = {{-50, -50}, {-40, -43}, {-30, -38}, {0, -30.5}};
+    for (const auto& [in, out] : moved) {
+        const auto* const point =
+            std::ranges::find_if(curve, [&](const auto& p) { return std::abs(Decibels(p.x) - in) < 1e-4; });
+        ASSERT_NE(point, curve.end()) << in;
+        EXPECT_NEAR(Decibels(point->y), out, 1e-3) << in;
     }
 }
