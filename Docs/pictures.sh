@@ -6,7 +6,7 @@ source Scripts/common.sh
 
 need_packages "${BUILD_PACKAGES[@]}" sonic-pi-samples
 say "building"
-build_preset release dsphost
+build_preset apps dsphost
 if ! [ -f build/fonts/Montserrat_400Regular.ttf ] && ! fetch_montserrat build/fonts; then
     echo "Montserrat cannot be fetched (npm, network?); the pictures would come out in another typeface" >&2
     exit 1
@@ -17,7 +17,7 @@ recordings=$(dirname "$(dpkg -L sonic-pi-samples | grep -m1 '/loop_amen_full\.')
 draw() {
     local command=$1 recording=$recordings/$2 picture=Docs/pictures/$3
     shift 3
-    build/release/bin/dsphost "$command" "$recording" "$picture" -y -q \
+    build/apps/bin/dsphost "$command" "$recording" "$picture" -y -q \
         --font build/fonts/Montserrat_400Regular.ttf "$@"
     echo "$picture"
 }
