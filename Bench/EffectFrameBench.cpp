@@ -1,3 +1,4 @@
+#include "DSP/Effects/Tube/TubeDistorsion.h"
 #include "EffectRun.h"
 #include "Support/EffectCases.h"
 
@@ -53,6 +54,12 @@ BENCHMARK_TEMPLATE(BM_BlockCopy, double)->Arg(512);
                                          RunEffect<float>(state, *effect);
                                      })
             ->Arg(512);
+    benchmark::RegisterBenchmark("BM_EveryEffect/Tube distortion at 8x", [](benchmark::State& state) {
+        Corvo::DSP::TubeDistorsion tube;
+        tube.SetPreset(1);
+        tube.SetParam(9, 0.64f, false);
+        RunEffect<float>(state, tube);
+    })->Arg(512);
     return true;
 }();
 
