@@ -69,23 +69,24 @@ TEST_P(EveryEffect, GivesTheSameOutputHoweverTheStreamIsCut) {
 // Catches a per-channel path that lags behind the interleaved one, or that touches what it does not support.
 TEST_P(EveryEffect, TreatsPlanarBlocksLikeInterleavedOnes) {
     constexpr std::size_t kFrames = 2000;
-    const auto format = Format<double>();
-    const auto input = Noise<double>(2 * kFrames);
-    const auto planar = Make(), interleaved = Make();
-    std::vector<double> left, right;
-    for (std::size_t i = 0; i < kFrames; ++i) {
-        left.push_back(input[2 * i]);
-        right.push_back(input[2 * i + 1]);
-    }
-    double* const channels[] = {left.data(), right.data()};
-    planar->InitProcessing(kFrames, &format);
-    Corvo::DSP::ProcessFlags flags;
-    planar->ProcessNoninterleaved(channels, kFrames, &format, flags);
-    const auto expected =
-        planar->SupportsNoninterleaved() ? Render(*interleaved, input, format, {kFrames}) : input;
-    for (std::size_t i = 0; i < kFrames; ++i) {
-        ASSERT_EQ(left[i], expected[2 * i]) << "frame " << i;
-        ASSERT_EQ(right[i], expected[2 * i + 1]) << "frame " << i;
+    for (const std::size_t count : {1u, 2u}) {
+        const auto format = Format<double>(static_cast<int>(count));
+        const auto input = Noise<double>(count * kFrames);
+        const auto planar = Make(), interleaved = Make();
+        for (auto* effect : {planar.get(), interleaved.get()}) {
+            Random random(6);
+            SetAllParams(*effect, random);
+        }
+        std::vector<double> planes[2];
+        for (std::size_t i = 0; i < input.size(); ++i) planes[i % count].push_back(input[i]);
+        double* const channels[] = {planes[0].data(), planes[1].data()};
+        planar->InitProcessing(kFrames, &format);
+        Corvo::DSP::ProcessFlags flags;
+        planar->ProcessNoninterleaved(channels, kFrames, &format, flags);
+        const auto expected =
+            planar->SupportsNoninterleaved() ? Render(*interleaved, input, format, {kFrames}) : input;
+        for (std::size_t i = 0; i < input.size(); ++i)
+            ASSERT_EQ(planes[i % count][i / count], expected[i]) << count << " channels, frame " << i / count;
     }
 }
 
@@ -94,6 +95,10 @@ TEST_P(EveryEffect, TreatsPlanarBlocksLikeInterleavedOnes) {
 // preparation, runs out of.
 TEST_P(EveryEffect, StaysInsideItsBlocksAtAnyRateAndSize) {
     const auto effect = Make();
+    if (!GetParam().mayGrow) {
+        Random random(6);
+        SetAllParams(*effect, random);
+    }
     const auto run = [&]<typename Sample>(Sample, int rate, int channels) {
         const auto format = Format<Sample>(channels, rate);
         for (const bool prepared : {false, true}) {

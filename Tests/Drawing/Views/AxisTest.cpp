@@ -63,8 +63,10 @@ TEST(Axis, RoomIsGivenOnce) {
 
 // The names' expected values are those of equal temperament: A4 = 440 Hz, a cent a factor of 2^(1/1200).
 TEST(ShortText, ReadsLikeAScale) {
+    EXPECT_EQ(ShortText().AddFrequency(55.0).View(), "55.00 Hz");
     EXPECT_EQ(ShortText().AddFrequency(440.04).View(), "440.0 Hz");
     EXPECT_EQ(ShortText().AddFrequency(999.96).View(), "1.000 kHz");
+    EXPECT_EQ(ShortText().AddFrequency(9990.0).View(), "9.990 kHz");
     EXPECT_EQ(ShortText().AddFrequency(12345.0).View(), "12.35 kHz");
     EXPECT_EQ(ShortText().AddNote(440.0).View(), "A4 +0c");
     EXPECT_EQ(ShortText().AddNote(261.6256 * 1.00986).View(), "C4 +17c");
