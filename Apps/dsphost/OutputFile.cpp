@@ -212,6 +212,7 @@ void CommitTogether(std::span<OutputFile* const> files) {
 void RefuseSameOutputs(const std::vector<std::string>& paths) {
     for (auto a = paths.begin(); a != paths.end(); ++a)
         for (auto b = paths.begin(); b != a; ++b) {
+            if (a->empty() || b->empty()) continue;
             if (*a == "-" && *b == "-") throw UserError("only one output can go to standard output");
             std::error_code error;
             const bool device = *a != "-" && fs::is_character_file(PathOf(*a), error);
