@@ -24,7 +24,8 @@ namespace fs = std::filesystem;
 // Where the bytes end up: links lead to the file behind them, so that it is replaced and not the link.
 fs::path Target(const std::string& path) {
     std::error_code error;
-    const auto resolved = fs::weakly_canonical(PathOf(path), error);
+    // What does not exist stays relative otherwise.
+    const auto resolved = fs::weakly_canonical(fs::absolute(PathOf(path)), error);
     return error ? PathOf(path) : resolved;
 }
 
