@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
-# The names that a library exports are its contract. exports.txt beside this script has a row per class and one
-# per namespace (`Corvo::`) for its free functions: how many members are exported, and a checksum over their
-# signatures. `Class<>` counts the instances of its member templates. A row that names libraries holds for these
-# only; the others hold for DSPDll on every target, so signatures are compared without the width of integers.
+# The names that a library exports are its contract. exports.txt beside this script has a row per class, one per
+# namespace (`Corvo::`) for its free functions and `dsp_` for the C interface: how many members are exported, and a
+# checksum over their signatures. `Class<>` counts the instances of its member templates. A row that names libraries
+# holds for these only; the others hold for DSPDll on every target, so signatures are compared without the width of
+# integers.
 #
 #   exports.sh check LIBRARY   fails on a name that no row covers; on a row that covers nothing; and on a class in
 #                              which a member came, went, or changed its name or its parameters
@@ -37,6 +38,7 @@ compare() {
     BEGIN { for (i = 1; i < 256; ++i) code[sprintf("%c", i)] = i }
     # The row that a name belongs to: its own, its class (with <> for instances of templates), or its namespace.
     function owner(name,    instance) {
+        if (name ~ /^dsp_/) return "dsp_"
         if (name ~ /^(vtable|typeinfo) for /) return substr(name, index(name, " for ") + 5)
         gsub(/\(.*|\[abi:[a-z0-9]*\]/, "", name)
         while (sub(/<[^<>]*>/, "", name)) instance = "<>"

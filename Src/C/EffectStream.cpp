@@ -1,0 +1,144 @@
+#include "C/EffectStream.h"
+
+#include <algorithm>
+
+namespace Corvo::C {
+
+double TempoSource::GetTempo() { return Ask().bpm; }
+
+void TempoSource::GetTimeSignature(int& numerator, int& denominator) {
+    const dsp_tempo tempo = Ask();
+    numerator = tempo.numerator;
+    denominator = tempo.denominator;
+}
+
+dsp_tempo TempoSource::Ask() const {
+    dsp_tempo tempo{sizeof(dsp_tempo), 4, 4, 0, 120.0};
+    m_callback(m_user, &tempo);
+    return tempo;
+}
+
+EffectStream::EffectStream(const DSP::EffectKind& effectKind)
+    : Object(kKind),
+      effect(effectKind.MakeReady()),
+      m_announced(static_cast<std::size_t>(Busses())),
+      m_sidechain(m_announced.size()) {}
+
+void EffectStream::Prepare(const tWAVEFORMATEX& format, int maxFrames) {
+    const std::size_t samples = static_cast<std::size_t>(maxFrames) * format.nChannels;
+    m_scratch.assign(effect->SupportsNoninterleaved() ? 0 : samples, 0.0);
+    m_format = format;
+    m_maxFrames = maxFrames;
+    Restart();
+}
+
+void EffectStream::Restart() {
+    effect->Cleanup();
+    effect->InitProcessing(m_maxFrames, &m_format);
+    Seek(0);
+}
+
+void EffectStream::Seek(std::int64_t position) {
+    m_position = position;
+    m_nextPoint = static_cast<std::size_t>(std::ranges::upper_bound(m_points, position) - m_points.begin());
+}
+
+void EffectStream::Automate(int parameter, const dsp_point* points, std::size_t count) {
+    std::vector<MP_ENVELOPE_SEGMENT> segments(count);
+    std::vector<std::int64_t> frames(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        segments[i].rtStart = segments[i].rtEnd = frames[i] = points[i].frame;
+        segments[i].valStart = segments[i].valEnd = points[i].value;
+    }
+    m_lanes.resize(static_cast<std::size_t>(effect->GetParamCount()));
+    effect->AddEnvelope(parameter, static_cast<int>(count), segments.data());
+    m_lanes[static_cast<std::size_t>(parameter)] = frames;
+    m_points.clear();
+    for (const auto& lane : m_lanes) m_points.insert(m_points.end(), lane.begin(), lane.end());
+    std::ranges::sort(m_points);
+    Seek(m_position);
+}
+
+void EffectStream::AnnounceSidechain(int bus, int channels) {
+    m_announced[static_cast<std::size_t>(bus)] = channels;
+    m_sidechain[static_cast<std::size_t>(bus)] = {};
+    // In ascending order: announcing one discards all above it.
+    for (int b = bus; b < Busses(); ++b) effect->SetSidechainBusNumChannels(b, SidechainChannels(b));
+}
+
+void EffectStream::SetSidechain(int bus, const void* const* channels) {
+    auto& pointers = m_sidechain[static_cast<std::size_t>(bus)];
+    pointers = {};
+    for (int c = 0; channels && c < std::min(SidechainChannels(bus), kMostChannels); ++c)
+        pointers[static_cast<std::size_t>(c)] = static_cast<const std::byte*>(channels[c]);
+}
+
+void EffectStream::HandOverSidechain(int from) {
+    const std::ptrdiff_t offset = static_cast<std::ptrdiff_t>(from) * (Bits() / 8);
+    for (std::size_t bus = 0; bus < m_sidechain.size(); ++bus) {
+        double* at[kMostChannels]{};
+        for (std::size_t c = 0; c < kMostChannels; ++c)
+            if (const std::byte* const channel = m_sidechain[bus][c])
+                at[c] = reinterpret_cast<double*>(const_cast<std::byte*>(channel + offset));
+        if (at[0]) effect->SetSidechainBuffer(static_cast<int>(bus), at);
+    }
+}
+
+int EffectStream::PieceFrames(int left) {
+    while (m_nextPoint < m_points.size() && m_points[m_nextPoint] <= m_position) ++m_nextPoint;
+    const int most = std::min(left, m_maxFrames);
+    if (m_nextPoint == m_points.size()) return most;
+    return static_cast<int>(std::min<std::int64_t>(most, m_points[m_nextPoint] - m_position));
+}
+
+// process(first frame, frames) for every piece of the block.
+template <typename ProcessPiece>
+void EffectStream::Cut(int frames, ProcessPiece process) {
+    for (int done = 0; done < frames;) {
+        const int piece = PieceFrames(frames - done);
+        HandOverSidechain(done);
+        if (!m_points.empty()) effect->SetEnvelopeTime(m_position);
+        process(done, piece);
+        done += piece;
+        m_position += piece;
+    }
+    std::ranges::fill(m_sidechain, Pointers{});
+}
+
+template <typename Sample>
+void EffectStream::Process(Sample* samples, int frames) {
+    Cut(frames, [&](int first, int count) {
+        DSP::ProcessFlags flags;
+        effect->Process(reinterpret_cast<double*>(samples + static_cast<std::ptrdiff_t>(first) * Channels()),
+                        count, &m_format, flags);
+    });
+}
+
+template <typename Sample>
+void EffectStream::ProcessPlanar(Sample* const* channels, int frames) {
+    DSP::ProcessFlags flags;
+    const int width = Channels();
+    if (effect->SupportsNoninterleaved()) {
+        Cut(frames, [&](int first, int count) {
+            double* at[kMostChannels]{};
+            for (int c = 0; c < width; ++c) at[c] = reinterpret_cast<double*>(channels[c] + first);
+            effect->ProcessNoninterleaved(at, count, &m_format, flags);
+        });
+        return;
+    }
+    auto* const block = reinterpret_cast<Sample*>(m_scratch.data());
+    Cut(frames, [&](int first, int count) {
+        for (int c = 0; c < width; ++c)
+            for (int i = 0; i < count; ++i) block[i * width + c] = channels[c][first + i];
+        effect->Process(m_scratch.data(), count, &m_format, flags);
+        for (int c = 0; c < width; ++c)
+            for (int i = 0; i < count; ++i) channels[c][first + i] = block[i * width + c];
+    });
+}
+
+template void EffectStream::Process(float*, int);
+template void EffectStream::Process(double*, int);
+template void EffectStream::ProcessPlanar(float* const*, int);
+template void EffectStream::ProcessPlanar(double* const*, int);
+
+}  // namespace Corvo::C

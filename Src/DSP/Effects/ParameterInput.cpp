@@ -1,0 +1,122 @@
+#include "DSP/Effects/ParameterInput.h"
+
+#include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <optional>
+#include <stdexcept>
+
+#include "DSP/Effects/Parameters/ParameterText.h"
+
+namespace Corvo::DSP {
+namespace {
+
+bool SameNoCase(std::string_view a, std::string_view b) {
+    return a.size() == b.size() && StartsWithNoCase(a, b);
+}
+
+std::string_view Piece(std::string_view text, std::size_t from) {
+    return Trimmed(text.substr(std::min(from, text.size())));
+}
+
+// How many characters at the start are a decimal number; "inf" and "nan" are none.
+std::size_t NumberLength(std::string_view text) {
+    const std::size_t sign = text.starts_with('+') || text.starts_with('-') ? 1 : 0;
+    if (text.find_first_of("0123456789.", sign) != sign) return 0;
+    double value;
+    const auto [end, error] = std::from_chars(text.data() + sign, text.data() + text.size(), value);
+    return error == std::errc::invalid_argument ? 0 : static_cast<std::size_t>(end - text.data());
+}
+
+std::optional<double> NumberOf(std::string_view text) {
+    if (text.starts_with('+')) text.remove_prefix(1);
+    double value;
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+    if (error != std::errc{} || end == text.data() || !std::isfinite(value)) return {};
+    return value;
+}
+
+std::string Shown(CorvoEffectBase& effect, int index, float normalised) {
+    const std::string text = Narrow(effect.GetParameterFormattedText(index, static_cast<double>(normalised)));
+    return std::string(Trimmed(text));
+}
+
+// "4 x" and "4" name the same choice when the unit is "x".
+bool SameChoice(std::string_view shown, std::string_view text, std::string_view unit) {
+    const auto bare = [unit](std::string_view whole) {
+        whole = Trimmed(whole);
+        const bool ends = !unit.empty() && whole.size() > unit.size() &&
+                          SameNoCase(whole.substr(whole.size() - unit.size()), unit);
+        return ends ? Trimmed(whole.substr(0, whole.size() - unit.size())) : whole;
+    };
+    return SameNoCase(bare(shown), bare(text));
+}
+
+// Parsers stop where they understand no more: words, and what follows a number, count when the effect shows
+// them too. "-inf" for "-Inf. dB", "500 ms" for "499 ms", "1/4" for "1/4 (500 ms)".
+bool SaysTheSame(std::string_view shown, std::string_view text, std::string_view unit) {
+    const std::size_t length = NumberLength(text);
+    const std::string_view rest = Piece(text, length);
+    return StartsWithNoCase(shown, text) ||
+           (length > 0 &&
+            (rest.empty() || SameNoCase(rest, unit) || SameNoCase(rest, Piece(shown, NumberLength(shown)))));
+}
+
+bool BeyondRange(double number, float normalised, std::string_view shown) {
+    if (normalised > 0.0f && normalised < 1.0f) return false;
+    const auto end = NumberOf(shown);
+    if (!end) return false;
+    const double slack = 1e-3 * std::max(1.0, std::abs(*end));
+    return normalised >= 1.0f ? number > *end + slack : number < *end - slack;
+}
+
+// -1 for what the effect's parser does not take.
+float Parsed(CorvoEffectBase& effect, int index, std::string_view text) {
+    try {
+        return effect.GetParamValueNormalizedFromText(index, std::string(text));
+    } catch (const std::invalid_argument&) {
+        return -1.0f;
+    } catch (const std::out_of_range&) {
+        return -1.0f;
+    }
+}
+
+}  // namespace
+
+std::vector<int> FindParameters(CorvoEffectBase& effect, std::string_view name) {
+    name = Trimmed(name);
+    std::vector<int> labelled, named;
+    for (int index = 0; index < effect.GetParamCount(); ++index) {
+        const ParameterDescription parameter = effect.Describe(index);
+        if (SameNoCase(parameter.label, name)) labelled.push_back(index);
+        if (SameNoCase(parameter.name, name)) named.push_back(index);
+    }
+    return labelled.empty() ? named : labelled;
+}
+
+std::string AcceptedTexts(CorvoEffectBase& effect, int index) {
+    std::string all;
+    for (const auto& choice : effect.Describe(index).choices) all += (all.empty() ? "" : ", ") + choice.text;
+    return all.empty() ? Shown(effect, index, 0.0f) + " to " + Shown(effect, index, 1.0f) : all;
+}
+
+ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text) {
+    const ParameterDescription parameter = effect.Describe(index);
+    const std::string_view unit = Trimmed(parameter.unit);
+    text = Trimmed(text);
+    for (const auto& choice : parameter.choices)
+        if (SameChoice(choice.text, text, unit)) return {choice.normalised, false};
+    const std::size_t length = NumberLength(text);
+    const bool onlyChoices =
+        parameter.type == EffectParameterType::List || (!parameter.choices.empty() && length == 0);
+    const float value = text.empty() || onlyChoices ? -1.0f : Parsed(effect, index, text);
+    const bool understood = value >= 0.0f && value <= 1.0f;
+    const std::string shown = understood ? Shown(effect, index, value) : "";
+    if (!understood || !SaysTheSame(shown, text, unit))
+        throw std::invalid_argument(parameter.label + " cannot be \"" + std::string(text) +
+                                    "\"; accepted: " + AcceptedTexts(effect, index));
+    const auto number = NumberOf(text);
+    return {value, number && BeyondRange(*number, value, shown)};
+}
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,30 @@
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
+#include "Platform/Export.h"
+
+// What a person writes about parameters: their names, and values as text. User-interface thread; texts are
+// UTF-8, and letters may be of either case.
+namespace Corvo::DSP {
+
+// The external parameters that `name` means: the one with that label, else all with that name, which are both
+// sides of a pair. Empty when there is none.
+DSP_API std::vector<int> FindParameters(CorvoEffectBase& effect, std::string_view name);
+
+struct ParameterInput {
+    float normalised;
+    bool limited;  // the number was beyond the range
+};
+
+// The value that `text` means for an external parameter that the effect has: a choice of a list or switch, or
+// a number as the effect's own parser takes it, with or without its unit; beyond the range it is limited.
+// Throws std::invalid_argument, with a sentence that says what would be accepted, for anything else.
+DSP_API ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text);
+// What would be accepted: "On, Off" or "-60.0 dB to 12.0 dB".
+DSP_API std::string AcceptedTexts(CorvoEffectBase& effect, int index);
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,15 @@
+# The functions of the C interface are read from its headers: for the list of names that other compilers' linkers
+# take on Windows, and for the test that calls every one of them.
+set(dsp_c_headers ${PROJECT_SOURCE_DIR}/Src/C/dspdll.h)
+if(WIN32 OR DSP_BUILD_DRAWING)
+    list(APPEND dsp_c_headers ${PROJECT_SOURCE_DIR}/Src/C/dspdrawing.h)
+endif()
+set_property(DIRECTORY ${PROJECT_SOURCE_DIR} APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${dsp_c_headers})
+set(DSP_C_FUNCTIONS)
+foreach(header ${dsp_c_headers})
+    file(STRINGS ${header} lines REGEX "DSP_CALL dsp_[a-z0-9_]+\\(")
+    foreach(line ${lines})
+        string(REGEX REPLACE ".*DSP_CALL (dsp_[a-z0-9_]+)\\(.*" "\\1" name "${line}")
+        list(APPEND DSP_C_FUNCTIONS ${name})
+    endforeach()
+endforeach()
