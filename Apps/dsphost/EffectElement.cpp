@@ -68,9 +68,8 @@ void ProcessPlanar(Effect& effect, Sample* samples, Sample* planes, int frames, 
 
 }  // namespace
 
-EffectElement::EffectElement(EffectFactory factory, std::string_view settings)
-    : m_factory(factory), m_effect(factory()), m_name(m_effect->GetName()) {
-    m_parameters = DescribeParameters(factory);
+EffectElement::EffectElement(const EffectKind& kind, std::string_view settings)
+    : m_kind(kind), m_effect(kind.make()), m_name(kind.name), m_parameters(DescribeParameters(kind)) {
     const auto all = SplitSettings(settings, m_name);
     std::optional<Setting> start;
     for (const auto& setting : all)
@@ -79,7 +78,7 @@ EffectElement::EffectElement(EffectFactory factory, std::string_view settings)
             start = setting;
         }
     if (!start)
-        m_effect = MakeEffect(factory);
+        m_effect = kind.MakeReady();
     else if (SameNoCase(start->key, "preset"))
         ChoosePreset(start->value);
     else
@@ -98,14 +97,13 @@ void EffectElement::ChoosePreset(std::string_view name) {
 
 void EffectElement::LoadChunk(const std::string& path) {
     const std::string bytes = ReadWhole(path, kLargestChunk);
-    UseChunk(m_factory, *m_effect, {bytes.begin(), bytes.end()}, path);
+    UseChunk(m_kind, *m_effect, {bytes.begin(), bytes.end()}, path);
 }
 
 void EffectElement::SetParameter(std::string_view label, std::string_view text) {
     std::string warning;
-    for (const auto* parameter : FindParameters(m_parameters, label, m_name))
-        m_effect->SetParam(parameter->index, ParseValue(m_factory, *m_effect, *parameter, text, warning),
-                           false);
+    for (const auto* parameter : FindParameters(*m_effect, m_parameters, label))
+        m_effect->SetParam(parameter->index, ParseValue(*m_effect, *parameter, text, warning), false);
     if (!warning.empty()) PrintMessage("warning: " + warning);
 }
 
@@ -136,7 +134,8 @@ double EffectElement::LongestGap() { return m_effect->LongestGap(); }
 std::vector<int> EffectElement::AutomationLanes(std::string_view parameter) {
     if (!m_effect->PlaysAutomation()) throw UserError(m_name + " plays no automation");
     std::vector<int> lanes;
-    for (const auto* found : FindParameters(m_parameters, parameter, m_name)) lanes.push_back(found->index);
+    for (const auto* found : FindParameters(*m_effect, m_parameters, parameter))
+        lanes.push_back(found->index);
     return lanes;
 }
 

@@ -17,7 +17,8 @@ namespace dsphost {
 // state to start from instead of the default preset, wherever they stand.
 class EffectElement : public ChainElement {
 public:
-    EffectElement(EffectFactory factory, std::string_view settings);
+    // `kind` lives as long as the element.
+    EffectElement(const EffectKind& kind, std::string_view settings);
     ~EffectElement() override;
 
     std::string Name() const override { return m_name; }
@@ -41,7 +42,7 @@ private:
         std::size_t next = 0;  // the first that is not due
     };
 
-    EffectFactory m_factory;
+    const EffectKind& m_kind;
     std::unique_ptr<Effect> m_effect;
     std::string m_name;
     std::vector<EffectParameter> m_parameters;

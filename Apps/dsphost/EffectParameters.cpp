@@ -6,6 +6,7 @@
 #include <iterator>
 #include <stdexcept>
 
+#include "DSP/Effects/ParameterInput.h"
 #include "Errors.h"
 #include "Text.h"
 
@@ -15,44 +16,6 @@ namespace {
 using Corvo::EffectParameterType;
 
 constexpr std::string_view kNormalisedMark = "n:";
-
-// "4 x" and "4" name the same choice when the unit is "x".
-bool SameChoice(std::string_view shown, std::string_view text, std::string_view unit) {
-    shown = Trimmed(shown), text = Trimmed(text), unit = Trimmed(unit);
-    const auto bare = [&](std::string_view whole) {
-        const bool ends = !unit.empty() && whole.size() > unit.size() &&
-                          SameNoCase(whole.substr(whole.size() - unit.size()), unit);
-        return ends ? Trimmed(whole.substr(0, whole.size() - unit.size())) : whole;
-    };
-    return SameNoCase(bare(shown), bare(text));
-}
-
-// Both ends as numbers, when the effect shows plain numbers there.
-std::string RangeText(Effect& scratch, const EffectParameter& parameter) {
-    const std::string low = TextAt(scratch, parameter, 0.0f), high = TextAt(scratch, parameter, 1.0f);
-    return std::string(Trimmed(low)) + " to " + std::string(Trimmed(high));
-}
-
-// Parsers stop where they understand no more: words, and what follows a number, count when the effect shows
-// them too. "-inf" for "-Inf. dB", "500 ms" for "499 ms", "1/4" for "1/4 (500 ms)".
-bool SaysTheSame(std::string_view shown, std::string_view text, std::string_view unit) {
-    shown = Trimmed(shown);
-    const std::size_t length = NumberLength(text);
-    const std::string_view rest = Trimmed(text.substr(length));
-    return StartsWithNoCase(shown, text) ||
-           (length > 0 && (rest.empty() || SameNoCase(rest, Trimmed(unit)) ||
-                           SameNoCase(rest, Trimmed(shown.substr(NumberLength(shown))))));
-}
-
-bool BeyondRange(Effect& scratch, const EffectParameter& parameter, double number, float normalised) {
-    if (normalised > 0.0f && normalised < 1.0f) return false;
-    const std::string text = TextAt(scratch, parameter, normalised);
-    const auto length = NumberLength(Trimmed(text));
-    const auto end = ToNumber(Trimmed(text).substr(0, length));
-    const double slack = end ? 1e-3 * std::max(1.0, std::abs(*end)) : 0.0;
-    if (!end) return false;
-    return normalised >= 1.0f ? number > *end + slack : number < *end - slack;
-}
 
 std::vector<std::uint8_t> StateOf(Effect& effect) {
     std::vector<std::uint8_t> chunk;
@@ -68,8 +31,8 @@ std::uint32_t WordAt(const State& state, std::size_t place) {
     return word;
 }
 
-std::vector<State> PresetStates(EffectFactory factory) {
-    const auto effect = factory();
+std::vector<State> PresetStates(const EffectKind& kind) {
+    const auto effect = kind.make();
     std::vector<State> states;
     for (int i = 0; i < effect->NumPresets(); ++i) {
         effect->SetPreset(i);
@@ -80,17 +43,18 @@ std::vector<State> PresetStates(EffectFactory factory) {
 
 // Whether the words that the parameter sets, one for each side, lie between those of its ends or of presets,
 // which may go beyond. Where it sets more it is no plain number, and the effect looks after it.
-bool InRange(EffectFactory factory, const EffectParameter& parameter, const State& state,
+bool InRange(const EffectKind& kind, const EffectParameter& parameter, const State& state,
              std::vector<State> known) {
     constexpr int kSides = 2;
-    const auto effect = factory();
+    const auto effect = kind.make();
     for (const float end : {0.0f, 1.0f}) {
         effect->SetParam(parameter.index, end, false);
         known.push_back(StateOf(*effect));
     }
     const State &low = known[known.size() - 2], &high = known.back();
     int set = 0, outside = 0;
-    for (std::size_t place = 0; place + 4 <= state.size(); place += 4) {
+    const std::size_t size = std::ranges::min(known, {}, &State::size).size();
+    for (std::size_t place = 0; place + 4 <= std::min(size, state.size()); place += 4) {
         if (WordAt(low, place) == WordAt(high, place)) continue;
         // What parameters store as integers would be tiny as floats, or none.
         const auto isFloat = [&](const State& each) {
@@ -112,36 +76,26 @@ bool InRange(EffectFactory factory, const EffectParameter& parameter, const Stat
 
 }  // namespace
 
-std::unique_ptr<Effect> MakeEffect(EffectFactory factory) {
-    auto effect = factory();
-    if (effect->NumPresets() > 0) effect->SetPreset(effect->GetDefaultPreset());
-    return effect;
-}
-
-std::unique_ptr<Effect> CopyEffect(EffectFactory factory, Effect& effect) {
-    auto copy = factory();
-    copy->SetSettingsChunk(StateOf(effect));
-    return copy;
-}
-
-void UseChunk(EffectFactory factory, Effect& effect, const std::vector<std::uint8_t>& chunk,
+void UseChunk(const EffectKind& kind, Effect& effect, const std::vector<std::uint8_t>& chunk,
               const std::string& name) {
     const auto before = StateOf(effect);
-    if (chunk.size() <= before.size()) effect.SetSettingsChunk(chunk);
-    // Effects ignore what they cannot read without a word.
-    if (chunk.size() > before.size() || (StateOf(effect) == before && chunk != before))
+    const auto trial = kind.Copy(effect);
+    trial->SetSettingsChunk(chunk);
+    const auto state = StateOf(*trial);
+    // Effects ignore what they cannot read, and what lies behind their settings, without a word.
+    if (chunk.size() > state.size() || (state == before && chunk != before))
         throw UserError(name + ": " + std::to_string(chunk.size()) + " bytes are not settings of " +
                         effect.GetName() + ", which have " + std::to_string(before.size()));
-    const auto state = StateOf(effect);
-    const auto presets = PresetStates(factory);
-    for (const auto& parameter : DescribeParameters(factory))
-        if (!InRange(factory, parameter, state, presets))
+    const auto presets = PresetStates(kind);
+    for (const auto& parameter : DescribeParameters(kind))
+        if (!InRange(kind, parameter, state, presets))
             throw UserError(name + ": is not settings of " + effect.GetName() + ": " + parameter.label +
                             " is out of range");
+    effect.SetSettingsChunk(chunk);
 }
 
-std::vector<EffectParameter> DescribeParameters(EffectFactory factory) {
-    const auto effect = MakeEffect(factory);
+std::vector<EffectParameter> DescribeParameters(const EffectKind& kind) {
+    const auto effect = kind.MakeReady();
     std::vector<EffectParameter> parameters;
     for (int index = 0; index < effect->GetParamCount(); ++index)
         parameters.push_back({effect->Describe(index), index});
@@ -157,26 +111,22 @@ std::string CurrentText(Effect& effect, const EffectParameter& parameter) {
     return Utf8(effect.GetParameterFormattedText(parameter.index, effect.GetParam(parameter.index)));
 }
 
-std::vector<const EffectParameter*> FindParameters(const std::vector<EffectParameter>& all,
-                                                   std::string_view label, const std::string& effectName) {
-    label = Trimmed(label);
+std::vector<const EffectParameter*> FindParameters(Effect& effect, const std::vector<EffectParameter>& all,
+                                                   std::string_view label) {
     std::vector<const EffectParameter*> found;
-    for (const auto& parameter : all)
-        if (SameNoCase(parameter.label, label)) found.push_back(&parameter);
-    if (found.empty())
-        for (const auto& parameter : all)
-            if (SameNoCase(parameter.name, label)) found.push_back(&parameter);
+    for (const int index : Corvo::DSP::FindParameters(effect, label))
+        found.push_back(&all[static_cast<std::size_t>(index)]);
     if (!found.empty()) return found;
     std::vector<std::string> labels;
     for (const auto& parameter : all)
         for (const auto& name : {parameter.name, parameter.label})
             if (std::ranges::find(labels, name) == labels.end()) labels.push_back(name);
-    const std::string shown = Shortened(label, kLongestQuote);
-    throw UserError(effectName + " has no parameter \"" + shown + "\"; " + Suggestion(shown, labels));
+    const std::string shown = Shortened(Trimmed(label), kLongestQuote);
+    throw UserError(effect.GetName() + " has no parameter \"" + shown + "\"; " + Suggestion(shown, labels));
 }
 
-float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& parameter,
-                 std::string_view text, std::string& warning) {
+float ParseValue(Effect& effect, const EffectParameter& parameter, std::string_view text,
+                 std::string& warning) {
     text = Trimmed(text);
     const std::string asked =
         effect.GetName() + ": " + parameter.label + " cannot be \"" + Shortened(text, kLongestQuote) + "\"; ";
@@ -186,37 +136,17 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
             throw UserError(asked + "n: takes a normalised value from 0 to 1, such as n:0.37");
         return static_cast<float>(*number);
     }
-    const auto scratch = CopyEffect(factory, effect);
-    std::vector<std::string> choices;
-    for (const auto& choice : parameter.choices) {
-        if (SameChoice(choice.text, text, parameter.unit)) return choice.normalised;
-        choices.push_back(choice.text);
-    }
-    const std::string accepted = (choices.empty() ? "accepted: " + RangeText(*scratch, parameter)
-                                                  : "accepted: " + Joined(choices, ", ")) +
-                                 ", or a normalised value such as n:0.5";
-    const std::size_t length = NumberLength(text);
-    const bool list = parameter.type == EffectParameterType::List;
-    if (text.empty() || (!choices.empty() && (list || length == 0))) throw UserError(asked + accepted);
-    float value = -1.0f;
     try {
-        value = effect.GetParamValueNormalizedFromText(parameter.index, std::string(text));
+        const auto input = Corvo::DSP::ReadParameter(effect, parameter.index, text);
+        if (input.limited)
+            warning = effect.GetName() + ": " + parameter.label + "=" + std::string(text) +
+                      " is beyond the range; " +
+                      Corvo::DSP::ParameterTextAt(effect, parameter.index, input.normalised) + " is used";
+        return input.normalised;
     } catch (const std::invalid_argument&) {
-        throw UserError(asked + accepted);
-    } catch (const std::out_of_range&) {
-        throw UserError(asked + accepted);
+        throw UserError(asked + "accepted: " + Corvo::DSP::AcceptedTexts(effect, parameter.index) +
+                        ", or a normalised value such as n:0.5");
     }
-    // Beyond the range parsers limit, or say by how much.
-    if (length > 0 && !std::isnan(value)) value = std::clamp(value, 0.0f, 1.0f);
-    if (!(value >= 0.0f && value <= 1.0f) ||
-        !SaysTheSame(TextAt(*scratch, parameter, value), text, parameter.unit))
-        throw UserError(asked + accepted);
-    if (const auto number = ToNumber(text.substr(0, length));
-        number && BeyondRange(*scratch, parameter, *number, value))
-        warning = effect.GetName() + ": " + parameter.label + "=" + std::string(text) +
-                  " is beyond the range; " + std::string(Trimmed(TextAt(*scratch, parameter, value))) +
-                  " is used";
-    return value;
 }
 
 }  // namespace dsphost

@@ -1,21 +1,19 @@
 #pragma once
 
-#include <memory>
 #include <span>
 #include <string>
 #include <vector>
 
 #include "ChainElement.h"
-#include "DSP/Effects/Framework/CorvoEffectBase.h"
+#include "DSP/Effects/EffectKinds.h"
 
 namespace dsphost {
 
 using Effect = Corvo::DSP::CorvoEffectBase;
-using EffectFactory = std::unique_ptr<Effect> (*)();
+using Corvo::DSP::EffectKind;
+using Corvo::DSP::EffectKinds;
 
-// Every effect of the library, in the order that `dsphost effects` shows.
-std::span<const EffectFactory> EffectFactories();
-// Their names, in the same order.
+// The names of the library's effects, in its order.
 std::span<const std::string> EffectNames();
 
 // Everything that --fx can name: the effects, and what else can stand in a chain.

@@ -33,8 +33,8 @@ const char* TypeName(EffectParameterType type) {
 }
 
 // In the state it starts from, prepared for a stereo stream at 48 kHz: a latency may depend on the format.
-std::unique_ptr<Effect> Prepared(EffectFactory factory) {
-    auto effect = MakeEffect(factory);
+std::unique_ptr<Effect> Prepared(const EffectKind& kind) {
+    auto effect = kind.MakeReady();
     effect->InitProcessing(kFrames, &kFormat);
     return effect;
 }
@@ -52,10 +52,10 @@ std::vector<std::string> ListTexts(const EffectParameter& parameter) {
     return texts;
 }
 
-Json Describe(EffectFactory factory) {
-    const auto effect = Prepared(factory);
+Json Describe(const EffectKind& kind) {
+    const auto effect = Prepared(kind);
     Json parameters = Json::array();
-    for (const auto& parameter : DescribeParameters(factory))
+    for (const auto& parameter : DescribeParameters(kind))
         parameters.push_back({{"index", parameter.index},
                               {"name", parameter.label},
                               {"unit", parameter.unit},
@@ -91,13 +91,13 @@ std::string Table(const std::vector<std::vector<std::string>>& rows) {
     return text;
 }
 
-std::string Explain(EffectFactory factory) {
-    const auto effect = Prepared(factory);
-    const auto scratch = MakeEffect(factory);
+std::string Explain(const EffectKind& kind) {
+    const auto effect = Prepared(kind);
+    const auto scratch = kind.MakeReady();
     const auto shown = [](const std::string& text) { return std::string(Trimmed(text)); };
     std::vector<std::vector<std::string>> rows{
         {"", "parameter", "unit", "at 0", "neutral", "at 1", "default"}};
-    for (const auto& parameter : DescribeParameters(factory)) {
+    for (const auto& parameter : DescribeParameters(kind)) {
         const auto at = [&](float n) {
             std::string text = shown(TextAt(*scratch, parameter, n));
             scratch->SetParam(parameter.index, effect->GetParam(parameter.index), false);
@@ -108,7 +108,7 @@ std::string Explain(EffectFactory factory) {
     }
     std::string text = effect->GetName() + ", latency " + std::to_string(effect->GetLatency()) +
                        " frames at 48 kHz\n\n" + Table(rows);
-    for (const auto& parameter : DescribeParameters(factory))
+    for (const auto& parameter : DescribeParameters(kind))
         if (const auto texts = ListTexts(parameter); !texts.empty())
             text += "\n  " + parameter.label + ": " + Joined(texts, ", ");
     const auto presets = Presets(*effect);
@@ -123,8 +123,8 @@ std::string Explain(EffectFactory factory) {
 
 std::string Overview() {
     std::vector<std::vector<std::string>> rows{{"effect", "parameters", "presets", "latency"}};
-    for (const auto factory : EffectFactories()) {
-        const auto effect = Prepared(factory);
+    for (const auto& kind : EffectKinds()) {
+        const auto effect = Prepared(kind);
         rows.push_back({effect->GetName(), std::to_string(effect->GetParamCount()),
                         std::to_string(effect->NumPresets()), std::to_string(effect->GetLatency())});
     }
@@ -158,23 +158,23 @@ std::string ExplainEqualiser() {
 }  // namespace
 
 void RunEffects(EffectsArguments arguments) {
-    auto factories = EffectFactories();
+    auto kinds = EffectKinds();
     bool equaliser = true;
     if (!arguments.effect.empty()) {
         std::vector<std::string> names(EffectNames().begin(), EffectNames().end());
         names.emplace_back(EqualiserElement::kName);
         const std::size_t found = FindName(arguments.effect, names, "effect");
-        equaliser = found == factories.size();
-        factories = factories.subspan(found, equaliser ? 0 : 1);
+        equaliser = found == kinds.size();
+        kinds = kinds.subspan(found, equaliser ? 0 : 1);
     }
     if (arguments.json) {
         Json all = Json::array();
-        for (const auto factory : factories) all.push_back(Describe(factory));
+        for (const auto& kind : kinds) all.push_back(Describe(kind));
         if (equaliser) all.push_back(DescribeEqualiser());
         return Print(all.dump(2) + "\n");
     }
     if (arguments.effect.empty()) return Print(Overview());
-    Print(equaliser ? ExplainEqualiser() : Explain(factories.front()));
+    Print(equaliser ? ExplainEqualiser() : Explain(kinds.front()));
 }
 
 }  // namespace dsphost

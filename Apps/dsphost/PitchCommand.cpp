@@ -1,13 +1,12 @@
 #include <algorithm>
 #include <cmath>
-#include <memory>
 #include <string>
 #include <vector>
 
 #include "Arguments.h"
 #include "AudioReader.h"
 #include "AudioWriter.h"
-#include "DSP/Pitch/PitchAdapter.h"
+#include "DSP/Pitch/OfflinePitchShift.h"
 #include "Errors.h"
 #include "Progress.h"
 #include "Text.h"
@@ -15,14 +14,13 @@
 namespace dsphost {
 namespace {
 
-using Corvo::DSP::PitchAdapter;
+using Corvo::DSP::OfflinePitchShift;
 using Corvo::DSP::PitchAdapterInfo;
 
 constexpr int kBlock = 4096;
 constexpr int kMostChannels = 2;
 constexpr double kMostSemitones = 36.0;
 constexpr double kLowestSpeed = 0.1, kHighestSpeed = 10.0;
-constexpr int kClassicSizeIndex = 3;
 
 bool IsNew(const PitchArguments& arguments) { return SameNoCase(arguments.engine, "new"); }
 
@@ -44,83 +42,27 @@ void CheckNumbers(const PitchArguments& arguments, const PitchAdapterInfo& engin
                         arguments.engine);
 }
 
-// "New" makes up for its own delay in the path without padding. "Classic" delays by all of its frame but one
-// step, which is dropped here and made up for with silence behind the input.
-int DelayFrames(const PitchArguments& arguments, const PitchAdapterInfo& engine) {
-    if (IsNew(arguments)) return 0;
-    const int size = engine.GetFFTSizes()[kClassicSizeIndex];
-    return size - size / engine.GetQualities()[static_cast<std::size_t>(arguments.quality)];
-}
-
-std::unique_ptr<PitchAdapter> Prepare(const PitchArguments& arguments, PitchAdapterInfo* engine,
-                                      const AudioReader& input) {
-    std::unique_ptr<PitchAdapter> adapter(PitchAdapter::CreateAdapter(engine));
-    adapter->SetChannelsNum(input.Channels());
-    adapter->SetSampleRate(input.Rate());
-    adapter->SetFFTSize(kClassicSizeIndex);
-    adapter->SetQuality(arguments.quality);
-    adapter->SetTranspose(static_cast<float>(arguments.semitones));
-    adapter->SetSpeed(static_cast<float>(arguments.speed));
-    adapter->CookFactors();
-    return adapter;
-}
-
-// Takes blocks as they come out of the engine: leaves out its delay, and stops where the output is long
-// enough.
-class Sink {
-public:
-    Sink(AudioWriter& output, int channels, int delay)
-        : m_output(output), m_channels(static_cast<std::size_t>(channels)), m_delay(delay) {}
-
-    void Take(const std::vector<float>& block, int frames, std::int64_t owed) {
-        const auto skipped = static_cast<int>(std::min<std::int64_t>(m_delay, frames));
-        m_delay -= skipped;
-        const std::int64_t count = std::min<std::int64_t>(frames - skipped, owed - m_output.FramesWritten());
-        if (count <= 0) return;
-        const auto first = block.begin() + static_cast<std::ptrdiff_t>(m_channels) * skipped;
-        m_samples.assign(
-            first, first + static_cast<std::ptrdiff_t>(m_channels) * static_cast<std::ptrdiff_t>(count));
-        m_output.Write(m_samples.data(), count);
-    }
-
-private:
-    AudioWriter& m_output;
-    std::size_t m_channels;
-    std::int64_t m_delay;
-    std::vector<double> m_samples;
-};
-
-void Shift(AudioReader& input, PitchAdapter& adapter, AudioWriter& output, const PitchArguments& arguments,
-           int delay) {
+void Shift(AudioReader& input, OfflinePitchShift& shift, AudioWriter& output, bool quiet) {
     const auto width = static_cast<std::size_t>(input.Channels());
-    std::vector<double> read(kBlock * width);
+    std::vector<double> samples(kBlock * width);
     std::vector<float> block(kBlock * width);
-    Sink sink(output, input.Channels(), delay);
-    const auto process = [&](int frames, std::int64_t owed) {
-        const int got = adapter.ProcessInPlaceNoPadding(block.data(), frames);
-        sink.Take(block, got, owed);
+    const auto write = [&] {
+        while (const int count = shift.Take(block.data(), kBlock)) {
+            std::copy_n(block.begin(), static_cast<std::size_t>(count) * width, samples.begin());
+            output.Write(samples.data(), count);
+        }
     };
-    Progress progress("pitch", input.Rate(), input.Frames(), arguments.writing.quiet);
-    const float speed = static_cast<float>(arguments.speed);
+    Progress progress("pitch", input.Rate(), input.Frames(), quiet);
     std::int64_t frames = 0;
-    const auto owed = [&] { return static_cast<std::int64_t>(static_cast<double>(frames) / speed); };
-    while (const int count = input.Read(read.data(), kBlock)) {
-        std::transform(read.begin(), read.begin() + static_cast<std::ptrdiff_t>(width) * count, block.begin(),
-                       [](double sample) { return static_cast<float>(sample); });
-        frames += count;
-        process(count, owed());
-        progress.Update(frames);
+    while (const int count = input.Read(samples.data(), kBlock)) {
+        std::transform(samples.begin(), samples.begin() + static_cast<std::ptrdiff_t>(width) * count,
+                       block.begin(), [](double sample) { return static_cast<float>(sample); });
+        shift.Feed(block.data(), count);
+        write();
+        progress.Update(frames += count);
     }
-    for (int left = delay; left > 0; left -= kBlock) {
-        std::ranges::fill(block, 0.0f);
-        process(std::min(left, kBlock), owed());
-    }
-    adapter.Flush();
-    for (int left = adapter.GetNumSamplesAvailable(); left > 0; left = adapter.GetNumSamplesAvailable()) {
-        const int count = std::min(left, kBlock);
-        adapter.ReceiveSamples(block.data(), count);
-        sink.Take(block, count, owed());
-    }
+    shift.Finish();
+    write();
 }
 
 }  // namespace
@@ -134,13 +76,16 @@ void RunPitch(PitchArguments arguments) {
 
     AudioReader input(arguments.input);
     RequireFormat(input, kMostChannels, "the pitch is shifted in mono and stereo");
-    const auto adapter = Prepare(arguments, engine, input);
+    OfflinePitchShift shift(
+        {input.Rate(), input.Channels(), arguments.semitones,
+         IsNew(arguments) ? OfflinePitchShift::Engine::New : OfflinePitchShift::Engine::Classic,
+         arguments.quality, arguments.speed});
     AudioWriterOptions writing{input.Channels(), input.Rate(), asked, input.Format(), input.Frames()};
     if (writing.framesAtMost)
         writing.framesAtMost =
             static_cast<std::int64_t>(static_cast<double>(*writing.framesAtMost) / kLowestSpeed);
     AudioWriter output(arguments.output, arguments.writing.rules, writing);
-    Shift(input, *adapter, output, arguments, DelayFrames(arguments, *engine));
+    Shift(input, shift, output, arguments.writing.quiet);
     output.Commit();
     WarnOfClipping(output);
 }

@@ -32,7 +32,8 @@ AlignedConverter::Settings Settings(const dsp_conversion& c) {
             static_cast<StoredSample>(c.in_sample),
             static_cast<StoredSample>(c.out_sample),
             c.nearest == 0,
-            static_cast<DitherCurve>(c.dither)};
+            static_cast<DitherCurve>(c.dither),
+            0};
 }
 static_assert(static_cast<int>(StoredSample::Int16) == DSP_S16 &&
               static_cast<int>(StoredSample::Double) == DSP_F64);

@@ -116,8 +116,7 @@ dsp_status DSP_CALL dsp_effect_value_to_text(dsp_effect* effect, int32_t paramet
                                              size_t size, size_t* needed) {
     return WithParameter(effect, parameter, nullptr, [&](CorvoEffectBase& fx) -> dsp_status {
         if (!(value >= 0.0f && value <= 1.0f)) return DSP_OUT_OF_RANGE;
-        return GiveText(Narrow(fx.GetParameterFormattedText(parameter, static_cast<double>(value))), buffer,
-                        size, needed);
+        return GiveText(Corvo::DSP::ParameterTextAt(fx, parameter, value), buffer, size, needed);
     });
 }
 
@@ -145,7 +144,7 @@ dsp_status DSP_CALL dsp_effect_automate(dsp_effect* effect, int32_t parameter, c
             const bool ascends = i == 0 || points[i].frame >= points[i - 1].frame;
             if (!ascends || !(points[i].value >= 0.0f && points[i].value <= 1.0f)) return DSP_OUT_OF_RANGE;
         }
-        stream.Automate(parameter, points, count);
+        stream.Automate(parameter, {points, count});
         return DSP_OK;
     });
 }

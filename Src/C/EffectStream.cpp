@@ -40,22 +40,16 @@ void EffectStream::Restart() {
 
 void EffectStream::Seek(std::int64_t position) {
     m_position = position;
-    m_nextPoint = static_cast<std::size_t>(std::ranges::upper_bound(m_points, position) - m_points.begin());
+    for (Lane& lane : m_lanes) {
+        const auto due = std::ranges::upper_bound(lane.points, position, {}, &dsp_point::frame);
+        // The last point that is due is played again.
+        lane.next = static_cast<std::size_t>(std::max<std::ptrdiff_t>(due - lane.points.begin() - 1, 0));
+    }
 }
 
-void EffectStream::Automate(int parameter, const dsp_point* points, std::size_t count) {
-    std::vector<MP_ENVELOPE_SEGMENT> segments(count);
-    std::vector<std::int64_t> frames(count);
-    for (std::size_t i = 0; i < count; ++i) {
-        segments[i].rtStart = segments[i].rtEnd = frames[i] = points[i].frame;
-        segments[i].valStart = segments[i].valEnd = points[i].value;
-    }
-    m_lanes.resize(static_cast<std::size_t>(effect->GetParamCount()));
-    effect->AddEnvelope(parameter, static_cast<int>(count), segments.data());
-    m_lanes[static_cast<std::size_t>(parameter)] = frames;
-    m_points.clear();
-    for (const auto& lane : m_lanes) m_points.insert(m_points.end(), lane.begin(), lane.end());
-    std::ranges::sort(m_points);
+void EffectStream::Automate(int parameter, std::span<const dsp_point> points) {
+    std::erase_if(m_lanes, [parameter](const Lane& lane) { return lane.parameter == parameter; });
+    if (!points.empty()) m_lanes.push_back({parameter, {points.begin(), points.end()}, 0});
     Seek(m_position);
 }
 
@@ -84,20 +78,32 @@ void EffectStream::HandOverSidechain(int from) {
     }
 }
 
-int EffectStream::PieceFrames(int left) {
-    while (m_nextPoint < m_points.size() && m_points[m_nextPoint] <= m_position) ++m_nextPoint;
-    const int most = std::min(left, m_maxFrames);
-    if (m_nextPoint == m_points.size()) return most;
-    return static_cast<int>(std::min<std::int64_t>(most, m_points[m_nextPoint] - m_position));
+// Not as envelopes: an effect plays those from the start after every move, and in the end does nothing else.
+void EffectStream::PlayDue() {
+    for (Lane& lane : m_lanes)
+        // Before its first point a parameter has that point's value.
+        for (;
+             lane.next < lane.points.size() && (lane.next == 0 || lane.points[lane.next].frame <= m_position);
+             ++lane.next)
+            effect->SetParam(lane.parameter, lane.points[lane.next].value, true);
+}
+
+// How much of a block can be processed before a point is due.
+int EffectStream::PieceFrames(int left) const {
+    std::int64_t frames = std::min(left, m_maxFrames);
+    for (const Lane& lane : m_lanes)
+        if (lane.next < lane.points.size())
+            frames = std::min(frames, lane.points[lane.next].frame - m_position);
+    return static_cast<int>(frames);
 }
 
 // process(first frame, frames) for every piece of the block.
 template <typename ProcessPiece>
 void EffectStream::Cut(int frames, ProcessPiece process) {
     for (int done = 0; done < frames;) {
+        PlayDue();
         const int piece = PieceFrames(frames - done);
         HandOverSidechain(done);
-        if (!m_points.empty()) effect->SetEnvelopeTime(m_position);
         process(done, piece);
         done += piece;
         m_position += piece;

@@ -5,6 +5,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <span>
 #include <vector>
 
 #include "C/Handles.h"
@@ -46,7 +47,7 @@ public:
 
     void Seek(std::int64_t position);
     // Replaces the automation of an external parameter.
-    void Automate(int parameter, const dsp_point* points, std::size_t count);
+    void Automate(int parameter, std::span<const dsp_point> points);
 
     int Busses() const { return std::max(effect->GetNumSidechainBusses(), 0); }
     void AnnounceSidechain(int bus, int channels);
@@ -65,20 +66,26 @@ public:
 private:
     using Pointers = std::array<const std::byte*, kMostChannels>;
 
+    // The automation of one parameter.
+    struct Lane {
+        int parameter;
+        std::vector<dsp_point> points;
+        std::size_t next;  // the first that was not played
+    };
+
     template <typename ProcessPiece>
     void Cut(int frames, ProcessPiece process);
-    int PieceFrames(int left);
+    void PlayDue();
+    int PieceFrames(int left) const;
     void HandOverSidechain(int from);
 
     tWAVEFORMATEX m_format{};
     int m_maxFrames = 0;  // 0 before the first preparation
     std::int64_t m_position = 0;
-    std::vector<std::vector<std::int64_t>> m_lanes;  // where each parameter has points
-    std::vector<std::int64_t> m_points;              // all of them, ascending
-    std::size_t m_nextPoint = 0;                     // the first behind the position
-    std::vector<int> m_announced;                    // channels by side-chain bus
-    std::vector<Pointers> m_sidechain;               // of the next block
-    std::vector<double> m_scratch;  // a planar piece, interleaved for an effect that takes no others
+    std::vector<Lane> m_lanes;
+    std::vector<int> m_announced;       // channels by side-chain bus
+    std::vector<Pointers> m_sidechain;  // of the next block
+    std::vector<double> m_scratch;      // a planar piece, interleaved for an effect that takes no others
 };
 
 }  // namespace Corvo::C

@@ -191,8 +191,9 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_value_to_text(dsp_effect* effect, int32
 DSP_C_API dsp_status DSP_CALL dsp_effect_text_to_value(dsp_effect* effect, int32_t parameter,
                                                        const char* text, float* value, dsp_error* error);
 
-/* From `frame` of the stream on the parameter has this value. Points are in ascending order and are met to
- * the frame; no points end the automation. DSP_UNSUPPORTED where the effect plays none. */
+/* From `frame` of the stream on the parameter has this value, before its first point that of the first.
+ * Points are in ascending order and are met to the frame; no points end the automation. DSP_UNSUPPORTED where
+ * the effect plays none. */
 typedef struct dsp_point {
     int64_t frame;
     float value;
@@ -286,7 +287,7 @@ typedef struct dsp_pitch_shift dsp_pitch_shift;
 enum { DSP_ENGINE_CLASSIC = 0, DSP_ENGINE_NEW = 1 };
 typedef struct dsp_shift {
     uint32_t size;
-    int32_t rate;     /* 1000 to 192000 Hz */
+    int32_t rate;     /* 1000 to 768000 Hz */
     int32_t channels; /* 1 or 2, interleaved */
     int32_t engine;
     int32_t quality; /* from 0, fastest first */

@@ -200,10 +200,6 @@ TEST(CInterface, ProcessesLikeTheClasses) {
         ASSERT_EQ(direct->GetName(), kind.name);
         direct->SetParam(0, 0.25f, false);
         const bool automates = direct->PlaysAutomation();
-        MP_ENVELOPE_SEGMENT jump{};
-        jump.rtStart = jump.rtEnd = kPoint;
-        jump.valStart = jump.valEnd = 0.75f;
-        if (automates) direct->AddEnvelope(0, 1, &jump);
         direct->InitProcessing(kMost, &wave);
         auto expected = noise;
         for (int at = 0; at < kFrames;) {
@@ -211,17 +207,17 @@ TEST(CInterface, ProcessesLikeTheClasses) {
             const int toBlock = at < 1000 ? 1000 - at : kFrames - at;
             const int count = std::min({kMost, toPoint, toBlock});
             Corvo::DSP::ProcessFlags flags;
-            if (automates) direct->SetEnvelopeTime(at);
+            if (automates && at == kPoint) direct->SetParam(0, 0.75f, true);
             direct->Process(&expected[2 * static_cast<std::size_t>(at)], count, &wave, flags);
             at += count;
         }
 
         for (const bool planar : {false, true}) {
             dsp_effect* effect = nullptr;
-            const dsp_point point{kPoint, 0.75f, 0.0f};
+            const dsp_point points[]{{0, 0.25f, 0.0f}, {kPoint, 0.75f, 0.0f}};
             ASSERT_EQ(dsp_effect_create(kind.name, &effect, nullptr), DSP_OK);
             ASSERT_EQ(dsp_effect_set(effect, 0, 0.25f), DSP_OK);
-            ASSERT_EQ(dsp_effect_automate(effect, 0, &point, 1), automates ? DSP_OK : DSP_UNSUPPORTED);
+            ASSERT_EQ(dsp_effect_automate(effect, 0, points, 2), automates ? DSP_OK : DSP_UNSUPPORTED);
             ASSERT_EQ(dsp_effect_prepare(effect, &format, nullptr), DSP_OK);
             auto got = noise;
             for (const auto& [at, count] : {std::pair{0, 1000}, std::pair{1000, kFrames - 1000}}) {

@@ -3,9 +3,11 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <memory>
 #include <optional>
 #include <stdexcept>
 
+#include "DSP/Effects/EffectKinds.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 
 namespace Corvo::DSP {
@@ -36,10 +38,24 @@ std::optional<double> NumberOf(std::string_view text) {
     return value;
 }
 
-std::string Shown(CorvoEffectBase& effect, int index, float normalised) {
-    const std::string text = Narrow(effect.GetParameterFormattedText(index, static_cast<double>(normalised)));
-    return std::string(Trimmed(text));
-}
+// An effect to try values on: some show what they have stored, and one parameter may change another's text.
+class Trial {
+public:
+    explicit Trial(CorvoEffectBase& effect) : m_effect(effect) {
+        if (const EffectKind* const kind = FindEffectKind(effect.GetName())) m_copy = kind->Copy(effect);
+    }
+    std::string TextAt(int index, float normalised) {
+        if (m_copy) m_copy->SetParam(index, normalised, false);
+        auto& shown = m_copy ? *m_copy : m_effect;
+        const std::string text =
+            Narrow(shown.GetParameterFormattedText(index, static_cast<double>(normalised)));
+        return std::string(Trimmed(text));
+    }
+
+private:
+    CorvoEffectBase& m_effect;
+    std::unique_ptr<CorvoEffectBase> m_copy;  // none for a class that is a host's own
+};
 
 // "4 x" and "4" name the same choice when the unit is "x".
 bool SameChoice(std::string_view shown, std::string_view text, std::string_view unit) {
@@ -94,10 +110,16 @@ std::vector<int> FindParameters(CorvoEffectBase& effect, std::string_view name) 
     return labelled.empty() ? named : labelled;
 }
 
+std::string ParameterTextAt(CorvoEffectBase& effect, int index, float normalised) {
+    return Trial(effect).TextAt(index, normalised);
+}
+
 std::string AcceptedTexts(CorvoEffectBase& effect, int index) {
     std::string all;
     for (const auto& choice : effect.Describe(index).choices) all += (all.empty() ? "" : ", ") + choice.text;
-    return all.empty() ? Shown(effect, index, 0.0f) + " to " + Shown(effect, index, 1.0f) : all;
+    if (!all.empty()) return all;
+    Trial trial(effect);
+    return trial.TextAt(index, 0.0f) + " to " + trial.TextAt(index, 1.0f);
 }
 
 ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text) {
@@ -109,9 +131,11 @@ ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_vie
     const std::size_t length = NumberLength(text);
     const bool onlyChoices =
         parameter.type == EffectParameterType::List || (!parameter.choices.empty() && length == 0);
-    const float value = text.empty() || onlyChoices ? -1.0f : Parsed(effect, index, text);
+    float value = text.empty() || onlyChoices ? -1.0f : Parsed(effect, index, text);
+    // Beyond the range parsers limit, or say by how much.
+    if (length > 0 && !onlyChoices && !std::isnan(value)) value = std::clamp(value, 0.0f, 1.0f);
     const bool understood = value >= 0.0f && value <= 1.0f;
-    const std::string shown = understood ? Shown(effect, index, value) : "";
+    const std::string shown = understood ? ParameterTextAt(effect, index, value) : "";
     if (!understood || !SaysTheSame(shown, text, unit))
         throw std::invalid_argument(parameter.label + " cannot be \"" + std::string(text) +
                                     "\"; accepted: " + AcceptedTexts(effect, index));

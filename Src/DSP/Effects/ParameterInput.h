@@ -7,8 +7,9 @@
 #include "DSP/Effects/Framework/CorvoEffectBase.h"
 #include "Platform/Export.h"
 
-// What a person writes about parameters: their names, and values as text. User-interface thread; texts are
-// UTF-8, and letters may be of either case.
+// What a person reads and writes about parameters: their names, and values as text. User-interface thread;
+// texts are UTF-8, and letters may be of either case. Values are tried on a copy of the effect, which takes
+// up to a few milliseconds.
 namespace Corvo::DSP {
 
 // The external parameters that `name` means: the one with that label, else all with that name, which are both
@@ -24,6 +25,8 @@ struct ParameterInput {
 // a number as the effect's own parser takes it, with or without its unit; beyond the range it is limited.
 // Throws std::invalid_argument, with a sentence that says what would be accepted, for anything else.
 DSP_API ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text);
+// What the parameter would show at a value, without blanks at the ends; the effect keeps the value it has.
+DSP_API std::string ParameterTextAt(CorvoEffectBase& effect, int index, float normalised);
 // What would be accepted: "On, Off" or "-60.0 dB to 12.0 dB".
 DSP_API std::string AcceptedTexts(CorvoEffectBase& effect, int index);
 

@@ -25,7 +25,7 @@ void Require(bool holds, const std::string& sentence) {
 const Settings& Checked(const Settings& settings) {
     const bool isNew = settings.engine == OfflinePitchShift::Engine::New;
     Require(isNew || settings.engine == OfflinePitchShift::Engine::Classic, "there is no such engine");
-    Require(settings.rate >= 1000 && settings.rate <= 192000, "the rate can be 1000 to 192000 Hz");
+    Require(settings.rate >= 1000 && settings.rate <= 768000, "the rate can be 1000 to 768000 Hz");
     Require(settings.channels == 1 || settings.channels == 2, "the pitch is shifted in mono and stereo");
     Require(std::abs(settings.semitones) <= 36.0, "the pitch can be shifted by -36 to 36 semitones");
     Require(settings.speed >= 0.1 && settings.speed <= 10.0, "the speed can be 0.1 to 10");

@@ -19,7 +19,7 @@ class DSP_API OfflinePitchShift {
 public:
     enum class Engine { Classic, New };  // as in PitchAdapterInfo::GetPitchAdapters()
     struct Settings {
-        int rate = 48000;        // Hz, 1000..192000
+        int rate = 48000;        // Hz, 1000..768000; above 192000 it counts as that
         int channels = 2;        // 1 or 2
         double semitones = 0.0;  // -36..36
         Engine engine = Engine::New;

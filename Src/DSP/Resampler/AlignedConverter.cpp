@@ -58,6 +58,10 @@ int Copy(const char* in, int samples, int channels, char* out, CDither<double>* 
     return samples / channels;
 }
 
+int DitherBits(const AlignedConverter::Settings& settings) {
+    return settings.ditherBits ? settings.ditherBits : 8 * BytesOf(settings.out);
+}
+
 void Check(const AlignedConverter::Settings& settings) {
     for (const int rate : {settings.inRate, settings.outRate})
         Require(rate >= kLowestRate && rate <= kHighestRate,
@@ -69,7 +73,8 @@ void Check(const AlignedConverter::Settings& settings) {
                 "there is no such sample format");
     Require(settings.dither >= DitherCurve::None && settings.dither <= DitherCurve::Strong,
             "there is no such dither");
-    Require(settings.dither == DitherCurve::None || settings.out <= StoredSample::Int24,
+    const int bits = DitherBits(settings);
+    Require(settings.dither == DitherCurve::None || bits == 16 || bits == 24,
             "dither is for samples of 16 and 24 bits");
 }
 
@@ -77,8 +82,7 @@ void Check(const AlignedConverter::Settings& settings) {
 
 AlignedConverter::AlignedConverter(const Settings& settings) : m_settings(settings) {
     Check(settings);
-    const int bits = BytesOf(settings.out) * 8;
-    std::ranges::fill(m_dither, MakeDither(settings.dither, bits));
+    std::ranges::fill(m_dither, MakeDither(settings.dither, DitherBits(settings)));
     if (settings.inRate == settings.outRate) return;
     const int common = std::gcd(settings.inRate, settings.outRate);
     const bool set = settings.exact ? m_core.InitConversionByFactors(settings.outRate / common,

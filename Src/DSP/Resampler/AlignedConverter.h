@@ -23,8 +23,10 @@ public:
         // Any ratio of whole numbers; else the nearest with factors up to 49, which is quicker where the
         // exact one is large, but may miss the rate by some cents: compare Up() / Down().
         bool exact = true;
-        // None, or for outputs of 16 and 24 bits.
+        // For `ditherBits`, 16 or 24, which may be fewer than the output has: for a host that shortens words
+        // itself. 0: as many as the output has.
         DitherCurve dither = DitherCurve::None;
+        int ditherBits = 0;
     };
 
     // Throws std::invalid_argument with a sentence for settings outside their ranges, and std::bad_alloc.
