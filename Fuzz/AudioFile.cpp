@@ -1,19 +1,20 @@
-// Any bytes as an audio file of the command-line host, and through a pipe.
+// Any bytes as an audio file of the command-line host, and as a stream that is read forwards only.
 #include "AudioReader.h"
 #include "Errors.h"
-#include "MemoryPath.h"
 #include "Target.h"
 
 namespace {
 
 using Fuzz::Input;
-using Fuzz::MemoryPath;
 
 const Fuzz::Target target("AudioFile", [](Input& input) {
-    const auto kind = input.Flag() ? MemoryPath::Kind::Pipe : MemoryPath::Kind::File;
-    const MemoryPath file(input.Rest(), kind);
+    const bool forwardsOnly = input.Flag();
+    const auto bytes = input.Rest();
+    auto file = dsphost::File::Temporary();
+    file.Write(bytes.data(), bytes.size());
+    file.Seek(0);
     try {
-        dsphost::AudioReader reader(file.Path());
+        dsphost::AudioReader reader(std::move(file), forwardsOnly);
         dsphost::RequireFormat(reader, 48, "48 are enough");
         constexpr int kBlock = 256;
         std::vector<double> block(static_cast<std::size_t>(kBlock * reader.Channels()));

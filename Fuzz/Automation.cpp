@@ -2,20 +2,19 @@
 #include "Automation.h"
 
 #include "Errors.h"
-#include "MemoryPath.h"
 #include "Target.h"
 
 namespace {
 
 using Fuzz::Input;
-using Fuzz::MemoryPath;
 
 const Fuzz::Target target("Automation", [](Input& input) {
     static const std::string kChain[]{"Tremolo", "Gain", "Echo", "Gain"};
-    const MemoryPath file(input.Rest(), MemoryPath::Kind::File);
+    const auto bytes = input.Rest();
+    const std::string text(bytes.begin(), bytes.end());
     dsphost::Chain chain(kChain);
     try {
-        dsphost::LoadAutomation(file.Path(), 48000, chain);
+        dsphost::ReadAutomation(text, "a file", 48000, chain);
     } catch (const dsphost::UserError& error) {
         Fuzz::Require(std::string_view(error.what()).size() < 2000, "a message is a line that one can read");
         return;

@@ -25,7 +25,8 @@ fuzz() {
     local report=$work/$target.log
     mkdir -p "$work/corpus/$target" "$work/failed/$target" "$work/seeds/$target"
     "$program" -max_total_time="$share" -timeout=20 -rss_limit_mb=3000 -max_len=8192 -print_final_stats=1 \
-        -artifact_prefix="$work/failed/$target/" "$work/corpus/$target" "$work/seeds/$target" &> "$report" || {
+        -artifact_prefix="$work/failed/$target/" "$work/corpus/$target" "$work/seeds/$target" 2>&1 |
+        grep -v '^dsphost: warning' > "$report" || {
         tail -n 60 "$report"
         echo "$target: FAILED; the input is in $work/failed/$target"
         return 1
@@ -33,6 +34,7 @@ fuzz() {
     sed -n "s/^Done \([0-9]*\) runs.*/$target: \1 runs/p" "$report"
 }
 export -f fuzz
+export SHELLOPTS  # failures inside pipes count there too
 export work share
 
 say "fuzzing, $share s for each of ${#fuzzers[@]} targets"
