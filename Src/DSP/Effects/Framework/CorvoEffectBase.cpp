@@ -11,6 +11,12 @@
 namespace Corvo::DSP {
 namespace {
 
+bool Guards(const EffectTable* table, const tWAVEFORMATEX& format) {
+    const auto guard = table ? table->inputGuard : InputGuard::FloatFormats;
+    const bool knownWidth = format.wBitsPerSample == 32 || format.wBitsPerSample == 64;
+    return guard == InputGuard::EveryFormat || (guard == InputGuard::FloatFormats && knownWidth);
+}
+
 // Interleaved or one channel of a planar block. Effects pass channels after the second unchanged.
 void GuardInput(double* buffer, int frames, int channels, int bits) {
     const int guarded = CorvoEffectBase::MaxNumChannels;
@@ -89,17 +95,11 @@ bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format)
     return true;
 }
 
-bool CorvoEffectBase::GuardsInput(const tWAVEFORMATEX& format) const {
-    const auto guard = m_table ? m_table->inputGuard : InputGuard::FloatFormats;
-    const bool knownWidth = format.wBitsPerSample == 32 || format.wBitsPerSample == 64;
-    return guard == InputGuard::EveryFormat || (guard == InputGuard::FloatFormats && knownWidth);
-}
-
 void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
     frames = m_tail->BeginBlock(frames);
-    if (GuardsInput(*format)) GuardInput(buffer, frames, format->nChannels, format->wBitsPerSample);
+    if (Guards(m_table, *format)) GuardInput(buffer, frames, format->nChannels, format->wBitsPerSample);
     ProcessInternal(buffer, frames, format, flags);
     m_tail->EndBlock();
 }
@@ -109,7 +109,7 @@ void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames,
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
     frames = m_tail->BeginBlock(frames);
-    if (GuardsInput(*format) && SupportsNoninterleaved())
+    if (Guards(m_table, *format) && SupportsNoninterleaved())
         for (int channel = 0; channel < std::min<int>(format->nChannels, MaxNumChannels); ++channel)
             GuardInput(channels[channel], frames, 1, format->wBitsPerSample);
     ProcessInternalNoninterleaved(channels, frames, format, flags);

@@ -312,7 +312,6 @@ protected:
 
 private:
     void Store(const std::vector<std::uint32_t>& settings);
-    bool GuardsInput(const tWAVEFORMATEX& format) const;
 
     const EffectTable* m_table = nullptr;
     void* m_words = nullptr;
