@@ -10,7 +10,6 @@
 
 #include "Errors.h"
 #include "Text.h"
-#include "WavHeader.h"
 
 namespace dsphost {
 namespace {
@@ -111,11 +110,7 @@ void AudioReader::OpenFile(File file) {
     m_file->Seek(0);
     const auto header = ReadWavStreamHeader(SourceOf(*m_file), start);
     m_file->Seek(0);
-    try {
-        m_sound = std::make_unique<SoundFile>(*m_file, SFM_READ, m_info);
-    } catch (const UserError&) {
-        throw UserError(NoAudio(m_name));
-    }
+    OpenSound(header);
     if (m_info.frames <= 0) throw UserError(m_name + ": is empty: it holds no samples");
     m_cutOff = m_info.frames == std::numeric_limits<sf_count_t>::max();  // as libsndfile says of Ogg
     if (!m_cutOff) m_frames = m_info.frames;
@@ -138,7 +133,17 @@ void AudioReader::OpenStream(File stream) {
     if (header->sampleBytes) m_frames = *header->sampleBytes / FrameBytes(*header);
     if (header->doubtfulBytes) m_doubtfulFrames = *header->doubtfulBytes / FrameBytes(*header);
     m_file = std::make_unique<File>(std::move(stream));
-    m_sound = std::make_unique<SoundFile>(*m_file, SFM_READ, m_info);
+    OpenSound(header);
+}
+
+void AudioReader::OpenSound(const std::optional<WavStreamHeader>& header) {
+    try {
+        m_sound = std::make_unique<SoundFile>(*m_file, SFM_READ, m_info);
+    } catch (const UserError&) {
+        if (!header) throw UserError(NoAudio(m_name));
+        throw UserError(m_name + ": cannot be read: it has " + std::to_string(header->channels) +
+                        " channels and a sample rate of " + std::to_string(header->rate) + " Hz");
+    }
 }
 
 int AudioReader::Read(double* samples, int frames) {

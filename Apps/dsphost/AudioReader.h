@@ -9,6 +9,7 @@
 #include "File.h"
 #include "SampleFormat.h"
 #include "SoundFile.h"
+#include "WavHeader.h"
 
 namespace dsphost {
 
@@ -43,6 +44,7 @@ public:
 private:
     void OpenStream(File stream);
     void OpenFile(File file);
+    void OpenSound(const std::optional<WavStreamHeader>& header);
     int ReadSome(double* samples, int frames);
     void CountNotFinite(std::span<const double> samples);
     void End();

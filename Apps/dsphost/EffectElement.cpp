@@ -41,13 +41,6 @@ std::vector<Setting> SplitSettings(std::string_view text, const std::string& eff
     return settings;
 }
 
-MP_ENVELOPE_SEGMENT Jump(const AutomationPoint& point) {
-    MP_ENVELOPE_SEGMENT segment{};
-    segment.rtStart = segment.rtEnd = point.frame;
-    segment.valStart = segment.valEnd = point.value;
-    return segment;
-}
-
 // Copies between one interleaved block and its channels one behind the other.
 template <typename Sample>
 void Deinterleave(const Sample* from, Sample* to, int channels, int frames) {
@@ -128,7 +121,7 @@ int EffectElement::Latency() { return std::max(m_effect->GetLatency(), 0); }
 
 void EffectElement::Process(double* samples, int frames, std::int64_t time) {
     ProcessFlags flags;
-    if (m_automated) m_effect->SetEnvelopeTime(time);
+    PlayDue(time);
     if (!m_planar)
         m_effect->Process(samples, frames, &m_format, flags);
     else if (m_format.wBitsPerSample == 64)
@@ -148,10 +141,16 @@ std::vector<int> EffectElement::AutomationLanes(std::string_view parameter) {
 }
 
 void EffectElement::Automate(int lane, std::span<const AutomationPoint> points) {
-    std::vector<MP_ENVELOPE_SEGMENT> segments;
-    for (const auto& point : points) segments.push_back(Jump(point));
-    m_effect->AddEnvelope(lane, static_cast<int>(segments.size()), segments.data());
-    m_automated = true;
+    m_lanes.push_back({lane, {points.begin(), points.end()}});
+}
+
+// Not as envelopes: an effect plays those from the start after every move, and in the end does nothing else.
+void EffectElement::PlayDue(std::int64_t time) {
+    for (auto& lane : m_lanes)
+        // Before its first point a parameter has that point's value.
+        for (auto& next = lane.next;
+             next < lane.points.size() && (next == 0 || lane.points[next].frame <= time); ++next)
+            m_effect->SetParam(lane.index, lane.points[next].value, true);
 }
 
 std::vector<std::uint8_t> EffectElement::State() {

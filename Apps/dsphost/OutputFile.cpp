@@ -24,7 +24,8 @@ namespace fs = std::filesystem;
 // Where the bytes end up: links lead to the file behind them, so that it is replaced and not the link.
 fs::path Target(const std::string& path) {
     std::error_code error;
-    const auto resolved = fs::weakly_canonical(PathOf(path), error);
+    // What does not exist stays relative otherwise.
+    const auto resolved = fs::weakly_canonical(fs::absolute(PathOf(path)), error);
     return error ? PathOf(path) : resolved;
 }
 
@@ -212,6 +213,7 @@ void CommitTogether(std::span<OutputFile* const> files) {
 void RefuseSameOutputs(const std::vector<std::string>& paths) {
     for (auto a = paths.begin(); a != paths.end(); ++a)
         for (auto b = paths.begin(); b != a; ++b) {
+            if (a->empty() || b->empty()) continue;
             if (*a == "-" && *b == "-") throw UserError("only one output can go to standard output");
             std::error_code error;
             const bool device = *a != "-" && fs::is_character_file(PathOf(*a), error);
