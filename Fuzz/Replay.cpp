@@ -43,7 +43,7 @@ int Replay(const fs::path& folder) {
     return files;
 }
 
-// Of this process, in MiB.
+// Of this process, in MiB; 0 where the system does not say so.
 double ResidentMemory() {
     std::ifstream status("/proc/self/statm");
     double total = 0.0, resident = 0.0;
