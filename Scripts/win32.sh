@@ -27,7 +27,7 @@ say "building (win32)"
 fresh=()
 if [ -f build/win32/CMakeCache.txt ] && ! grep -qF "$prefix/" build/win32/CMakeCache.txt; then fresh=(--fresh); fi
 cmake --preset win32 "${fresh[@]}" > /dev/null
-cmake --build --preset win32 --target DSPDll dsp_tests record_effects dsphost
+cmake --build --preset win32 --target DSPDll dsp_tests record_effects dsphost fuzz_replay
 root_ready
 
 # Every part runs even when one before it failed, so that one run tells all.
@@ -57,6 +57,13 @@ compare_builds() {
     build/release/bin/record_effects build/release/native.takes build/win32/bin/win32.takes
 }
 
+# The fuzzers do not build for this target; what they found is replayed, and their sessions run on random input.
+replay_failed() {
+    cp -r Fuzz/Failed build/win32/bin/
+    Scripts/win32-wine.sh build/win32/bin/fuzz_replay.exe Failed
+    Scripts/win32-wine.sh build/win32/bin/fuzz_replay.exe --soak 15 "$RANDOM" soak
+}
+
 # From the unpacked zip alone the host renders a file to the same bytes as the native one.
 try_package() {
     local unpacked=build/win32/package/unpacked programs
@@ -78,8 +85,10 @@ try_package() {
 }
 
 part "tests under Wine" test_program dsp_tests
+part "hardening" Tests/Package/hardening.sh build/win32/bin/{DSPDll.dll,dsphost.exe}
 part "exported names" Tests/Exports/exports.sh check build/win32/bin/DSPDll.dll
 part "the native build and this one" compare_builds
+part "inputs that failed once" replay_failed
 part "package" try_package
 
 [ ${#failed[@]} = 0 ] || {

@@ -144,7 +144,7 @@ Subject Analyser() {
 void ExpectToCountAsZero(const std::function<Subject()>& make, const std::string& name) {
     constexpr int kBlocks = 40, kBad = 12;
     for (const double poison : {kNaN, kInfinity, -kInfinity})
-        for (const std::size_t count : {1, 2 * kFrames}) {
+        for (const std::size_t count : {std::size_t{1}, std::size_t{2 * kFrames}}) {
             SCOPED_TRACE(name + ", " + std::to_string(count) + " times " + std::to_string(poison));
             const Subject poisoned = make(), clean = make();
             for (int i = 0; i < kBlocks; ++i) {
@@ -168,7 +168,7 @@ using EveryMemory = EveryEffect;
 INSTANTIATE_TEST_SUITE_P(All, EveryMemory, testing::ValuesIn(AllEffects()), EffectTestName);
 
 TEST_P(EveryMemory, TakesWhatIsNotFiniteForZero) {
-    for (const std::uint64_t seed : {0, 1, 2}) {
+    for (const std::uint64_t seed : {0u, 1u, 2u}) {
         const auto made = [seed] {
             std::shared_ptr<CorvoEffectBase> effect = Make();
             Random random(seed);

@@ -120,7 +120,8 @@ std::string Shortened(std::string_view text, std::size_t most) {
 std::string_view Trimmed(std::string_view text) {
     constexpr std::string_view kBlanks = " \t\r\n\f\v";
     const auto first = text.find_first_not_of(kBlanks);
-    if (first == text.npos) return {};
+    if (first == text.npos)
+        return text.substr(text.size());  // within the text, for whoever goes on from there
     return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 

@@ -50,7 +50,8 @@ bool RunEchoSide(const EchoPrivate::Side& side, Sample* samples, std::ptrdiff_t 
         const double delayed = ring[i], in = *samples, back = delayed * s.feedback;
         ring[i] = static_cast<float>(back + in);
         *samples = static_cast<Sample>(((delayed * s.echo + back) * s.wet + in * s.dry) * s.output);
-        finite &= std::isfinite(ring[i]) & std::isfinite(*samples);
+        finite &= std::isfinite(ring[i]);
+        finite &= std::isfinite(*samples);
     }
     return !finite;
 }
