@@ -5,6 +5,7 @@
 
 #include "DSP/Effects/Chorus/Chorus.h"
 #include "DSP/Effects/Compressor/Compressor.h"
+#include "DSP/Effects/Denoiser/DenoiserProcessor.h"
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
@@ -35,6 +36,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::PitchShift>,
     Make<Corvo::DSP::Compressor>,
     Make<Corvo::DSP::Reverb>,
+    Make<Corvo::DSP::DenoiserProcessor>,
 };
 // clang-format on
 
