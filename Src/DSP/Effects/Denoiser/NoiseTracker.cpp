@@ -12,7 +12,7 @@ constexpr double kPerDb = 0.23025850929940457;  // natural logarithm of a power
 constexpr double kCreepDbPerSecond = 0.1;
 constexpr float kFollowRange = static_cast<float>(15.0 * kPerDb), kSteepestSlope = 3.0f;
 constexpr float kTrustRange = 0.08f;
-constexpr int kFirstRounds = 4;
+constexpr float kMostWhite = 1e30f;  // what the sum over a band leaves finite
 
 // The quiet half of so many bins of white noise, measured over ten frames.
 struct White {
@@ -64,6 +64,15 @@ void TrackerTables::Prepare(const WindowTables& track) {
         band.whiteFlatness = white.flatness;
         bands.push_back(band);
     }
+    const auto work = [](const TrackerBand& band) { return band.end - band.first + 40; };
+    std::size_t total = 0, done = 0, group = 1;
+    for (const auto& band : bands) total += work(band);
+    groups = {};
+    for (std::size_t i = 0; i < bands.size(); ++i) {
+        done += work(bands[i]);
+        if (group < kGroups && done * kGroups >= total * group) groups[group++] = i + 1;
+    }
+    groups[kGroups] = bands.size();
     logBin.resize(bins);
     bandBelow.resize(bins);
     bandShare.resize(bins);
@@ -91,20 +100,18 @@ void NoiseTracker::Prepare(Arena& arena, WindowTables& track, const TrackerTable
     m_noise.Take(arena, kKept, values);
     for (std::size_t i = 0; i < m_sizes.size(); ++i)
         if (m_sizes[i]) m_converted[i].Take(arena, kKept, m_sizes[i]->Bins() + 16);
-    for (auto* each : {&m_re, &m_im, &m_meanPower, &m_meanLog, &m_logShape, &m_shape, &m_white, &m_logProfile,
-                       &m_order, &m_level})
+    for (auto* each : {&m_re, &m_im, &m_meanPower, &m_meanLog, &m_logShape, &m_white, &m_logWhite,
+                       &m_logProfile, &m_order, &m_level})
         *each = arena.Take(values);
     m_hum.Prepare(arena, track.Bins(), values);
     for (auto* each : {&m_levels, &m_smooth, &m_candidates, &m_flatness, &m_follow})
         each->resize(tables.bands.size());
     m_done = -1;
-    m_begun = false;
     m_frames = 0;
 }
 
 void NoiseTracker::Start(const float* profile) {
     m_profile = profile;
-    m_begun = false;
     m_frames = 0;
     std::ranges::fill(m_follow, 1.0f);
     if (!profile) return;
@@ -127,28 +134,22 @@ void NoiseTracker::Start(const float* profile) {
 void NoiseTracker::SetMaterial(bool music) { m_hum.SetMaterial(music, m_hopSeconds); }
 
 float NoiseTracker::Cost(int step) const {
+    constexpr float kNanoseconds[kFixedSteps]{2.8f, 2.0f, 1.5f, 1.0f, 1.0f, 1.0f, 1.0f, 1.2f, 1.5f};
     const auto bins = static_cast<float>(m_track->Bins());
-    if (step == kAnalyse) return 6.0f * bins;
-    if (step == kGather) return 2.0f * bins;
-    if (step == kShape) return 2.0f * bins;
-    if (step < kLevels) return 4.0f * bins;
-    if (step == kLevels) return 2.0f * bins;
-    if (step == kLines) return 2.0f * bins;
-    return m_sizes[static_cast<std::size_t>(step - kFixedSteps)] ? 2.0f * bins : 0.0f;
+    if (step < kFixedSteps) return kNanoseconds[step] * bins;
+    const auto* const size = m_sizes[static_cast<std::size_t>(step - kFixedSteps)];
+    return size ? 0.5f * bins + 0.7f * static_cast<float>(size->Bins()) : 0.0f;
 }
 
 void NoiseTracker::Run(int step, std::int64_t frame, const SampleRing& input) {
     if (step == kAnalyse) return Analyse(frame, input);
     if (step == kGather) return Gather(frame);
     if (m_frames == 0 && step != kLines) return;
-    const std::size_t bands = m_tables->bands.size(), groups = kLevels - kFirstBands;
     if (step == kShape) {
-        if (m_profile && !m_begun) Begin();
-        if (!m_profile && m_frames <= kMemory) Begin();
+        if (m_frames == 1) Begin();
         Shape();
     } else if (step < kLevels) {
-        const auto group = static_cast<std::size_t>(step - kFirstBands);
-        Compare(bands * group / groups, bands * (group + 1) / groups);
+        Compare(static_cast<std::size_t>(step - kFirstBands));
     } else if (step == kLevels) {
         Update();
         float* const noise = m_noise[frame];
@@ -222,31 +223,17 @@ void NoiseTracker::Gather(std::int64_t frame) {
     }
 }
 
-// The first levels: those of the profile, or a first guess that a few rounds make better.
+// The first levels: those of the profile, or a guess that the first frames make better.
 void NoiseTracker::Begin() {
-    m_begun = true;
-    const std::size_t bands = m_tables->bands.size();
-    if (m_profile) {
-        std::ranges::fill(m_levels, 0.0f);
-        std::ranges::fill(m_smooth, 0.0f);
-        return;
-    }
-    for (std::size_t i = 0; i < bands; ++i) {
+    std::ranges::fill(m_levels, 0.0f);
+    std::ranges::fill(m_smooth, 0.0f);
+    if (m_profile) return;
+    for (std::size_t i = 0; i < m_levels.size(); ++i) {
         const auto& band = m_tables->bands[i];
-        std::copy(m_meanPower + band.first, m_meanPower + band.end, m_order);
-        const auto bins = static_cast<std::ptrdiff_t>(band.end - band.first),
-                   half = std::max<std::ptrdiff_t>(bins / 2, 1);
-        std::nth_element(m_order, m_order + half - 1, m_order + bins);
-        double sum = 0.0;
-        for (std::ptrdiff_t k = 0; k < half; ++k) sum += m_order[k];
-        m_levels[i] = Logarithm(sum / static_cast<double>(half) / 0.65);
-    }
-    for (int round = 0; round < kFirstRounds; ++round) {
-        m_begun = false;  // the shape is taken as it is
-        Shape();
-        m_begun = true;
-        Compare(0, bands);
-        m_levels = m_candidates;
+        const std::size_t bins = band.end - band.first;
+        std::copy_n(m_meanPower + band.first, bins, m_order);
+        const auto quiet = m_kernels->quiet(m_order, m_meanLog + band.first, bins, band.quiet);
+        m_levels[i] = Logarithm(static_cast<double>(quiet.sum / quiet.count));
     }
 }
 
@@ -254,7 +241,7 @@ void NoiseTracker::Begin() {
 // end.
 void NoiseTracker::Shape() {
     const std::size_t bands = m_levels.size(), bins = m_track->Bins();
-    const auto keep = m_begun ? static_cast<float>(std::exp(-m_hopSeconds / kShapeSeconds)) : 0.0f;
+    const auto keep = Settling() ? 0.0f : static_cast<float>(std::exp(-m_hopSeconds / kShapeSeconds));
     for (std::size_t i = 0; i < bands; ++i) {
         float sum = 0.0f;
         for (const int offset : {-2, -1, 0, 1, 2}) {
@@ -270,34 +257,34 @@ void NoiseTracker::Shape() {
     else
         for (std::size_t i = 0; i < bins; ++i) m_order[i] = -m_logShape[i];
     m_kernels->exponential(m_order, m_white, m_track->Values());
-    for (std::size_t i = 0; i < bins; ++i) m_white[i] *= m_meanPower[i];
+    for (std::size_t i = 0; i < bins; ++i) {
+        m_white[i] = std::min(m_white[i] * m_meanPower[i], kMostWhite);
+        m_logWhite[i] = m_meanLog[i] + m_order[i];
+    }
 }
 
-// Level and flatness of the quiet half of the bands from `first` on.
-void NoiseTracker::Compare(std::size_t first, std::size_t end) {
+// Level and flatness of the quiet half of a quarter of the bands.
+void NoiseTracker::Compare(std::size_t group) {
     const float few = kFewFrames[static_cast<std::size_t>(std::min(m_frames, kMemory)) - 1];
-    for (std::size_t i = first; i < end; ++i) {
+    const auto& groups = m_tables->groups;
+    for (std::size_t i = groups[group]; i < groups[group + 1]; ++i) {
         const auto& band = m_tables->bands[i];
-        std::copy(m_white + band.first, m_white + band.end, m_order);
-        float* const last = m_order + band.quiet - 1;
-        std::nth_element(m_order, last, m_order + (band.end - band.first));
-        const float most = *last;
-        float sum = 0.0f, logSum = 0.0f, count = 0.0f;
-        for (std::size_t bin = band.first; bin < band.end; ++bin) {
-            const float quiet = m_white[bin] <= most ? 1.0f : 0.0f;
-            sum += quiet * m_white[bin];
-            logSum += quiet * (m_meanLog[bin] - m_logShape[bin] - (m_profile ? m_logProfile[bin] : 0.0f));
-            count += quiet;
-        }
-        const float mean = Logarithm(static_cast<double>(sum / count));
+        const std::size_t bins = band.end - band.first;
+        std::copy_n(m_white + band.first, bins, m_order);
+        const auto quiet = m_kernels->quiet(m_order, m_logWhite + band.first, bins, band.quiet);
+        const float mean = Logarithm(static_cast<double>(quiet.sum / quiet.count));
         const float reference =
             m_logShape[band.below] + (m_logShape[band.below + 1] - m_logShape[band.below]) * band.share;
         m_candidates[i] = mean - Logarithm(static_cast<double>(band.whiteLevel * few)) + reference;
-        m_flatness[i] = logSum / count - mean - band.whiteFlatness;
+        m_flatness[i] = quiet.logSum / quiet.count - mean - band.whiteFlatness;
     }
 }
 
 void NoiseTracker::Update() {
+    if (Settling()) {
+        m_levels = m_candidates;
+        return;
+    }
     const auto up = static_cast<float>(1.0 - std::exp(-m_hopSeconds / kUpSeconds)),
                down = static_cast<float>(1.0 - std::exp(-m_hopSeconds / kDownSeconds)),
                creep = static_cast<float>(kCreepDbPerSecond * kPerDb * m_hopSeconds);

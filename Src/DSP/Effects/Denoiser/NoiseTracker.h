@@ -28,9 +28,11 @@ struct TrackerTables {
     void Prepare(const WindowTables& track);
 
     std::vector<TrackerBand> bands;
-    std::vector<std::uint16_t> bandBelow;  // per bin: the band whose centre is at or below it
-    Floats bandShare;                      // of the next band
-    std::size_t belowFirst = 0;            // bins below the first band's centre
+    static constexpr std::size_t kGroups = 4;
+    std::array<std::size_t, kGroups + 1> groups{};  // of bands with about the same work; where they begin
+    std::vector<std::uint16_t> bandBelow;           // per bin: the band whose centre is at or below it
+    Floats bandShare;                               // of the next band
+    std::size_t belowFirst = 0;                     // bins below the first band's centre
     Floats logBin;
 };
 
@@ -77,9 +79,10 @@ private:
     void Analyse(std::int64_t frame, const SampleRing& input);
     void Gather(std::int64_t frame);
     void Shape();
-    void Compare(std::size_t first, std::size_t end);
+    void Compare(std::size_t group);
     void Update();
     void Begin();
+    bool Settling() const { return !m_profile && m_frames <= kMemory; }
     void LevelsToBins(const std::vector<float>& levels, float* logarithms) const;
 
     const SpectrumKernels* m_kernels = nullptr;
@@ -89,7 +92,7 @@ private:
     double m_hopSeconds = 0.0;
     HumFinder m_hum;
     const float* m_profile = nullptr;
-    bool m_begun = false, m_wantsReference = false;
+    bool m_wantsReference = false;
     std::int64_t m_started = 0, m_frames = 0;  // frames gathered since Start
     std::int64_t m_done = -1;
     float m_logReference = 0.0f;
@@ -97,7 +100,8 @@ private:
     FrameRing m_power, m_logPower, m_noise;
     std::array<FrameRing, 4> m_converted;
     float *m_re = nullptr, *m_im = nullptr, *m_meanPower = nullptr, *m_meanLog = nullptr;
-    float *m_logShape = nullptr, *m_shape = nullptr, *m_white = nullptr, *m_logProfile = nullptr;
+    float *m_logShape = nullptr, *m_shape = nullptr, *m_white = nullptr, *m_logWhite = nullptr,
+          *m_logProfile = nullptr;
     float *m_order = nullptr, *m_level = nullptr;
     std::vector<float> m_levels, m_smooth, m_candidates, m_flatness, m_follow;
 };

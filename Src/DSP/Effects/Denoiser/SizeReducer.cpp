@@ -9,14 +9,15 @@ namespace {
 
 constexpr float kPrior = 0.2f, kPriorLow = 0.0001f, kPriorHigh = 0.8f;
 constexpr int kSupportBefore = 3;       // frames, of the presences that make the prior
+constexpr int kSmoothHalf = 7;          // bins to either side
 constexpr float kMostWhitening = 4.6f;  // natural logarithm of a power
 
-const std::array<float, 8>& BinWeights() {
-    static const std::array<float, 8> weights = [] {
-        std::array<float, 15> all;
+const std::array<float, kSmoothHalf + 1>& BinWeights() {
+    static const std::array<float, kSmoothHalf + 1> weights = [] {
+        std::array<float, 2 * kSmoothHalf + 1> all;
         HannWeights(all);
-        std::array<float, 8> half;
-        std::copy_n(all.begin() + 7, half.size(), half.begin());
+        std::array<float, kSmoothHalf + 1> half;
+        std::copy_n(all.begin() + kSmoothHalf, half.size(), half.begin());
         return half;
     }();
     return weights;
@@ -73,17 +74,17 @@ float SizeReducer::Cost(int step) const {
     switch (stage) {
         case Stage::Analyse:
         case Stage::Synthesise:
-            return 2.2f * static_cast<float>(m_tables->length);
+            return 1.6f * static_cast<float>(m_tables->length);
         case Stage::Ratio:
-            return bins(3.0f);
+            return bins(1.4f + 0.5f * static_cast<float>(m_channels));
         case Stage::Presence:
-            return bins(1.5f);
+            return bins(0.9f);
         case Stage::Gain:
-            return bins(5.0f);
+            return bins(2.6f);
         case Stage::Mask:
             return 0.0f;
         case Stage::Risk:
-            return bins(1.0f);
+            return bins(0.5f);
     }
     return 0.0f;
 }
@@ -174,8 +175,8 @@ void SizeReducer::Whiten(std::size_t from, std::size_t to, float reference) {
 // prior of an earlier frame, whose presences are the result.
 void SizeReducer::Support(std::size_t pass, std::size_t piece, std::int64_t newest, float* presence) {
     if (newest < 0) return;
-    m_kernels->smoothBins(Padded(m_raw[pass]), m_support[pass][newest], BinWeights().data(), From(piece),
-                          To(piece));
+    m_kernels->smoothBins(Padded(m_raw[pass]), m_support[pass][newest], BinWeights().data(), kSmoothHalf,
+                          From(piece), To(piece));
     const std::int64_t frame = newest - SupportAhead();
     if (frame < 0) return;
     std::array<const float*, 7> frames;

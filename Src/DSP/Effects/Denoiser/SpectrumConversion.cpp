@@ -40,28 +40,32 @@ void SpectrumConversion::Prepare(const WindowTables& from, const WindowTables& t
     const std::size_t half = kResponseBins * m_ratio;
     // By Parseval: the sum over all bins is length * sum(window^2).
     const double total = 0.5 * static_cast<double>(to.length) * from.length;
-    m_response.resize(2 * half + 1);
+    m_response.resize(half + 1);
     for (std::size_t i = 0; i <= half; ++i)
-        m_response[half - i] = m_response[half + i] =
-            static_cast<float>((re[i] * re[i] + im[i] * im[i]) / total);
-    m_mirrored.resize(m_fromBins + 2 * half);
+        m_response[i] = m_scale * static_cast<float>((re[i] * re[i] + im[i] * im[i]) / total);
+    m_mirrored.resize(from.Values() + 2 * half);
+    m_seen.resize(from.Values());
 }
 
 void SpectrumConversion::Run(const float* from, float* to) {
     if (!m_shorter) {
-        Resample(from, m_fromBins, 1.0 / static_cast<double>(m_ratio), to, m_toBins);
-        for (std::size_t i = 0; i < m_toBins; ++i) to[i] *= m_scale;
+        for (std::size_t i = 0; i + 1 < m_fromBins; ++i) {
+            const float step = m_scale * (from[i + 1] - from[i]) / static_cast<float>(m_ratio);
+            for (std::size_t j = 0; j < m_ratio; ++j)
+                to[i * m_ratio + j] = m_scale * from[i] + step * static_cast<float>(j);
+        }
+        to[m_toBins - 1] = m_scale * from[m_fromBins - 1];
         return;
     }
-    const std::size_t half = m_response.size() / 2;
+    const std::size_t half = m_response.size() - 1;
     std::copy_n(from, m_fromBins, m_mirrored.data() + half);
     for (std::size_t i = 1; i <= half; ++i) {
         m_mirrored[half - i] = from[i];
         m_mirrored[half + m_fromBins - 1 + i] = from[m_fromBins - 1 - i];
     }
-    const auto& kernels = BestSpectrumKernels();
-    for (std::size_t i = 0; i < m_toBins; ++i)
-        to[i] = m_scale * kernels.dot(m_mirrored.data() + i * m_ratio, m_response.data(), m_response.size());
+    BestSpectrumKernels().smoothBins(m_mirrored.data() + half, m_seen.data(), m_response.data(),
+                                     static_cast<int>(half), 0, m_seen.size());
+    for (std::size_t i = 0; i < m_toBins; ++i) to[i] = m_seen[i * m_ratio];
 }
 
 }  // namespace Corvo::DSP::Denoising

@@ -22,8 +22,8 @@ private:
     std::size_t m_fromBins = 0, m_toBins = 0, m_ratio = 1;
     bool m_shorter = false;
     float m_scale = 1.0f;  // of the windows' energies
-    Floats m_response;     // m_ratio bins apart are one bin of the shorter window
-    Floats m_mirrored;
+    Floats m_response;  // of the shorter window, from the middle on; m_ratio bins apart are one of its bins
+    Floats m_mirrored, m_seen;
 };
 
 // `count` values at places step * i of `from`, linear between them; beyond the end its last value.

@@ -38,8 +38,10 @@ struct SpectrumKernels {
         float *evidence, *unlikely, *presence;
     };
     void (*evidence)(const Evidence& job, std::size_t from, std::size_t to);
-    // Over 15 bins; weights[0] is the middle one's. `in` can be read 8 bins beyond the range.
-    void (*smoothBins)(const float* in, float* out, const float* weights, std::size_t from, std::size_t to);
+    // The weighted sum over the bins up to `half` to either side; weights[0] is the middle one's. `in` can be
+    // read that far beyond the range.
+    void (*smoothBins)(const float* in, float* out, const float* weights, int half, std::size_t from,
+                       std::size_t to);
     // presence with a prior per bin, low + span * (the weighted mean of the smoothed presences).
     struct Presence {
         Frames smoothed;
@@ -61,6 +63,13 @@ struct SpectrumKernels {
     void (*risk)(const float* ratio, const float* gain, float* risk, std::size_t from, std::size_t to);
     // The sum of the products, in eight running sums whatever the registers' width.
     float (*dot)(const float* a, const float* b, std::size_t count);
+    // Of `count` positive values, those up to the rank-th smallest (from 1): how many there are (more than
+    // `rank` when several are equal), their sum, and the sum of the `logs` at their places. The values are
+    // followed by room for 7 more, which are overwritten. Takes as long whatever the values are.
+    struct Quiet {
+        float count, sum, logSum;
+    };
+    Quiet (*quiet)(float* values, const float* logs, std::size_t count, std::size_t rank);
     void (*logarithm)(const float* in, float* out, std::size_t count);
     void (*exponential)(const float* in, float* out, std::size_t count);
 };

@@ -1,5 +1,9 @@
 #pragma once
 
+#include <algorithm>
+#include <bit>
+#include <cstdint>
+#include <limits>
 #include <xsimd/xsimd.hpp>
 
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
@@ -78,12 +82,12 @@ struct KernelsFor {
         }
     }
 
-    static void SmoothBins(const float* in, float* out, const float* weights, std::size_t from,
+    static void SmoothBins(const float* in, float* out, const float* weights, int half, std::size_t from,
                            std::size_t to) {
         for (std::size_t i = from; i < to; i += kWidth) {
             const float* const x = in + i;
             V sum = Load(x) * V(weights[0]);
-            for (int j = 1; j < 8; ++j) sum += (Load(x - j) + Load(x + j)) * V(weights[j]);
+            for (int j = 1; j <= half; ++j) sum += (Load(x - j) + Load(x + j)) * V(weights[j]);
             sum.store_unaligned(out + i);
         }
     }
@@ -132,12 +136,54 @@ struct KernelsFor {
         for (; i + 8 <= count; i += 8)
             for (std::size_t j = 0; j < kSums; ++j)
                 sums[j] += Load(a + i + j * kWidth) * Load(b + i + j * kWidth);
-        float each[8];
-        for (std::size_t j = 0; j < kSums; ++j) sums[j].store_unaligned(each + j * kWidth);
-        float sum = 0.0f;
-        for (const float part : each) sum += part;
+        float sum = Total(sums);
         for (; i < count; ++i) sum += a[i] * b[i];
         return sum;
+    }
+
+    static float Total(const V (&sums)[kSums]) {
+        float each[8], total = 0.0f;
+        for (std::size_t j = 0; j < kSums; ++j) sums[j].store_unaligned(each + j * kWidth);
+        for (const float part : each) total += part;
+        return total;
+    }
+
+    static float CountUpTo(const float* values, std::size_t count, float most) {
+        V sums[kSums];
+        for (auto& sum : sums) sum = V(0.0f);
+        for (std::size_t i = 0; i < count; i += 8)
+            for (std::size_t j = 0; j < kSums; ++j)
+                sums[j] += xsimd::select(Load(values + i + j * kWidth) <= V(most), V(1.0f), V(0.0f));
+        return Total(sums);
+    }
+
+    static SpectrumKernels::Quiet Quiet(float* values, const float* logs, std::size_t count,
+                                        std::size_t rank) {
+        std::fill_n(values + count, 7, std::numeric_limits<float>::max());
+        const auto wanted = static_cast<float>(rank);
+        // Positive floats are in the order of their bits, which are found one by one from the top, until just
+        // as many values as wanted lie below.
+        std::uint32_t bits = 0;
+        for (std::uint32_t bit = 1u << 30; bit != 0; bit >>= 1) {
+            const std::uint32_t tried = bits + bit - 1;
+            const float found = CountUpTo(values, count, std::bit_cast<float>(tried));
+            if (found < wanted) bits += bit;
+            if (found != wanted) continue;
+            bits = tried;
+            break;
+        }
+        const V most(std::bit_cast<float>(bits));
+        V counts[kSums], sums[kSums], logSums[kSums];
+        for (std::size_t j = 0; j < kSums; ++j) counts[j] = sums[j] = logSums[j] = V(0.0f);
+        for (std::size_t i = 0; i < count; i += 8)
+            for (std::size_t j = 0; j < kSums; ++j) {
+                const V value = Load(values + i + j * kWidth);
+                const auto quiet = value <= most;
+                counts[j] += xsimd::select(quiet, V(1.0f), V(0.0f));
+                sums[j] += xsimd::select(quiet, value, V(0.0f));
+                logSums[j] += xsimd::select(quiet, Load(logs + i + j * kWidth), V(0.0f));
+            }
+        return {Total(counts), Total(sums), Total(logSums)};
     }
 
     static void Logarithm(const float* in, float* out, std::size_t count) {
@@ -147,9 +193,9 @@ struct KernelsFor {
         for (std::size_t i = 0; i < count; i += kWidth) xsimd::exp(Load(in + i)).store_unaligned(out + i);
     }
 
-    static constexpr SpectrumKernels kTable{Multiply, MultiplyAdd, Power,     ApplyGain,     Ratio,
-                                            Evidence, SmoothBins,  Presence,  FirstEstimate, Gain,
-                                            Risk,     Dot,         Logarithm, Exponential};
+    static constexpr SpectrumKernels kTable{Multiply, MultiplyAdd, Power,    ApplyGain,     Ratio,
+                                            Evidence, SmoothBins,  Presence, FirstEstimate, Gain,
+                                            Risk,     Dot,         Quiet,    Logarithm,     Exponential};
 };
 
 }  // namespace
