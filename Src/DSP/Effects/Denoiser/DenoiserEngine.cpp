@@ -8,6 +8,7 @@ namespace {
 
 constexpr float kPerDb = 0.23025851f;  // natural logarithm of a power
 constexpr int kGlide = 512;
+constexpr int kTrackerSettles = 8192;
 constexpr double kLowestBandHz = 62.5;
 constexpr std::size_t kBlendIndex = 1, kTrackIndex = 3;
 static_assert(kLearnedLengths[kBlendIndex] == kBlendLength && kLearnedLengths[kTrackIndex] == kTrackLength);
@@ -110,15 +111,19 @@ void DenoiserEngine::Layout(Arena& arena) {
 }
 
 // Begins a stream: at the very start, or in one whose window lengths change. What came before is then heard
-// unprocessed until the new windows have filled.
+// unprocessed until the new windows have filled and the noise is known again.
 void DenoiserEngine::Start(bool afterSound) {
     m_arena.Reset();
     Layout(m_arena);
+    m_latencyBefore = m_format.latency;
     m_format = FormatOf(static_cast<int>(m_rate), static_cast<int>(m_channels), *m_set, m_scale);
     m_time = 0;
-    m_wetFrom = afterSound ? m_format.latency : 0;
     PlacePaces();
     ChooseMode(true);
+    m_wetFrom = afterSound ? m_format.latency + (Tracks() ? m_scale(kTrackerSettles) : 0) : 0;
+    AimOutput(false);
+    m_jump.Set(afterSound ? 1.0 : 0.0, 0);
+    m_jump.Set(0.0, m_scale(kGlide));
 }
 
 void DenoiserEngine::PlacePaces() {
@@ -184,11 +189,12 @@ void DenoiserEngine::CookCurves() {
 }
 
 void DenoiserEngine::AimOutput(bool glide) {
-    const bool untouched = m_settings.learn || m_time < m_wetFrom;
-    const double mix = static_cast<double>(m_settings.mix);
+    const bool residue = m_settings.residue && !m_settings.learn,
+               unchanged = m_settings.learn || m_time < m_wetFrom;
+    const double mix = unchanged ? 0.0 : static_cast<double>(m_settings.mix);
     const int frames = glide ? m_scale(kGlide) : 0;
-    m_dryGain.Set(untouched ? 1.0 : m_settings.residue ? mix : 1.0 - mix, frames);
-    m_wetGain.Set(untouched ? 0.0 : m_settings.residue ? -mix : mix, frames);
+    m_dryGain.Set(residue ? mix : 1.0 - mix, frames);
+    m_wetGain.Set(residue ? -mix : mix, frames);
 }
 
 // Settles whose noise is reduced. The trackers start afresh when what they follow is another.

@@ -126,6 +126,9 @@ private:
     int m_tick = kUnit;
     std::int64_t m_time = 0, m_dryTime = 0, m_wetFrom = 0;
     Glide m_dryGain, m_wetGain;
+    // Where the latency changes, the sound moves over from the one delay to the other.
+    Glide m_jump;
+    std::int64_t m_latencyBefore = 0;
 };
 
 template <typename At>
@@ -136,14 +139,17 @@ void DenoiserEngine::Run(int frames, At at) {
     for (int done = 0; done < frames;) {
         const int count = std::min(frames - done, m_tick - static_cast<int>(m_time % m_tick));
         for (int i = done; i < done + count; ++i, ++m_time, ++m_dryTime) {
-            const double dryGain = m_dryGain.Next(), wetGain = m_wetGain.Next();
+            const double dryGain = m_dryGain.Next(), wetGain = m_wetGain.Next(), jump = m_jump.Next();
             for (std::size_t c = 0; c < m_channels; ++c) {
                 auto& sample = at(c, i);
                 double* const dry = m_dry.data() + c * (mask + 1);
                 const double in = static_cast<double>(sample);
                 dry[static_cast<std::size_t>(m_dryTime) & mask] = in;
                 m_input[c][m_time] = static_cast<float>(std::clamp(in, -kMost, kMost));
-                const double delayed = dry[static_cast<std::size_t>(m_dryTime - latency) & mask];
+                double delayed = dry[static_cast<std::size_t>(m_dryTime - latency) & mask];
+                if (jump != 0.0)
+                    delayed +=
+                        jump * (dry[static_cast<std::size_t>(m_dryTime - m_latencyBefore) & mask] - delayed);
                 const double wet = m_time < latency ? 0.0 : static_cast<double>(Wet(c)[m_time - latency]);
                 sample =
                     static_cast<std::remove_reference_t<decltype(sample)>>(dryGain * delayed + wetGain * wet);

@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <memory>
 
-#include "DSP/Effects/Denoiser/DenoiserFormat.h"
+#include "DSP/Effects/Denoiser/Format.h"
 #include "DSP/Effects/Framework/CorvoEffect.h"
 
 namespace Corvo::DSP {

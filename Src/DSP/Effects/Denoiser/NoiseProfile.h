@@ -5,7 +5,7 @@
 #include <span>
 #include <vector>
 
-#include "DSP/Effects/Denoiser/DenoiserFormat.h"
+#include "DSP/Effects/Denoiser/SizeSets.h"
 
 namespace Corvo::DSP::Denoising {
 

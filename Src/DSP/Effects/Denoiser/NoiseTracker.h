@@ -5,9 +5,9 @@
 #include <span>
 #include <vector>
 
-#include "DSP/Effects/Denoiser/DenoiserFormat.h"
 #include "DSP/Effects/Denoiser/HumFinder.h"
 #include "DSP/Effects/Denoiser/SizeReducer.h"
+#include "DSP/Effects/Denoiser/SizeSets.h"
 #include "DSP/Effects/Denoiser/SpectrumConversion.h"
 
 namespace Corvo::DSP::Denoising {

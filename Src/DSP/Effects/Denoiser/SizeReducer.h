@@ -5,7 +5,7 @@
 #include <span>
 
 #include "DSP/Effects/Denoiser/Arena.h"
-#include "DSP/Effects/Denoiser/DenoiserFormat.h"
+#include "DSP/Effects/Denoiser/SizeSets.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
 #include "DSP/Effects/Denoiser/WindowTables.h"
 

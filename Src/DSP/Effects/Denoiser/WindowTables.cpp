@@ -4,8 +4,8 @@
 #include <cmath>
 #include <numbers>
 
-#include "DSP/Effects/Denoiser/DenoiserFormat.h"
 #include "DSP/Effects/Denoiser/HannWeights.h"
+#include "DSP/Effects/Denoiser/SizeSets.h"
 
 namespace Corvo::DSP::Denoising {
 namespace {

@@ -1,4 +1,4 @@
-#include "DSP/Effects/Denoiser/DenoiserFormat.h"
+#include "DSP/Effects/Denoiser/SizeSets.h"
 
 #include <algorithm>
 

@@ -4,19 +4,9 @@
 #include <cstdint>
 #include <span>
 
-namespace Corvo::DSP {
+#include "DSP/Effects/Denoiser/Format.h"
 
-// What a stream's frames are for the noise reducer, derived from its rate and "FFT size".
-struct Format_t {
-    int rate = 0, channels = 0;
-    int fftSize = 0;       // samples of the longest window in use
-    int hop = 0;           // of that window
-    int windowLength = 0;  // samples
-    int latency = 0;       // samples
-    int bins = 0;          // of that window's spectrum
-};
-
-namespace Denoising {
+namespace Corvo::DSP::Denoising {
 
 // Lengths are written for 44.1 and 48 kHz; at other rates they are multiplied by the power of two that keeps
 // them nearest to as long in seconds, from a quarter at 8 kHz to four times at 176.4 kHz and above.
@@ -79,5 +69,4 @@ const SizeSet& SizeSetAt(std::int32_t word);
 
 Format_t FormatOf(int rate, int channels, const SizeSet& set, const Scale& scale);
 
-}  // namespace Denoising
-}  // namespace Corvo::DSP
+}  // namespace Corvo::DSP::Denoising
