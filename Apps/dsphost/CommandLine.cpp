@@ -158,7 +158,7 @@ void AddSpectrum(CLI::App& app) {
     command.add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
     command.add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
     command.add_option("--profile", a.profile,
-                       "File of noise learned by denoise: the thin line, and a column of the table");
+                       "File of noise learned by denoise, to be drawn under the mean; a column of the table");
     AddDrawing(command, a.drawing);
     AddWriting(command, a.writing);
 }

@@ -107,18 +107,19 @@ std::string Csv(const std::vector<double>& power, const std::vector<double>& pro
     return text;
 }
 
-// The curve is the mean, over the highest that each frequency ever reached or a profile.
+// The curve is the mean, over the highest that each frequency ever reached. With a profile that is the curve,
+// under the mean.
 void Draw(kivspectrum& analyser, const std::vector<double>& power, const std::vector<double>& profile,
           Picture& picture) {
     auto& settings = kivspectrum::settings;
     SpectrumDrawer& drawer = *analyser.GetSpectrumDrawer();
     drawer.UpdateSettings(settings);
     VectorInterpolationFilterFloat unused;
-    if (!profile.empty()) {
-        drawer.SmoothFftSpectrum({profile.begin(), profile.end()}, 0.0f, unused);
-        drawer.AgePeaks();
-    }
     drawer.SmoothFftSpectrum({power.begin(), power.end()}, 0.0f, unused);
+    if (!profile.empty()) {
+        drawer.AgePeaks();
+        drawer.SmoothFftSpectrum({profile.begin(), profile.end()}, 0.0f, unused);
+    }
     picture.Paint([&](auto& target) { analyser.DoDrawSpectrum<PictureDrawing>(target, picture.Whole()); });
 }
 
