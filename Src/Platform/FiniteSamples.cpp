@@ -3,6 +3,7 @@
 #include <immintrin.h>
 
 #include <cstdint>
+#include <cstring>
 
 namespace Corvo {
 namespace {
@@ -19,7 +20,11 @@ struct Exponent {
 template <typename Sample>
 bool RestIsFinite(const Sample* samples, std::size_t count) {
     bool finite = true;
-    for (std::size_t i = 0; i < count; ++i) finite &= std::isfinite(samples[i]);
+    for (std::size_t i = 0; i < count; ++i) {
+        Sample sample;
+        std::memcpy(&sample, samples + i, sizeof(sample));
+        finite &= std::isfinite(sample);
+    }
     return finite;
 }
 

@@ -72,7 +72,8 @@ PitchAdapterCorvoOld::~PitchAdapterCorvoOld() = default;
 void PitchAdapterCorvoOld::SetSampleRate(int rate) { m_rate = rate; }
 
 void PitchAdapterCorvoOld::SetPitchFactor(int channel, float factor) {
-    if (channel == 0 || channel == 1) StoreShared(m_factors[static_cast<std::size_t>(channel)], factor);
+    if ((channel == 0 || channel == 1) && std::isfinite(factor))
+        StoreShared(m_factors[static_cast<std::size_t>(channel)], factor);
 }
 
 void PitchAdapterCorvoOld::SetFFTSize(int index) { m_size = kFFTSizes[Limited(kFFTSizes, index)]; }

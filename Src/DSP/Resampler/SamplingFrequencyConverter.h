@@ -21,6 +21,8 @@ struct PolePairLowPass;
 // kept beside the histories, which every block leaves as the direct form would have them: a host may read
 // them or go on from them with the step. A channel whose histories the host has zeroed starts afresh.
 //
+// Samples that are not finite count as 0.
+//
 // Copying and moving copy member by member: both objects then point to the same rings, and only one of
 // them may free those. Filter and histories are independent.
 //
@@ -44,7 +46,8 @@ struct DSP_API SamplingFrequencyConverter {
     // Takes the factors given, which need not be reduced. Returns 1; 0, with the object untouched, for
     // factors outside 1..kMaxFactor or no memory.
     int InitConversionByFactors(int upFactor, int downFactor);
-    // Makes rings for 0..48 channels and starts the stream. Rings of an earlier Init are not freed.
+    // Makes rings for 0..48 channels and starts the stream. Rings of an earlier Init are not freed. Without
+    // memory blocks return 0 until the next Init.
     void Init(int channels);
     // Starts afresh like `design`, which is initialised, in the rings this object has: neither allocates
     // nor frees as long as whoever set up `design` keeps it. False, nothing done, if the rings are too short.

@@ -42,6 +42,10 @@ struct TailRecord;
 // Indices: a "real" index counts the effect's own parameters, an "external" one the host's, which may
 // stand for a left/right pair. The base checks no index; an effect ignores a real index it does not have.
 //
+// Memory: when there is none, constructors and the user-interface thread's calls throw std::bad_alloc. A call
+// that does has stored nothing or all that it was given, and may be repeated. Processing and preparation
+// never throw.
+//
 // Most effects are described by a table: names, texts, choices, presets and the layout of the settings chunk.
 // The operations below answer from it; an effect without one has the answers given here.
 //
@@ -96,7 +100,8 @@ public:
 
     // Re-derives coefficients when they are stale, `force` is set, or the format is not the last one seen.
     // With `force`, from InitProcessing, it also makes all memory and starts afresh; then it may allocate and
-    // no block is being processed. Without, it runs in front of every block on the audio thread.
+    // no block is being processed. Without, it runs in front of every block on the audio thread. It may throw
+    // std::bad_alloc, which InitProcessing and Process catch.
     virtual void CheckCookProperties(const tWAVEFORMATEX* format, bool force);
 
     // State, on the user-interface thread: the settings chunk is a fixed little-endian layout of
@@ -185,7 +190,8 @@ public:
     virtual float GetParamFromProp(int index, int preset);
 
     // Announces the format and the largest block, and derives everything; all memory that processing
-    // needs is made here. Always true.
+    // needs is made here. Always true, and never throws: without memory blocks pass unchanged, and the next
+    // InitProcessing tries again.
     bool InitProcessing(int maxFrames, const tWAVEFORMATEX* format);
     // Plays automation that is due, then processes one block in place. Never throws; a block of 0 frames
     // or fewer is left alone. An effect that remembers its input takes samples that are not finite for 0, and
@@ -312,7 +318,10 @@ protected:
 
 private:
     void Store(const std::vector<std::uint32_t>& settings);
-    bool GuardsInput(const tWAVEFORMATEX& format) const;
+    template <typename Call>
+    void Attempt(Call&& call);
+    template <typename Call>
+    void RunBlock(int frames, ProcessFlags& flags, Call&& call);
 
     const EffectTable* m_table = nullptr;
     void* m_words = nullptr;

@@ -25,6 +25,11 @@ struct PhaserImpl {
         memories.fill(0.0);
         last = 0.0;
     }
+    // Feedback of 100 % can grow beyond all numbers, and would stay there. From any stage that shows at the
+    // end of the chain within a frame.
+    void ClearUnlessFinite() {
+        if (!std::isfinite(last)) Clear();
+    }
 
     // The all-passes' coefficients in the next frames, at most a piece of the oscillator. They are the
     // floats that the library's sines give, to the bit: where the oscillator's may round to another one, the

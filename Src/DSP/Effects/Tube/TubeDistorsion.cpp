@@ -95,7 +95,7 @@ EffectTable MakeTable() {
                       .rows = kRows,
                       .chunk = {.words = kRows.size()},
                       .sectionLabel = SectionLabel::WithoutSide,
-                      .inputGuard = InputGuard::EveryFormat};
+                      .inputGuard = InputGuard::None};  // what remembers guards itself
     for (const auto& preset : TubePresets::kPresets) {
         VirtualTubeAmp::Values values;
         for (std::size_t i = 0; i < values.size(); ++i) values[i] = preset.values[i / 2];
