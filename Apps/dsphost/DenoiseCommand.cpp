@@ -162,6 +162,7 @@ void RunDenoise(DenoiseArguments arguments) {
     if (!arguments.format.empty()) asked = ParseSampleFormat(arguments.format);
     auto& rules = arguments.writing.rules;
     rules.inputs = {arguments.input, arguments.profile};
+    RefuseSameOutputs({arguments.output, arguments.residue, arguments.saveProfile});
 
     DenoiserProcessor denoiser;
     if (!arguments.profile.empty()) LoadNoiseProfile(denoiser, arguments.profile);
@@ -185,9 +186,10 @@ void RunDenoise(DenoiseArguments arguments) {
         profile->Bytes().Write(chunk.data(), chunk.size());
     }
     Clean(input, denoiser, format, output, residue ? &*residue : nullptr, arguments.writing.quiet);
-    output.Commit();
-    if (residue) residue->Commit();
-    if (profile) profile->Commit();
+    std::vector<OutputFile*> together{&output.Complete()};
+    if (residue) together.push_back(&residue->Complete());
+    if (profile) together.push_back(&*profile);
+    CommitTogether(together);
     WarnOfClipping(output);
 }
 
