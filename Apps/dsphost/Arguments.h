@@ -27,6 +27,13 @@ struct ConvertArguments {
 };
 void RunConvert(ConvertArguments arguments);
 
+struct DenoiseArguments {
+    std::string input, output, profile, saveProfile, settings, residue, format;
+    std::vector<std::string> learn;
+    WritingOptions writing;
+};
+void RunDenoise(DenoiseArguments arguments);
+
 struct EffectsArguments {
     std::string effect;
     bool json = false;
@@ -68,7 +75,7 @@ struct SonogramArguments {
 void RunSonogram(SonogramArguments arguments);
 
 struct SpectrumArguments {
-    std::string input, picture, csv, window = "blackman";
+    std::string input, picture, csv, profile, window = "blackman";
     int length = 4096;
     float overlap = 0.5f;
     PictureOptions drawing;

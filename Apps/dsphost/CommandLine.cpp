@@ -71,6 +71,21 @@ void AddConvert(CLI::App& app) {
     AddWriting(command, a.writing);
 }
 
+void AddDenoise(CLI::App& app) {
+    const auto [command, a] = Add(
+        app, "denoise", "Takes steady noise out of a recording, aligned and as long as it was", RunDenoise);
+    AddInput(command, a.input);
+    AddAudioOutput(command, a.output);
+    command.add_option("--learn", a.learn, "FROM:TO, seconds that hold noise only; as often as there are")
+        ->allow_extra_args(false);
+    command.add_option("--profile", a.profile, "File of noise learned before");
+    command.add_option("--save-profile", a.saveProfile, "Writes what was learned");
+    command.add_option("--set", a.settings, "\"label=value, ...\", as of the effect Denoiser");
+    command.add_option("--residue", a.residue, "Audio file of what was taken away");
+    AddFormat(command, a.format);
+    AddWriting(command, a.writing);
+}
+
 void AddEffects(CLI::App& app) {
     const auto [command, a] =
         Add(app, "effects", "Lists the effects, or one effect's parameters and presets", RunEffects);
@@ -148,6 +163,8 @@ void AddSpectrum(CLI::App& app) {
     command.add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
     command.add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
     command.add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
+    command.add_option("--profile", a.profile,
+                       "File of noise learned by denoise, to be drawn under the mean; a column of the table");
     AddDrawing(command, a.drawing);
     AddWriting(command, a.writing);
 }
@@ -193,8 +210,8 @@ void RunCommandLine(int count, char** arguments) {
     app.require_subcommand(1);
     app.set_version_flag("--version", DSPHOST_VERSION);
     // In the order in which help lists them.
-    for (const auto add :
-         {AddConvert, AddEffects, AddPitch, AddEqCurve, AddRender, AddSonogram, AddSpectrum, AddTuner})
+    for (const auto add : {AddConvert, AddDenoise, AddEffects, AddPitch, AddEqCurve, AddRender, AddSonogram,
+                           AddSpectrum, AddTuner})
         add(app);
     CheckCommand(app, count, arguments);
     try {

@@ -10,6 +10,7 @@
 #include "Arguments.h"
 #include "AudioReader.h"
 #include "Errors.h"
+#include "NoiseProfileFile.h"
 #include "PictureOptions.h"
 #include "Playback.h"
 #include "Progress.h"
@@ -54,7 +55,7 @@ std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser,
         std::fill(samples.begin() + got * channels, samples.end(), 0.0);
         analyser.Feed(samples.data(), wanted, input.Channels(), input.Channels());
         analyser.PrepareFFTForDrawingHelper(false, false);
-        analyser.GetSpectrumDrawer()->AgePeaks();
+        if (arguments.profile.empty()) analyser.GetSpectrumDrawer()->AgePeaks();
         const auto& power = analyser.GetPower();
         for (std::size_t k = 0; k < sum.size(); ++k) sum[k] += power[k];
         ++spectra;
@@ -64,10 +65,25 @@ std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser,
     return sum;
 }
 
-std::string Csv(const std::vector<double>& power, const std::vector<float>& window, int rate, int length) {
+// The learned noise as this analysis would show it; empty when none is asked for.
+std::vector<double> ProfilePower(const SpectrumArguments& arguments, const kivspectrum& analyser, int rate) {
+    if (arguments.profile.empty()) return {};
+    Corvo::DSP::DenoiserProcessor denoiser;
+    LoadNoiseProfile(denoiser, arguments.profile);
+    std::vector<float> density(analyser.GetPower().size());
+    denoiser.LearnedDensity(rate, density.data(), static_cast<int>(density.size()));
+    const auto& window = analyser.GetWindow();
+    const double energy = std::inner_product(window.begin(), window.end(), window.begin(), 0.0);
+    std::vector<double> power;
+    for (const float each : density) power.push_back(energy * static_cast<double>(each));
+    return power;
+}
+
+std::string Csv(const std::vector<double>& power, const std::vector<double>& profile,
+                const std::vector<float>& window, int rate, int length) {
     // A full-scale sine has half the window's sum as its amplitude.
     const double full = std::accumulate(window.begin(), window.end(), 0.0) / 2.0;
-    std::string text = "frequency_hz,level_db\n";
+    std::string text = profile.empty() ? "frequency_hz,level_db\n" : "frequency_hz,level_db,profile_db\n";
     const auto append = [&text](double value, int digits, char end) {
         char number[64];
         const auto result =
@@ -75,22 +91,32 @@ std::string Csv(const std::vector<double>& power, const std::vector<float>& wind
         text.append(number, result.ptr) += end;
     };
     for (std::size_t k = 0; k < power.size(); ++k) {
-        const auto share = static_cast<float>(power[k] / (full * full));
-        float level;
-        Corvo::PowerToDecibels(&share, &level, 1, 0.0f);
+        const auto decibels = [&](double each) {
+            const auto share = static_cast<float>(each / (full * full));
+            float level;
+            Corvo::PowerToDecibels(&share, &level, 1, 0.0f);
+            return level;
+        };
         append(static_cast<double>(k) * rate / length, 4, ',');
-        append(level, 3, '\n');
+        append(decibels(power[k]), 3, profile.empty() ? '\n' : ',');
+        if (!profile.empty()) append(decibels(profile[k]), 3, '\n');
     }
     return text;
 }
 
-// The curve is the mean, over the highest that each frequency ever reached.
-void Draw(kivspectrum& analyser, const std::vector<double>& power, Picture& picture) {
+// The curve is the mean, over the highest that each frequency ever reached. With a profile that is the curve,
+// under the mean.
+void Draw(kivspectrum& analyser, const std::vector<double>& power, const std::vector<double>& profile,
+          Picture& picture) {
     auto& settings = kivspectrum::settings;
     SpectrumDrawer& drawer = *analyser.GetSpectrumDrawer();
     drawer.UpdateSettings(settings);
     VectorInterpolationFilterFloat unused;
     drawer.SmoothFftSpectrum({power.begin(), power.end()}, 0.0f, unused);
+    if (!profile.empty()) {
+        drawer.AgePeaks();
+        drawer.SmoothFftSpectrum({profile.begin(), profile.end()}, 0.0f, unused);
+    }
     picture.Paint([&](auto& target) { analyser.DoDrawSpectrum<PictureDrawing>(target, picture.Whole()); });
 }
 
@@ -99,7 +125,7 @@ void Draw(kivspectrum& analyser, const std::vector<double>& power, Picture& pict
 void RunSpectrum(SpectrumArguments arguments) {
     Check(arguments);
     RefuseSameOutputs({arguments.picture, arguments.csv});
-    arguments.writing.rules.inputs = {arguments.input};
+    arguments.writing.rules.inputs = {arguments.input, arguments.profile};
     auto& settings = kivspectrum::settings;
     settings.window_type = static_cast<std::int32_t>(FindName(arguments.window, kWindows, "window"));
     settings.window_length = arguments.length;
@@ -122,15 +148,16 @@ void RunSpectrum(SpectrumArguments arguments) {
         picture = arguments.drawing.Make();
         drawing = OpenPicture(arguments.picture, arguments.writing.rules);
     }
+    const auto profile = ProfilePower(arguments, analyser, input.Rate());
     const auto power = AveragePower(input, analyser, arguments);
     std::vector<OutputFile*> together;
     if (picture) {
-        Draw(analyser, power, *picture);
+        Draw(analyser, power, profile, *picture);
         Write(*picture, *drawing);
         together.push_back(drawing.get());
     }
     if (table) {
-        const std::string text = Csv(power, analyser.GetWindow(), input.Rate(), arguments.length);
+        const std::string text = Csv(power, profile, analyser.GetWindow(), input.Rate(), arguments.length);
         table->Bytes().Write(text.data(), text.size());
         together.push_back(&*table);
     }

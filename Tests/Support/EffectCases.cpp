@@ -4,6 +4,7 @@
 
 #include "DSP/Effects/Chorus/Chorus.h"
 #include "DSP/Effects/Compressor/Compressor.h"
+#include "DSP/Effects/Denoiser/DenoiserProcessor.h"
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
@@ -40,6 +41,7 @@ constexpr std::array kEffects{
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
+    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>},
 };
 
 }  // namespace

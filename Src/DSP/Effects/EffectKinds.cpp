@@ -6,6 +6,7 @@
 
 #include "DSP/Effects/Chorus/Chorus.h"
 #include "DSP/Effects/Compressor/Compressor.h"
+#include "DSP/Effects/Denoiser/DenoiserProcessor.h"
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
@@ -34,6 +35,7 @@ constexpr EffectKind kKinds[]{
     {"Pitch Shift", Make<PitchShift>},
     {"Compressor",  Make<Compressor>},
     {"Reverb",      Make<Reverb>},
+    {"Denoiser",    Make<DenoiserProcessor>},
 };
 // clang-format on
 

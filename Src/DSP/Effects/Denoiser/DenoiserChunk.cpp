@@ -1,0 +1,115 @@
+#include <algorithm>
+#include <cmath>
+
+#include "DSP/Effects/Denoiser/DenoiserPresets.h"
+#include "DSP/Effects/Denoiser/DenoiserState.h"
+#include "DSP/Effects/Denoiser/DenoiserTable.h"
+#include "DSP/Effects/Framework/MemoryFile.h"
+#include "DSP/Effects/Parameters/LittleEndian.h"
+#include "Threads/SharedRecord.h"
+
+// The settings chunk: the parameters and the learned noise.
+namespace Corvo::DSP {
+namespace {
+
+using namespace Denoising;
+using KivFiles::CMemoryFile;
+
+constexpr std::int32_t kVersion = 1;
+constexpr float kMostPower = 1e30f;
+
+template <typename T>
+void Write(CMemoryFile& file, T value) {
+    const auto bytes = LittleEndianBytes(value);
+    if (file.Write(bytes.data(), sizeof(T)) != sizeof(T)) throw CorvoException("Error writing data");
+}
+
+template <typename T>
+T Read(CMemoryFile& file) {
+    std::array<std::uint8_t, sizeof(T)> bytes;
+    if (file.Read(bytes.data(), sizeof(T)) != sizeof(T)) throw CorvoException("Error reading data");
+    return LittleEndianValue<T>(bytes);
+}
+
+void Require(bool valid) {
+    if (!valid) throw CorvoException("Error reading data");
+}
+
+void WriteProfile(CMemoryFile& file, const NoiseProfile& profile) {
+    Write(file, profile.seconds);
+    Write(file, profile.rate);
+    Write(file, profile.channels);
+    for (std::size_t c = 0; c < profile.channels; ++c)
+        for (const auto& spectrum : profile.power[c])
+            KivFiles::WriteDoubles(file, {spectrum.begin(), spectrum.end()});
+}
+
+NoiseProfile ReadProfile(CMemoryFile& file) {
+    NoiseProfile profile;
+    profile.seconds = Read<double>(file);
+    profile.rate = Read<std::uint32_t>(file);
+    profile.channels = Read<std::uint32_t>(file);
+    Require(std::isfinite(profile.seconds) && profile.seconds >= 0.0 &&
+            profile.channels <= profile.power.size() && (profile.rate > 0 || profile.channels == 0));
+    for (std::size_t c = 0; c < profile.channels; ++c)
+        for (std::size_t which = 0; which < kLengths; ++which) {
+            std::vector<double> powers;
+            KivFiles::ReadDoubles(file, powers);
+            Require(powers.empty() || powers.size() == NoiseProfile::Bins(which, profile.rate));
+            Require(std::ranges::all_of(powers,
+                                        [](double power) { return power >= 0.0 && power <= kMostPower; }));
+            profile.power[c][which].assign(powers.size(), 0.0f);
+            std::ranges::transform(powers, profile.power[c][which].begin(),
+                                   [](double power) { return static_cast<float>(power); });
+        }
+    return profile;
+}
+
+}  // namespace
+
+int DenoiserProcessor::GetSettingsChunkSize() {
+    const auto& profile = m_state->Known();
+    std::size_t size = 4 + 4 + 4 + 8 * Table().rows.size() + 8 + 4 + 4;
+    for (std::size_t c = 0; c < profile.channels; ++c)
+        for (const auto& spectrum : profile.power[c]) size += 4 + 8 * spectrum.size();
+    return static_cast<int>(size);
+}
+
+void DenoiserProcessor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
+    CMemoryFile file;
+    Write(file, m_chunk_tag);
+    Write(file, kVersion);
+    std::vector<double> values;
+    for (const auto& row : Table().rows)
+        values.push_back(PlainValue(row, static_cast<std::int32_t>(LoadWord(&m_settings, row.word))));
+    KivFiles::WriteDoubles(file, values);
+    WriteProfile(file, m_state->Known());
+    chunk.assign(file.Data(), file.Data() + file.GetLength());
+}
+
+void DenoiserProcessor::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {
+    // Only read from.
+    CMemoryFile file(const_cast<std::uint8_t*>(chunk.data()), static_cast<std::int64_t>(chunk.size()));
+    try {
+        const auto tag = Read<std::int32_t>(file);
+        Require(Read<std::int32_t>(file) == kVersion);
+        std::vector<double> values;
+        KivFiles::ReadDoubles(file, values);
+        Require(std::ranges::all_of(values, [](double value) { return std::isfinite(value); }));
+        auto words = WordsOf(DenoiserPresets::kPresets[0].settings);
+        for (std::size_t i = 0; i < std::min(values.size(), Table().rows.size()); ++i) {
+            const auto& row = Table().rows[i];
+            words[row.word] = static_cast<std::uint32_t>(WordOf(row, values[i]));
+        }
+        words[WordAt(&Settings::clear)] = 0;
+        auto profile = ReadProfile(file);
+        m_chunk_tag = tag;
+        m_state->Load(std::move(profile));
+        Assign(m_settings, RecordOf<Settings>(words));
+        MarkStale();
+    } catch (const CorvoException&) {
+        return;  // nothing has changed
+    }
+}
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,334 @@
+#include "DSP/Effects/Denoiser/DenoiserEngine.h"
+
+#include <bit>
+#include <cmath>
+
+namespace Corvo::DSP::Denoising {
+namespace {
+
+constexpr float kPerDb = 0.23025851f;  // natural logarithm of a power
+constexpr int kGlide = 512;
+constexpr int kTrackerSettles = 8192;
+constexpr double kLowestBandHz = 62.5;
+constexpr std::size_t kBlendIndex = 1, kTrackIndex = 3;
+static_assert(kLearnedLengths[kBlendIndex] == kBlendLength && kLearnedLengths[kTrackIndex] == kTrackLength);
+
+// The value at a place between the bands.
+float AtPlace(const std::array<float, kGainBands>& bands, float place) {
+    const auto below = std::min(static_cast<std::size_t>(place), kGainBands - 2);
+    return bands[below] + (bands[below + 1] - bands[below]) * (place - static_cast<float>(below));
+}
+
+}  // namespace
+
+void DenoiserEngine::Glide::Set(double to, int frames) {
+    if (to == target && (frames > 0 || left == 0)) return;
+    target = to;
+    left = frames;
+    if (frames > 0)
+        step = (to - value) / frames;
+    else
+        value = to;
+}
+
+std::size_t DenoiserEngine::LengthIndex(std::size_t size) const {
+    return static_cast<std::size_t>(std::ranges::find(kLearnedLengths, m_set->sizes[size].length) -
+                                    kLearnedLengths.begin());
+}
+
+void DenoiserEngine::Prepare(double rate, std::size_t channels) {
+    const Scale scale = Scale::Of(rate);
+    if (!(scale == m_scale) || m_dry.empty()) {
+        m_scale = scale;
+        m_tick = std::min(kUnit, scale(kUnit));
+        for (std::size_t i = 0; i < kLengths; ++i) m_windows[i].Prepare(scale(kLearnedLengths[i]));
+        m_trackerTables.Prepare(m_windows[kTrackIndex]);
+        for (std::size_t i = 0; i < kLengths; ++i) {
+            if (i != kTrackIndex) m_conversions[i].Prepare(m_windows[kTrackIndex], m_windows[i]);
+            const std::size_t values = m_windows[i].Values();
+            auto& curves = m_curves[i];
+            for (auto* each : {&curves.offset, &curves.floor, &curves.logFloor, &curves.band})
+                each->assign(values, 0.0f);
+            for (auto& channel : m_learned) channel[i].assign(values, 1.0f);
+        }
+        for (auto& passage : m_passage) passage.assign(m_windows.back().Values(), 0.0f);
+        m_order.assign(m_windows[kTrackIndex].Values(), 0.0f);
+        m_learner.Prepare(m_windows);
+        m_dry.assign(kMostChannels * static_cast<std::size_t>(scale(kLongestRing)), 0.0);
+        std::size_t most = 0;
+        m_channels = kMostChannels;
+        m_rate = rate;
+        for (const auto& set : kSizeSets) {
+            m_set = &set;
+            Arena counting;
+            Layout(counting);
+            most = std::max(most, counting.Taken());
+        }
+        m_arena.Reserve(most);
+        m_learnedSeconds = 0.0;  // of windows that are no more
+    }
+    SetFormat(rate, channels);
+}
+
+void DenoiserEngine::SetFormat(double rate, std::size_t channels) {
+    m_rate = rate;
+    m_channels = channels;
+    m_fresh = true;
+    m_learner.Cancel();
+    std::ranges::fill(m_dry, 0.0);
+    m_dryTime = 0;
+    for (std::size_t i = 0; i < kLengths; ++i) {
+        auto& windows = m_windows[i];
+        windows.SetRate(rate, m_windows[kBlendIndex].length);
+        for (std::size_t bin = 0; bin < windows.Values(); ++bin) {
+            const double hz = static_cast<double>(bin) * rate / windows.length;
+            m_curves[i].band[bin] = static_cast<float>(
+                std::clamp(std::log2(std::max(hz, 1.0) / kLowestBandHz), 0.0, kGainBands - 1.0));
+        }
+    }
+    Start(false);
+}
+
+// Hands out the memory. Called with every set, to see how much it takes, and with the one in use.
+void DenoiserEngine::Layout(Arena& arena) {
+    const auto ring = static_cast<std::size_t>(m_scale(kLongestRing));
+    std::array<SpectrumConversion*, 3> conversions{};
+    const auto count = static_cast<std::size_t>(m_set->count);
+    for (std::size_t i = 0; i < count; ++i)
+        if (const auto index = LengthIndex(i); index != kTrackIndex) conversions[i] = &m_conversions[index];
+    for (std::size_t c = 0; c < m_channels; ++c) {
+        m_input[c].Take(arena, ring);
+        for (std::size_t i = 0; i < count; ++i) m_sized[i][c].Take(arena, ring);
+        if (count > 1) m_blended[c].Take(arena, ring);
+        m_trackers[c].Prepare(arena, m_windows[kTrackIndex], m_trackerTables,
+                              std::span(conversions).first(count), m_rate);
+    }
+    for (std::size_t i = 0; i < count; ++i)
+        m_reducers[i].Prepare(arena, m_set->sizes[i], m_windows[LengthIndex(i)], m_channels);
+    if (count > 1)
+        m_blend.Prepare(arena, m_windows[kBlendIndex], std::span(m_reducers).first(count), m_channels,
+                        m_rate);
+}
+
+// Begins a stream: at the very start, or in one whose window lengths change. What came before is then heard
+// unprocessed until the new windows have filled and the noise is known again.
+void DenoiserEngine::Start(bool afterSound) {
+    m_arena.Reset();
+    Layout(m_arena);
+    m_latencyBefore = m_format.latency;
+    m_format = FormatOf(static_cast<int>(m_rate), static_cast<int>(m_channels), *m_set, m_scale);
+    m_time = 0;
+    PlacePaces();
+    ChooseMode(true);
+    m_wetFrom = afterSound ? m_format.latency + (Tracks() ? m_scale(kTrackerSettles) : 0) : 0;
+    AimOutput(false);
+    m_jump.Set(afterSound ? 1.0 : 0.0, 0);
+    m_jump.Set(0.0, m_scale(kGlide));
+}
+
+void DenoiserEngine::PlacePaces() {
+    const int unit = m_scale(kUnit), ticksPerUnit = unit / m_tick;
+    const auto ticks = [&](int units) { return (units - 1) * ticksPerUnit + 1; };
+    for (std::size_t i = 0; i < static_cast<std::size_t>(m_set->count); ++i) {
+        const auto& plan = m_set->sizes[i];
+        const auto& reducer = m_reducers[i];
+        m_reducerPaces[i].Set(reducer.Hop() + std::int64_t{plan.delay} * unit, reducer.Hop(),
+                              ticks(plan.units), m_tick, reducer.Steps(),
+                              [&](int step) { return reducer.Cost(step); });
+    }
+    const int trackHop = m_windows[kTrackIndex].length / kOverlap;
+    for (std::size_t c = 0; c < m_channels; ++c)
+        m_trackerPaces[c].Set(trackHop, trackHop, ticks(m_set->trackerUnits), m_tick, m_trackers[c].Steps(),
+                              [&](int step) { return m_trackers[c].Cost(step); });
+    if (m_set->count == 1) return;
+    // Frame 0 ends with the blend's first hop of samples; all of it is needed when they come out.
+    const std::int64_t hop = m_windows[kBlendIndex].length / kOverlap,
+                       due = m_format.latency - (kOverlap - 1) * hop;
+    m_blendPace.Set(due - std::int64_t{m_set->blendUnits - 1} * unit, hop, ticks(m_set->blendUnits), m_tick,
+                    m_blend.Steps(), [](int) { return 1.0; });
+}
+
+void DenoiserEngine::Apply(const EngineSettings& settings) {
+    const bool first = m_fresh, wasLearning = m_learner.Active();
+    m_fresh = false;
+    const auto* const set = &SizeSetAt(settings.sizeSet);
+    const bool resize = set != m_set;
+    if (wasLearning && (!settings.learn || resize)) EndLearning();
+    m_settings = settings;
+    if (resize) {
+        m_set = set;
+        Start(!first);
+    }
+    if (settings.learn && !m_learner.Active() && Scale::Of(m_rate) == m_scale)
+        m_learner.Begin(m_time, m_channels);
+    CookCurves();
+    for (auto& tracker : std::span(m_trackers).first(m_channels)) {
+        tracker.SetMaterial(settings.music);
+        tracker.SetWhitening(settings.gains.whitening > 0.0f);
+    }
+    ChooseMode(false);
+    AimOutput(!first);
+}
+
+void DenoiserEngine::CookCurves() {
+    const auto& kernels = BestSpectrumKernels();
+    for (std::size_t i = 0; i < static_cast<std::size_t>(m_set->count); ++i) {
+        auto& curves = m_curves[LengthIndex(i)];
+        const std::size_t values = curves.band.size();
+        for (std::size_t bin = 0; bin < values; ++bin) {
+            const float place = curves.band[bin];
+            curves.floor[bin] = kPerDb * (m_settings.sensitivityDb + AtPlace(m_settings.gainDb, place));
+            curves.logFloor[bin] =
+                -0.5f * kPerDb * std::min(m_settings.reductionDb, AtPlace(m_settings.rangeDb, place));
+        }
+        kernels.exponential(curves.floor.data(), curves.offset.data(), values);
+        kernels.exponential(curves.logFloor.data(), curves.floor.data(), values);
+        m_reducers[i].SetCurves(curves.offset.data(), curves.floor.data(), curves.logFloor.data());
+        m_reducers[i].SetGains(m_settings.gains);
+    }
+}
+
+void DenoiserEngine::AimOutput(bool glide) {
+    const bool residue = m_settings.residue && !m_settings.learn,
+               unchanged = m_settings.learn || m_time < m_wetFrom;
+    const double mix = unchanged ? 0.0 : static_cast<double>(m_settings.mix);
+    const int frames = glide ? m_scale(kGlide) : 0;
+    m_dryGain.Set(residue ? mix : 1.0 - mix, frames);
+    m_wetGain.Set(residue ? -mix : mix, frames);
+}
+
+// Settles whose noise is reduced. The trackers start afresh when what they follow is another.
+void DenoiserEngine::ChooseMode(bool restart) {
+    const auto before = m_mode;
+    m_mode = HasLearned() ? m_settings.profile : ProfileMode::Adaptive;
+    if (m_mode == before && !restart) return;
+    for (std::size_t c = 0; c < m_channels; ++c) {
+        m_trackers[c].Start(m_mode == ProfileMode::Following ? m_learned[c][kTrackIndex].data() : nullptr);
+        m_trackers[c].SetMaterial(m_settings.music);
+        m_trackers[c].SetWhitening(m_settings.gains.whitening > 0.0f);
+        m_trackerPaces[c].Drop();
+    }
+}
+
+NoiseAt DenoiserEngine::NoiseFor(std::size_t channel, std::size_t size, std::int64_t centre) const {
+    if (Tracks() && m_trackers[channel].Ready()) return m_trackers[channel].At(size, centre);
+    if (!HasLearned()) return {nullptr, nullptr, 0.0f};
+    const float* const learned = m_learned[channel][LengthIndex(size)].data();
+    return {learned, learned, 0.0f};
+}
+
+void DenoiserEngine::Tick() {
+    const auto input = std::span<const SampleRing>(m_input).first(m_channels);
+    if (Tracks())
+        for (std::size_t c = 0; c < m_channels; ++c)
+            m_trackerPaces[c].Tick(
+                m_time, [&](std::int64_t frame, int step) { m_trackers[c].Run(step, frame, m_input[c]); });
+    for (std::size_t i = 0; i < static_cast<std::size_t>(m_set->count); ++i)
+        m_reducerPaces[i].Tick(m_time, [&](std::int64_t frame, int step) {
+            auto& job = m_jobs[i];
+            if (step == 0) {
+                job.frame = frame;
+                job.input = input;
+                job.output = std::span<const SampleRing>(m_sized[i]).first(m_channels);
+                for (std::size_t c = 0; c < m_channels; ++c)
+                    job.noise[c] = NoiseFor(c, i, (frame - 1) * m_reducers[i].Hop());
+                // Powers grow with the window's length.
+                const auto [longer, track] =
+                    std::pair(m_reducers[i].Hop() * kOverlap, m_windows[kTrackIndex].length);
+                job.logReference = std::log(static_cast<float>(longer) / static_cast<float>(track));
+                float sum = 0.0f;
+                for (std::size_t c = 0; c < m_channels; ++c)
+                    sum += Tracks() ? m_trackers[c].LogReference() : m_learnedReference[c];
+                job.logReference += sum / static_cast<float>(m_channels);
+            }
+            m_reducers[i].Run(step, job);
+        });
+    if (m_set->count > 1)
+        m_blendPace.Tick(m_time, [&](std::int64_t frame, int step) {
+            m_blend.Run(step, {.frame = frame,
+                               .inputs = std::span(m_sized).first(static_cast<std::size_t>(m_set->count)),
+                               .output = std::span<const SampleRing>(m_blended).first(m_channels)});
+        });
+    if (m_learner.Active()) m_learner.Run(m_time, input);
+    if (m_wetFrom > 0 && m_time == m_wetFrom) AimOutput(true);
+}
+
+// What was learned goes into one mean with what had been before, by the time each took.
+void DenoiserEngine::EndLearning() {
+    const auto input = std::span<const SampleRing>(m_input).first(m_channels);
+    if (!m_learner.End(m_time, input)) return;
+    const double seconds = static_cast<double>(m_learner.Length()) / m_rate;
+    const auto share = static_cast<float>(seconds / (seconds + m_learnedSeconds));
+    for (std::size_t c = 0; c < m_channels; ++c)
+        for (std::size_t i = 0; i < kLengths; ++i) {
+            auto &passage = m_passage[i % 2], &shorter = m_passage[(i + 1) % 2];
+            const std::size_t bins = m_windows[i].Bins();
+            if (const float* const mean = m_learner.Mean(c, i))
+                std::copy_n(mean, bins, passage.data());
+            else
+                ConvertSpectrum(std::span(shorter).first(m_windows[i - 1].Bins()), m_windows[i - 1].length,
+                                m_rate, passage.data(), bins, m_windows[i].length, m_rate);
+            auto& learned = m_learned[c][i];
+            for (std::size_t bin = 0; bin < bins; ++bin)
+                learned[bin] = (1.0f - share) * learned[bin] + share * (passage[bin] + kLeastPower);
+        }
+    for (std::size_t c = m_channels; c < kMostChannels; ++c)
+        for (std::size_t i = 0; i < kLengths; ++i)
+            std::ranges::copy(m_learned[0][i], m_learned[c][i].begin());
+    m_learnedSeconds += seconds;
+    m_learnedChannels = m_channels;
+    m_newlyLearned = true;
+    FinishLearned();
+}
+
+void DenoiserEngine::Adopt(const NoiseProfile& profile) {
+    m_learnedSeconds = 0.0;
+    bool whole = profile.Learned();
+    for (std::size_t c = 0; c < kMostChannels && whole; ++c) {
+        const auto& spectra = profile.power[std::min<std::size_t>(c, profile.channels - 1)];
+        for (std::size_t i = 0; i < kLengths && whole; ++i) {
+            // A length that was not learned is made from the next shorter one, or else a longer one.
+            std::size_t from = i;
+            while (from > 0 && spectra[from].empty()) --from;
+            while (from < kLengths && spectra[from].empty()) ++from;
+            whole = from < kLengths;
+            if (!whole) break;
+            auto& learned = m_learned[c][i];
+            ConvertSpectrum(spectra[from], NoiseProfile::Length(from, profile.rate), profile.rate,
+                            learned.data(), m_windows[i].Bins(), m_windows[i].length, m_rate);
+            for (float& power : learned) power = std::max(power, kLeastPower);
+        }
+    }
+    if (whole) {
+        m_learnedSeconds = profile.seconds;
+        m_learnedChannels = profile.channels;
+    }
+    FinishLearned();
+}
+
+void DenoiserEngine::FinishLearned() {
+    const std::size_t bins = m_windows[kTrackIndex].Bins();
+    for (std::size_t c = 0; c < kMostChannels && HasLearned(); ++c) {
+        BestSpectrumKernels().logarithm(m_learned[c][kTrackIndex].data(), m_order.data(), m_order.size());
+        const auto middle = m_order.begin() + static_cast<std::ptrdiff_t>(bins / 2);
+        std::nth_element(m_order.begin(), middle, m_order.begin() + static_cast<std::ptrdiff_t>(bins));
+        m_learnedReference[c] = *middle;
+    }
+    ChooseMode(m_mode == ProfileMode::Following);
+}
+
+void DenoiserEngine::GiveRoom(NoiseProfile& profile) const {
+    for (auto& channel : profile.power)
+        for (std::size_t i = 0; i < kLengths; ++i) channel[i].resize(m_windows[i].Bins());
+}
+
+void DenoiserEngine::Export(NoiseProfile& profile) const {
+    profile.seconds = m_learnedSeconds;
+    profile.rate = static_cast<std::uint32_t>(m_rate);
+    profile.channels = static_cast<std::uint32_t>(HasLearned() ? m_learnedChannels : 0);
+    for (std::size_t c = 0; c < kMostChannels; ++c)
+        for (std::size_t i = 0; i < kLengths; ++i)
+            std::copy_n(m_learned[c][i].begin(), profile.power[c][i].size(), profile.power[c][i].begin());
+}
+
+}  // namespace Corvo::DSP::Denoising

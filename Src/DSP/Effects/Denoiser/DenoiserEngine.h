@@ -1,0 +1,163 @@
+#pragma once
+
+#include <array>
+#include <cstdint>
+#include <type_traits>
+#include <utility>
+#include <vector>
+
+#include "DSP/Effects/Denoiser/NoiseLearner.h"
+#include "DSP/Effects/Denoiser/NoiseTracker.h"
+#include "DSP/Effects/Denoiser/Pace.h"
+#include "DSP/Effects/Denoiser/SizeBlend.h"
+
+namespace Corvo::DSP::Denoising {
+
+constexpr std::size_t kGainBands = 8;  // octaves from 63 Hz to 8 kHz
+
+enum class ProfileMode { Learned, Following, Adaptive };
+
+// What the parameters come to.
+struct EngineSettings {
+    ProfileMode profile = ProfileMode::Adaptive;
+    int sizeSet = 0;
+    bool learn = false, music = false, residue = false;
+    float reductionDb = 25.0f, sensitivityDb = 0.7f, mix = 1.0f;
+    GainSettings gains;
+    std::array<float, kGainBands> gainDb{};   // of the profile
+    std::array<float, kGainBands> rangeDb{};  // deepest attenuation
+};
+
+// The noise reducer without the effect around it: one or two channels, audio in, delayed and cleaned audio
+// out. Only Prepare allocates.
+//
+// All work is counted from the stream's first sample and done in pieces every kUnit samples or less, so the
+// output does not depend on how the stream is cut, and no block pays for a whole long transform.
+class DenoiserEngine {
+public:
+    // Makes all memory for a rate and any settings, and starts a stream.
+    void Prepare(double rate, std::size_t channels);
+    // Starts a stream in another format. Window lengths stay as they were prepared.
+    void SetFormat(double rate, std::size_t channels);
+    // Takes settings from the next sample on. The first ones after a start apply without a glide.
+    void Apply(const EngineSettings& settings);
+
+    // Processes one sample per channel after the other. `at(channel, frame)` refers to a sample.
+    template <typename At>
+    void Run(int frames, At at);
+
+    // The learned noise, in today's format.
+    void Adopt(const NoiseProfile& profile);
+    void Forget() { Adopt(NoiseProfile{}); }
+    bool HasLearned() const { return m_learnedSeconds > 0.0; }
+    // True once after a passage has been learned; Export then fills a profile whose spectra have been given
+    // room.
+    bool TakeNewlyLearned() { return std::exchange(m_newlyLearned, false); }
+    void Export(NoiseProfile& profile) const;
+    void GiveRoom(NoiseProfile& profile) const;
+
+    const Format_t& Format() const { return m_format; }
+
+private:
+    struct Curves {
+        Floats offset, floor, logFloor;  // the profile's offset as a factor, the floor and its logarithm
+        Floats band;                     // per bin the place between the gain bands
+    };
+    struct Glide {
+        double value = 0.0, target = 0.0, step = 0.0;
+        int left = 0;
+        void Set(double to, int frames);
+        double Next() {
+            if (left > 0) value = --left == 0 ? target : value + step;
+            return value;
+        }
+    };
+
+    void Start(bool afterSound);
+    void Layout(Arena& arena);
+    void PlacePaces();
+    void CookCurves();
+    void AimOutput(bool glide);
+    void EndLearning();
+    void FinishLearned();
+    void ChooseMode(bool restart);
+    bool Tracks() const { return m_mode != ProfileMode::Learned; }
+    void Tick();
+    NoiseAt NoiseFor(std::size_t channel, std::size_t size, std::int64_t centre) const;
+    const SampleRing& Wet(std::size_t channel) const {
+        return m_set->count > 1 ? m_blended[channel] : m_sized[0][channel];
+    }
+    std::size_t LengthIndex(std::size_t size) const;
+
+    Scale m_scale;
+    double m_rate = 0.0;
+    std::size_t m_channels = 0;
+    Format_t m_format;
+    EngineSettings m_settings;
+    const SizeSet* m_set = &kSizeSets[0];
+    ProfileMode m_mode = ProfileMode::Adaptive;  // in use: "Learned" needs a profile
+    bool m_fresh = true;                         // no settings yet
+
+    std::array<WindowTables, kLengths> m_windows;
+    std::array<SpectrumConversion, kLengths> m_conversions;
+    TrackerTables m_trackerTables;
+    std::array<Curves, kLengths> m_curves;
+    NoiseLearner m_learner;
+    std::array<std::array<Floats, kLengths>, kMostChannels> m_learned;
+    std::array<float, kMostChannels> m_learnedReference{};
+    std::array<Floats, 2> m_passage;
+    Floats m_order;
+    double m_learnedSeconds = 0.0;
+    std::size_t m_learnedChannels = 0;
+    bool m_newlyLearned = false;
+
+    Arena m_arena;
+    std::vector<double> m_dry;  // rings, one after the other
+    std::array<SampleRing, kMostChannels> m_input, m_blended;
+    std::array<std::array<SampleRing, kMostChannels>, 3> m_sized;
+    std::array<NoiseTracker, kMostChannels> m_trackers;
+    std::array<SizeReducer, 3> m_reducers;
+    SizeBlend m_blend;
+    std::array<Pace, 3> m_reducerPaces;
+    std::array<Pace, kMostChannels> m_trackerPaces;
+    Pace m_blendPace;
+    std::array<SizeReducer::Job, 3> m_jobs;
+
+    int m_tick = kUnit;
+    std::int64_t m_time = 0, m_dryTime = 0, m_wetFrom = 0;
+    Glide m_dryGain, m_wetGain;
+    // Where the latency changes, the sound moves over from the one delay to the other.
+    Glide m_jump;
+    std::int64_t m_latencyBefore = 0;
+};
+
+template <typename At>
+void DenoiserEngine::Run(int frames, At at) {
+    constexpr double kMost = 1048576.0;  // +120 dB: nothing that could not be squared and summed
+    const std::size_t mask = m_dry.size() / kMostChannels - 1;
+    const std::int64_t latency = m_format.latency;
+    for (int done = 0; done < frames;) {
+        const int count = std::min(frames - done, m_tick - static_cast<int>(m_time % m_tick));
+        for (int i = done; i < done + count; ++i, ++m_time, ++m_dryTime) {
+            const double dryGain = m_dryGain.Next(), wetGain = m_wetGain.Next(), jump = m_jump.Next();
+            for (std::size_t c = 0; c < m_channels; ++c) {
+                auto& sample = at(c, i);
+                double* const dry = m_dry.data() + c * (mask + 1);
+                const double in = static_cast<double>(sample);
+                dry[static_cast<std::size_t>(m_dryTime) & mask] = in;
+                m_input[c][m_time] = static_cast<float>(std::clamp(in, -kMost, kMost));
+                double delayed = dry[static_cast<std::size_t>(m_dryTime - latency) & mask];
+                if (jump != 0.0)
+                    delayed +=
+                        jump * (dry[static_cast<std::size_t>(m_dryTime - m_latencyBefore) & mask] - delayed);
+                const double wet = m_time < latency ? 0.0 : static_cast<double>(Wet(c)[m_time - latency]);
+                sample =
+                    static_cast<std::remove_reference_t<decltype(sample)>>(dryGain * delayed + wetGain * wet);
+            }
+        }
+        done += count;
+        if (m_time % m_tick == 0) Tick();
+    }
+}
+
+}  // namespace Corvo::DSP::Denoising

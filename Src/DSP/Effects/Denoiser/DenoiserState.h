@@ -1,0 +1,97 @@
+#pragma once
+
+#include <atomic>
+#include <memory>
+
+#include "DSP/Effects/Denoiser/DenoiserEngine.h"
+#include "DSP/Effects/Denoiser/DenoiserProcessor.h"
+#include "Threads/LatestValue.h"
+
+namespace Corvo::DSP::DenoiserPrivate {
+
+using Denoising::DenoiserEngine;
+using Denoising::NoiseProfile;
+
+// The engine, and the learned noise on its way between the threads.
+//
+// The audio thread learns and hands the whole profile to the user-interface thread, which keeps it for the
+// chunk; a chunk's profile, or none after "Clear profile", goes the other way. Each of those gets a number,
+// so that what was learned before it and arrives later is dropped.
+struct State {
+    tWAVEFORMATEX format{};  // the audio thread's
+    std::unique_ptr<DenoiserEngine> engine;
+    std::atomic<std::uint32_t> rate{48000};
+    std::atomic<bool> clearRequested{false};  // by automation, on the audio thread
+
+    // User-interface thread.
+    const NoiseProfile& Known() {
+        if (const auto* newest = m_fromAudio.Take(); newest && newest->generation == m_generation)
+            m_known = *newest;
+        return m_known;
+    }
+    void Load(NoiseProfile profile) {
+        Known();
+        m_known = std::move(profile);
+        m_known.generation = ++m_generation;
+        m_toAudio.Draft() = m_known;
+        m_toAudio.Publish();
+    }
+
+    // No block is being processed.
+    void Prepare(double preparedRate, std::size_t channels) {
+        Keep();
+        if (!engine) engine = std::make_unique<DenoiserEngine>();
+        engine->Prepare(preparedRate, channels);
+        engine->Adopt(m_kept);
+        // Every slot of what the audio thread will hand over gets its room; a value on its way is taken
+        // first.
+        Known();
+        for (int slot = 0; slot < 3; ++slot) {
+            engine->GiveRoom(m_fromAudio.Draft());
+            m_fromAudio.Publish();
+            m_fromAudio.Take();
+        }
+        rate.store(static_cast<std::uint32_t>(preparedRate));
+    }
+    void Free() {
+        Keep();
+        engine.reset();
+    }
+
+    // Audio thread.
+    void TakeProfiles() {
+        if (const auto* loaded = m_toAudio.Take()) {
+            engine->Adopt(*loaded);
+            m_taken = loaded->generation;
+        }
+        if (clearRequested.exchange(false, std::memory_order_acquire)) {
+            engine->Forget();
+            HandOver();
+        }
+    }
+    void HandOverLearned() {
+        if (engine->TakeNewlyLearned()) HandOver();
+    }
+
+private:
+    void HandOver() {
+        auto& draft = m_fromAudio.Draft();
+        engine->Export(draft);
+        draft.generation = m_taken;
+        m_fromAudio.Publish();
+    }
+    // What the engine has learned outlives it.
+    void Keep() {
+        if (!engine) return;
+        engine->GiveRoom(m_kept);
+        engine->Export(m_kept);
+    }
+
+    LatestValue<NoiseProfile> m_toAudio, m_fromAudio;
+    NoiseProfile m_known;            // user-interface thread
+    std::uint32_t m_generation = 0;  // user-interface thread
+    std::uint32_t m_taken = 0;       // audio thread
+    NoiseProfile m_kept;
+};
+
+}  // namespace Corvo::DSP::DenoiserPrivate

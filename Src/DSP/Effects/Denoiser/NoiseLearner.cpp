@@ -1,0 +1,80 @@
+#include "DSP/Effects/Denoiser/NoiseLearner.h"
+
+#include <algorithm>
+
+namespace Corvo::DSP::Denoising {
+namespace {
+
+// Windows up to this length are so many, and so quickly done, that each is taken as soon as it is complete;
+// of the longer ones one at a time.
+constexpr std::size_t kShortLengths = 2;
+
+}  // namespace
+
+void NoiseLearner::Prepare(std::span<WindowTables, kLengths> windows) {
+    m_windows = windows.data();
+    m_active = false;
+    for (auto& channel : m_sums)
+        for (std::size_t i = 0; i < kLengths; ++i) channel[i].resize(windows[i].Bins());
+    m_re.resize(windows.back().Half());
+    m_im.resize(windows.back().Half());
+    m_power.resize(windows.back().Values());
+}
+
+void NoiseLearner::Begin(std::int64_t place, std::size_t channels) {
+    m_active = true;
+    m_begin = place;
+    m_channels = channels;
+    m_count = {};
+    for (auto& channel : m_sums)
+        for (auto& sums : channel) std::ranges::fill(sums, 0.0);
+}
+
+void NoiseLearner::Run(std::int64_t place, std::span<const SampleRing> input) {
+    for (std::size_t which = 0; which < kShortLengths; ++which)
+        while (TakeWindow(which, place, input)) {
+        }
+    for (std::size_t which = kShortLengths; which < kLengths; ++which)
+        if (TakeWindow(which, place, input)) return;
+}
+
+bool NoiseLearner::End(std::int64_t place, std::span<const SampleRing> input) {
+    for (std::size_t which = 0; which < kLengths; ++which)
+        while (TakeWindow(which, place, input)) {
+        }
+    m_active = false;
+    m_end = place;
+    return m_count.front() > 0;
+}
+
+bool NoiseLearner::TakeWindow(std::size_t which, std::int64_t place, std::span<const SampleRing> input) {
+    auto& tables = m_windows[which];
+    const std::int64_t start = m_begin + m_count[which] * (tables.length / kOverlap);
+    if (start + tables.length > place) return false;
+    for (std::size_t c = 0; c < m_channels; ++c) {
+        // A passage begins anywhere, so the ring's end may cut it anywhere.
+        input[c].ForEachRun(start, static_cast<std::size_t>(tables.length),
+                            [&](const float* samples, std::size_t done, std::size_t count) {
+                                std::copy_n(samples, count, tables.scratch.data() + done);
+                            });
+        const auto& kernels = BestSpectrumKernels();
+        kernels.multiply(tables.scratch.data(), tables.scratch.data(), tables.analysis.data(),
+                         static_cast<std::size_t>(tables.length));
+        tables.fft.DoFFTReal(tables.scratch.data(), m_re.data(), m_im.data(), tables.length, 0);
+        kernels.power(m_re.data(), m_im.data(), m_power.data(), tables.Half());
+        auto& sums = m_sums[c][which];
+        for (std::size_t bin = 0; bin < sums.size(); ++bin) sums[bin] += static_cast<double>(m_power[bin]);
+    }
+    ++m_count[which];
+    return true;
+}
+
+const float* NoiseLearner::Mean(std::size_t channel, std::size_t which) {
+    if (m_count[which] == 0) return nullptr;
+    const auto& sums = m_sums[channel][which];
+    for (std::size_t bin = 0; bin < sums.size(); ++bin)
+        m_power[bin] = static_cast<float>(sums[bin] / static_cast<double>(m_count[which]));
+    return m_power.data();
+}
+
+}  // namespace Corvo::DSP::Denoising

@@ -1,0 +1,71 @@
+#include "DSP/Effects/Denoiser/SpectrumConversion.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace Corvo::DSP::Denoising {
+namespace {
+
+constexpr std::size_t kResponseBins = 3;  // of the shorter window, to either side
+
+}  // namespace
+
+void Resample(const float* from, std::size_t fromCount, double step, float* to, std::size_t count) {
+    for (std::size_t i = 0; i < count; ++i) {
+        const double place = step * static_cast<double>(i);
+        const std::size_t below = std::min(static_cast<std::size_t>(place), fromCount - 1);
+        const std::size_t above = std::min(below + 1, fromCount - 1);
+        const auto share = static_cast<float>(place - std::floor(place));
+        to[i] = from[below] + (from[above] - from[below]) * share;
+    }
+}
+
+void SpectrumConversion::Prepare(const WindowTables& from, const WindowTables& to) {
+    m_fromBins = from.Bins();
+    m_toBins = to.Bins();
+    m_scale = static_cast<float>(to.length) / static_cast<float>(from.length);
+    m_shorter = to.length < from.length;
+    m_ratio = static_cast<std::size_t>(std::max(to.length, from.length) / std::min(to.length, from.length));
+    m_response.clear();
+    if (!m_shorter) return;
+
+    const auto length = static_cast<std::size_t>(from.length);
+    std::vector<double> window(length), re(length / 2), im(length / 2);
+    std::ranges::copy(to.analysis, window.begin());
+    CorvoFFT fft;
+    fft.AllocateReal(from.length, 0);
+    fft.DoFFTReal(window.data(), re.data(), im.data(), from.length, 0);
+    fft.Free();
+    im[0] = 0.0;  // the highest bin's place
+    const std::size_t half = kResponseBins * m_ratio;
+    // By Parseval: the sum over all bins is length * sum(window^2).
+    const double total = 0.5 * static_cast<double>(to.length) * from.length;
+    m_response.resize(half + 1);
+    for (std::size_t i = 0; i <= half; ++i)
+        m_response[i] = m_scale * static_cast<float>((re[i] * re[i] + im[i] * im[i]) / total);
+    m_mirrored.resize(from.Values() + 2 * half);
+    m_seen.resize(from.Values());
+}
+
+void SpectrumConversion::Run(const float* from, float* to) {
+    if (!m_shorter) {
+        for (std::size_t i = 0; i + 1 < m_fromBins; ++i) {
+            const float step = m_scale * (from[i + 1] - from[i]) / static_cast<float>(m_ratio);
+            for (std::size_t j = 0; j < m_ratio; ++j)
+                to[i * m_ratio + j] = m_scale * from[i] + step * static_cast<float>(j);
+        }
+        to[m_toBins - 1] = m_scale * from[m_fromBins - 1];
+        return;
+    }
+    const std::size_t half = m_response.size() - 1;
+    std::copy_n(from, m_fromBins, m_mirrored.data() + half);
+    for (std::size_t i = 1; i <= half; ++i) {
+        m_mirrored[half - i] = from[i];
+        m_mirrored[half + m_fromBins - 1 + i] = from[m_fromBins - 1 - i];
+    }
+    BestSpectrumKernels().smoothBins(m_mirrored.data() + half, m_seen.data(), m_response.data(),
+                                     static_cast<int>(half), 0, m_seen.size());
+    for (std::size_t i = 0; i < m_toBins; ++i) to[i] = m_seen[i * m_ratio];
+}
+
+}  // namespace Corvo::DSP::Denoising

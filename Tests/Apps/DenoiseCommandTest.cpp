@@ -1,0 +1,87 @@
+#include <gtest/gtest.h>
+
+#include <cmath>
+
+#include "Apps/Program.h"
+
+namespace AppTest {
+namespace {
+
+class DenoiseCommand : public Program {};
+
+// Noise alone for two seconds, then with a tone.
+Sound Recording(int rate, int channels = 1) {
+    Sound sound = NoiseSound(static_cast<std::size_t>(4 * rate), channels, kDouble);
+    sound.rate = rate;
+    for (std::size_t i = 0; i < sound.samples.size(); ++i) {
+        const double t = static_cast<double>(i / static_cast<std::size_t>(channels)) / rate;
+        sound.samples[i] = 0.05 * sound.samples[i] + (t > 2.0 ? 0.4 * std::sin(2764.6 * t) : 0.0);
+    }
+    return sound;
+}
+
+double Power(const Sound& sound, double from, double to) {
+    double sum = 0.0;
+    const auto at = [&](double t) {
+        return static_cast<std::size_t>(t * sound.rate) * static_cast<std::size_t>(sound.channels);
+    };
+    for (std::size_t i = at(from); i < at(to); ++i) sum += sound.samples.at(i) * sound.samples[i];
+    return 10.0 * std::log10(sum / static_cast<double>(at(to) - at(from)));
+}
+
+// Catches output that is late or short, a residue that is not what is missing, passages that are not heeded,
+// and settings that are not applied over the profile's.
+TEST_F(DenoiseCommand, LearnsAndCleansInOneCommand) {
+    const Sound in = Recording(48000);
+    Save("in.wav", in);
+    Succeed("denoise in.wav out.wav --learn 0.2:1 --learn 0.9:1.8 --residue gone.wav --save-profile hiss -q");
+    const Sound out = Load("out.wav"), gone = Load("gone.wav");
+    ASSERT_EQ(out.Frames(), in.Frames());
+    ASSERT_EQ(gone.Frames(), in.Frames());
+    for (std::size_t i = 0; i < in.samples.size(); ++i)
+        ASSERT_NEAR(out.samples[i] + gone.samples[i], in.samples[i], 1e-12) << "sample " << i;
+    EXPECT_NEAR(Power(in, 0.3, 1.7) - Power(out, 0.3, 1.7), 25.0, 2.0);
+    EXPECT_NEAR(Power(in, 2.5, 3.5), Power(out, 2.5, 3.5), 0.1);
+
+    Save("other.wav", Recording(96000, 2));
+    Succeed("denoise other.wav clean.wav --profile hiss --set \"Reduction=10 dB, FFT size=2048\" -q");
+    const Sound other = Load("other.wav"), clean = Load("clean.wav");
+    // At twice the rate the noise's density is half of what was learned, so all of it counts as noise.
+    EXPECT_NEAR(Power(other, 0.3, 1.7) - Power(clean, 0.3, 1.7), 10.0, 1.0);
+    EXPECT_NEAR(Power(other, 2.5, 3.5), Power(clean, 2.5, 3.5), 0.2);
+    Succeed("denoise in.wav adaptive.wav -q");
+    EXPECT_NEAR(Power(in, 0.5, 1.7) - Power(Load("adaptive.wav"), 0.5, 1.7), 25.0, 3.0);
+
+    // The profile's line runs along the noise: white, so level.
+    const auto table = Succeed("spectrum in.wav --csv - --profile hiss --length 1024 -q");
+    ASSERT_TRUE(table.starts_with("frequency_hz,level_db,profile_db\n"));
+    const auto row = table.find("\n12000.0000,");
+    ASSERT_NE(row, table.npos);
+    const auto level = table.find(',', row) + 1, profile = table.find(',', level) + 1;
+    EXPECT_NEAR(std::stod(table.substr(level)), std::stod(table.substr(profile)), 1.5);
+}
+
+TEST_F(DenoiseCommand, RefusesWhatItCannotDo) {
+    Save("in.wav", Recording(48000));
+    SaveBytes("junk", "no profile");
+    const struct {
+        const char *arguments, *words;
+    } cases[] = {{"--learn 1", "--learn|accepted: FROM:TO"},
+                 {"--learn 2:1", "2:1|accepted"},
+                 {"--learn -1:1", "-1:1|accepted"},
+                 {"--learn 3:5", "3:5|in.wav|4.00 s"},
+                 {"--learn 1:1.002", "1:1.002|too short"},
+                 {"--profile junk", "junk|no noise profile"},
+                 {"--profile missing", "missing"},
+                 {"--save-profile p", "--save-profile|--learn"},
+                 {"--set Reduktion=3", "Reduktion|did you mean|Reduction"},
+                 {"--residue in.wav -y", "in.wav"}};
+    for (const auto& [arguments, words] : cases) {
+        SCOPED_TRACE(arguments);
+        ExpectRefused(Run(std::string("denoise in.wav out.wav -q ") + arguments), words);
+    }
+    ExpectRefused(Run("denoise - out.wav --learn 0:1 -q", Bytes("in.wav")), "--learn|standard input");
+}
+
+}  // namespace
+}  // namespace AppTest

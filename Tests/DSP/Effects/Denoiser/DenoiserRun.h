@@ -1,0 +1,59 @@
+#pragma once
+
+#include <string>
+
+#include "DSP/Effects/Denoiser/DenoiserProcessor.h"
+#include "Support/EffectRun.h"
+
+namespace TestSupport {
+
+using Corvo::DSP::DenoiserProcessor;
+
+enum DenoiserParameter { kProfile, kLearn, kClear, kReduction, kSensitivity, kSize = 8, kListen = 10, kMix };
+constexpr float kLearned = 0.0f, kFollowing = 0.5f, kAdaptive = 1.0f;
+
+inline void SetText(DenoiserProcessor& denoiser, int index, const std::string& text) {
+    denoiser.SetParam(index, denoiser.GetParamValueNormalizedFromText(index, text), false);
+}
+
+// Learns from `noise`, interleaved; further passages add up.
+template <typename Sample>
+void Learn(DenoiserProcessor& denoiser, std::vector<Sample> noise, const tWAVEFORMATEX& format) {
+    noise.resize(noise.size() + format.nChannels);
+    const int frames = static_cast<int>(noise.size() / format.nChannels) - 1;
+    denoiser.InitProcessing(frames, &format);
+    denoiser.SetParam(kLearn, 1.0f, false);
+    ProcessBlock(denoiser, noise.data(), frames, format);
+    denoiser.SetParam(kLearn, 0.0f, false);
+    ProcessBlock(denoiser, noise.data() + noise.size() - format.nChannels, 1, format);
+}
+
+// What becomes of the samples, the latency taken out.
+template <typename Sample>
+std::vector<Sample> Clean(DenoiserProcessor& denoiser, const std::vector<Sample>& samples,
+                          const tWAVEFORMATEX& format) {
+    denoiser.InitProcessing(512, &format);
+    const auto late = static_cast<std::ptrdiff_t>(denoiser.GetLatency() * format.nChannels);
+    std::vector<Sample> padded = samples;
+    for (std::ptrdiff_t i = 0; i < late; ++i) padded.push_back(0);
+    padded = Render(denoiser, padded, format, {512});
+    return {padded.begin() + late, padded.end()};
+}
+
+// The mean power from one second to another, in decibels.
+template <typename Sample>
+double Level(const std::vector<Sample>& mono, double from, double to, int rate = 48000) {
+    double sum = 0.0;
+    const auto first = static_cast<std::size_t>(from * rate), last = static_cast<std::size_t>(to * rate);
+    for (std::size_t i = first; i < last; ++i)
+        sum += static_cast<double>(mono.at(i)) * static_cast<double>(mono[i]);
+    return 10.0 * std::log10(sum / static_cast<double>(last - first) + 1e-30);
+}
+
+template <typename Sample>
+std::vector<Sample> Sum(std::vector<Sample> a, const std::vector<Sample>& b, double gain = 1.0) {
+    for (std::size_t i = 0; i < a.size(); ++i) a[i] += static_cast<Sample>(gain) * b.at(i);
+    return a;
+}
+
+}  // namespace TestSupport
