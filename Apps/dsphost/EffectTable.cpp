@@ -8,6 +8,7 @@
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
+#include "DSP/Effects/PitchDoctor/PitchDoctor.h"
 #include "DSP/Effects/PitchShift/PitchShift.h"
 #include "DSP/Effects/Reverb/Reverb.h"
 #include "DSP/Effects/Tremolo/Autovol.h"
@@ -33,6 +34,7 @@ constexpr EffectFactory kEffects[]{
     Make<Corvo::DSP::TubeDistorsion>,
     Make<Corvo::DSP::Phaser>,
     Make<Corvo::DSP::PitchShift>,
+    Make<Corvo::DSP::PitchDoctor>,
     Make<Corvo::DSP::Compressor>,
     Make<Corvo::DSP::Reverb>,
 };

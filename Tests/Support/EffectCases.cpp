@@ -7,6 +7,7 @@
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
+#include "DSP/Effects/PitchDoctor/PitchDoctor.h"
 #include "DSP/Effects/PitchShift/PitchShift.h"
 #include "DSP/Effects/Reverb/Reverb.h"
 #include "DSP/Effects/Tremolo/Autovol.h"
@@ -40,6 +41,7 @@ constexpr std::array kEffects{
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
+    EffectCase{.name = "Cantrix", .make = Make<PitchDoctor>},
 };
 
 }  // namespace

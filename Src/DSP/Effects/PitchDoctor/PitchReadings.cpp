@@ -1,0 +1,31 @@
+#include "DSP/Effects/PitchDoctor/PitchReadings.h"
+
+#include <cmath>
+
+namespace Corvo::DSP {
+
+std::vector<DecidedNote> NotesOf(std::span<const PitchReading> readings, std::int64_t longestPause) {
+    constexpr int kLeastReadings = 3;
+    std::vector<DecidedNote> notes;
+    int count = 0;  // readings of the last note
+    const auto leaveOutShort = [&] {
+        if (!notes.empty() && count < kLeastReadings) notes.pop_back();
+        count = 0;
+    };
+    for (const auto& reading : readings) {
+        if (!reading.IsVoiced() || reading.note < 0) continue;
+        if (count == 0 || notes.back().note != reading.note ||
+            reading.position - notes.back().end > longestPause) {
+            leaveOutShort();
+            notes.push_back({reading.position, reading.position, reading.note, 0.0f});
+        }
+        auto& note = notes.back();
+        note.end = reading.position;
+        const float cents = 1200.0f * std::log2(reading.heardHz / reading.noteHz);
+        note.heardCents += (cents - note.heardCents) / static_cast<float>(++count);
+    }
+    leaveOutShort();
+    return notes;
+}
+
+}  // namespace Corvo::DSP
