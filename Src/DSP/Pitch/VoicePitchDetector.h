@@ -8,6 +8,8 @@
 
 namespace Corvo::DSP {
 
+class VoicePitchAnalysis;
+
 struct VoicePitchSettings {
     double rate = 48000.0;      // Hz, limited to 1000..768000
     double lowestHz = 75.0;     // limited to 20..1000; the delay grows with its period
@@ -72,8 +74,7 @@ public:
     std::span<const VoicePitchCandidate> Candidates() const;
 
 private:
-    struct State;
-    std::unique_ptr<State> m_state;
+    std::unique_ptr<VoicePitchAnalysis> m_analysis;
 };
 
 }  // namespace Corvo::DSP

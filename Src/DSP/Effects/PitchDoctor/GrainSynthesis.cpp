@@ -17,6 +17,8 @@ constexpr double kKeptBelow = 450.0, kKeptTo = 650.0;  // Hz: formants are kept 
 // of the spacing: five cents.
 constexpr double kReturn = 0.003;
 
+using Batch = xsimd::make_sized_batch_t<double, 2>;
+
 constexpr int kPhases = 512;
 constexpr double kBeta = 7.0;
 
@@ -71,6 +73,25 @@ const SincTable<16>& Sincs() {
     return table;
 }
 
+// The value between in[kTaps / 2 - 1] and the sample behind it, at `share` of the way.
+template <int kTaps>
+double ReadAt(const SincTable<kTaps>& table, double share, const double* in) {
+    const double place = share * kPhases;
+    const auto phase = static_cast<std::size_t>(place);
+    const Batch rest(place - static_cast<double>(phase));
+    const double *const before = table.rows[phase].data(), *const after = table.rows[phase + 1].data();
+    Batch sums[2] = {Batch(0.0), Batch(0.0)};
+    for (int tap = 0; tap < kTaps; tap += 4)
+        for (int half = 0; half < 2; ++half) {
+            const int at = tap + 2 * half;
+            const Batch low = Batch::load_unaligned(before + at), high = Batch::load_unaligned(after + at);
+            sums[half] += (low + rest * (high - low)) * Batch::load_unaligned(in + at);
+        }
+    double lanes[2];
+    (sums[0] + sums[1]).store_unaligned(lanes);
+    return lanes[0] + lanes[1];
+}
+
 // 0.5 + 0.5 cos(pi t), 0 <= t <= 1: the sine's series around the middle.
 double HalfCosine(double t) {
     const double x = std::numbers::pi * (0.5 - t), y = x * x;
@@ -84,7 +105,6 @@ double HalfCosine(double t) {
 // out[i] = sum of taps[k] * in[i + k], added up in that order for every i.
 template <std::size_t kTaps>
 void Filter(const std::array<double, kTaps>& taps, const double* in, double* out, int count) {
-    using Batch = xsimd::make_sized_batch_t<double, 2>;
     int i = 0;
     for (; i + 8 <= count; i += 8) {
         Batch a(0.0), b(0.0), c(0.0), d(0.0);
@@ -222,6 +242,7 @@ void GrainSynthesis::Render(std::array<const SampleHistory<double>*, 2> input, i
                             std::int64_t from, int frames,
                             std::array<std::array<double, kMostFrames>, 2>& output) {
     std::array<double, kMostFrames> weights{}, window{}, read{};
+    const auto& sincs = Sincs();
     for (auto& channel : output) channel.fill(0.0);
     const auto grain = [&](std::int64_t number) -> Grain& {
         return m_grains[static_cast<std::size_t>(number) % m_grains.size()];
@@ -246,12 +267,10 @@ void GrainSynthesis::Render(std::array<const SampleHistory<double>*, 2> input, i
         for (std::size_t i = b; i < e; ++i) weights[i] += window[i];
         for (std::size_t c = 0; c < static_cast<std::size_t>(channels); ++c) {
             if (g.speed != 1.0) {
-                std::array<double, kTaps> taps;
                 for (int i = begin; i < end; ++i) {
                     const double place = g.mark + (start + i - g.centre) * g.speed, whole = std::floor(place);
-                    Sincs().Take(place - whole, taps);
-                    Filter(taps, input[c]->At(static_cast<std::int64_t>(whole) - kTaps / 2 + 1),
-                           read.data() + i, 1);
+                    const double* const at = input[c]->At(static_cast<std::int64_t>(whole) - kTaps / 2 + 1);
+                    read[static_cast<std::size_t>(i)] = ReadAt(sincs, place - whole, at);
                 }
             } else if (g.aligned) {
                 std::copy_n(input[c]->At(from + begin + g.shift), end - begin, read.data() + begin);

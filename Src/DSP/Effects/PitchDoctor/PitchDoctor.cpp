@@ -42,6 +42,12 @@ struct PitchDoctor::Engines {
         if (engine && engine != inUse) engine->Clear();
         inUse = engine;
     }
+    template <typename Sample>
+    void Run(std::array<Sample*, MaxNumChannels> samples, int channels, int frames, std::ptrdiff_t stride) {
+        if (frames < 1 || channels < 1 || !inUse) return;
+        const bool wanted = published.load(std::memory_order_relaxed);
+        inUse->Process(samples, channels, frames, stride, wanted ? &readings : nullptr);
+    }
 };
 
 PitchDoctor::PitchDoctor()
@@ -138,19 +144,11 @@ void PitchDoctor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     if (m_engines->inUse) m_engines->inUse->Cook(VoiceOf(settings));
 }
 
-template <typename Sample>
-void PitchDoctor::Run(std::array<Sample*, MaxNumChannels> samples, int channels, int frames,
-                      std::ptrdiff_t stride) {
-    if (frames < 1 || channels < 1 || !m_engines->inUse) return;
-    const bool published = m_engines->published.load(std::memory_order_relaxed);
-    m_engines->inUse->Process(samples, channels, frames, stride, published ? &m_engines->readings : nullptr);
-}
-
 void PitchDoctor::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     const int channels = format->nChannels;
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&]<typename Sample>(Sample* samples) {
-        Run<Sample>({samples, samples + 1}, std::min(channels, MaxNumChannels), frames, channels);
+        m_engines->Run<Sample>({samples, samples + 1}, std::min(channels, MaxNumChannels), frames, channels);
     });
 }
 
@@ -160,7 +158,7 @@ void PitchDoctor::ProcessInternalNoninterleaved(double* const* channels, int fra
     const int count = std::min<int>(format->nChannels, MaxNumChannels);
     if (count < 1) return;
     WithChannels(channels, *format, OtherWidths::AreFloat, [&]<typename Sample>(Sample* const* buffers) {
-        Run<Sample>({buffers[0], count == 2 ? buffers[1] : nullptr}, count, frames, 1);
+        m_engines->Run<Sample>({buffers[0], count == 2 ? buffers[1] : nullptr}, count, frames, 1);
     });
 }
 

@@ -95,8 +95,6 @@ protected:
 private:
     struct Engines;
 
-    template <typename Sample>
-    void Run(std::array<Sample*, MaxNumChannels> samples, int channels, int frames, std::ptrdiff_t stride);
     // Runs an edit of the user-interface thread and tells the host when it changed the latency.
     template <typename Edit>
     void WatchingLatency(Edit edit);

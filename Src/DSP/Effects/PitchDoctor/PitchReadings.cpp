@@ -4,7 +4,7 @@
 
 namespace Corvo::DSP {
 
-std::vector<DecidedNote> NotesOf(std::span<const PitchReading> readings, std::int64_t longestPause) {
+std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings, std::int64_t longestPause) {
     constexpr int kLeastReadings = 3;
     std::vector<DecidedNote> notes;
     int count = 0;  // readings of the last note

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <cstdint>
-#include <span>
 #include <vector>
 
 #include "Platform/Export.h"
@@ -28,6 +27,7 @@ struct DecidedNote {
 
 // The notes of readings in their order. A pause of up to `longestPause` frames does not end a note; notes of
 // fewer than three readings are left out.
-DSP_API std::vector<DecidedNote> NotesOf(std::span<const PitchReading> readings, std::int64_t longestPause);
+DSP_API std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings,
+                                         std::int64_t longestPause);
 
 }  // namespace Corvo::DSP
