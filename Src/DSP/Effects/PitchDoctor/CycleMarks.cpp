@@ -12,6 +12,7 @@ namespace {
 constexpr double kUnvoicedSeconds = 0.005, kLowPassHz = 2000.0, kStepRate = 24000.0;
 constexpr double kSearch = 0.06, kAlike = 0.5;  // of a period; correlation from which it counts
 constexpr double kPull = 0.05, kMostPull = 0.01;
+constexpr double kNear = 0.3;  // of the distance without voice: marks no closer, and no further off it
 constexpr int kMargin = 8;
 
 }  // namespace
@@ -82,11 +83,16 @@ bool CycleMarks::ExtendUnvoiced(const PitchTrack& track) {
         Add({next, m_unvoicedDistance, false});
         return true;
     }
-    const double period = track.Period(next);
+    const double period = track.Period(next), reach = 0.5 * period + 1.0;
+    if (next + reach > end) return false;
     double place = next;
     for (int round = 0; round < 3; ++round) place += FromEnergy(place, period);
-    place = std::clamp(place, last.place + 0.3 * m_unvoicedDistance + 1.0, next + period);
-    if (place + period > end) return false;
+    if (place > next + kNear * m_unvoicedDistance) {  // a gap would open: one more without voice
+        Add({next, m_unvoicedDistance, false});
+        return true;
+    }
+    place = std::max(place, last.place + kNear * m_unvoicedDistance + 1.0);
+    if (place + reach > end) return false;
     Add({place, period, true});
     return true;
 }

@@ -9,7 +9,8 @@
 namespace Corvo::DSP {
 namespace {
 
-constexpr double kDecideAhead = 1.1;  // spacings in front of a grain's centre
+constexpr double kDecideAhead = 1.1, kDecideLate = 1.0,
+                 kDecideLateUnchanged = 0.7;  // spacings before a grain's centre
 constexpr double kLeastWeight = 0.6;
 constexpr double kClosest = 0.25;                      // spacing of two grains where voice turns to noise
 constexpr double kKeptBelow = 450.0, kKeptTo = 650.0;  // Hz: formants are kept below, and no more above
@@ -134,12 +135,13 @@ void GrainSynthesis::Clear() {
     Sincs();  // made here, not while processing
     m_firstGrain = m_endGrain = 0;
     m_mark = -1;
-    m_centre = 0.0;
+    m_centre = m_rendered = 0.0;
     m_ratio = 1.0;
 }
 
 void GrainSynthesis::Rebase(double samples) {
     m_centre -= samples;
+    m_rendered -= samples;
     for (auto& grain : m_grains) {
         grain.centre -= samples;
         grain.mark -= samples;
@@ -177,9 +179,16 @@ void GrainSynthesis::Add(const CycleMarks& marks, std::int64_t number, double ce
     m_ratio = ratio;
 }
 
+void GrainSynthesis::Widen(const CycleMarks& marks) {
+    if (m_mark + 1 >= marks.End() || m_centre < m_rendered) return;
+    m_grains[static_cast<std::size_t>(m_endGrain - 1) % m_grains.size()].right =
+        marks.At(m_mark + 1).place - marks.At(m_mark).place;
+}
+
 void GrainSynthesis::Place(const CycleMarks& marks, const PitchTrack& track, const GrainSettings& settings,
                            double until) {
     if (m_mark < 0) Add(marks, marks.First(), marks.At(marks.First()).place, 1.0, settings);
+    Widen(marks);
     while (m_endGrain - m_firstGrain < static_cast<std::int64_t>(m_grains.size()) &&
            (marks.At(m_mark).voiced ? PlaceVoiced(marks, track, settings, until)
                                     : PlaceUnvoiced(marks, settings, until))) {
@@ -196,8 +205,12 @@ bool GrainSynthesis::PlaceVoiced(const CycleMarks& marks, const PitchTrack& trac
     else if (m_mark > marks.First() && marks.At(m_mark - 1).voiced)
         spacing = mark.place - marks.At(m_mark - 1).place;
     const double guess = m_centre + spacing / m_ratio;
-    if (until < guess - kDecideAhead * spacing / std::min(Speed(mark, m_ratio, settings), 1.0) - 2.0)
-        return false;
+    const double width = spacing / std::min(Speed(mark, m_ratio, settings), 1.0);
+    if (until < guess - kDecideAhead * width - 2.0) return false;
+    // The next mark may be late where the voice is low; until it opens, the grain can wait for it, and longer
+    // where nothing is corrected, as the one before alone is the input then.
+    const double latest = m_ratio == 1.0 ? kDecideLateUnchanged : kDecideLate;
+    if (m_mark + 1 >= marks.End() && until < guess - latest * width - 2.0) return false;
     std::int64_t next = marks.Nearest(guess, m_mark);
     const auto& content = marks.At(next);
     if (!content.voiced) {  // noise stands where it was
@@ -251,6 +264,7 @@ void GrainSynthesis::Render(std::array<const SampleHistory<double>*, 2> input, i
     while (m_firstGrain + 1 < m_endGrain && static_cast<double>(from) > last(grain(m_firstGrain)))
         ++m_firstGrain;
     const auto start = static_cast<double>(from);
+    m_rendered = start + frames;
     for (std::int64_t number = m_firstGrain; number < m_endGrain; ++number) {
         const Grain& g = grain(number);
         const double open = std::ceil(g.centre - g.left / g.speed - start);

@@ -47,6 +47,8 @@ private:
         bool aligned = false;  // at speed 1: no reading between samples
     };
 
+    // Widens or narrows the newest grain to reach the next mark, which may be known only now.
+    void Widen(const CycleMarks& marks);
     void Add(const CycleMarks& marks, std::int64_t mark, double centre, double ratio,
              const GrainSettings& settings);
     bool PlaceVoiced(const CycleMarks& marks, const PitchTrack& track, const GrainSettings& settings,
@@ -59,6 +61,7 @@ private:
     std::int64_t m_firstGrain = 0, m_endGrain = 0;
     std::int64_t m_mark = -1;  // of the newest grain
     double m_centre = 0.0, m_ratio = 1.0;
+    double m_rendered = 0.0;  // the output's end
 };
 
 }  // namespace Corvo::DSP
