@@ -156,24 +156,6 @@ TEST_P(EveryEffect, StaysFiniteAtEverySetting) {
             "random settings " + std::to_string(seed));
 }
 
-// Catches poison that stays in filters and delay lines for good.
-TEST_P(EveryEffect, RecoversFromInputThatIsNoNumber) {
-    const auto format = Format<float>();
-    const auto effect = Make();
-    auto poison = Noise<float>(2 * 1000);
-    poison[100] = std::numeric_limits<float>::quiet_NaN();
-    poison[501] = std::numeric_limits<float>::infinity();
-    poison[900] = -std::numeric_limits<float>::infinity();
-    effect->InitProcessing(1000, &format);
-    FencedBlock<float> block(poison.size());
-    std::ranges::copy(poison, block.Data());
-    ProcessBlock(*effect, block.Data(), 1000, format);
-    ASSERT_TRUE(block.Intact());
-    effect->Cleanup();
-    const auto output = Render(*effect, Noise<float>(2 * 2 * 48000), format, {512});
-    ASSERT_TRUE(AllFinite(std::span(output).subspan(2 * 48000))) << "still poisoned after a second";
-}
-
 // Catches noise, constant offsets and oscillation where there should be nothing.
 TEST_P(EveryEffect, KeepsSilenceSilent) {
     const auto effect = Make();

@@ -5,6 +5,7 @@
 #include <cmath>
 #include <cstddef>
 #include <mutex>
+#include <new>
 #include <numbers>
 #include <utility>
 
@@ -110,24 +111,31 @@ void Analyser::Prepare(const SpectrumSettings& settings) {
     if (SameBuffers(settings, m_built)) return FitFilter(settings);
     m_order = OrderOf(settings.fft_length);
     m_built = settings;
-    UpdateDrawer(settings);
     try {
-        Allocate(settings, true);
+        UpdateDrawer(settings);
     } catch (...) {
-        m_built.hop_length = std::numeric_limits<std::int32_t>::min();  // the next call builds again
+        BuildAgain();
         throw;
     }
+    Allocate(settings, true);
     m_capture.ClearPending();
 }
 
+// The next Prepare, whatever its settings.
+void Analyser::BuildAgain() { m_built.hop_length = std::numeric_limits<std::int32_t>::min(); }
+
 void Analyser::Allocate(const SpectrumSettings& settings, bool reset) {
     const Lock lock(m_lock);
-    m_powerIsFrame = false;
-    if (m_order != m_fftOrder) {
-        m_fft.Free();
-        if (m_order != kNoOrder) m_fft.AllocateReal(m_built.fft_length, 0);
-        m_fftOrder = m_order;
+    try {
+        Build(settings, reset);
+    } catch (...) {
+        BuildAgain();
+        throw;
     }
+}
+
+void Analyser::Build(const SpectrumSettings& settings, bool reset) {
+    m_powerIsFrame = false;
     if (!reset || state.frozen) {
         m_capture.Resize(0, 0);
         for (auto* buffer : {&m_samples, &m_transform, &m_window, &m_power}) *buffer = {};
@@ -139,11 +147,28 @@ void Analyser::Allocate(const SpectrumSettings& settings, bool reset) {
     m_capture.SetHop(m_built.hop_length >= 1 ? m_built.hop_length : m_built.window_length);
     m_samples.resize(Entries(m_built.fft_length));
     m_transform.resize(Entries(m_built.fft_length));
+    BuildTransform();
     m_power.resize(Entries(m_built.fft_length) / 2);
     m_drawer->Allocate();
     m_window.resize(Entries(m_built.window_length));
     ResizeFilter(FilterLength(settings));
     CookWindow();
+}
+
+// Without memory the transform does nothing, which an impulse shows.
+void Analyser::BuildTransform() {
+    if (m_order == m_fftOrder) return;
+    m_fftOrder = kNoOrder;
+    m_fft.Free();
+    if (m_order == kNoOrder) return;
+    m_fft.AllocateReal(m_built.fft_length, 0);
+    if (m_transform.size() == static_cast<std::size_t>(m_built.fft_length) && m_transform.size() > 1) {
+        std::ranges::fill(m_transform, 0.0f);
+        m_transform[0] = 1.0f;
+        m_fft.DoFFTReal(m_transform.data(), 0, 0);
+        if (m_transform[1] != 1.0f) throw std::bad_alloc();
+    }
+    m_fftOrder = m_order;
 }
 
 void Analyser::FitFilter(const SpectrumSettings& settings) {

@@ -99,6 +99,9 @@ public:
     bool AdvanceSonogram();
 
 private:
+    void BuildAgain();
+    void Build(const SpectrumSettings& settings, bool reset);
+    void BuildTransform();
     void CookWindow();
     void ComputePower();
     void ResizeFilter(int spectra);

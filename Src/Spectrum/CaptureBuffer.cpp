@@ -1,11 +1,24 @@
 #include "Spectrum/CaptureBuffer.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstdint>
 #include <mutex>
 #include <utility>
 
 namespace Corvo {
+namespace {
+
+template <typename Sample>
+float MeanOfFinite(const Sample* samples, int channels) {
+    double sum = 0.0;
+    for (int channel = 0; channel < channels; ++channel)
+        if (std::isfinite(samples[channel])) sum += static_cast<double>(samples[channel]) / channels;
+    const auto mean = static_cast<float>(sum);
+    return std::isfinite(mean) ? mean : 0.0f;
+}
+
+}  // namespace
 
 template <typename Sample>
 void CaptureBuffer::Feed(const Sample* samples, int frames, int stride, int channels) {
@@ -19,7 +32,9 @@ void CaptureBuffer::Feed(const Sample* samples, int frames, int stride, int chan
         for (int i = 0; i < piece; ++i, samples += step) {
             Sample sum = samples[0];
             for (int channel = 1; channel < channels; ++channel) sum += samples[channel];
-            m_staging[(written + static_cast<unsigned>(i)) % kStaged] = static_cast<float>(sum * share);
+            auto mean = static_cast<float>(sum * share);
+            if (!std::isfinite(mean)) mean = MeanOfFinite(samples, channels);
+            m_staging[(written + static_cast<unsigned>(i)) % kStaged] = mean;
         }
         const unsigned now = staged + static_cast<unsigned>(piece);
         m_written.store(written + static_cast<unsigned>(piece), std::memory_order_release);

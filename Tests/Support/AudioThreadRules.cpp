@@ -20,11 +20,27 @@ enum Kind { kAllocation, kFree, kLock, kWait, kThrow, kKinds };
 constexpr std::array<const char*, kKinds> kNames{"allocations", "frees", "locks", "waits", "throws"};
 
 thread_local bool t_counting = false;
+thread_local int t_untilFailure = -1;  // allocations; below 0 none fails
+thread_local bool t_failureLasts = false, t_failed = false;
 thread_local std::array<int, kKinds> t_counts{};
 
 #if COUNTS_CALLS
 void Note(Kind kind) {
     if (t_counting) ++t_counts[kind];
+}
+
+// An allocation, if it may be had.
+template <typename Allocate>
+void* Allocated(Allocate allocate) {
+    Note(kAllocation);
+    if (t_untilFailure == 0) {
+        t_failed = true;
+        if (!t_failureLasts) t_untilFailure = -1;
+        errno = ENOMEM;
+        return nullptr;
+    }
+    if (t_untilFailure > 0) --t_untilFailure;
+    return allocate();
 }
 
 template <typename Result>
@@ -58,6 +74,16 @@ std::string AudioThreadRules::Broken() const {
     return text;
 }
 
+FailingAllocations::FailingAllocations(int after, bool lasting) {
+    t_untilFailure = after;
+    t_failureLasts = lasting;
+    t_failed = false;
+}
+
+FailingAllocations::~FailingAllocations() { t_untilFailure = -1; }
+
+bool FailingAllocations::Reached() const { return t_failed; }
+
 bool AudioThreadRules::CanCount() {
 #if COUNTS_CALLS
     return true;
@@ -78,14 +104,20 @@ void* __libc_realloc(void*, std::size_t);
 void* __libc_memalign(std::size_t, std::size_t);
 void __libc_free(void*);
 
-void* malloc(std::size_t size) { return Counted(kAllocation, __libc_malloc(size)); }
-void* calloc(std::size_t count, std::size_t size) { return Counted(kAllocation, __libc_calloc(count, size)); }
-void* realloc(void* memory, std::size_t size) { return Counted(kAllocation, __libc_realloc(memory, size)); }
+void* malloc(std::size_t size) {
+    return Allocated([=] { return __libc_malloc(size); });
+}
+void* calloc(std::size_t count, std::size_t size) {
+    return Allocated([=] { return __libc_calloc(count, size); });
+}
+void* realloc(void* memory, std::size_t size) {
+    return Allocated([=] { return __libc_realloc(memory, size); });
+}
 void* aligned_alloc(std::size_t alignment, std::size_t size) {
-    return Counted(kAllocation, __libc_memalign(alignment, size));
+    return Allocated([=] { return __libc_memalign(alignment, size); });
 }
 int posix_memalign(void** memory, std::size_t alignment, std::size_t size) {
-    *memory = Counted(kAllocation, __libc_memalign(alignment, size));
+    *memory = Allocated([=] { return __libc_memalign(alignment, size); });
     return *memory ? 0 : ENOMEM;
 }
 void free(void* memory) {

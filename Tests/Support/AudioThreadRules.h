@@ -21,4 +21,16 @@ public:
     static bool CanCount();
 };
 
+// While one of these lives, the allocations of its thread fail: one of them, after so many that do not, or it
+// and all that follow. Where AudioThreadRules::CanCount.
+class FailingAllocations {
+public:
+    FailingAllocations(int after, bool lasting);
+    ~FailingAllocations();
+    FailingAllocations(const FailingAllocations&) = delete;
+    FailingAllocations& operator=(const FailingAllocations&) = delete;
+
+    bool Reached() const;  // whether one has failed
+};
+
 }  // namespace TestSupport

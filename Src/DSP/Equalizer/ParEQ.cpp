@@ -1,14 +1,17 @@
 #include "DSP/Equalizer/ParEQ.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstddef>
 #include <numbers>
+#include <span>
 
 #include "DSP/Equalizer/BiquadSection.h"
 #include "DSP/Equalizer/EqCascade.h"
 #include "DSP/Equalizer/EqChannel.h"
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -57,6 +60,33 @@ void Invert(Sample* samples, std::ptrdiff_t stride, int frames) {
     for (int i = 0; i < frames; ++i) samples[i * stride] = -samples[i * stride];
 }
 
+template <typename Sample>
+struct Lanes {
+    Sample* samples;  // the first channel's first
+    std::ptrdiff_t stride;
+    int frames;
+};
+
+// One channel, or two neighbouring ones: polarity, bands, analysers. What grew beyond all numbers is cleared.
+template <typename Sample>
+void RunChannels(const Lanes<Sample>& block, std::span<EqChannel* const> channels,
+                 const builtin_effects_data* records, int numBands, std::int32_t& counter,
+                 bool feedSpectrum) {
+    std::array<EqBands*, 2> bands{};
+    for (std::size_t c = 0; c < channels.size(); ++c) {
+        bands[c] = &channels[c]->bands;
+        if (records[c].GetPhaseShift()) Invert(block.samples + c, block.stride, block.frames);
+    }
+    RunCascade(block.samples, block.stride, block.frames, std::span(bands).first(channels.size()), numBands,
+               counter);
+    for (std::size_t c = 0; c < channels.size(); ++c) {
+        for (EqBand& band : std::span(*bands[c]).first(static_cast<std::size_t>(numBands)))
+            if (!std::isfinite(band.w1) || !std::isfinite(band.w2)) band.w1 = band.w2 = 0.0;
+        if (feedSpectrum)
+            channels[c]->analyser.Feed(block.samples + c, block.frames, static_cast<int>(block.stride), 1);
+    }
+}
+
 }  // namespace
 
 ParEQ::ParEQ() : m_glide_counter(std::make_shared<std::int32_t>(0)) {}
@@ -101,24 +131,18 @@ void ParEQ::Process(Sample* buf, int frames, int numChannels, bool feedSpectrum,
                     builtin_effects_data* records) {
     if (!records || frames <= 0) return;
     const DenormalGuard guard;
+    ReplaceNonFinite(buf, frames, numChannels, static_cast<int>(m_channels.size()));
     const int numBands = BandsInUse(records[0]);
     for (int channel = 0; channel < numChannels; ++channel) {
-        EqChannel* const first = Channel(channel);
-        EqChannel* const second = channel + 1 < numChannels ? Channel(channel + 1) : nullptr;
-        if (!second || !MayRunTogether(first->bands, second->bands, numBands, *m_glide_counter)) {
-            ProcessSingle(buf, frames, numChannels, feedSpectrum, channel, records);
-            continue;
-        }
-        Sample* const samples = buf + channel;
-        EqBands* const bands[] = {&first->bands, &second->bands};
-        if (records[channel].GetPhaseShift()) Invert(samples, numChannels, frames);
-        if (records[channel + 1].GetPhaseShift()) Invert(samples + 1, numChannels, frames);
-        RunCascade(samples, numChannels, frames, bands, numBands, *m_glide_counter);
-        if (feedSpectrum) {
-            first->analyser.Feed(samples, frames, numChannels, 1);
-            second->analyser.Feed(samples + 1, frames, numChannels, 1);
-        }
-        ++channel;
+        EqChannel* const channels[] = {Channel(channel),
+                                       channel + 1 < numChannels ? Channel(channel + 1) : nullptr};
+        if (!channels[0]) break;
+        const bool together =
+            channels[1] && MayRunTogether(channels[0]->bands, channels[1]->bands, numBands, *m_glide_counter);
+        RunChannels(Lanes<Sample>{buf + channel, numChannels, frames},
+                    std::span(channels).first(together ? 2 : 1), records + channel, numBands,
+                    *m_glide_counter, feedSpectrum);
+        channel += together;
     }
 }
 
@@ -132,10 +156,12 @@ void ParEQ::ProcessSingle(Sample* buf, int frames, int stride, bool feedSpectrum
     if (first >= end) return;
     const int count = static_cast<int>((end - first + stride - 1) / stride);
     Sample* const samples = buf + first;
-    if (records[channel].GetPhaseShift()) Invert(samples, stride, count);
-    EqBands* const bands = &state->bands;
-    RunCascade(samples, stride, count, {&bands, 1}, BandsInUse(records[0]), *m_glide_counter);
-    if (feedSpectrum) state->analyser.Feed(samples, count, stride, 1);
+    // Only this channel's: the others may be in another thread's hands.
+    for (int i = 0; i < count; ++i)
+        if (Sample& sample = samples[std::ptrdiff_t{i} * stride]; !std::isfinite(sample)) sample = 0;
+    EqChannel* const channels[] = {state};
+    RunChannels(Lanes<Sample>{samples, stride, count}, channels, records + channel, BandsInUse(records[0]),
+                *m_glide_counter, feedSpectrum);
 }
 
 std::complex<double> ParEQ::GetResponse(int channel, double frequency, int sampleRate,

@@ -5,9 +5,11 @@
 #include <cmath>
 #include <limits>
 #include <mutex>
+#include <new>
 
 #include "DSP/Pitch/ShortFader.h"
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -15,6 +17,9 @@ namespace {
 constexpr int kMostEngineChannels = 16;
 constexpr int kPrimingFrames = 28;
 constexpr int kFlushFrames = 128;
+constexpr int kPiece = 256;
+constexpr float kOctave = 2.0f;
+constexpr int kMostFillBlocks = 64;
 // The engine can only be flushed by more input; far more than its longest sequence ends the attempt.
 constexpr int kMostFlushBlocks = 1 << 16;
 // The engine throws at higher rates, and at a few Hz its sequences are too short to move on by a frame. It
@@ -37,41 +42,87 @@ std::size_t Samples(int frames, int channels) {
 }  // namespace
 
 PitchAdapterSoundTouch::PitchAdapterSoundTouch()
-    : m_fadePosition(static_cast<std::int64_t>(static_cast<std::uint64_t>(ShortFaderNumSamples()) + 1)) {
+    : m_engine(std::make_unique<soundtouch::SoundTouch>()),
+      m_fadePosition(static_cast<std::int64_t>(static_cast<std::uint64_t>(ShortFaderNumSamples()) + 1)) {
     m_scratch.reserve(kScratchSamples);
     TakeLatency();
 }
 PitchAdapterSoundTouch::~PitchAdapterSoundTouch() = default;
 
+// An engine that ran out of memory may hold pointers to what it has freed: it is never touched again, not
+// even to destroy it.
+template <typename Call>
+void PitchAdapterSoundTouch::WithEngine(Call&& call) {
+    try {
+        call();
+    } catch (const std::bad_alloc&) {
+        static_cast<void>(m_engine.release());
+        throw;
+    }
+}
+
+void PitchAdapterSoundTouch::Configure(const Configuration& wanted) {
+    if (!m_engine) {
+        m_engine = std::make_unique<soundtouch::SoundTouch>();
+        m_told = {};
+        m_filledChannels = m_filledRate = 0;
+    }
+    WithEngine([&] {
+        if (wanted.channels != m_told.channels) {
+            m_told.channels = 0;  // stays so when the engine refuses
+            m_engine->setChannels(wanted.channels);
+        }
+        if (wanted.rate != m_told.rate) m_engine->setSampleRate(wanted.rate);
+        if (wanted.pitch != m_told.pitch) m_engine->setPitch(wanted.pitch);
+        if (wanted.speed != m_told.speed) m_engine->setRate(wanted.speed);
+        const auto set = [&](int setting, int Configuration::*value) {
+            if (wanted.*value != m_told.*value) m_engine->setSetting(setting, wanted.*value);
+        };
+        set(SETTING_USE_AA_FILTER, &Configuration::filter);
+        set(SETTING_AA_FILTER_LENGTH, &Configuration::filterLength);
+        set(SETTING_USE_QUICKSEEK, &Configuration::quickSeek);
+    });
+    m_told = wanted;
+}
+
 void PitchAdapterSoundTouch::Reset() {
     m_inputFrames = m_outputFrames = 0;
-    m_engine.clear();
+    if (m_engine) m_engine->clear();
     m_atRest = true;
     m_fadePosition = 0;
     TakeLatency();
 }
 
 void PitchAdapterSoundTouch::TakeLatency() {
-    m_latency.store(m_engine.getSetting(SETTING_INITIAL_LATENCY), std::memory_order_relaxed);
+    if (m_engine) m_latency.store(m_engine->getSetting(SETTING_INITIAL_LATENCY), std::memory_order_relaxed);
 }
 
 // The engine takes 16 channels, but its anti-alias filter ends the process when it is given more than 15.
-void PitchAdapterSoundTouch::ApplyFilter() {
-    m_engine.setSetting(SETTING_USE_AA_FILTER, m_wantsFilter && m_engineChannels < kMostEngineChannels);
+PitchAdapterSoundTouch::Configuration PitchAdapterSoundTouch::WithFilter(Configuration wanted) const {
+    wanted.filter = m_wantsFilter && wanted.channels < kMostEngineChannels;
+    return wanted;
 }
 
 void PitchAdapterSoundTouch::Put(const float* samples, int frames) {
-    if (Ready() && frames > 0) m_engine.putSamples(samples, static_cast<unsigned>(frames));
+    if (!Ready()) return;
+    // In pieces where the engine first makes more of them, so that this stays small.
+    const int piece = m_told.pitch * m_told.speed < 1.0f ? kPiece : frames;
+    for (int count; frames > 0; frames -= count, samples += Samples(count, m_channels)) {
+        count = std::min(frames, piece);
+        WithEngine([&] { m_engine->putSamples(samples, static_cast<unsigned>(count)); });
+    }
 }
 
 int PitchAdapterSoundTouch::Take(float* buffer, int frames) {
     if (!Ready() || frames <= 0) return 0;
-    return static_cast<int>(m_engine.receiveSamples(buffer, static_cast<unsigned>(frames)));
+    return static_cast<int>(m_engine->receiveSamples(buffer, static_cast<unsigned>(frames)));
 }
+
+std::int64_t PitchAdapterSoundTouch::Held() const { return m_engine ? m_engine->numSamples() : 0; }
 
 // Output frames that the input is worth, less those taken.
 std::int64_t PitchAdapterSoundTouch::Owed() const {
-    return static_cast<std::int64_t>(static_cast<double>(m_inputFrames) / m_speed) - m_outputFrames;
+    return static_cast<std::int64_t>(static_cast<double>(m_inputFrames) / m_told.speed) - m_outputFrames;
 }
 
 void PitchAdapterSoundTouch::Clear() {
@@ -83,7 +134,9 @@ void PitchAdapterSoundTouch::SetSampleRate(int rate) {
     const std::lock_guard lock(m_lock);
     Reset();
     m_rateSet = rate > 0;
-    if (m_rateSet) m_engine.setSampleRate(static_cast<unsigned>(std::clamp(rate, kLowestRate, kHighestRate)));
+    auto wanted = m_told;
+    if (m_rateSet) wanted.rate = static_cast<unsigned>(std::clamp(rate, kLowestRate, kHighestRate));
+    Configure(wanted);
     TakeLatency();
     Put(kSilence.data(), kPrimingFrames);
 }
@@ -92,45 +145,69 @@ void PitchAdapterSoundTouch::SetChannelsNum(int channels) {
     const std::lock_guard lock(m_lock);
     m_channels = channels;
     Reset();
-    m_engineChannels = 0;  // stays so when the engine refuses
-    m_engine.setChannels(static_cast<unsigned>(channels));
-    m_engineChannels = channels;
-    ApplyFilter();
+    auto wanted = m_told;
+    wanted.channels = static_cast<unsigned>(channels);
+    Configure(WithFilter(wanted));
     TakeLatency();
 }
 
 void PitchAdapterSoundTouch::SetPitchFactor(int channel, float factor) {
     const std::lock_guard lock(m_lock);
     if (channel != 0) return;  // all channels share one pitch
-    m_engine.setPitch(factor > kLowestPitch ? std::min(factor, kHighestPitch) : kLowestPitch);
+    auto wanted = m_told;
+    wanted.pitch = factor > kLowestPitch ? std::min(factor, kHighestPitch) : kLowestPitch;
+    Configure(wanted);
     Reset();
 }
 
 void PitchAdapterSoundTouch::SetSpeed(float speed) {
     if (!(speed > 0.0f) || !std::isfinite(speed)) return;
-    speed = std::clamp(speed, kLowestSpeed, kHighestSpeed);
     const std::lock_guard lock(m_lock);
-    m_speed = speed;
-    m_engine.setRate(speed);
+    auto wanted = m_told;
+    wanted.speed = std::clamp(speed, kLowestSpeed, kHighestSpeed);
+    Configure(wanted);
     Reset();
 }
 
 void PitchAdapterSoundTouch::SetQuality(int index) {
     const std::lock_guard lock(m_lock);
+    Fill();
     Reset();
     m_wantsFilter = index >= 3;
-    ApplyFilter();
-    m_engine.setSetting(SETTING_AA_FILTER_LENGTH, index <= 4 ? 32 : index == 5 ? 64 : 128);
-    m_engine.setSetting(SETTING_USE_QUICKSEEK, index < 4);
+    auto wanted = WithFilter(m_told);
+    wanted.filterLength = index <= 4 ? 32 : index == 5 ? 64 : 128;
+    wanted.quickSeek = index < 4;
+    Configure(wanted);
     TakeLatency();
+}
+
+// The engine's buffers keep their size when it is cleared: once they have held the most that a block of
+// kScratchSamples needs, at the lowest pitch and up to an octave, they grow no more.
+void PitchAdapterSoundTouch::Fill() {
+    if (!Ready() || (m_filledChannels == m_told.channels && m_filledRate == m_told.rate)) return;
+    const auto wanted = m_told;
+    m_scratch.assign(kScratchSamples, 0.0f);
+    const int block = static_cast<int>(kScratchSamples) / m_channels;
+    for (const float pitch : {kLowestPitch, 1.0f, kOctave}) {
+        auto other = wanted;
+        other.pitch = pitch;
+        Configure(other);
+        m_engine->clear();
+        for (int i = 0; Held() < block && i < kMostFillBlocks; ++i) Put(m_scratch.data(), block);
+        Put(m_scratch.data(), block);
+    }
+    Configure(wanted);
+    m_filledChannels = wanted.channels;
+    m_filledRate = wanted.rate;
 }
 
 void PitchAdapterSoundTouch::ProcessInPlace(float* buffer, int frames) {
     const DenormalGuard guard;
     const std::lock_guard lock(m_lock);
     m_atRest = false;
+    ReplaceNonFinite(buffer, frames, m_channels);
     Put(buffer, frames);
-    if (static_cast<std::int64_t>(m_engine.numSamples()) < frames)
+    if (Held() < frames)
         std::fill_n(buffer, Samples(frames, m_channels), 0.0f);
     else
         Take(buffer, frames);
@@ -140,6 +217,7 @@ int PitchAdapterSoundTouch::ProcessInPlaceNoPadding(float* buffer, int frames) {
     const DenormalGuard guard;
     const std::lock_guard lock(m_lock);
     m_atRest = false;
+    ReplaceNonFinite(buffer, frames, m_channels);
     Put(buffer, frames);
     m_inputFrames += std::max(frames, 0);
     const int taken = Take(buffer, frames);
@@ -177,13 +255,12 @@ void PitchAdapterSoundTouch::Flush() {
     m_atRest = true;
     if (!Ready()) return;
     const std::int64_t owed = Owed();
-    for (int i = 0; static_cast<std::int64_t>(m_engine.numSamples()) < owed && i < kMostFlushBlocks; ++i)
-        Put(kSilence.data(), kFlushFrames);
+    for (int i = 0; Held() < owed && i < kMostFlushBlocks; ++i) Put(kSilence.data(), kFlushFrames);
 }
 
 int PitchAdapterSoundTouch::GetNumSamplesAvailable() {
     const std::lock_guard lock(m_lock);
-    const std::int64_t held = m_engine.numSamples();
+    const std::int64_t held = Held();
     const std::int64_t count = m_atRest ? std::min(held, Owed()) : held;
     using Limits = std::numeric_limits<int>;
     return static_cast<int>(std::clamp<std::int64_t>(count, Limits::min(), Limits::max()));

@@ -3,6 +3,7 @@
 #include <SoundTouch.h>
 
 #include <atomic>
+#include <memory>
 #include <vector>
 
 #include "DSP/Pitch/PitchAdapter.h"
@@ -12,6 +13,10 @@ namespace Corvo::DSP {
 
 // The "New" back-end: the SoundTouch engine behind the adapter's operations. Every configuration call is a
 // reset: it empties the engine and its counts.
+//
+// The engine is told only what changes, as it allocates for that, and SetQuality, the last of the
+// calls that prepare, fills its buffers to the largest. Where it runs out of memory it is replaced at the
+// next configuration call.
 class PitchAdapterSoundTouch final : public PitchAdapter {
 public:
     PitchAdapterSoundTouch();
@@ -36,27 +41,43 @@ public:
     int GetLatency() override;
 
 private:
+    // What the engine is told.
+    struct Configuration {
+        unsigned rate = 0, channels = 0;  // 0: not yet
+        float pitch = 1.0f, speed = 1.0f;
+        int filterLength = 64, filter = 1, quickSeek = 0;
+        bool operator==(const Configuration&) const = default;
+    };
+
+    template <typename Call>
+    void WithEngine(Call&& call);
+    void Configure(const Configuration& wanted);
     void Reset();
     void TakeLatency();
-    void ApplyFilter();
+    Configuration WithFilter(Configuration wanted) const;
+    void Fill();
     // The engine throws when it is given samples before it knows rate and channels.
-    bool Ready() const { return m_rateSet && m_engineChannels > 0 && m_engineChannels == m_channels; }
+    bool Ready() const {
+        return m_engine && m_rateSet && m_told.channels > 0 &&
+               m_told.channels == static_cast<unsigned>(m_channels);
+    }
     void Put(const float* samples, int frames);
     int Take(float* buffer, int frames);
+    std::int64_t Held() const;
     std::int64_t Owed() const;
     template <typename Call>
     int ThroughScratch(double* buffer, int frames, Call call);
 
-    soundtouch::SoundTouch m_engine;
+    std::unique_ptr<soundtouch::SoundTouch> m_engine;
+    Configuration m_told;                             // what it knows
+    unsigned m_filledChannels = 0, m_filledRate = 0;  // for which its buffers are filled
     bool m_atRest = true;
     CriticalSection m_lock;
     std::int64_t m_inputFrames = 0, m_outputFrames = 0;  // of the path without padding
-    float m_speed = 1.0f;
     std::int64_t m_fadePosition;
     std::vector<float> m_scratch;
     bool m_rateSet = false;
     bool m_wantsFilter = true;
-    std::int32_t m_engineChannels = 0;
     std::atomic<int> m_latency;  // asked for without the lock
 };
 

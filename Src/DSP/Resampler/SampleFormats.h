@@ -33,6 +33,7 @@ struct IntegerSample {
 
 template <typename Float>
 struct FloatSample {
+    using Value = Float;
     static constexpr int kBytes = sizeof(Float);
 
     static double Read(const char* sample) {

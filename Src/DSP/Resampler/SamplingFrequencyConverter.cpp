@@ -10,6 +10,7 @@
 
 #include "DSP/Resampler/PolePairKernel.h"
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 
 using PolePairs::Lanes;
 using PolePairs::State;
@@ -178,6 +179,55 @@ int ConvertGroup(SamplingFrequencyConverter& c, int firstChannel, const Block& b
     return run.Written();
 }
 
+template <typename In>
+double ReadAt(const char* frame, int channel, int channels, int frameBytes) {
+    return In::Read(frame + static_cast<std::int64_t>(channel) * frameBytes / channels);
+}
+
+template <typename In>
+bool IsFinite(const char* in, int frames, int channels, int frameBytes) {
+    if (frameBytes == channels * In::kBytes)
+        return Corvo::AllFinite(reinterpret_cast<const typename In::Value*>(in),
+                                static_cast<std::size_t>(frames) * static_cast<std::size_t>(channels));
+    bool finite = true;
+    for (int i = 0; i < frames; ++i, in += frameBytes)
+        for (int channel = 0; channel < channels; ++channel)
+            finite &= std::isfinite(ReadAt<In>(in, channel, channels, frameBytes));
+    return finite;
+}
+
+// Converts a copy in which samples that are not finite are 0.
+template <typename In, typename Out>
+int ConvertRepaired(SamplingFrequencyConverter& c, int frames, const char* in, char* out, int channels,
+                    int inFrameBytes, int outFrameBytes, CDither<double>* dither) {
+    constexpr int kPiece = 16;
+    std::array<typename In::Value, kPiece * SamplingFrequencyConverter::kMaxChannels> copy;
+    int written = 0;
+    for (int count; frames > 0; frames -= count) {
+        count = std::min(frames, kPiece);
+        auto* to = copy.data();
+        for (int i = 0; i < count; ++i, in += inFrameBytes)
+            for (int channel = 0; channel < channels; ++channel)
+                *to++ = static_cast<typename In::Value>(ReadAt<In>(in, channel, channels, inFrameBytes));
+        Corvo::ReplaceNonFinite(copy.data(), count, channels);
+        written +=
+            c.sfreq_conversion_core_block<In, Out>(count, reinterpret_cast<char*>(copy.data()),
+                                                   out + static_cast<std::ptrdiff_t>(written) * outFrameBytes,
+                                                   channels, channels * In::kBytes, outFrameBytes, dither);
+    }
+    return written;
+}
+
+// A channel that samples near the largest number drove beyond it starts afresh: its histories are empty.
+void ClearUnlessFinite(SamplingFrequencyConverter& c, int channel) {
+    constexpr int kGroup = SamplingFrequencyConverter::kChannelsPerGroup;
+    double sum = 0.0;
+    for (const auto& state : c.pairStates[channel / kGroup]) sum += state[channel % kGroup];
+    if (std::isfinite(sum)) return;
+    std::ranges::fill(c.inputHistory[channel], 0.0);
+    std::ranges::fill(c.outputHistory[channel], 0.0);
+}
+
 }  // namespace
 
 SamplingFrequencyConverter::SamplingFrequencyConverter() = default;
@@ -271,6 +321,7 @@ void SamplingFrequencyConverter::FreeRings() {
 double SamplingFrequencyConverter::GroupDelay() const { return pairs ? pairs->groupDelay : 0.0; }
 
 double SamplingFrequencyConverter::sfreq_conv_lowpass(double x, double* xHistory, double* yHistory) {
+    if (!std::isfinite(x)) x = 0.0;
     std::shift_left(xHistory, xHistory + lowPass.zeros + 1, 1);
     xHistory[lowPass.zeros] = x / lowPass.gain;
     std::shift_left(yHistory, yHistory + lowPass.poles + 1, 1);
@@ -289,6 +340,10 @@ int SamplingFrequencyConverter::sfreq_conversion_core_block(int frames, char* in
     if (frames < 1 || channels < 1 || channels > kMaxChannels || !pairs || ringLength < 1) return 0;
     if (std::any_of(rings, rings + channels, [](const double* ring) { return ring == nullptr; })) return 0;
     const Corvo::DenormalGuard guard;
+    if constexpr (requires { typename In::Value; })
+        if (!IsFinite<In>(in, frames, channels, inFrameBytes))
+            return ConvertRepaired<In, Out>(*this, frames, in, out, channels, inFrameBytes, outFrameBytes,
+                                            dither);
 
     const std::int64_t toNextOutput = std::max<std::int64_t>(
         0, static_cast<std::int64_t>(readWraps - writeWraps) * ringLength + readPosition - writePosition);
@@ -317,6 +372,7 @@ int SamplingFrequencyConverter::sfreq_conversion_core_block(int frames, char* in
             ++channel;
         }
     }
+    for (int channel = 0; channel < channels; ++channel) ClearUnlessFinite(*this, channel);
     writeWraps += Advance(writePosition, static_cast<std::int64_t>(frames) * up, ringLength);
     readWraps += Advance(readPosition, static_cast<std::int64_t>(written) * down, ringLength);
     const int common = std::min(writeWraps, readWraps);

@@ -21,6 +21,8 @@ struct PolePairLowPass;
 // kept beside the histories, which every block leaves as the direct form would have them: a host may read
 // them or go on from them with the step. A channel whose histories the host has zeroed starts afresh.
 //
+// Samples that are not finite count as 0.
+//
 // Copying and moving copy member by member: both objects then point to the same rings, and only one of
 // them may free those. Filter and histories are independent.
 //

@@ -41,8 +41,9 @@ void SpectrumDrawer::Deallocate() {
 
 void SpectrumDrawer::UpdateSamplingFrequency(int samplingRate) {
     if (samplingRate == m_samplingRate) return;
-    m_samplingRate = samplingRate;
+    m_samplingRate = -1;  // until the buffers are there
     ReallocateBuffers();
+    m_samplingRate = samplingRate;
 }
 
 int SpectrumDrawer::GetSamplingFrequency() const { return m_samplingRate; }
@@ -102,7 +103,7 @@ void SpectrumDrawer::AgePeaks() {
     if (m_settings.peak_hold_mode == 0) return;
     const int frames = power_decay_length(m_smoothed);
     const bool fall = m_settings.peak_hold_mode == 1 && frames > 0;
-    const std::size_t bins = std::min(m_smoothed.size(), m_peaks.size());
+    const std::size_t bins = std::min({m_smoothed.size(), m_peaks.size(), m_peakFrames.size()});
     for (std::size_t k = 0; k < bins; ++k) {
         if (m_smoothed[k] >= m_peaks[k]) {
             m_peaks[k] = m_smoothed[k];

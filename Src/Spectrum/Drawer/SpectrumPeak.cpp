@@ -16,7 +16,8 @@ Corvo::SpectrumPeak SpectrumDrawer::HighestPeak(double lowestHz) const {
     const auto power = [&](std::ptrdiff_t k) {
         return k >= 1 ? m_smoothed[static_cast<std::size_t>(k)] : 0.0f;
     };
-    const double first = std::clamp(std::ceil(lowestHz / perBin), 1.0, static_cast<double>(bins));
+    const double lowest = std::ceil(lowestHz / perBin);
+    const double first = lowest > 1.0 ? std::min(lowest, static_cast<double>(bins)) : 1.0;  // 1 for NaN, too
     std::ptrdiff_t peak = 0;
     for (auto k = static_cast<std::ptrdiff_t>(first); k + 1 < bins; ++k)
         if (power(k) > power(peak) && power(k) >= power(k - 1) && power(k) >= power(k + 1)) peak = k;

@@ -20,9 +20,9 @@ CoordinatesAndFrequencies SonogramAxis::Map() const {
 
 void SonogramRows::Prepare(const SonogramAxis& axis, int bins) {
     if (axis == m_axis && bins == m_bins) return;
+    m_rows.resize(static_cast<std::size_t>(axis.height));
     m_axis = axis;
     m_bins = bins;
-    m_rows.resize(static_cast<std::size_t>(axis.height));
     const CoordinatesAndFrequencies map = axis.Map();
     const double perHz = 2.0 * bins / axis.samplingRate;
     double from = 0.0;

@@ -6,10 +6,10 @@ namespace Corvo {
 
 void PitchDetector::Prepare(const SpectrumFormat& format) {
     if (format == Format()) return;
-    m_peaks.Prepare(format);
     // Made now, so that no analysis has to when the spectrum is asked for.
     m_denoised.clear();
     m_denoised.reserve(format.bins);
+    m_peaks.Prepare(format);  // takes note of the format
 }
 
 void PitchDetector::MeasureFloor(std::span<const float> power, bool keepDenoised) {

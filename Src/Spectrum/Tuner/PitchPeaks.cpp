@@ -36,13 +36,14 @@ float PowerRatio(float decibels) { return std::pow(10.0f, 0.1f * decibels); }
 }  // namespace
 
 void PitchPeaks::Prepare(const SpectrumFormat& format) {
-    m_format = format;
+    m_format = {};  // until all is there: memory may run out
     m_interpolation.Prepare(format.windowType, format.windowLength, format.fftLength);
     m_floor.Prepare(format.bins, static_cast<double>(format.fftLength) / format.windowLength);
     m_floorLevels.resize(format.bins);
     // Two neighbours are never both peaks.
     m_peaks.reserve(format.bins / 2 + 1);
     m_silence = std::pow(0.5 * kSilentAmplitude * kTypicalWindowMean * format.windowLength, 2.0);
+    m_format = format;
 }
 
 double PitchPeaks::InterpolateMax(std::span<const float> power, std::size_t bin) const {

@@ -5,6 +5,7 @@
 #include "DSP/Effects/Compressor/CompressorSides.h"
 #include "DSP/Parts/Decibels.h"
 #include "DSP/Parts/SampleDispatch.h"
+#include "Platform/FiniteSamples.h"
 
 // The compressor on the audio thread: taking settings, cooking, processing.
 namespace Corvo::DSP {
@@ -22,14 +23,6 @@ void Compressor::TakeUiSettings() {
     const auto* newest = m_hand_over->toAudio.Take();
     if (!newest) return;
     m_audio->current = *newest;
-    auto& state = m_audio->state;
-    for (std::size_t channel = 0; channel < 2; ++channel) {
-        if (!std::isfinite(state.envelope[channel])) {
-            state.envelope[channel] = 0.0;
-            state.segment[channel] = 0;
-        }
-        if (!std::isfinite(state.displayGain[channel])) state.displayGain[channel] = 1.0;
-    }
 }
 
 void Compressor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
@@ -130,19 +123,29 @@ void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
             detector[channel] = reinterpret_cast<const Sample*>(
                 audio.sideChain[channel < static_cast<std::size_t>(audio.sideChainChannels) ? channel : 0]);
     const int stride = sideChain ? 1 : channels;
+    // The side-chain is the host's, so what is not finite there becomes 0 in a copy.
+    const bool repair = sideChain && !(AllFinite(detector[0], static_cast<std::size_t>(frames)) &&
+                                       AllFinite(detector[1], static_cast<std::size_t>(frames)));
 
     // Monitored, the followers run on a copy, so that they are where they should be when it ends.
-    constexpr int kMonitorPiece = 64;
+    constexpr int kCopiedPiece = 64;
+    std::array<std::array<Sample, kCopiedPiece>, 2> repaired;
     for (int done = 0; done < frames;) {
         int piece = frames - done;
         if (audio.map.framesLeft > 0) piece = std::min(piece, audio.map.framesLeft);
         if (audio.gainFramesLeft > 0) piece = std::min(piece, audio.gainFramesLeft);
         Sample* const output = block + static_cast<std::ptrdiff_t>(done) * channels;
-        const std::array<const Sample*, 2> from{detector[0] + static_cast<std::ptrdiff_t>(done) * stride,
-                                                detector[1] + static_cast<std::ptrdiff_t>(done) * stride};
+        std::array<const Sample*, 2> from{detector[0] + static_cast<std::ptrdiff_t>(done) * stride,
+                                          detector[1] + static_cast<std::ptrdiff_t>(done) * stride};
+        if (monitor || repair) piece = std::min(piece, kCopiedPiece);
+        for (std::size_t channel = 0; repair && channel < 2; ++channel) {
+            auto& copy = repaired[channel];
+            std::copy_n(from[channel], piece, copy.begin());
+            ReplaceNonFinite(copy.data(), piece, 1);
+            from[channel] = copy.data();
+        }
         if (monitor) {
-            piece = std::min(piece, kMonitorPiece);
-            std::array<Sample, kMonitorPiece * MaxNumChannels> copy;
+            std::array<Sample, kCopiedPiece * MaxNumChannels> copy;
             std::copy_n(output, piece * channels, copy.begin());
             RunPiece(copy.data(), from.data(), stride, piece, channels);
             if (sideChain && channels == 1)
@@ -154,6 +157,7 @@ void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
         }
         done += piece;
     }
+    audio.ClearUnlessFinite();
     for (std::size_t channel = 0; channel < 2; ++channel)
         m_hand_over->displayGain[channel] = static_cast<float>(audio.state.displayGain[channel]);
 }

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <atomic>
+#include <cmath>
 #include <cstdint>
 
 #include "DSP/Effects/Compressor/Compressor.h"
@@ -41,6 +42,15 @@ struct AudioSide {
     std::array<double*, 2> sideChain{};
     int sideChainChannels = 0;  // 0: none was handed over for this block
 
+    void ClearUnlessFinite() {
+        for (std::size_t channel = 0; channel < 2; ++channel) {
+            if (!std::isfinite(state.envelope[channel])) {
+                state.envelope[channel] = 0.0;
+                state.segment[channel] = 0;
+            }
+            if (!std::isfinite(state.displayGain[channel])) state.displayGain[channel] = 1.0;
+        }
+    }
     // Where the curves have other points than before.
     void FindSegments() {
         for (std::size_t channel = 0; channel < 2; ++channel)

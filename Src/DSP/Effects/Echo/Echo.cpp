@@ -14,6 +14,7 @@
 #include "DSP/Parts/Decibels.h"
 #include "DSP/Parts/Limits.h"
 #include "DSP/Parts/SampleDispatch.h"
+#include "Platform/FiniteSamples.h"
 #include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
@@ -67,6 +68,7 @@ const EffectTable& Table() {
         .pads = {{"Default", {0, 1}, {4, 5}}},
         .sections = {"Delays", "Output"},
         .sectionLabel = SectionLabel::WithoutSide,
+        .inputGuard = InputGuard::EveryFormat,
     };
     return table;
 }
@@ -222,10 +224,16 @@ template <typename Sample>
 void Echo::Run(Sample* samples, std::array<int, 2> frames) {
     const int channels = m_format.nChannels;
     int done = 0;
+    bool finite = true;
+    const auto all = [](const auto* from, int count) {
+        return AllFinite(from, static_cast<std::size_t>(count));
+    };
     auto& [left, right] = m_delay->lines;
     for (const int both = channels == 2 ? std::min(frames[0], frames[1]) : 0; done < both;) {
         const int run = std::min({both - done, left.UntilWrap(), right.UntilWrap()});
-        RunEchoPair(m_delay->sides, samples + 2 * done, run, left.Here(), right.Here());
+        Sample* const block = samples + 2 * done;
+        if (RunEchoPair(m_delay->sides, block, run, left.Here(), right.Here()))
+            finite &= all(left.Here(), run) && all(right.Here(), run) && all(block, 2 * run);
         left.Advance(run);
         right.Advance(run);
         done += run;
@@ -235,12 +243,14 @@ void Echo::Run(Sample* samples, std::array<int, 2> frames) {
         auto& line = m_delay->lines[i];
         for (int at = done; at < frames[i];) {
             const int run = std::min(frames[i] - at, line.UntilWrap());
-            RunEchoSide(m_delay->sides[i], samples + static_cast<std::ptrdiff_t>(at) * channels + side,
-                        channels, run, line.Here());
+            finite &=
+                !RunEchoSide(m_delay->sides[i], samples + static_cast<std::ptrdiff_t>(at) * channels + side,
+                             channels, run, line.Here());
             line.Advance(run);
             at += run;
         }
     }
+    if (!finite) InitResetProcessingLight(false);
 }
 
 }  // namespace Corvo::DSP

@@ -1,7 +1,9 @@
 #pragma once
 
 #include <array>
+#include <cmath>
 #include <cstddef>
+#include <type_traits>
 #include <xsimd/xsimd.hpp>
 
 #include "DSP/Effects/Echo/Echo.h"
@@ -36,17 +38,22 @@ struct Delay {
 
 }  // namespace EchoPrivate
 
-// Both run over samples between two wraps of the ring, so that none reads what another one wrote.
+// Both run over samples between two wraps of the ring, so that none reads what another one wrote. They return
+// whether any sample written, to the ring or as output, may be infinite or NaN. For that they lay the bits of
+// all of them over each other, which may look like it when none of them is.
 
 template <typename Sample>
-void RunEchoSide(const EchoPrivate::Side& side, Sample* samples, std::ptrdiff_t stride, int frames,
+bool RunEchoSide(const EchoPrivate::Side& side, Sample* samples, std::ptrdiff_t stride, int frames,
                  float* ring) {
     const auto s = side;
+    bool finite = true;
     for (int i = 0; i < frames; ++i, samples += stride) {
         const double delayed = ring[i], in = *samples, back = delayed * s.feedback;
         ring[i] = static_cast<float>(back + in);
         *samples = static_cast<Sample>(((delayed * s.echo + back) * s.wet + in * s.dry) * s.output);
+        finite &= std::isfinite(ring[i]) & std::isfinite(*samples);
     }
+    return !finite;
 }
 
 // A frame of two doubles, left and right, in one register.
@@ -69,19 +76,33 @@ inline std::array<Frame, 4> Load(const double* samples) {
     return {Frame::load_unaligned(samples), Frame::load_unaligned(samples + 2),
             Frame::load_unaligned(samples + 4), Frame::load_unaligned(samples + 6)};
 }
-inline void Store(float* samples, const std::array<Frame, 4>& frames) {
-    Joined(frames[0], frames[1]).store_unaligned(samples);
-    Joined(frames[2], frames[3]).store_unaligned(samples + 4);
+inline void Store(float* samples, const std::array<Frame, 4>& frames, Floats& bits) {
+    const Floats a = Joined(frames[0], frames[1]), b = Joined(frames[2], frames[3]);
+    bits = bits | a | b;
+    a.store_unaligned(samples);
+    b.store_unaligned(samples + 4);
 }
-inline void Store(double* samples, const std::array<Frame, 4>& frames) {
+inline void Store(double* samples, const std::array<Frame, 4>& frames, Frame& bits) {
     for (std::size_t i = 0; i < 4; ++i) frames[i].store_unaligned(samples + 2 * i);
+    bits = bits | frames[0] | frames[1] | frames[2] | frames[3];
+}
+
+inline bool MayBeInfinite(Floats bits) {
+    const auto exponent = _mm_set1_epi32(0x7F800000);
+    const auto words = _mm_and_si128(_mm_castps_si128(bits), exponent);
+    return _mm_movemask_ps(_mm_castsi128_ps(_mm_cmpeq_epi32(words, exponent))) != 0;
+}
+inline bool MayBeInfinite(Frame bits) {
+    const auto exponent = _mm_set1_epi32(0x7FF00000);
+    const auto words = _mm_and_si128(_mm_castpd_si128(bits), exponent);
+    return _mm_movemask_pd(_mm_castsi128_pd(_mm_cmpeq_epi32(words, exponent))) != 0;
 }
 
 }  // namespace EchoFrames
 
 // Interleaved stereo: both sides together, four frames at a time. The results are RunEchoSide's.
 template <typename Sample>
-void RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples, int frames, float* left,
+bool RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples, int frames, float* left,
                  float* right) {
     using namespace EchoFrames;
     const auto both = [&](double EchoPrivate::Side::*factor) {
@@ -90,6 +111,8 @@ void RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples,
     using EchoPrivate::Side;
     const Frame feedback = both(&Side::feedback), echo = both(&Side::echo), wet = both(&Side::wet),
                 dry = both(&Side::dry), output = both(&Side::output);
+    Floats written(0.0f);
+    std::conditional_t<std::is_same_v<Sample, float>, Floats, Frame> shown(0);
     int i = 0;
     for (; i + 4 <= frames; i += 4, samples += 8) {
         const auto l = Floats::load_unaligned(left + i), r = Floats::load_unaligned(right + i);
@@ -103,12 +126,15 @@ void RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples,
             in[k] = ((delayed[k] * echo + back) * wet + in[k] * dry) * output;
         }
         const Floats a = Joined(kept[0], kept[1]), b = Joined(kept[2], kept[3]);
+        written = written | a | b;
         Lefts(a, b).store_unaligned(left + i);
         Rights(a, b).store_unaligned(right + i);
-        Store(samples, in);
+        Store(samples, in, shown);
     }
-    RunEchoSide(sides[0], samples, 2, frames - i, left + i);
-    RunEchoSide(sides[1], samples + 1, 2, frames - i, right + i);
+    bool doubtful = MayBeInfinite(written) || MayBeInfinite(shown);
+    doubtful |= RunEchoSide(sides[0], samples, 2, frames - i, left + i);
+    doubtful |= RunEchoSide(sides[1], samples + 1, 2, frames - i, right + i);
+    return doubtful;
 }
 
 }  // namespace Corvo::DSP

@@ -1,12 +1,34 @@
 #include "DSP/Effects/Framework/CorvoEffectBase.h"
 
 #include <algorithm>
+#include <exception>
 #include <numeric>
+#include <utility>
 
 #include "DSP/Effects/Framework/TailRecord.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
+namespace {
+
+bool Guards(const EffectTable* table, const tWAVEFORMATEX& format) {
+    const auto guard = table ? table->inputGuard : InputGuard::FloatFormats;
+    const bool knownWidth = format.wBitsPerSample == 32 || format.wBitsPerSample == 64;
+    return guard == InputGuard::EveryFormat || (guard == InputGuard::FloatFormats && knownWidth);
+}
+
+// Interleaved or one channel of a planar block. Effects pass channels after the second unchanged.
+void GuardInput(double* buffer, int frames, int channels, int bits) {
+    const int guarded = CorvoEffectBase::MaxNumChannels;
+    if (bits == 64)
+        ReplaceNonFinite(buffer, frames, channels, guarded);
+    else
+        ReplaceNonFinite(reinterpret_cast<float*>(buffer), frames, channels, guarded);
+}
+
+}  // namespace
 
 CorvoEffectBase::CorvoEffectBase() : m_tail(std::make_unique<TailRecord>()) {}
 CorvoEffectBase::~CorvoEffectBase() = default;
@@ -68,26 +90,55 @@ CorvoEffectBase::Cook CorvoEffectBase::TakeCook(tWAVEFORMATEX& seen, const tWAVE
     return {m_cook.exchange(false, std::memory_order_acquire) || afresh, afresh};
 }
 
+// An effect that runs out of memory may be in any state: it is left alone until it is prepared again.
+template <typename Call>
+void CorvoEffectBase::Attempt(Call&& call) {
+    try {
+        call();
+    } catch (const std::exception&) {
+        m_tail->unprepared = true;
+        MarkStale();
+    }
+}
+
 bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format) {
     *m_tail = {};
-    SetMaximumFramesPerBuffer(maxFrames);
-    CheckCookProperties(format, true);
+    Attempt([&] {
+        SetMaximumFramesPerBuffer(maxFrames);
+        CheckCookProperties(format, true);
+    });
     return true;
 }
 
-void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
+template <typename Call>
+void CorvoEffectBase::RunBlock(int frames, ProcessFlags& flags, Call&& call) {
     const DenormalGuard guard;
-    UpdateEnvelopes(flags);
-    ProcessInternal(buffer, m_tail->BeginBlock(frames), format, flags);
+    flags.params_changed = false;
+    if (!m_tail->unprepared)
+        Attempt([&] {
+            UpdateEnvelopes(flags);
+            call(m_tail->BeginBlock(frames));
+        });
+    else
+        m_tail->BeginBlock(frames);
     m_tail->EndBlock();
+}
+
+void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
+    RunBlock(frames, flags, [&](int allowed) {
+        if (Guards(m_table, *format)) GuardInput(buffer, allowed, format->nChannels, format->wBitsPerSample);
+        ProcessInternal(buffer, allowed, format, flags);
+    });
 }
 
 void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                             ProcessFlags& flags) {
-    const DenormalGuard guard;
-    UpdateEnvelopes(flags);
-    ProcessInternalNoninterleaved(channels, m_tail->BeginBlock(frames), format, flags);
-    m_tail->EndBlock();
+    RunBlock(frames, flags, [&](int allowed) {
+        if (Guards(m_table, *format) && SupportsNoninterleaved())
+            for (int channel = 0; channel < std::min<int>(format->nChannels, MaxNumChannels); ++channel)
+                GuardInput(channels[channel], allowed, 1, format->wBitsPerSample);
+        ProcessInternalNoninterleaved(channels, allowed, format, flags);
+    });
 }
 
 void CorvoEffectBase::StartTail(std::int64_t maxFrames) {
@@ -121,9 +172,9 @@ void CorvoEffectBase::AddEnvelope(int index, int count, const MP_ENVELOPE_SEGMEN
     const auto parameter = static_cast<std::size_t>(index);
     // Before the first cook there is no array yet; positions stay with the cook, so nothing plays early.
     if (parameter >= m_envelopes.size()) m_envelopes.resize(parameter + 1);
-    auto& envelope = m_envelopes[parameter];
-    envelope.clear();
+    std::vector<MP_ENVELOPE_SEGMENT> envelope;
     if (segments && count > 0) envelope.assign(segments, segments + count);
+    m_envelopes[parameter] = std::move(envelope);
     MarkStale();
 }
 

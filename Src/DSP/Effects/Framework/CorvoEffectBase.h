@@ -42,6 +42,10 @@ struct TailRecord;
 // Indices: a "real" index counts the effect's own parameters, an "external" one the host's, which may
 // stand for a left/right pair. The base checks no index; an effect ignores a real index it does not have.
 //
+// Memory: when there is none, constructors and the user-interface thread's calls throw std::bad_alloc. A call
+// that does has stored nothing or all that it was given, and may be repeated. Processing and preparation
+// never throw.
+//
 // Most effects are described by a table: names, texts, choices, presets and the layout of the settings chunk.
 // The operations below answer from it; an effect without one has the answers given here.
 //
@@ -185,10 +189,12 @@ public:
     virtual float GetParamFromProp(int index, int preset);
 
     // Announces the format and the largest block, and derives everything; all memory that processing
-    // needs is made here. Always true.
+    // needs is made here. Always true, and never throws: without memory blocks pass unchanged, and the next
+    // InitProcessing tries again.
     bool InitProcessing(int maxFrames, const tWAVEFORMATEX* format);
     // Plays automation that is due, then processes one block in place. Never throws; a block of 0 frames
-    // or fewer is left alone.
+    // or fewer is left alone. An effect that remembers its input takes samples that are not finite for 0, and
+    // what grows beyond all numbers inside it is cleared when that shows: the next block is sound again.
     void Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags);
     void ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                ProcessFlags& flags);
@@ -311,6 +317,10 @@ protected:
 
 private:
     void Store(const std::vector<std::uint32_t>& settings);
+    template <typename Call>
+    void Attempt(Call&& call);
+    template <typename Call>
+    void RunBlock(int frames, ProcessFlags& flags, Call&& call);
 
     const EffectTable* m_table = nullptr;
     void* m_words = nullptr;

@@ -8,12 +8,14 @@
 namespace Corvo::DSP {
 
 // How an effect rings out after its input has ended: the host's wishes and the effect's report. Belongs
-// to the audio thread; CorvoEffectBase describes the use from the host's side.
+// to the audio thread; CorvoEffectBase describes the use from the host's side. The base keeps its own note
+// here.
 struct TailRecord {
     bool restart_requested = false;       // host: begin a new tail with the next block
     std::int64_t frames_limited_to = -1;  // host: frames the tail may still have; below 0: no tail mode
     int frames_produced = 0;              // effect: frames of the last block that hold output
     bool finished = false;                // effect: nothing follows
+    bool unprepared = false;              // base: memory ran out, so that blocks pass unchanged
 
     bool TailMode() const { return frames_limited_to >= 0; }
     bool TakeRestart() { return std::exchange(restart_requested, false); }

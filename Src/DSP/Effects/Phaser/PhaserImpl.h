@@ -5,6 +5,7 @@
 #include <cstddef>
 
 #include "DSP/Parts/SineOscillator.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 
@@ -24,6 +25,10 @@ struct PhaserImpl {
     void Clear() {
         memories.fill(0.0);
         last = 0.0;
+    }
+    // Feedback of 100 % can grow beyond all numbers, and would stay there.
+    void ClearUnlessFinite() {
+        if (!std::isfinite(last) || !AllFinite(memories.data(), static_cast<std::size_t>(stages))) Clear();
     }
 
     // The all-passes' coefficients in the next frames, at most a piece of the oscillator. They are the

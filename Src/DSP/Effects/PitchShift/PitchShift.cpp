@@ -73,7 +73,8 @@ const EffectTable& Table() {
             .icon = "BuiltinPlugins/PitchShift@3x.png",
             .rows = kRows,
             .chunk = {.words = kWordsOf<_transform_props>, .wideWords = kWordsOf<_transform_props>},
-            .sectionLabel = SectionLabel::None};
+            .sectionLabel = SectionLabel::None,
+            .inputGuard = InputGuard::None};  // the back-ends have their own
         for (const auto& preset : kPresets)
             made.presets.push_back({preset.name, WordsOf(SettingsOf(preset.pitch))});
         return made;
@@ -205,6 +206,8 @@ void PitchShift::TakeRecord(const _transform_props& record) {
     m_back_ends->HandOver(BackEndIndex(record));
     Assign(m_record, record);  // last: a cook that reads it finds the back-end there
     MarkStale();
+    // On this thread, as the engine allocates for another pitch.
+    CookPitchShift(record, m_back_ends->channels.load());
 }
 
 void PitchShift::Cleanup() { m_back_ends->Clear(); }
@@ -225,10 +228,8 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     // The back-end that came decides, never the record: one caught in mid-change may name another that is
     // still being handed over, and its flag follows.
     if (const int index = m_back_ends->Take(); index != BackEnds::kNone) record.backEnd = index;
-    if (InitState(record, format, force))
-        m_back_ends->format = *format;
-    else
-        MarkStale();  // the next block tries again
+    if (!InitState(record, format, force)) throw std::bad_alloc();  // passes sound until it is prepared again
+    m_back_ends->format = *format;
     // An edit after the record was read may have reached the back-end first.
     if (m_back_ends->edits.fetch_add(0, std::memory_order_acq_rel) != edits)
         m_back_ends->factorsPending.store(true, std::memory_order_relaxed);

@@ -115,7 +115,7 @@ void Reverb::Cleanup() {
 
 void Reverb::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (format->nChannels == 0) return;
+    if (frames < 1 || format->nChannels == 0) return;
     WithSamples(buffer, *format, OtherWidths::Skip, [&](auto* samples) {
         auto& engine = m_engines->For(samples);
         if (engine.IsReady()) engine.Run({samples, samples + 1}, format->nChannels, frames);
@@ -125,7 +125,7 @@ void Reverb::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* fo
 void Reverb::ProcessInternalNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                            ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (format->nChannels == 0) return;
+    if (frames < 1 || format->nChannels == 0) return;
     WithChannels(channels, *format, OtherWidths::Skip, [&](auto* const* samples) {
         auto& engine = m_engines->For(samples[0]);
         if (engine.IsReady()) engine.Run({samples[0], Sides(*format) == 2 ? samples[1] : nullptr}, 1, frames);

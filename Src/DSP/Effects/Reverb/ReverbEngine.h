@@ -8,6 +8,7 @@
 #include "DSP/Effects/Reverb/ReverbDesign.h"
 #include "DSP/Equalizer/BiquadSection.h"
 #include "DSP/Parts/PieceRing.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 
@@ -116,6 +117,9 @@ public:
             m_channels == 2 ? RunPiece<2>(at, stride, count) : RunPiece<1>(at, stride, count);
             done += count;
         }
+        // All that is infinite in the loops passes here, and stays.
+        for (const auto& data : m_data)
+            if (!std::isfinite(data.w1) || !AllFinite(data.memory.data(), kCombs)) return Clear();
     }
 
 private:

@@ -94,7 +94,8 @@ EffectTable MakeTable() {
                       .icon = "BuiltinPlugins/valvex.png",
                       .rows = kRows,
                       .chunk = {.words = kRows.size()},
-                      .sectionLabel = SectionLabel::WithoutSide};
+                      .sectionLabel = SectionLabel::WithoutSide,
+                      .inputGuard = InputGuard::None};  // what remembers guards itself
     for (const auto& preset : TubePresets::kPresets) {
         VirtualTubeAmp::Values values;
         for (std::size_t i = 0; i < values.size(); ++i) values[i] = preset.values[i / 2];

@@ -14,11 +14,17 @@ struct Designs {
 
     Designs() {
         for (const int factor : {2, 4, 8, 12, 16}) {
-            up[static_cast<std::size_t>(factor)].InitConversionByFactors(factor, 1);
-            down[static_cast<std::size_t>(factor)].InitConversionByFactors(1, factor);
+            const bool designed = up[static_cast<std::size_t>(factor)].InitConversionByFactors(factor, 1) &&
+                                  down[static_cast<std::size_t>(factor)].InitConversionByFactors(1, factor);
+            if (!designed) throw std::bad_alloc();  // the next instance tries again
         }
     }
 };
+
+bool HasRings(const SamplingFrequencyConverter& converter) {
+    return std::all_of(converter.rings, converter.rings + TubeBuffer::kMaxChannels,
+                       [](const double* ring) { return ring != nullptr; });
+}
 
 const Designs& AllDesigns() {
     static const Designs designs;
@@ -54,6 +60,10 @@ TubeOversampling::TubeOversampling() {
     m_up.Init(TubeBuffer::kMaxChannels);
     m_down = AllDesigns().down[TubeBuffer::kLargestFactor];
     m_down.Init(TubeBuffer::kMaxChannels);
+    if (HasRings(m_up) && HasRings(m_down)) return;
+    m_up.FreeRings();
+    m_down.FreeRings();
+    throw std::bad_alloc();
 }
 
 TubeOversampling::~TubeOversampling() {
@@ -62,10 +72,11 @@ TubeOversampling::~TubeOversampling() {
 }
 
 void TubeOversampling::Clear(int factor) {
-    m_factor = factor;
-    if (factor == 1) return;
-    m_up.Restart(AllDesigns().up[static_cast<std::size_t>(factor)]);
-    m_down.Restart(AllDesigns().down[static_cast<std::size_t>(factor)]);
+    const auto index = static_cast<std::size_t>(factor);
+    // Both filters or none: at two factors they would not give back as many frames as they took.
+    const bool raised =
+        factor > 1 && m_up.Restart(AllDesigns().up[index]) && m_down.Restart(AllDesigns().down[index]);
+    m_factor = raised ? factor : 1;
 }
 
 double TubeOversampling::Delay(int factor) {

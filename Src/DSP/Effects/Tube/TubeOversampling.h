@@ -31,7 +31,7 @@ private:
 };
 
 // The filters that take the stream up to a multiple of its rate and back. Their memory, for every factor, is
-// made by the constructor; nothing else allocates.
+// made by the constructor, which throws std::bad_alloc; nothing else allocates.
 class TubeOversampling {
 public:
     TubeOversampling();

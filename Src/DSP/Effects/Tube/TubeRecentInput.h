@@ -4,6 +4,8 @@
 #include <array>
 #include <cstddef>
 
+#include "Platform/FiniteSamples.h"
+
 namespace Corvo::DSP {
 
 // The newest frames in front of the tube distortion's shaper, for filters that come into use in mid-stream.
@@ -22,11 +24,12 @@ public:
         m_next = (m_next + added) % size;
     }
     void Clear() { *this = {}; }
-    // Interleaved, oldest first.
+    // Interleaved, oldest first, and finite.
     std::array<double, kFrames * 2> Samples(int channels) const {
         std::array<double, kFrames * 2> samples{};
         const auto begin = m_samples.begin();
         std::rotate_copy(begin, begin + m_next, begin + kFrames * channels, samples.begin());
+        ReplaceNonFinite(samples.data(), kFrames, channels);
         return samples;
     }
 

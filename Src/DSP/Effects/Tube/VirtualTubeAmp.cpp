@@ -4,6 +4,7 @@
 #include <numbers>
 
 #include "DSP/Effects/Tube/TubeShapers.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -113,6 +114,7 @@ template <typename Sample>
 void VirtualTubeAmp::FilterTone(Sample* samples, int frames, int channels) {
     const bool left = m_sides[kLeft].ToneOn(), right = channels == 2 && m_sides[kRight].ToneOn();
     if (!left && !right) return;
+    ReplaceNonFinite(samples, frames, channels);
     using Lanes = xsimd::batch<double>;
     static_assert(Lanes::size == kSides);
     const auto load = [](const Sides& sides) { return Lanes::load_unaligned(sides.data()); };
@@ -137,6 +139,7 @@ void VirtualTubeAmp::FilterTone(Sample* samples, int frames, int channels) {
     xsimd::select(on, m2, none).store_unaligned(memory[1].data());
     xsimd::select(on, m3, none).store_unaligned(memory[2].data());
     xsimd::select(on, m4, none).store_unaligned(memory[3].data());
+    if (!AllFinite(memory[0].data(), kSides * memory.size())) ClearMemories();
 }
 
 template <typename Sample>

@@ -28,7 +28,8 @@ public:
     virtual double DoidicA(double sample, double shape) const;
     virtual double ArayaS(double sample, double shape) const;
 
-    // Both work in place on interleaved frames of one channel (the left side's values) or two.
+    // Both work in place on interleaved frames of one channel (the left side's values) or two. The filter
+    // takes samples that are not finite for 0.
     template <typename Sample>
     void FilterTone(Sample* samples, int frames, int channels);
     template <typename Sample>

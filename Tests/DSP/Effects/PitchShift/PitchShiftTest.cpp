@@ -74,6 +74,34 @@ TEST_F(PitchShiftTest, ChangesBackEndsWithoutAllocatingWhileItProcesses) {
     }
 }
 
+// Catches an engine that grows its buffers, or is configured, while it processes: edits between blocks do
+// that.
+TEST(PitchShift, NewOnlyLocksWhileItProcesses) {
+    if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
+    for (const int rate : {8000, 48000}) {
+        const auto format = Format<float>(2, rate);
+        PitchShift effect;
+        effect.SetPreset(0);
+        effect.InitProcessing(4096, &format);
+        auto block = Noise<float>(2 * 4096);
+        Random random(3);
+        for (int i = 0; i < 1000; ++i) {
+            if (i % 100 == 10) effect.SetPreset(random.Below(effect.NumPresets()));
+            if (i % 100 == 60) effect.SetParam(0, static_cast<float>(random.Unit()), false);
+            Corvo::DSP::ProcessFlags flags;
+            const int frames = i % 2 ? 64 : 1 + random.Below(4096);
+            std::string broken;
+            {
+                const AudioThreadRules rules;
+                effect.Process(block.data(), frames, &format, flags);
+                broken = rules.Broken();
+            }
+            ASSERT_TRUE(broken.ends_with("locks") && broken.find(',') == broken.npos)
+                << broken << ", block " << i;
+        }
+    }
+}
+
 // Catches a back-end freed in use, and one that is taken but not the record's in the end.
 TEST_F(PitchShiftTest, TakesBackEndsFromAnotherThread) {
     for (const int last : {0, 1}) {
