@@ -89,11 +89,13 @@ void AudioWriter::CompleteWav() {
     if (size % 2 != 0) bytes.Write("", 1);
 }
 
-void AudioWriter::Commit() {
+OutputFile& AudioWriter::Complete() {
     m_sound->Close();
     if (m_wav) CompleteWav();
-    m_output.Commit();
+    return m_output;
 }
+
+void AudioWriter::Commit() { Complete().Commit(); }
 
 void WarnOfClipping(const AudioWriter& writer, std::int64_t before) {
     if (const auto count = writer.ClippedSamples() + before; count > 0)

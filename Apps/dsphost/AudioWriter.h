@@ -36,6 +36,8 @@ public:
     void Write(const double* samples, std::int64_t frames);
     // Completes the file and puts it in its place. Throws IoError.
     void Commit();
+    // The first half of it; the result is still to be committed.
+    OutputFile& Complete();
 
     std::int64_t ClippedSamples() const { return m_clipped; }
     std::int64_t FramesWritten() const { return m_frames; }

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <functional>
 #include <memory>
+#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -10,7 +11,9 @@
 #include <CLI/CLI.hpp>
 
 #include "Arguments.h"
+#include "AudioReader.h"
 #include "Errors.h"
+#include "Process.h"
 #include "Text.h"
 
 // Every command and its options. The parser's header takes seconds to compile: no other file includes it.
@@ -29,6 +32,9 @@ std::pair<CLI::App&, Arguments&> Add(CLI::App& app, const char* name, const char
 
 void AddInput(CLI::App& command, std::string& input) {
     command.add_option("IN", input, "Audio file, or - for standard input")->required();
+    command.add_option_function<std::string>(
+        "--spool-limit", AudioReader::SetSpoolLimit,
+        "Most that a temporary file may take for input that does not stream (8G)");
 }
 
 void AddAudioOutput(CLI::App& command, std::string& output) {
@@ -170,6 +176,16 @@ void CheckCommand(const CLI::App& app, int count, char** arguments) {
         throw UserError("there is no command \"" + name + "\"; " + Suggestion(name, names));
 }
 
+// The parser's "Could not convert: --rate = 1e5" in our own words.
+std::string NotANumber(const CLI::App& app, const std::string& text) {
+    const auto colon = text.find(": "), equals = text.find(" = ");
+    if (colon == text.npos || equals == text.npos) return text + "; see --help";
+    const std::string name = text.substr(colon + 2, equals - colon - 2);
+    const auto* const option = app.get_subcommands().front()->get_option_no_throw(name);
+    return name + " cannot be \"" + Shortened(text.substr(equals + 3), kLongestQuote) + "\"; accepted: a " +
+           (option && option->get_type_name() == "INT" ? "whole number in plain digits" : "number");
+}
+
 }  // namespace
 
 void RunCommandLine(int count, char** arguments) {
@@ -184,7 +200,11 @@ void RunCommandLine(int count, char** arguments) {
     try {
         app.parse(count, arguments);
     } catch (const CLI::Success& help) {  // --help, --version
-        app.exit(help);
+        std::ostringstream text, none;
+        app.exit(help, text, none);
+        Print(text.str());
+    } catch (const CLI::ConversionError& error) {
+        throw UserError(NotANumber(app, error.what()));
     } catch (const CLI::ParseError& error) {
         throw UserError(std::string(error.what()) + "; see --help");
     }

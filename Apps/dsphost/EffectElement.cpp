@@ -14,7 +14,7 @@ namespace {
 
 using Corvo::DSP::ProcessFlags;
 
-constexpr std::size_t kLargestChunk = 1 << 24;
+constexpr std::size_t kLargestChunk = 1 << 20;
 
 struct Setting {
     std::string_view key, value;
@@ -39,23 +39,6 @@ std::vector<Setting> SplitSettings(std::string_view text, const std::string& eff
         }
     }
     return settings;
-}
-
-std::vector<std::uint8_t> ReadChunk(const std::string& path) {
-    File file(path, File::Mode::Read, path);
-    std::vector<std::uint8_t> bytes(kLargestChunk + 1);
-    bytes.resize(file.Read(bytes.data(), bytes.size()));
-    file.ThrowIfFailed();
-    if (bytes.empty()) throw UserError(path + ": is empty");
-    if (bytes.size() > kLargestChunk) throw UserError(path + ": is too large to be an effect's settings");
-    return bytes;
-}
-
-MP_ENVELOPE_SEGMENT Jump(const AutomationPoint& point) {
-    MP_ENVELOPE_SEGMENT segment{};
-    segment.rtStart = segment.rtEnd = point.frame;
-    segment.valStart = segment.valEnd = point.value;
-    return segment;
 }
 
 // Copies between one interleaved block and its channels one behind the other.
@@ -114,13 +97,8 @@ void EffectElement::ChoosePreset(std::string_view name) {
 }
 
 void EffectElement::LoadChunk(const std::string& path) {
-    const auto bytes = ReadChunk(path);
-    const auto before = State();
-    m_effect->SetSettingsChunk(bytes);
-    // Effects ignore what they cannot read without a word.
-    if (State() == before && bytes != before)
-        throw UserError(path + ": " + std::to_string(bytes.size()) + " bytes are not settings of " + m_name +
-                        ", which have " + std::to_string(m_effect->GetSettingsChunkSize()));
+    const std::string bytes = ReadWhole(path, kLargestChunk);
+    UseChunk(m_factory, *m_effect, {bytes.begin(), bytes.end()}, path);
 }
 
 void EffectElement::SetParameter(std::string_view label, std::string_view text) {
@@ -143,7 +121,7 @@ int EffectElement::Latency() { return std::max(m_effect->GetLatency(), 0); }
 
 void EffectElement::Process(double* samples, int frames, std::int64_t time) {
     ProcessFlags flags;
-    if (m_automated) m_effect->SetEnvelopeTime(time);
+    PlayDue(time);
     if (!m_planar)
         m_effect->Process(samples, frames, &m_format, flags);
     else if (m_format.wBitsPerSample == 64)
@@ -163,10 +141,16 @@ std::vector<int> EffectElement::AutomationLanes(std::string_view parameter) {
 }
 
 void EffectElement::Automate(int lane, std::span<const AutomationPoint> points) {
-    std::vector<MP_ENVELOPE_SEGMENT> segments;
-    for (const auto& point : points) segments.push_back(Jump(point));
-    m_effect->AddEnvelope(lane, static_cast<int>(segments.size()), segments.data());
-    m_automated = true;
+    m_lanes.push_back({lane, {points.begin(), points.end()}});
+}
+
+// Not as envelopes: an effect plays those from the start after every move, and in the end does nothing else.
+void EffectElement::PlayDue(std::int64_t time) {
+    for (auto& lane : m_lanes)
+        // Before its first point a parameter has that point's value.
+        for (auto& next = lane.next;
+             next < lane.points.size() && (next == 0 || lane.points[next].frame <= time); ++next)
+            m_effect->SetParam(lane.index, lane.points[next].value, true);
 }
 
 std::vector<std::uint8_t> EffectElement::State() {

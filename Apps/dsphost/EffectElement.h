@@ -33,13 +33,21 @@ private:
     void ChoosePreset(std::string_view name);
     void LoadChunk(const std::string& path);
     void SetParameter(std::string_view label, std::string_view text);
+    void PlayDue(std::int64_t time);
+
+    struct Lane {
+        int index;
+        std::vector<AutomationPoint> points;
+        std::size_t next = 0;  // the first that is not due
+    };
 
     EffectFactory m_factory;
     std::unique_ptr<Effect> m_effect;
     std::string m_name;
     std::vector<EffectParameter> m_parameters;
     tWAVEFORMATEX m_format{};
-    bool m_automated = false, m_planar = false;
+    std::vector<Lane> m_lanes;
+    bool m_planar = false;
     std::vector<double> m_planes;  // one channel behind the other; floats where the format says so
 };
 

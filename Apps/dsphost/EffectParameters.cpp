@@ -1,7 +1,9 @@
 #include "EffectParameters.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
+#include <ranges>
 #include <stdexcept>
 
 #include "Errors.h"
@@ -52,6 +54,60 @@ bool BeyondRange(Effect& scratch, const EffectParameter& parameter, double numbe
     return normalised >= 1.0f ? number > *end + slack : number < *end - slack;
 }
 
+std::vector<std::uint8_t> StateOf(Effect& effect) {
+    std::vector<std::uint8_t> chunk;
+    effect.GetSettingsChunk(chunk);
+    return chunk;
+}
+
+using State = std::vector<std::uint8_t>;
+
+std::uint32_t WordAt(const State& state, std::size_t place) {
+    std::uint32_t word = 0;
+    for (std::size_t i = 4; i-- > 0;) word = word << 8 | state[place + i];
+    return word;
+}
+
+std::vector<State> PresetStates(EffectFactory factory) {
+    const auto effect = factory();
+    std::vector<State> states;
+    for (int i = 0; i < effect->NumPresets(); ++i) {
+        effect->SetPreset(i);
+        states.push_back(StateOf(*effect));
+    }
+    return states;
+}
+
+// Whether the words that the parameter sets, one for each side, lie between those of its ends or of presets,
+// which may go beyond. Where it sets more it is no plain number, and the effect looks after it.
+bool InRange(EffectFactory factory, const EffectParameter& parameter, const State& state,
+             std::vector<State> known) {
+    constexpr int kSides = 2;
+    const auto effect = factory();
+    for (const float end : {0.0f, 1.0f}) {
+        effect->SetParam(parameter.index, end, false);
+        known.push_back(StateOf(*effect));
+    }
+    const State &low = known[known.size() - 2], &high = known.back();
+    int set = 0, outside = 0;
+    for (std::size_t place = 0; place + 4 <= state.size(); place += 4) {
+        if (WordAt(low, place) == WordAt(high, place)) continue;
+        // What parameters store as integers would be tiny as floats, or none.
+        const auto isFloat = [&](const State& each) {
+            return std::isnormal(std::bit_cast<float>(WordAt(each, place)));
+        };
+        const bool floats = isFloat(low) || isFloat(high);
+        const auto number = [&](const State& each) {
+            const auto word = WordAt(each, place);
+            return floats ? static_cast<double>(std::bit_cast<float>(word)) : static_cast<std::int32_t>(word);
+        };
+        const auto [least, most] = std::ranges::minmax(known | std::views::transform(number));
+        ++set;
+        outside += !(number(state) >= least && number(state) <= most);
+    }
+    return outside == 0 || set > kSides;
+}
+
 }  // namespace
 
 std::unique_ptr<Effect> MakeEffect(EffectFactory factory) {
@@ -61,11 +117,25 @@ std::unique_ptr<Effect> MakeEffect(EffectFactory factory) {
 }
 
 std::unique_ptr<Effect> CopyEffect(EffectFactory factory, Effect& effect) {
-    std::vector<std::uint8_t> chunk;
-    effect.GetSettingsChunk(chunk);
     auto copy = factory();
-    copy->SetSettingsChunk(chunk);
+    copy->SetSettingsChunk(StateOf(effect));
     return copy;
+}
+
+void UseChunk(EffectFactory factory, Effect& effect, const std::vector<std::uint8_t>& chunk,
+              const std::string& name) {
+    const auto before = StateOf(effect);
+    if (chunk.size() <= before.size()) effect.SetSettingsChunk(chunk);
+    // Effects ignore what they cannot read without a word.
+    if (chunk.size() > before.size() || (StateOf(effect) == before && chunk != before))
+        throw UserError(name + ": " + std::to_string(chunk.size()) + " bytes are not settings of " +
+                        effect.GetName() + ", which have " + std::to_string(before.size()));
+    const auto state = StateOf(effect);
+    const auto presets = PresetStates(factory);
+    for (const auto& parameter : DescribeParameters(factory))
+        if (!InRange(factory, parameter, state, presets))
+            throw UserError(name + ": is not settings of " + effect.GetName() + ": " + parameter.label +
+                            " is out of range");
 }
 
 std::vector<EffectParameter> DescribeParameters(EffectFactory factory) {
@@ -99,15 +169,15 @@ std::vector<const EffectParameter*> FindParameters(const std::vector<EffectParam
     for (const auto& parameter : all)
         for (const auto& name : {parameter.name, parameter.label})
             if (std::ranges::find(labels, name) == labels.end()) labels.push_back(name);
-    throw UserError(effectName + " has no parameter \"" + std::string(label) + "\"; " +
-                    Suggestion(label, labels));
+    const std::string shown = Shortened(label, kLongestQuote);
+    throw UserError(effectName + " has no parameter \"" + shown + "\"; " + Suggestion(shown, labels));
 }
 
 float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& parameter,
                  std::string_view text, std::string& warning) {
     text = Trimmed(text);
     const std::string asked =
-        effect.GetName() + ": " + parameter.label + " cannot be \"" + std::string(text) + "\"; ";
+        effect.GetName() + ": " + parameter.label + " cannot be \"" + Shortened(text, kLongestQuote) + "\"; ";
     if (text.starts_with(kNormalisedMark)) {
         const auto number = ToNumber(text.substr(kNormalisedMark.size()));
         if (!number || *number < 0.0 || *number > 1.0)
@@ -134,6 +204,8 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
     } catch (const std::out_of_range&) {
         throw UserError(asked + accepted);
     }
+    // Beyond the range parsers limit, or say by how much.
+    if (length > 0 && !std::isnan(value)) value = std::clamp(value, 0.0f, 1.0f);
     if (!(value >= 0.0f && value <= 1.0f) ||
         !SaysTheSame(TextAt(*scratch, parameter, value), text, parameter.unit))
         throw UserError(asked + accepted);

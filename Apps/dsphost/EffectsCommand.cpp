@@ -8,7 +8,8 @@
 #include "Arguments.h"
 #include "EffectParameters.h"
 #include "EffectTable.h"
-#include "File.h"
+#include "EqualiserElement.h"
+#include "Process.h"
 #include "Text.h"
 
 namespace dsphost {
@@ -127,21 +128,53 @@ std::string Overview() {
         rows.push_back({effect->GetName(), std::to_string(effect->GetParamCount()),
                         std::to_string(effect->NumPresets()), std::to_string(effect->GetLatency())});
     }
+    rows.push_back({EqualiserElement::kName, "bands", "0", "0"});
     return Table(rows);
+}
+
+// The equaliser has bands where effects have parameters.
+constexpr const char* kBandForm = "FREQ TYPE [GAIN_DB] [q=Q]";
+
+Json DescribeEqualiser() {
+    return {{"name", EqualiserElement::kName},
+            {"latency", 0},
+            {"presets", Json::array()},
+            {"parameters", Json::array()},
+            {"bands",
+             {{"form", kBandForm},
+              {"most", Corvo::DSP::builtin_effects_data::kMaxBands},
+              {"types", FilterTypes()}}}};
+}
+
+std::string ExplainEqualiser() {
+    const std::string most = std::to_string(Corvo::DSP::builtin_effects_data::kMaxBands);
+    return std::string(EqualiserElement::kName) + ", latency 0 frames\n\nUp to " + most +
+           " bands with semicolons between them: \"EQ: 80 highpass; 2500 peak -3 q=200\"\n\n" +
+           "  FREQ      in whole Hz, 1 to 1000000\n  TYPE      " + Joined(FilterTypes(), ", ") +
+           "\n  GAIN_DB   -100 to 100 in steps of 0.1, 0 when left out\n" +
+           "  q=Q       1 to 100000, what suits the type when left out\n";
 }
 
 }  // namespace
 
 void RunEffects(EffectsArguments arguments) {
     auto factories = EffectFactories();
-    if (!arguments.effect.empty())
-        factories = factories.subspan(FindName(arguments.effect, EffectNames(), "effect"), 1);
+    bool equaliser = true;
+    if (!arguments.effect.empty()) {
+        std::vector<std::string> names(EffectNames().begin(), EffectNames().end());
+        names.emplace_back(EqualiserElement::kName);
+        const std::size_t found = FindName(arguments.effect, names, "effect");
+        equaliser = found == factories.size();
+        factories = factories.subspan(found, equaliser ? 0 : 1);
+    }
     if (arguments.json) {
         Json all = Json::array();
         for (const auto factory : factories) all.push_back(Describe(factory));
+        if (equaliser) all.push_back(DescribeEqualiser());
         return Print(all.dump(2) + "\n");
     }
-    Print(arguments.effect.empty() ? Overview() : Explain(factories.front()));
+    if (arguments.effect.empty()) return Print(Overview());
+    Print(equaliser ? ExplainEqualiser() : Explain(factories.front()));
 }
 
 }  // namespace dsphost

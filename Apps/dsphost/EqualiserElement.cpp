@@ -32,9 +32,7 @@ constexpr std::array kTypes{
 // clang-format on
 
 EQFilterType ParseType(std::string_view text) {
-    std::vector<std::string> names;
-    for (const auto& type : kTypes) names.push_back(type.name);
-    return kTypes[FindName(text, names, "filter type")].type;
+    return kTypes[FindName(text, FilterTypes(), "filter type")].type;
 }
 
 // The text up to `end`, which goes, too.
@@ -49,7 +47,9 @@ std::string_view TakeWord(std::string_view& text) {
     return TakeUntil(text, " \t");
 }
 
-std::string Quoted(std::string_view text) { return std::string(1, '"').append(text).append(1, '"'); }
+std::string Quoted(std::string_view text) {
+    return std::string(1, '"').append(Shortened(text, kLongestQuote)).append(1, '"');
+}
 
 [[noreturn]] void Refuse(std::string_view band, const std::string& why) {
     throw UserError(std::string(EqualiserElement::kName) + ": " + Quoted(band) + ": " + why);
@@ -92,6 +92,12 @@ void AddBand(builtin_effects_data& data, std::string_view band) {
 }
 
 }  // namespace
+
+std::vector<std::string> FilterTypes() {
+    std::vector<std::string> names;
+    for (const auto& type : kTypes) names.emplace_back(type.name);
+    return names;
+}
 
 builtin_effects_data ParseBands(std::string_view settings) {
     builtin_effects_data data;

@@ -31,6 +31,9 @@ private:
     tWAVEFORMATEX m_format{};
 };
 
+// The names that TYPE may have.
+std::vector<std::string> FilterTypes();
+
 // What an element of these settings is made of. Throws UserError.
 Corvo::DSP::builtin_effects_data ParseBands(std::string_view settings);
 

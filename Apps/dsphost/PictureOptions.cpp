@@ -36,7 +36,7 @@ constexpr ViewOption kView[] = {
 // By the first bytes of the file.
 bool IsTypeface(const std::string& path) {
     std::array<char, 4> tag{};
-    std::ifstream(path, std::ios::binary).read(tag.data(), tag.size());
+    std::ifstream(PathOf(path), std::ios::binary).read(tag.data(), tag.size());
     const std::string_view found(tag.data(), tag.size());
     using namespace std::string_view_literals;
     return found == "\0\1\0\0"sv || found == "OTTO"sv || found == "true"sv || found == "ttcf"sv;
@@ -68,7 +68,7 @@ std::unique_ptr<Picture> PictureOptions::Make(int narrower) const {
     const auto [width, height] = size.empty() ? std::pair{kUsualWidth - narrower, kUsualHeight} : Sides(size);
     if (!(dpi >= kLowestDpi && dpi <= kHighestDpi))
         throw UserError("--dpi cannot be " + std::to_string(dpi) + "; accepted: 24 to 960");
-    if (!font.empty() && !std::filesystem::is_regular_file(font))
+    if (!font.empty() && !std::filesystem::is_regular_file(PathOf(font)))
         throw UserError("--font: there is no file \"" + font + "\"");
     if (!font.empty() && !IsTypeface(font))
         throw UserError("--font: \"" + font + "\" is no TrueType or OpenType font");
@@ -90,9 +90,22 @@ void PictureOptions::ApplyTo(kivspectrum& analyser) const {
     analyser.popupmenu_process(FindName(scale, scales, "scale") == 0 ? 1286 : 1285);
 }
 
-void Save(Picture& picture, OutputFile& output) {
+std::unique_ptr<OutputFile> OpenPicture(const std::string& path, const OutputRules& rules) {
+    auto output = std::make_unique<OutputFile>(path, rules);
+    constexpr std::string_view kEnding = ".png";
+    const auto ending = path.size() > kEnding.size() ? path.substr(path.size() - kEnding.size()) : "";
+    if (!output->IsStream() && !SameNoCase(ending, kEnding))
+        throw UserError(path + ": the ending must be .png, the kind of picture that is written");
+    return output;
+}
+
+void Write(Picture& picture, OutputFile& output) {
     const auto png = picture.Png();
     output.Bytes().Write(png.data(), png.size());
+}
+
+void Save(Picture& picture, OutputFile& output) {
+    Write(picture, output);
     output.Commit();
 }
 

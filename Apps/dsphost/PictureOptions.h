@@ -11,6 +11,7 @@ class kivspectrum;
 namespace dsphost {
 
 class OutputFile;
+struct OutputRules;
 
 // What every command that draws takes.
 struct PictureOptions {
@@ -28,6 +29,10 @@ struct PictureOptions {
 // What a display option may be.
 std::vector<std::string> ViewNames();
 
+// Throws UserError for a name that promises something else than a PNG file.
+std::unique_ptr<OutputFile> OpenPicture(const std::string& path, const OutputRules& rules);
+void Write(Picture& picture, OutputFile& output);
+// Writes and commits.
 void Save(Picture& picture, OutputFile& output);
 
 }  // namespace dsphost

@@ -62,6 +62,9 @@ void RunRender(RenderArguments arguments) {
     std::optional<SampleFormat> asked;
     if (!arguments.format.empty()) asked = ParseSampleFormat(arguments.format);
     rules.inputs = {arguments.input, arguments.automation};
+    auto outputs = arguments.chunks;
+    outputs.push_back(arguments.output);
+    RefuseSameOutputs(outputs);
 
     Chain chain(arguments.effects);
     AudioReader input(arguments.input);
@@ -83,8 +86,9 @@ void RunRender(RenderArguments arguments) {
         Progress progress("render", input.Rate(), input.Frames(), arguments.writing.quiet);
         Render(input, chain, output, options, [&](std::int64_t frames) { progress.Update(frames); });
     }
-    output.Commit();
-    for (const auto& chunk : chunks) chunk->Commit();
+    std::vector<OutputFile*> together{&output.Complete()};
+    for (const auto& chunk : chunks) together.push_back(chunk.get());
+    CommitTogether(together);
     WarnOfClipping(output);
 }
 

@@ -62,7 +62,7 @@ void RunSonogram(SonogramArguments arguments) {
     kivspectrum::SetAnalysisWindowsOverlap(kDisplayOverlap);
     analyser.ObserverUpdate();
     arguments.drawing.ApplyTo(analyser);
-    OutputFile output(arguments.output, arguments.writing.rules);
+    const auto output = OpenPicture(arguments.output, arguments.writing.rules);
     Corvo::Sonogram::SetColourScheme(arguments.scheme);
     analyser.ShowSonogram(true);
     const auto draw = [&](auto& target) {
@@ -84,7 +84,7 @@ void RunSonogram(SonogramArguments arguments) {
         analyser.GetSpectrumDrawer()->AgePeaks();  // as drawing every refresh would
     });
     picture->Paint(draw);
-    Save(*picture, output);
+    Save(*picture, *output);
 }
 
 }  // namespace dsphost

@@ -28,8 +28,6 @@ constexpr int kShortest = 128, kLongest = 524288;
 const std::vector<std::string> kWindows{"rectangular", "triangular", "hann", "hamming", "blackman"};
 
 void Check(const SpectrumArguments& arguments) {
-    if (arguments.picture == "-" && arguments.csv == "-")
-        throw UserError("picture and table cannot both go to standard output");
     if (arguments.picture.empty() && arguments.csv.empty())
         throw UserError("an output is missing; accepted: a picture (OUT.png), --csv FILE, or both");
     if (arguments.length < kShortest || arguments.length > kLongest ||
@@ -51,7 +49,6 @@ std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser,
     Progress progress("spectrum", input.Rate(), input.Frames(), arguments.writing.quiet);
     std::int64_t read = 0, spectra = 0;
     for (int wanted = arguments.length;; wanted = kivspectrum::settings.hop_length) {
-        CheckInterrupted();
         const int got = input.Read(samples.data(), wanted);
         if (got < wanted && spectra > 0) break;
         std::fill(samples.begin() + got * channels, samples.end(), 0.0);
@@ -101,6 +98,7 @@ void Draw(kivspectrum& analyser, const std::vector<double>& power, Picture& pict
 
 void RunSpectrum(SpectrumArguments arguments) {
     Check(arguments);
+    RefuseSameOutputs({arguments.picture, arguments.csv});
     arguments.writing.rules.inputs = {arguments.input};
     auto& settings = kivspectrum::settings;
     settings.window_type = static_cast<std::int32_t>(FindName(arguments.window, kWindows, "window"));
@@ -116,21 +114,27 @@ void RunSpectrum(SpectrumArguments arguments) {
     analyser.set_parameters(input.Rate());
     analyser.SetOn(true);
     arguments.drawing.ApplyTo(analyser);
-    std::optional<OutputFile> table, drawing;
+    std::optional<OutputFile> table;
+    std::unique_ptr<OutputFile> drawing;
     std::unique_ptr<Picture> picture;
     if (!arguments.csv.empty()) table.emplace(arguments.csv, arguments.writing.rules);
     if (!arguments.picture.empty()) {
         picture = arguments.drawing.Make();
-        drawing.emplace(arguments.picture, arguments.writing.rules);
+        drawing = OpenPicture(arguments.picture, arguments.writing.rules);
     }
     const auto power = AveragePower(input, analyser, arguments);
-    if (picture) Draw(analyser, power, *picture);
+    std::vector<OutputFile*> together;
+    if (picture) {
+        Draw(analyser, power, *picture);
+        Write(*picture, *drawing);
+        together.push_back(drawing.get());
+    }
     if (table) {
         const std::string text = Csv(power, analyser.GetWindow(), input.Rate(), arguments.length);
         table->Bytes().Write(text.data(), text.size());
+        together.push_back(&*table);
     }
-    if (picture) Save(*picture, *drawing);
-    if (table) table->Commit();
+    CommitTogether(together);
 }
 
 }  // namespace dsphost

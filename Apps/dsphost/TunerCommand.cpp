@@ -131,7 +131,7 @@ void RunTuner(TunerArguments arguments) {
     const auto picture = arguments.drawing.Make();
     Listener listener(arguments);
     arguments.drawing.ApplyTo(listener.Analyser());
-    OutputFile output(arguments.output, arguments.writing.rules);
+    const auto output = OpenPicture(arguments.output, arguments.writing.rules);
     listener.Analyser().GetTuner()->SetSensibilityPreset(sensitivity);
     Moment moment(arguments.at);
     std::vector<Heard> all;
@@ -148,7 +148,7 @@ void RunTuner(TunerArguments arguments) {
     if (!drawn && arguments.at)
         throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; the file ends before");
     if (!drawn) draw();
-    Save(*picture, output);
+    Save(*picture, *output);
     if (arguments.json) Print(Json(all));
 }
 

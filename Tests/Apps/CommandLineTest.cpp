@@ -18,6 +18,7 @@ protected:
         Save("cd.wav", {2, 44100, kPcm16, NoiseSound(100).samples});
         SaveBytes("empty.wav", "");
         SaveBytes("taken.wav", "something dear");
+        SaveBytes("low.chunk", std::string(18, '\0') + "\x80\xBF");  // a word of -1
         SaveBytes("moves.json", R"([{"parameter": "Pan", "points": [[0, 0.5]]}])");
     }
 };
@@ -41,6 +42,11 @@ const Refusal kLines[] = {
     {"render float.wav o.flac", "o.flac|f32|s16, s24"},
     {"render in.wav o.wav --tail long", "--tail|long|auto"},
     {"render in.wav o.wav --fx Gain --automation moves.json", "moves.json|Gain plays no automation"},
+    {"render in.wav o.wav --spool-limit 1X", "--spool-limit|1X|500M"},
+    {"render in.wav o.wav --fx Gain --save-chunk ./o.wav", "./o.wav and o.wav are one file"},
+    {"render in.wav - --fx Gain --save-chunk -", "standard output"},
+    {"convert cd.wav o.wav --rate 1e5", "--rate|1e5|whole number"},
+    {"convert cd.wav o.wav --rate 0", "--rate cannot be 0|1000 to 768000"},
     {"convert cd.wav o.wav --rate 1001 --format s16", "cents|--exact"},
     {"convert float.wav o.wav --rate 96000 --dither tpdf", "s16 and s24"},
     {"convert wide.wav o.wav --rate 48000", "49 channels|48"},
@@ -48,6 +54,8 @@ const Refusal kLines[] = {
     {"pitch in.wav o.wav --semitones 1 --engine classic --speed 2", "--speed|new"},
     {"eq-curve o.csv --fx Gain", "Gain|EQ:"},
     {"spectrum in.wav - --csv -", "standard output"},
+    {"spectrum in.wav o.png --csv ./o.png", "one file"},
+    {"tuner in.wav o.jpg", "o.jpg|.png"},
     {"spectrum in.wav o.png --size 0x10", "--size|0x10"},
     {"tuner in.wav o.png --view wavy", "wavy|view"},
     {"tuner in.wav o.png --at 99", "--at|ends"},
@@ -60,6 +68,7 @@ const Refusal kEffects[] = {
     {"Gain: Gain=loud", "Gain|loud|-Inf. dB to 20.0 dB|n:"},
     {"Gain: Pan=nan", "Pan|nan|-1.00 to 1.00"},
     {"Gain: chunk=taken.wav", "taken.wav|14 bytes|20"},
+    {"Gain: chunk=low.chunk", "low.chunk|Gain is out of range"},
     {"Gain: Gain", "Gain|is not a setting|label=value"},
     {"Echo: Depth=5 apples", "5 apples|4999 ms"},
     {"Valvex: Oversampling=5", "5|1, 2, 4, 8"},
@@ -72,6 +81,9 @@ const Refusal kEffects[] = {
 // Moves for a chain of tremolo, echo, tremolo.
 const Refusal kMoves[] = {
     {"[", "is not JSON"},
+    {std::string(100000, '['), "too deeply"},
+    {"[1e999]", "too large"},
+    {R"([{"effect": "Echo", "parameter": "Depth", "points": [")" + std::string(100000, 'x') + "\"]}]", "xxx..."},
     {"[7]", "lane 1: a lane is"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[0]]}])", "a point is"},
     {R"([{"effect": "Echo", "parameter": "Depth", "points": [[1e300, 0]]}])", "time"},
@@ -90,6 +102,7 @@ TEST_F(CommandLine, RefusesBadInput) {
         SCOPED_TRACE(arguments);
         const auto result = Run(arguments);
         ExpectRefused(result, words);
+        EXPECT_LT(result.err.size(), 400u);
         EXPECT_EQ(result.out, "");
     };
     for (const auto& c : kLines) refuse(c.arguments, c.words);
@@ -122,17 +135,26 @@ TEST_F(CommandLine, ReportsAFullDisk) {
     for (const std::string name : {"out.wav", "out.flac", "out.aiff", "taken.wav"})
         ExpectRefused(Shell("ulimit -f 100; DSPHOST render -y long.wav " + name), name + "|too large", 1);
     EXPECT_EQ(Bytes("taken.wav"), "something dear");
-    EXPECT_EQ(Shell("DSPHOST effects > /dev/full").status, 1);
+    for (const std::string arguments : {"effects", "--help", "render --help"})
+        ExpectRefused(Shell("DSPHOST " + arguments + " > /dev/full"), "standard output|No space left", 1);
 }
 
-// Ctrl-C while it waits for more input leaves nothing behind either.
+// Whatever ends the program and whatever it waits for, nothing is left, in its folder or among the temporary
+// files: samples of a stream, the rest of its header, what does not stream.
 TEST_F(CommandLine, LeavesNothingWhenInterrupted) {
-    SaveBytes("endless", Bytes("in.wav").replace(40, 4, "\xFF\xFF\xFF\xFF"));
-    const auto result = Shell(
-        "mkfifo fifo; exec 3<>fifo; cat endless >&3; DSPHOST render fifo out.flac & "
-        "while ! ls | grep -q part; do sleep 0.02; done; kill -TERM $!; wait $!; "
-        "status=$?; rm fifo; exit $status");
-    ExpectRefused(result, "interrupted", 130);
+    SaveBytes("samples", Bytes("in.wav").replace(40, 4, "\xFF\xFF\xFF\xFF"));
+    SaveBytes("header", "RIFF....WAVE");
+    SaveBytes("flac", "fLaC" + std::string(50000, '.'));
+    for (const std::string start : {"samples", "header", "flac"})
+        for (const std::string signal : {"HUP", "INT", "TERM"}) {
+            SCOPED_TRACE(start + " " + signal);
+            // What runs in the background would ignore an interrupt.
+            const auto result = Shell(
+                "mkdir tmp; mkfifo fifo; exec 3<>fifo; cat " + start +
+                " >&3; TMPDIR=tmp env --default-signal=INT DSPHOST render fifo out.flac & sleep 0.2; kill -" +
+                signal + " $!; wait $!; status=$?; rm fifo; rmdir tmp; exit $status");
+            ExpectRefused(result, "interrupted", 130);
+        }
 }
 #endif
 

@@ -1,8 +1,14 @@
 #include <gtest/gtest.h>
 
+#include <filesystem>
 #include <string>
+#include <utility>
+#include <vector>
 
 #include "Apps/Program.h"
+#include "WavHeader.h"
+
+using namespace std::string_literals;
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 constexpr bool kSanitized = true;
@@ -50,25 +56,92 @@ TEST_F(Pipes, ReadsAStreamToItsEnd) {
 }
 
 // A producer that died is no reason to lose what came, but it must not pass unnoticed.
-TEST_F(Pipes, WarnsOfAStreamThatEndsEarly) {
+TEST_F(Pipes, WarnsOfInputThatEndsEarly) {
     Save("in.wav", NoiseSound(3000));
-    const auto result = Run("render - out.wav", Bytes("in.wav").substr(0, 44 + 4 * 2000));
-    EXPECT_EQ(result.status, 0);
-    EXPECT_EQ(result.err, "dsphost: warning: standard input: ended after 2000 of 3000 frames\n");
-    EXPECT_EQ(Load("out.wav").Frames(), 2000u);
+    const std::string cut = Bytes("in.wav").substr(0, 44 + 4 * 2000);
+    SaveBytes("cut.wav", cut);
+    Save("in.ogg", NoiseSound(200000, 1, SF_FORMAT_OGG | SF_FORMAT_VORBIS));
+    SaveBytes("cut.ogg", Bytes("in.ogg").substr(0, Bytes("in.ogg").size() / 2));
+    for (const auto& [arguments, warning] :
+         {std::pair{"- out.wav", "standard input: ended after 2000 of 3000 frames\n"},
+          {"cut.wav out.wav", "cut.wav: ended after 2000 of 3000 frames\n"},
+          {"cut.ogg out.wav", "cut.ogg: was cut off, after "}}) {
+        const auto result = Run(std::string("render -y ") + arguments, cut);
+        EXPECT_EQ(result.status, 0);
+        EXPECT_EQ(result.err.find(std::string("dsphost: warning: ") + warning), 0u) << result.err;
+        EXPECT_LT(result.err.size(), 80u) << result.err;
+    }
+}
+
+// Only the sizes that programs write when they do not know it stand for "unknown"; others are meant, 2 GiB
+// and more too.
+TEST(WavStreams, KnowTheirSizeOrNot) {
+    Sound head = NoiseSound(0, 1, SF_FORMAT_WAV | SF_FORMAT_PCM_24);
+    const auto path = (std::filesystem::temp_directory_path() / "dsphost-head.wav").string();
+    Save(path, head);
+    const std::string wav = Bytes(path).substr(0, 44);
+    std::filesystem::remove(path);
+    const auto read = [](std::string bytes) {
+        std::vector<unsigned char> kept;
+        return dsphost::ReadWavStreamHeader(
+            [&](void* to, std::size_t count) {
+                count = bytes.copy(static_cast<char*>(to), count);
+                bytes.erase(0, count);
+                return count;
+            },
+            kept);
+    };
+    constexpr std::int64_t kNone = -1;
+    const struct {
+        std::uint32_t size;
+        std::int64_t meant, doubtful;
+    } cases[] = {
+        {300, 300, kNone},
+        {0, kNone, kNone},
+        {0xFFFFFFFF, kNone, kNone},
+        {0x7FFFF000, kNone, 0x7FFFF000},
+        {0x7FFFEFFF, kNone, 0x7FFFEFFF},  // whole frames of 3 bytes
+        {0x7FFFEFFE, 0x7FFFEFFE, kNone},
+        {0x7FFFF100, 0x7FFFF100, kNone},
+        {0xC0000000, 0xC0000000, kNone},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.size);
+        std::string bytes = wav;
+        for (std::size_t i = 0; i < 4; ++i) bytes[40 + i] = static_cast<char>(c.size >> (8 * i));
+        const auto header = read(bytes);
+        ASSERT_TRUE(header);
+        EXPECT_EQ(header->sampleBytes.value_or(kNone), c.meant);
+        EXPECT_EQ(header->doubtfulBytes.value_or(kNone), c.doubtful);
+    }
+    EXPECT_TRUE(dsphost::StartsChunk("LIST.", 6));
+    EXPECT_TRUE(dsphost::StartsChunk("\0LIST"s, 7));
+    EXPECT_FALSE(dsphost::StartsChunk("\0\0\0\0\0"s, 6));
 }
 
 TEST_F(Pipes, RefusesStreamsThatAreNoAudio) {
     Save("in.wav", NoiseSound(100));
-    const std::string wav = Bytes("in.wav");
+    std::string wav = Bytes("in.wav");
     for (const auto& [stream, words] : {std::pair{std::string(), "empty"},
                                         {wav.substr(0, 44), "no samples"},
                                         {wav.substr(0, 30), "not an audio file"},
-                                        {"RIFF....WAVEdata....", "not an audio file"}})
+                                        {"RIFF....WAVEdata....", "not an audio file"},
+                                        {wav.replace(24, 4, "\0\0\0\0"s), "sample rate of 0 Hz"}})
         ExpectRefused(Run("render - out.wav", stream), std::string("standard input|") + words);
 }
 
 #if !defined(_WIN32)
+// Endless input ends soon, and its temporary file before the disk is full.
+TEST_F(Pipes, BoundsWhatItKeepsOfAStream) {
+    Save("in.flac", NoiseSound(100000, 1, SF_FORMAT_FLAC | SF_FORMAT_PCM_16));
+    for (const auto& [line, words] :
+         {std::pair{"DSPHOST render /dev/zero out.wav", "/dev/zero|not an audio file"},
+          {"{ printf 'RIFF....WAVE'; yes LIST | tr '\\n' '\\0'; } | DSPHOST render - out.wav", "first MiB"},
+          {"DSPHOST render - out.wav --spool-limit 64K < in.flac", "65536 bytes|--spool-limit"}})
+        ExpectRefused(Shell(line), words);
+    EXPECT_EQ(Shell("DSPHOST render - out.wav --spool-limit 1M < in.flac").status, 0);
+}
+
 TEST_F(Pipes, WritesSizesThatSayUntilTheEnd) {
     Save("in.wav", NoiseSound(3000));
     ASSERT_EQ(Shell("DSPHOST render in.wav - | cat > stream").status, 0);

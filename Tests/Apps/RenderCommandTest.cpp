@@ -42,9 +42,13 @@ TEST_F(RenderCommand, SetsParametersByLabelAndText) {
             ASSERT_NEAR(out.samples[i + 1], c.rightFromLeft * l + c.rightFromRight * r, 1e-6);
         }
     }
-    const auto beyond = Run("render in.wav out.wav -y --fx \"Gain: Gain=40 dB\"");
-    EXPECT_EQ(beyond.status, 0);
-    EXPECT_NE(beyond.err.find("Gain=40 dB is beyond the range; 20.0 dB is used"), std::string::npos);
+    for (const auto& [fx, warning] :
+         {std::pair{"Gain: Gain=40 dB", "Gain=40 dB is beyond the range; 20.0 dB is used"},
+          {"Pitch Shift: Pitch=100", "Pitch=100 is beyond the range; 12.0 semitones"}}) {
+        const auto beyond = Run(std::string("render in.wav out.wav -y --fx \"") + fx + "\"");
+        EXPECT_EQ(beyond.status, 0);
+        EXPECT_NE(beyond.err.find(warning), std::string::npos) << beyond.err;
+    }
 }
 
 TEST_F(RenderCommand, GivesTheSameBytesForEveryBlockAndLayout) {
@@ -132,6 +136,7 @@ TEST_F(RenderCommand, RoundsToNearestEvenAndClips) {
     Save("in.wav", {1, 48000, kDouble, samples});
     // 1.0, 1 - 0.4 steps, -1 - 0.6 steps, the two sevens, and what is no number.
     EXPECT_EQ(Run("render in.wav out.wav --format s16").err,
+              "dsphost: warning: in.wav: 1 sample is no finite number, at 0.000 s\n"
               "dsphost: warning: out.wav: 6 samples were clipped\n");
     const Sound out = Load("out.wav");
     ASSERT_EQ(out.samples.size(), expected.size());

@@ -69,6 +69,7 @@ TEST_F(Reports, DescribeEveryEffect) {
         SCOPED_TRACE(name);
         EXPECT_TRUE(names.insert(name).second);
         EXPECT_NE(overview.find(name), std::string::npos);
+        if (effect.contains("bands")) continue;
         EXPECT_FALSE(effect.at("parameters").empty());
         int index = 0;
         for (const auto& parameter : effect.at("parameters")) {

@@ -1,0 +1,91 @@
+#include <gtest/gtest.h>
+
+#include <array>
+#include <filesystem>
+#include <iterator>
+#include <memory>
+#include <string>
+
+#include "Apps/Program.h"
+#include "Errors.h"
+#include "OutputFile.h"
+
+#if !defined(_WIN32)
+#include <sys/stat.h>
+#include <unistd.h>
+#endif
+
+// What becomes of files that are there before, or come meanwhile.
+namespace AppTest {
+namespace {
+
+namespace fs = std::filesystem;
+using dsphost::OutputFile;
+
+class Outputs : public Program {
+protected:
+    static std::unique_ptr<OutputFile> Open(const std::string& path, bool overwrite) {
+        auto file = std::make_unique<OutputFile>(path, dsphost::OutputRules{overwrite, {}});
+        file->Bytes().Write("new", 3);
+        return file;
+    }
+};
+
+TEST_F(Outputs, AppearTogetherOrNotAtAll) {
+    for (const bool overwrite : {false, true}) {
+        SCOPED_TRACE(overwrite);
+        fs::remove("a");
+        if (overwrite) SaveBytes("a", "old");
+        auto a = Open("a", overwrite), b = Open("b", false);
+        SaveBytes("b", "theirs");
+        EXPECT_THROW(dsphost::CommitTogether(std::array{a.get(), b.get()}), dsphost::IoError);
+        a.reset(), b.reset();
+        EXPECT_EQ(Bytes("a"), overwrite ? "old" : "");
+        EXPECT_EQ(Bytes("b"), "theirs");
+        EXPECT_EQ(std::distance(fs::directory_iterator("."), {}), overwrite ? 2 : 1);
+        fs::remove("b");
+    }
+    auto a = Open("a", true), b = Open("b", false);
+    dsphost::CommitTogether(std::array{a.get(), b.get()});
+    a.reset(), b.reset();
+    EXPECT_EQ(Bytes("a") + Bytes("b"), "newnew");
+    EXPECT_EQ(std::distance(fs::directory_iterator("."), {}), 2);
+}
+
+// Names that leave no room for what is put behind them, and names that are not of this place.
+TEST_F(Outputs, HaveAnyName) {
+    for (const std::string& name :
+         {std::string(251, 'n') + ".wav", std::string("\xC5\xBC\xE9\x9F\xB3 \xF0\x9F\x8E\xB5.wav")}) {
+        Open(name, false)->Commit();
+        EXPECT_EQ(fs::file_size(dsphost::PathOf(name)), 3u);
+    }
+}
+
+#if !defined(_WIN32)
+TEST_F(Outputs, KeepOwnerAndPermissionsAndWhatIsProtected) {
+    Save("in.wav", NoiseSound(10));
+    SaveBytes("theirs.wav", "old");
+    SaveBytes("kept.wav", "old");
+    const bool root = geteuid() == 0;
+    ASSERT_EQ(chown("theirs.wav", root ? 1234 : geteuid(), root ? 567 : getegid()), 0);
+    ASSERT_EQ(chmod("theirs.wav", 0646), 0);
+    ASSERT_EQ(chmod("kept.wav", 0444), 0);
+    struct stat before {
+    }, after{};
+    stat("theirs.wav", &before);
+    Succeed("render -y in.wav theirs.wav");
+    stat("theirs.wav", &after);
+    EXPECT_NE(after.st_ino, before.st_ino);
+    EXPECT_EQ(after.st_uid, before.st_uid);
+    EXPECT_EQ(after.st_gid, before.st_gid);
+    EXPECT_EQ(after.st_mode, before.st_mode);
+    ExpectRefused(Run("render -y in.wav kept.wav"), "kept.wav|write-protected");
+    ExpectRefused(Shell("DSPHOST render -y - in.wav < in.wav"), "in.wav|input");
+    ExpectRefused(Shell("DSPHOST render in.wav - >> in.wav"), "standard output|input");
+    // What is printed of a name stays on its line.
+    ExpectRefused(Run("render '\x1B[31m\n.wav' o.wav"), "\\x1b[31m\\n.wav");
+}
+#endif
+
+}  // namespace
+}  // namespace AppTest
