@@ -60,7 +60,7 @@ void PitchControl::ChooseNote(double cents, const PitchScale& scale, const Pitch
     m_rival = nearest.number;
     const bool quick = young || std::abs(cents - m_note.cents) > kFar;
     if (m_rivalFrames * m_frame < settings.hold * (quick ? kQuickHold : 1.0)) return;
-    m_from = m_target;
+    m_from = m_output;
     m_note = nearest;
     m_since = 0.0;
     m_rivalFrames = 0;
@@ -132,6 +132,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
     if (!fresh && silent > kGap + m_frame / 2.0) {
         m_voiceStart = now;
         m_correction = settings.shift;
+        m_output = m_target;
     }
     const auto nearest = scale.Nearest(frame.cents);
     if (nearest.number < 0 || (fresh && !IsCalm(track, now))) return Rest(frame, settings.shift);
@@ -156,7 +157,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
         m_note = {};
         return Rest(frame, m_correction);
     }
-    if (settings.keepVibrato > 0.0) error += settings.keepVibrato * (heard - MeanSinceNote(track, now));
+    error += settings.keepVibrato * (heard - MeanSinceNote(track, now));
     const double weight = Weight(error, settings.tolerance, fresh);
     const double keep = settings.retune > 0.0 ? std::exp(-m_frame / settings.retune) : 0.0;
     if (fresh && weight == 1.0) Fill(track, now, target, settings, keep);
@@ -164,6 +165,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
         settings.ratio * weight * std::clamp(error, -kLargestError, kLargestError) + settings.shift;
     m_correction = keep * m_correction + (1.0 - keep) * wanted;
     if (std::abs(m_correction) < kNothing) m_correction = 0.0;
+    m_output = settings.ratio > 0.0 ? heard + (m_correction - settings.shift) / settings.ratio : target;
     frame.correction = m_correction;
     frame.note = m_note.number;
     frame.noteCents = m_note.cents;

@@ -46,6 +46,7 @@ private:
     int m_rival = -1;
     int m_rivalFrames = 0;
     double m_target = 0.0, m_from = 0.0;  // of a transition
+    double m_output = 0.0;                // cents: where the voice is now, if all of the error counted
     double m_since = 1e9;                 // seconds since the last change of note
     double m_meanError = 0.0, m_correction = 0.0;
     std::int64_t m_lastVoiced = -1000000, m_noteStart = 0, m_voiceStart = 0;

@@ -1,7 +1,6 @@
 #include "DSP/Effects/PitchDoctor/PitchDoctor.h"
 
 #include <algorithm>
-#include <new>
 
 #include "DSP/Effects/Parameters/SettingsChunk.h"
 #include "DSP/Effects/PitchDoctor/PitchDoctorEngine.h"
@@ -20,23 +19,18 @@ constexpr std::uint32_t kFields = kWordsOf<PitchDoctorSettings>;
 // One engine for each lowest pitch, so that choosing another one makes no memory.
 struct PitchDoctor::Engines {
     std::array<std::unique_ptr<PitchDoctorEngine>, kLowestPitches.size()> all;
-    PitchDoctorEngine* inUse = nullptr;  // null without memory
+    PitchDoctorEngine* inUse = nullptr;  // null until prepared
     std::uint32_t rate = 0;
     std::atomic<bool> published{false};  // an editor wants readings
     PitchReadingRing readings;
 
     void Prepare(std::uint32_t wanted) {
         inUse = nullptr;
-        if (rate != wanted) {
-            rate = 0;
-            try {
-                for (std::size_t i = 0; i < all.size(); ++i)
-                    all[i] = std::make_unique<PitchDoctorEngine>(wanted, kLowestPitches[i]);
-                rate = wanted;
-            } catch (const std::bad_alloc&) {
-                for (auto& engine : all) engine.reset();
-            }
-        }
+        if (rate == wanted) return;
+        rate = 0;  // should memory run out
+        for (std::size_t i = 0; i < all.size(); ++i)
+            all[i] = std::make_unique<PitchDoctorEngine>(wanted, kLowestPitches[i]);
+        rate = wanted;
     }
     void Use(PitchDoctorEngine* engine) {
         if (engine && engine != inUse) engine->Clear();

@@ -69,9 +69,8 @@ void PitchDoctorEngine::Run(int channels, int frames) {
     for (std::size_t i = 0; i < count; ++i) {
         double sum = 0.0;
         for (std::size_t c = 0; c < static_cast<std::size_t>(channels); ++c) {
-            const double sample = std::isfinite(m_block[c][i]) ? m_block[c][i] : 0.0;
-            m_input[c].Push(sample);
-            sum += sample;
+            m_input[c].Push(m_block[c][i]);
+            sum += m_block[c][i];
         }
         heard[i] = std::clamp(channels == 2 ? 0.5 * sum : sum, -kLimit, kLimit);
         m_marks.Push(heard[i]);

@@ -267,7 +267,8 @@ const EffectTable& PitchDoctorTable() {
                          .rows = kRows,
                          .chunk = {.words = kWordsOf<S>},
                          .pads = {{"Default", {kRetune}, {kRatio}}},
-                         .sections = {"Scale", "Correction", "Voice", "Tuning", "Output"}};
+                         .sections = {"Scale", "Correction", "Voice", "Tuning", "Output"},
+                         .inputGuard = InputGuard::EveryFormat};
         for (const auto& preset : kPresets) {
             S settings = kDefaults;
             preset.change(settings);

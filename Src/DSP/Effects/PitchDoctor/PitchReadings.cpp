@@ -4,20 +4,20 @@
 
 namespace Corvo::DSP {
 
-std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings, std::int64_t longestPause) {
-    constexpr int kLeastReadings = 3;
+std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings, std::int64_t longestPause,
+                                 std::int64_t shortest) {
     std::vector<DecidedNote> notes;
     int count = 0;  // readings of the last note
     const auto leaveOutShort = [&] {
-        if (!notes.empty() && count < kLeastReadings) notes.pop_back();
-        count = 0;
+        if (!notes.empty() && notes.back().end - notes.back().start < shortest) notes.pop_back();
     };
     for (const auto& reading : readings) {
         if (!reading.IsVoiced() || reading.note < 0) continue;
-        if (count == 0 || notes.back().note != reading.note ||
+        if (notes.empty() || notes.back().note != reading.note ||
             reading.position - notes.back().end > longestPause) {
             leaveOutShort();
             notes.push_back({reading.position, reading.position, reading.note, 0.0f});
+            count = 0;
         }
         auto& note = notes.back();
         note.end = reading.position;

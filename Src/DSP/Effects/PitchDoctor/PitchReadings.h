@@ -25,9 +25,9 @@ struct DecidedNote {
     float heardCents;         // mean of what was sung, in cents above the note
 };
 
-// The notes of readings in their order. A pause of up to `longestPause` frames does not end a note; notes of
-// fewer than three readings are left out.
-DSP_API std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings,
-                                         std::int64_t longestPause);
+// The notes of readings in their order. In frames: a pause of up to `longestPause` does not end a note, and a
+// note shorter than `shortest` is left out, as a glide touches notes on its way.
+DSP_API std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings, std::int64_t longestPause,
+                                         std::int64_t shortest);
 
 }  // namespace Corvo::DSP
