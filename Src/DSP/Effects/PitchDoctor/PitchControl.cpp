@@ -29,7 +29,7 @@ std::pair<double, std::size_t> PitchControl::Median(const PitchTrack& track, std
     std::size_t count = 0;
     const auto reach = Frames(std::clamp(kMedianHolds * hold, kMedianLeast, kMedianMost));
     const auto first =
-        std::max({now - reach, now - static_cast<std::int64_t>(kMostMedian) + 1, std::int64_t{0}});
+        std::max({now - reach, now - static_cast<std::int64_t>(kMostMedian) + 1, m_judgedFrom});
     for (std::int64_t i = now; i >= first && track.At(i).hz > 0.0; --i) values[count++] = track.At(i).cents;
     const auto middle = values.begin() + static_cast<std::ptrdiff_t>(count / 2);
     std::nth_element(values.begin(), middle, values.begin() + static_cast<std::ptrdiff_t>(count));
@@ -65,6 +65,12 @@ void PitchControl::ChooseNote(double cents, const PitchScale& scale, const Pitch
     m_since = 0.0;
     m_rivalFrames = 0;
     m_noteStart = now;
+}
+
+// Far from the note, with another one clearly nearer.
+bool PitchControl::IsElsewhere(double cents, const PitchScale::Note& nearest) const {
+    const double off = std::abs(m_note.cents - cents);
+    return off > kFar && off > std::abs(nearest.cents - cents) + kNearer;
 }
 
 double PitchControl::Target(double transition) {
@@ -149,15 +155,15 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
     } else {
         ChooseNote(decisive, scale, settings, now);
     }
-    const double target = Target(settings.transition);
-    double error = target - heard;
     const bool early = static_cast<double>(now - m_voiceStart) * m_frame < kMayStartAgain;
-    if (!fresh && early && std::abs(error) > kFar &&
-        std::abs(error) > std::abs(nearest.cents - heard) + kNearer) {
+    if (!fresh && early && IsElsewhere(frame.cents, nearest)) {
+        // A leap right after the voice set in: what was heard before was wrong.
+        if (outlier) m_judgedFrom = now;
         m_note = {};
-        return Rest(frame, m_correction);
+        return Rest(frame, outlier ? settings.shift : m_correction);
     }
-    error += settings.keepVibrato * (heard - MeanSinceNote(track, now));
+    const double target = Target(settings.transition);
+    const double error = target - heard + settings.keepVibrato * (heard - MeanSinceNote(track, now));
     const double weight = Weight(error, settings.tolerance, fresh);
     const double keep = settings.retune > 0.0 ? std::exp(-m_frame / settings.retune) : 0.0;
     if (fresh && weight == 1.0) Fill(track, now, target, settings, keep);

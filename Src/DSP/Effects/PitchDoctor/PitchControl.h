@@ -34,6 +34,7 @@ private:
     bool IsCalm(const PitchTrack& track, std::int64_t now) const;
     void ChooseNote(double cents, const PitchScale& scale, const PitchControlSettings& settings,
                     std::int64_t now);
+    bool IsElsewhere(double cents, const PitchScale::Note& nearest) const;
     double Target(double transition);
     double MeanSinceNote(const PitchTrack& track, std::int64_t now) const;
     double Weight(double error, double tolerance, bool fresh);
@@ -49,7 +50,7 @@ private:
     double m_output = 0.0;                // cents: where the voice is now, if all of the error counted
     double m_since = 1e9;                 // seconds since the last change of note
     double m_meanError = 0.0, m_correction = 0.0;
-    std::int64_t m_lastVoiced = -1000000, m_noteStart = 0, m_voiceStart = 0;
+    std::int64_t m_lastVoiced = -1000000, m_noteStart = 0, m_voiceStart = 0, m_judgedFrom = 0;
 };
 
 }  // namespace Corvo::DSP
