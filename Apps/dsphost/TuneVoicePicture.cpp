@@ -32,9 +32,15 @@ constexpr double kLabelSpacing = 90.0;
 constexpr int kLeastRows = 12, kRowsAround = 2;
 constexpr int kAnyLowest = 48, kAnyHighest = 72;  // where nothing was decided
 
+int NoteOfOctave(int note) { return (note % 12 + 12) % 12; }
 bool IsBlackKey(int note) {
     constexpr std::array kBlack{0, 1, 0, 1, 0, 0, 1, 0, 1, 0, 1, 0};
-    return kBlack[static_cast<std::size_t>(((note % 12) + 12) % 12)] != 0;
+    return kBlack[static_cast<std::size_t>(NoteOfOctave(note))] != 0;
+}
+// Where rows are too low for every name, these stand at least two rows apart.
+bool IsNamedFirst(int note) {
+    constexpr std::array kFirst{1, 0, 1, 0, 1, 0, 0, 1, 0, 1, 0, 0};
+    return kFirst[static_cast<std::size_t>(NoteOfOctave(note))] != 0;
 }
 
 class Roll {
@@ -85,19 +91,19 @@ private:
     void DrawRows() {
         m_target.FillRectangle(m_plot, {kPlot});
         const float height = m_plot.height / static_cast<float>(m_highest - m_lowest + 1);
+        const float label = 1.2f * kLabelSize * m_scale;
         const float capitals = Corvo::kCapHeight * kLabelSize * m_scale;
         for (int note = m_lowest; note <= m_highest; ++note) {
             const float top = std::round(Y(note + 0.5)), bottom = std::round(Y(note - 0.5));
             if (IsBlackKey(note))
                 m_target.FillRectangle({m_plot.x, top, m_plot.width, bottom - top}, {kGround});
             m_target.FillRectangle({m_plot.x, bottom - Line(), m_plot.width, Line()},
-                                   {note % 12 == 0 ? kGrid : kMinorGrid});
-            const bool fits = height >= 1.2f * kLabelSize * m_scale;
-            const bool shown =
-                fits || note % 12 == 0 || (2.0f * height >= 1.2f * kLabelSize * m_scale && !IsBlackKey(note));
+                                   {NoteOfOctave(note) == 0 ? kGrid : kMinorGrid});
+            const bool isC = NoteOfOctave(note) == 0;
+            const bool shown = height >= label || (2.0f * height >= label && IsNamedFirst(note)) || isC;
             if (shown)
                 m_target.Text(NoteName(note), {m_plot.x - 1.5f * kGap * m_scale, Y(note) + capitals / 2.0f},
-                              TextAlign::Right, kLabelSize * m_scale, {note % 12 == 0 ? kText : kLabel});
+                              TextAlign::Right, kLabelSize * m_scale, {isC ? kText : kLabel});
         }
     }
 
