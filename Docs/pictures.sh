@@ -4,7 +4,7 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 source Scripts/common.sh
 
-need_packages "${BUILD_PACKAGES[@]}" sonic-pi-samples
+need_packages "${BUILD_PACKAGES[@]}" sonic-pi-samples espeak-ng
 say "building"
 build_preset apps dsphost
 if ! [ -f build/fonts/Montserrat_400Regular.ttf ] && ! fetch_montserrat build/fonts; then
@@ -28,3 +28,10 @@ draw spectrum loop_amen_full.flac bands.png --size 960x400 --view bars,third-oct
 draw sonogram bass_drop_c.flac sonogram.png --pitch --view note-names
 draw sonogram loop_amen_full.flac both.png --spectrum --scheme 2
 draw tuner bass_dnb_f.flac tuner.png --size 960x360
+
+speech=$(mktemp -d)
+trap 'rm -r "$speech"' EXIT
+espeak-ng -w "$speech/in.wav" "Why were you away a year, Roy? We owe you a yellow lion."
+build/apps/bin/dsphost tune-voice "$speech/in.wav" "$speech/out.wav" --scale "A minor" -y -q --size 960x480 \
+    --curve Docs/pictures/tune-voice.png --font build/fonts/Montserrat_400Regular.ttf
+echo Docs/pictures/tune-voice.png
