@@ -52,3 +52,9 @@ for pair in noisy:before cleaned:after residue:residue; do
 done
 draw spectrum build/noisy-voice/noisy.wav denoise-profile.png --size 960x400 --length 8192 \
     --profile build/noisy-voice/profile
+speech=$(mktemp -d)
+trap 'rm -r "$speech"' EXIT
+espeak-ng -w "$speech/in.wav" "Why were you away a year, Roy? We owe you a yellow lion."
+build/apps/bin/dsphost tune-voice "$speech/in.wav" "$speech/out.wav" --scale "A minor" -y -q --size 960x480 \
+    --curve Docs/pictures/tune-voice.png --font build/fonts/Montserrat_400Regular.ttf
+echo Docs/pictures/tune-voice.png

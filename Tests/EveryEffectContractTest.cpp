@@ -52,7 +52,7 @@ struct Row {
     }
 };
 
-enum class Leading { None, Kept, Version1 };
+enum class Leading { None, Kept, Version1, Version1AndCount };
 
 struct Contract {
     const char *name, *image, *icon;  // null where any will do
@@ -163,6 +163,43 @@ const Contract kContracts[] = {
         {L"Oversampling L", L"x ",      List,       {36, 40}, {0.0, 0.5, 1.0}, {L"1 x ", L"4 x ", L"16 x "}}},
      .presets = {24, 0x67D2D1C77C3DA038},
      .pads = {"Guitar", "Guitar - Clean", "Guitar - Heavy", "Guitar - Heavier", "Drums", "Vocal"}},
+    {.name = "Cantrix", .image = "builtinCantrix.png", .icon = "BuiltinPlugins/Cantrix@3x.png",
+     .chunkSize = 136, .leading = Leading::Version1AndCount, .oldWords = 0,
+     .rows = {
+        {L"Scale root", L"", List, {8},  {0.0, 6.0, 11.0}, {L"C", L"F#", L"B"}, 0.0f},
+        {L"Scale mode", L"", List, {12}, {0.0, 6.0, 12.0}, {L"Chromatic", L"Minor pentatonic", L"Whole tone"}, 0.0f},
+        {L"Note C", L"", Switch, {16}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note C#", L"", Switch, {20}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note D", L"", Switch, {24}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note D#", L"", Switch, {28}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note E", L"", Switch, {32}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note F", L"", Switch, {36}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note F#", L"", Switch, {40}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note G", L"", Switch, {44}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note G#", L"", Switch, {48}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note A", L"", Switch, {52}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note A#", L"", Switch, {56}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Note B", L"", Switch, {60}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        {L"Retune speed",         L"ms",        Continuous, {64},  {0.0, 100.0, 400.0},     {L"0.0 ms", L"100.0 ms", L"400.0 ms"}, 0.2236068f},
+        {L"Note transition time", L"ms",        Continuous, {68},  {0.0, 125.0, 500.0},     {L"0.0 ms", L"125.0 ms", L"500.0 ms"}, 0.28284273f},
+        {L"Correction ratio",     L"%",         Continuous, {72},  {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}, 1.0f},
+        {L"Tolerance",            L"cents",     Continuous, {76},  {0.0, 25.0, 50.0},       {L"0.0 cents", L"25.0 cents", L"50.0 cents"}, 0.1f},
+        {L"Keep vibrato",         L"%",         Continuous, {80},  {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}},
+        {L"Hysteresis",           L"cents",     Continuous, {84},  {0.0, 25.0, 50.0},       {L"0.0 cents", L"25.0 cents", L"50.0 cents"}},
+        {L"Note hold",            L"ms",        Continuous, {88},  {0.0, 50.0, 100.0},      {L"0.0 ms", L"50.0 ms", L"100.0 ms"}, 0.25f},
+        {L"Formants kept",        L"%",         Continuous, {92},  {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}, 1.0f},
+        {L"Formant shift",        L"semitones", Continuous, {96},  {-12.0, 0.0, 12.0},      {L"-12.00 semitones", L"0.00 semitones", L"12.00 semitones"}},
+        {L"Transpose",            L"semitones", Continuous, {100}, {-12.0, 0.0, 12.0},      {L"-12 semitones", L"0 semitones", L"12 semitones"}},
+        {L"Offset",               L"cents",     Continuous, {104}, {-100.0, 0.0, 100.0},    {L"-100.0 cents", L"0.0 cents", L"100.0 cents"}},
+        {L"Lowest pitch",         L"Hz",        List,       {108}, {55.0, 110.0, 160.0},    {L"55 Hz", L"110 Hz", L"160 Hz"}, 1 / 3.0f},
+        {L"Highest pitch",        L"Hz",        Continuous, {112}, {300.0, 648.0, 1400.0},  {L"300 Hz", L"648 Hz", L"1400 Hz"}, 1.0f},
+        {L"Silence",              L"dB",        Continuous, {116}, {-90.0, -65.0, -40.0},   {L"-90.0 dB", L"-65.0 dB", L"-40.0 dB"}, 0.4f},
+        {L"Follow tuner",         L"",          Switch,     {120}, {0.0, 1.0, 1.0},         {L"Off", L"On", L"On"}, 0.0f},
+        {L"Concert pitch",        L"Hz",        Continuous, {124}, {400.0, 440.0, 480.0},   {L"400.0 Hz", L"440.0 Hz", L"480.0 Hz"}},
+        {L"Temperament",          L"",          List,       {128}, {0.0, 5.0, 10.0},        {L"Equal", L"Just (Fogliano I)", L"Vallotti"}, 0.0f},
+        {L"Mix",                  L"%",         Continuous, {132}, {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}, 1.0f}},
+     .presets = {10, 0x6F1FBE11B4299CAB},
+     .sections = {"Scale", "Correction", "Voice", "Tuning", "Output"}, .pads = {"Default"}},
     {.name = "Pitch Shift", .image = "builtinPitch.png", .icon = "BuiltinPlugins/PitchShift@3x.png",
      .chunkSize = 92, .leading = Leading::Kept, .oldWords = 0,
      .rows = {{L"Pitch L", L"semitones", Continuous, {4, 8}, {10, 3005, 6000},
@@ -362,12 +399,16 @@ TEST_P(EveryEffectContract, HasItsPresets) {
 TEST_P(EveryEffectContract, TakesChunksWordByWord) {
     const auto& contract = Promised();
     if (contract.ownRecord || contract.rows.front().step != 0.0) GTEST_SKIP() << "tested apart";
-    const std::size_t leading = contract.leading == Leading::None ? 0 : 4,
+    const bool counted = contract.leading == Leading::Version1AndCount;
+    const std::size_t leading = contract.leading == Leading::None ? 0
+                                : counted                         ? 8
+                                                                  : 4,
                       words = (static_cast<std::size_t>(contract.chunkSize) - leading) / 4;
     auto today = CountingChunk(leading, words, 4);
     const auto effect = GetParam().make();
     effect->SetSettingsChunk(today);
-    if (contract.leading == Leading::Version1) std::ranges::copy(Bytes{1, 0, 0, 0}, today.begin());
+    if (contract.leading == Leading::Version1 || counted) std::ranges::copy(Bytes{1, 0, 0, 0}, today.begin());
+    if (counted) std::ranges::copy(Bytes{static_cast<std::uint8_t>(words), 0, 0, 0}, today.begin() + 4);
     EXPECT_EQ(Chunk(*effect), today);
     ForEachParameter([&](const Row& row, std::size_t side, int real, int) {
         const auto bits = WordAt(today, row.at[side]);

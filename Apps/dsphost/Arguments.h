@@ -93,4 +93,12 @@ struct TunerArguments {
 void RunTuner(TunerArguments arguments);
 const std::vector<std::string>& DetectionMethods();
 
+// Texts of the effect's parameters; empty: its default.
+struct TuneVoiceArguments {
+    std::string input, output, format, scale = "Chromatic", retune, transition, ratio, lowest, notes, curve;
+    PictureOptions drawing;
+    WritingOptions writing;
+};
+void RunTuneVoice(TuneVoiceArguments arguments);
+
 }  // namespace dsphost

@@ -51,10 +51,14 @@ void AddWriting(CLI::App& command, WritingOptions& writing) {
     command.add_flag("-q", writing.quiet, "No progress");
 }
 
-void AddDrawing(CLI::App& command, PictureOptions& o) {
+void AddPicture(CLI::App& command, PictureOptions& o) {
     command.add_option("--size", o.size, "Of the picture, WIDTHxHEIGHT in pixels (1280x720)");
     command.add_option("--dpi", o.dpi, "Dots per inch that texts and lines are sized for (96)");
     command.add_option("--font", o.font, "The typeface's file, where Montserrat is not installed");
+}
+
+void AddDrawing(CLI::App& command, PictureOptions& o) {
+    AddPicture(command, o);
     command.add_option("--scale", o.scale, "Frequency scale: log or linear");
     command.add_option("--view", o.view, "Display options: " + Joined(ViewNames(), ", "))->delimiter(',');
 }
@@ -183,6 +187,23 @@ void AddTuner(CLI::App& app) {
     AddWriting(command, a.writing);
 }
 
+void AddTuneVoice(CLI::App& app) {
+    const auto [command, a] =
+        Add(app, "tune-voice", "Corrects the pitch of a voice, aligned and as long as it was", RunTuneVoice);
+    AddInput(command, a.input);
+    AddAudioOutput(command, a.output);
+    command.add_option("--scale", a.scale, "Root and mode, such as \"A minor\"; chromatic when left out");
+    command.add_option("--retune", a.retune, "Milliseconds that the correction takes, 0 to 400 (20)");
+    command.add_option("--transition", a.transition, "Milliseconds from note to note, 0 to 500 (40)");
+    command.add_option("--ratio", a.ratio, "Per cent of the error taken away, 0 to 100 (100)");
+    command.add_option("--lowest", a.lowest, "Hz: the lowest pitch sung, 55, 75, 110 or 160 (75)");
+    command.add_option("--notes", a.notes, "The notes decided, as .csv or .mid");
+    command.add_option("--curve", a.curve, "PNG picture: the pitch heard and corrected over the notes");
+    AddFormat(command, a.format);
+    AddPicture(command, a.drawing);
+    AddWriting(command, a.writing);
+}
+
 // Told here, because the parser would only say that a command is missing.
 void CheckCommand(const CLI::App& app, int count, char** arguments) {
     std::vector<std::string> names;
@@ -211,7 +232,7 @@ void RunCommandLine(int count, char** arguments) {
     app.set_version_flag("--version", DSPHOST_VERSION);
     // In the order in which help lists them.
     for (const auto add : {AddConvert, AddDenoise, AddEffects, AddPitch, AddEqCurve, AddRender, AddSonogram,
-                           AddSpectrum, AddTuner})
+                           AddSpectrum, AddTuner, AddTuneVoice})
         add(app);
     CheckCommand(app, count, arguments);
     try {

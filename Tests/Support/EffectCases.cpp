@@ -8,6 +8,7 @@
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
+#include "DSP/Effects/PitchDoctor/PitchDoctor.h"
 #include "DSP/Effects/PitchShift/PitchShift.h"
 #include "DSP/Effects/Reverb/Reverb.h"
 #include "DSP/Effects/Tremolo/Autovol.h"
@@ -42,6 +43,7 @@ constexpr std::array kEffects{
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
     EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>},
+    EffectCase{.name = "Cantrix", .make = Make<PitchDoctor>},
 };
 
 }  // namespace

@@ -10,6 +10,7 @@
 #include "DSP/Effects/Echo/Echo.h"
 #include "DSP/Effects/Gain/GainEfx.h"
 #include "DSP/Effects/Phaser/Phaser.h"
+#include "DSP/Effects/PitchDoctor/PitchDoctor.h"
 #include "DSP/Effects/PitchShift/PitchShift.h"
 #include "DSP/Effects/Reverb/Reverb.h"
 #include "DSP/Effects/Tremolo/Autovol.h"
@@ -36,6 +37,7 @@ constexpr EffectKind kKinds[]{
     {"Compressor",  Make<Compressor>},
     {"Reverb",      Make<Reverb>},
     {"Denoiser",    Make<DenoiserProcessor>},
+    {"Cantrix",     Make<PitchDoctor>},
 };
 // clang-format on
 

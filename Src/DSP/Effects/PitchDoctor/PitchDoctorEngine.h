@@ -1,0 +1,87 @@
+#pragma once
+
+#include <array>
+#include <cmath>
+#include <cstddef>
+#include <cstdint>
+
+#include "DSP/Effects/PitchDoctor/CycleMarks.h"
+#include "DSP/Effects/PitchDoctor/GrainSynthesis.h"
+#include "DSP/Effects/PitchDoctor/PitchControl.h"
+#include "DSP/Effects/PitchDoctor/PitchReadings.h"
+#include "DSP/Effects/PitchDoctor/PitchScale.h"
+#include "DSP/Effects/PitchDoctor/PitchTrack.h"
+#include "DSP/Parts/SampleHistory.h"
+#include "DSP/Pitch/VoicePitchDetector.h"
+#include "Threads/RecentValues.h"
+
+namespace Corvo::DSP {
+
+using PitchReadingRing = RecentValues<PitchReading, 512>;
+
+struct PitchDoctorVoice {
+    PitchScale scale;
+    PitchControlSettings control;
+    GrainSettings grains;
+    double highestHz = 1400.0, silence = -70.0;
+    double mix = 1.0;
+};
+
+// Hears, decides and shifts one stream for one lowest pitch. Work is done in steps that stand still in the
+// stream, so that the output does not depend on how it is cut.
+class PitchDoctorEngine {
+public:
+    // All memory is made here.
+    PitchDoctorEngine(double rate, double lowestHz);
+    static int LatencyOf(double rate, double lowestHz);
+
+    int Latency() const { return m_latency; }
+    void Clear();
+    void Cook(const PitchDoctorVoice& voice);
+
+    // One or two channels in place, `stride` from a channel's sample to its next. `readings`: null for none.
+    template <typename Sample>
+    void Process(std::array<Sample*, 2> samples, int channels, int frames, std::ptrdiff_t stride,
+                 PitchReadingRing* readings) {
+        while (frames > 0) {
+            const int count = frames < m_untilStep ? frames : m_untilStep;
+            for (std::size_t c = 0; c < static_cast<std::size_t>(channels); ++c)
+                for (int i = 0; i < count; ++i)
+                    m_block[c][static_cast<std::size_t>(i)] = samples[c][i * stride];
+            Run(channels, count);
+            for (std::size_t c = 0; c < static_cast<std::size_t>(channels); ++c)
+                for (int i = 0; i < count; ++i, samples[c] += stride)
+                    *samples[c] = static_cast<Sample>(m_block[c][static_cast<std::size_t>(i)]);
+            frames -= count;
+            if ((m_untilStep -= count) > 0) continue;
+            m_untilStep = m_detector.StepSamples();
+            Step(readings);
+        }
+    }
+
+private:
+    using Block = std::array<double, GrainSynthesis::kMostFrames>;
+
+    void Run(int channels, int frames);
+    void Step(PitchReadingRing* readings);
+    void Publish(PitchReadingRing& readings) const;
+    void Rebase();
+
+    int m_latency;
+    double m_mixShare;  // of the way to a new mix that each frame goes
+    VoicePitchDetector m_detector;
+    PitchTrack m_track;
+    PitchControl m_control;
+    CycleMarks m_marks;
+    GrainSynthesis m_grains;
+    std::array<SampleHistory<double>, 2> m_input;
+    double m_behind;  // how far behind the output marks are kept
+    PitchDoctorVoice m_voice;
+    double m_mix = 1.0;
+    bool m_fresh = true;  // nothing was processed since Clear
+    int m_untilStep = 1;
+    std::int64_t m_origin = 0;  // of the places, in the stream
+    std::array<Block, 2> m_block{}, m_wet{};
+};
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "Platform/Export.h"
+
+namespace Corvo::DSP {
+
+// What the pitch correction heard and did at one moment, for editors and for lists of notes.
+struct PitchReading {
+    std::int64_t position = 0;     // frames of input since InitProcessing or Cleanup
+    float heardHz = 0.0f;          // 0: not voiced
+    float correctionCents = 0.0f;  // so much higher is the output
+    std::int32_t note = -1;        // the MIDI number of the note that is meant; -1 while none is decided
+    float noteHz = 0.0f;           // where that note stands; 0 without one
+
+    bool IsVoiced() const { return heardHz > 0.0f; }
+};
+
+// A note as it was decided.
+struct DecidedNote {
+    std::int64_t start, end;  // positions of its first and last reading
+    std::int32_t note;        // MIDI number
+    float heardCents;         // mean of what was sung, in cents above the note
+};
+
+// The notes of readings in their order. In frames: a pause of up to `longestPause` does not end a note, and a
+// note shorter than `shortest` is left out, as a glide touches notes on its way.
+DSP_API std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings, std::int64_t longestPause,
+                                         std::int64_t shortest);
+
+}  // namespace Corvo::DSP

@@ -1,0 +1,96 @@
+#include <gtest/gtest.h>
+
+#include <sstream>
+
+#include "Apps/Program.h"
+#include "Support/Voice.h"
+
+// tune-voice: a voice, its notes and its curve.
+namespace AppTest {
+namespace {
+
+constexpr int kRate = 44100;
+
+class TuneVoice : public Program {
+protected:
+    // A3 and D4, 30 cents sharp, a pause between them.
+    TuneVoice() {
+        const auto hz = [](double t) { return t < 0.8 ? 220.0 : t < 0.9 ? 0.0 : 293.665; };
+        Save("in.wav",
+             {1, kRate, kDouble, TestSupport::Sing(1.7, kRate, [&](double t) { return 1.0175 * hz(t); })});
+    }
+};
+
+}  // namespace
+
+TEST_F(TuneVoice, WritesTheVoiceItsNotesAndItsCurve) {
+    Succeed(
+        "tune-voice in.wav out.wav --scale 'a minor' --retune '0 ms' --transition 0 --notes n.csv --curve "
+        "c.png "
+        "--size 400x200 -q");
+    EXPECT_EQ(Load("out.wav").Frames(), Load("in.wav").Frames());
+    EXPECT_TRUE(Bytes("c.png").starts_with("\x89PNG"));
+    std::istringstream lines(Bytes("n.csv"));
+    std::string line;
+    std::getline(lines, line);
+    EXPECT_EQ(line, "start_s,end_s,midi_note,name,sung_cents");
+    struct {
+        double start, end, cents;
+        std::string note;
+    } const expected[] = {{0.0, 0.8, 30.0, "57,A3"}, {0.9, 1.7, 30.0, "62,D4"}};
+    for (const auto& note : expected) {
+        ASSERT_TRUE(std::getline(lines, line));
+        std::istringstream cells(line);
+        std::string start, end, number, name, cents;
+        for (auto* cell : {&start, &end, &number, &name, &cents}) std::getline(cells, *cell, ',');
+        EXPECT_EQ(number + "," + name, note.note);
+        EXPECT_NEAR(std::stod(start), note.start, 0.04);
+        EXPECT_NEAR(std::stod(end), note.end, 0.04);
+        EXPECT_NEAR(std::stod(cents), note.cents, 1.0);
+    }
+    EXPECT_FALSE(std::getline(lines, line));
+    // The corrected voice stands on its notes.
+    Succeed("tune-voice out.wav again.wav --notes again.csv -q");
+    EXPECT_NE(Bytes("again.csv").find(",57,A3,"), std::string::npos);
+    for (const char* cents : {",A3,30", ",D4,30"})
+        EXPECT_EQ(Bytes("again.csv").find(cents), std::string::npos);
+}
+
+// Ticks of 1/1920 s: on and off for both notes, between the tempo and the end of the track.
+TEST_F(TuneVoice, WritesNotesAsMidi) {
+    Succeed("tune-voice in.wav out.wav --notes n.mid -q");
+    const std::string midi = Bytes("n.mid");
+    ASSERT_TRUE(midi.starts_with(std::string("MThd\0\0\0\6\0\0\0\1\3\xC0MTrk", 18)));
+    const auto length = static_cast<std::size_t>(static_cast<unsigned char>(midi[20])) << 8 |
+                        static_cast<unsigned char>(midi[21]);
+    ASSERT_EQ(midi.size(), 22 + length);
+    std::vector<std::string> events;
+    double ticks = 0.0;
+    for (std::size_t at = 22 + 7; at < midi.size();) {
+        unsigned delta = 0, byte = 0x80;
+        for (; (byte & 0x80) != 0; ++at)
+            delta = delta << 7 | ((byte = static_cast<unsigned char>(midi[at])) & 0x7F);
+        ticks += delta;
+        if (midi[at] == '\xFF') break;
+        events.push_back(midi.substr(at, 2));
+        at += 3;
+    }
+    EXPECT_EQ(events, (std::vector<std::string>{"\x90\x39", "\x80\x39", "\x90\x3E", "\x80\x3E"}));
+    EXPECT_NEAR(ticks / 1920.0, 1.7, 0.04);
+    EXPECT_TRUE(midi.ends_with(std::string("\0\xFF\x2F\0", 4)));
+}
+
+TEST_F(TuneVoice, RefusesWhatItDoesNotUnderstand) {
+    const auto refused = [&](const std::string& options, const std::string& words) {
+        ExpectRefused(Run("tune-voice in.wav out.wav " + options + " -q"), words);
+    };
+    refused("--scale 'H minor'", "H minor|A minor");
+    refused("--scale 'A nonsense'", "nonsense|scale mode");
+    refused("--scale A", "root and a mode");
+    refused("--retune fast", "Retune speed|fast|400");
+    refused("--lowest 80", "Lowest pitch|55, 75, 110, 160");
+    refused("--notes n.txt", "n.txt|.csv|.mid");
+    refused("--notes out.wav.csv --curve out.wav.csv", "out.wav.csv");
+}
+
+}  // namespace AppTest

@@ -1,0 +1,288 @@
+#include "DSP/Effects/PitchDoctor/PitchDoctor.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <map>
+
+#include "DSP/Pitch/VoicePitchDetector.h"
+#include "Spectrum/Tuner/Tuner.h"
+#include "Support/EffectRun.h"
+#include "Support/Voice.h"
+
+class BuiltinEditor {};
+
+using namespace Corvo::DSP;
+using namespace TestSupport;
+
+namespace {
+
+constexpr int kRate = 48000;
+constexpr double kA3 = 220.0;
+
+using Settings = std::map<std::string, std::string>;
+
+int IndexOf(CorvoEffectBase& effect, const std::string& label) {
+    for (int i = 0; i < effect.GetParamCount(); ++i)
+        if (effect.Describe(i).label == label) return i;
+    throw std::invalid_argument(label);
+}
+void Set(CorvoEffectBase& effect, const Settings& settings) {
+    for (const auto& [label, text] : settings) {
+        const int index = IndexOf(effect, label);
+        effect.SetParam(index, effect.GetParamValueNormalizedFromText(index, text), false);
+    }
+}
+// At once, and all of the error.
+Settings Exactly(Settings settings) {
+    settings.insert(
+        {{"Retune speed", "0"}, {"Note transition time", "0"}, {"Tolerance", "0"}, {"Keep vibrato", "0"}});
+    return settings;
+}
+
+std::vector<double> Correct(const std::vector<double>& mono, const Settings& settings, int rate = kRate) {
+    PitchDoctor effect;
+    Set(effect, settings);
+    return Render(effect, mono, Format<double>(1, rate), {512});
+}
+
+// Median pitch of the last half, Hz.
+double PitchOf(const std::vector<double>& samples, int rate = kRate) {
+    VoicePitchDetector detector({.rate = 1.0 * rate});
+    std::vector<double> heard;
+    for (std::size_t i = 0; i + 256 <= samples.size(); i += 256) {
+        detector.Push(samples.data() + i, 256);
+        for (VoicePitchFrame frame; detector.Take(frame);)
+            if (frame.hz > 0.0 && i > samples.size() / 2) heard.push_back(frame.hz);
+    }
+    if (heard.size() < 10) return 0.0;
+    std::ranges::nth_element(heard, heard.begin() + static_cast<std::ptrdiff_t>(heard.size() / 2));
+    return heard[heard.size() / 2];
+}
+
+void ExpectDelayed(const std::vector<double>& input, const std::vector<double>& output, int latency,
+                   std::size_t from = 0) {
+    for (std::size_t i = from; i + static_cast<std::size_t>(latency) < input.size(); ++i)
+        ASSERT_NEAR(output[i + static_cast<std::size_t>(latency)], input[i], 1e-12) << "frame " << i;
+}
+
+double Level(const std::vector<double>& samples, double hz) {
+    double re = 0.0, im = 0.0;
+    for (std::size_t i = samples.size() / 2; i < samples.size(); ++i) {
+        const double turn = 2.0 * std::numbers::pi * hz * static_cast<double>(i) / kRate;
+        re += samples[i] * std::cos(turn);
+        im += samples[i] * std::sin(turn);
+    }
+    return std::hypot(re, im);
+}
+
+}  // namespace
+
+// Catches a wrong scale, root, ratio, unit or sign anywhere between a parameter and the sound.
+TEST(PitchDoctor, BringsAVoiceWhereTheSettingsSay) {
+    const double sung = kA3 * std::exp2(40.0 / 1200.0);  // A3 and 40 cents
+    const Settings offWithA{{"Note A", "Off"}};
+    struct Case {
+        Settings settings;
+        double cents;  // above A3
+    };
+    for (const auto& [settings, cents] : {
+             Case{{}, 0.0},
+             {{{"Correction ratio", "50 %"}}, 20.0},
+             {offWithA, 100.0},
+             {{{"Scale root", "D#"}, {"Scale mode", "Major pentatonic"}}, 100.0},
+             {{{"Scale root", "F"}, {"Scale mode", "Minor pentatonic"}}, 100.0},
+             {{{"Transpose", "5"}}, 500.0},
+             {{{"Transpose", "-12"}, {"Correction ratio", "0"}}, -1160.0},
+             {{{"Offset", "-30"}}, -30.0},
+             {{{"Concert pitch", "450"}}, Cents(450.0, 440.0)},
+             // Around D the chain of pure fifths goes from F to A#, seven of them above A.
+             {{{"Scale root", "D"}, {"Temperament", "Pythagorean"}, {"Note A", "Off"}}, 113.685},
+             {{{"Formants kept", "0"}}, 0.0},
+             {{{"Lowest pitch", "160"}}, 0.0},
+         }) {
+        SCOPED_TRACE(settings.empty() ? "" : settings.begin()->first + "=" + settings.begin()->second);
+        const double heard = PitchOf(Correct(Sing(1.0, kRate, sung), Exactly(settings)));
+        EXPECT_NEAR(Cents(heard, kA3), cents, 0.5);
+    }
+    for (const int rate : {8000, 44100, 96000, 192000})
+        EXPECT_NEAR(Cents(PitchOf(Correct(Sing(1.0, rate, sung), Exactly({}), rate), rate), kA3), 0.0,
+                    rate < 20000 ? 3.0 : 0.5)
+            << rate;
+}
+
+TEST(PitchDoctor, FollowsTheTunerWhenAskedTo) {
+    Tuner::SetTemperament(4);
+    Tuner::CookNotesFrequencies(true);
+    const double cSharp = 2.0 * Tuner::GetNoteFrequency(4);
+    const auto heard = PitchOf(Correct(Sing(1.0, kRate, 272.0), Exactly({{"Follow tuner", "On"}})));
+    Tuner::SetTemperament(0);
+    Tuner::CookNotesFrequencies(true);
+    EXPECT_NEAR(Cents(heard, cSharp), 0.0, 0.5);
+    EXPECT_GT(std::abs(Cents(cSharp, 440.0 * std::exp2(-8.0 / 12.0))), 5.0) << "tempered as it was";
+}
+
+// Formants stay under another pitch, unless they are not kept; harmonics 700 Hz apart tell the difference.
+TEST(PitchDoctor, KeepsFormants) {
+    const auto voice = Sing(1.0, kRate, 175.0);
+    const auto tilt = [&](const Settings& settings) {
+        const auto output = Correct(voice, Exactly(settings));
+        const double hz = 175.0 * std::exp2(7.0 / 12.0);  // harmonics 3 and 6 at 787 and 1574 Hz
+        return 20.0 * std::log10(Level(output, 3 * hz) / Level(output, 6 * hz));
+    };
+    const Settings up{{"Transpose", "7"}, {"Correction ratio", "0"}};
+    auto moved = up;
+    moved["Formants kept"] = "0";
+    EXPECT_GT(tilt(up), tilt(moved) + 6.0);
+}
+
+// Catches windows with gaps, and grains that leave their places: what is not corrected is only delayed.
+TEST(PitchDoctor, OnlyDelaysWhatItDoesNotCorrect) {
+    auto voice = Sing(2.0, kRate, [](double t) {
+        return t < 0.3 ? 0.0 : t > 1.2 && t < 1.3 ? 0.0 : 90.0 + 200.0 * t;
+    });
+    const auto noise = Noise<double>(voice.size());
+    for (std::size_t i = 0; i < voice.size(); ++i) voice[i] += (i / 9000 % 3 == 0 ? 0.1 : 1e-4) * noise[i];
+    for (const auto& [lowest, latency] : {std::pair{"55", 1408}, {"75", 1024}, {"110", 704}, {"160", 512}}) {
+        PitchDoctor effect;
+        Set(effect, {{"Correction ratio", "0"}, {"Lowest pitch", lowest}});
+        const auto output = Render(effect, voice, Format<double>(1), {512});
+        EXPECT_EQ(effect.GetLatency(), latency);
+        ExpectDelayed(voice, output, latency);
+        ExpectDelayed(voice, Correct(voice, {{"Mix", "0"}, {"Lowest pitch", lowest}}), latency);
+        const auto none = Exactly({{"Scale mode", "Whole tone"},
+                                   {"Note C", "Off"},
+                                   {"Note D", "Off"},
+                                   {"Note E", "Off"},
+                                   {"Note F#", "Off"},
+                                   {"Note G#", "Off"},
+                                   {"Note A#", "Off"},
+                                   {"Lowest pitch", lowest}});
+        ExpectDelayed(voice, Correct(voice, none), latency);
+    }
+    ExpectDelayed(noise, Correct(noise, Exactly({})), 1024);
+}
+
+// A voice that sets in an octave up is misjudged at first. The shift in time that this leaves is taken back.
+TEST(PitchDoctor, TakesBackTheShiftOfAMisjudgedOnset) {
+    const auto voice = Sing(4.0, kRate, [](double t) {
+        return t < 0.1 ? 0.0 : t < 0.16 ? 155.0 : kA3 / 2.0;
+    });
+    for (const char* tolerance : {"5", "2"}) {
+        auto settings = Exactly({});
+        settings["Tolerance"] = tolerance;
+        ExpectDelayed(voice, Correct(voice, settings), 1024, 3 * kRate);
+    }
+}
+
+TEST(PitchDoctor, KeepsTheStereoImage) {
+    const auto voice = Sing(0.6, kRate, 228.0);
+    std::vector<double> stereo;
+    for (const double sample : voice) stereo.insert(stereo.end(), {sample, 0.25 * sample});
+    PitchDoctor effect;
+    const auto output = Render(effect, stereo, Format<double>(2), {100});
+    const auto left = Correct(voice, {});
+    for (std::size_t i = 0; i < voice.size(); ++i) {
+        ASSERT_NEAR(output[2 * i + 1], 0.25 * output[2 * i], 1e-12);
+        ASSERT_NEAR(output[2 * i], left[i], 1e-6);
+    }
+}
+
+// Places in the stream are counted anew now and then. Catches a part that is left out, by a click or by a
+// reading at a wrong place.
+TEST(PitchDoctor, GoesOnForHours) {
+    constexpr int kLowRate = 8000;
+    constexpr std::size_t kPiece = 8000, kPieces = 540;  // 4.3 million frames
+    PitchDoctor effect;
+    BuiltinEditor editor;
+    effect.SetEditor(&editor);
+    Set(effect, Exactly({}));
+    const auto format = Format<double>(1, kLowRate);
+    effect.InitProcessing(kPiece, &format);
+    const auto second = Sing(1.0, kLowRate, 222.0);  // whole periods
+    std::vector<PitchReading> readings;
+    std::vector<double> first, block;
+    for (std::size_t piece = 0; piece < kPieces; ++piece) {
+        block = second;
+        ProcessBlock(effect, block.data(), kPiece, format);
+        readings.clear();
+        effect.TakeReadings(readings);
+        const auto largest = std::ranges::max(block, {}, [](double x) { return std::abs(x); });
+        if (piece == 1) first = block;
+        if (piece < 1) continue;
+        ASSERT_LT(std::abs(largest),
+                  1.02 * std::abs(std::ranges::max(first, {}, [](double x) { return std::abs(x); })));
+        ASSERT_NEAR(static_cast<double>(readings.back().position), static_cast<double>((piece + 1) * kPiece),
+                    300.0);
+        if (piece > 515) {
+            ASSERT_NEAR(Cents(PitchOf(block, kLowRate), kA3), 0.0, 3.0) << piece;
+        }
+    }
+}
+
+TEST(PitchDoctor, TellsAnEditorWhatItHears) {
+    PitchDoctor effect;
+    EXPECT_TRUE(effect.IsCantrix());
+    std::vector<PitchReading> readings;
+    const auto format = Format<double>(1);
+    const auto voice = Sing(1.0, kRate, [](double t) { return t < 0.5 ? 225.0 : 300.0; });
+    Render(effect, voice, format, {480});
+    effect.TakeReadings(readings);
+    EXPECT_TRUE(readings.empty()) << "no editor";
+    BuiltinEditor editor;
+    effect.SetEditor(&editor);
+    Set(effect, Exactly({}));
+    Render(effect, voice, format, {480});
+    effect.TakeReadings(readings);
+    ASSERT_GT(readings.size(), 150u);
+    const auto& last = readings.back();
+    EXPECT_NEAR(last.heardHz, 300.0, 0.1);
+    EXPECT_EQ(last.note, 62);
+    EXPECT_NEAR(Cents(static_cast<double>(last.noteHz), 440.0), -700.0, 0.01);
+    EXPECT_NEAR(static_cast<double>(last.correctionCents), -Cents(300.0, 293.6648), 0.3);
+    const auto notes = NotesOf(readings, 1440, 2880);
+    ASSERT_EQ(notes.size(), 2u);
+    EXPECT_EQ(notes[0].note, 57);
+    EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(225.0, 220.0), 10.0);
+    EXPECT_NEAR(static_cast<double>(notes[1].start), 24000.0, 2000.0);
+    EXPECT_TRUE(NotesOf(readings, 1440, 48000).empty()) << "shorter than asked for";
+}
+
+TEST(PitchDoctor, AnnouncesAnotherLatency) {
+    PitchDoctor effect;
+    EXPECT_EQ(effect.GetLatency(), 0);
+    const auto format = Format<float>(2, 96000);
+    effect.InitProcessing(64, &format);
+    EXPECT_EQ(effect.GetLatency(), 2048);
+    const auto lowest = IndexOf(effect, "Lowest pitch");
+    effect.SetParam(lowest, 1.0f, true);
+    EXPECT_EQ(effect.GetLatency(), 2048) << "not automated";
+    EXPECT_FALSE(effect.WantRefreshAllParams());
+    effect.SetPreset(6);  // "High voice, low latency"
+    EXPECT_TRUE(effect.WantRefreshAllParams());
+    EXPECT_EQ(effect.GetLatency(), 960);
+    effect.SetWantRefreshAllParams(false);
+    effect.SetParam(lowest, effect.GetParam(lowest), false);
+    EXPECT_FALSE(effect.WantRefreshAllParams());
+}
+
+// Catches a count that is believed: other versions may have fewer settings, or more.
+TEST(PitchDoctor, TakesChunksWithOtherCounts) {
+    PitchDoctor effect;
+    const auto defaults = Chunk(effect);
+    Random random(3);
+    SetAllParams(effect, random);
+    auto longer = Chunk(effect);
+    const auto whole = longer;
+    longer[4] = 40;
+    longer.resize(8 + 4 * 40, 0x55);
+    effect.SetSettingsChunk(longer);
+    EXPECT_EQ(Chunk(effect), whole);
+    auto shorter = whole;
+    shorter[4] = 5;
+    shorter.resize(8 + 4 * 5);
+    effect.SetSettingsChunk(shorter);
+    auto expected = defaults;
+    std::copy(whole.begin() + 8, whole.begin() + 8 + 4 * 5, expected.begin() + 8);
+    EXPECT_EQ(Chunk(effect), expected);
+}
