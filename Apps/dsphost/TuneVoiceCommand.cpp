@@ -33,8 +33,6 @@ constexpr int kMostChannels = 2;
 constexpr double kLongestPause = 0.03;  // seconds that do not end a note
 constexpr double kShortestNote = 0.06;
 
-std::unique_ptr<Effect> MakePitchDoctor() { return std::make_unique<PitchDoctor>(); }
-
 std::vector<std::string> ChoicesOf(Effect& effect, int parameter) {
     std::vector<std::string> names;
     for (const auto& choice : effect.Describe(parameter).choices) names.push_back(choice.text);
@@ -73,7 +71,7 @@ public:
     VoiceTuner(const TuneVoiceArguments& arguments, std::vector<PitchReading>& readings)
         : m_readings(readings) {
         m_effect.SetEditor(&m_editor);
-        m_parameters = DescribeParameters(MakePitchDoctor);
+        m_parameters = DescribeParameters(*Corvo::DSP::FindEffectKind(Name()));
         const Scale scale = ParseScale(arguments.scale, m_effect);
         Set("Scale root", scale.root);
         Set("Scale mode", scale.mode);
@@ -100,9 +98,8 @@ private:
     void Set(const char* label, const std::string& text) {
         if (text.empty()) return;
         std::string warning;
-        for (const auto* parameter : FindParameters(m_parameters, label, Name()))
-            m_effect.SetParam(parameter->index,
-                              ParseValue(MakePitchDoctor, m_effect, *parameter, text, warning), false);
+        for (const auto* parameter : FindParameters(m_effect, m_parameters, label))
+            m_effect.SetParam(parameter->index, ParseValue(m_effect, *parameter, text, warning), false);
         if (!warning.empty()) PrintMessage("warning: " + warning);
     }
 
