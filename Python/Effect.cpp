@@ -41,10 +41,9 @@ std::vector<Effect::Parameter> Effect::Parameters() const {
     return all;
 }
 
-float Effect::Get(int index) const {
-    float value = 0.0f;
-    Check(dsp_effect_get(m_effect.get(), index, &value));
-    return value;
+std::string Effect::ShownText(int index) const {
+    const std::string text = ParameterText(index, DSP_TEXT_VALUE);
+    return text.substr(0, text.find_last_not_of(' ') + 1);
 }
 
 void Effect::Set(int index, float value) { Check(dsp_effect_set(m_effect.get(), index, value)); }
@@ -116,7 +115,7 @@ void DefineEffect(py::module_& module) {
     py::class_<Effect>(module, "Effect")
         .def(py::init<const std::string&>(), py::arg("name"))
         .def("parameters", &Effect::Parameters)
-        .def("get", &Effect::Get)
+        .def("text", &Effect::ShownText)
         .def("set", &Effect::Set)
         .def("value_to_text", &Effect::ValueToText)
         .def("text_to_value", &Effect::TextToValue)

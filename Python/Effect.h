@@ -21,7 +21,7 @@ public:
         std::vector<Choice> choices;
     };
     std::vector<Parameter> Parameters() const;
-    float Get(int index) const;
+    std::string ShownText(int index) const;
     void Set(int index, float value);
     std::string ValueToText(int index, float value) const;
     float TextToValue(int index, const std::string& text) const;

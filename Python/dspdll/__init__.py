@@ -21,7 +21,8 @@ from .equalizer import Band, Equalizer
 from .files import render
 from .processor import Processor, Stream
 
-__all__ = effects.__all__ + [
+__all__ = [
     "Band", "Chain", "Effect", "Equalizer", "Parameter", "Parameters", "Processor", "Sonogram", "Spectrum",
     "Stream", "Tuning", "convert", "effects", "pitch", "render", "sonogram", "spectrum", "tune",
 ]
+__all__ += effects.__all__

@@ -20,7 +20,8 @@ _FLOOR = 1e-30
 
 def decibels(shares: Audio) -> Audio:
     """Powers relative to a full-scale sine's, in dB; -300 for nothing."""
-    return 10.0 * np.log10(np.maximum(shares, _FLOOR))
+    levels: Audio = 10.0 * np.log10(np.maximum(shares, _FLOOR))
+    return levels
 
 
 def axes(ax: Any) -> Any:

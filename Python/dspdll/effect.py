@@ -13,7 +13,7 @@ from . import _native
 from .processor import Audio, Processor, Stream
 
 Value = Union[float, str, bool]
-_SWITCH = 1
+_CONTINUOUS, _SWITCH = 0, 1
 
 
 def read_number(text: str) -> Optional[float]:
@@ -67,8 +67,8 @@ class Parameters(Mapping[str, Parameter]):
         return len(self._rows)
 
     def _cells(self) -> List[Tuple[str, ...]]:
-        head = ("parameter", "attribute", "accepted", "default", "now")
-        return [head] + [(p.name, p.attribute, p.accepted, p.default, p.text) for p in self.values()]
+        head: Tuple[str, ...] = ("parameter", "attribute", "accepted", "default", "now")
+        return [head, *((p.name, p.attribute, p.accepted, p.default, p.text) for p in self.values())]
 
     def __repr__(self) -> str:
         cells = self._cells()
@@ -78,8 +78,10 @@ class Parameters(Mapping[str, Parameter]):
     def _repr_html_(self) -> str:
         from html import escape
 
-        head, *rows = [["".join(escape(cell)) for cell in row] for row in self._cells()]
-        line = lambda tag, row: "<tr>" + "".join(f"<{tag}>{cell}</{tag}>" for cell in row) + "</tr>"
+        def line(tag: str, row: Iterable[str]) -> str:
+            return "<tr>" + "".join(f"<{tag}>{escape(cell)}</{tag}>" for cell in row) + "</tr>"
+
+        head, *rows = self._cells()
         return "<table>" + line("th", head) + "".join(line("td", row) for row in rows) + "</table>"
 
 
@@ -94,7 +96,7 @@ class Table:
         self.sidechain_channels: int = native.sidechain_channels()
         self.parameters = native.parameters()
         self.defaults = [shown(native, index) for index in range(len(self.parameters))]
-        self.ranges = [(shown_at(native, index, 0.0), shown_at(native, index, 1.0))
+        self.ranges = [(native.value_to_text(index, 0.0), native.value_to_text(index, 1.0))
                        for index in range(len(self.parameters))]
         # By label, and both of a left/right pair by the name without a side.
         self.labels: Dict[str, List[int]] = {}
@@ -114,7 +116,7 @@ class Table:
 
     def is_side(self, name: str) -> bool:
         """Whether `name`, a label or its attribute, is one side of a pair that has a name, too."""
-        indices = self.names.get(name) or self.attributes.get(name, [])
+        indices = self.names.get(name, self.attributes.get(name, []))
         return any(len(other) > len(indices) and set(other) > set(indices) for other in self.names.values())
 
     def suggestion(self, name: str, accepted: Iterable[str]) -> str:
@@ -130,16 +132,7 @@ class Table:
 
 
 def shown(native: _native.Effect, index: int) -> str:
-    return native.value_to_text(index, native.get(index)).strip()
-
-
-def shown_at(native: _native.Effect, index: int, value: float) -> str:
-    """What the effect shows when the parameter has this value; some texts follow the settings as a whole."""
-    before = native.state()
-    native.set(index, value)
-    text = shown(native, index)
-    native.set_state(before)
-    return text
+    return native.text(index)
 
 
 def suggestion(name: str, accepted: Iterable[str], told: Iterable[str]) -> str:
@@ -184,11 +177,15 @@ class Effect(Processor):
         self._changed()
         if preset is not None:
             self.preset = preset
-        for name, value in parameters.items():
-            if name not in self._table.attributes:
+        table = self._table
+        for name in parameters:
+            if name not in table.attributes:
                 raise TypeError(f"{type(self).__name__} has no parameter {name!r}; "
-                                + self._table.suggestion(name, self._table.attributes))
-            self._set(self._table.attributes[name], value)
+                                + table.suggestion(name, table.attributes))
+        # Lists and switches first: they say what some numbers mean.
+        kinds = {name: table.parameters[table.attributes[name][0]].kind for name in parameters}
+        for name in sorted(parameters, key=lambda name: kinds[name] == _CONTINUOUS):
+            self._set(table.attributes[name], parameters[name])
 
     # Parameters.
 
@@ -215,7 +212,8 @@ class Effect(Processor):
         if isinstance(value, (bool, np.bool_)):
             text = "On" if value else "Off"
         elif isinstance(value, str):
-            text = value.strip()
+            # "-Inf. dB", as some show it, is not the only way to write it.
+            text = f"{read_number(value):g}" if np.isinf(read_number(value) or 0.0) else value.strip()
         elif np.isnan(value):
             raise ValueError("a parameter cannot be NaN")
         elif np.isinf(value):

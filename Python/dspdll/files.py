@@ -3,7 +3,9 @@
 from __future__ import annotations
 
 import contextlib
+import glob
 import os
+import uuid
 import warnings
 from pathlib import Path
 from typing import Any, Iterator, Optional, Sequence, Union
@@ -34,16 +36,22 @@ def _progress(wanted: bool, frames: int, rate: int, name: str) -> Iterator[Any]:
 
 
 @contextlib.contextmanager
-def written_whole(path: Union[str, "os.PathLike[str]"]) -> Iterator[Path]:
-    """A path beside `path` to write to; it becomes `path` when all went well, and is removed otherwise."""
-    path = Path(path)
-    beside = path.with_name(f".{path.name}.{os.getpid()}.part")
+def written_whole(path: Path) -> Iterator[Path]:
+    """A path beside `path`, of the same ending, to write to; it becomes `path` when all went well, and is removed
+    otherwise. Nobody else writes to it, be it another process or another machine."""
+    beside = path.with_name(f".{path.stem}.{uuid.uuid4().hex[:12]}.part{path.suffix}")
     try:
         yield beside
         os.replace(beside, path)
     finally:
         with contextlib.suppress(FileNotFoundError):
             beside.unlink()
+
+
+def remains_of(path: Path) -> None:
+    """Removes what processes that were killed have left beside `path`; for when nobody is writing it any more."""
+    for beside in path.parent.glob(f".{glob.escape(path.stem)}.????????????.part{path.suffix}"):
+        beside.unlink(missing_ok=True)
 
 
 def render(source: Union[str, "os.PathLike[str]"], target: Union[str, "os.PathLike[str]"],

@@ -115,7 +115,8 @@ def _frames(x: Audio, axis: int) -> int:
 
 
 def _cut(x: Audio, axis: int, start: int, end: Optional[int] = None) -> Audio:
-    return x[start:end] if axis == 0 else x[:, start:end]
+    cut: Audio = x[start:end] if axis == 0 else x[:, start:end]
+    return cut
 
 
 class Processor:
@@ -191,7 +192,7 @@ class Processor:
             body = line.process(x, latency, latency, sidechain)
             flat = x.ndim == 1
             pieces = [p.reshape(-1) if flat else p for p in line._dies_away(rate, x.dtype)]
-            result = np.concatenate([body, *pieces], axis=axis) if pieces else body
+            result: Audio = np.concatenate([body, *pieces], axis=axis) if pieces else body
         else:
             result = line.process(x, latency + round(rate * seconds), latency, sidechain)
         self.__dict__["_spare"] = (settings, line, x.dtype)

@@ -6,6 +6,7 @@
 #include <optional>
 #include <stdexcept>
 
+#include "DSP/Effects/EffectKinds.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 
 namespace Corvo::DSP {
@@ -34,11 +35,6 @@ std::optional<double> NumberOf(std::string_view text) {
     const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
     if (error != std::errc{} || end == text.data() || !std::isfinite(value)) return {};
     return value;
-}
-
-std::string Shown(CorvoEffectBase& effect, int index, float normalised) {
-    const std::string text = Narrow(effect.GetParameterFormattedText(index, static_cast<double>(normalised)));
-    return std::string(Trimmed(text));
 }
 
 // "4 x" and "4" name the same choice when the unit is "x".
@@ -94,10 +90,20 @@ std::vector<int> FindParameters(CorvoEffectBase& effect, std::string_view name) 
     return labelled.empty() ? named : labelled;
 }
 
+std::string TextAt(CorvoEffectBase& effect, int index, float normalised) {
+    // Some texts, such as a threshold's, are read from the settings as a whole.
+    const auto* const kind = FindEffectKind(effect.GetName());
+    const auto other = kind ? kind->Copy(effect) : nullptr;
+    if (other) other->SetParam(index, normalised, false);
+    const auto text =
+        (other ? *other : effect).GetParameterFormattedText(index, static_cast<double>(normalised));
+    return std::string(Trimmed(Narrow(text)));
+}
+
 std::string AcceptedTexts(CorvoEffectBase& effect, int index) {
     std::string all;
     for (const auto& choice : effect.Describe(index).choices) all += (all.empty() ? "" : ", ") + choice.text;
-    return all.empty() ? Shown(effect, index, 0.0f) + " to " + Shown(effect, index, 1.0f) : all;
+    return all.empty() ? TextAt(effect, index, 0.0f) + " to " + TextAt(effect, index, 1.0f) : all;
 }
 
 ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text) {
@@ -111,7 +117,7 @@ ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_vie
         parameter.type == EffectParameterType::List || (!parameter.choices.empty() && length == 0);
     const float value = text.empty() || onlyChoices ? -1.0f : Parsed(effect, index, text);
     const bool understood = value >= 0.0f && value <= 1.0f;
-    const std::string shown = understood ? Shown(effect, index, value) : "";
+    const std::string shown = understood ? TextAt(effect, index, value) : "";
     if (!understood || !SaysTheSame(shown, text, unit))
         throw std::invalid_argument(parameter.label + " cannot be \"" + std::string(text) +
                                     "\"; accepted: " + AcceptedTexts(effect, index));
