@@ -84,14 +84,21 @@ def peaks(source):
 MEASURES = {"tuning": (tuning, ".json"), "spectrum": (spectrum, ".csv"), "peaks": (peaks, ".json")}
 
 
-def do(job, source, target):
-    """Runs on a worker. Returns the seconds of audio, and what went wrong or ""."""
-    try:
-        target.parent.mkdir(parents=True, exist_ok=True)
-        job(source, target)
-        return soundfile.info(source).duration, ""
-    except Exception as error:  # whatever it is, it is this file's alone
-        return 0.0, " ".join(f"{type(error).__name__}: {error}".split())
+def told(error):
+    return " ".join(f"{type(error).__name__}: {error}".split())
+
+
+def do(job, pairs):
+    """Runs on a worker. For each file the seconds of audio, and what went wrong or ""."""
+    done = []
+    for source, target in pairs:
+        try:
+            target.parent.mkdir(parents=True, exist_ok=True)
+            job(source, target)
+            done.append((soundfile.info(source).duration, ""))
+        except Exception as error:  # whatever it is, it is this file's alone
+            done.append((0.0, told(error)))
+    return done
 
 
 def to_do(folder, out, ending):
@@ -107,17 +114,19 @@ def to_do(folder, out, ending):
     return sorted(missing, key=lambda pair: -pair[0].stat().st_size), len(pairs) - len(missing)
 
 
-def run(client, job, pairs):
+def run(client, job, pairs, per_task=1):
     """Yields (source, seconds of audio, error) as the files are done."""
     from dask.distributed import as_completed
 
-    futures = {client.submit(do, job, source, target, pure=False): source for source, target in pairs}
+    pieces = [pairs[first:first + per_task] for first in range(0, len(pairs), per_task)]
+    futures = {client.submit(do, job, piece, pure=False): piece for piece in pieces}
     for future in as_completed(futures):
         if future.status == "finished":
-            yield (futures[future], *future.result())
-        else:
-            # Not the file's own error, but for example that several workers died of it.
-            yield futures[future], 0.0, f"{type(future.exception()).__name__}: {future.exception()}"
+            results = future.result()
+        else:  # not a file's own error, but for example that several workers died of it
+            results = [(0.0, told(future.exception()))] * len(futures[future])
+        for (source, _), result in zip(futures[future], results):
+            yield (source, *result)
     for _, target in pairs:
         remains_of(target)
 
@@ -139,6 +148,7 @@ def main():
     parser.add_argument("--ending", help="the outputs' format, for example .flac; the sources' when left out")
     parser.add_argument("--measure", choices=MEASURES)
     parser.add_argument("--scheduler", metavar="HOST:PORT")
+    parser.add_argument("--per-task", type=int, default=1, metavar="N", help="files a worker gets at once")
     parser.add_argument("--workers", type=int, help="on this machine; as many as cores when left out")
     options = parser.parse_args()
     if not options.source.is_dir():
@@ -157,7 +167,7 @@ def main():
     failures, audio = [], 0.0
     with cluster(options.scheduler, options.workers) as client:
         start = time.time()
-        for count, (source, seconds, error) in enumerate(run(client, job, pairs), 1):
+        for count, (source, seconds, error) in enumerate(run(client, job, pairs, max(1, options.per_task)), 1):
             audio += seconds
             if error:
                 failures.append((source.relative_to(options.source.resolve()), error))

@@ -119,7 +119,7 @@ def test_many_files_as_a_program(tmp_path):
     folder = make_folder(tmp_path / "in", 3, ["bad.wav"])
     (folder / "sub").mkdir()
     (folder / "00.flac").rename(folder / "sub" / "00.flac")
-    command = [sys.executable, str(ROOT / "examples/many_files.py"), str(folder), str(tmp_path / "out"), "--measure", "peaks"]
+    command = [sys.executable, str(ROOT / "examples/many_files.py"), str(folder), str(tmp_path / "out"), "--measure", "peaks", "--per-task", "3"]
     first, second = (subprocess.run(command, capture_output=True, text=True) for _ in range(2))
     assert first.returncode == second.returncode == 1 and "1 files failed:\n  bad.wav  LibsndfileError" in first.stdout
     assert "4 files to do, 0 done before" in first.stdout and "1 files to do, 3 done before" in second.stdout
