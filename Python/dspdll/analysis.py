@@ -55,7 +55,8 @@ class Spectrum(Drawn):
 
     def __repr__(self) -> str:
         hz, level = self.peak
-        return f"<Spectrum of {len(self.levels)} bins up to {self.rate / 2:g} Hz, strongest at {hz:.1f} Hz: {level:.1f} dB>"
+        return (f"<Spectrum of {len(self.levels)} bins up to {self.rate / 2:g} Hz, "
+                f"strongest at {hz:.1f} Hz: {level:.1f} dB>")
 
     def plot(self, ax: Any = None) -> Any:
         """Draws levels and peaks into Matplotlib axes, new ones if None, and returns them."""

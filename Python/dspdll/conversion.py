@@ -17,7 +17,8 @@ def convert(x: Audio, in_rate: float, out_rate: float, *, nearest: bool = False,
         (channels, frames). The result has round(frames * out_rate / in_rate) frames and stands where x stood:
         the filter's delay is taken out.
     nearest: quicker where the exact ratio has large factors, but may miss the rate by some cents."""
-    return _native.convert(np.asarray(x), whole_rate(in_rate), whole_rate(out_rate), bool(nearest), operator.index(axis))
+    return _native.convert(np.asarray(x), whole_rate(in_rate), whole_rate(out_rate), bool(nearest),
+                           operator.index(axis))
 
 
 def pitch(x: Audio, rate: float, semitones: float, *, engine: str = "new", quality: int = 4, speed: float = 1.0,

@@ -321,7 +321,7 @@ class Effect(Processor):
         for seconds, value in points:
             normalised = self._normalised(index, value) if isinstance(value, str) else float(value)
             if not 0.0 <= normalised <= 1.0:
-                raise ValueError(f"a point's value is a number from 0, the lowest, to 1, the highest, or a text such as "
+                raise ValueError("a point's value is a number from 0, the lowest, to 1, the highest, or a text such as "
                                  f"{self._table.defaults[index]!r}; not {value!r}")
             if not 0.0 <= seconds < 1e9:
                 raise ValueError(f"a point's time is in seconds from 0 on, not {seconds!r}")

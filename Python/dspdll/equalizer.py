@@ -41,7 +41,8 @@ class Band:
     @classmethod
     def parse(cls, text: str) -> "Band":
         """From "FREQUENCY TYPE [GAIN] [q=Q]": "2500 peak -3 q=200"."""
-        match = re.fullmatch(r"\s*(\d+)(?:\s*Hz)?\s+([a-z-]+)(?:\s+([+-]?[\d.]+)(?:\s*dB)?)?(?:\s+q=(\d+))?\s*", text, re.I)
+        match = re.fullmatch(r"\s*(\d+)(?:\s*Hz)?\s+([a-z-]+)(?:\s+([+-]?[\d.]+)(?:\s*dB)?)?(?:\s+q=(\d+))?\s*",
+                             text, re.I)
         if not match:
             raise ValueError(f'{text!r} is no band; write "FREQUENCY TYPE [GAIN] [q=Q]", for example '
                              '"2500 peak -3 q=200"')

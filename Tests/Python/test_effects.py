@@ -180,8 +180,8 @@ def test_automation_is_met_to_the_frame():
     y = np.abs(level(x, RATE))
     assert np.allclose(y[:24000], np.abs(x[:24000])) and y[24000:24100].max() < 0.49 and 0.04 < y[-100:].max() < 0.06
     # Behind an effect with latency it keeps its place in the music.
-    late = np.abs(dsp.Chain([dsp.Valvex(oversampling="16"), level])(x, RATE))
-    assert late.argmax() < 24000 and np.abs(np.diff(np.maximum.accumulate(late[::-1])[::-1])).argmax() == pytest.approx(24000, abs=60)
+    late = np.abs(dsp.Chain([dsp.PitchShift(), level])(x, RATE))
+    assert late[22900:23400].max() > 0.4 and late[25000:].max() < 0.1
     level.automate("Dry level", [(0.0, 0.0), (1.0, 1.0)], ramp=0.01)
     ramp = np.abs(level(x, RATE)).reshape(100, 480).max(axis=1)
     assert (np.diff(ramp[10:]) >= 0).all() and len(np.unique(ramp.round(9))) > 50
