@@ -23,3 +23,4 @@ mv $prefix build/python/moved
 PYTHONPATH=$(echo build/python/moved/lib/python3*/*-packages) $python -c '
 import dspdll, numpy
 assert "moved" in dspdll.__file__ and dspdll.Gain()(numpy.zeros(9), 48000).shape == (9,)'
+say "to use it: PYTHONPATH=$PWD/build/python $python"
