@@ -49,6 +49,11 @@ class Band:
         frequency, kind, gain, q = match.groups()
         return cls(int(frequency), kind.lower(), float(gain or 0), int(q) if q else None)
 
+    def __str__(self) -> str:
+        """As parse takes it."""
+        gain = f" {self.gain:g}" if self.gain else ""
+        return f"{self.frequency} {self.type}{gain}" + (f" q={self.q}" if self.q is not None else "")
+
     def _record(self) -> Tuple[int, int, float, int]:
         kind = TYPES.index(self.type)
         q = self.q if self.q is not None else _native.default_q(kind)
@@ -102,7 +107,7 @@ class Equalizer(Processor):
         return ax
 
     def __repr__(self) -> str:
-        return f"Equalizer({list(self._bands)!r}{', invert=True' if self._invert else ''})"
+        return f"Equalizer({[str(band) for band in self._bands]}{', invert=True' if self._invert else ''})"
 
     def __reduce__(self) -> Tuple[Any, ...]:
         return _restore, (self._bands, self._invert)

@@ -39,6 +39,7 @@ def test_pitch_moves_by_semitones_and_stays_in_its_place():
 
 def test_the_equaliser_does_what_its_response_says():
     equaliser = dsp.Equalizer(["80 highpass", "2500 peak -6 q=200", dsp.Band(9000, "highshelf", 3)])
+    assert repr(equaliser) == "Equalizer(['80 highpass', '2500 peak -6 q=200', '9000 highshelf 3'])"
     impulse = np.zeros(8 * 8192)
     impulse[0] = 1
     f = np.fft.rfftfreq(len(impulse), 1 / RATE)[1:-1]
