@@ -216,6 +216,7 @@ void DefineLine(py::module_& module) {
         .def_property_readonly("latency", &Line::Latency, "Frames that the output is later than the input.")
         .def_property_readonly("longest_gap", &Line::LongestGap,
                                "Seconds that may pass between two echoes, as the settings are now.")
+        .def_property_readonly("is_double", &Line::IsDouble)
         .def_property_readonly("rate", &Line::Rate, "Hz.")
         .def_property_readonly("channels", &Line::Channels, "1 or 2.")
         .def_property_readonly("axis", &Line::Axis, "The frames' axis in two-dimensional blocks.")

@@ -41,6 +41,7 @@ public:
     void Reset();
     int Latency();
     double LongestGap();
+    bool IsDouble() const { return m_sample == DSP_F64; }
     int Rate() const { return m_rate; }
     int Channels() const { return m_channels; }
     int Axis() const { return m_axis; }

@@ -54,13 +54,14 @@ class Stream(_native.Line):
     Later changes to the effects it was made of do not reach it.
     """
 
-    def flush(self, tail: Tail = 0.0, dtype: Any = np.float32) -> Audio:
-        """What is still inside when the signal has ended: `latency` frames, and the tail.
+    def flush(self, tail: Tail = 0.0) -> Audio:
+        """What is still inside when the signal has ended: `latency` frames, and the tail; always of two
+        dimensions.
 
-        tail: seconds, or "auto": until it has died away. dtype: that of the blocks before."""
-        empty = self._silence(0, dtype)
+        tail: seconds, or "auto": until it has died away."""
+        dtype = np.float64 if self.is_double else np.float32
         pieces = list(self._ends(self.rate, tail, dtype, 0))
-        return np.concatenate([empty, *pieces], axis=self.axis if empty.ndim > 1 else 0)
+        return np.concatenate([self._silence(0, dtype), *pieces], axis=self.axis)
 
     def _silence(self, frames: int, dtype: Any) -> Audio:
         shape = (frames, self.channels) if self.axis == 0 else (self.channels, frames)

@@ -71,13 +71,13 @@ def test_layouts_and_copies(effect):
 @pytest.mark.parametrize("effect", BLOCKS, ids=lambda effect: effect.__name__)
 def test_a_stream_is_the_recording_in_blocks(effect):
     fx = dsp.Chain([effect(), dsp.Equalizer(["900 peak 6"])])
-    x = noise(20000)
+    x = noise(20000, np.float64)
     expected = fx(x, RATE, tail=0.1)
     stream = fx.stream(RATE, 2)
     pieces = [stream(block) for block in np.split(x, [1, 65, 66, 3000, 12345])] + [stream.flush(0.1)]
     result = np.concatenate(pieces)
     assert stream.position == len(result) == 20000 + stream.latency + 4800
-    assert np.allclose(result[stream.latency:], expected, rtol=0, atol=1e-6)
+    assert np.allclose(result[stream.latency:], expected, rtol=0, atol=1e-9)
 
 
 def test_latency_is_taken_out():
