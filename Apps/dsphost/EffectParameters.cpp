@@ -141,7 +141,7 @@ float ParseValue(Effect& effect, const EffectParameter& parameter, std::string_v
         if (input.limited)
             warning = effect.GetName() + ": " + parameter.label + "=" + std::string(text) +
                       " is beyond the range; " +
-                      Corvo::DSP::ParameterTextAt(effect, parameter.index, input.normalised) + " is used";
+                      Corvo::DSP::TextAt(effect, parameter.index, input.normalised) + " is used";
         return input.normalised;
     } catch (const std::invalid_argument&) {
         throw UserError(asked + "accepted: " + Corvo::DSP::AcceptedTexts(effect, parameter.index) +

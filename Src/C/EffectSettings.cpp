@@ -116,7 +116,7 @@ dsp_status DSP_CALL dsp_effect_value_to_text(dsp_effect* effect, int32_t paramet
                                              size_t size, size_t* needed) {
     return WithParameter(effect, parameter, nullptr, [&](CorvoEffectBase& fx) -> dsp_status {
         if (!(value >= 0.0f && value <= 1.0f)) return DSP_OUT_OF_RANGE;
-        return GiveText(Corvo::DSP::ParameterTextAt(fx, parameter, value), buffer, size, needed);
+        return GiveText(TextAt(fx, parameter, value), buffer, size, needed);
     });
 }
 

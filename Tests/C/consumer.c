@@ -75,6 +75,9 @@ static void UseEffects(float* samples) {
     OK(dsp_effect_get(gain, level, &before));
     OK(dsp_effect_value_to_text(gain, level, before, text, sizeof text, NULL));
     EXPECT(strstr(text, "-6") != NULL);
+    OK(dsp_effect_value_to_text(gain, level, 0.0f, text, sizeof text, NULL));
+    EXPECT(strcmp(text, "-Inf. dB") == 0);
+    OK(dsp_effect_text_to_value(gain, level, "-inf", &value, &g_error));
     EXPECT(dsp_effect_set_state(gain, state, 3, &g_error) == DSP_NOT_UNDERSTOOD);
     free(state);
 

@@ -13,9 +13,12 @@ mv "$work/first" "$work/installed"
 
 if [ -x "$work/installed/bin/dsphost" ]; then "$work/installed/bin/dsphost" --version; fi
 
-# The example is the README's only block of C++.
-awk '/^```cpp$/ {on = 1; next} /^```$/ {on = 0} on' "$source_dir/README.md" > "$work/example/example.cpp"
-[ -s "$work/example/example.cpp" ]
+# The examples are the README's only blocks of C++ and of C.
+for language in cpp c; do
+    awk -v start="\`\`\`$language" '$0 == start {on = 1; next} /^```$/ {on = 0} on' "$source_dir/README.md" \
+        > "$work/example/example.$language"
+    [ -s "$work/example/example.$language" ]
+done
 cp "$here/CMakeLists.txt" "$here/drawing.cpp" "$work/example/"
 
 cmake -G Ninja -S "$work/example" -B "$work/by-cmake" -DCMAKE_PREFIX_PATH="$work/installed" \
@@ -38,5 +41,8 @@ if [ -n "$drawing" ]; then
     "$work/drawing"
 fi
 
+in_c=$("$work/by-cmake/c_example")
+echo "the example in C says: $in_c"
+[ "${in_c% *}" = "after 0.64 s:" ] && [ "${in_c##* }" != 0.0000 ]
 echo "the example says: $by_cmake"
 [ -n "$by_cmake" ] && [ "$by_cmake" = "$by_pkg_config" ]

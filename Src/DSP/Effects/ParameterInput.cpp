@@ -38,25 +38,6 @@ std::optional<double> NumberOf(std::string_view text) {
     return value;
 }
 
-// An effect to try values on: some show what they have stored, and one parameter may change another's text.
-class Trial {
-public:
-    explicit Trial(CorvoEffectBase& effect) : m_effect(effect) {
-        if (const EffectKind* const kind = FindEffectKind(effect.GetName())) m_copy = kind->Copy(effect);
-    }
-    std::string TextAt(int index, float normalised) {
-        if (m_copy) m_copy->SetParam(index, normalised, false);
-        auto& shown = m_copy ? *m_copy : m_effect;
-        const std::string text =
-            Narrow(shown.GetParameterFormattedText(index, static_cast<double>(normalised)));
-        return std::string(Trimmed(text));
-    }
-
-private:
-    CorvoEffectBase& m_effect;
-    std::unique_ptr<CorvoEffectBase> m_copy;  // none for a class that is a host's own
-};
-
 // "4 x" and "4" name the same choice when the unit is "x".
 bool SameChoice(std::string_view shown, std::string_view text, std::string_view unit) {
     const auto bare = [unit](std::string_view whole) {
@@ -110,16 +91,20 @@ std::vector<int> FindParameters(CorvoEffectBase& effect, std::string_view name) 
     return labelled.empty() ? named : labelled;
 }
 
-std::string ParameterTextAt(CorvoEffectBase& effect, int index, float normalised) {
-    return Trial(effect).TextAt(index, normalised);
+std::string TextAt(CorvoEffectBase& effect, int index, float normalised) {
+    // Some texts, such as a threshold's, are read from the settings as a whole.
+    const auto* const kind = FindEffectKind(effect.GetName());
+    const auto other = kind ? kind->Copy(effect) : nullptr;
+    if (other) other->SetParam(index, normalised, false);
+    const auto text =
+        (other ? *other : effect).GetParameterFormattedText(index, static_cast<double>(normalised));
+    return std::string(Trimmed(Narrow(text)));
 }
 
 std::string AcceptedTexts(CorvoEffectBase& effect, int index) {
     std::string all;
     for (const auto& choice : effect.Describe(index).choices) all += (all.empty() ? "" : ", ") + choice.text;
-    if (!all.empty()) return all;
-    Trial trial(effect);
-    return trial.TextAt(index, 0.0f) + " to " + trial.TextAt(index, 1.0f);
+    return all.empty() ? TextAt(effect, index, 0.0f) + " to " + TextAt(effect, index, 1.0f) : all;
 }
 
 ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text) {
@@ -135,7 +120,7 @@ ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_vie
     // Beyond the range parsers limit, or say by how much.
     if (length > 0 && !onlyChoices && !std::isnan(value)) value = std::clamp(value, 0.0f, 1.0f);
     const bool understood = value >= 0.0f && value <= 1.0f;
-    const std::string shown = understood ? ParameterTextAt(effect, index, value) : "";
+    const std::string shown = understood ? TextAt(effect, index, value) : "";
     if (!understood || !SaysTheSame(shown, text, unit))
         throw std::invalid_argument(parameter.label + " cannot be \"" + std::string(text) +
                                     "\"; accepted: " + AcceptedTexts(effect, index));

@@ -25,8 +25,9 @@ struct ParameterInput {
 // a number as the effect's own parser takes it, with or without its unit; beyond the range it is limited.
 // Throws std::invalid_argument, with a sentence that says what would be accepted, for anything else.
 DSP_API ParameterInput ReadParameter(CorvoEffectBase& effect, int index, std::string_view text);
-// What the parameter would show at a value, without blanks at the ends; the effect keeps the value it has.
-DSP_API std::string ParameterTextAt(CorvoEffectBase& effect, int index, float normalised);
+// The text that an effect of this library shows when the parameter has a value, whatever it has now. Asks
+// another instance with the same settings: not for drawing.
+DSP_API std::string TextAt(CorvoEffectBase& effect, int index, float normalised);
 // What would be accepted: "On, Off" or "-60.0 dB to 12.0 dB".
 DSP_API std::string AcceptedTexts(CorvoEffectBase& effect, int index);
 

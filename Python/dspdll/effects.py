@@ -1,0 +1,60 @@
+"""One class for every effect of the library, made from the library's own tables when the package is imported."""
+
+import inspect
+import re
+import textwrap
+
+from . import _native
+from .effect import Effect, Table
+
+
+def _document(name, table):
+    """The class's help: every parameter, and the presets."""
+    lines = [f"{name}(preset=None, **parameters)", "",
+             f"{table.kind}, with these parameters; Effect tells how it is used.", ""]
+    for attribute, indices in table.attributes.items():
+        if table.is_side(attribute):
+            continue
+        label = next(n for n, i in table.names.items() if i is indices)
+        choices = [choice.text.strip() for choice in table.parameters[indices[0]].choices]
+        accepted = ", ".join(choices) if choices else " to ".join(table.ranges[indices[0]])
+        sides = [a for a, i in table.attributes.items() if table.is_side(a) and set(i) < set(indices)]
+        alone = f" ({', '.join(sides)}: one side)" if sides else ""
+        lines += [f'{attribute}, "{label}"{alone}', f"    {accepted}; {table.defaults[indices[0]]} at first"]
+    if table.presets:
+        quoted = ", ".join(f'"{preset}"' for preset in table.presets)
+        lines += ["", f"Presets, {table.default_preset!r} at first:"]
+        lines += textwrap.wrap(quoted, 100, initial_indent="    ", subsequent_indent="    ")
+    if table.sidechain_channels:
+        lines += ["", f"It can listen to a side-chain of 1 to {table.sidechain_channels} channels."]
+    return "\n".join(lines)
+
+
+def _property(indices, doc):
+    return property(lambda self: self._get(indices), lambda self, value: self._set(indices, value), doc=doc)
+
+
+def _class(kind):
+    table = Table(kind)
+    name = re.sub(r"\W+", "", kind)
+    # What every effect has keeps its name; a parameter called the same gets an underscore.
+    table.attributes = {attribute + "_" * hasattr(Effect, attribute): indices
+                        for attribute, indices in table.attributes.items()}
+    members = {"_table": table, "__doc__": _document(name, table), "__module__": __package__}
+    for attribute, indices in table.attributes.items():
+        accepted = " to ".join(table.ranges[indices[0]])
+        members[attribute] = _property(indices, f"{accepted}; {table.defaults[indices[0]]} at first")
+    keywords = [inspect.Parameter(a, inspect.Parameter.KEYWORD_ONLY, default=None) for a in table.attributes]
+    preset = inspect.Parameter("preset", inspect.Parameter.POSITIONAL_OR_KEYWORD, default=None)
+    members["__signature__"] = inspect.Signature([preset, *keywords])
+    return type(name, (Effect,), members)
+
+
+def by_kind(kind):
+    """The class of the effect that the library calls `kind`."""
+    return _classes[kind]
+
+
+_classes = {kind: _class(kind) for kind in _native.kinds()}
+__all__ = [c.__name__ for c in _classes.values()]
+globals().update((c.__name__, c) for c in _classes.values())

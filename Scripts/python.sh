@@ -1,0 +1,26 @@
+#!/usr/bin/env bash
+# Builds the Python package into build/python, tests it there, and tries what an installation gives. ./check python
+set -euo pipefail
+cd "$(dirname "$0")/.."
+source Scripts/common.sh
+
+need_packages "${BUILD_PACKAGES[@]}" pybind11-dev python3-dev python3-numpy python3-pytest python3-soundfile \
+    python3-distributed python3-matplotlib python3-tqdm mypy
+# Debian's Python, whose packages these are, even where another one comes first.
+python=/usr/bin/python3
+say "building (python)"
+cmake --preset python -DPython_EXECUTABLE=$python >/dev/null
+cmake --build --preset python
+say "testing (python)"
+export PYTHONDONTWRITEBYTECODE=1
+PYTHONPATH=$PWD/build/python $python -m pytest -q -p no:cacheprovider Tests/Python
+
+say "installing (python)"
+prefix=build/python/installed
+rm -rf $prefix build/python/moved
+cmake --install build/python --prefix "$PWD/$prefix" >/dev/null
+mv $prefix build/python/moved
+PYTHONPATH=$(echo build/python/moved/lib/python3*/*-packages) $python -c '
+import dspdll, numpy
+assert "moved" in dspdll.__file__ and dspdll.Gain()(numpy.zeros(9), 48000).shape == (9,)'
+say "to use it: PYTHONPATH=$PWD/build/python $python"
