@@ -82,6 +82,7 @@ TEST_P(EveryEffect, TreatsPlanarBlocksLikeInterleavedOnes) {
         double* const channels[] = {planes[0].data(), planes[1].data()};
         planar->InitProcessing(kFrames, &format);
         Corvo::DSP::ProcessFlags flags;
+        planar->ProcessNoninterleaved(nullptr, 0, &format, flags);
         planar->ProcessNoninterleaved(channels, kFrames, &format, flags);
         const auto expected =
             planar->SupportsNoninterleaved() ? Render(*interleaved, input, format, {kFrames}) : input;

@@ -119,18 +119,25 @@ struct TransformSubject : Subject {
 
 // The block that comes out is the newest column of the sonogram.
 struct AnalyserSubject : Subject {
-    AnalyserSubject() {
-        analyser.SetOn(true);
-        analyser.SetTunerOn(true);
-        analyser.ShowSonogram(true);
-    }
+    AnalyserSubject() { AnalyserSubject::Restore(); }
+    ~AnalyserSubject() override { Restore(); }
     void Prepare() override {
         analyser.set_parameters(kRate);
         analyser.init();
         analyser.GetSonogram()->CheckPixelBufferSize({0, 0, 30, 64}, 0);
     }
     void Edit() override {
-        for (const int command : {1100, 1101, 1350}) analyser.popupmenu_process(command);
+        for (int command = 1200; command <= 1402; command += 7) analyser.popupmenu_process(command);
+    }
+    void Restore() override {
+        kivspectrum::settings = {};
+        Tuner::SetDetectionMethod(0);
+        Corvo::Sonogram::SetSpeedIndex(3);
+        Corvo::Sonogram::SetColourScheme(0);
+        analyser.SetOn(true);
+        analyser.SetFrozen(false);
+        analyser.SetTunerOn(true);
+        analyser.ShowSonogram(true);
     }
     void Run(std::vector<float>& block) override {
         analyser.Feed(block.data(), kFrames, 2, 2);

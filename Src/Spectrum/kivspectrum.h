@@ -94,6 +94,9 @@ public:
     // Every live analyser is registered by its constructor and leaves with its destructor.
     static void ObserverAdd(kivspectrum* instance, bool add);
 
+    // Memory: what prepares, refreshes or changes settings throws std::bad_alloc where there is none, and the
+    // next call tries again. Feed never does.
+
     // Off, its tuner too, with buffers for the current settings.
     kivspectrum();
     ~kivspectrum();

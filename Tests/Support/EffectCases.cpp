@@ -37,7 +37,7 @@ constexpr std::array kEffects{
                .make = Make<PitchShift>,
                .cuts = Cuts::Exempt,
                .splices = true,
-               .engineAllocates = "the engine grows its own buffers and is locked against edits",
+               .engineAllocates = "the engine is locked against edits and allocates for an automated pitch",
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},

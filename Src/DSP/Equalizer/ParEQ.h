@@ -41,7 +41,8 @@ public:
     // one and all of them under `bypassAll` are left out.
     //
     // The record is taken as it is except that a frequency counts as at least 1 Hz and, but for peaks, as
-    // below half the rate, and that a band whose numbers give no stable filter is left out. Bands beyond the
+    // below half the rate, and that a band whose numbers give no stable filter is left out. Throws
+    // std::bad_alloc without memory, like Resize and GetSpectrum, and may be repeated. Bands beyond the
     // record's count keep what they have. A null record changes nothing.
     void Cook(bool smooth, bool bypassAll, builtin_effects_data* data, int sampleRate, int numChannels);
 

@@ -40,6 +40,10 @@ private:
 // each call, and every configuration call drops the audio it holds. "Classic" takes pitch factors from
 // another thread; all else must not run at the same time.
 //
+// Memory: configuration calls allocate and may throw std::bad_alloc; the next ones try again, and until then
+// blocks are silent or unchanged. Once configured in the order above, processing allocates only in "New", and
+// there only for blocks of more than 16384 samples (all channels counted) and for pitches above an octave.
+//
 // The order of the virtual operations is part of the contract.
 class DSP_API PitchAdapter {
 public:

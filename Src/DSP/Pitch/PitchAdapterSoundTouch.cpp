@@ -19,7 +19,7 @@ constexpr int kPrimingFrames = 28;
 constexpr int kFlushFrames = 128;
 constexpr int kPiece = 256;
 constexpr float kOctave = 2.0f;
-constexpr int kMostFillBlocks = 64;
+constexpr int kMostFillPieces = 1024;
 // The engine can only be flushed by more input; far more than its longest sequence ends the attempt.
 constexpr int kMostFlushBlocks = 1 << 16;
 // The engine throws at higher rates, and at a few Hz its sequences are too short to move on by a frame. It
@@ -193,8 +193,10 @@ void PitchAdapterSoundTouch::Fill() {
         other.pitch = pitch;
         Configure(other);
         m_engine->clear();
-        for (int i = 0; Held() < block && i < kMostFillBlocks; ++i) Put(m_scratch.data(), block);
-        Put(m_scratch.data(), block);
+        // The lowest pitch asks for the most input, but for no more output than the others.
+        const std::int64_t enough = pitch == kLowestPitch ? 1 : block;
+        for (int i = 0; Held() < enough && i < kMostFillPieces; ++i) Put(m_scratch.data(), kPiece);
+        if (pitch != kLowestPitch) Put(m_scratch.data(), block);
     }
     Configure(wanted);
     m_filledChannels = wanted.channels;

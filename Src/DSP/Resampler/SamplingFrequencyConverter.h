@@ -46,7 +46,8 @@ struct DSP_API SamplingFrequencyConverter {
     // Takes the factors given, which need not be reduced. Returns 1; 0, with the object untouched, for
     // factors outside 1..kMaxFactor or no memory.
     int InitConversionByFactors(int upFactor, int downFactor);
-    // Makes rings for 0..48 channels and starts the stream. Rings of an earlier Init are not freed.
+    // Makes rings for 0..48 channels and starts the stream. Rings of an earlier Init are not freed. Without
+    // memory blocks return 0 until the next Init.
     void Init(int channels);
     // Starts afresh like `design`, which is initialised, in the rings this object has: neither allocates
     // nor frees as long as whoever set up `design` keeps it. False, nothing done, if the rings are too short.

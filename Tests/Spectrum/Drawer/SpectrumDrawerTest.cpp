@@ -184,6 +184,7 @@ TEST(SpectrumDrawer, FindsTheHighestPeak) {
          {Case{{0, 64, 1, 0, 0, 0, 0, 0}, 0.0, 1.0, 0.0},
           Case{{99, 0, 0, 0, 0, 0, 0, 6.4f}, 0.0, 0.0, -300.0},
           Case{{0, 640, 40, 1, 6.4f, 1, 0, 0}, 1.1, 4.0, -10.0},
+          Case{{0, 64, 1, 0, 0, 0, 0, 0}, std::nan(""), 1.0, 0.0},
           Case{{0, 0, 1, 64, 64, 1, 0, 0}, 0.0, 3.5, 10.0 / 4.0 * std::log10(64.0) / 2.0}}) {
         drawer.SmoothFftSpectrum(power, 1.0f, none);
         EXPECT_NEAR(drawer.HighestPeak(lowest).frequency, hz, 1e-6);

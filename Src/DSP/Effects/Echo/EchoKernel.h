@@ -39,8 +39,7 @@ struct Delay {
 }  // namespace EchoPrivate
 
 // Both run over samples between two wraps of the ring, so that none reads what another one wrote. They return
-// whether any sample written, to the ring or as output, may be infinite or NaN. For that they lay the bits of
-// all of them over each other, which may look like it when none of them is.
+// whether any of them may be infinite or NaN: what is so in the ring shows in the output when its time comes.
 
 template <typename Sample>
 bool RunEchoSide(const EchoPrivate::Side& side, Sample* samples, std::ptrdiff_t stride, int frames,
@@ -82,22 +81,17 @@ inline void Store(float* samples, const std::array<Frame, 4>& frames, Floats& bi
     a.store_unaligned(samples);
     b.store_unaligned(samples + 4);
 }
-inline void Store(double* samples, const std::array<Frame, 4>& frames, Frame& bits) {
+// Doubles hold whatever floats of the ring can make.
+inline void Store(double* samples, const std::array<Frame, 4>& frames, Floats&) {
     for (std::size_t i = 0; i < 4; ++i) frames[i].store_unaligned(samples + 2 * i);
-    bits = bits | frames[0] | frames[1] | frames[2] | frames[3];
 }
 
+// The bits of many samples over each other may look like it when none of them is.
 inline bool MayBeInfinite(Floats bits) {
     const auto exponent = _mm_set1_epi32(0x7F800000);
     const auto words = _mm_and_si128(_mm_castps_si128(bits), exponent);
     return _mm_movemask_ps(_mm_castsi128_ps(_mm_cmpeq_epi32(words, exponent))) != 0;
 }
-inline bool MayBeInfinite(Frame bits) {
-    const auto exponent = _mm_set1_epi32(0x7FF00000);
-    const auto words = _mm_and_si128(_mm_castpd_si128(bits), exponent);
-    return _mm_movemask_pd(_mm_castsi128_pd(_mm_cmpeq_epi32(words, exponent))) != 0;
-}
-
 }  // namespace EchoFrames
 
 // Interleaved stereo: both sides together, four frames at a time. The results are RunEchoSide's.
@@ -111,8 +105,7 @@ bool RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples,
     using EchoPrivate::Side;
     const Frame feedback = both(&Side::feedback), echo = both(&Side::echo), wet = both(&Side::wet),
                 dry = both(&Side::dry), output = both(&Side::output);
-    Floats written(0.0f);
-    std::conditional_t<std::is_same_v<Sample, float>, Floats, Frame> shown(0);
+    Floats bits(0.0f);
     int i = 0;
     for (; i + 4 <= frames; i += 4, samples += 8) {
         const auto l = Floats::load_unaligned(left + i), r = Floats::load_unaligned(right + i);
@@ -126,12 +119,12 @@ bool RunEchoPair(const std::array<EchoPrivate::Side, 2>& sides, Sample* samples,
             in[k] = ((delayed[k] * echo + back) * wet + in[k] * dry) * output;
         }
         const Floats a = Joined(kept[0], kept[1]), b = Joined(kept[2], kept[3]);
-        written = written | a | b;
+        if constexpr (std::is_same_v<Sample, double>) bits = bits | a | b;
         Lefts(a, b).store_unaligned(left + i);
         Rights(a, b).store_unaligned(right + i);
-        Store(samples, in, shown);
+        Store(samples, in, bits);
     }
-    bool doubtful = MayBeInfinite(written) || MayBeInfinite(shown);
+    bool doubtful = MayBeInfinite(bits);
     doubtful |= RunEchoSide(sides[0], samples, 2, frames - i, left + i);
     doubtful |= RunEchoSide(sides[1], samples + 1, 2, frames - i, right + i);
     return doubtful;

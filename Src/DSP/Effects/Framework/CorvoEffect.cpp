@@ -19,7 +19,8 @@ CorvoEffect::CorvoEffect() = default;
 const MP_PARAMINFO& CorvoEffect::Record(int externalIndex) {
     static constexpr MP_PARAMINFO kNone{};
     const MP_PARAMINFO* const records = GetParametersInfo();
-    return records ? records[RealIndex(externalIndex)] : kNone;
+    const int real = RealIndex(externalIndex);
+    return records && real >= 0 && real < GetParamCountReal() ? records[real] : kNone;
 }
 
 bool CorvoEffect::DoSetParam(int index, float normalised, bool fromAutomation) {

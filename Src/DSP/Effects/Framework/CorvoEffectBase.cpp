@@ -134,7 +134,7 @@ void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* f
 void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                             ProcessFlags& flags) {
     RunBlock(frames, flags, [&](int allowed) {
-        if (Guards(m_table, *format) && SupportsNoninterleaved())
+        if (allowed > 0 && Guards(m_table, *format) && SupportsNoninterleaved())
             for (int channel = 0; channel < std::min<int>(format->nChannels, MaxNumChannels); ++channel)
                 GuardInput(channels[channel], allowed, 1, format->wBitsPerSample);
         ProcessInternalNoninterleaved(channels, allowed, format, flags);

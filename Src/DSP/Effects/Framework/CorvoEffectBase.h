@@ -100,7 +100,8 @@ public:
 
     // Re-derives coefficients when they are stale, `force` is set, or the format is not the last one seen.
     // With `force`, from InitProcessing, it also makes all memory and starts afresh; then it may allocate and
-    // no block is being processed. Without, it runs in front of every block on the audio thread.
+    // no block is being processed. Without, it runs in front of every block on the audio thread. It may throw
+    // std::bad_alloc, which InitProcessing and Process catch.
     virtual void CheckCookProperties(const tWAVEFORMATEX* format, bool force);
 
     // State, on the user-interface thread: the settings chunk is a fixed little-endian layout of

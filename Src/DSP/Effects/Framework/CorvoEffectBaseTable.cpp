@@ -23,8 +23,10 @@ const ParameterRow* CorvoEffectBase::WordRow(int real) const {
 const ParameterRow* CorvoEffectBase::RowOf(int external) { return RealRow(RealIndex(external)); }
 
 int CorvoEffectBase::RealIndex(int external) {
+    const int count = GetParamCountReal();
+    if (external < 0 || external >= count) return -1;  // any number may be asked for
     const int real = SeparateLeftRightControls() == 0 ? 2 * external : external;
-    return m_reverse_param_order ? GetParamCountReal() - real - 1 : real;
+    return m_reverse_param_order ? count - real - 1 : real;
 }
 
 const MP_PARAMINFO* CorvoEffectBase::TableRecords() const {

@@ -5,7 +5,6 @@
 #include <cstddef>
 
 #include "DSP/Parts/SineOscillator.h"
-#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 
@@ -26,9 +25,10 @@ struct PhaserImpl {
         memories.fill(0.0);
         last = 0.0;
     }
-    // Feedback of 100 % can grow beyond all numbers, and would stay there.
+    // Feedback of 100 % can grow beyond all numbers, and would stay there. From any stage that shows at the
+    // end of the chain within a frame.
     void ClearUnlessFinite() {
-        if (!std::isfinite(last) || !AllFinite(memories.data(), static_cast<std::size_t>(stages))) Clear();
+        if (!std::isfinite(last)) Clear();
     }
 
     // The all-passes' coefficients in the next frames, at most a piece of the oscillator. They are the

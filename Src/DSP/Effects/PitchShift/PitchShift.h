@@ -29,7 +29,8 @@ static_assert(sizeof(_transform_props) == 88);
 //
 // Blocks are interleaved, 1 to 16 channels; 64-bit blocks are double, all others float. The start of the
 // stream is silence until the back-end is full, so the output depends on how the stream is cut. "New"
-// allocates and locks inside its engine.
+// takes a lock in every block, against edits, and allocates in two cases: for each step of an automated
+// pitch, and for blocks of more than 16384 samples, all channels counted.
 //
 // Left and right are one external parameter, "Pitch". A new instance has an empty record, at the lowest
 // pitch: load a preset or a chunk first.
@@ -37,8 +38,8 @@ static_assert(sizeof(_transform_props) == 88);
 // Threads: as in CorvoEffectBase. An edit reaches the back-end at once, again with the next block when a cook
 // overtook it, and restarts "New" under that engine's own lock, which a block may wait for briefly; the
 // effect has no lock. Back-ends are made and freed on the user-interface thread, except for one that a block
-// makes after Cleanup. Latency is asked for on one of the two threads. Cleanup and InitProcessing are not
-// called while a block is processed.
+// makes after Cleanup. Settings that come whole send their pitch at once, too. Latency is asked for on one of
+// the two threads. Cleanup and InitProcessing are not called while a block is processed.
 //
 // Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API PitchShift : public CorvoEffect {
