@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <bit>
 #include <cmath>
-#include <ranges>
+#include <iterator>
 #include <stdexcept>
 
 #include "Errors.h"
@@ -101,7 +101,9 @@ bool InRange(EffectFactory factory, const EffectParameter& parameter, const Stat
             const auto word = WordAt(each, place);
             return floats ? static_cast<double>(std::bit_cast<float>(word)) : static_cast<std::int32_t>(word);
         };
-        const auto [least, most] = std::ranges::minmax(known | std::views::transform(number));
+        std::vector<double> numbers;
+        std::ranges::transform(known, std::back_inserter(numbers), number);
+        const auto [least, most] = std::ranges::minmax(numbers);
         ++set;
         outside += !(number(state) >= least && number(state) <= most);
     }

@@ -237,7 +237,8 @@ bool File::BecomeLike(const fs::path& other) {
 void File::Sync() {
     errno = 0;
     const bool done = std::fflush(m_stream) == 0 && SyncStream(m_stream) == 0;
-    if (!done && m_error == 0) m_error = Reason();
+    const bool unknown = errno == EINVAL || errno == ENOSYS;  // to file systems without a disk
+    if (!done && !unknown && m_error == 0) m_error = Reason();
 }
 
 void File::Close() {

@@ -108,7 +108,7 @@ TEST_F(CommandLine, RefusesBadInput) {
     for (const auto& c : kLines) refuse(c.arguments, c.words);
     for (const auto& c : kEffects) refuse("render in.wav o.wav --fx \"" + c.arguments + "\"", c.words);
     for (const auto& c : kMoves) {
-        SCOPED_TRACE(c.arguments);
+        SCOPED_TRACE(c.arguments.substr(0, 200));
         SaveBytes("moves.json", c.arguments);
         refuse("render in.wav o.wav --fx Tremolo --fx Echo --fx Tremolo --automation moves.json",
                "moves.json: |" + c.words);
@@ -148,11 +148,13 @@ TEST_F(CommandLine, LeavesNothingWhenInterrupted) {
     for (const std::string start : {"samples", "header", "flac"})
         for (const std::string signal : {"HUP", "INT", "TERM"}) {
             SCOPED_TRACE(start + " " + signal);
-            // What runs in the background would ignore an interrupt.
-            const auto result = Shell(
-                "mkdir tmp; mkfifo fifo; exec 3<>fifo; cat " + start +
-                " >&3; TMPDIR=tmp env --default-signal=INT DSPHOST render fifo out.flac & sleep 0.2; kill -" +
-                signal + " $!; wait $!; status=$?; rm fifo; rmdir tmp; exit $status");
+            // What runs in the background would ignore an interrupt. It is ready when it catches all three.
+            const auto result =
+                Shell("mkdir tmp; mkfifo fifo; exec 3<>fifo; cat " + start +
+                      " >&3; TMPDIR=tmp env --default-signal=INT DSPHOST render fifo out.flac & "
+                      "while kill -0 $! && ! grep -q 'SigCgt:.*4..3$' /proc/$!/status; do sleep 0.02; done; "
+                      "sleep 0.1; kill -" +
+                      signal + " $!; wait $!; status=$?; rm fifo; rmdir tmp; exit $status");
             ExpectRefused(result, "interrupted", 130);
         }
 }
