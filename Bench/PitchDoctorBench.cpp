@@ -7,7 +7,6 @@
 #include "DSP/Effects/PitchDoctor/PitchDoctor.h"
 #include "DSP/Pitch/VoicePitchDetector.h"
 #include "EffectRun.h"
-#include "LadspaPeer.h"
 #include "Support/Voice.h"
 
 // What does the correction of a sung voice cost, and the detector alone? A host has to make room for the
@@ -103,14 +102,5 @@ void BM_VoicePitchDetector(benchmark::State& state) {
     state.SetItemsProcessed(state.iterations() * kFrames);
 }
 BENCHMARK(BM_VoicePitchDetector);
-
-#if DSP_HAVE_LADSPA
-// A correction by another method, without and with its formant correction; one instance per channel.
-void BM_Autotalent(benchmark::State& state) {
-    RunLadspa(state, "autotalent.so", "autotalent",
-              {{"Correction strength", 1.0f}, {"Formant correction", static_cast<float>(state.range(1))}});
-}
-BENCHMARK(BM_Autotalent)->Args({512, 0})->Args({512, 1});
-#endif
 
 }  // namespace

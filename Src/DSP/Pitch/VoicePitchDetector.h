@@ -46,7 +46,7 @@ struct VoicePitchCandidate {
 //
 // The same bits however the stream is cut into calls, on every processor. All memory is made by the
 // constructor; nothing else allocates. One thread uses an object at a time. A sample that is not finite
-// counts as 0. A second of 48 kHz takes about 4 ms.
+// counts as 0. A second of 48 kHz takes about 4 ms of one core.
 class DSP_API VoicePitchDetector {
 public:
     explicit VoicePitchDetector(const VoicePitchSettings& settings);

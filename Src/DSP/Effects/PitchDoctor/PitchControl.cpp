@@ -8,7 +8,7 @@ namespace {
 // Seconds.
 constexpr double kKeepCorrection = 0.03, kForgetNote = 0.06, kGap = 0.0107, kOnset = 0.0107;
 constexpr double kYoung = 0.12, kMayStartAgain = 0.08, kVibratoMean = 0.182, kToleranceMean = 0.08;
-constexpr double kMedianHolds = 1.3, kMedianLeast = 0.016, kMedianMost = 0.032;
+constexpr double kMedianHolds = 1.3, kMedianLeast = 0.016, kMedianMost = 0.027;
 // Cents.
 constexpr double kOutlier = 350.0, kAgree = 100.0, kYoungHysteresis = 5.0, kFar = 200.0, kNearer = 50.0;
 constexpr double kLargestMean = 50.0, kLargestError = 1300.0, kNothing = 0.01;
@@ -31,6 +31,7 @@ std::pair<double, std::size_t> PitchControl::Median(const PitchTrack& track, std
     const auto first =
         std::max({now - reach, now - static_cast<std::int64_t>(kMostMedian) + 1, m_judgedFrom});
     for (std::int64_t i = now; i >= first && track.At(i).hz > 0.0; --i) values[count++] = track.At(i).cents;
+    if (count % 2 == 0) --count;  // leaps up and down count alike
     const auto middle = values.begin() + static_cast<std::ptrdiff_t>(count / 2);
     std::nth_element(values.begin(), middle, values.begin() + static_cast<std::ptrdiff_t>(count));
     return {*middle, count};

@@ -150,7 +150,7 @@ void PitchDoctor::ProcessInternalNoninterleaved(double* const* channels, int fra
                                                 const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     const int count = std::min<int>(format->nChannels, MaxNumChannels);
-    if (count < 1) return;
+    if (frames < 1 || count < 1) return;
     WithChannels(channels, *format, OtherWidths::AreFloat, [&]<typename Sample>(Sample* const* buffers) {
         m_engines->Run<Sample>({buffers[0], count == 2 ? buffers[1] : nullptr}, count, frames, 1);
     });

@@ -55,7 +55,7 @@ static_assert(sizeof(PitchDoctorSettings) == 4 * 32);
 //
 // Settings chunk: 136 bytes, the number 1, the number of settings (32), the settings. A chunk of fewer
 // settings leaves the others at their defaults, of more the rest is not read. Values out of range are kept,
-// and limited where they are used. Memory: about 2 MB at 48 kHz; a format that InitProcessing did not
+// and limited where they are used. Memory: about 1.5 MB at 48 kHz; a format that InitProcessing did not
 // announce makes its own in the first block that has it.
 class DSP_API PitchDoctor : public CorvoEffectBase {
 public:
