@@ -65,7 +65,6 @@ void LearnPassage(DenoiserProcessor& denoiser, AudioReader& input, const Passage
     std::vector<double> block(static_cast<std::size_t>(kBlock) * format.nChannels);
     const double before = denoiser.LearnedSeconds();
     for (; position < to;) {
-        CheckInterrupted();
         const bool inside = position >= from;
         const auto wanted = static_cast<int>(std::min<std::int64_t>(kBlock, (inside ? to : from) - position));
         const int got = input.Read(block.data(), wanted);
@@ -134,7 +133,6 @@ void Clean(AudioReader& input, DenoiserProcessor& denoiser, const tWAVEFORMATEX&
     };
     Progress progress("denoise", input.Rate(), input.Frames(), quiet);
     while (const int count = input.Read(block.data(), kBlock)) {
-        CheckInterrupted();
         read += count;
         if (residue)
             original.insert(original.end(), block.begin(),
@@ -143,7 +141,6 @@ void Clean(AudioReader& input, DenoiserProcessor& denoiser, const tWAVEFORMATEX&
         progress.Update(read);
     }
     while (output.FramesWritten() < read) {
-        CheckInterrupted();
         std::ranges::fill(block, 0.0);
         process(kBlock);
     }

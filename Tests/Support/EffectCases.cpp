@@ -41,7 +41,7 @@ constexpr std::array kEffects{
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
-    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>},
+    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>, .splices = true},
 };
 
 }  // namespace
