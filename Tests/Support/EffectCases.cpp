@@ -42,8 +42,8 @@ constexpr std::array kEffects{
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
-    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>},
-    EffectCase{.name = "Cantrix", .make = Make<PitchDoctor>},
+    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>, .splices = true},
+    EffectCase{.name = "Cantrix", .make = Make<PitchDoctor>, .splices = true},
 };
 
 }  // namespace

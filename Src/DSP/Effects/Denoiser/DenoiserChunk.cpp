@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <cmath>
+#include <new>
 
 #include "DSP/Effects/Denoiser/DenoiserPresets.h"
 #include "DSP/Effects/Denoiser/DenoiserState.h"
@@ -75,7 +76,7 @@ int DenoiserProcessor::GetSettingsChunkSize() {
     return static_cast<int>(size);
 }
 
-void DenoiserProcessor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
+void DenoiserProcessor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) try {
     CMemoryFile file;
     Write(file, m_chunk_tag);
     Write(file, kVersion);
@@ -85,6 +86,8 @@ void DenoiserProcessor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
     KivFiles::WriteDoubles(file, values);
     WriteProfile(file, m_state->Known());
     chunk.assign(file.Data(), file.Data() + file.GetLength());
+} catch (const CorvoException&) {
+    throw std::bad_alloc();  // nothing else can happen to a file in memory
 }
 
 void DenoiserProcessor::SetSettingsChunk(const std::vector<std::uint8_t>& chunk) {

@@ -19,6 +19,11 @@ float AtPlace(const std::array<float, kGainBands>& bands, float place) {
     return bands[below] + (bands[below + 1] - bands[below]) * (place - static_cast<float>(below));
 }
 
+bool SameCurves(const EngineSettings& a, const EngineSettings& b) {
+    return a.reductionDb == b.reductionDb && a.sensitivityDb == b.sensitivityDb && a.gainDb == b.gainDb &&
+           a.rangeDb == b.rangeDb;
+}
+
 }  // namespace
 
 void DenoiserEngine::Glide::Set(double to, int frames) {
@@ -39,6 +44,7 @@ std::size_t DenoiserEngine::LengthIndex(std::size_t size) const {
 void DenoiserEngine::Prepare(double rate, std::size_t channels) {
     const Scale scale = Scale::Of(rate);
     if (!(scale == m_scale) || m_dry.empty()) {
+        m_dry.clear();
         m_scale = scale;
         m_tick = std::min(kUnit, scale(kUnit));
         for (std::size_t i = 0; i < kLengths; ++i) m_windows[i].Prepare(scale(kLearnedLengths[i]));
@@ -54,7 +60,6 @@ void DenoiserEngine::Prepare(double rate, std::size_t channels) {
         for (auto& passage : m_passage) passage.assign(m_windows.back().Values(), 0.0f);
         m_order.assign(m_windows[kTrackIndex].Values(), 0.0f);
         m_learner.Prepare(m_windows);
-        m_dry.assign(kMostChannels * static_cast<std::size_t>(scale(kLongestRing)), 0.0);
         std::size_t most = 0;
         m_channels = kMostChannels;
         m_rate = rate;
@@ -65,6 +70,7 @@ void DenoiserEngine::Prepare(double rate, std::size_t channels) {
             most = std::max(most, counting.Taken());
         }
         m_arena.Reserve(most);
+        m_dry.assign(kMostChannels * static_cast<std::size_t>(scale(kLongestRing)), 0.0);
         m_learnedSeconds = 0.0;  // of windows that are no more
     }
     SetFormat(rate, channels);
@@ -154,6 +160,7 @@ void DenoiserEngine::Apply(const EngineSettings& settings) {
     const auto* const set = &SizeSetAt(settings.sizeSet);
     const bool resize = set != m_set;
     if (wasLearning && (!settings.learn || resize)) EndLearning();
+    const bool curves = first || resize || !SameCurves(settings, m_settings);
     m_settings = settings;
     if (resize) {
         m_set = set;
@@ -161,7 +168,9 @@ void DenoiserEngine::Apply(const EngineSettings& settings) {
     }
     if (settings.learn && !m_learner.Active() && Scale::Of(m_rate) == m_scale)
         m_learner.Begin(m_time, m_channels);
-    CookCurves();
+    if (curves) CookCurves();
+    for (auto& reducer : std::span(m_reducers).first(static_cast<std::size_t>(m_set->count)))
+        reducer.SetGains(settings.gains);
     for (auto& tracker : std::span(m_trackers).first(m_channels)) {
         tracker.SetMaterial(settings.music);
         tracker.SetWhitening(settings.gains.whitening > 0.0f);
@@ -184,7 +193,6 @@ void DenoiserEngine::CookCurves() {
         kernels.exponential(curves.floor.data(), curves.offset.data(), values);
         kernels.exponential(curves.logFloor.data(), curves.floor.data(), values);
         m_reducers[i].SetCurves(curves.offset.data(), curves.floor.data(), curves.logFloor.data());
-        m_reducers[i].SetGains(m_settings.gains);
     }
 }
 

@@ -47,8 +47,8 @@ struct State;
 //
 // Latency: of "FFT size", in samples at 44.1 and 48 kHz 9216, 5120, 2048 or 1024; at other rates times the
 // power of two that keeps the windows nearest to as long in seconds. It changes with that parameter; sound
-// then passes as it is until the new windows have filled. A host that changes the rate without InitProcessing
-// keeps the windows' lengths, and nothing is learned until it prepares.
+// then passes as it is until the new windows have filled and know the noise, up to 0.4 s. A host that changes
+// the rate without InitProcessing keeps the windows' lengths, and nothing is learned until it prepares.
 //
 // Threads: as in CorvoEffectBase. Learning is switched like every parameter; a passage ends with the block
 // that finds it switched off, and the profile crosses between the threads as a whole. Learned noise survives

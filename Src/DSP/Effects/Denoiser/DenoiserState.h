@@ -37,12 +37,13 @@ struct State {
         m_toAudio.Publish();
     }
 
-    // No block is being processed.
+    // No block is being processed. Without memory there is no engine, and the learned noise is kept.
     void Prepare(double preparedRate, std::size_t channels) {
         Keep();
-        if (!engine) engine = std::make_unique<DenoiserEngine>();
-        engine->Prepare(preparedRate, channels);
-        engine->Adopt(m_kept);
+        auto made = engine ? std::move(engine) : std::make_unique<DenoiserEngine>();
+        made->Prepare(preparedRate, channels);
+        made->Adopt(m_kept);
+        engine = std::move(made);
         // Every slot of what the audio thread will hand over gets its room; a value on its way is taken
         // first.
         Known();

@@ -14,13 +14,13 @@ public:
     // Speech lets lines in after 2 s; music, whose notes are steady too, after 4 s of greater steadiness.
     void SetMaterial(bool music, double hopSeconds);
 
-    // Takes the power of frame after frame; `floor` is the tracker's estimate. At the end `noise` is raised
-    // to the lines.
-    void Run(const float* power, const float* floor, float* noise);
+    // Frame after frame, in this order: takes its power; looks for lines when a piece of the time is
+    // complete, over the tracker's estimate `floor`; raises `noise` to the lines.
+    void Listen(const float* power);
+    void Look(const float* floor);
+    void Raise(float* noise);
 
 private:
-    void EndPiece(const float* floor);
-
     static constexpr std::size_t kPieces = 8;
 
     std::size_t m_bins = 0;
@@ -30,7 +30,7 @@ private:
     bool m_begun = false;
     float *m_smooth = nullptr, *m_minimum = nullptr, *m_sum = nullptr;
     FrameRing m_minima, m_means;
-    float *m_lowest = nullptr, *m_mean = nullptr, *m_found = nullptr;
+    float *m_lowest = nullptr, *m_valley = nullptr, *m_mean = nullptr, *m_found = nullptr;
     float *m_level = nullptr,
           *m_low = nullptr;  // of a line, 0 where there is none; seconds since it was heard
 };

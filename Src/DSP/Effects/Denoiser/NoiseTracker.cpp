@@ -134,7 +134,8 @@ void NoiseTracker::Start(const float* profile) {
 void NoiseTracker::SetMaterial(bool music) { m_hum.SetMaterial(music, m_hopSeconds); }
 
 float NoiseTracker::Cost(int step) const {
-    constexpr float kNanoseconds[kFixedSteps]{2.8f, 2.0f, 1.5f, 1.0f, 1.0f, 1.0f, 1.0f, 1.2f, 1.5f};
+    constexpr float kNanoseconds[kFixedSteps]{2.8f, 2.0f, 1.5f, 1.0f, 1.0f, 1.0f,
+                                              1.0f, 1.2f, 0.6f, 2.0f, 1.0f};
     const auto bins = static_cast<float>(m_track->Bins());
     if (step < kFixedSteps) return kNanoseconds[step] * bins;
     const auto* const size = m_sizes[static_cast<std::size_t>(step - kFixedSteps)];
@@ -144,7 +145,7 @@ float NoiseTracker::Cost(int step) const {
 void NoiseTracker::Run(int step, std::int64_t frame, const SampleRing& input) {
     if (step == kAnalyse) return Analyse(frame, input);
     if (step == kGather) return Gather(frame);
-    if (m_frames == 0 && step != kLines) return;
+    if (m_frames == 0 && (step < kListen || step > kFinish)) return;
     if (step == kShape) {
         if (m_frames == 1) Begin();
         Shape();
@@ -157,9 +158,13 @@ void NoiseTracker::Run(int step, std::int64_t frame, const SampleRing& input) {
         m_kernels->exponential(m_order, m_level, m_track->Values());
         for (std::size_t i = 0; i < m_track->Bins(); ++i)
             noise[i] = m_profile ? m_level[i] * m_profile[i] : m_level[i];
-    } else if (step == kLines) {
+    } else if (step == kListen) {
+        if (!m_profile) m_hum.Listen(m_power[frame]);
+    } else if (step == kLook) {
+        if (!m_profile) m_hum.Look(m_level);
+    } else if (step == kFinish) {
         float* const noise = m_noise[frame];
-        if (!m_profile) m_hum.Run(m_power[frame], m_level, noise);
+        if (!m_profile) m_hum.Raise(noise);
         std::fill(noise + m_track->Bins(), noise + m_track->Values(), 1.0f);
         if (m_wantsReference) {
             const std::size_t bins = m_track->Bins();

@@ -71,7 +71,9 @@ private:
         kFirstBands,
         kLastBands = kFirstBands + 3,
         kLevels,
-        kLines,
+        kListen,
+        kLook,
+        kFinish,
         kFixedSteps
     };
     static constexpr std::int64_t kMemory = 10, kKept = 4;

@@ -20,7 +20,7 @@ void Resample(const float* from, std::size_t fromCount, double step, float* to, 
     }
 }
 
-void SpectrumConversion::Prepare(const WindowTables& from, const WindowTables& to) {
+void SpectrumConversion::Prepare(WindowTables& from, const WindowTables& to) {
     m_fromBins = from.Bins();
     m_toBins = to.Bins();
     m_scale = static_cast<float>(to.length) / static_cast<float>(from.length);
@@ -30,19 +30,16 @@ void SpectrumConversion::Prepare(const WindowTables& from, const WindowTables& t
     if (!m_shorter) return;
 
     const auto length = static_cast<std::size_t>(from.length);
-    std::vector<double> window(length), re(length / 2), im(length / 2);
+    Floats window(length), re(length / 2), im(length / 2);
     std::ranges::copy(to.analysis, window.begin());
-    CorvoFFT fft;
-    fft.AllocateReal(from.length, 0);
-    fft.DoFFTReal(window.data(), re.data(), im.data(), from.length, 0);
-    fft.Free();
-    im[0] = 0.0;  // the highest bin's place
+    from.fft.DoFFTReal(window.data(), re.data(), im.data(), from.length, 0);
+    im[0] = 0.0f;  // the highest bin's place
     const std::size_t half = kResponseBins * m_ratio;
     // By Parseval: the sum over all bins is length * sum(window^2).
     const double total = 0.5 * static_cast<double>(to.length) * from.length;
     m_response.resize(half + 1);
     for (std::size_t i = 0; i <= half; ++i)
-        m_response[i] = m_scale * static_cast<float>((re[i] * re[i] + im[i] * im[i]) / total);
+        m_response[i] = m_scale * (re[i] * re[i] + im[i] * im[i]) / static_cast<float>(total);
     m_mirrored.resize(from.Values() + 2 * half);
     m_seen.resize(from.Values());
 }

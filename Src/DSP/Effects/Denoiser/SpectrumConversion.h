@@ -14,7 +14,7 @@ namespace Corvo::DSP::Denoising {
 class SpectrumConversion {
 public:
     // Allocates.
-    void Prepare(const WindowTables& from, const WindowTables& to);
+    void Prepare(WindowTables& from, const WindowTables& to);
     void Run(const float* from, float* to);
     std::size_t Bins() const { return m_toBins; }
 

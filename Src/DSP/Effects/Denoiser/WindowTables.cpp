@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <new>
 #include <numbers>
 
 #include "DSP/Effects/Denoiser/HannWeights.h"
@@ -62,6 +63,13 @@ void WindowTables::Prepare(int samples) {
         synthesis[i] = static_cast<float>(0.5 * window);  // four squared windows add up to 2
     }
     fft.AllocateReal(samples, 1);
+    // Without memory it transforms nothing and says nothing.
+    std::ranges::fill(scratch, 0.0f);
+    scratch[1] = 1.0f;
+    fft.DoFFTReal(scratch.data(), 0, 0);
+    const bool forward = scratch[0] != 0.0f;
+    fft.DoIFFTReal(scratch.data(), 0, 0);
+    if (!forward || !(scratch[1] > 0.5f)) throw std::bad_alloc();
     masking.Prepare(Bins());
     for (auto& band : riskBands) band.assign(Values(), 0.0f);
 }

@@ -15,7 +15,7 @@ constexpr std::size_t kRiskBands = 8;  // at most
 
 // What the parts of the reducer share for windows of one length; made before processing.
 struct WindowTables {
-    // Allocates for windows of `samples`.
+    // Allocates for windows of `samples`; throws std::bad_alloc.
     void Prepare(int samples);
     // How much each bin counts in each of the bands in which the blend compares sizes: triangles two octaves
     // apart from 100 Hz. They belong to the grid of a spectrum of `blendLength`; a longer window's bins are
