@@ -78,6 +78,7 @@ try_package() {
 }
 
 part "tests under Wine" test_program dsp_tests
+part "hardening" Tests/Package/hardening.sh build/win32/bin/{DSPDll.dll,dsphost.exe}
 part "exported names" Tests/Exports/exports.sh check build/win32/bin/DSPDll.dll
 part "the native build and this one" compare_builds
 part "package" try_package

@@ -14,3 +14,17 @@ if(DSP_SANITIZE)
     add_compile_options(-fsanitize=${DSP_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
     add_link_options(-fsanitize=${DSP_SANITIZE})
 endif()
+if(DSP_FUZZ)
+    add_compile_options(-fsanitize=fuzzer-no-link)
+endif()
+
+# Clang asks a library for the atomic access to a pair of words that GCC writes inline.
+include(CheckCXXSourceCompiles)
+set(dsp_atomic_pair "#include <atomic>
+    struct Pair { int a, b; };
+    std::atomic<Pair> pair;
+    int main() { return pair.load().a; }")
+check_cxx_source_compiles("${dsp_atomic_pair}" DSP_ATOMICS_ARE_INLINE)
+if(NOT DSP_ATOMICS_ARE_INLINE)
+    target_link_libraries(dsp_compile INTERFACE atomic)
+endif()

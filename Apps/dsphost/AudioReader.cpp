@@ -1,11 +1,15 @@
 #include "AudioReader.h"
 
 #include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <limits>
+#include <string_view>
 #include <utility>
 #include <vector>
 
 #include "Errors.h"
-#include "OutputFile.h"
+#include "Text.h"
 #include "WavHeader.h"
 
 namespace dsphost {
@@ -15,93 +19,187 @@ namespace fs = std::filesystem;
 
 constexpr int kLowestRate = 1000, kHighestRate = 768000;
 
-void Spool(File& from, const std::vector<unsigned char>& start, const fs::path& path) {
-    File to(path, File::Mode::Write, "temporary file " + path.string());
+// Programs that write it put what it is at the start.
+constexpr std::size_t kEnoughToRecognise = 1 << 16;
+
+std::int64_t g_spoolLimit = std::int64_t{8} << 30;
+
+std::string Counted(std::int64_t count, const char* one, const char* several) {
+    return std::to_string(count) + (count == 1 ? one : several);
+}
+
+std::string NoAudio(const std::string& name) {
+    return name + ": is not an audio file that can be read (WAV, FLAC, AIFF, Ogg and others)";
+}
+
+// All of the stream in a temporary file, `start` in front.
+File Spool(File& from, const std::vector<unsigned char>& start) {
+    File to = File::Temporary();
     to.Write(start.data(), start.size());
-    std::vector<unsigned char> buffer(1 << 16);
-    for (;;) {
-        const std::size_t count = from.Read(buffer.data(), buffer.size());
-        if (count == 0) break;
+    std::vector<unsigned char> buffer(kEnoughToRecognise);
+    auto size = static_cast<std::int64_t>(start.size());
+    for (bool recognised = false; const std::size_t count = from.Read(buffer.data(), buffer.size());) {
+        size += static_cast<std::int64_t>(count);
+        if (size > g_spoolLimit)
+            throw UserError(from.Name() + ": does not stream, and its temporary file would be larger than " +
+                            Counted(g_spoolLimit, " byte", " bytes") + "; --spool-limit allows more");
         to.Write(buffer.data(), count);
         to.ThrowIfFailed();
-        CheckInterrupted();
+        if (std::exchange(recognised, true)) continue;
+        if (!SoundFile::MayBeSound(to)) throw UserError(NoAudio(from.Name()));
+        to.Seek(0, SEEK_END);
     }
     from.ThrowIfFailed();
-    to.Close();
+    return to;
+}
+
+std::int64_t FrameBytes(const WavStreamHeader& header) {
+    return std::int64_t{WavSampleBytes(header.subtype)} * header.channels;
+}
+
+ByteSource SourceOf(File& file) {
+    return [&file](void* bytes, std::size_t count) { return file.Read(bytes, count); };
 }
 
 }  // namespace
 
 AudioReader::AudioReader(const std::string& path) : m_name(path == "-" ? "standard input" : path) {
     std::error_code error;
-    const auto status = fs::status(path, error);
+    const auto status = fs::status(PathOf(path), error);
     if (path == "-") {
         if (IsTerminal(stdin)) throw UserError("standard input is a terminal; pipe audio into it");
         OpenStream(File::StandardInput());
     } else if (fs::is_directory(status)) {
         throw UserError(path + ": is a directory, not an audio file");
-    } else if (fs::exists(status) && !fs::is_regular_file(status)) {
-        OpenStream(File(path, File::Mode::Read, path));
     } else {
-        OpenFile(path);
+        File file(PathOf(path), File::Mode::Read, path);
+        if (fs::exists(status) && !fs::is_regular_file(status))
+            OpenStream(std::move(file));
+        else
+            OpenFile(std::move(file));
     }
 }
 
-AudioReader::~AudioReader() {
-    m_sound.reset();
-    m_file.reset();
-    std::error_code error;
-    if (!m_spool.empty()) fs::remove(m_spool, error);
+AudioReader::AudioReader(File file, bool forwardsOnly) : m_name(file.Name()) {
+    if (forwardsOnly)
+        OpenStream(std::move(file));
+    else
+        OpenFile(std::move(file));
 }
 
-void AudioReader::OpenFile(const fs::path& path) {
-    m_file = std::make_unique<File>(path, File::Mode::Read, m_name);
-    if (m_file->Length() == 0) throw UserError(m_name + ": is empty");
+AudioReader::~AudioReader() = default;
+
+void AudioReader::SetSpoolLimit(const std::string& size) {
+    constexpr std::string_view kUnits = "KMGT";
+    const auto length = NumberLength(size);
+    const auto number = ToNumber(std::string_view(size).substr(0, length));
+    const std::string_view unit = std::string_view(size).substr(length);
+    const auto place = unit.size() == 1 ? kUnits.find(static_cast<char>(unit[0] & ~0x20)) : kUnits.npos;
+    const int power = place == kUnits.npos ? 0 : 10 * (static_cast<int>(place) + 1);
+    const double bytes = number ? std::ldexp(*number, power) : -1.0;
+    if (!(bytes >= 0.0 && bytes < 0x1p62) || (power == 0 && !unit.empty()))
+        throw UserError("--spool-limit cannot be \"" + size + "\"; accepted: a number of bytes, or 500M, 8G");
+    g_spoolLimit = static_cast<std::int64_t>(bytes);
+}
+
+void AudioReader::OpenFile(File file) {
+    m_file = std::make_unique<File>(std::move(file));
+    const std::int64_t length = m_file->Length();
+    if (length == 0) throw UserError(m_name + ": is empty");
+    // libsndfile says nothing of samples that a WAV file promises and does not hold.
+    std::vector<unsigned char> start;
+    m_file->Seek(0);
+    const auto header = ReadWavStreamHeader(SourceOf(*m_file), start);
+    m_file->Seek(0);
     try {
         m_sound = std::make_unique<SoundFile>(*m_file, SFM_READ, m_info);
     } catch (const UserError&) {
-        throw UserError(m_name + ": is not an audio file that can be read (WAV, FLAC, AIFF, Ogg and others)");
+        throw UserError(NoAudio(m_name));
     }
     if (m_info.frames <= 0) throw UserError(m_name + ": is empty: it holds no samples");
-    m_frames = m_info.frames;
+    m_cutOff = m_info.frames == std::numeric_limits<sf_count_t>::max();  // as libsndfile says of Ogg
+    if (!m_cutOff) m_frames = m_info.frames;
+    if (header && header->sampleBytes &&
+        *header->sampleBytes > length - static_cast<std::int64_t>(start.size()))
+        m_frames = *header->sampleBytes / FrameBytes(*header);
 }
 
 void AudioReader::OpenStream(File stream) {
     std::vector<unsigned char> start;
-    const auto header = ReadWavStreamHeader(stream, start);
+    const auto header = ReadWavStreamHeader(SourceOf(stream), start);
     stream.ThrowIfFailed();
     if (start.empty()) throw UserError(m_name + ": is empty");
-    if (!header) {
-        m_spool = OutputFile::UnusedName(fs::temp_directory_path(), "dsphost");
-        Spool(stream, start, m_spool);
-        return OpenFile(m_spool);
-    }
+    if (start.size() >= kLongestWavHeader)
+        throw UserError(m_name + ": is a WAV stream without samples in its first MiB");
+    if (!header) return OpenFile(Spool(stream, start));
     m_info.channels = header->channels;
     m_info.samplerate = header->rate;
     m_info.format = SF_FORMAT_RAW | header->subtype | SF_ENDIAN_LITTLE;
-    if (header->sampleBytes)
-        m_frames = *header->sampleBytes / (WavSampleBytes(header->subtype) * header->channels);
+    if (header->sampleBytes) m_frames = *header->sampleBytes / FrameBytes(*header);
+    if (header->doubtfulBytes) m_doubtfulFrames = *header->doubtfulBytes / FrameBytes(*header);
     m_file = std::make_unique<File>(std::move(stream));
     m_sound = std::make_unique<SoundFile>(*m_file, SFM_READ, m_info);
 }
 
 int AudioReader::Read(double* samples, int frames) {
+    int done = 0;
+    while (done < frames) {
+        const int got = ReadSome(samples + static_cast<std::ptrdiff_t>(done) * Channels(), frames - done);
+        if (got == 0) break;
+        done += got;
+    }
+    if (done < frames && !std::exchange(m_ended, true)) End();
+    return done;
+}
+
+// None at the end only.
+int AudioReader::ReadSome(double* samples, int frames) {
+    if (m_doubtfulFrames && m_position == *m_doubtfulFrames) {
+        const std::int64_t bytes =
+            m_position * WavSampleBytes(m_info.format & SF_FORMAT_SUBMASK) * Channels();
+        if (StartsChunk(m_file->Peek(kChunkStart), bytes)) m_frames = m_position;
+        m_doubtfulFrames.reset();
+    }
     std::int64_t wanted = frames;
-    if (m_frames) wanted = std::min(wanted, *m_frames - m_position);
+    for (const auto& end : {m_frames, m_doubtfulFrames})
+        if (end) wanted = std::min(wanted, *end - m_position);
     if (wanted <= 0) return 0;
     const auto got = sf_readf_double(m_sound->Get(), samples, wanted);
+    CountNotFinite(std::span(samples, static_cast<std::size_t>(got * Channels())));
     m_position += got;
     m_file->ThrowIfFailed();
     if (sf_error(m_sound->Get()) != SF_ERR_NO_ERROR)
         throw UserError(m_name + ": is damaged after " + std::to_string(m_position) +
                         " frames: " + m_sound->Error());
+    return static_cast<int>(got);
+}
+
+void AudioReader::CountNotFinite(std::span<const double> samples) {
+    const auto notFinite = [](double sample) { return !std::isfinite(sample); };
+    const auto count = std::ranges::count_if(samples, notFinite);
+    if (count > 0 && m_notFinite == 0)
+        m_firstNotFinite =
+            m_position + (std::ranges::find_if(samples, notFinite) - samples.begin()) / Channels();
+    m_notFinite += count;
+}
+
+void AudioReader::End() {
     if (m_position == 0) throw UserError(m_name + ": is empty: it holds no samples");
-    if (m_frames && got < wanted) {
-        PrintMessage("warning: " + m_name + ": ended after " + std::to_string(m_position) + " of " +
+    const std::string warning = "warning: " + m_name + ": ";
+    if (m_frames && m_position < *m_frames) {
+        PrintMessage(warning + "ended after " + std::to_string(m_position) + " of " +
                      std::to_string(*m_frames) + " frames");
         m_frames = m_position;
+    } else if (m_cutOff) {
+        PrintMessage(warning + "was cut off, after " + std::to_string(m_position) + " frames");
     }
-    return static_cast<int>(got);
+    if (m_notFinite == 0) return;
+    char time[32];
+    std::snprintf(time, sizeof time, "%.3f", static_cast<double>(m_firstNotFinite) / Rate());
+    PrintMessage(warning +
+                 Counted(m_notFinite, " sample is no finite number, at ",
+                         " samples are no finite numbers, the first at ") +
+                 time + " s");
 }
 
 void RequireFormat(const AudioReader& input, int maxChannels, const std::string& reason) {

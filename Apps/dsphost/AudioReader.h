@@ -1,9 +1,9 @@
 #pragma once
 
 #include <cstdint>
-#include <filesystem>
 #include <memory>
 #include <optional>
+#include <span>
 #include <string>
 
 #include "File.h"
@@ -20,7 +20,13 @@ class AudioReader {
 public:
     // Throws UserError when there is nothing there, or nothing that is audio.
     explicit AudioReader(const std::string& path);
+    // `forwardsOnly`: as if the file could not seek.
+    explicit AudioReader(File file, bool forwardsOnly = false);
     ~AudioReader();
+
+    // The most that a temporary file may take, 8 GiB at first: "500M", in bytes or with a K, M, G or T behind
+    // the number. Throws UserError.
+    static void SetSpoolLimit(const std::string& size);
 
     int Channels() const { return m_info.channels; }
     int Rate() const { return m_info.samplerate; }
@@ -30,20 +36,25 @@ public:
     const std::string& Name() const { return m_name; }  // as messages call it
 
     // Fills `samples` with up to `frames` interleaved frames and returns how many there were: fewer only at
-    // the end. Throws UserError when the file turns out to be damaged.
+    // the end. Throws UserError when the file turns out to be damaged. At the end it warns of an input that
+    // was cut off and of samples that are no finite numbers, which it leaves as they are.
     int Read(double* samples, int frames);
 
 private:
     void OpenStream(File stream);
-    void OpenFile(const std::filesystem::path& path);
+    void OpenFile(File file);
+    int ReadSome(double* samples, int frames);
+    void CountNotFinite(std::span<const double> samples);
+    void End();
 
     std::string m_name;
-    std::filesystem::path m_spool;
     std::unique_ptr<File> m_file;
     std::unique_ptr<SoundFile> m_sound;
     SF_INFO m_info{};
-    std::optional<std::int64_t> m_frames;
+    std::optional<std::int64_t> m_frames, m_doubtfulFrames;
     std::int64_t m_position = 0;
+    std::int64_t m_notFinite = 0, m_firstNotFinite = 0;  // samples; the frame of the first
+    bool m_cutOff = false, m_ended = false;
 };
 
 // Throws UserError unless the rate is between 1000 and 768000 Hz and there are at most `maxChannels`

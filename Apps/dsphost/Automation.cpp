@@ -21,13 +21,14 @@ constexpr double kLatestSecond = 1e9;
 constexpr const char* kLaneForm =
     R"(a lane is {"effect": "NAME", "parameter": "LABEL", "points": [[seconds, value], ...]})";
 
-std::string ReadText(const std::string& path) {
-    File file(path, File::Mode::Read, path);
-    std::string text;
-    char buffer[4096];
-    while (const std::size_t count = file.Read(buffer, sizeof buffer)) text.append(buffer, count);
-    file.ThrowIfFailed();
-    return text;
+constexpr std::size_t kLargestFile = std::size_t{64} << 20;
+constexpr int kDeepest = 8;
+
+// What stands in a file, cut to a length that a message can have.
+std::string Quoted(const Json& json) {
+    if (json.is_structured() && json.size() > kDeepest)
+        return (json.is_array() ? "a list of " : "an object of ") + std::to_string(json.size());
+    return Shortened(json.dump(-1, ' ', false, Json::error_handler_t::replace), kLongestQuote);
 }
 
 std::size_t FindElement(const Json& lane, Chain& chain) {
@@ -39,10 +40,10 @@ std::size_t FindElement(const Json& lane, Chain& chain) {
     }
     const Json& effect = lane["effect"];
     if (effect.is_number_integer()) {
-        const auto place = effect.get<long long>();
-        if (place >= 1 && place <= static_cast<long long>(names.size()))
-            return static_cast<std::size_t>(place - 1);
-        throw UserError("the chain has no effect " + std::to_string(place) + "; places go from 1 to " +
+        const auto place = effect.get<double>();  // of any size
+        if (place >= 1.0 && place <= static_cast<double>(names.size()))
+            return static_cast<std::size_t>(place) - 1;
+        throw UserError("the chain has no effect " + Quoted(effect) + "; places go from 1 to " +
                         std::to_string(names.size()));
     }
     if (!effect.is_string()) throw UserError("\"effect\" is a name or a place in the chain");
@@ -56,13 +57,13 @@ AutomationPoint ReadPoint(const Json& point, int rate) {
     const bool pair = point.is_array() && point.size() == 2;
     if (!pair && !(point.is_object() && point.contains("time") && point.contains("value")))
         throw UserError("a point is [seconds, value] or {\"time\": seconds, \"value\": value}, not " +
-                        point.dump());
+                        Quoted(point));
     const Json& time = pair ? point[0] : point["time"];
     const Json& value = pair ? point[1] : point["value"];
     if (!time.is_number() || !(time.get<double>() >= 0.0) || time.get<double>() > kLatestSecond)
-        throw UserError("a point's time is a number of seconds from 0 on, not " + time.dump());
+        throw UserError("a point's time is a number of seconds from 0 on, not " + Quoted(time));
     if (!value.is_number() || !(value.get<double>() >= 0.0 && value.get<double>() <= 1.0))
-        throw UserError("a point's value is a normalised value from 0 to 1, not " + value.dump());
+        throw UserError("a point's value is a normalised value from 0 to 1, not " + Quoted(value));
     return {std::llround(time.get<double>() * rate), value.get<float>()};
 }
 
@@ -76,11 +77,20 @@ std::vector<AutomationPoint> ReadPoints(const Json& lane, int rate) {
 }  // namespace
 
 void LoadAutomation(const std::string& path, int rate, Chain& chain) {
+    ReadAutomation(ReadWhole(path, kLargestFile), path, rate, chain);
+}
+
+void ReadAutomation(std::string_view text, const std::string& path, int rate, Chain& chain) {
     Json file;
     try {
-        file = Json::parse(ReadText(path));
+        file = Json::parse(text, [&](int depth, Json::parse_event_t, Json&) {
+            if (depth > kDeepest) throw UserError(path + ": is nested too deeply; " + kLaneForm);
+            return true;
+        });
     } catch (const Json::parse_error& error) {
         throw UserError(path + ": is not JSON: error at byte " + std::to_string(error.byte));
+    } catch (const Json::exception&) {
+        throw UserError(path + ": is not JSON that can be used: it holds a number that is too large");
     }
     if (file.is_object()) file = Json::array({file});
     if (!file.is_array()) throw UserError(path + ": is not a list of lanes; " + kLaneForm);

@@ -154,7 +154,6 @@ void RunConvert(ConvertArguments arguments) {
         if (bits == 24) Store<tipo_24bit_outd>(converted, clipped);
         output.Write(converted.data(), static_cast<std::int64_t>(converted.size() / channels));
         written += static_cast<std::int64_t>(converted.size() / channels);
-        CheckInterrupted();
     };
     {
         Progress progress("convert", input.Rate(), input.Frames(), arguments.writing.quiet);

@@ -14,7 +14,7 @@ namespace {
 
 using Corvo::DSP::ProcessFlags;
 
-constexpr std::size_t kLargestChunk = 1 << 24;
+constexpr std::size_t kLargestChunk = 1 << 20;
 
 struct Setting {
     std::string_view key, value;
@@ -39,16 +39,6 @@ std::vector<Setting> SplitSettings(std::string_view text, const std::string& eff
         }
     }
     return settings;
-}
-
-std::vector<std::uint8_t> ReadChunk(const std::string& path) {
-    File file(path, File::Mode::Read, path);
-    std::vector<std::uint8_t> bytes(kLargestChunk + 1);
-    bytes.resize(file.Read(bytes.data(), bytes.size()));
-    file.ThrowIfFailed();
-    if (bytes.empty()) throw UserError(path + ": is empty");
-    if (bytes.size() > kLargestChunk) throw UserError(path + ": is too large to be an effect's settings");
-    return bytes;
 }
 
 MP_ENVELOPE_SEGMENT Jump(const AutomationPoint& point) {
@@ -114,13 +104,8 @@ void EffectElement::ChoosePreset(std::string_view name) {
 }
 
 void EffectElement::LoadChunk(const std::string& path) {
-    const auto bytes = ReadChunk(path);
-    const auto before = State();
-    m_effect->SetSettingsChunk(bytes);
-    // Effects ignore what they cannot read without a word.
-    if (State() == before && bytes != before)
-        throw UserError(path + ": " + std::to_string(bytes.size()) + " bytes are not settings of " + m_name +
-                        ", which have " + std::to_string(m_effect->GetSettingsChunkSize()));
+    const std::string bytes = ReadWhole(path, kLargestChunk);
+    UseChunk(m_factory, *m_effect, {bytes.begin(), bytes.end()}, path);
 }
 
 void EffectElement::SetParameter(std::string_view label, std::string_view text) {

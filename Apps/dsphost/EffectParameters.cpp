@@ -52,6 +52,12 @@ bool BeyondRange(Effect& scratch, const EffectParameter& parameter, double numbe
     return normalised >= 1.0f ? number > *end + slack : number < *end - slack;
 }
 
+std::vector<std::uint8_t> StateOf(Effect& effect) {
+    std::vector<std::uint8_t> chunk;
+    effect.GetSettingsChunk(chunk);
+    return chunk;
+}
+
 }  // namespace
 
 std::unique_ptr<Effect> MakeEffect(EffectFactory factory) {
@@ -61,11 +67,28 @@ std::unique_ptr<Effect> MakeEffect(EffectFactory factory) {
 }
 
 std::unique_ptr<Effect> CopyEffect(EffectFactory factory, Effect& effect) {
-    std::vector<std::uint8_t> chunk;
-    effect.GetSettingsChunk(chunk);
     auto copy = factory();
-    copy->SetSettingsChunk(chunk);
+    copy->SetSettingsChunk(StateOf(effect));
     return copy;
+}
+
+void UseChunk(EffectFactory factory, Effect& effect, const std::vector<std::uint8_t>& chunk,
+              const std::string& name) {
+    const auto before = StateOf(effect);
+    if (chunk.size() <= before.size()) effect.SetSettingsChunk(chunk);
+    // Effects ignore what they cannot read without a word.
+    if (chunk.size() > before.size() || (StateOf(effect) == before && chunk != before))
+        throw UserError(name + ": " + std::to_string(chunk.size()) + " bytes are not settings of " +
+                        effect.GetName() + ", which have " + std::to_string(before.size()));
+    // A value that a parameter can have stays what it is when it is set again.
+    const auto copy = CopyEffect(factory, effect);
+    for (const auto& parameter : DescribeParameters(factory)) {
+        const float value = copy->GetParam(parameter.index);
+        if (value >= 0.0f && value <= 1.0f) copy->SetParam(parameter.index, value, false);
+        if (!(value >= 0.0f && value <= 1.0f) || StateOf(*copy) != StateOf(effect))
+            throw UserError(name + ": is not settings of " + effect.GetName() + ": " + parameter.label +
+                            " is out of range");
+    }
 }
 
 std::vector<EffectParameter> DescribeParameters(EffectFactory factory) {
@@ -99,15 +122,15 @@ std::vector<const EffectParameter*> FindParameters(const std::vector<EffectParam
     for (const auto& parameter : all)
         for (const auto& name : {parameter.name, parameter.label})
             if (std::ranges::find(labels, name) == labels.end()) labels.push_back(name);
-    throw UserError(effectName + " has no parameter \"" + std::string(label) + "\"; " +
-                    Suggestion(label, labels));
+    const std::string shown = Shortened(label, kLongestQuote);
+    throw UserError(effectName + " has no parameter \"" + shown + "\"; " + Suggestion(shown, labels));
 }
 
 float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& parameter,
                  std::string_view text, std::string& warning) {
     text = Trimmed(text);
     const std::string asked =
-        effect.GetName() + ": " + parameter.label + " cannot be \"" + std::string(text) + "\"; ";
+        effect.GetName() + ": " + parameter.label + " cannot be \"" + Shortened(text, kLongestQuote) + "\"; ";
     if (text.starts_with(kNormalisedMark)) {
         const auto number = ToNumber(text.substr(kNormalisedMark.size()));
         if (!number || *number < 0.0 || *number > 1.0)
@@ -134,6 +157,8 @@ float ParseValue(EffectFactory factory, Effect& effect, const EffectParameter& p
     } catch (const std::out_of_range&) {
         throw UserError(asked + accepted);
     }
+    // Beyond the range parsers limit, or say by how much.
+    if (length > 0 && std::isfinite(value)) value = std::clamp(value, 0.0f, 1.0f);
     if (!(value >= 0.0f && value <= 1.0f) ||
         !SaysTheSame(TextAt(*scratch, parameter, value), text, parameter.unit))
         throw UserError(asked + accepted);

@@ -17,6 +17,10 @@ struct EffectParameter : Corvo::DSP::ParameterDescription {
 std::unique_ptr<Effect> MakeEffect(EffectFactory factory);
 // A second instance in the same state, to try things on.
 std::unique_ptr<Effect> CopyEffect(EffectFactory factory, Effect& effect);
+// Sets the state that a chunk holds; messages call it `name`. Throws UserError, with the effect as it was or
+// not, when these are not the bytes of such a state or hold values that no parameter can have.
+void UseChunk(EffectFactory factory, Effect& effect, const std::vector<std::uint8_t>& chunk,
+              const std::string& name);
 std::vector<EffectParameter> DescribeParameters(EffectFactory factory);
 
 // The text that `effect` shows once the parameter is set to the normalised value; it stays set.

@@ -16,9 +16,4 @@ struct IoError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-// Stopped by the user (Ctrl-C); what was being written is discarded. Exit status 130.
-struct Interrupted : std::runtime_error {
-    Interrupted() : std::runtime_error("interrupted") {}
-};
-
 }  // namespace dsphost

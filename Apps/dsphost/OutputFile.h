@@ -2,6 +2,7 @@
 
 #include <filesystem>
 #include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -15,8 +16,9 @@ struct OutputRules {
     std::vector<std::string> inputs;  // never overwritten, not even with -y
 };
 
-// An output that appears whole or not at all: it is written beside its place and renamed at Commit. "-" is
-// standard output; a device or a named pipe is written straight. Without Commit nothing stays behind.
+// An output that appears whole or not at all: it is written beside its place, in NAME.*.part, and renamed at
+// Commit. "-" is standard output; a device or a named pipe is written straight. Without Commit nothing stays
+// behind. A file that it replaces gives it its owner and permissions.
 class OutputFile {
 public:
     // Throws UserError when the place is taken, is an input, or cannot be written.
@@ -29,16 +31,26 @@ public:
     const std::string& Name() const { return m_name; }
     // True for standard output, devices and pipes.
     bool IsStream() const { return m_partial.empty(); }
-    // Closes and renames; throws IoError, and nothing stays behind.
+    // Stores everything on the disk and renames; throws IoError, and nothing stays behind.
     void Commit();
 
-    // A name for an unfinished file in `directory` that is not taken.
-    static std::filesystem::path UnusedName(const std::filesystem::path& directory, const std::string& stem);
-
 private:
+    friend void CommitTogether(std::span<OutputFile* const> files);
+    void MakePartial(const std::filesystem::path& directory);
+    void Complete();
+    void Place(SignalsWait& wait, bool keepOld);
+    void TakeBack();
+
     std::string m_name;
-    std::filesystem::path m_target, m_partial;
+    std::filesystem::path m_target, m_partial, m_old;
     std::optional<File> m_file;
+    bool m_overwrite = false, m_existed = false, m_placed = false;
 };
+
+// All of them, or none: what cannot be put in its place takes the others back.
+void CommitTogether(std::span<OutputFile* const> files);
+
+// Throws UserError when two of these outputs would be one file; call it before there is any.
+void RefuseSameOutputs(const std::vector<std::string>& paths);
 
 }  // namespace dsphost

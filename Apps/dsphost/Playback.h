@@ -42,7 +42,6 @@ void PlayThrough(AudioReader& input, kivspectrum& analyser, const std::string& w
     std::int64_t played = 0, end = 0;
     bool ended = false;
     for (std::int64_t refresh = 1; !ended || played < end; ++refresh) {
-        CheckInterrupted();
         const auto wanted = static_cast<int>(refresh * rate / kRefreshesPerSecond - played);
         const int got = ended ? 0 : input.Read(samples.data(), wanted);
         if (!ended && got < wanted) {

@@ -51,7 +51,6 @@ public:
 
     void Run(const std::function<void(std::int64_t)>& onProgress) {
         while (!Finished()) {
-            CheckInterrupted();
             const int frames = BlockFrames();
             ReadBlock(frames);
             ProcessBlock(frames);

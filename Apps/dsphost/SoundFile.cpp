@@ -1,6 +1,8 @@
 #include "SoundFile.h"
 
+#include <array>
 #include <limits>
+#include <string_view>
 #include <utility>
 
 #include "Errors.h"
@@ -45,6 +47,23 @@ SoundFile::SoundFile(File& file, int mode, SF_INFO& info)
     if (m_handle) return;
     file.ThrowIfFailed();
     throw UserError(file.Name() + ": " + sf_strerror(nullptr));
+}
+
+bool SoundFile::MayBeSound(File& file) {
+    SF_INFO info{};
+    Stream stream{file, true};
+    auto io = Callbacks();
+    file.Seek(0);
+    if (SNDFILE* const handle = sf_open_virtual(&io, SFM_READ, &info, &stream)) {
+        sf_close(handle);
+        return true;
+    }
+    // A tag may be longer than all that there is.
+    std::array<char, 3> tag{};
+    file.Seek(0);
+    file.Read(tag.data(), tag.size());
+    return sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT ||
+           std::string_view(tag.data(), tag.size()) == "ID3";
 }
 
 SoundFile::~SoundFile() {

@@ -20,6 +20,10 @@ public:
     SoundFile& operator=(const SoundFile&) = delete;
     ~SoundFile();
 
+    // False for bytes, from the start of `file` on, that no kind of sound file starts with; true where only
+    // the rest is missing.
+    static bool MayBeSound(File& file);
+
     SNDFILE* Get() const { return m_handle; }
     File& Bytes() const { return m_stream.file; }
     // libsndfile's own words on what went wrong.

@@ -51,7 +51,6 @@ std::vector<double> AveragePower(AudioReader& input, kivspectrum& analyser,
     Progress progress("spectrum", input.Rate(), input.Frames(), arguments.writing.quiet);
     std::int64_t read = 0, spectra = 0;
     for (int wanted = arguments.length;; wanted = kivspectrum::settings.hop_length) {
-        CheckInterrupted();
         const int got = input.Read(samples.data(), wanted);
         if (got < wanted && spectra > 0) break;
         std::fill(samples.begin() + got * channels, samples.end(), 0.0);

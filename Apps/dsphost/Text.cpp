@@ -63,10 +63,65 @@ std::string Utf8(std::wstring_view wide) {
     return text;
 }
 
+std::wstring Wide(std::string_view utf8) {
+    std::wstring wide;
+    for (std::size_t i = 0; i < utf8.size();) {
+        const auto lead = static_cast<unsigned char>(utf8[i++]);
+        const int tail = lead < 0x80   ? 0
+                         : lead < 0xC2 ? -1
+                         : lead < 0xE0 ? 1
+                         : lead < 0xF0 ? 2
+                         : lead < 0xF5 ? 3
+                                       : -1;
+        std::uint32_t code = tail > 0 ? lead & (0x3Fu >> tail) : tail == 0 ? lead : 0xFFFD;
+        for (int k = 0; k < tail; ++k) {
+            if (i == utf8.size() || (static_cast<unsigned char>(utf8[i]) & 0xC0) != 0x80) {
+                code = 0xFFFD;
+                break;
+            }
+            code = code << 6 | (static_cast<unsigned char>(utf8[i++]) & 0x3Fu);
+        }
+        if (code > 0xFFFF && sizeof(wchar_t) == 2) {
+            wide += static_cast<wchar_t>(0xD7C0 + (code >> 10));
+            code = 0xDC00 + (code & 0x3FF);
+        }
+        wide += static_cast<wchar_t>(code);
+    }
+    return wide;
+}
+
+std::string Escaped(std::string_view text) {
+    std::string escaped;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const auto byte = static_cast<unsigned char>(text[i]);
+        // The upper control characters are two bytes, of which the first is no character alone.
+        const bool upper =
+            byte == 0xC2 && i + 1 < text.size() && static_cast<unsigned char>(text[i + 1]) < 0xA0;
+        if (byte == '\n') {
+            escaped += "\\n";
+        } else if (byte < 0x20 || byte == 0x7F || upper) {
+            constexpr char kDigits[] = "0123456789abcdef";
+            const auto code = upper ? static_cast<unsigned char>(text[++i]) : byte;
+            escaped.append("\\x").append(1, kDigits[code >> 4]).append(1, kDigits[code & 15]);
+        } else {
+            escaped += text[i];
+        }
+    }
+    return escaped;
+}
+
+std::string Shortened(std::string_view text, std::size_t most) {
+    if (text.size() <= most) return std::string(text);
+    // Not in the middle of a character.
+    while (most > 0 && (static_cast<unsigned char>(text[most]) & 0xC0) == 0x80) --most;
+    return std::string(text.substr(0, most)) + "...";
+}
+
 std::string_view Trimmed(std::string_view text) {
     constexpr std::string_view kBlanks = " \t\r\n\f\v";
     const auto first = text.find_first_not_of(kBlanks);
-    if (first == text.npos) return {};
+    if (first == text.npos)
+        return text.substr(text.size());  // within the text, for whoever goes on from there
     return text.substr(first, text.find_last_not_of(kBlanks) - first + 1);
 }
 
@@ -128,9 +183,10 @@ std::size_t FindName(std::string_view text, std::span<const std::string> names, 
     if (!text.empty()) std::ranges::copy_if(names, std::back_inserter(candidates), begins);
     if (candidates.size() == 1)
         return static_cast<std::size_t>(std::ranges::find_if(names, begins) - names.begin());
-    const std::string asked = std::string(what) + " \"" + std::string(text) + "\"";
+    const std::string shown = Shortened(text, kLongestQuote),
+                      asked = std::string(what) + " \"" + shown + "\"";
     if (candidates.size() > 1) throw UserError(asked + " could be several: " + Joined(candidates, ", "));
-    throw UserError("there is no " + asked + "; " + Suggestion(text, names));
+    throw UserError("there is no " + asked + "; " + Suggestion(shown, names));
 }
 
 }  // namespace dsphost

@@ -9,6 +9,13 @@
 namespace dsphost {
 
 std::string Utf8(std::wstring_view wide);
+// What is no UTF-8 becomes U+FFFD.
+std::wstring Wide(std::string_view utf8);
+// Control characters as \n or \x1b, so that a text keeps to its line and a terminal only shows it.
+std::string Escaped(std::string_view text);
+// At most `most` bytes, with dots where the rest was.
+std::string Shortened(std::string_view text, std::size_t most);
+inline constexpr std::size_t kLongestQuote = 60;  // of what a message repeats
 // Blanks removed at both ends.
 std::string_view Trimmed(std::string_view text);
 // ASCII letters only; everything else compares as it is.

@@ -19,21 +19,29 @@ constexpr std::array kCodings{
     CodingRow{kALaw, 8, SF_FORMAT_ALAW},    CodingRow{kMuLaw, 8, SF_FORMAT_ULAW},
 };
 
-// Programs that stream put a size here that stands for "unknown": the largest or half of it.
-constexpr std::uint32_t kUnknownSize = 0x7FFFF000;
 constexpr std::uint32_t kLargestFormatChunk = 4096;
+
+// What programs that stream write where they do not know the size, less the part of a frame that is left
+// over. All but the first two could also be meant.
+constexpr std::array<std::uint32_t, 6> kUnknownSizes{0,          0xFFFFFFFF, 0x7FFFF000,
+                                                     0x7FFFFF00, 0x7FFFFFFF, 0x80000000};
+constexpr std::size_t kCertainlyUnknown = 2;
+
+// Chunks that stand behind the samples.
+constexpr std::array<std::string_view, 18> kChunkNames{"LIST", "bext", "id3 ", "ID3 ", "cue ", "smpl",
+                                                       "JUNK", "PAD ", "fact", "iXML", "inst", "plst",
+                                                       "acid", "_PMX", "axml", "umid", "PEAK", "afsp"};
 
 // The bytes of a stream, all of them kept.
 class Keeper {
 public:
-    Keeper(File& file, std::vector<unsigned char>& bytes) : m_file(file), m_bytes(bytes) {}
+    Keeper(const ByteSource& source, std::vector<unsigned char>& bytes) : m_source(source), m_bytes(bytes) {}
     bool Fetch(std::size_t count) {
-        const std::size_t start = m_bytes.size();
-        m_bytes.resize(start + count);
-        const std::size_t done = m_file.Read(m_bytes.data() + start, count);
-        m_bytes.resize(start + done);
+        const std::size_t start = m_bytes.size(), most = std::min(count, kLongestWavHeader - start);
+        m_bytes.resize(start + most);
+        m_bytes.resize(start + m_source(m_bytes.data() + start, most));
         m_last = start;
-        return done == count;
+        return m_bytes.size() - start == count;
     }
     // Of the bytes fetched last.
     std::string_view Text(std::size_t offset) const {
@@ -47,7 +55,7 @@ public:
     }
 
 private:
-    File& m_file;
+    const ByteSource& m_source;
     std::vector<unsigned char>& m_bytes;
     std::size_t m_last = 0;
 };
@@ -66,8 +74,16 @@ bool ReadFormatChunk(Keeper& stream, std::uint32_t size, WavStreamHeader& header
     return stream.Number(12, 2) == static_cast<std::uint32_t>(header.channels * bits / 8);
 }
 
-// Chunks in front of the samples that say nothing about them.
-constexpr std::uint32_t kLargestOtherChunk = 1 << 24;
+void TakeSize(std::uint32_t size, std::uint32_t frameBytes, WavStreamHeader& header) {
+    const auto unknown = std::ranges::find_if(kUnknownSizes, [&](std::uint32_t value) {
+        return size == value || size == value - value % frameBytes;
+    });
+    const auto place = static_cast<std::size_t>(unknown - kUnknownSizes.begin());
+    if (unknown == kUnknownSizes.end())
+        header.sampleBytes = size;
+    else if (place >= kCertainlyUnknown)
+        header.doubtfulBytes = size;
+}
 
 }  // namespace
 
@@ -76,8 +92,9 @@ int WavSampleBytes(int subtype) {
     return coding == kCodings.end() ? 0 : coding->bits / 8;
 }
 
-std::optional<WavStreamHeader> ReadWavStreamHeader(File& file, std::vector<unsigned char>& bytes) {
-    Keeper stream(file, bytes);
+std::optional<WavStreamHeader> ReadWavStreamHeader(const ByteSource& source,
+                                                   std::vector<unsigned char>& bytes) {
+    Keeper stream(source, bytes);
     if (!stream.Fetch(12) || stream.Text(0) != "RIFF" || stream.Text(8) != "WAVE") return {};
     WavStreamHeader header;
     while (stream.Fetch(8)) {
@@ -85,16 +102,22 @@ std::optional<WavStreamHeader> ReadWavStreamHeader(File& file, std::vector<unsig
         const std::uint32_t size = stream.Number(4, 4);
         if (name == "data") {
             if (header.channels == 0) return {};
-            if (size > 0 && size < kUnknownSize) header.sampleBytes = size;
+            TakeSize(size, static_cast<std::uint32_t>(header.channels * WavSampleBytes(header.subtype)),
+                     header);
             return header;
         }
         if (name == "fmt ") {
             if (!ReadFormatChunk(stream, size, header)) return {};
-        } else if (size > kLargestOtherChunk || !stream.Fetch(size + (size & 1))) {
+        } else if (!stream.Fetch(std::size_t{size} + (size & 1))) {
             return {};
         }
     }
     return {};
+}
+
+bool StartsChunk(std::string_view bytes, std::int64_t sampleBytes) {
+    const std::size_t padding = sampleBytes % 2 == 0 ? 0 : 1;
+    return bytes.size() >= padding + 4 && std::ranges::count(kChunkNames, bytes.substr(padding, 4)) > 0;
 }
 
 std::vector<unsigned char> MakeWavHeader(const WavShape& shape, std::optional<std::int64_t> sampleBytes) {

@@ -1,24 +1,25 @@
 #include <exception>
+#include <string>
+#include <vector>
 
 #include "CommandLine.h"
 #include "Errors.h"
-#include "File.h"
+#include "Process.h"
 
 namespace {
 
-constexpr int kSuccess = 0, kIoFailure = 1, kUserFailure = 2, kInterrupted = 130;
+constexpr int kSuccess = 0, kIoFailure = 1, kUserFailure = 2;
 
-int Run(int count, char** arguments) {
+int Run(std::vector<std::string> arguments) {
     using namespace dsphost;
     try {
-        RunCommandLine(count, arguments);
+        std::vector<char*> pointers;
+        for (auto& argument : arguments) pointers.push_back(argument.data());
+        RunCommandLine(static_cast<int>(pointers.size()), pointers.data());
         return kSuccess;
     } catch (const UserError& error) {
         PrintMessage(error.what());
         return kUserFailure;
-    } catch (const Interrupted& error) {
-        PrintMessage(error.what());
-        return kInterrupted;
     } catch (const std::exception& error) {
         PrintMessage(error.what());
         return kIoFailure;
@@ -29,5 +30,5 @@ int Run(int count, char** arguments) {
 
 int main(int count, char** arguments) {
     dsphost::PrepareProcess();
-    return Run(count, arguments);
+    return Run(dsphost::Utf8Arguments(count, arguments));
 }

@@ -132,6 +132,7 @@ TEST_F(RenderCommand, RoundsToNearestEvenAndClips) {
     Save("in.wav", {1, 48000, kDouble, samples});
     // 1.0, 1 - 0.4 steps, -1 - 0.6 steps, the two sevens, and what is no number.
     EXPECT_EQ(Run("render in.wav out.wav --format s16").err,
+              "dsphost: warning: in.wav: 1 sample is no finite number, at 0.000 s\n"
               "dsphost: warning: out.wav: 6 samples were clipped\n");
     const Sound out = Load("out.wav");
     ASSERT_EQ(out.samples.size(), expected.size());

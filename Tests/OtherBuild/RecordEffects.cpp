@@ -116,7 +116,7 @@ Take EqualizerTake() {
 std::vector<Take> RecordAll() {
     std::vector<Take> takes{EqualizerTake()};
     for (const auto& which : AllEffects()) {
-        for (const std::uint64_t seed : {1, 2, 3}) RecordAtRandom(which, seed, takes);
+        for (const std::uint64_t seed : {1u, 2u, 3u}) RecordAtRandom(which, seed, takes);
         takes.push_back(Texts(which));
     }
     return takes;

@@ -69,7 +69,7 @@ public:
     virtual void SetFFTSize(int index);
     virtual void SetQuality(int index);
     // Processing. The first frames of "New" are silence until its engine is full; "Classic" leaves double
-    // buffers as they are.
+    // buffers as they are. Samples that are not finite count as 0.
     virtual void ProcessInPlace(double* buffer, int frames) = 0;
     virtual void ProcessInPlace(float* buffer, int frames) = 0;
     // Without that silence: returns how many frames, at most those given, it put at the start of the buffer.

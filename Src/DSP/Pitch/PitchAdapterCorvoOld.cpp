@@ -6,6 +6,7 @@
 #include <numbers>
 
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 #include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
@@ -116,6 +117,7 @@ void PitchAdapterCorvoOld::ProcessInPlace(float* buffer, int frames) {
     // A new frame size waits for CookFactors.
     if (m_window.empty() || m_window.size() != static_cast<std::size_t>(m_size)) return;
     const DenormalGuard guard;
+    ReplaceNonFinite(buffer, frames, m_channels, 2);
     for (int channel = 0; channel < std::min(m_channels, 2); ++channel) {
         const auto side = static_cast<std::size_t>(channel);
         if (channel == 0 || m_channels == 2)

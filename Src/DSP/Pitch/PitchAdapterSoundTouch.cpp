@@ -8,6 +8,7 @@
 
 #include "DSP/Pitch/ShortFader.h"
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -129,6 +130,7 @@ void PitchAdapterSoundTouch::ProcessInPlace(float* buffer, int frames) {
     const DenormalGuard guard;
     const std::lock_guard lock(m_lock);
     m_atRest = false;
+    ReplaceNonFinite(buffer, frames, m_channels);
     Put(buffer, frames);
     if (static_cast<std::int64_t>(m_engine.numSamples()) < frames)
         std::fill_n(buffer, Samples(frames, m_channels), 0.0f);
@@ -140,6 +142,7 @@ int PitchAdapterSoundTouch::ProcessInPlaceNoPadding(float* buffer, int frames) {
     const DenormalGuard guard;
     const std::lock_guard lock(m_lock);
     m_atRest = false;
+    ReplaceNonFinite(buffer, frames, m_channels);
     Put(buffer, frames);
     m_inputFrames += std::max(frames, 0);
     const int taken = Take(buffer, frames);

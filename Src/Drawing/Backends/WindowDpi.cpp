@@ -9,7 +9,8 @@ constexpr int kUsualDpi = 96;
 using GetDpiForMonitorType = HRESULT(WINAPI*)(HMONITOR, int kind, UINT* x, UINT* y);
 
 GetDpiForMonitorType FindGetDpiForMonitor() {
-    const HMODULE library = LoadLibraryW(L"shcore.dll");
+    // From the system's folder: by name alone it could be another one, from where the program stands.
+    const HMODULE library = LoadLibraryExW(L"shcore.dll", nullptr, LOAD_LIBRARY_SEARCH_SYSTEM32);
     if (!library) return nullptr;
     // By way of void*: the compiler takes a cast between two types of function for a mistake.
     return reinterpret_cast<GetDpiForMonitorType>(

@@ -215,8 +215,8 @@ void DrawNeedleInfo(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     if (!IsDrawable(rectangle)) return;
     const Tuner& tuner = *analyser.GetTuner();
     // The error comes first; the other lines only where they stay large enough to read.
-    const int lines = std::clamp(static_cast<int>(rectangle.height / (kLeastInfoLine * target.Scale())), 1,
-                                 TunerGetNumLines());
+    const float most = rectangle.height / (kLeastInfoLine * target.Scale());
+    const int lines = static_cast<int>(std::clamp(most, 1.0f, static_cast<float>(TunerGetNumLines())));
     const float middle = Centre(rectangle).x;
     const float pitch = rectangle.height / (static_cast<float>(lines) + 0.4f);
     const auto baseline = [&](int line) { return rectangle.y + pitch * (static_cast<float>(line) + 0.85f); };

@@ -54,7 +54,7 @@ void CorvoFFT::Release(SetUp<T>& setUp) {
 template <typename T>
 void CorvoFFT::Build(SetUp<T>& setUp, int length, bool real) {
     const Kind kind = real ? Kind::Real : Kind::Complex;
-    const int order = std::bit_width(static_cast<unsigned>(length)) - 1;
+    const auto order = static_cast<int>(std::bit_width(static_cast<unsigned>(length))) - 1;
     setUp.memory = AlignedAllocate(Corvo::Fft::PlanBytes<T>(order, kind));
     if (!setUp.memory) return;
     const auto* const plan = Corvo::Fft::BuildPlan<T>(setUp.memory, order, kind);

@@ -40,7 +40,7 @@ using Words = std::array<int, 4>;  // type, frequency, boost, Q
 // setters are called twice: the second call changes nothing.
 TEST(BuiltinEffectsData, TellsTheRightListeners) {
     constexpr int kType = 2 | _eq_data::kBypassBand;
-    constexpr Words kBand{kType, 2500, 60, 300};
+    static constexpr Words kBand{kType, 2500, 60, 300};
     struct Case {
         const char* fault;
         std::function<void(Data&)> act;

@@ -82,9 +82,11 @@ void ExpectTheSameBytes(int up, int down, int channels) {
 
 template <typename... In, typename... Out>
 void ExpectTheSameBytes(std::tuple<In...>, std::tuple<Out...>) {
-    for (const auto& [up, down] : {std::pair{37, 34}, {2, 1}, {3, 16}})
+    for (const auto& factors : {std::pair{37, 34}, {2, 1}, {3, 16}})
         for (const int channels : {1, 2, 5})
-            ([&]<typename I>(I) { (ExpectTheSameBytes<I, Out>(up, down, channels), ...); }(In{}), ...);
+            ([&]<typename I>(
+                 I) { (ExpectTheSameBytes<I, Out>(factors.first, factors.second, channels), ...); }(In{}),
+             ...);
 }
 
 // Catches state, position or alignment lost at a block's edge, a channel that leaks into its neighbour,

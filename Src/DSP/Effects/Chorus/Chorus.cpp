@@ -48,6 +48,7 @@ const EffectTable& Table() {
         .chunk = {.words = kWordsOf<Props>, .wideWords = kWordsOf<Props>},
         .presets = PresetsOf(kPresets),
         .pads = {{"Default", {0, 1}, {4, 5}}, {"Choruses", {2, 3}, {4, 5}}, {"Flangers", {0, 1}, {2, 3}}},
+        .inputGuard = InputGuard::EveryFormat,
     };
     return table;
 }

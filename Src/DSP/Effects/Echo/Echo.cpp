@@ -67,6 +67,7 @@ const EffectTable& Table() {
         .pads = {{"Default", {0, 1}, {4, 5}}},
         .sections = {"Delays", "Output"},
         .sectionLabel = SectionLabel::WithoutSide,
+        .inputGuard = InputGuard::EveryFormat,
     };
     return table;
 }

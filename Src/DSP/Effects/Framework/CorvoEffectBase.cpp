@@ -4,9 +4,23 @@
 #include <numeric>
 
 #include "DSP/Effects/Framework/TailRecord.h"
+#include "DSP/Effects/Parameters/EffectTable.h"
 #include "Platform/DenormalGuard.h"
+#include "Platform/FiniteSamples.h"
 
 namespace Corvo::DSP {
+namespace {
+
+// Interleaved or one channel of a planar block. Effects pass channels after the second unchanged.
+void GuardInput(double* buffer, int frames, int channels, int bits) {
+    const int guarded = CorvoEffectBase::MaxNumChannels;
+    if (bits == 64)
+        ReplaceNonFinite(buffer, frames, channels, guarded);
+    else
+        ReplaceNonFinite(reinterpret_cast<float*>(buffer), frames, channels, guarded);
+}
+
+}  // namespace
 
 CorvoEffectBase::CorvoEffectBase() : m_tail(std::make_unique<TailRecord>()) {}
 CorvoEffectBase::~CorvoEffectBase() = default;
@@ -75,10 +89,18 @@ bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format)
     return true;
 }
 
+bool CorvoEffectBase::GuardsInput(const tWAVEFORMATEX& format) const {
+    const auto guard = m_table ? m_table->inputGuard : InputGuard::FloatFormats;
+    const bool knownWidth = format.wBitsPerSample == 32 || format.wBitsPerSample == 64;
+    return guard == InputGuard::EveryFormat || (guard == InputGuard::FloatFormats && knownWidth);
+}
+
 void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
-    ProcessInternal(buffer, m_tail->BeginBlock(frames), format, flags);
+    frames = m_tail->BeginBlock(frames);
+    if (GuardsInput(*format)) GuardInput(buffer, frames, format->nChannels, format->wBitsPerSample);
+    ProcessInternal(buffer, frames, format, flags);
     m_tail->EndBlock();
 }
 
@@ -86,7 +108,11 @@ void CorvoEffectBase::ProcessNoninterleaved(double* const* channels, int frames,
                                             ProcessFlags& flags) {
     const DenormalGuard guard;
     UpdateEnvelopes(flags);
-    ProcessInternalNoninterleaved(channels, m_tail->BeginBlock(frames), format, flags);
+    frames = m_tail->BeginBlock(frames);
+    if (GuardsInput(*format) && SupportsNoninterleaved())
+        for (int channel = 0; channel < std::min<int>(format->nChannels, MaxNumChannels); ++channel)
+            GuardInput(channels[channel], frames, 1, format->wBitsPerSample);
+    ProcessInternalNoninterleaved(channels, frames, format, flags);
     m_tail->EndBlock();
 }
 

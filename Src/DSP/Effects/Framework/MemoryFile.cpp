@@ -71,7 +71,8 @@ void CMemoryFile::Reserve(std::int64_t size) {
     void* grown = nullptr;
     if (capacity <= std::numeric_limits<std::int32_t>::max()) {
         grown = std::realloc(m_owns_data ? m_data : nullptr, static_cast<std::size_t>(capacity));
-        if (grown && !m_owns_data) std::memcpy(grown, m_data, static_cast<std::size_t>(m_capacity));
+        if (grown && m_capacity > 0 && !m_owns_data)
+            std::memcpy(grown, m_data, static_cast<std::size_t>(m_capacity));
     } else {
         errno = ENOMEM;
     }

@@ -104,6 +104,7 @@ const EffectTable& Table() {
         .chunk = {.words = kCount, .leadingWord = false},
         .caps = 0,
         .playsAutomation = false,
+        .inputGuard = InputGuard::None,  // nothing is remembered
     };
     return table;
 }

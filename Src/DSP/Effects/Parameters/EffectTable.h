@@ -75,6 +75,13 @@ enum class SectionLabel { None, Whole, WithoutSide };
 // The rows as records of the system, texts cut to the length of their fields.
 std::vector<MP_PARAMINFO> RecordsOf(std::span<const ParameterRow> rows, MP_CAPS caps);
 
+// Whose input has samples that are not finite replaced by 0 before processing sees them.
+enum class InputGuard {
+    FloatFormats,  // blocks of 32 and 64 bits
+    EveryFormat,   // all: the effect takes every width but 64 bits for float
+    None           // none: the effect remembers nothing, or guards what it keeps
+};
+
 // All that is constant about an effect. Made once, when the first instance is, and
 // there for the life of the library; the rows are static data of the effect.
 struct EffectTable {
@@ -89,6 +96,7 @@ struct EffectTable {
     SectionLabel sectionLabel = SectionLabel::Whole;
     MP_CAPS caps = 1;
     bool playsAutomation = true;
+    InputGuard inputGuard = InputGuard::FloatFormats;
     std::vector<MP_PARAMINFO> records = RecordsOf(rows, caps);
 
     const ParameterRow* Row(int real) const { return At(rows, real); }

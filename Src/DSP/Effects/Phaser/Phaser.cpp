@@ -61,6 +61,7 @@ const EffectTable& Table() {
         .chunk = {.words = kWordsOf<PhaserSettings>},
         .presets = PresetsOf(PhaserPresets::kPresets),
         .pads = {{"Default", {0}, {1}}},
+        .inputGuard = InputGuard::EveryFormat,
     };
     return table;
 }

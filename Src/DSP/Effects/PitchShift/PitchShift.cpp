@@ -73,7 +73,8 @@ const EffectTable& Table() {
             .icon = "BuiltinPlugins/PitchShift@3x.png",
             .rows = kRows,
             .chunk = {.words = kWordsOf<_transform_props>, .wideWords = kWordsOf<_transform_props>},
-            .sectionLabel = SectionLabel::None};
+            .sectionLabel = SectionLabel::None,
+            .inputGuard = InputGuard::None};  // the back-ends have their own
         for (const auto& preset : kPresets)
             made.presets.push_back({preset.name, WordsOf(SettingsOf(preset.pitch))});
         return made;

@@ -74,6 +74,7 @@ const EffectTable& Table() {
         .chunk = {.words = kWordsOf<Props>, .wideWords = kWordsOf<Props>},
         .presets = PresetsOf(AutovolPresets::kPresets),
         .pads = {{"Default", {0, 2}, {4, 6}}, {"Default", {1, 3}, {5, 7}}},  // a side each
+        .inputGuard = InputGuard::None,                                      // nothing is remembered
     };
     return table;
 }

@@ -94,12 +94,13 @@ EffectTable MakeTable() {
                       .icon = "BuiltinPlugins/valvex.png",
                       .rows = kRows,
                       .chunk = {.words = kRows.size()},
-                      .sectionLabel = SectionLabel::WithoutSide};
+                      .sectionLabel = SectionLabel::WithoutSide,
+                      .inputGuard = InputGuard::EveryFormat};
     for (const auto& preset : TubePresets::kPresets) {
         VirtualTubeAmp::Values values;
         for (std::size_t i = 0; i < values.size(); ++i) values[i] = preset.values[i / 2];
         table.presets.push_back({preset.name, WordsOf(values)});
-        table.padNames.emplace_back(TubePresets::kGroupNames[preset.group]);
+        table.padNames.emplace_back(TubePresets::kGroupNames[static_cast<std::size_t>(preset.group)]);
     }
     // Boost against drive, for each kind of preset.
     for (const auto* group : TubePresets::kGroupNames) table.pads.push_back({group, {0, 1}, {2, 3}});

@@ -152,8 +152,8 @@ TEST(CompressorEdit, ADrawnBendMovesAlong) {
     curve.MoveThreshold(-300);
     const std::pair<double, double> moved[] = {{-50, -50}, {-40, -43}, {-30, -38}, {0, -30.5}};
     for (const auto& [in, out] : moved) {
-        const auto* const point =
-            std::ranges::find_if(curve, [&](const auto& p) { return std::abs(Decibels(p.x) - in) < 1e-4; });
+        const auto* const point = std::ranges::find_if(
+            curve, [&, x = in](const auto& p) { return std::abs(Decibels(p.x) - x) < 1e-4; });
         ASSERT_NE(point, curve.end()) << in;
         EXPECT_NEAR(Decibels(point->y), out, 1e-3) << in;
     }

@@ -1,0 +1,76 @@
+#include "Platform/FiniteSamples.h"
+
+#include <immintrin.h>
+
+#include <cstdint>
+
+namespace Corvo {
+namespace {
+
+// A sample is not finite when all bits of its exponent are set. These stand in its upper 32-bit word, or in
+// its only one.
+template <typename Sample>
+struct Exponent {
+    static constexpr std::size_t kWords = sizeof(Sample) / 4;
+    static constexpr std::uint32_t kBits = kWords == 1 ? 0x7F800000u : 0x7FF00000u;
+    static constexpr int kUpperWords = kWords == 1 ? 0xFF : 0xAA;  // of a register
+};
+
+template <typename Sample>
+bool RestIsFinite(const Sample* samples, std::size_t count) {
+    bool finite = true;
+    for (std::size_t i = 0; i < count; ++i) finite &= std::isfinite(samples[i]);
+    return finite;
+}
+
+template <typename Sample>
+bool AllFiniteBaseline(const Sample* samples, std::size_t count) {
+    constexpr std::size_t kLanes = 16 / sizeof(Sample);
+    const __m128i bits = _mm_set1_epi32(static_cast<int>(Exponent<Sample>::kBits));
+    __m128i found = _mm_setzero_si128();
+    std::size_t i = 0;
+    for (; i + kLanes <= count; i += kLanes) {
+        const __m128i words = _mm_loadu_si128(reinterpret_cast<const __m128i*>(samples + i));
+        found = _mm_or_si128(found, _mm_cmpeq_epi32(_mm_and_si128(words, bits), bits));
+    }
+    return (_mm_movemask_ps(_mm_castsi128_ps(found)) & Exponent<Sample>::kUpperWords) == 0 &&
+           RestIsFinite(samples + i, count - i);
+}
+
+template <typename Sample>
+[[gnu::target("avx2")]] bool AllFiniteWide(const Sample* samples, std::size_t count) {
+    constexpr std::size_t kLanes = 32 / sizeof(Sample);
+    const auto* from = reinterpret_cast<const __m256i*>(samples);
+    // Doubled, a word has lost its sign, and the largest one says it all.
+    __m256i most[4] = {_mm256_setzero_si256(), _mm256_setzero_si256(), _mm256_setzero_si256(),
+                       _mm256_setzero_si256()};
+    std::size_t left = count;
+    for (; left >= 4 * kLanes; left -= 4 * kLanes, from += 4)
+        for (int k = 0; k < 4; ++k) {
+            const __m256i words = _mm256_loadu_si256(from + k);
+            most[k] = _mm256_max_epu32(most[k], _mm256_add_epi32(words, words));
+        }
+    for (; left >= kLanes; left -= kLanes, ++from) {
+        const __m256i words = _mm256_loadu_si256(from);
+        most[0] = _mm256_max_epu32(most[0], _mm256_add_epi32(words, words));
+    }
+    const __m256i top =
+        _mm256_max_epu32(_mm256_max_epu32(most[0], most[1]), _mm256_max_epu32(most[2], most[3]));
+    const __m256i bound = _mm256_set1_epi32(static_cast<int>(2 * Exponent<Sample>::kBits));
+    const __m256i reached = _mm256_cmpeq_epi32(_mm256_max_epu32(top, bound), top);
+    return (_mm256_movemask_ps(_mm256_castsi256_ps(reached)) & Exponent<Sample>::kUpperWords) == 0 &&
+           RestIsFinite(samples + (count - left), left);
+}
+
+const bool wide = __builtin_cpu_supports("avx2");
+
+}  // namespace
+
+bool AllFinite(const float* samples, std::size_t count) {
+    return wide ? AllFiniteWide(samples, count) : AllFiniteBaseline(samples, count);
+}
+bool AllFinite(const double* samples, std::size_t count) {
+    return wide ? AllFiniteWide(samples, count) : AllFiniteBaseline(samples, count);
+}
+
+}  // namespace Corvo

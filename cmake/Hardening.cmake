@@ -1,0 +1,11 @@
+# What makes a fault harder to exploit, in release builds; Scripts/hardening.sh reads it back from the binaries.
+set(dsp_hardening -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2 -fstack-protector-strong)
+if(WIN32)
+    # The guard itself linked in, so that the package needs no further DLL. Images that may be moved and data that
+    # is not executable are what this linker makes anyway.
+    string(APPEND CMAKE_CXX_STANDARD_LIBRARIES " -Wl,-Bstatic -lssp -Wl,-Bdynamic")
+else()
+    list(APPEND dsp_hardening -fcf-protection)
+    add_link_options($<$<CONFIG:Release>:LINKER:-z,relro,-z,now>)
+endif()
+add_compile_options("$<$<CONFIG:Release>:${dsp_hardening}>")
