@@ -99,7 +99,10 @@ try_other_compilers() {
         -DFUNCTIONS="$PWD/$build/Tests/C" > /dev/null
     cmake --build "$own"
     cp "$own/freestanding.exe" "$programs"
-    on_wine "$programs/freestanding.exe"
+    on_wine "$programs/freestanding.exe" || {
+        echo "freestanding.exe says that step $? failed"
+        return 1
+    }
     echo "a program of the other compiler family found every function and used some"
 }
 

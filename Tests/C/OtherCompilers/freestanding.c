@@ -10,6 +10,7 @@ static float g_samples[2 * kFrames];
 static dsp_effect* g_gain;
 static const void* volatile g_function;
 static double g_asked;
+static const dsp_format g_format = {sizeof(dsp_format), 48000, 2, DSP_F32, kFrames};
 
 /* The program only starts when the DLL has every function of the headers. */
 static void NeedAllFunctions(void) {
@@ -25,19 +26,20 @@ static void DSP_CALL Tempo(void* user, dsp_tempo* tempo) {
 
 static int CallsBack(void) {
     dsp_effect* echo = 0;
-    const int called = dsp_effect_create("Echo", &echo, 0) == DSP_OK &&
+    const int played = dsp_effect_create("Echo", &echo, 0) == DSP_OK &&
+                       dsp_effect_set_preset(echo, 1) == DSP_OK && /* its delay is in notes */
                        dsp_effect_tempo_callback(echo, Tempo, &g_asked) == DSP_OK &&
-                       dsp_effect_tempo_changed(echo) == DSP_OK;
-    return dsp_close(echo) == DSP_OK && called && g_asked > 0.0;
+                       dsp_effect_prepare(echo, &g_format, 0) == DSP_OK &&
+                       dsp_effect_process_f32(echo, g_samples, kFrames) == DSP_OK;
+    return dsp_close(echo) == DSP_OK && played && g_asked > 0.0;
 }
 
 static int Halves(void) {
-    const dsp_format format = {sizeof format, 48000, 2, DSP_F32, kFrames};
     float value = 0.0f;
     int32_t level = -1, i;
     if (dsp_effect_find_parameter(g_gain, "Gain", &level, 0) != DSP_OK ||
         dsp_effect_text_to_value(g_gain, level, "-6.0 dB", &value, 0) != DSP_OK ||
-        dsp_effect_set(g_gain, level, value) != DSP_OK || dsp_effect_prepare(g_gain, &format, 0) != DSP_OK)
+        dsp_effect_set(g_gain, level, value) != DSP_OK || dsp_effect_prepare(g_gain, &g_format, 0) != DSP_OK)
         return 0;
     for (i = 0; i < 2 * kFrames; ++i) g_samples[i] = 0.5f;
     if (dsp_effect_process_f32(g_gain, g_samples, kFrames) != DSP_OK) return 0;
