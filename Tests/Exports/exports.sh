@@ -25,7 +25,7 @@ mangled() {
 # Readable, the same on every target, sorted; the variants of a constructor or destructor fall together.
 names() {
     mangled "$1" | c++filt | sed -E '/^typeinfo name for /d
-        s/\bunsigned (int|long long|long)\b/size/g; s/\b(long long|long)\b/int/g; s/([0-9])ul?\b/\1/g
+        s/\bunsigned (int|long long|long)\b/size/g; s/\b(long long|long)\b/int/g; s/([0-9])ul{0,2}\b/\1/g
         s/\b_MP_ENVELOPE/MP_ENVELOPE/g' | LC_ALL=C sort -u
 }
 
