@@ -30,7 +30,7 @@ say "building ($target)"
 fresh=()
 if [ -f $build/CMakeCache.txt ] && ! grep -qF "$prefix/" $build/CMakeCache.txt; then fresh=(--fresh); fi
 cmake --preset "$target" "${fresh[@]}" > /dev/null
-cmake --build --preset "$target" --target DSPDll dsp_tests c_consumer record_effects dsphost
+cmake --build --preset "$target" --target DSPDll dsp_tests record_effects dsphost
 root_ready
 
 # Every part runs even when one before it failed, so that one run tells all.
@@ -60,29 +60,35 @@ compare_builds() {
     build/release/bin/record_effects build/release/native.takes $build/bin/windows.takes
 }
 
+package=$build/package/DSPDll programs=$build/package/DSPDll/bin
 unpack() {
-    unpacked=$build/package/unpacked
     cpack --config $build/CPackConfig.cmake -B $build/package > /dev/null
-    rm -rf "$unpacked"
-    unzip -q $build/package/DSPDll-*-"$target".zip -d "$unpacked"
-    unpacked=$(echo "$unpacked"/*)
-    programs=$unpacked/bin
+    rm -rf $package
+    unzip -q $build/package/DSPDll-*-$target.zip -d $package
+    mv $package/*/* $package  # out of the folder that has the version in its name
 }
 
 # From the unpacked zip alone the host renders a file to the same bytes as the native one.
 try_package() {
     unpack
-    ls "$programs"
+    ls $programs
     build_preset release dsphost
     local render=(render -q -y --fx "Gain: Gain=-3") host=build/release/bin/dsphost
-    "$host" render -q -y --fx Gain --format f32 /usr/share/sonic-pi/samples/loop_amen.flac "$programs/loop.wav"
-    "$host" "${render[@]}" "$programs/loop.wav" "$unpacked/here.wav"
-    on_wine "$programs/dsphost.exe" "${render[@]}" loop.wav there.wav
-    cmp "$unpacked/here.wav" "$programs/there.wav"
-    echo "dsphost.exe rendered the same $(stat -c %s "$unpacked/here.wav") bytes as the native host"
-    on_wine "$programs/dsphost.exe" sonogram -q -y loop.wav picture.png --spectrum
-    cmp -n 8 "$programs/picture.png" <(printf '\x89PNG\r\n\x1a\n')
-    echo "dsphost.exe drew a picture of $(stat -c %s "$programs/picture.png") bytes"
+    "$host" render -q -y --fx Gain --format f32 /usr/share/sonic-pi/samples/loop_amen.flac $programs/loop.wav
+    "$host" "${render[@]}" $programs/loop.wav $package/here.wav
+    on_wine $programs/dsphost.exe "${render[@]}" loop.wav there.wav
+    cmp $package/here.wav $programs/there.wav
+    echo "dsphost.exe rendered the same $(stat -c %s $package/here.wav) bytes as the native host"
+    on_wine $programs/dsphost.exe sonogram -q -y loop.wav picture.png --spectrum
+    cmp -n 8 $programs/picture.png <(printf '\x89PNG\r\n\x1a\n')
+    echo "dsphost.exe drew a picture of $(stat -c %s $programs/picture.png) bytes"
+}
+
+# A host in C with nothing but the package, which needs none of the flags that hosts in C++ need.
+try_c_interface() {
+    "$processor-w64-mingw32-gcc-posix" -std=c11 -Wall -Wextra -Werror -DDSP_TEST_DRAWS -I $package/include/DSPDll \
+        Tests/C/consumer.c $package/lib/DSPDll.lib -o $programs/consumer.exe
+    on_wine $programs/consumer.exe
 }
 
 # The other compiler family: its compiler takes the package's headers, its linker the import library. It has no C
@@ -90,16 +96,15 @@ try_package() {
 try_other_compilers() {
     local own=$build/other-compilers
     rm -rf "$own"
-    unpack
     cmake -G Ninja -S Tests/C/OtherCompilers -B "$own" -DCMAKE_BUILD_TYPE=Release -DCMAKE_SYSTEM_NAME=Windows \
         -DCMAKE_C_COMPILER=clang -DCMAKE_CXX_COMPILER=clang++ -DCMAKE_TRY_COMPILE_TARGET_TYPE=STATIC_LIBRARY \
         -DCMAKE_{C,CXX}_COMPILER_TARGET=$processor-pc-windows-msvc -DCMAKE_MSVC_RUNTIME_LIBRARY= \
         -DCMAKE_{C,CXX}_STANDARD_LIBRARIES= -DCMAKE_{C,CXX}_FLAGS="-ffreestanding -Wall -Wextra -Wpedantic -Werror" \
-        -DCMAKE_C_STANDARD=11 -DCMAKE_CXX_STANDARD=11 -DCMAKE_PREFIX_PATH="$PWD/$unpacked" \
+        -DCMAKE_C_STANDARD=11 -DCMAKE_CXX_STANDARD=11 -DCMAKE_PREFIX_PATH="$PWD/$package" \
         -DFUNCTIONS="$PWD/$build/Tests/C" > /dev/null
     cmake --build "$own"
-    cp "$own/freestanding.exe" "$programs"
-    on_wine "$programs/freestanding.exe" || {
+    cp "$own/freestanding.exe" $programs
+    on_wine $programs/freestanding.exe || {
         echo "freestanding.exe says that step $? failed"
         return 1
     }
@@ -107,11 +112,11 @@ try_other_compilers() {
 }
 
 part "tests under Wine" test_program dsp_tests
-part "the C interface" on_wine $build/bin/c_consumer.exe
 part "hardening" Tests/Package/hardening.sh $build/bin/{DSPDll.dll,dsphost.exe}
 part "exported names" Tests/Exports/exports.sh check $build/bin/DSPDll.dll
 part "the native build and this one" compare_builds
 part "package" try_package
+part "C interface" try_c_interface
 part "other compilers" try_other_compilers
 
 [ ${#failed[@]} = 0 ] || {
