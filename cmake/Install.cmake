@@ -12,7 +12,8 @@ install(TARGETS DSPDll ${dsp_drawing} EXPORT DSPDllTargets
 set(DSP_PACKAGE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/DSPDll)
 install(EXPORT DSPDllTargets NAMESPACE DSPDll:: DESTINATION ${DSP_PACKAGE_DIR})
 configure_package_config_file(cmake/DSPDllConfig.cmake.in DSPDllConfig.cmake
-    INSTALL_DESTINATION ${DSP_PACKAGE_DIR})
+    INSTALL_DESTINATION ${DSP_PACKAGE_DIR}
+    PATH_VARS CMAKE_INSTALL_BINDIR CMAKE_INSTALL_LIBDIR CMAKE_INSTALL_INCLUDEDIR)
 write_basic_package_version_file(DSPDllConfigVersion.cmake COMPATIBILITY SameMajorVersion)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/DSPDllConfig.cmake ${CMAKE_CURRENT_BINARY_DIR}/DSPDllConfigVersion.cmake
     DESTINATION ${DSP_PACKAGE_DIR})

@@ -4,6 +4,8 @@
 #include "C/dspdrawing.h"
 
 #if defined(_WIN32)
+#include <algorithm>
+
 #include "Drawing/Backends/DrawingGdiPlus.h"
 // GdiPlusHeader.h is not for hosts, and gdiplus.h needs these names.
 #include "Platform/WindowsHeader.h"

@@ -9,14 +9,14 @@
 #                              which a member came, went, or changed its name or its parameters
 #   exports.sh names LIBRARY   what is counted, a line each: two of these show what changed
 #   exports.sh update          builds the native libraries and rewrites the numbers of the rows, with those of
-#                              the Windows DLL where it stands in build/win32
+#                              a Windows DLL where one stands in build/win32 or build/win64
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
 rows=$here/exports.txt
 
 mangled() {
     case $1 in
-        *.dll) i686-w64-mingw32-objdump -p "$1" |
+        *.dll) objdump -p "$1" |
             awk '/Ordinal\/Name Pointer/ { on = 1; next } on && /^[ \t]*\[/ { print $NF; next } { on = 0 }' ;;
         *) nm -D --defined-only "$1" | awk '{ print $NF }' ;;
     esac
@@ -25,7 +25,7 @@ mangled() {
 # Readable, the same on every target, sorted; the variants of a constructor or destructor fall together.
 names() {
     mangled "$1" | c++filt | sed -E '/^typeinfo name for /d
-        s/\bunsigned (int|long long|long)\b/size/g; s/\b(long long|long)\b/int/g; s/([0-9])ul?\b/\1/g
+        s/\bunsigned (int|long long|long)\b/size/g; s/\b(long long|long)\b/int/g; s/([0-9])ul{0,2}\b/\1/g
         s/\b_MP_ENVELOPE/MP_ENVELOPE/g' | LC_ALL=C sort -u
 }
 
@@ -102,7 +102,7 @@ update() {
     cd "$here/../.."
     cmake --preset release > /dev/null
     cmake --build --preset release --target DSPDll DSPDrawing
-    for library in build/win32/bin/DSPDll.dll build/release/bin/lib{DSPDll,DSPDrawing}.so; do
+    for library in build/win{32,64}/bin/DSPDll.dll build/release/bin/lib{DSPDll,DSPDrawing}.so; do
         [ ! -e "$library" ] || rewrite "$library"
     done
     git --no-pager diff --stat -- "$here"

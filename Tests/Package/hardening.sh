@@ -29,8 +29,8 @@ check_elf() {
 
 check_pe() {
     local headers
-    headers=$(i686-w64-mingw32-objdump -p "$file")
-    need "no stack protector (-fstack-protector-strong)" ' ___stack_chk_fail$' "$(i686-w64-mingw32-nm "$file")"
+    headers=$(objdump -p "$file")
+    need "no stack protector (-fstack-protector-strong)" ' _{2,3}stack_chk_fail$' "$(nm "$file")"
     need "it cannot be moved in memory" DYNAMIC_BASE "$headers"
     need "its data is executable" NX_COMPAT "$headers"
     need_no "it needs a libssp beside it" 'DLL Name: libssp' "$headers"

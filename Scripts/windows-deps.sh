@@ -1,10 +1,11 @@
 #!/usr/bin/env bash
+# windows-deps.sh win32|win64
 # Builds the libraries the Windows target needs into a cached prefix, once, and prints where it is:
 # GoogleTest, SoundTouch and libsndfile from Debian's sources, the header-only ones linked from the system.
-# The prefix is named after the checksum of this script and the toolchain file, which finds it by that.
-source "$(dirname "$0")/win32-common.sh"
+# The prefix is named after the checksum of this script and the toolchain files, which find it by that.
+source "$(dirname "$0")/windows-common.sh"
 
-prefix=$(place_of prefix "$0" "$tree/cmake/win32-toolchain.cmake")
+prefix=$(place_of prefix "$0" "$tree"/cmake/{windows,$target}-toolchain.cmake)
 exec 8> "$cache/prefix.lock"
 flock 8
 if [ -d "$prefix" ]; then
@@ -13,7 +14,7 @@ if [ -d "$prefix" ]; then
     exit
 fi
 
-need_win32_packages
+need_windows_packages
 work=$(mktemp -d "$cache/deps.XXXXXX")
 part=$(mktemp -d "$cache/prefix.part.XXXXXX")
 trap 'rm -rf "$work" "$part"' EXIT
@@ -36,7 +37,7 @@ build() {
     local source=$1
     shift
     cmake -G Ninja -S "$source" -B "$source.build" -DCMAKE_BUILD_TYPE=Release \
-        -DCMAKE_TOOLCHAIN_FILE="$tree/cmake/win32-toolchain.cmake" -DDSP_WIN32_MAKING_PREFIX=ON \
+        -DCMAKE_TOOLCHAIN_FILE="$tree/cmake/$target-toolchain.cmake" -DDSP_MAKING_PREFIX=ON \
         -DCMAKE_INSTALL_PREFIX="$part" "$@"
     cmake --build "$source.build" --target install
 }
@@ -92,7 +93,7 @@ logged fetch_sources soundtouch libsndfile
 logged build_all
 if [ $status != 0 ]; then
     grep -iE 'error|cannot' "$log" | tail -n 20 >&2
-    echo "win32: a library for the target did not build; the whole log is $log" >&2
+    echo "$target: a library for the target did not build; the whole log is $log" >&2
     exit 1
 fi
 
