@@ -104,7 +104,7 @@ void RunConvert(ConvertArguments arguments) {
         converter.emplace(settings);
     }
     std::int64_t clipped = 0, read = 0;
-    const int most = converter->MostFrames(kBlock);
+    const auto most = static_cast<int>(converter->MostFrames(kBlock));
     std::vector<double> samples(kBlock * channels), converted(static_cast<std::size_t>(most) * channels);
     const auto write = [&](int frames) {
         const auto written = std::span(converted).first(static_cast<std::size_t>(frames) * channels);

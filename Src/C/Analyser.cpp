@@ -7,6 +7,7 @@
 
 #include "C/AnalyserHandle.h"
 #include "C/Calls.h"
+#include "Picture/DrawingBitmap.h"
 #include "Spectrum/AnalyserMenu.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/Scales/PowerToDecibels.h"
@@ -206,7 +207,9 @@ dsp_status DSP_CALL dsp_note_name(int32_t note, char* buffer, size_t size, size_
 
 dsp_status DSP_CALL dsp_sonogram_resize(dsp_analyser* analyser, int32_t width, int32_t height) {
     return WithAnalyser(analyser, [&](kivspectrum& a) -> dsp_status {
-        if (!Within(width, 1, kLargestSide) || !Within(height, 1, kLargestSide)) return DSP_OUT_OF_RANGE;
+        if (!Within(width, 1, kLargestSide) || !Within(height, 1, kLargestSide) ||
+            static_cast<std::int64_t>(width) * height > Corvo::DrawingBitmap::kMostPixels)
+            return DSP_OUT_OF_RANGE;
         a.GetSonogram()->CheckPixelBufferSize(
             {0.0f, 0.0f, static_cast<float>(width), static_cast<float>(height)}, height);
         return DSP_OK;

@@ -126,22 +126,40 @@ dsp_status Give(T value, std::type_identity_t<T>* to) {
     return DSP_OK;
 }
 
-// A caller's record as this version knows it: what lies behind the caller's size is 0. The first version of
-// every record is the present one.
+// Records may grow at their ends. How long each was at first is fixed here; a caller's record is at least as
+// long.
 template <typename Record>
-Record Taken(const Record* record, const char* name) {
+constexpr std::size_t kFirstSize = 0;
+template <>
+inline constexpr std::size_t kFirstSize<dsp_format> = 20;
+template <>
+inline constexpr std::size_t kFirstSize<dsp_parameter> = 16;
+template <>
+inline constexpr std::size_t kFirstSize<dsp_band> = 32;
+template <>
+inline constexpr std::size_t kFirstSize<dsp_conversion> = 32;
+template <>
+inline constexpr std::size_t kFirstSize<dsp_shift> = 40;
+template <>
+inline constexpr std::size_t kFirstSize<dsp_tuner_reading> = 48;
+
+// A caller's record as this version knows it; members behind the caller's size are 0.
+template <typename Record>
+Record Taken(const Record* record, const char* name, std::size_t firstSize = kFirstSize<Record>) {
     if (!record) throw Refusal{DSP_NULL, std::string(name) + " is null"};
-    if (record->size < sizeof(Record))
-        throw Refusal{DSP_BAD_RECORD, std::string(name) + ": its size was not set"};
-    return *record;
+    if (record->size < firstSize) throw Refusal{DSP_BAD_RECORD, std::string(name) + ": its size was not set"};
+    Record taken{};
+    std::memcpy(&taken, record, std::min<std::size_t>(record->size, sizeof taken));
+    return taken;
 }
 
+// As much of it as the caller's record has room for.
 template <typename Record>
 dsp_status GiveRecord(Record value, Record* to) {
     if (!to) return DSP_NULL;
-    if (to->size < sizeof(Record)) return DSP_BAD_RECORD;
+    if (to->size < kFirstSize<Record>) return DSP_BAD_RECORD;
     value.size = to->size;
-    *to = value;
+    std::memcpy(to, &value, std::min<std::size_t>(to->size, sizeof value));
     return DSP_OK;
 }
 

@@ -1,5 +1,8 @@
+#include <cmath>
 #include <cstdint>
 #include <memory>
+#include <string>
+#include <utility>
 
 #include "C/Calls.h"
 #include "DSP/Pitch/OfflinePitchShift.h"
@@ -12,10 +15,13 @@ namespace {
 using namespace Corvo::C;
 using Corvo::DSP::OfflinePitchShift;
 
+constexpr double kMostCents = 20.0;  // a listener begins to notice
+
 struct Converter : Object {
     static constexpr Kind kKind = Kind::Converter;
     explicit Converter(const AlignedConverter::Settings& settings) : Object(kKind), converter(settings) {}
     AlignedConverter converter;
+    bool finished = false;
 };
 
 struct PitchShift : Object {
@@ -52,7 +58,13 @@ static_assert(static_cast<int>(OfflinePitchShift::Engine::New) == DSP_ENGINE_NEW
 dsp_status DSP_CALL dsp_converter_create(const dsp_conversion* conversion, dsp_converter** converter,
                                          dsp_error* error) {
     return Create(converter, error, [conversion] {
-        return std::make_unique<Converter>(Settings(Taken(conversion, "the conversion")));
+        const dsp_conversion wanted = Taken(conversion, "the conversion");
+        auto made = std::make_unique<Converter>(Settings(wanted));
+        const double factor = static_cast<double>(made->converter.Up()) / made->converter.Down();
+        const double cents = 1200.0 * std::log2(factor * wanted.in_rate / wanted.out_rate);
+        Require(std::abs(cents) <= kMostCents, "factors up to 49 miss the rate by " +
+                                                   std::to_string(std::lround(std::abs(cents))) + " cents");
+        return made;
     });
 }
 
@@ -62,7 +74,7 @@ dsp_status DSP_CALL dsp_converter_frames(dsp_converter* converter, int64_t in_fr
         // Factors are below 2^23.
         if (!Within(in_frames, 0, INT64_MAX >> 25)) return DSP_OUT_OF_RANGE;
         if (out_frames) *out_frames = c.converter.FramesOut(in_frames);
-        if (most_of_a_block) *most_of_a_block = in_frames * c.converter.Up() / c.converter.Down() + 1;
+        if (most_of_a_block) *most_of_a_block = c.converter.MostFrames(in_frames);
         return DSP_OK;
     });
 }
@@ -72,6 +84,7 @@ dsp_status DSP_CALL dsp_converter_process(dsp_converter* converter, const void* 
     return With<Converter>(converter, [&](Converter& c) -> dsp_status {
         if (!written || (frames > 0 && (!in || !out))) return DSP_NULL;
         if (frames < 0) return DSP_OUT_OF_RANGE;
+        if (c.finished) return DSP_UNPREPARED;
         if (frames > 0 && capacity < c.converter.MostFrames(frames)) return DSP_TOO_SMALL;
         return Give(c.converter.Convert(in, frames, out), written);
     });
@@ -82,6 +95,7 @@ dsp_status DSP_CALL dsp_converter_finish(dsp_converter* converter, void* out, in
     return With<Converter>(converter, [&](Converter& c) -> dsp_status {
         if (!written || !out) return DSP_NULL;
         if (capacity < c.converter.MostFrames(1)) return DSP_TOO_SMALL;
+        c.finished = true;
         return Give(c.converter.Finish(out, capacity), written);
     });
 }
@@ -104,8 +118,7 @@ dsp_status DSP_CALL dsp_pitch_shift_feed(dsp_pitch_shift* pitch_shift, const flo
 
 dsp_status DSP_CALL dsp_pitch_shift_finish(dsp_pitch_shift* pitch_shift) {
     return With<PitchShift>(pitch_shift, [](PitchShift& p) {
-        if (!p.finished) p.shift.Finish();
-        p.finished = true;
+        if (!std::exchange(p.finished, true)) p.shift.Finish();
     });
 }
 

@@ -1,4 +1,5 @@
 #include <cmath>
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -23,7 +24,8 @@ struct Drawing : Object {
 };
 
 dsp_picture Checked(const dsp_picture* picture) {
-    const dsp_picture p = Taken(picture, "the picture");
+    const dsp_picture p =
+        Taken(picture, "the picture", offsetof(dsp_picture, reserved) + sizeof picture->reserved);
     Require(p.pixels, "the picture's pixels are null", DSP_NULL);
     Require(Within(p.width, 1, kLargestSide) && Within(p.height, 1, kLargestSide),
             "a picture's sides can be 1 to 16384 pixels");

@@ -19,8 +19,7 @@ dsp_status Processed(dsp_effect* effect, Samples samples, int frames, Process pr
         if (!stream.IsPrepared() || stream.Bits() != 8 * static_cast<int>(sizeof(Sample)))
             return DSP_UNPREPARED;
         if (frames < 0) return DSP_OUT_OF_RANGE;
-        if (frames == 0) return DSP_OK;
-        if (!samples) return DSP_NULL;
+        if (frames > 0 && !samples) return DSP_NULL;
         return process(stream);
     });
 }
@@ -28,7 +27,7 @@ dsp_status Processed(dsp_effect* effect, Samples samples, int frames, Process pr
 template <typename Sample>
 dsp_status ProcessedPlanar(dsp_effect* effect, Sample* const* channels, int frames) {
     return Processed<Sample>(effect, channels, frames, [&](EffectStream& stream) -> dsp_status {
-        for (int c = 0; c < stream.Channels(); ++c)
+        for (int c = 0; frames > 0 && c < stream.Channels(); ++c)
             if (!channels[c]) return DSP_NULL;
         stream.ProcessPlanar(channels, frames);
         return DSP_OK;
@@ -41,6 +40,7 @@ dsp_status GiveSidechain(dsp_effect* effect, int32_t bus, const Sample* const* c
         if (!stream.IsPrepared() || stream.Bits() != 8 * static_cast<int>(sizeof(Sample)))
             return DSP_UNPREPARED;
         if (!Within(bus, 0, stream.Busses() - 1)) return DSP_OUT_OF_RANGE;
+        if (channels && stream.SidechainChannels(bus) == 0) return DSP_UNPREPARED;
         for (int c = 0; channels && c < stream.SidechainChannels(bus); ++c)
             if (!channels[c]) return DSP_NULL;
         stream.SetSidechain(bus, reinterpret_cast<const void* const*>(channels));
@@ -119,7 +119,11 @@ dsp_status DSP_CALL dsp_effect_latency(dsp_effect* effect, int32_t* frames) {
 }
 
 dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position) {
-    return With<EffectStream>(effect, [position](EffectStream& stream) { stream.Seek(position); });
+    return With<EffectStream>(effect, [position](EffectStream& stream) -> dsp_status {
+        if (!Within(position, 0, EffectStream::kLastFrame)) return DSP_OUT_OF_RANGE;
+        stream.Seek(position);
+        return DSP_OK;
+    });
 }
 
 dsp_status DSP_CALL dsp_effect_start_tail(dsp_effect* effect, int64_t max_frames) {
@@ -128,7 +132,7 @@ dsp_status DSP_CALL dsp_effect_start_tail(dsp_effect* effect, int64_t max_frames
 dsp_status DSP_CALL dsp_effect_tail(dsp_effect* effect, int32_t* frames, int32_t* finished) {
     return With<EffectStream>(effect, [&](EffectStream& stream) -> dsp_status {
         if (!frames || !finished) return DSP_NULL;
-        *frames = stream.effect->TailFramesProduced();
+        *frames = stream.TailFrames();
         *finished = stream.effect->TailFinished();
         return DSP_OK;
     });

@@ -16,10 +16,11 @@ using namespace Corvo::C;
 using Corvo::DSP::CorvoEffectBase;
 
 // The library's texts are plain ASCII, which is UTF-8.
-std::string Narrow(const std::wstring& text) {
+std::string Trimmed(const std::wstring& text) {
     std::string narrow;
     for (const wchar_t letter : text) narrow += static_cast<char>(letter);
-    return narrow;
+    narrow.erase(narrow.find_last_not_of(' ') + 1);
+    return narrow.erase(0, narrow.find_first_not_of(' '));
 }
 
 // With a parameter that the effect has; call(CorvoEffectBase&).
@@ -27,8 +28,9 @@ template <typename Call>
 dsp_status WithParameter(dsp_effect* effect, int32_t parameter, dsp_error* error, Call call) {
     return With<EffectStream>(effect, error, [&](EffectStream& stream) -> dsp_status {
         const int count = stream.effect->GetParamCount();
-        Require(Within(parameter, 0, count - 1), "there is no parameter " + std::to_string(parameter) +
-                                                     "; there are " + std::to_string(count));
+        if (!Within(parameter, 0, count - 1))
+            throw Refusal{DSP_OUT_OF_RANGE, "there is no parameter " + std::to_string(parameter) +
+                                                "; there are " + std::to_string(count)};
         return call(*stream.effect);
     });
 }
@@ -67,7 +69,7 @@ dsp_status DSP_CALL dsp_effect_parameter_text(dsp_effect* effect, int32_t parame
             case DSP_TEXT_UNIT:
                 return give(fx.Describe(parameter).unit);
             case DSP_TEXT_VALUE:
-                return give(Narrow(
+                return give(Trimmed(
                     fx.GetParameterFormattedText(parameter, static_cast<double>(fx.GetParam(parameter)))));
             default:
                 return DSP_OUT_OF_RANGE;
@@ -142,6 +144,8 @@ dsp_status DSP_CALL dsp_effect_automate(dsp_effect* effect, int32_t parameter, c
         if (!stream.effect->PlaysAutomation()) return DSP_UNSUPPORTED;
         for (std::size_t i = 0; i < count; ++i) {
             const bool ascends = i == 0 || points[i].frame >= points[i - 1].frame;
+            if (!Within(points[i].frame, -EffectStream::kLastFrame, EffectStream::kLastFrame))
+                return DSP_OUT_OF_RANGE;
             if (!ascends || !(points[i].value >= 0.0f && points[i].value <= 1.0f)) return DSP_OUT_OF_RANGE;
         }
         stream.Automate(parameter, {points, count});

@@ -1,6 +1,8 @@
 #include "C/EffectStream.h"
 
 #include <algorithm>
+#include <new>
+#include <utility>
 
 namespace Corvo::C {
 
@@ -29,12 +31,20 @@ void EffectStream::Prepare(const tWAVEFORMATEX& format, int maxFrames) {
     m_scratch.assign(effect->SupportsNoninterleaved() ? 0 : samples, 0.0);
     m_format = format;
     m_maxFrames = maxFrames;
-    Restart();
+    try {
+        Restart();
+    } catch (const std::bad_alloc&) {
+        m_maxFrames = 0;
+        throw;
+    }
 }
 
 void EffectStream::Restart() {
     effect->Cleanup();
     effect->InitProcessing(m_maxFrames, &m_format);
+    if (!effect->IsPrepared()) throw std::bad_alloc();
+    std::ranges::fill(m_sidechain, Pointers{});
+    m_tailFrames = 0;
     Seek(0);
 }
 
@@ -48,8 +58,10 @@ void EffectStream::Seek(std::int64_t position) {
 }
 
 void EffectStream::Automate(int parameter, std::span<const dsp_point> points) {
-    std::erase_if(m_lanes, [parameter](const Lane& lane) { return lane.parameter == parameter; });
-    if (!points.empty()) m_lanes.push_back({parameter, {points.begin(), points.end()}, 0});
+    m_lanes.reserve(m_lanes.size() + 1);
+    Lane lane{parameter, {points.begin(), points.end()}, 0};
+    std::erase_if(m_lanes, [parameter](const Lane& other) { return other.parameter == parameter; });
+    if (!points.empty()) m_lanes.push_back(std::move(lane));
     Seek(m_position);
 }
 
@@ -100,11 +112,13 @@ int EffectStream::PieceFrames(int left) const {
 // process(first frame, frames) for every piece of the block.
 template <typename ProcessPiece>
 void EffectStream::Cut(int frames, ProcessPiece process) {
+    m_tailFrames = 0;
     for (int done = 0; done < frames;) {
         PlayDue();
         const int piece = PieceFrames(frames - done);
         HandOverSidechain(done);
         process(done, piece);
+        m_tailFrames += effect->TailFramesProduced();
         done += piece;
         m_position += piece;
     }

@@ -39,12 +39,14 @@ public:
 
     // Announces the format and the longest piece.
     void Prepare(const tWAVEFORMATEX& format, int maxFrames);
-    // Starts anew, as prepared.
+    // Starts anew, as prepared. Both throw std::bad_alloc, and are not prepared then.
     void Restart();
     bool IsPrepared() const { return m_maxFrames > 0; }
     int Bits() const { return m_format.wBitsPerSample; }
     int Channels() const { return m_format.nChannels; }
 
+    // Positions, and those of points, stay far from where 64 bits end.
+    static constexpr std::int64_t kLastFrame = std::int64_t{1} << 62;
     void Seek(std::int64_t position);
     // Replaces the automation of an external parameter.
     void Automate(int parameter, std::span<const dsp_point> points);
@@ -54,6 +56,9 @@ public:
     int SidechainChannels(int bus) const { return m_announced[static_cast<std::size_t>(bus)]; }
     // Planar, for the next block only; null for none.
     void SetSidechain(int bus, const void* const* channels);
+
+    // Of the last block, all its pieces together.
+    int TailFrames() const { return m_tailFrames; }
 
     template <typename Sample>
     void Process(Sample* samples, int frames);
@@ -82,6 +87,7 @@ private:
     tWAVEFORMATEX m_format{};
     int m_maxFrames = 0;  // 0 before the first preparation
     std::int64_t m_position = 0;
+    int m_tailFrames = 0;
     std::vector<Lane> m_lanes;
     std::vector<int> m_announced;       // channels by side-chain bus
     std::vector<Pointers> m_sidechain;  // of the next block

@@ -25,15 +25,15 @@ public:
     Equaliser() : Object(kKind) { m_records[0].SetNumBands(0); }
 
     void SetBands(const std::vector<_eq_data>& bands) {
-        const int before = m_records[0].GetNumBands();
+        const auto before = static_cast<std::size_t>(m_records[0].GetNumBands());
         for (auto& record : m_records) {
-            record.SetNumBands(static_cast<int>(bands.size()));
             std::ranges::copy(bands, record.bands.begin());
-            // A band that is no longer there is flat, so that it fades from what it was.
-            for (std::size_t i = bands.size(); i < static_cast<std::size_t>(std::max(before, 0)); ++i)
-                record.bands[i].boost = 0;
+            for (std::size_t i = bands.size(); i < before; ++i) record.bands[i].boost = 0;
+            record.SetNumBands(static_cast<int>(std::max(before, bands.size())));
         }
+        // Bands that are gone are cooked once more, as flat ones: they forget their sound.
         if (IsPrepared()) Cook(true);
+        for (auto& record : m_records) record.SetNumBands(static_cast<int>(bands.size()));
     }
     void Prepare(const tWAVEFORMATEX& format) {
         m_format = format;
@@ -96,12 +96,13 @@ dsp_status DSP_CALL dsp_equaliser_set_bands(dsp_equaliser* equaliser, const dsp_
     return With<Equaliser>(equaliser, error, [&](Equaliser& eq) {
         Require(Within(count, 0, builtin_effects_data::kMaxBands), "there can be 0 to 20 bands");
         std::vector<_eq_data> all;
-        // The caller's records may be longer than ours, so the next one is where the first says.
         const auto* at = reinterpret_cast<const char*>(bands);
         for (int i = 0; i < count; ++i) {
             const auto* const band = reinterpret_cast<const dsp_band*>(at);
             all.push_back(Band(Taken(band, "a band")));
-            at += bands->size;
+            Require(band->size == bands->size && band->size % alignof(dsp_band) == 0,
+                    "all bands must have the same size", DSP_BAD_RECORD);
+            at += band->size;
         }
         eq.SetBands(all);
     });

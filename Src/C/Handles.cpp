@@ -16,6 +16,9 @@ struct Place {
 };
 
 constexpr std::uintptr_t kPageBits = 8, kIndexBits = 16;
+// So many free places rest before one is used again, which keeps the numbers of 32-bit handles from coming
+// back soon.
+constexpr std::size_t kRested = 4096;
 constexpr std::uintptr_t kPageSize = 1u << kPageBits, kPages = 1u << (kIndexBits - kPageBits);
 using Page = std::array<Place, kPageSize>;
 
@@ -65,7 +68,7 @@ void* OpenHandle(std::unique_ptr<Object> object) {
     const std::lock_guard guard(table.lock);
     std::uintptr_t index = table.made;
     Place* place = nullptr;
-    if (!table.free.empty()) {
+    if (table.free.size() > kRested || (table.made == kPages * kPageSize && !table.free.empty())) {
         index = table.free.front();
         table.free.pop_front();
         place = table.At(index);

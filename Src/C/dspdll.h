@@ -1,8 +1,8 @@
 /* The library for every language that can call C: effects, equaliser, conversion, pitch shift, transform,
  * analyser, tuner, sonogram. C11, and C++11 and later.
  *
- * Handles. What is created is known by a handle; dsp_close ends it. A handle that is null, was closed, or is
- * of another kind gets a status, never a crash. Nothing is closed while another thread uses it.
+ * Handles. What is created is known by a handle; dsp_close ends it, on any thread, while no other uses it. A
+ * handle that is null, was closed, or is of another kind gets a status, never a crash.
  *
  * Errors. Every function that can fail returns a dsp_status. Where a sentence says more than the status, the
  * function takes a dsp_error, which may be null; it is written on failure only. A function that failed has
@@ -14,8 +14,9 @@
  * DSP_TOO_SMALL. Arrays are given the same way, counted in elements, but are left alone where they do not
  * fit.
  *
- * Records begin with their own size, which the caller sets: dsp_format format = {sizeof format}. Members that
- * are left at 0 are meant as they say. Later versions may add members behind the last one.
+ * Records begin with their own size, which the caller sets: dsp_format format = {sizeof format}. Later
+ * versions may add members at the end, which count as 0 for a caller that does not know them; members that
+ * this version does not know are not read. An array of records steps by the first one's size.
  *
  * Threads. An object is used by one thread at a time, but for what the sections below say. Functions for the
  * audio thread neither allocate nor wait once their object is prepared. */
@@ -63,7 +64,7 @@ enum {
 };
 
 typedef struct dsp_error {
-    uint32_t size;
+    uint32_t size;  /* 0 gets no text */
     char text[508]; /* a sentence */
 } dsp_error;
 
@@ -90,8 +91,9 @@ typedef struct dsp_format {
 /* ---- Effects ----
  *
  * Create, set up, prepare, then process block by block; prepare again when the format changes. Processing,
- * seek, side-chain, tail and the position belong to the audio thread. Parameters, presets, state and what is
- * read of them belong to one other thread, at the same time; preparing, resetting and automating stop both.
+ * seek, the side-chain's samples, the tail and its gap belong to the audio thread. Parameters, presets,
+ * state, texts, latency and tempo_changed belong to one other thread, at the same time. Prepare, reset,
+ * automate, the tempo callback and the side-chain's channels are called while neither thread uses the effect.
  */
 
 typedef struct dsp_effect dsp_effect;
@@ -102,7 +104,7 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_kind_name(int32_t kind, char* buffer, s
 DSP_C_API dsp_status DSP_CALL dsp_effect_create(const char* name, dsp_effect** effect, dsp_error* error);
 DSP_C_API dsp_status DSP_CALL dsp_effect_name(dsp_effect* effect, char* buffer, size_t size, size_t* needed);
 
-/* Makes all memory and starts the stream at position 0. */
+/* Makes all memory and starts the stream at position 0. After a failure the effect is not prepared. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_prepare(dsp_effect* effect, const dsp_format* format,
                                                  dsp_error* error);
 /* Forgets the sound and starts the stream anew, prepared as before. */
@@ -117,13 +119,14 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_process_planar_f64(dsp_effect* effect, 
                                                             int32_t frames);
 /* How many frames the output is later than the input, at the prepared format; may change with parameters. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_latency(dsp_effect* effect, int32_t* frames);
-/* The stream position of the next block, in frames, which automation is played by. */
+/* The stream position of the next block, in frames from 0, which automation is played by. What sounds goes
+ * on: see reset. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position);
 
 /* Ringing out, when the stream has ended: start with the most frames the tail may have; process blocks of
- * silence until `finished`, of each of which the first `frames` are output; end. What still sounds then, as
- * an echo's feedback does, comes out of further blocks of silence; `gap` is how many seconds may pass between
- * two echoes. */
+ * silence until `finished`; of each block the first `frames` are output; end. What still sounds then, as
+ * an echo's feedback does, comes out of further blocks of silence; `gap` is how many seconds may
+ * pass between two echoes: wait as long for the next before taking silence for the end. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_start_tail(dsp_effect* effect, int64_t max_frames);
 DSP_C_API dsp_status DSP_CALL dsp_effect_tail(dsp_effect* effect, int32_t* frames, int32_t* finished);
 DSP_C_API dsp_status DSP_CALL dsp_effect_end_tail(dsp_effect* effect);
@@ -143,7 +146,8 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_sidechain_f64(dsp_effect* effect, int32
                                                        const double* const* channels);
 
 /* Tempo. The callback fills the record, which holds 120 bpm and 4/4, on either of the effect's threads; it
- * must neither wait nor throw. Null takes it away. Say when it would answer something new. */
+ * must neither wait nor throw. Null takes it away. Call dsp_effect_tempo_changed when it would answer
+ * something new. */
 typedef struct dsp_tempo {
     uint32_t size;
     int32_t numerator, denominator;
@@ -178,14 +182,16 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_parameter_text(dsp_effect* effect, int3
 /* By label or name, in letters of either case; the left one of a pair that is named without its side. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_find_parameter(dsp_effect* effect, const char* name,
                                                         int32_t* parameter, dsp_error* error);
-/* A choice's text and its normalised value, from 0. */
+/* A choice's text and the value that sets it, from 0. To see which one is chosen compare texts: other values
+ * may mean the same choice. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_choice(dsp_effect* effect, int32_t parameter, int32_t choice,
                                                 float* value, char* buffer, size_t size, size_t* needed);
 DSP_C_API dsp_status DSP_CALL dsp_effect_get(dsp_effect* effect, int32_t parameter, float* value);
 /* Takes effect with the next block. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_set(dsp_effect* effect, int32_t parameter, float value);
 /* The text that the effect shows at a value, and the value that a text means: a choice, or a number with or
- * without its unit. Numbers beyond the range are limited to it. Neither changes the effect. */
+ * without its unit. Numbers beyond the range are limited to it. Neither changes the effect; both try the
+ * value on a copy of it, which takes up to some milliseconds. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_value_to_text(dsp_effect* effect, int32_t parameter, float value,
                                                        char* buffer, size_t size, size_t* needed);
 DSP_C_API dsp_status DSP_CALL dsp_effect_text_to_value(dsp_effect* effect, int32_t parameter,
@@ -228,7 +234,7 @@ enum {
 typedef struct dsp_band {
     uint32_t size;
     int32_t type;
-    int32_t frequency; /* Hz, 1 to 1000000; below half the rate where it is not a peak's */
+    int32_t frequency; /* Hz, 1 to 1000000; limited to below half the rate where it is not a peak's */
     int32_t q; /* 1 to 100000; a peak is q/133 octaves wide, shelves slope and passes resonate with q/50 */
     int32_t bypass;
     int32_t reserved;
@@ -265,7 +271,7 @@ typedef struct dsp_conversion {
     int32_t channels;          /* 1 to 48, interleaved */
     int32_t in_sample, out_sample;
     int32_t dither;  /* for DSP_S16 and DSP_S24 */
-    int32_t nearest; /* 1: small factors that may miss the rate by some cents, quicker */
+    int32_t nearest; /* 1: small factors, quicker, refused where they miss the rate by over 20 cents */
 } dsp_conversion;
 DSP_C_API dsp_status DSP_CALL dsp_converter_create(const dsp_conversion* conversion,
                                                    dsp_converter** converter, dsp_error* error);
@@ -319,9 +325,8 @@ DSP_C_API dsp_status DSP_CALL dsp_transform_f64(dsp_transform* transform, double
 
 /* ---- Analyser, tuner, sonogram ----
  *
- * Feed belongs to the audio thread, refresh and everything read to the display thread; menu commands may come
- * from any. How the analysis is done (window, scales, colours, methods) is shared by all analysers of the
- * process. */
+ * Feed belongs to the audio thread, all else to the display thread. A command reaches every analyser of the
+ * process: give it on the display thread, or while none is refreshed, read or drawn. */
 
 typedef struct dsp_analyser dsp_analyser;
 DSP_C_API dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, dsp_error* error);
@@ -335,7 +340,8 @@ DSP_C_API dsp_status DSP_CALL dsp_analyser_feed_f64(dsp_analyser* analyser, cons
                                                     int32_t frames, int32_t channels);
 /* One refresh of the display, 30 times a second; `fresh` says whether there is something new. May be null. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_refresh(dsp_analyser* analyser, int32_t* fresh);
-/* Levels of the bins from 0 Hz up, dB below a full-scale sine, and their frequencies, Hz. */
+/* Levels of the bins from 0 Hz up, dB below a full-scale sine, and their frequencies, Hz. Bin 0 also holds
+ * what stands at half the rate. */
 enum { DSP_SPECTRUM_NOW = 0, DSP_SPECTRUM_SMOOTHED = 1, DSP_SPECTRUM_PEAKS = 2 };
 DSP_C_API dsp_status DSP_CALL dsp_analyser_spectrum(dsp_analyser* analyser, int32_t which, float* decibels,
                                                     size_t count, size_t* needed);
@@ -369,9 +375,10 @@ typedef struct dsp_tuner_reading {
 DSP_C_API dsp_status DSP_CALL dsp_analyser_tuner(dsp_analyser* analyser, dsp_tuner_reading* reading);
 DSP_C_API dsp_status DSP_CALL dsp_note_name(int32_t note, char* buffer, size_t size, size_t* needed);
 
-/* The sonogram's picture: as wide and high as asked for, each side 1 to 16384; it moves with every refresh
- * while DSP_SHOW_SONOGRAM is on. Pixels are 0xLLRRGGBB, L the level from 0, silence, to 255, full scale; rows
- * from the highest frequency down, the newest column at the right. */
+/* The sonogram's picture: as wide and high as asked for, each side 1 to 16384 and at most 2^26 pixels, until
+ * a drawing of it needs another size; it moves with every refresh while DSP_SHOW_SONOGRAM is on. Pixels are
+ * 0xLLRRGGBB, L the level from 0, silence, to 255, full scale; rows from the highest frequency down, the
+ * newest column at the right. */
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_resize(dsp_analyser* analyser, int32_t width, int32_t height);
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_pixels(dsp_analyser* analyser, uint32_t* pixels, size_t count,
                                                   size_t* needed);

@@ -25,7 +25,7 @@ typedef struct dsp_picture {
     uint32_t size;
     int32_t width, height; /* pixels, 1 to 16384 */
     int32_t stride;        /* bytes from one row to the next, a multiple of 4; rows go down */
-    uint32_t* pixels;      /* 0x00RRGGBB in the machine's byte order */
+    uint32_t* pixels;      /* 0xRRGGBB in the machine's byte order; the top byte means nothing */
     float dpi;             /* dots per inch, above 0; 96 is 100 % */
     float reserved;
 } dsp_picture;

@@ -92,10 +92,22 @@ constexpr bool kIsHandle = !std::is_void_v<T> && !std::is_function_v<T>;
 template <typename T>
 constexpr bool kIsHandle<T, std::void_t<decltype(sizeof(T))>> = false;
 
-// Memory that any argument may point to: zeros, but for the address of more of it at places where pointers
-// are.
+// Memory that arguments may point to: zeros; records of any kind whose size is set, with zeros and with huge
+// numbers behind it; channels.
 struct Memory {
-    alignas(16) std::byte bytes[65536]{};
+    static constexpr std::size_t kRecord = 1024;
+
+    void Fill() {
+        std::memset(zeros, 0, sizeof zeros);
+        std::memset(small, 0, sizeof small);
+        std::memset(huge, 0x7F, sizeof huge);
+        const std::uint32_t size = kRecord;
+        for (auto* const record : {small, huge}) std::memcpy(record, &size, sizeof size);
+        for (auto& channel : channels) channel = zeros;
+    }
+
+    alignas(16) std::byte zeros[65536], small[kRecord], huge[kRecord];
+    void* channels[2];
 };
 
 // What is tried for an argument. A count that is larger than the memory goes with null pointers only.
@@ -108,11 +120,15 @@ std::vector<T> Candidates(Handles& handles, Memory& memory, bool huge) {
         else if constexpr (kIsHandle<Target>)
             return {nullptr, static_cast<T>(handles.closed), handles.Other<Target>(),
                     handles.Right<Target>()};
-        else if constexpr (std::is_void_v<Target>)
-            return huge ? std::vector<T>{nullptr} : std::vector<T>{nullptr, memory.bytes};
+        else if (huge)
+            return {nullptr};
+        else if constexpr (std::is_pointer_v<Target> && !kIsHandle<std::remove_pointer_t<Target>>)
+            return {nullptr, reinterpret_cast<T>(memory.zeros), reinterpret_cast<T>(memory.channels)};
+        else if constexpr (std::is_class_v<Target>)
+            return {nullptr, reinterpret_cast<T>(memory.zeros), reinterpret_cast<T>(memory.small),
+                    reinterpret_cast<T>(memory.huge)};
         else
-            return huge ? std::vector<T>{nullptr}
-                        : std::vector<T>{nullptr, reinterpret_cast<T>(memory.bytes)};
+            return {nullptr, static_cast<T>(static_cast<void*>(memory.zeros))};
     } else if constexpr (std::is_floating_point_v<T>) {
         return {T(0), T(-1e30)};
     } else if (huge) {
@@ -139,7 +155,7 @@ private:
     template <std::size_t i, typename Chosen, typename Check>
     void Choose(bool huge, const Chosen& chosen, Check& check) {
         if constexpr (i == sizeof...(Arguments)) {
-            std::memset(m_memory.bytes, 0, sizeof m_memory.bytes);
+            m_memory.Fill();
             check(chosen, std::apply(m_function, chosen));
         } else {
             using T = std::tuple_element_t<i, std::tuple<Arguments...>>;
@@ -187,7 +203,7 @@ TEST(CInterface, TakesNullsHugeCountsAndForeignHandlesWithAStatus) {
 
 // The same bytes as the classes give, in blocks that are longer than the longest piece and cut by automation.
 TEST(CInterface, ProcessesLikeTheClasses) {
-    constexpr int kFrames = 3000, kMost = 256, kPoint = 700, kRate = 48000;
+    constexpr int kFrames = 12000, kMost = 256, kPoint = 700, kRate = 48000;
     tWAVEFORMATEX wave{};
     wave.nChannels = 2;
     wave.nSamplesPerSec = kRate;
@@ -212,6 +228,7 @@ TEST(CInterface, ProcessesLikeTheClasses) {
             at += count;
         }
 
+        EXPECT_NE(expected, std::vector<double>(expected.size())) << "silence";
         for (const bool planar : {false, true}) {
             dsp_effect* effect = nullptr;
             const dsp_point points[]{{0, 0.25f, 0.0f}, {kPoint, 0.75f, 0.0f}};

@@ -104,7 +104,52 @@ static void UseEffects(float* samples) {
     for (i = 1, value = 0.0f; i < kFrames; ++i) value = fmaxf(value, fabsf(samples[i]));
     EXPECT(value > 0.01f);
     OK(dsp_effect_tempo_callback(echo, NULL, NULL));
+    OK(dsp_effect_reset(echo));
+    OK(dsp_effect_seek(echo, 1000));
+    EXPECT(dsp_effect_seek(echo, -1) == DSP_OUT_OF_RANGE);
     OK(dsp_close(echo));
+}
+
+/* A reverb rings for as long as it may, in blocks that are longer than the longest piece. */
+static void UseTail(float* samples) {
+    const dsp_format format = {sizeof format, kRate, 1, DSP_F32, 256};
+    dsp_effect* reverb = NULL;
+    int32_t frames = 0, finished = 0, total = 0;
+    OK(dsp_effect_create("Reverb", &reverb, &g_error));
+    OK(dsp_effect_prepare(reverb, &format, &g_error));
+    OK(dsp_effect_start_tail(reverb, 10000));
+    while (!finished) {
+        memset(samples, 0, 1000 * sizeof *samples);
+        OK(dsp_effect_process_f32(reverb, samples, 1000));
+        OK(dsp_effect_tail(reverb, &frames, &finished));
+        total += frames;
+    }
+    EXPECT(total == 10000);
+    OK(dsp_effect_end_tail(reverb));
+    OK(dsp_close(reverb));
+}
+
+/* What the other input says decides how far a compressor turns down. */
+static void UseSidechain(float* samples) {
+    const dsp_format format = {sizeof format, kRate, 1, DSP_F32, 512};
+    dsp_effect* compressor = NULL;
+    float* const loud = malloc(kRate * sizeof *loud);
+    const float* channels[1];
+    int32_t busses = 0, i;
+    channels[0] = loud;
+    for (i = 0; i < kRate; ++i) loud[i] = i % 2 ? 0.9f : -0.9f, samples[i] = 0.01f;
+    OK(dsp_effect_create("Compressor", &compressor, &g_error));
+    OK(dsp_effect_set_preset(compressor, 5));
+    OK(dsp_effect_sidechain_busses(compressor, &busses));
+    EXPECT(busses == 1);
+    OK(dsp_effect_sidechain_channels(compressor, 0, 1));
+    OK(dsp_effect_prepare(compressor, &format, &g_error));
+    OK(dsp_effect_process_f32(compressor, samples, kRate / 2));
+    OK(dsp_effect_sidechain_f32(compressor, 0, channels));
+    OK(dsp_effect_process_f32(compressor, samples + kRate / 2, kRate / 2));
+    EXPECT(fabsf(samples[kRate - 1]) < 0.9f * fabsf(samples[kRate / 2 - 1]));
+    free(loud);
+    OK(dsp_close(compressor));
 }
 
 static void UseEqualiser(void) {
@@ -249,6 +294,8 @@ static void UseAnalyser(const float* sine) {
 int main(void) {
     float* const samples = malloc(kFrames * sizeof *samples);
     UseEffects(samples);
+    UseTail(samples);
+    UseSidechain(samples);
     UseEqualiser();
     Sine(samples, kFrames, 440.0);
     UseConverterAndPitchShift(samples);

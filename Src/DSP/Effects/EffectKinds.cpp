@@ -58,6 +58,7 @@ std::unique_ptr<CorvoEffectBase> EffectKind::Copy(CorvoEffectBase& effect) const
     effect.GetSettingsChunk(chunk);
     auto copy = make();
     copy->SetSettingsChunk(chunk);
+    copy->SetHostCallback(effect.GetHostCallback());
     return copy;
 }
 

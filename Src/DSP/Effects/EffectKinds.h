@@ -16,7 +16,7 @@ struct EffectKind {
 
     // A new instance that starts as a host shows it: from its default preset, where it has presets.
     DSP_API std::unique_ptr<CorvoEffectBase> MakeReady() const;
-    // Another instance with the settings of `effect`, which is of this kind.
+    // Another instance with the settings and the host of `effect`, which is of this kind.
     DSP_API std::unique_ptr<CorvoEffectBase> Copy(CorvoEffectBase& effect) const;
 };
 

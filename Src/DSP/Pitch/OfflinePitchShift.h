@@ -36,7 +36,8 @@ public:
     void Feed(const float* samples, int frames);
     // The recording has ended; after that nothing is fed.
     void Finish();
-    // Frames that can be taken now. All of them after Finish: the frames fed, divided by the speed.
+    // Frames that can be taken now. All of them after Finish: the frames fed, divided by the speed; one fewer
+    // where rounding has it so.
     std::int64_t Available() const;
     // Takes at most `frames` frames and returns how many they were.
     int Take(float* samples, int frames);

@@ -3,7 +3,9 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <new>
 #include <numeric>
+#include <span>
 #include <stdexcept>
 #include <string>
 
@@ -52,10 +54,10 @@ int WithOutput(StoredSample sample, Call call) {
 }
 
 template <typename In, typename Out>
-int Copy(const char* in, int samples, int channels, char* out, CDither<double>* dither) {
-    for (int i = 0; i < samples; ++i)
+int Copy(const char* in, std::ptrdiff_t samples, int channels, char* out, CDither<double>* dither) {
+    for (std::ptrdiff_t i = 0; i < samples; ++i)
         Out::Write(ApplyDither(dither[i % channels], In::Read(in + i * In::kBytes)), out + i * Out::kBytes);
-    return samples / channels;
+    return static_cast<int>(samples / channels);
 }
 
 int DitherBits(const AlignedConverter::Settings& settings) {
@@ -90,6 +92,11 @@ AlignedConverter::AlignedConverter(const Settings& settings) : m_settings(settin
                                     : m_core.InitConversion(settings.inRate, settings.outRate) != 0;
     if (!set) throw std::bad_alloc();
     m_core.Init(settings.channels);
+    if (std::ranges::count(std::span(m_core.rings).first(static_cast<std::size_t>(settings.channels)),
+                           nullptr) > 0) {
+        m_core.FreeRings();
+        throw std::bad_alloc();
+    }
     m_up = m_core.up;
     m_down = m_core.down;
     // Outputs begin where the filter's delay ends, to the nearest step of the raised rate.
@@ -104,13 +111,12 @@ std::int64_t AlignedConverter::FramesOut(std::int64_t framesIn) const {
     return (2 * framesIn * m_up + m_down) / (2 * m_down);
 }
 
-int AlignedConverter::MostFrames(int frames) const {
-    const std::int64_t most = static_cast<std::int64_t>(std::max(frames, 0)) * m_up / m_down + 1;
-    return static_cast<int>(std::min<std::int64_t>(most, 0x7FFFFFFF));
+std::int64_t AlignedConverter::MostFrames(std::int64_t frames) const {
+    return std::max<std::int64_t>(frames, 0) * m_up / m_down + 1;
 }
 
 int AlignedConverter::Convert(const void* in, int frames, void* out) {
-    if (frames < 1) return 0;
+    if (frames < 1 || m_finished) return 0;
     m_taken += frames;
     return Limited(Store(in, frames, out));
 }
@@ -118,6 +124,7 @@ int AlignedConverter::Convert(const void* in, int frames, void* out) {
 int AlignedConverter::Finish(void* out, int frames) {
     // As much silence as gives no more than there is room for.
     const auto fitting = static_cast<int>(static_cast<std::int64_t>(frames - 1) * m_down / m_up);
+    m_finished = true;
     if (frames < MostFrames(1)) return 0;
     while (m_given < FramesOut(m_taken))
         if (const int given = Limited(Store(kSilence.data(), std::clamp(fitting, 1, kSilentFrames), out)))
@@ -131,7 +138,9 @@ int AlignedConverter::Store(const void* in, int frames, void* out) {
     const int channels = m_settings.channels;
     return WithInput(m_settings.in, [&]<typename In>(In) {
         return WithOutput(m_settings.out, [&]<typename Out>(Out) {
-            if (m_up == m_down) return Copy<In, Out>(from, frames * channels, channels, to, m_dither);
+            if (m_up == m_down)
+                return Copy<In, Out>(from, static_cast<std::ptrdiff_t>(frames) * channels, channels, to,
+                                     m_dither);
             return m_core.sfreq_conversion_core_block<In, Out>(
                 frames, const_cast<char*>(from), to, channels, channels * In::kBytes, channels * Out::kBytes,
                 m_settings.dither == DitherCurve::None ? nullptr : m_dither);

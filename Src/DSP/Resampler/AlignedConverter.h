@@ -20,8 +20,8 @@ public:
         int inRate = 48000, outRate = 48000;  // Hz, 1000..768000
         int channels = 2;                     // 1..48
         StoredSample in = StoredSample::Double, out = StoredSample::Double;
-        // Any ratio of whole numbers; else the nearest with factors up to 49, which is quicker where the
-        // exact one is large, but may miss the rate by some cents: compare Up() / Down().
+        // Any ratio of whole numbers. Else the nearest with factors up to 49, which is quicker where the
+        // exact ones are large, but may miss the rate: compare Up() / Down().
         bool exact = true;
         // For `ditherBits`, 16 or 24, which may be fewer than the output has: for a host that shortens words
         // itself. 0: as many as the output has.
@@ -40,8 +40,8 @@ public:
     int Down() const { return m_down; }
     // How many frames a recording of so many becomes.
     std::int64_t FramesOut(std::int64_t framesIn) const;
-    // The most that Convert writes for a block, or Finish for `frames` below.
-    int MostFrames(int frames) const;
+    // The most that Convert writes for a block of so many.
+    std::int64_t MostFrames(std::int64_t frames) const;
 
     // Converts `frames` frames and returns how many were written, at most MostFrames(frames); fewer at the
     // beginning, while the filter fills. The buffers must not overlap. Nothing for frames below 1.
@@ -58,4 +58,5 @@ private:
     CDither<double> m_dither[SamplingFrequencyConverter::kMaxChannels];
     int m_up = 1, m_down = 1;
     std::int64_t m_taken = 0, m_given = 0;
+    bool m_finished = false;
 };

@@ -124,6 +124,8 @@ void CorvoEffectBase::RunBlock(int frames, ProcessFlags& flags, Call&& call) {
     m_tail->EndBlock();
 }
 
+bool CorvoEffectBase::IsPrepared() const { return !m_tail->unprepared; }
+
 void CorvoEffectBase::Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
     RunBlock(frames, flags, [&](int allowed) {
         if (Guards(m_table, *format)) GuardInput(buffer, allowed, format->nChannels, format->wBitsPerSample);

@@ -193,6 +193,8 @@ public:
     // needs is made here. Always true, and never throws: without memory blocks pass unchanged, and the next
     // InitProcessing tries again.
     bool InitProcessing(int maxFrames, const tWAVEFORMATEX* format);
+    // False when the last preparation found no memory: sound passes unchanged until the next one.
+    bool IsPrepared() const;
     // Plays automation that is due, then processes one block in place. Never throws; a block of 0 frames
     // or fewer is left alone. An effect that remembers its input takes samples that are not finite for 0, and
     // what grows beyond all numbers inside it is cleared when that shows: the next block is sound again.
@@ -222,6 +224,7 @@ public:
     void RequestTailRestart();
 
     void SetHostCallback(CorvoEffectHostCallback* callback);  // not owned; null for none
+    CorvoEffectHostCallback* GetHostCallback() const { return m_host_callback; }
     // The host calls this when tempo or time signature changed: the next block derives afresh.
     void NotifyTempoChanged();
     void SetWantRefreshAllParams(bool want);
