@@ -6,6 +6,8 @@
 #include <vector>
 
 #include "Apps/Program.h"
+#include "EffectParameters.h"
+#include "Errors.h"
 
 namespace AppTest {
 namespace {
@@ -73,6 +75,28 @@ TEST_F(RenderCommand, SavesAndLoadsTheState) {
     // A setting beside the chunk changes it, wherever it stands.
     Succeed("render in.wav c.wav --fx \"Gain: Pan=0, Gain=n:0.5, chunk=state\"");
     EXPECT_EQ(Load("c.wav").samples, in.samples);
+}
+
+// Presets go beyond what controls give, and older files of a compressor are shorter. What is refused is told
+// from what changes nothing.
+TEST(Chunks, AreTakenFromEveryPreset) {
+    constexpr std::size_t kOlderCompressor = 16100;
+    for (const auto& kind : dsphost::EffectKinds()) {
+        SCOPED_TRACE(kind.name);
+        const auto effect = kind.make(), other = kind.make();
+        std::vector<std::uint8_t> chunk;
+        for (int preset = -1; preset < effect->NumPresets(); ++preset) {
+            effect->SetPreset(preset);
+            effect->GetSettingsChunk(chunk);
+            EXPECT_NO_THROW(dsphost::UseChunk(kind, *other, chunk, "file")) << preset;
+        }
+        EXPECT_THROW(dsphost::UseChunk(kind, *other, std::vector<std::uint8_t>(7), "file"),
+                     dsphost::UserError);
+        if (chunk.size() <= kOlderCompressor) continue;
+        kind.make()->GetSettingsChunk(chunk);
+        chunk.resize(kOlderCompressor);
+        EXPECT_NO_THROW(dsphost::UseChunk(kind, *other, chunk, "file"));
+    }
 }
 
 // A tremolo that stands still multiplies by 1 / (1 + depth); every step comes on its frame, whatever the
