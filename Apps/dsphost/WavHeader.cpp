@@ -78,7 +78,7 @@ bool ReadFormatChunk(Keeper& stream, std::uint32_t size, WavStreamHeader& header
 // known.
 std::optional<std::int64_t> ReadLongSize(Keeper& stream, std::uint32_t size) {
     constexpr std::uint32_t kHighest = 0x3FFFFFFF;
-    if (size < 16 || !stream.Fetch(std::size_t{size} + (size & 1))) return {};
+    if (size < 16 || size > kLongestWavHeader || !stream.Fetch(size + (size & 1))) return {};
     const std::uint32_t low = stream.Number(8, 4), high = stream.Number(12, 4);
     if (high > kHighest || (high == 0 && low == 0)) return {};
     return static_cast<std::int64_t>(std::uint64_t{high} << 32 | low);
