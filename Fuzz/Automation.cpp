@@ -2,6 +2,7 @@
 #include "Automation.h"
 
 #include "Errors.h"
+#include "Render.h"
 #include "Target.h"
 
 namespace {
@@ -19,11 +20,7 @@ const Fuzz::Target target("Automation", [](Input& input) {
         Fuzz::Require(std::string_view(error.what()).size() < 2000, "a message is a line that one can read");
         return;
     }
-    tWAVEFORMATEX format{};
-    format.nChannels = 2;
-    format.nSamplesPerSec = 48000;
-    format.wBitsPerSample = 64;
-    chain.Prepare(512, format, false);
+    chain.Prepare(512, dsphost::ChainFormat(2, 48000, 64), false);
     std::vector<double> block(2 * 512, 0.25);
     for (std::int64_t at = 0, frames = 0; at < 20000; at += frames) {
         frames = chain.FramesToCut(at, 512);

@@ -1,6 +1,7 @@
 // Any text after --fx of the command-line host; a chain that comes of it also runs.
 #include "Chain.h"
 #include "Errors.h"
+#include "Render.h"
 #include "Target.h"
 
 namespace {
@@ -25,11 +26,7 @@ const Fuzz::Target target("ChainText", [](Input& input) {
         if (text.find('/') != text.npos) return;
     try {
         dsphost::Chain chain(texts);
-        tWAVEFORMATEX format{};
-        format.nChannels = 2;
-        format.nSamplesPerSec = 44100;
-        format.wBitsPerSample = 32;
-        chain.Prepare(256, format, true);
+        chain.Prepare(256, dsphost::ChainFormat(2, 44100, 32), true);
         std::vector<double> block(2 * 256, 0.25);
         for (std::int64_t at = 0; at < 1024; at += 256) chain.Process(block.data(), 256, at);
         for (std::size_t i = 0; i < chain.Size(); ++i) chain.Element(i).LongestGap();

@@ -24,8 +24,10 @@ fuzz() {
     local program=$1 target=${1##*fuzz_}
     local report=$work/$target.log
     mkdir -p "$work/corpus/$target" "$work/failed/$target" "$work/seeds/$target"
+    local known=()  # what failed before
+    [ ! -d "Fuzz/Failed/$target" ] || known=("Fuzz/Failed/$target")
     "$program" -max_total_time="$share" -timeout=20 -rss_limit_mb=3000 -max_len=8192 -print_final_stats=1 \
-        -artifact_prefix="$work/failed/$target/" "$work/corpus/$target" "$work/seeds/$target" 2>&1 |
+        -artifact_prefix="$work/failed/$target/" "$work/corpus/$target" "$work/seeds/$target" "${known[@]}" 2>&1 |
         grep -v '^dsphost: warning' > "$report" || {
         tail -n 60 "$report"
         echo "$target: FAILED; the input is in $work/failed/$target"

@@ -81,7 +81,8 @@ try_package() {
     ls $programs
     build_preset release dsphost
     local render=(render -q -y --fx "Gain: Gain=-3") host=build/release/bin/dsphost
-    "$host" render -q -y --fx Gain --format f32 /usr/share/sonic-pi/samples/loop_amen.flac $programs/loop.wav
+    "$host" render -q -y --fx Gain --format f32 "$(dpkg -L sonic-pi-samples | grep -m1 '/loop_amen\.flac$')" \
+        $programs/loop.wav
     "$host" "${render[@]}" $programs/loop.wav $package/here.wav
     on_wine $programs/dsphost.exe "${render[@]}" loop.wav there.wav
     cmp $package/here.wav $programs/there.wav

@@ -1,4 +1,4 @@
-# What makes a fault harder to exploit, in release builds; Scripts/hardening.sh reads it back from the binaries.
+# What makes a fault harder to exploit, in release builds; Tests/Package/hardening.sh reads it back from the binaries.
 set(dsp_hardening -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2 -fstack-protector-strong)
 if(WIN32)
     # The guard itself linked in, so that the package needs no further DLL. Images that may be moved and data that

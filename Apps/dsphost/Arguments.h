@@ -1,9 +1,11 @@
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
 #include <vector>
 
+#include "AudioReader.h"
 #include "OutputFile.h"
 #include "PictureOptions.h"
 #include "Render.h"
@@ -19,16 +21,22 @@ struct WritingOptions {
     bool quiet = false;
 };
 
-struct ConvertArguments {
-    std::string input, output, format, dither = "none";
+// What every command that reads audio takes.
+struct ReadingOptions {
+    std::string input;
+    std::int64_t spoolLimit = AudioReader::kUsualSpoolLimit;
+};
+
+struct ConvertArguments : ReadingOptions {
+    std::string output, format, dither = "none";
     int rate = 0;
     bool exact = false;
     WritingOptions writing;
 };
 void RunConvert(ConvertArguments arguments);
 
-struct DenoiseArguments {
-    std::string input, output, profile, saveProfile, settings, residue, format;
+struct DenoiseArguments : ReadingOptions {
+    std::string output, profile, saveProfile, settings, residue, format;
     std::vector<std::string> learn;
     WritingOptions writing;
 };
@@ -48,24 +56,24 @@ struct EqCurveArguments {
 };
 void RunEqCurve(EqCurveArguments arguments);
 
-struct PitchArguments {
-    std::string input, output, engine = "new", format;
+struct PitchArguments : ReadingOptions {
+    std::string output, engine = "new", format;
     double semitones = 0.0, speed = 1.0;
     int quality = 4;
     WritingOptions writing;
 };
 void RunPitch(PitchArguments arguments);
 
-struct RenderArguments {
-    std::string input, output, format, automation, tail = "0";
+struct RenderArguments : ReadingOptions {
+    std::string output, format, automation, tail = "0";
     std::vector<std::string> effects, chunks;
     RenderOptions options;
     WritingOptions writing;
 };
 void RunRender(RenderArguments arguments);
 
-struct SonogramArguments {
-    std::string input, output;
+struct SonogramArguments : ReadingOptions {
+    std::string output;
     int scheme = 0;
     std::optional<int> speed;
     bool spectrum = false, pitch = false;
@@ -74,8 +82,8 @@ struct SonogramArguments {
 };
 void RunSonogram(SonogramArguments arguments);
 
-struct SpectrumArguments {
-    std::string input, picture, csv, profile, window = "blackman";
+struct SpectrumArguments : ReadingOptions {
+    std::string picture, csv, profile, window = "blackman";
     int length = 4096;
     float overlap = 0.5f;
     PictureOptions drawing;
@@ -83,8 +91,8 @@ struct SpectrumArguments {
 };
 void RunSpectrum(SpectrumArguments arguments);
 
-struct TunerArguments {
-    std::string input, output, method = "denoised", temperament = "Equal", sensitivity = "Standard";
+struct TunerArguments : ReadingOptions {
+    std::string output, method = "denoised", temperament = "Equal", sensitivity = "Standard";
     std::optional<double> at;
     bool json = false;
     PictureOptions drawing;
@@ -94,8 +102,8 @@ void RunTuner(TunerArguments arguments);
 const std::vector<std::string>& DetectionMethods();
 
 // Texts of the effect's parameters; empty: its default.
-struct TuneVoiceArguments {
-    std::string input, output, format, scale = "Chromatic", retune, transition, ratio, lowest, notes, curve;
+struct TuneVoiceArguments : ReadingOptions {
+    std::string output, format, scale = "Chromatic", retune, transition, ratio, lowest, notes, curve;
     PictureOptions drawing;
     WritingOptions writing;
 };

@@ -18,10 +18,8 @@ namespace fs = std::filesystem;
 
 constexpr int kLowestRate = 1000, kHighestRate = 768000;
 
-// Programs that write it put what it is at the start.
+// Every kind of audio file is known by what stands in its first bytes; so many are more than enough.
 constexpr std::size_t kEnoughToRecognise = 1 << 16;
-
-std::int64_t g_spoolLimit = std::int64_t{8} << 30;
 
 std::string Counted(std::int64_t count, const char* one, const char* several) {
     return std::to_string(count) + (count == 1 ? one : several);
@@ -32,16 +30,16 @@ std::string NoAudio(const std::string& name) {
 }
 
 // All of the stream in a temporary file, `start` in front.
-File Spool(File& from, const std::vector<unsigned char>& start) {
+File Spool(File& from, const std::vector<unsigned char>& start, std::int64_t limit) {
     File to = File::Temporary();
     to.Write(start.data(), start.size());
     std::vector<unsigned char> buffer(kEnoughToRecognise);
     auto size = static_cast<std::int64_t>(start.size());
     for (bool recognised = false; const std::size_t count = from.Read(buffer.data(), buffer.size());) {
         size += static_cast<std::int64_t>(count);
-        if (size > g_spoolLimit)
+        if (size > limit)
             throw UserError(from.Name() + ": does not stream, and its temporary file would be larger than " +
-                            Counted(g_spoolLimit, " byte", " bytes") + "; --spool-limit allows more");
+                            Counted(limit, " byte", " bytes") + "; --spool-limit allows more");
         to.Write(buffer.data(), count);
         to.ThrowIfFailed();
         if (std::exchange(recognised, true)) continue;
@@ -62,14 +60,13 @@ ByteSource SourceOf(File& file) {
 
 }  // namespace
 
-AudioReader::AudioReader(const std::string& path) : m_name(path == "-" ? "standard input" : path) {
+AudioReader::AudioReader(const std::string& path, std::int64_t spoolLimit)
+    : m_name(path == "-" ? "standard input" : path), m_spoolLimit(spoolLimit) {
     std::error_code error;
     const auto status = fs::status(PathOf(path), error);
     if (path == "-") {
         if (IsTerminal(stdin)) throw UserError("standard input is a terminal; pipe audio into it");
         OpenStream(File::StandardInput());
-    } else if (fs::is_directory(status)) {
-        throw UserError(path + ": is a directory, not an audio file");
     } else {
         File file(PathOf(path), File::Mode::Read, path);
         if (fs::exists(status) && !fs::is_regular_file(status))
@@ -87,19 +84,6 @@ AudioReader::AudioReader(File file, bool forwardsOnly) : m_name(file.Name()) {
 }
 
 AudioReader::~AudioReader() = default;
-
-void AudioReader::SetSpoolLimit(const std::string& size) {
-    constexpr std::string_view kUnits = "KMGT";
-    const auto length = NumberLength(size);
-    const auto number = ToNumber(std::string_view(size).substr(0, length));
-    const std::string_view unit = std::string_view(size).substr(length);
-    const auto place = unit.size() == 1 ? kUnits.find(static_cast<char>(unit[0] & ~0x20)) : kUnits.npos;
-    const int power = place == kUnits.npos ? 0 : 10 * (static_cast<int>(place) + 1);
-    const double bytes = number ? std::ldexp(*number, power) : -1.0;
-    if (!(bytes >= 0.0 && bytes < 0x1p62) || (power == 0 && !unit.empty()))
-        throw UserError("--spool-limit cannot be \"" + size + "\"; accepted: a number of bytes, or 500M, 8G");
-    g_spoolLimit = static_cast<std::int64_t>(bytes);
-}
 
 void AudioReader::OpenFile(File file) {
     m_file = std::make_unique<File>(std::move(file));
@@ -126,7 +110,7 @@ void AudioReader::OpenStream(File stream) {
     if (start.empty()) throw UserError(m_name + ": is empty");
     if (start.size() >= kLongestWavHeader)
         throw UserError(m_name + ": is a WAV stream without samples in its first MiB");
-    if (!header) return OpenFile(Spool(stream, start));
+    if (!header) return OpenFile(Spool(stream, start, m_spoolLimit));
     m_info.channels = header->channels;
     m_info.samplerate = header->rate;
     m_info.format = SF_FORMAT_RAW | header->subtype | SF_ENDIAN_LITTLE;
@@ -202,9 +186,22 @@ void AudioReader::End() {
     char time[32];
     std::snprintf(time, sizeof time, "%.3f", static_cast<double>(m_firstNotFinite) / Rate());
     PrintMessage(warning +
-                 Counted(m_notFinite, " sample is no finite number, at ",
-                         " samples are no finite numbers, the first at ") +
+                 Counted(m_notFinite, " sample is not a finite number, at ",
+                         " samples are not finite numbers, the first at ") +
                  time + " s");
+}
+
+std::int64_t ParseSpoolLimit(const std::string& size) {
+    constexpr std::string_view kUnits = "KMGT";
+    const auto length = NumberLength(size);
+    const auto number = ToNumber(std::string_view(size).substr(0, length));
+    const std::string_view unit = std::string_view(size).substr(length);
+    const auto place = unit.size() == 1 ? kUnits.find(static_cast<char>(unit[0] & ~0x20)) : kUnits.npos;
+    const int power = place == kUnits.npos ? 0 : 10 * (static_cast<int>(place) + 1);
+    const double bytes = number ? std::ldexp(*number, power) : -1.0;
+    if (!(bytes >= 0.0 && bytes < 0x1p62) || (power == 0 && !unit.empty()))
+        throw UserError("--spool-limit cannot be \"" + size + "\"; accepted: a number of bytes, or 500M, 8G");
+    return static_cast<std::int64_t>(bytes);
 }
 
 void RequireFormat(const AudioReader& input, int maxChannels, const std::string& reason) {

@@ -20,14 +20,13 @@ namespace dsphost {
 class AudioReader {
 public:
     // Throws UserError when there is nothing there, or nothing that is audio.
-    explicit AudioReader(const std::string& path);
+    // A temporary file takes at most `spoolLimit` bytes.
+    explicit AudioReader(const std::string& path, std::int64_t spoolLimit = kUsualSpoolLimit);
     // `forwardsOnly`: as if the file could not seek.
     explicit AudioReader(File file, bool forwardsOnly = false);
     ~AudioReader();
 
-    // The most that a temporary file may take, 8 GiB at first: "500M", in bytes or with a K, M, G or T behind
-    // the number. Throws UserError.
-    static void SetSpoolLimit(const std::string& size);
+    static constexpr std::int64_t kUsualSpoolLimit = std::int64_t{8} << 30;
 
     int Channels() const { return m_info.channels; }
     int Rate() const { return m_info.samplerate; }
@@ -38,7 +37,7 @@ public:
 
     // Fills `samples` with up to `frames` interleaved frames and returns how many there were: fewer only at
     // the end. Throws UserError when the file turns out to be damaged. At the end it warns of an input that
-    // was cut off and of samples that are no finite numbers, which it leaves as they are.
+    // was cut off and of samples that are not finite numbers, which it leaves as they are.
     int Read(double* samples, int frames);
 
 private:
@@ -50,6 +49,7 @@ private:
     void End();
 
     std::string m_name;
+    std::int64_t m_spoolLimit = kUsualSpoolLimit;
     std::unique_ptr<File> m_file;
     std::unique_ptr<SoundFile> m_sound;
     SF_INFO m_info{};
@@ -58,6 +58,10 @@ private:
     std::int64_t m_notFinite = 0, m_firstNotFinite = 0;  // samples; the frame of the first
     bool m_cutOff = false, m_ended = false;
 };
+
+// A number of bytes as "500M": with a K, M, G or T behind it, or nothing. Throws UserError that names
+// --spool-limit.
+std::int64_t ParseSpoolLimit(const std::string& size);
 
 // Throws UserError unless the rate is between 1000 and 768000 Hz and there are at most `maxChannels`
 // channels; `reason` says why not more.

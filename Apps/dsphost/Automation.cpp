@@ -22,11 +22,12 @@ constexpr const char* kLaneForm =
     R"(a lane is {"effect": "NAME", "parameter": "LABEL", "points": [[seconds, value], ...]})";
 
 constexpr std::size_t kLargestFile = std::size_t{64} << 20;
-constexpr int kDeepest = 8;
+constexpr int kDeepest = 8;              // of nested brackets
+constexpr std::size_t kLongestList = 8;  // that a message repeats
 
 // What stands in a file, cut to a length that a message can have.
 std::string Quoted(const Json& json) {
-    if (json.is_structured() && json.size() > kDeepest)
+    if (json.is_structured() && json.size() > kLongestList)
         return (json.is_array() ? "a list of " : "an object of ") + std::to_string(json.size());
     return Shortened(json.dump(-1, ' ', false, Json::error_handler_t::replace), kLongestQuote);
 }

@@ -43,6 +43,9 @@ public:
     // Points in ascending order; before Prepare.
     virtual void Automate(int lane, std::span<const AutomationPoint> points);
 
+    // The file that it was made from; empty where there is none.
+    virtual std::string SourceFile() const { return {}; }
+
     // The whole state as the library's own bytes. Throws UserError when the element has no such form.
     virtual std::vector<std::uint8_t> State();
 };

@@ -30,10 +30,10 @@ std::pair<CLI::App&, Arguments&> Add(CLI::App& app, const char* name, const char
     return {*command, *arguments};
 }
 
-void AddInput(CLI::App& command, std::string& input) {
-    command.add_option("IN", input, "Audio file, or - for standard input")->required();
+void AddInput(CLI::App& command, ReadingOptions& reading) {
+    command.add_option("IN", reading.input, "Audio file, or - for standard input")->required();
     command.add_option_function<std::string>(
-        "--spool-limit", AudioReader::SetSpoolLimit,
+        "--spool-limit", [&reading](const std::string& size) { reading.spoolLimit = ParseSpoolLimit(size); },
         "Most that a temporary file may take for input that does not stream (8G)");
 }
 
@@ -66,7 +66,7 @@ void AddDrawing(CLI::App& command, PictureOptions& o) {
 void AddConvert(CLI::App& app) {
     const auto [command, a] =
         Add(app, "convert", "Converts an audio file to another sample rate or format", RunConvert);
-    AddInput(command, a.input);
+    AddInput(command, a);
     AddAudioOutput(command, a.output);
     command.add_option("--rate", a.rate, "Sample rate in Hz")->required();
     AddFormat(command, a.format);
@@ -78,7 +78,7 @@ void AddConvert(CLI::App& app) {
 void AddDenoise(CLI::App& app) {
     const auto [command, a] = Add(
         app, "denoise", "Takes steady noise out of a recording, aligned and as long as it was", RunDenoise);
-    AddInput(command, a.input);
+    AddInput(command, a);
     AddAudioOutput(command, a.output);
     command.add_option("--learn", a.learn, "FROM:TO, seconds that hold noise only; as often as there are")
         ->allow_extra_args(false);
@@ -100,7 +100,7 @@ void AddEffects(CLI::App& app) {
 void AddPitch(CLI::App& app) {
     const auto [command, a] =
         Add(app, "pitch", "Transposes an audio file, aligned and as long as it was", RunPitch);
-    AddInput(command, a.input);
+    AddInput(command, a);
     AddAudioOutput(command, a.output);
     command.add_option("--semitones", a.semitones, "How far, -36 to 36")->required();
     command.add_option("--engine", a.engine, "new (default) or classic");
@@ -125,7 +125,7 @@ void AddEqCurve(CLI::App& app) {
 void AddRender(CLI::App& app) {
     const auto [command, a] =
         Add(app, "render", "Renders an audio file through a chain of effects", RunRender);
-    AddInput(command, a.input);
+    AddInput(command, a);
     AddAudioOutput(command, a.output);
     command
         .add_option("--fx", a.effects,
@@ -145,7 +145,7 @@ void AddRender(CLI::App& app) {
 void AddSonogram(CLI::App& app) {
     const auto [command, a] =
         Add(app, "sonogram", "Draws how the spectrum of an audio file changes", RunSonogram);
-    AddInput(command, a.input);
+    AddInput(command, a);
     command.add_option("OUT", a.output, "PNG picture")->required();
     command.add_option("--scheme", a.scheme, "Colours, 0 to 6");
     command.add_option(
@@ -161,7 +161,7 @@ void AddSonogram(CLI::App& app) {
 void AddSpectrum(CLI::App& app) {
     const auto [command, a] =
         Add(app, "spectrum", "Writes the mean spectrum of an audio file, its channels mixed", RunSpectrum);
-    AddInput(command, a.input);
+    AddInput(command, a);
     command.add_option("OUT", a.picture, "PNG picture: the mean, and the highest levels as a thin line");
     command.add_option("--csv", a.csv, "Table of frequencies and mean levels, 0 dB a full-scale sine");
     command.add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
@@ -176,7 +176,7 @@ void AddSpectrum(CLI::App& app) {
 void AddTuner(CLI::App& app) {
     const auto [command, a] =
         Add(app, "tuner", "Names the notes of an audio file and draws the tuner", RunTuner);
-    AddInput(command, a.input);
+    AddInput(command, a);
     command.add_option("OUT", a.output, "PNG picture of the panel while the longest note sounds")->required();
     command.add_flag("--json", a.json, "What was heard 30 times a second, on standard output");
     command.add_option("--at", a.at, "The moment to draw instead, in seconds");
@@ -190,7 +190,7 @@ void AddTuner(CLI::App& app) {
 void AddTuneVoice(CLI::App& app) {
     const auto [command, a] =
         Add(app, "tune-voice", "Corrects the pitch of a voice, aligned and as long as it was", RunTuneVoice);
-    AddInput(command, a.input);
+    AddInput(command, a);
     AddAudioOutput(command, a.output);
     command.add_option("--scale", a.scale, "Root and mode, such as \"A minor\"; chromatic when left out");
     command.add_option("--retune", a.retune, "Milliseconds that the correction takes, 0 to 400 (20)");

@@ -81,7 +81,7 @@ void RunConvert(ConvertArguments arguments) {
     if (!arguments.format.empty()) asked = ParseSampleFormat(arguments.format);
     rules.inputs = {arguments.input};
 
-    AudioReader input(arguments.input);
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, SamplingFrequencyConverter::kMaxChannels, "the converter takes up to 48");
     const auto channels = static_cast<std::size_t>(input.Channels());
     AlignedConverter::Settings settings{.inRate = input.Rate(),

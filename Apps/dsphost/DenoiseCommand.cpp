@@ -89,7 +89,7 @@ void Learn(DenoiserProcessor& denoiser, const DenoiseArguments& arguments, const
     auto passages = ParsePassages(arguments.learn);
     while (!passages.empty()) {
         // Passages that overlap need the recording again.
-        AudioReader input(arguments.input);
+        AudioReader input(arguments.input, arguments.spoolLimit);
         std::int64_t position = 0;
         std::vector<Passage> later;
         for (const auto& passage : passages)
@@ -164,7 +164,7 @@ void RunDenoise(DenoiseArguments arguments) {
     DenoiserProcessor denoiser;
     if (!arguments.profile.empty()) LoadNoiseProfile(denoiser, arguments.profile);
     ApplySettings(denoiser, arguments.settings, learned);
-    AudioReader input(arguments.input);
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "noise is reduced in mono and stereo");
     const auto format = ChainFormat(input.Channels(), input.Rate(), kPrecision);
     denoiser.InitProcessing(kBlock, &format);

@@ -98,6 +98,7 @@ void EffectElement::ChoosePreset(std::string_view name) {
 void EffectElement::LoadChunk(const std::string& path) {
     const std::string bytes = ReadWhole(path, kLargestChunk);
     UseChunk(m_kind, *m_effect, {bytes.begin(), bytes.end()}, path);
+    m_source = path;
 }
 
 void EffectElement::SetParameter(std::string_view label, std::string_view text) {
@@ -143,7 +144,8 @@ void EffectElement::Automate(int lane, std::span<const AutomationPoint> points) 
     m_lanes.push_back({lane, {points.begin(), points.end()}});
 }
 
-// Not as envelopes: an effect plays those from the start after every move, and in the end does nothing else.
+// Not as envelopes: an effect goes through those from the start after every SetParam, which takes longer with
+// every point.
 void EffectElement::PlayDue(std::int64_t time) {
     for (auto& lane : m_lanes)
         // Before its first point a parameter has that point's value.

@@ -28,6 +28,7 @@ public:
     double LongestGap() override;
     std::vector<int> AutomationLanes(std::string_view parameter) override;
     void Automate(int lane, std::span<const AutomationPoint> points) override;
+    std::string SourceFile() const override { return m_source; }
     std::vector<std::uint8_t> State() override;
 
 private:
@@ -44,7 +45,7 @@ private:
 
     const EffectKind& m_kind;
     std::unique_ptr<Effect> m_effect;
-    std::string m_name;
+    std::string m_name, m_source;
     std::vector<EffectParameter> m_parameters;
     tWAVEFORMATEX m_format{};
     std::vector<Lane> m_lanes;

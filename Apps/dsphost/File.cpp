@@ -152,7 +152,12 @@ File::File(std::FILE* stream, std::string name, bool owned)
 
 File::File(const fs::path& path, Mode mode, std::string name)
     : m_stream(OpenStream(path, mode)), m_name(std::move(name)) {
-    if (!m_stream) throw UserError(m_name + ": " + std::strerror(errno));
+    const int reason = errno;
+    if (std::error_code none; fs::is_directory(path, none)) {
+        if (m_stream) std::fclose(m_stream);
+        throw UserError(m_name + ": is a directory; name a file");
+    }
+    if (!m_stream) throw UserError(m_name + ": " + std::strerror(reason));
 }
 
 File File::Temporary() {
@@ -237,8 +242,9 @@ bool File::BecomeLike(const fs::path& other) {
 void File::Sync() {
     errno = 0;
     const bool done = std::fflush(m_stream) == 0 && SyncStream(m_stream) == 0;
-    const bool unknown = errno == EINVAL || errno == ENOSYS;  // to file systems without a disk
-    if (!done && !unknown && m_error == 0) m_error = Reason();
+    // Where there is no disk behind the file there is nothing to wait for.
+    const bool noDisk = errno == EINVAL || errno == ENOSYS;
+    if (!done && !noDisk && m_error == 0) m_error = Reason();
 }
 
 void File::Close() {

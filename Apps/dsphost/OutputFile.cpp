@@ -21,12 +21,18 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// Where the bytes end up: links lead to the file behind them, so that it is replaced and not the link.
+// Where the bytes end up: links lead to the file behind them, so that it is replaced and not the link. A link
+// is left only by links in a circle.
 fs::path Target(const std::string& path) {
+    constexpr int kMostLinks = 40;
     std::error_code error;
-    // What does not exist stays relative otherwise.
-    const auto resolved = fs::weakly_canonical(fs::absolute(PathOf(path)), error);
-    return error ? PathOf(path) : resolved;
+    // Absolute first: weakly_canonical leaves a relative path relative when nothing of it exists.
+    fs::path place = fs::absolute(PathOf(path), error);
+    // A link to a file that does not exist is followed here; weakly_canonical would stop at it.
+    for (int i = 0; i < kMostLinks && !fs::exists(place, error) && fs::is_symlink(place, error); ++i)
+        place = place.parent_path() / fs::read_symlink(place, error);
+    const auto resolved = fs::weakly_canonical(place, error);
+    return error ? place : resolved;
 }
 
 std::optional<FileIdentity> IdentityOfInput(const std::string& path) {
@@ -131,6 +137,8 @@ OutputFile::OutputFile(const std::string& path, const OutputRules& rules)
     const auto status = fs::status(m_target, error);
     if (fs::is_directory(status)) throw UserError(path + ": is a directory; name a file");
     m_existed = fs::exists(status);
+    if (!m_existed && fs::is_symlink(m_target, error))
+        throw UserError(path + ": is a link that leads back to itself; name a file");
     if (m_existed && !fs::is_regular_file(status)) {
         m_file.emplace(m_target, File::Mode::Write, path);
         return;

@@ -36,7 +36,6 @@ public:
 
 private:
     friend void CommitTogether(std::span<OutputFile* const> files);
-    void MakePartial(const std::filesystem::path& directory);
     void Complete();
     void Place(SignalsWait& wait, bool keepOld);
     void TakeBack();

@@ -71,7 +71,7 @@ std::unique_ptr<Picture> PictureOptions::Make(int narrower) const {
     if (!font.empty() && !std::filesystem::is_regular_file(PathOf(font)))
         throw UserError("--font: there is no file \"" + font + "\"");
     if (!font.empty() && !IsTypeface(font))
-        throw UserError("--font: \"" + font + "\" is no TrueType or OpenType font");
+        throw UserError("--font: \"" + font + "\" is not a TrueType or OpenType font");
     Corvo::DrawingFont::SetFile(font);
     return std::make_unique<Picture>(width, height, dpi);
 }

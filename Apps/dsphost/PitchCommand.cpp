@@ -74,7 +74,7 @@ void RunPitch(PitchArguments arguments) {
     if (!arguments.format.empty()) asked = ParseSampleFormat(arguments.format);
     arguments.writing.rules.inputs = {arguments.input};
 
-    AudioReader input(arguments.input);
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "the pitch is shifted in mono and stereo");
     OfflinePitchShift shift(
         {input.Rate(), input.Channels(), arguments.semitones,

@@ -24,6 +24,9 @@
 namespace dsphost {
 namespace {
 
+// Messages repeat arguments, which may be of any length. What would be accepted stands at the end.
+constexpr std::size_t kLongestMessage = 400;
+
 constexpr int kInterrupted = 130;
 constexpr std::string_view kInterruptedMessage = "dsphost: interrupted\n";
 
@@ -144,7 +147,7 @@ void Print(const std::string& text) {
 }
 
 void PrintMessage(const std::string& text) {
-    const std::string line = "dsphost: " + Escaped(text) + "\n";
+    const std::string line = "dsphost: " + ShortenedInside(Escaped(text), kLongestMessage) + "\n";
     if (!WriteToConsole(stderr, line)) std::fputs(line.c_str(), stderr);
 }
 

@@ -67,7 +67,8 @@ void RunRender(RenderArguments arguments) {
     RefuseSameOutputs(outputs);
 
     Chain chain(arguments.effects);
-    AudioReader input(arguments.input);
+    for (std::size_t i = 0; i < chain.Size(); ++i) rules.inputs.push_back(chain.Element(i).SourceFile());
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "the effects process mono and stereo");
     if (!arguments.automation.empty()) LoadAutomation(arguments.automation, input.Rate(), chain);
     const auto chunks = PrepareChunks(arguments, chain);

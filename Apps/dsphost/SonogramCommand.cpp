@@ -49,8 +49,8 @@ int SpareColumns(const AudioReader& input, int columns) {
 void RunSonogram(SonogramArguments arguments) {
     if (arguments.speed) Check(*arguments.speed, kSlowest, kFastest, "--speed");
     Check(arguments.scheme, 0, kLastScheme, "--scheme");
-    arguments.writing.rules.inputs = {arguments.input};
-    AudioReader input(arguments.input);
+    arguments.writing.rules.inputs = {arguments.input, arguments.drawing.font};
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
     auto picture = arguments.drawing.Make();
 

@@ -125,7 +125,7 @@ void Draw(kivspectrum& analyser, const std::vector<double>& power, const std::ve
 void RunSpectrum(SpectrumArguments arguments) {
     Check(arguments);
     RefuseSameOutputs({arguments.picture, arguments.csv});
-    arguments.writing.rules.inputs = {arguments.input, arguments.profile};
+    arguments.writing.rules.inputs = {arguments.input, arguments.profile, arguments.drawing.font};
     auto& settings = kivspectrum::settings;
     settings.window_type = static_cast<std::int32_t>(FindName(arguments.window, kWindows, "window"));
     settings.window_length = arguments.length;
@@ -134,7 +134,7 @@ void RunSpectrum(SpectrumArguments arguments) {
     settings.view_option_e = static_cast<std::int32_t>(Corvo::CurveStyle::Filled);
     kivspectrum::SetAnalysisWindowsOverlap(arguments.overlap);
 
-    AudioReader input(arguments.input);
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "the analyser takes the mean of up to 64");
     kivspectrum analyser;
     analyser.set_parameters(input.Rate());

@@ -117,6 +117,13 @@ std::string Shortened(std::string_view text, std::size_t most) {
     return std::string(text.substr(0, most)) + "...";
 }
 
+std::string ShortenedInside(std::string_view text, std::size_t most) {
+    if (text.size() <= most) return std::string(text);
+    auto end = text.substr(text.size() - most / 2);
+    while (!end.empty() && (static_cast<unsigned char>(end[0]) & 0xC0) == 0x80) end.remove_prefix(1);
+    return Shortened(text, most / 2) + std::string(end);
+}
+
 std::string_view Trimmed(std::string_view text) {
     constexpr std::string_view kBlanks = " \t\r\n\f\v";
     const auto first = text.find_first_not_of(kBlanks);

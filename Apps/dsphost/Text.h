@@ -15,6 +15,8 @@ std::wstring Wide(std::string_view utf8);
 std::string Escaped(std::string_view text);
 // At most `most` bytes, with dots where the rest was.
 std::string Shortened(std::string_view text, std::size_t most);
+// The same, with the dots in the middle.
+std::string ShortenedInside(std::string_view text, std::size_t most);
 inline constexpr std::size_t kLongestQuote = 60;  // of what a message repeats
 // Blanks removed at both ends.
 std::string_view Trimmed(std::string_view text);

@@ -123,7 +123,7 @@ bool IsMidi(const std::string& path) {
 
 void RunTuneVoice(TuneVoiceArguments arguments) {
     auto& rules = arguments.writing.rules;
-    rules.inputs = {arguments.input};
+    rules.inputs = {arguments.input, arguments.drawing.font};
     RefuseSameOutputs({arguments.output, arguments.notes, arguments.curve});
     std::optional<SampleFormat> asked;
     if (!arguments.format.empty()) asked = ParseSampleFormat(arguments.format);
@@ -133,7 +133,7 @@ void RunTuneVoice(TuneVoiceArguments arguments) {
     std::vector<std::unique_ptr<ChainElement>> elements;
     elements.push_back(std::make_unique<VoiceTuner>(arguments, curve.readings));
     Chain chain(std::move(elements));
-    AudioReader input(arguments.input);
+    AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "the pitch is corrected in mono and stereo");
     std::unique_ptr<Picture> picture;
     std::unique_ptr<OutputFile> drawing;

@@ -84,7 +84,8 @@ private:
 
 class Listener {
 public:
-    explicit Listener(const TunerArguments& arguments) : m_arguments(arguments), m_input(arguments.input) {
+    explicit Listener(const TunerArguments& arguments)
+        : m_arguments(arguments), m_input(arguments.input, arguments.spoolLimit) {
         RequireFormat(m_input, kMostChannels, "the analyser takes the mean of up to 64");
         m_analyser.set_parameters(m_input.Rate());
         m_analyser.SetOn(true);
@@ -118,7 +119,7 @@ const std::vector<std::string>& DetectionMethods() {
 }
 
 void RunTuner(TunerArguments arguments) {
-    arguments.writing.rules.inputs = {arguments.input};
+    arguments.writing.rules.inputs = {arguments.input, arguments.drawing.font};
     const auto temperaments = Names(Tuner::GetTemperamentName);
     const auto sensitivities = Names(Tuner::GetSensibilityPresetName);
     Tuner::SetDetectionMethod(static_cast<int>(FindName(arguments.method, DetectionMethods(), "method")));
@@ -148,8 +149,10 @@ void RunTuner(TunerArguments arguments) {
     if (!drawn && arguments.at)
         throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; the file ends before");
     if (!drawn) draw();
-    Save(*picture, *output);
+    Write(*picture, *output);
+    // First, so that there is no picture when it fails.
     if (arguments.json) Print(Json(all));
+    output->Commit();
 }
 
 }  // namespace dsphost

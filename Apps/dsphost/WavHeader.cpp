@@ -21,8 +21,8 @@ constexpr std::array kCodings{
 
 constexpr std::uint32_t kLargestFormatChunk = 4096;
 
-// What programs that stream write where they do not know the size, less the part of a frame that is left
-// over. All but the first two could also be meant.
+// What programs write for the size of a stream that they do not know, rounded down to whole frames. The first
+// two can mean nothing else; as many bytes as the others say could also be there.
 constexpr std::array<std::uint32_t, 6> kUnknownSizes{0,          0xFFFFFFFF, 0x7FFFF000,
                                                      0x7FFFFF00, 0x7FFFFFFF, 0x80000000};
 constexpr std::size_t kCertainlyUnknown = 2;
@@ -74,6 +74,16 @@ bool ReadFormatChunk(Keeper& stream, std::uint32_t size, WavStreamHeader& header
     return stream.Number(12, 2) == static_cast<std::uint32_t>(header.channels * bits / 8);
 }
 
+// An RF64 has its sizes in front, with 64 bits: of the file, of the samples. Nothing where the size is not
+// known.
+std::optional<std::int64_t> ReadLongSize(Keeper& stream, std::uint32_t size) {
+    constexpr std::uint32_t kHighest = 0x3FFFFFFF;
+    if (size < 16 || size > kLongestWavHeader || !stream.Fetch(size + (size & 1))) return {};
+    const std::uint32_t low = stream.Number(8, 4), high = stream.Number(12, 4);
+    if (high > kHighest || (high == 0 && low == 0)) return {};
+    return static_cast<std::int64_t>(std::uint64_t{high} << 32 | low);
+}
+
 void TakeSize(std::uint32_t size, std::uint32_t frameBytes, WavStreamHeader& header) {
     const auto unknown = std::ranges::find_if(kUnknownSizes, [&](std::uint32_t value) {
         return size == value || size == value - value % frameBytes;
@@ -95,18 +105,26 @@ int WavSampleBytes(int subtype) {
 std::optional<WavStreamHeader> ReadWavStreamHeader(const ByteSource& source,
                                                    std::vector<unsigned char>& bytes) {
     Keeper stream(source, bytes);
-    if (!stream.Fetch(12) || stream.Text(0) != "RIFF" || stream.Text(8) != "WAVE") return {};
+    if (!stream.Fetch(12) || stream.Text(8) != "WAVE") return {};
+    const bool rf64 = stream.Text(0) == "RF64";
+    if (!rf64 && stream.Text(0) != "RIFF") return {};
     WavStreamHeader header;
+    std::optional<std::int64_t> longSize;
     while (stream.Fetch(8)) {
         const std::string_view name = stream.Text(0);
         const std::uint32_t size = stream.Number(4, 4);
         if (name == "data") {
             if (header.channels == 0) return {};
-            TakeSize(size, static_cast<std::uint32_t>(header.channels * WavSampleBytes(header.subtype)),
-                     header);
+            if (rf64 && longSize && size == 0xFFFFFFFF)
+                header.sampleBytes = longSize;
+            else
+                TakeSize(size, static_cast<std::uint32_t>(header.channels * WavSampleBytes(header.subtype)),
+                         header);
             return header;
         }
-        if (name == "fmt ") {
+        if (name == "ds64") {
+            longSize = ReadLongSize(stream, size);
+        } else if (name == "fmt ") {
             if (!ReadFormatChunk(stream, size, header)) return {};
         } else if (!stream.Fetch(std::size_t{size} + (size & 1))) {
             return {};

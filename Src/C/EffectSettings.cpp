@@ -7,6 +7,7 @@
 #include "C/Calls.h"
 #include "C/EffectStream.h"
 #include "DSP/Effects/ParameterInput.h"
+#include "DSP/Effects/SettingsInput.h"
 
 // An effect's parameters, automation, presets and state.
 
@@ -190,11 +191,10 @@ dsp_status DSP_CALL dsp_effect_set_state(dsp_effect* effect, const void* bytes, 
         Require(size <= kMostBytes, "the state is too large to be an effect's settings");
         const auto* const first = static_cast<const std::uint8_t*>(bytes);
         const std::vector<std::uint8_t> chunk(first, first + size);
-        const auto before = StateOf(*stream.effect);
-        stream.effect->SetSettingsChunk(chunk);
-        // Effects ignore what they cannot read without a word.
-        Require(StateOf(*stream.effect) != before || chunk == before,
+        const auto* const kind = Corvo::DSP::FindEffectKind(stream.effect->GetName());
+        Require(kind && Corvo::DSP::TakesSettings(*kind, chunk),
                 std::to_string(size) + " bytes are not settings of " + stream.effect->GetName(),
                 DSP_NOT_UNDERSTOOD);
+        stream.effect->SetSettingsChunk(chunk);
     });
 }

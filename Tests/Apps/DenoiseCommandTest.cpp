@@ -61,27 +61,5 @@ TEST_F(DenoiseCommand, LearnsAndCleansInOneCommand) {
     EXPECT_NEAR(std::stod(table.substr(level)), std::stod(table.substr(profile)), 1.5);
 }
 
-TEST_F(DenoiseCommand, RefusesWhatItCannotDo) {
-    Save("in.wav", Recording(48000));
-    SaveBytes("junk", "no profile");
-    const struct {
-        const char *arguments, *words;
-    } cases[] = {{"--learn 1", "--learn|accepted: FROM:TO"},
-                 {"--learn 2:1", "2:1|accepted"},
-                 {"--learn -1:1", "-1:1|accepted"},
-                 {"--learn 3:5", "3:5|in.wav|4.00 s"},
-                 {"--learn 1:1.002", "1:1.002|too short"},
-                 {"--profile junk", "junk|no noise profile"},
-                 {"--profile missing", "missing"},
-                 {"--save-profile p", "--save-profile|--learn"},
-                 {"--set Reduktion=3", "Reduktion|did you mean|Reduction"},
-                 {"--residue in.wav -y", "in.wav"}};
-    for (const auto& [arguments, words] : cases) {
-        SCOPED_TRACE(arguments);
-        ExpectRefused(Run(std::string("denoise in.wav out.wav -q ") + arguments), words);
-    }
-    ExpectRefused(Run("denoise - out.wav --learn 0:1 -q", Bytes("in.wav")), "--learn|standard input");
-}
-
 }  // namespace
 }  // namespace AppTest

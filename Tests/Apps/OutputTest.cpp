@@ -52,6 +52,23 @@ TEST_F(Outputs, AppearTogetherOrNotAtAll) {
     EXPECT_EQ(std::distance(fs::directory_iterator("."), {}), 2);
 }
 
+#if !defined(_WIN32)
+// Also where nothing is behind the link yet.
+TEST_F(Outputs, FollowLinksAndKeepThem) {
+    fs::create_directory("folder");
+    fs::create_symlink("folder/far.wav", "link.wav");
+    fs::create_symlink("circle.wav", "circle.wav");
+    Save("in.wav", NoiseSound(10));
+    for (const std::string option : {"", " -y"}) {
+        Succeed("render in.wav link.wav" + option);
+        EXPECT_TRUE(fs::is_symlink("link.wav"));
+        EXPECT_EQ(Bytes("folder/far.wav"), Bytes("in.wav"));
+    }
+    ExpectRefused(Run("render folder/far.wav link.wav -y"), "link.wav|input");
+    ExpectRefused(Run("render in.wav circle.wav -y"), "circle.wav|link");
+}
+#endif
+
 // Names that leave no room for what is put behind them, and names that are not of this place.
 TEST_F(Outputs, HaveAnyName) {
     for (const std::string& name :

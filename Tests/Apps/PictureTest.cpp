@@ -1,16 +1,16 @@
-#include <filesystem>
-#include <fstream>
-
 #include <cairo.h>
 #include <gtest/gtest.h>
 
+#include "Apps/Program.h"
 #include "Picture.h"
 
 using dsphost::Picture;
 
+class PictureFile : public AppTest::Program {};
+
 // Catches red and blue exchanged, an alpha that lets the viewer's ground through, and a Paint that starts
 // over instead of going on.
-TEST(Picture, IsSavedAsItWasDrawn) {
+TEST_F(PictureFile, IsSavedAsItWasDrawn) {
     Picture picture(5, 3, 192.0f);
     picture.Paint([](auto& target) {
         EXPECT_EQ(target.Scale(), 2.0f);
@@ -19,10 +19,8 @@ TEST(Picture, IsSavedAsItWasDrawn) {
     picture.Paint([](auto& target) { target.FillRectangle({4, 2, 1, 1}, {0x00FF8000u, 128}); });
 
     const auto png = picture.Png();
-    const auto path = (std::filesystem::temp_directory_path() / "dsphost-picture.png").string();
-    std::ofstream(path, std::ios::binary).write(reinterpret_cast<const char*>(png.data()), std::ssize(png));
-    cairo_surface_t* const image = cairo_image_surface_create_from_png(path.c_str());
-    std::filesystem::remove(path);
+    AppTest::SaveBytes("picture.png", {png.begin(), png.end()});
+    cairo_surface_t* const image = cairo_image_surface_create_from_png("picture.png");
     ASSERT_EQ(cairo_surface_status(image), CAIRO_STATUS_SUCCESS);
     EXPECT_EQ(cairo_image_surface_get_format(image), CAIRO_FORMAT_RGB24);
     ASSERT_EQ(cairo_image_surface_get_width(image), 5);

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Apps/Program.h"
+#include "AudioReader.h"
 #include "WavHeader.h"
 
 using namespace std::string_literals;
@@ -14,10 +15,6 @@ using namespace std::string_literals;
 constexpr bool kSanitized = true;
 #else
 constexpr bool kSanitized = false;
-#endif
-
-#if !defined(_WIN32)
-#include <sys/resource.h>
 #endif
 
 namespace AppTest {
@@ -33,38 +30,64 @@ protected:
     }
 };
 
-// Every kind of file may come through standard input; what goes out is WAV with the same samples.
+// Every kind of file may come through standard input, and a WAV whose writer did not know its length, where
+// 0, the largest size or half of it stand. A stated size ends the samples; what follows them is not sound.
 TEST_F(Pipes, ReadsAnythingFromStandardInput) {
-    for (const int format : {SF_FORMAT_WAV | SF_FORMAT_FLOAT, SF_FORMAT_WAVEX | SF_FORMAT_PCM_32,
-                             SF_FORMAT_RF64 | SF_FORMAT_PCM_16, SF_FORMAT_FLAC | SF_FORMAT_PCM_16}) {
-        SCOPED_TRACE(format);
-        Save("in", NoiseSound(3000, 1, format));
-        SaveBytes("out", Succeed("render - - --fx Gain", Bytes("in")));
-        EXPECT_EQ(Load("out").samples, Load("in").samples);
+    const struct {
+        int format;
+        std::string size, behind;
+    } cases[] = {
+        {SF_FORMAT_WAV | SF_FORMAT_FLOAT, "", ""},
+        {SF_FORMAT_WAVEX | SF_FORMAT_PCM_32, "", ""},
+        {SF_FORMAT_RF64 | SF_FORMAT_PCM_16, "", "LIST....and so on"},
+        {SF_FORMAT_FLAC | SF_FORMAT_PCM_16, "", ""},
+        {kPcm16, "\0\0\0\0"s, ""},
+        {kPcm16, "\xFF\xFF\xFF\xFF", ""},
+        {kPcm16, "\0\xF0\xFF\x7F"s, ""},
+        {kPcm16, "", "LIST....and so on"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(testing::Message() << c.format << " " << testing::PrintToString(c.size));
+        const auto sound = NoiseSound(3000, 1, c.format);
+        Save("in", sound);
+        EXPECT_EQ(Piped(Bytes("in").replace(40, c.size.size(), c.size) + c.behind), sound.samples);
     }
 }
 
-// A WAV whose writer did not know its length: 0, the largest size or half of it stand there.
-TEST_F(Pipes, ReadsAStreamToItsEnd) {
-    const auto sound = NoiseSound(3000);
-    Save("in.wav", sound);
-    for (const std::string& size :
-         {std::string(4, '\0'), std::string(4, '\xFF'), std::string("\x00\xF0\xFF\x7F", 4)})
-        EXPECT_EQ(Piped(Bytes("in.wav").replace(40, 4, size)), sound.samples);
-    // A stated size ends the samples; what follows them is not sound.
-    EXPECT_EQ(Piped(Bytes("in.wav") + "LIST....and so on"), sound.samples);
+#if !defined(_WIN32)
+// A size that may be meant: samples of 2 GiB less 4 KiB, and then a chunk. The samples take no room on the
+// disk.
+TEST_F(Pipes, EndsAtAChunkBehindADoubtfulSize) {
+    if (kSanitized) GTEST_SKIP() << "takes long there";
+    constexpr std::int64_t kSize = 0x7FFFF000, kFrameBytes = 64;
+    const auto head = dsphost::MakeWavHeader({8, 48000, SF_FORMAT_DOUBLE}, kSize);
+    dsphost::File file("sparse.wav", dsphost::File::Mode::New, "sparse.wav");
+    file.Write(head.data(), head.size());
+    file.Seek(kSize, SEEK_CUR);
+    const std::string rest = "LIST" + std::string(kFrameBytes, '.');
+    file.Write(rest.data(), rest.size());
+    file.Seek(0);
+    dsphost::AudioReader reader(std::move(file), true);
+    std::vector<double> block(8 * 4096);
+    std::int64_t frames = 0;
+    for (int got = 4096; got == 4096; frames += got) got = reader.Read(block.data(), 4096);
+    EXPECT_EQ(frames, kSize / kFrameBytes);
 }
+#endif
 
 // A producer that died is no reason to lose what came, but it must not pass unnoticed.
 TEST_F(Pipes, WarnsOfInputThatEndsEarly) {
     Save("in.wav", NoiseSound(3000));
     const std::string cut = Bytes("in.wav").substr(0, 44 + 4 * 2000);
     SaveBytes("cut.wav", cut);
+    Save("in.rf64", NoiseSound(3000, 2, SF_FORMAT_RF64 | SF_FORMAT_PCM_16));
+    SaveBytes("cut.rf64", Bytes("in.rf64").substr(0, Bytes("in.rf64").size() - 4 * 1000));
     Save("in.ogg", NoiseSound(200000, 1, SF_FORMAT_OGG | SF_FORMAT_VORBIS));
     SaveBytes("cut.ogg", Bytes("in.ogg").substr(0, Bytes("in.ogg").size() / 2));
     for (const auto& [arguments, warning] :
          {std::pair{"- out.wav", "standard input: ended after 2000 of 3000 frames\n"},
           {"cut.wav out.wav", "cut.wav: ended after 2000 of 3000 frames\n"},
+          {"cut.rf64 out.wav", "cut.rf64: ended after 2000 of 3000 frames\n"},
           {"cut.ogg out.wav", "cut.ogg: was cut off, after "}}) {
         const auto result = Run(std::string("render -y ") + arguments, cut);
         EXPECT_EQ(result.status, 0);
@@ -76,11 +99,8 @@ TEST_F(Pipes, WarnsOfInputThatEndsEarly) {
 // Only the sizes that programs write when they do not know it stand for "unknown"; others are meant, 2 GiB
 // and more too.
 TEST(WavStreams, KnowTheirSizeOrNot) {
-    Sound head = NoiseSound(0, 1, SF_FORMAT_WAV | SF_FORMAT_PCM_24);
-    const auto path = (std::filesystem::temp_directory_path() / "dsphost-head.wav").string();
-    Save(path, head);
-    const std::string wav = Bytes(path).substr(0, 44);
-    std::filesystem::remove(path);
+    const auto head = dsphost::MakeWavHeader({1, 48000, SF_FORMAT_PCM_24}, 0);
+    const std::string wav(head.begin(), head.end());
     const auto read = [](std::string bytes) {
         std::vector<unsigned char> kept;
         return dsphost::ReadWavStreamHeader(
@@ -160,13 +180,11 @@ TEST_F(Pipes, StreamsLongFilesInLittleMemory) {
     Save("head.wav", head);
     SaveBytes("head.wav", Bytes("head.wav").replace(40, 4, "\xFF\xFF\xFF\xFF"));
     const std::size_t bytes = std::size_t{10 * 60} * 96000 * 4;
-    const auto result = Shell("{ cat head.wav; head -c " + std::to_string(bytes) +
-                              " /dev/zero; } | DSPHOST render - - --fx Gain --fx 'Gain: Pan=1' | wc -c");
-    ASSERT_EQ(result.status, 0);
-    EXPECT_EQ(std::stoull(result.out), bytes + 44);
-    rusage usage{};
-    getrusage(RUSAGE_CHILDREN, &usage);
-    EXPECT_LT(usage.ru_maxrss, 64 * 1024) << "KiB, the largest of all programs that the tests ran";
+    const auto result = Shell(
+        "{ cat head.wav; head -c " + std::to_string(bytes) +
+        " /dev/zero; } | { ulimit -v 131072; DSPHOST render - - --fx Gain --fx 'Gain: Pan=1'; } | wc -c");
+    ASSERT_EQ(result.status, 0) << result.err;
+    EXPECT_EQ(std::stoull(result.out), bytes + 44) << result.err;
 }
 #endif
 

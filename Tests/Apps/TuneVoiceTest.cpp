@@ -80,17 +80,4 @@ TEST_F(TuneVoice, WritesNotesAsMidi) {
     EXPECT_TRUE(midi.ends_with(std::string("\0\xFF\x2F\0", 4)));
 }
 
-TEST_F(TuneVoice, RefusesWhatItDoesNotUnderstand) {
-    const auto refused = [&](const std::string& options, const std::string& words) {
-        ExpectRefused(Run("tune-voice in.wav out.wav " + options + " -q"), words);
-    };
-    refused("--scale 'H minor'", "H minor|A minor");
-    refused("--scale 'A nonsense'", "nonsense|scale mode");
-    refused("--scale A", "root and a mode");
-    refused("--retune fast", "Retune speed|fast|400");
-    refused("--lowest 80", "Lowest pitch|55, 75, 110, 160");
-    refused("--notes n.txt", "n.txt|.csv|.mid");
-    refused("--notes out.wav.csv --curve out.wav.csv", "out.wav.csv");
-}
-
 }  // namespace AppTest

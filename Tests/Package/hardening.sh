@@ -4,9 +4,10 @@
 set -euo pipefail
 failed=0
 
+complain() { echo "$file: $1"; failed=1; }
 # need WHAT PATTERN TEXT: the text must have a line like that; need_no: it must have none.
-need() { grep -qE -- "$2" <<< "$3" || { echo "$file: $1"; failed=1; }; }
-need_no() { ! grep -qE -- "$2" <<< "$3" || { echo "$file: $1"; failed=1; }; }
+need() { grep -qE -- "$2" <<< "$3" || complain "$1"; }
+need_no() { ! grep -qE -- "$2" <<< "$3" || complain "$1"; }
 
 check_elf() {
     local dynamic segments imports places
@@ -16,7 +17,7 @@ check_elf() {
     ! grep -qE ' (v?sn?printf|v?swprintf|wmemcpy)\b' <<< "$imports" ||
         need "no checked copies (-D_FORTIFY_SOURCE=2)" ' __[a-z]+_chk\b' "$imports"
     # The compiler's start-up code has a few landing places of its own.
-    [ "$(objdump -d "$file" | grep -c endbr)" -gt 20 ] || need "jumps are not guarded (-fcf-protection)" more ""
+    [ "$(objdump -d "$file" | grep -c endbr)" -gt 20 ] || complain "jumps are not guarded (-fcf-protection)"
     need "functions are bound late (-z now)" 'FLAGS.*\bNOW\b' "$dynamic"
     need "pointers to functions stay writable (-z relro)" 'GNU_RELRO' "$segments"
     need "its stack is executable" 'GNU_STACK.* RW ' "$segments"
