@@ -133,9 +133,9 @@ struct PitchShift::BackEnds {
     static constexpr int kNone = -1;
 
     LatestValue<BackEnd> slots;
-    // In use, or on its way to the audio thread: it gets what the other thread sends. Only that thread frees
-    // back-ends, so what it reads here lives while it uses it.
-    std::atomic<PitchAdapter*> newest{nullptr};
+    // The user-interface thread sends edits to the newest one, in use or on its way. Only that thread frees
+    // back-ends, so what it reads here lives while it uses it. The one in use lives for both threads.
+    std::atomic<PitchAdapter*> newest{nullptr}, inUse{nullptr};
     std::atomic<int> newestIndex{kNone};
     std::atomic<bool> factorsPending{false};  // automation stored some, on the audio thread
     std::atomic<unsigned> edits{0};           // of the pitch, by the user-interface thread
@@ -152,6 +152,9 @@ struct PitchShift::BackEnds {
             made.toldAhead = Setup::Of(record, channels.load(), known);
             made.toldAhead->Tell(*made.adapter);
         }
+        // The audio thread may have given the old one back without having named the new one yet.
+        auto* cameBack = slots.Draft().adapter.get();
+        inUse.compare_exchange_strong(cameBack, nullptr);
         newest.store(made.adapter.get(), std::memory_order_release);
         newestIndex.store(index);
         slots.Draft() = std::move(made);
@@ -161,13 +164,14 @@ struct PitchShift::BackEnds {
     // No block is being processed.
     void Clear() {
         newest.store(nullptr);
+        inUse.store(nullptr);
         newestIndex.store(kNone);
         slots.Clear();
     }
 
     // Audio thread: looks for a new one. The index of the one then in use, kNone without any.
     int Take() {
-        slots.Take();
+        if (slots.Take()) NameTheOneInUse();
         return slots.Taken().index;
     }
     PitchAdapter* InUse() { return slots.Taken().adapter.get(); }
@@ -181,11 +185,13 @@ struct PitchShift::BackEnds {
             // Not if another one is on its way.
             newestIndex.compare_exchange_strong(expectedIndex, index);
             newest.compare_exchange_strong(expected, InUse());
+            NameTheOneInUse();
         }
         if (std::exchange(taken.toldAhead, {}) != setup) setup.Tell(*InUse());
     }
 
 private:
+    void NameTheOneInUse() { inUse.store(InUse(), std::memory_order_release); }
     static BackEnd Make(int index) {
         return {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(index)), index, {}};
     }
@@ -252,7 +258,7 @@ void PitchShift::TakeRecord(const _transform_props& record) {
 void PitchShift::Cleanup() { m_back_ends->Clear(); }
 
 int PitchShift::GetLatency() {
-    PitchAdapter* const adapter = m_back_ends->newest.load(std::memory_order_acquire);
+    PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_acquire);
     return adapter ? adapter->GetLatency() : 0;
 }
 

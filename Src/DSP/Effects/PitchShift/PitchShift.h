@@ -66,7 +66,8 @@ public:
     // is in use. Not while another thread edits. False without memory. `force` makes no difference.
     bool InitState(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format,
                    bool force);
-    // Derives the pitch factors and sends them to the back-end, if there is one.
+    // Derives the pitch factors and sends them to the newest back-end, if there is one. On the user-interface
+    // thread.
     void CookPitchShift(const PitchShiftPrivate::_transform_props& record, int channels);
     // Limited to the presets there are.
     static PitchShiftPrivate::_transform_props GetPresetData(int preset);
