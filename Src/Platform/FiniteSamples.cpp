@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <cstring>
 
+#include "Platform/Processor.h"
+
 namespace Corvo {
 namespace {
 
@@ -29,7 +31,7 @@ bool RestIsFinite(const Sample* samples, std::size_t count) {
 }
 
 template <typename Sample>
-bool AllFiniteBaseline(const Sample* samples, std::size_t count) {
+bool Baseline(const Sample* samples, std::size_t count) {
     constexpr std::size_t kLanes = 16 / sizeof(Sample);
     const __m128i bits = _mm_set1_epi32(static_cast<int>(Exponent<Sample>::kBits));
     __m128i found = _mm_setzero_si128();
@@ -43,10 +45,11 @@ bool AllFiniteBaseline(const Sample* samples, std::size_t count) {
 }
 
 template <typename Sample>
-[[gnu::target("avx2")]] bool AllFiniteWide(const Sample* samples, std::size_t count) {
+[[gnu::target("avx2")]] bool Wide(const Sample* samples, std::size_t count) {
     constexpr std::size_t kLanes = 32 / sizeof(Sample);
     const auto* from = reinterpret_cast<const __m256i*>(samples);
-    // Doubled, a word has lost its sign, and the largest one says it all.
+    // Doubling shifts the sign out of a word. Then a sample is not finite where a word reaches the exponent's
+    // bits, shifted as well: the largest words tell whether any does.
     __m256i most[4] = {_mm256_setzero_si256(), _mm256_setzero_si256(), _mm256_setzero_si256(),
                        _mm256_setzero_si256()};
     std::size_t left = count;
@@ -67,15 +70,18 @@ template <typename Sample>
            RestIsFinite(samples + (count - left), left);
 }
 
-const bool wide = __builtin_cpu_supports("avx2");
-
 }  // namespace
 
+bool AllFiniteBaseline(const float* samples, std::size_t count) { return Baseline(samples, count); }
+bool AllFiniteBaseline(const double* samples, std::size_t count) { return Baseline(samples, count); }
+bool AllFiniteAvx2(const float* samples, std::size_t count) { return Wide(samples, count); }
+bool AllFiniteAvx2(const double* samples, std::size_t count) { return Wide(samples, count); }
+
 bool AllFinite(const float* samples, std::size_t count) {
-    return wide ? AllFiniteWide(samples, count) : AllFiniteBaseline(samples, count);
+    return HasAvx2() ? Wide(samples, count) : Baseline(samples, count);
 }
 bool AllFinite(const double* samples, std::size_t count) {
-    return wide ? AllFiniteWide(samples, count) : AllFiniteBaseline(samples, count);
+    return HasAvx2() ? Wide(samples, count) : Baseline(samples, count);
 }
 
 }  // namespace Corvo

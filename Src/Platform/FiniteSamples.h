@@ -12,6 +12,11 @@ namespace Corvo {
 // there.
 bool AllFinite(const float* samples, std::size_t count);
 bool AllFinite(const double* samples, std::size_t count);
+// What AllFinite calls, by the processor.
+bool AllFiniteBaseline(const float* samples, std::size_t count);
+bool AllFiniteBaseline(const double* samples, std::size_t count);
+bool AllFiniteAvx2(const float* samples, std::size_t count);
+bool AllFiniteAvx2(const double* samples, std::size_t count);
 
 // Makes 0 of the samples that are not finite in an interleaved block, in the first `guarded` of its channels;
 // the channels after those are not touched. A planar block is one call with one channel per buffer.

@@ -33,7 +33,7 @@ constexpr std::array kEffects{
     EffectCase{.name = "Phaser", .make = Make<Phaser>, .phaseRunsOn = true},
     EffectCase{
         .name = "Echo", .make = Make<Echo>, .mayGrow = true, .linkedParameters = true, .shortestChunk = 92},
-    EffectCase{.name = "Tube distortion", .make = Make<TubeDistorsion>},
+    EffectCase{.name = "Tube distortion", .make = Make<TubeDistorsion>, .bounded = true},
     EffectCase{.name = "Pitch Shift",
                .make = Make<PitchShift>,
                .cuts = Cuts::Exempt,
@@ -42,7 +42,7 @@ constexpr std::array kEffects{
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
-    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>, .splices = true},
+    EffectCase{.name = "Denoiser", .make = Make<DenoiserProcessor>, .splices = true, .bounded = true},
     EffectCase{.name = "Cantrix", .make = Make<PitchDoctor>, .splices = true},
 };
 

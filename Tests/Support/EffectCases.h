@@ -27,6 +27,8 @@ struct EffectCase {
     const char* engineAllocates = nullptr;
     // Some settings have a loop gain of 1 or more, so the output may grow without bound.
     bool mayGrow = false;
+    // No input makes the output overflow.
+    bool bounded = false;
     // Parameters that move together on purpose: setting a parameter may change others of its group.
     bool linkedParameters = false;
     // The shortest older layout that is still taken, in bytes; below it, and below today's, nothing changes.

@@ -2,10 +2,12 @@
 
 #include <algorithm>
 
+#include "Platform/Processor.h"
+
 namespace Corvo::DSP {
 namespace {
 
-bool wideKernels = __builtin_cpu_supports("avx2");
+bool wideKernels = HasAvx2();
 
 template <typename Sample>
 const EqKernels<Sample>& Kernels() {

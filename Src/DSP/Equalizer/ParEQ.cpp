@@ -67,7 +67,7 @@ struct Lanes {
     int frames;
 };
 
-// One channel, or two neighbouring ones: polarity, bands, analysers. What grew beyond all numbers is cleared.
+// One channel, or two neighbouring ones: polarity, bands, analysers. What overflowed is cleared.
 template <typename Sample>
 void RunChannels(const Lanes<Sample>& block, std::span<EqChannel* const> channels,
                  const builtin_effects_data* records, int numBands, std::int32_t& counter,

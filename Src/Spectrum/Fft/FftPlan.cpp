@@ -5,6 +5,8 @@
 #include <new>
 #include <numbers>
 
+#include "Platform/Processor.h"
+
 namespace Corvo::Fft {
 namespace {
 
@@ -124,8 +126,7 @@ const Plan<T>* BuildPlan(void* memory, int order, Kind kind) {
 
 template <typename T>
 const Kernels<T>& BestKernels() {
-    static const bool wide = __builtin_cpu_supports("avx2");
-    if (wide) return Avx2Kernels<T>();
+    if (HasAvx2()) return Avx2Kernels<T>();
     return BaselineKernels<T>();
 }
 

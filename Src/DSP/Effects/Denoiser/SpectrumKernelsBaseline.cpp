@@ -1,13 +1,12 @@
 #include "DSP/Effects/Denoiser/SpectrumKernelsFor.h"
+#include "Platform/Processor.h"
 
 namespace Corvo::DSP::Denoising {
 
 const SpectrumKernels& BaselineSpectrumKernels() { return KernelsFor<xsimd::sse2>::kTable; }
 
 const SpectrumKernels& BestSpectrumKernels() {
-    static const SpectrumKernels& best =
-        xsimd::available_architectures().avx2 ? Avx2SpectrumKernels() : BaselineSpectrumKernels();
-    return best;
+    return HasAvx2() ? Avx2SpectrumKernels() : BaselineSpectrumKernels();
 }
 
 }  // namespace Corvo::DSP::Denoising

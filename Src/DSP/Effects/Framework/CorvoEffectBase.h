@@ -197,7 +197,7 @@ public:
     bool IsPrepared() const;
     // Plays automation that is due, then processes one block in place. Never throws; a block of 0 frames
     // or fewer is left alone. An effect that remembers its input takes samples that are not finite for 0, and
-    // what grows beyond all numbers inside it is cleared when that shows: the next block is sound again.
+    // what overflows inside it is cleared when that shows: the next block is sound again.
     void Process(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags);
     void ProcessNoninterleaved(double* const* channels, int frames, const tWAVEFORMATEX* format,
                                ProcessFlags& flags);

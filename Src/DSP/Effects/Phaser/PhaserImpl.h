@@ -25,8 +25,8 @@ struct PhaserImpl {
         memories.fill(0.0);
         last = 0.0;
     }
-    // Feedback of 100 % can grow beyond all numbers, and would stay there. From any stage that shows at the
-    // end of the chain within a frame.
+    // With a feedback of 100 % the chain can overflow, and would stay so. Whatever the stage, that shows at
+    // the end of the chain within a frame.
     void ClearUnlessFinite() {
         if (!std::isfinite(last)) Clear();
     }

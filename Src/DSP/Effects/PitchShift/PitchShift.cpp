@@ -2,6 +2,8 @@
 
 #include <cmath>
 #include <new>
+#include <optional>
+#include <utility>
 
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
@@ -92,6 +94,33 @@ int BackEndIndex(const _transform_props& record) {
     return std::clamp(record.backEnd, 0, PitchAdapterInfo::kCount - 1);
 }
 
+void SendFactors(PitchAdapter& adapter, const std::array<std::int32_t, 2>& pitch, int channels) {
+    for (int channel = 0; channel < std::min(channels, 2); ++channel)
+        adapter.SetPitchFactor(channel, static_cast<float>(Factor(pitch[static_cast<std::size_t>(channel)])));
+}
+
+// All that a back-end is told.
+struct Setup {
+    std::array<std::int32_t, 2> pitch;
+    std::int32_t fftSize, quality;
+    int channels, rate;
+    bool operator==(const Setup&) const = default;
+
+    static Setup Of(const _transform_props& record, int channels, int rate) {
+        return {record.pitch, record.fftSize, record.quality, channels, rate};
+    }
+    // May throw std::bad_alloc.
+    void Tell(PitchAdapter& adapter) const {
+        if (channels < 1 || channels > kMostEngineChannels) return;
+        adapter.SetChannelsNum(channels);
+        adapter.SetSampleRate(rate);
+        SendFactors(adapter, pitch, channels);
+        adapter.SetFFTSize(fftSize);
+        adapter.SetQuality(quality);
+        adapter.CookFactors();
+    }
+};
+
 }  // namespace
 
 // The back-end in use, the one handed over, and the one that came back.
@@ -99,33 +128,44 @@ struct PitchShift::BackEnds {
     struct BackEnd {
         std::unique_ptr<PitchAdapter> adapter;
         int index = kNone;
+        std::optional<Setup> toldAhead;  // until the first cook
     };
     static constexpr int kNone = -1;
 
     LatestValue<BackEnd> slots;
-    // What the audio thread took, for the other thread to send pitch factors to. Only that thread frees
-    // back-ends, so what it reads here lives while it uses it.
-    std::atomic<PitchAdapter*> inUse{nullptr};
-    std::atomic<int> newest{kNone};           // index of the one in use, or of the one on its way
+    // The user-interface thread sends edits to the newest one, in use or on its way. Only that thread frees
+    // back-ends, so what it reads here lives while it uses it. The one in use lives for both threads.
+    std::atomic<PitchAdapter*> newest{nullptr}, inUse{nullptr};
+    std::atomic<int> newestIndex{kNone};
     std::atomic<bool> factorsPending{false};  // automation stored some, on the audio thread
     std::atomic<unsigned> edits{0};           // of the pitch, by the user-interface thread
-    std::atomic<int> channels{1};
-    tWAVEFORMATEX format{};  // the audio thread's
+    std::atomic<int> channels{1}, rate{0};    // 0: not known yet
+    tWAVEFORMATEX format{};                   // the audio thread's
 
-    // User-interface thread.
-    void HandOver(int index) {
-        if (newest.load() == index) return;
+    // User-interface thread. The back-end is configured here, as that allocates and takes its time.
+    // False when the newest one will do.
+    bool HandOver(const _transform_props& record) {
+        const int index = BackEndIndex(record);
+        if (newestIndex.load() == index) return false;
+        BackEnd made = Make(index);
+        if (const int known = rate.load(); known > 0) {
+            made.toldAhead = Setup::Of(record, channels.load(), known);
+            made.toldAhead->Tell(*made.adapter);
+        }
         // The audio thread may have given the old one back without having named the new one yet.
         auto* cameBack = slots.Draft().adapter.get();
         inUse.compare_exchange_strong(cameBack, nullptr);
-        slots.Draft() = Make(index);
-        newest.store(index);
+        newest.store(made.adapter.get(), std::memory_order_release);
+        newestIndex.store(index);
+        slots.Draft() = std::move(made);
         slots.Publish();
+        return true;
     }
     // No block is being processed.
     void Clear() {
+        newest.store(nullptr);
         inUse.store(nullptr);
-        newest.store(kNone);
+        newestIndex.store(kNone);
         slots.Clear();
     }
 
@@ -134,22 +174,27 @@ struct PitchShift::BackEnds {
         if (slots.Take()) NameTheOneInUse();
         return slots.Taken().index;
     }
-    PitchAdapter& Use(int index) {
+    PitchAdapter* InUse() { return slots.Taken().adapter.get(); }
+    // May throw std::bad_alloc.
+    void Use(int index, const Setup& setup) {
         BackEnd& taken = slots.Taken();
         if (taken.index != index) {
-            int expected = taken.index;
-            newest.compare_exchange_strong(expected, index);  // not if another one is on its way
+            int expectedIndex = taken.index;
+            PitchAdapter* expected = InUse();
             taken = Make(index);
+            // Not if another one is on its way.
+            newestIndex.compare_exchange_strong(expectedIndex, index);
+            newest.compare_exchange_strong(expected, InUse());
             NameTheOneInUse();
         }
-        return *taken.adapter;
+        if (std::exchange(taken.toldAhead, {}) != setup) setup.Tell(*InUse());
     }
 
 private:
+    void NameTheOneInUse() { inUse.store(InUse(), std::memory_order_release); }
     static BackEnd Make(int index) {
-        return {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(index)), index};
+        return {std::unique_ptr<PitchAdapter>(PitchAdapter::CreateAdapter(index)), index, {}};
     }
-    void NameTheOneInUse() { inUse.store(slots.Taken().adapter.get(), std::memory_order_release); }
 };
 
 PitchShift::PitchShift() : CorvoEffect(Table(), &m_record), m_back_ends(std::make_unique<BackEnds>()) {}
@@ -203,11 +248,11 @@ bool PitchShift::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
 }
 
 void PitchShift::TakeRecord(const _transform_props& record) {
-    m_back_ends->HandOver(BackEndIndex(record));
+    const bool handedOver = m_back_ends->HandOver(record);
     Assign(m_record, record);  // last: a cook that reads it finds the back-end there
     MarkStale();
     // On this thread, as the engine allocates for another pitch.
-    CookPitchShift(record, m_back_ends->channels.load());
+    if (!handedOver) CookPitchShift(record, m_back_ends->channels.load());
 }
 
 void PitchShift::Cleanup() { m_back_ends->Clear(); }
@@ -220,7 +265,7 @@ int PitchShift::GetLatency() {
 void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const tWAVEFORMATEX& before = m_back_ends->format;
     const bool newFormat = format->nChannels != before.nChannels ||
-                           format->nSamplesPerSec != before.nSamplesPerSec || !m_back_ends->inUse.load();
+                           format->nSamplesPerSec != before.nSamplesPerSec || !m_back_ends->InUse();
     if (!m_cook.exchange(false, std::memory_order_acquire) && !force && !newFormat) return;
     m_back_ends->factorsPending.store(false, std::memory_order_relaxed);  // the cook sends them
     const unsigned edits = m_back_ends->edits.load(std::memory_order_acquire);
@@ -237,17 +282,11 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
 
 bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool) {
     InitEnvelopes(true);
-    const int channels = format->nChannels;
+    const int channels = format->nChannels, rate = static_cast<int>(format->nSamplesPerSec);
     m_back_ends->channels.store(channels);
+    m_back_ends->rate.store(rate);
     try {
-        PitchAdapter& adapter = m_back_ends->Use(BackEndIndex(record));
-        if (channels < 1 || channels > kMostEngineChannels) return true;
-        adapter.SetChannelsNum(channels);
-        adapter.SetSampleRate(static_cast<int>(format->nSamplesPerSec));
-        CookPitchShift(record, channels);
-        adapter.SetFFTSize(record.fftSize);
-        adapter.SetQuality(record.quality);
-        adapter.CookFactors();
+        m_back_ends->Use(BackEndIndex(record), Setup::Of(record, channels, rate));
     } catch (const std::bad_alloc&) {
         return false;
     }
@@ -255,18 +294,15 @@ bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* 
 }
 
 void PitchShift::CookPitchShift(const _transform_props& record, int channels) {
-    PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_acquire);
-    if (!adapter) return;
-    for (int channel = 0; channel < std::min(channels, 2); ++channel)
-        adapter->SetPitchFactor(channel,
-                                static_cast<float>(Factor(record.pitch[static_cast<std::size_t>(channel)])));
+    if (PitchAdapter* const adapter = m_back_ends->newest.load(std::memory_order_acquire))
+        SendFactors(*adapter, record.pitch, channels);
 }
 
 void PitchShift::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (m_back_ends->factorsPending.exchange(false, std::memory_order_relaxed))
-        CookPitchShift(Snapshot(m_record), m_back_ends->channels.load());
-    PitchAdapter* const adapter = m_back_ends->inUse.load(std::memory_order_relaxed);
+    PitchAdapter* const adapter = m_back_ends->InUse();
+    if (m_back_ends->factorsPending.exchange(false, std::memory_order_relaxed) && adapter)
+        SendFactors(*adapter, Snapshot(m_record).pitch, m_back_ends->channels.load());
     const int channels = m_back_ends->channels.load(std::memory_order_relaxed);
     // A cook that failed leaves a back-end that knows other channels: skip the block.
     if (frames < 1 || !adapter || channels != format->nChannels || channels < 1 ||

@@ -37,9 +37,10 @@ static_assert(sizeof(_transform_props) == 88);
 //
 // Threads: as in CorvoEffectBase. An edit reaches the back-end at once, again with the next block when a cook
 // overtook it, and restarts "New" under that engine's own lock, which a block may wait for briefly; the
-// effect has no lock. Back-ends are made and freed on the user-interface thread, except for one that a block
-// makes after Cleanup. Settings that come whole send their pitch at once, too. Latency is asked for on one of
-// the two threads. Cleanup and InitProcessing are not called while a block is processed.
+// effect has no lock. Back-ends are made, configured for the format last prepared and freed on the
+// user-interface thread, except for one that a block makes after Cleanup. Settings that come whole send their
+// pitch at once, too. Latency is asked for on one of the two threads. Cleanup and InitProcessing are not
+// called while a block is processed.
 //
 // Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API PitchShift : public CorvoEffect {
@@ -65,7 +66,8 @@ public:
     // is in use. Not while another thread edits. False without memory. `force` makes no difference.
     bool InitState(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format,
                    bool force);
-    // Derives the pitch factors and sends them to the back-end, if there is one.
+    // Derives the pitch factors and sends them to the newest back-end, if there is one. On the user-interface
+    // thread.
     void CookPitchShift(const PitchShiftPrivate::_transform_props& record, int channels);
     // Limited to the presets there are.
     static PitchShiftPrivate::_transform_props GetPresetData(int preset);

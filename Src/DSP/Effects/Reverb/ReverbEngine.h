@@ -97,6 +97,7 @@ public:
     }
 
     void Clear() {
+        m_allPassOverflowed = false;
         for (int i = 0; i < m_channels; ++i) {
             auto& data = m_data[static_cast<std::size_t>(i)];
             data.w1 = data.w2 = 0.0;
@@ -108,7 +109,8 @@ public:
         }
     }
 
-    // `channels` are the first samples of as many channels as were prepared.
+    // `channels` are the first samples of as many channels as were prepared. What overflows in the loops is
+    // cleared at the end.
     void Run(const std::array<T*, 2>& channels, std::ptrdiff_t stride, int frames) {
         for (int done = 0; done < frames;) {
             const int count = std::min(frames - done, m_shortest);
@@ -117,9 +119,7 @@ public:
             m_channels == 2 ? RunPiece<2>(at, stride, count) : RunPiece<1>(at, stride, count);
             done += count;
         }
-        // All that is infinite in the loops passes here, and stays.
-        for (const auto& data : m_data)
-            if (!std::isfinite(data.w1) || !AllFinite(data.memory.data(), kCombs)) return Clear();
+        if (!IsFinite()) Clear();
     }
 
 private:
@@ -149,6 +149,14 @@ private:
         data.tail = static_cast<T>(channel.tail);
         data.wet = static_cast<T>(channel.wet);
         data.dry = static_cast<T>(channel.dry);
+    }
+
+    // The input filter and the combs keep what is not finite, so their newest values tell. The combs' sum may
+    // overflow while each of them is finite: the all-pass is watched on its own.
+    bool IsFinite() const {
+        return !m_allPassOverflowed && std::ranges::all_of(m_data, [](const ReverbData<T>& data) {
+            return std::isfinite(data.w1) && AllFinite(data.memory.data(), kCombs);
+        });
     }
 
     template <std::size_t Channels>
@@ -276,6 +284,7 @@ private:
             sum[i] = a;
         }
         data.allPass.Advance(count);
+        m_allPassOverflowed |= !AllFinite(sum.data(), static_cast<std::size_t>(count));
         if (data.offset != 0) {
             Piece& waits = data.offset > 0 ? sum : early;
             std::copy_n(waits.begin(), count, data.align.Here());
@@ -298,6 +307,7 @@ private:
     std::array<T, kCombs> m_damping{};
     BiquadSection m_section{};
     bool m_filters = false, m_reflects = false;
+    bool m_allPassOverflowed = false;  // in this block
 };
 
 }  // namespace Corvo::DSP

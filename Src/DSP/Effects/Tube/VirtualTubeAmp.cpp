@@ -5,6 +5,7 @@
 
 #include "DSP/Effects/Tube/TubeShapers.h"
 #include "Platform/FiniteSamples.h"
+#include "Platform/Processor.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -20,8 +21,7 @@ double ShapeOne(double sample, double shape) {
 
 template <typename Sample>
 TubeKernel<Sample> BestTubeKernel() {
-    static const bool wide = __builtin_cpu_supports("avx2");
-    if (wide) return Avx2TubeKernel<Sample>();
+    if (HasAvx2()) return Avx2TubeKernel<Sample>();
     return BaselineTubeKernel<Sample>();
 }
 

@@ -6,6 +6,7 @@
 
 #include "DSP/Effects/Denoiser/Pace.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
+#include "Platform/Processor.h"
 #include "Support/Signals.h"
 
 namespace {
@@ -61,7 +62,7 @@ std::vector<float> Everything(const SpectrumKernels& kernels) {
 
 // Catches a lane or an operation that one kind of register treats otherwise.
 TEST(SpectrumKernelsTest, WideRegistersGiveTheSameBits) {
-    if (!__builtin_cpu_supports("avx2")) GTEST_SKIP() << "no AVX2 here";
+    if (!Corvo::HasAvx2()) GTEST_SKIP() << "no AVX2 here";
     const auto baseline = Everything(BaselineSpectrumKernels()), wide = Everything(Avx2SpectrumKernels());
     ASSERT_EQ(baseline.size(), wide.size());
     EXPECT_EQ(std::memcmp(baseline.data(), wide.data(), baseline.size() * sizeof(float)), 0);

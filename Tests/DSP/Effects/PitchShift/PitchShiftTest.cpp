@@ -58,7 +58,7 @@ TEST_F(PitchShiftTest, DrivesTheBackEndItsRecordNames) {
     }
 }
 
-// Catches memory made, freed or waited for by the effect itself; "Classic" has no engine that does so.
+// Catches a back-end that is configured, made or freed by the block that takes it. "New" locks.
 TEST_F(PitchShiftTest, ChangesBackEndsWithoutAllocatingWhileItProcesses) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
     for (int i = 0; i < 20; ++i) {
@@ -70,7 +70,8 @@ TEST_F(PitchShiftTest, ChangesBackEndsWithoutAllocatingWhileItProcesses) {
             Process();
             broken = rules.Broken();
         }
-        EXPECT_TRUE(broken.empty() || i % 2 == 1) << broken << " with Classic, round " << i;
+        const bool locksOnly = broken.ends_with("locks") && broken.find(',') == broken.npos;
+        EXPECT_TRUE(i % 2 == 1 ? locksOnly : broken.empty()) << broken << ", round " << i;
     }
 }
 

@@ -5,6 +5,7 @@
 #include <cstring>
 #include <limits>
 
+#include "Platform/Processor.h"
 #include "Support/Signals.h"
 
 namespace {
@@ -19,7 +20,7 @@ TYPED_TEST_SUITE(TubeKernelTest, Precisions);
 // Catches a lane, an end of block or an operation that one kind of register treats otherwise. Noise reaches
 // every branch and both clamps; beside it what a damaged stream may hold.
 TYPED_TEST(TubeKernelTest, WideRegistersGiveTheSameBits) {
-    if (!__builtin_cpu_supports("avx2")) GTEST_SKIP() << "no AVX2 here";
+    if (!Corvo::HasAvx2()) GTEST_SKIP() << "no AVX2 here";
     using Limits = std::numeric_limits<TypeParam>;
     constexpr int kFunctions = TubeShaping::kNoFunction + 1;
     auto input = TestSupport::Noise<TypeParam>(1000, 1.2);
