@@ -75,7 +75,13 @@ TEST_F(DenoiseCommand, RefusesWhatItCannotDo) {
                  {"--profile missing", "missing"},
                  {"--save-profile p", "--save-profile|--learn"},
                  {"--set Reduktion=3", "Reduktion|did you mean|Reduction"},
-                 {"--residue in.wav -y", "in.wav"}};
+                 {"--learn 0:1e300", "0:1e300|4.00 s"},
+                 {"--set chunk=junk", "chunk=junk|--learn|--profile"},
+                 {"--set Learn=On", "Learn=On|--learn"},
+                 {"--set \"Mix=50 %, Clear profile=On\"", "Clear profile=On|--profile"},
+                 {"--residue in.wav -y", "in.wav"},
+                 // An output that is there is refused before anything is learned.
+                 {"--residue junk --learn 3:5", "junk|-y"}};
     for (const auto& [arguments, words] : cases) {
         SCOPED_TRACE(arguments);
         ExpectRefused(Run(std::string("denoise in.wav out.wav -q ") + arguments), words);
