@@ -115,6 +115,7 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     const auto donor = Make(), fresh = Make();
     Random random(17);
     SetAllParams(*donor, random);
+    if (const int off = GetParam().loadsOff; off >= 0) donor->SetParam(off, 0.0f, false);
     const auto settings = Chunk(*donor);
     std::vector<float> heard[2];
     for (std::size_t i = 0; auto* each : {effect.get(), fresh.get()}) {

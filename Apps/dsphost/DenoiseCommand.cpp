@@ -3,6 +3,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Arguments.h"
@@ -57,11 +58,15 @@ void ProcessBlock(DenoiserProcessor& denoiser, std::vector<double>& block, int f
     denoiser.Process(block.data(), frames, &format, flags);
 }
 
+// Clamped, so that any number of seconds has a frame.
+std::int64_t FrameAt(double seconds, int rate) {
+    return static_cast<std::int64_t>(std::min(seconds * rate, 1e15));
+}
+
 // Plays a passage to the effect while it learns. The reader stands at `position`, which moves along.
 void LearnPassage(DenoiserProcessor& denoiser, AudioReader& input, const Passage& passage,
                   std::int64_t& position, const tWAVEFORMATEX& format) {
-    const auto frameAt = [&](double seconds) { return static_cast<std::int64_t>(seconds * input.Rate()); };
-    const std::int64_t from = frameAt(passage.from), to = frameAt(passage.to);
+    const std::int64_t from = FrameAt(passage.from, input.Rate()), to = FrameAt(passage.to, input.Rate());
     std::vector<double> block(static_cast<std::size_t>(kBlock) * format.nChannels);
     const double before = denoiser.LearnedSeconds();
     for (; position < to;) {
@@ -93,7 +98,7 @@ void Learn(DenoiserProcessor& denoiser, const DenoiseArguments& arguments, const
         std::int64_t position = 0;
         std::vector<Passage> later;
         for (const auto& passage : passages)
-            if (static_cast<std::int64_t>(passage.from * input.Rate()) >= position)
+            if (FrameAt(passage.from, input.Rate()) >= position)
                 LearnPassage(denoiser, input, passage, position, format);
             else
                 later.push_back(passage);
@@ -101,8 +106,28 @@ void Learn(DenoiserProcessor& denoiser, const DenoiseArguments& arguments, const
     }
 }
 
-// The settings, over whatever the profile's file has. With a profile it is used, unless they say otherwise.
+// Refuses settings that would learn, forget or bring a profile, for which the command has options of its own.
+void RefuseProfileSettings(std::string_view settings) {
+    for (std::size_t start = 0; start < settings.size();) {
+        const std::size_t comma = std::min(settings.find(',', start), settings.size());
+        const std::string_view piece = settings.substr(start, comma - start);
+        start = comma + 1;
+        const std::size_t equals = std::min(piece.find('='), piece.size());
+        const auto key = Trimmed(piece.substr(0, equals)),
+                   value = Trimmed(piece.substr(std::min(equals + 1, piece.size())));
+        const bool off = SameNoCase(value, "off") || value == "0";
+        if (SameNoCase(key, "chunk") ||
+            (!off && (SameNoCase(key, "Learn") || SameNoCase(key, "Clear profile"))))
+            throw UserError(
+                "--set cannot be \"" + std::string(Trimmed(piece)) +
+                "\" here; --learn FROM:TO learns noise, and --profile FILE uses what was learned");
+    }
+}
+
+// Sets every parameter as `settings` say, or to its default. Of the profile's file only the noise is kept.
+// With a profile it is used, unless they say otherwise.
 void ApplySettings(DenoiserProcessor& denoiser, const std::string& settings, bool learned) {
+    RefuseProfileSettings(settings);
     EffectElement parsed(*Corvo::DSP::FindEffectKind("Denoiser"),
                          (learned ? "Profile=Learned, " : "") + settings);
     DenoiserProcessor wanted;
@@ -167,21 +192,21 @@ void RunDenoise(DenoiseArguments arguments) {
     AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, kMostChannels, "noise is reduced in mono and stereo");
     const auto format = ChainFormat(input.Channels(), input.Rate(), kPrecision);
-    denoiser.InitProcessing(kBlock, &format);
-    if (learns) Learn(denoiser, arguments, format);
-    denoiser.InitProcessing(kBlock, &format);  // the recording begins
-
     const AudioWriterOptions writing{input.Channels(), input.Rate(), asked, input.Format(), input.Frames()};
     AudioWriter output(arguments.output, rules, writing);
     std::optional<AudioWriter> residue;
     if (!arguments.residue.empty()) residue.emplace(arguments.residue, rules, writing);
     std::optional<OutputFile> profile;
-    if (!arguments.saveProfile.empty()) {
-        profile.emplace(arguments.saveProfile, rules);
+    if (!arguments.saveProfile.empty()) profile.emplace(arguments.saveProfile, rules);
+
+    denoiser.InitProcessing(kBlock, &format);
+    if (learns) Learn(denoiser, arguments, format);
+    if (profile) {
         std::vector<std::uint8_t> chunk;
         denoiser.GetSettingsChunk(chunk);
         profile->Bytes().Write(chunk.data(), chunk.size());
     }
+    denoiser.InitProcessing(kBlock, &format);  // the recording begins
     Clean(input, denoiser, format, output, residue ? &*residue : nullptr, arguments.writing.quiet);
     std::vector<OutputFile*> together{&output.Complete()};
     if (residue) together.push_back(&residue->Complete());

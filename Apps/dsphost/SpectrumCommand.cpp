@@ -71,7 +71,9 @@ std::vector<double> ProfilePower(const SpectrumArguments& arguments, const kivsp
     Corvo::DSP::DenoiserProcessor denoiser;
     LoadNoiseProfile(denoiser, arguments.profile);
     std::vector<float> density(analyser.GetPower().size());
-    denoiser.LearnedDensity(rate, density.data(), static_cast<int>(density.size()));
+    if (!denoiser.LearnedDensity(rate, density.data(), static_cast<int>(density.size())))
+        throw UserError(arguments.profile + ": its noise profile cannot be shown at " + std::to_string(rate) +
+                        " Hz");
     const auto& window = analyser.GetWindow();
     const double energy = std::inner_product(window.begin(), window.end(), window.begin(), 0.0);
     std::vector<double> power;

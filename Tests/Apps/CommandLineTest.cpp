@@ -80,6 +80,12 @@ const Refusal kLines[] = {
     {"denoise in.wav o.wav --save-profile p", "--save-profile|--learn"},
     {"denoise in.wav o.wav --set Reduktion=3", "Reduktion|did you mean|Reduction"},
     {"denoise in.wav o.wav --residue in.wav -y", "in.wav|input"},
+    {"denoise second.wav o.wav --learn 0:1e300", "0:1e300|1.00 s"},
+    {"denoise in.wav o.wav --set chunk=taken.wav", "chunk=taken.wav|--learn|--profile"},
+    {"denoise in.wav o.wav --set Learn=On", "Learn=On|--learn"},
+    {"denoise in.wav o.wav --set \"Mix=50 %, Clear profile=On\"", "Clear profile=On|--profile"},
+    // An output that is there is refused before anything is learned.
+    {"denoise in.wav o.wav --residue taken.wav --learn 3:5", "taken.wav|-y"},
     {"tune-voice second.wav o.wav --scale \"H minor\"", "H minor|A minor"},
     {"tune-voice second.wav o.wav --scale \"A nonsense\"", "nonsense|scale mode"},
     {"tune-voice second.wav o.wav --scale A", "root and a mode"},

@@ -41,6 +41,8 @@ struct EffectCase {
     bool phaseRunsOn = false;
     // Texts are truncated, so text -> value -> text may lose one unit of the last place.
     bool textTruncates = false;
+    // A switch that a loaded chunk always leaves off.
+    int loadsOff = -1;
 };
 
 std::span<const EffectCase> AllEffects();

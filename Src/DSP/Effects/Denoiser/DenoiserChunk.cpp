@@ -63,6 +63,13 @@ NoiseProfile ReadProfile(CMemoryFile& file) {
             std::ranges::transform(powers, profile.power[c][which].begin(),
                                    [](double power) { return static_cast<float>(power); });
         }
+    bool any = false;
+    for (std::size_t which = 0; which < kLengths; ++which) {
+        const bool filled = !profile.power[0][which].empty();
+        any = any || filled;
+        for (std::size_t c = 1; c < profile.channels; ++c) Require(profile.power[c][which].empty() != filled);
+    }
+    Require((profile.seconds > 0.0) == any);
     return profile;
 }
 
@@ -105,6 +112,7 @@ void DenoiserProcessor::SetSettingsChunk(const std::vector<std::uint8_t>& chunk)
             words[row.word] = static_cast<std::uint32_t>(WordOf(row, values[i]));
         }
         words[WordAt(&Settings::clear)] = 0;
+        words[WordAt(&Settings::learn)] = 0;  // the passage was another sound's
         auto profile = ReadProfile(file);
         m_chunk_tag = tag;
         m_state->Load(std::move(profile));

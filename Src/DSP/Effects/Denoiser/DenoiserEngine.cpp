@@ -2,6 +2,7 @@
 
 #include <bit>
 #include <cmath>
+#include <limits>
 
 namespace Corvo::DSP::Denoising {
 namespace {
@@ -10,6 +11,7 @@ constexpr float kPerDb = 0.23025851f;  // natural logarithm of a power
 constexpr int kGlide = 512;
 constexpr int kTrackerSettles = 8192;
 constexpr double kLowestBandHz = 62.5;
+constexpr double kMostRate = std::numeric_limits<int>::max();
 constexpr std::size_t kBlendIndex = 1, kTrackIndex = 3;
 static_assert(kLearnedLengths[kBlendIndex] == kBlendLength && kLearnedLengths[kTrackIndex] == kTrackLength);
 
@@ -71,16 +73,18 @@ void DenoiserEngine::Prepare(double rate, std::size_t channels) {
         }
         m_arena.Reserve(most);
         m_dry.assign(kMostChannels * static_cast<std::size_t>(scale(kLongestRing)), 0.0);
-        m_learnedSeconds = 0.0;  // of windows that are no more
     }
+    m_learner.Cancel();
+    m_learnedSeconds = 0.0;
+    m_preparedRate = rate;
     SetFormat(rate, channels);
 }
 
 void DenoiserEngine::SetFormat(double rate, std::size_t channels) {
+    EndPassage();
     m_rate = rate;
     m_channels = channels;
     m_fresh = true;
-    m_learner.Cancel();
     std::ranges::fill(m_dry, 0.0);
     m_dryTime = 0;
     for (std::size_t i = 0; i < kLengths; ++i) {
@@ -122,7 +126,8 @@ void DenoiserEngine::Start(bool afterSound) {
     m_arena.Reset();
     Layout(m_arena);
     m_latencyBefore = m_format.latency;
-    m_format = FormatOf(static_cast<int>(m_rate), static_cast<int>(m_channels), *m_set, m_scale);
+    m_format = FormatOf(static_cast<int>(std::min(m_rate, kMostRate)), static_cast<int>(m_channels), *m_set,
+                        m_scale);
     m_time = 0;
     PlacePaces();
     ChooseMode(true);
@@ -155,19 +160,18 @@ void DenoiserEngine::PlacePaces() {
 }
 
 void DenoiserEngine::Apply(const EngineSettings& settings) {
-    const bool first = m_fresh, wasLearning = m_learner.Active();
+    const bool first = m_fresh;
     m_fresh = false;
     const auto* const set = &SizeSetAt(settings.sizeSet);
     const bool resize = set != m_set;
-    if (wasLearning && (!settings.learn || resize)) EndLearning();
+    if (!settings.learn || resize) EndPassage();
     const bool curves = first || resize || !SameCurves(settings, m_settings);
     m_settings = settings;
     if (resize) {
         m_set = set;
         Start(!first);
     }
-    if (settings.learn && !m_learner.Active() && Scale::Of(m_rate) == m_scale)
-        m_learner.Begin(m_time, m_channels);
+    if (settings.learn && !m_learner.Active() && AtPreparedRate()) m_learner.Begin(m_time, m_channels);
     if (curves) CookCurves();
     for (auto& reducer : std::span(m_reducers).first(static_cast<std::size_t>(m_set->count)))
         reducer.SetGains(settings.gains);
@@ -208,7 +212,7 @@ void DenoiserEngine::AimOutput(bool glide) {
 // Settles whose noise is reduced. The trackers start afresh when what they follow is another.
 void DenoiserEngine::ChooseMode(bool restart) {
     const auto before = m_mode;
-    m_mode = HasLearned() ? m_settings.profile : ProfileMode::Adaptive;
+    m_mode = UsesLearned() ? m_settings.profile : ProfileMode::Adaptive;
     if (m_mode == before && !restart) return;
     for (std::size_t c = 0; c < m_channels; ++c) {
         m_trackers[c].Start(m_mode == ProfileMode::Following ? m_learned[c][kTrackIndex].data() : nullptr);
@@ -220,7 +224,7 @@ void DenoiserEngine::ChooseMode(bool restart) {
 
 NoiseAt DenoiserEngine::NoiseFor(std::size_t channel, std::size_t size, std::int64_t centre) const {
     if (Tracks() && m_trackers[channel].Ready()) return m_trackers[channel].At(size, centre);
-    if (!HasLearned()) return {nullptr, nullptr, 0.0f};
+    if (!UsesLearned()) return {nullptr, nullptr, 0.0f};
     const float* const learned = m_learned[channel][LengthIndex(size)].data();
     return {learned, learned, 0.0f};
 }
@@ -290,6 +294,8 @@ void DenoiserEngine::EndLearning() {
 }
 
 void DenoiserEngine::Adopt(const NoiseProfile& profile) {
+    m_learner.Cancel();
+    m_newlyLearned = false;
     m_learnedSeconds = 0.0;
     bool whole = profile.Learned();
     for (std::size_t c = 0; c < kMostChannels && whole; ++c) {
@@ -303,15 +309,26 @@ void DenoiserEngine::Adopt(const NoiseProfile& profile) {
             if (!whole) break;
             auto& learned = m_learned[c][i];
             ConvertSpectrum(spectra[from], NoiseProfile::Length(from, profile.rate), profile.rate,
-                            learned.data(), m_windows[i].Bins(), m_windows[i].length, m_rate);
+                            learned.data(), m_windows[i].Bins(), m_windows[i].length, m_preparedRate);
             for (float& power : learned) power = std::max(power, kLeastPower);
         }
     }
     if (whole) {
         m_learnedSeconds = profile.seconds;
         m_learnedChannels = profile.channels;
+        if (m_channels == 1 && profile.channels > 1) MixLearned();
     }
     FinishLearned();
+}
+
+// One channel gets the mean of what two have learned.
+void DenoiserEngine::MixLearned() {
+    for (std::size_t i = 0; i < kLengths; ++i) {
+        auto &left = m_learned[0][i], &right = m_learned[1][i];
+        for (std::size_t bin = 0; bin < left.size(); ++bin)
+            left[bin] = right[bin] = 0.5f * (left[bin] + right[bin]);
+    }
+    m_learnedChannels = 1;
 }
 
 void DenoiserEngine::FinishLearned() {
@@ -332,7 +349,7 @@ void DenoiserEngine::GiveRoom(NoiseProfile& profile) const {
 
 void DenoiserEngine::Export(NoiseProfile& profile) const {
     profile.seconds = m_learnedSeconds;
-    profile.rate = static_cast<std::uint32_t>(m_rate);
+    profile.rate = static_cast<std::uint32_t>(m_preparedRate);
     profile.channels = static_cast<std::uint32_t>(HasLearned() ? m_learnedChannels : 0);
     for (std::size_t c = 0; c < kMostChannels; ++c)
         for (std::size_t i = 0; i < kLengths; ++i)

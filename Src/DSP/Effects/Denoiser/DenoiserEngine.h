@@ -35,9 +35,10 @@ struct EngineSettings {
 // output does not depend on how the stream is cut, and no block pays for a whole long transform.
 class DenoiserEngine {
 public:
-    // Makes all memory for a rate and any settings, and starts a stream.
+    // Makes all memory for a rate and any settings, and starts a stream with nothing learned.
     void Prepare(double rate, std::size_t channels);
-    // Starts a stream in another format. Window lengths stay as they were prepared.
+    // Starts a stream in another format; a passage still open ends. Window lengths stay as they were
+    // prepared. At another rate than the prepared one nothing is learned, and what was learned is not used.
     void SetFormat(double rate, std::size_t channels);
     // Takes settings from the next sample on. The first ones after a start apply without a glide.
     void Apply(const EngineSettings& settings);
@@ -46,10 +47,13 @@ public:
     template <typename At>
     void Run(int frames, At at);
 
-    // The learned noise, in today's format.
+    // The learned noise, at the prepared rate. A passage still open is dropped.
     void Adopt(const NoiseProfile& profile);
     void Forget() { Adopt(NoiseProfile{}); }
-    bool HasLearned() const { return m_learnedSeconds > 0.0; }
+    // Ends a passage still open, which becomes part of what was learned.
+    void EndPassage() {
+        if (m_learner.Active()) EndLearning();
+    }
     // True once after a passage has been learned; Export then fills a profile whose spectra have been given
     // room.
     bool TakeNewlyLearned() { return std::exchange(m_newlyLearned, false); }
@@ -80,7 +84,11 @@ private:
     void AimOutput(bool glide);
     void EndLearning();
     void FinishLearned();
+    void MixLearned();
     void ChooseMode(bool restart);
+    bool HasLearned() const { return m_learnedSeconds > 0.0; }
+    bool AtPreparedRate() const { return m_rate == m_preparedRate; }
+    bool UsesLearned() const { return HasLearned() && AtPreparedRate(); }
     bool Tracks() const { return m_mode != ProfileMode::Learned; }
     void Tick();
     NoiseAt NoiseFor(std::size_t channel, std::size_t size, std::int64_t centre) const;
@@ -90,7 +98,7 @@ private:
     std::size_t LengthIndex(std::size_t size) const;
 
     Scale m_scale;
-    double m_rate = 0.0;
+    double m_rate = 0.0, m_preparedRate = 0.0;
     std::size_t m_channels = 0;
     Format_t m_format;
     EngineSettings m_settings;

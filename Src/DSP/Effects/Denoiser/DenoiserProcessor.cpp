@@ -1,6 +1,7 @@
 #include "DSP/Effects/Denoiser/DenoiserProcessor.h"
 
 #include <algorithm>
+#include <cmath>
 
 #include "DSP/Effects/Denoiser/DenoiserPresets.h"
 #include "DSP/Effects/Denoiser/DenoiserState.h"
@@ -67,7 +68,7 @@ double DenoiserProcessor::LearnedSeconds() { return m_state->Known().seconds; }
 
 bool DenoiserProcessor::LearnedDensity(double rate, float* density, int bins) {
     const auto& profile = m_state->Known();
-    if (!profile.Learned() || bins < 2) return false;
+    if (!profile.Learned() || bins < 2 || !(std::isfinite(rate) && rate > 0.0)) return false;
     const int length = 2 * (bins - 1);
     // The longest of what was learned that is no longer than asked for, or else the shortest.
     std::size_t which = kLengths;

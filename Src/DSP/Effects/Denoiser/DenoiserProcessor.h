@@ -48,7 +48,8 @@ struct State;
 // Latency: of "FFT size", in samples at 44.1 and 48 kHz 9216, 5120, 2048 or 1024; at other rates times the
 // power of two that keeps the windows nearest to as long in seconds. It changes with that parameter; sound
 // then passes as it is until the new windows have filled and know the noise, up to 0.4 s. A host that changes
-// the rate without InitProcessing keeps the windows' lengths, and nothing is learned until it prepares.
+// the rate without InitProcessing keeps the windows' lengths. Until it prepares, nothing is learned and what
+// was learned is not used.
 //
 // Threads: as in CorvoEffectBase. Learning is switched like every parameter; a passage ends with the block
 // that finds it switched off, and the profile crosses between the threads as a whole. Learned noise survives
@@ -81,7 +82,8 @@ public:
     double LearnedSeconds();
     // The learned noise as power density, the mean of the channels: noise that is white and has variance v
     // has v in every bin. Bin k of `bins` stands for k * rate / 2 / (bins - 1) Hz. False, with nothing
-    // written, without a profile. User-interface thread; allocates.
+    // written, without a profile or for a rate that is not finite and above 0. User-interface thread;
+    // allocates.
     bool LearnedDensity(double rate, float* density, int bins);
 
     // What the reducer's frames are at the format of the last block or InitProcessing. Between blocks.

@@ -39,14 +39,13 @@ struct State {
 
     // No block is being processed. Without memory there is no engine, and the learned noise is kept.
     void Prepare(double preparedRate, std::size_t channels) {
-        Keep();
+        EndPassage();
         auto made = engine ? std::move(engine) : std::make_unique<DenoiserEngine>();
         made->Prepare(preparedRate, channels);
-        made->Adopt(m_kept);
+        made->Adopt(Known());
         engine = std::move(made);
-        // Every slot of what the audio thread will hand over gets its room; a value on its way is taken
-        // first.
-        Known();
+        // Every slot of what the audio thread will hand over gets its room; a value on its way has been
+        // taken.
         for (int slot = 0; slot < 3; ++slot) {
             engine->GiveRoom(m_fromAudio.Draft());
             m_fromAudio.Publish();
@@ -55,7 +54,7 @@ struct State {
         rate.store(static_cast<std::uint32_t>(preparedRate));
     }
     void Free() {
-        Keep();
+        EndPassage();
         engine.reset();
     }
 
@@ -82,17 +81,16 @@ private:
         m_fromAudio.Publish();
     }
     // What the engine has learned outlives it.
-    void Keep() {
+    void EndPassage() {
         if (!engine) return;
-        engine->GiveRoom(m_kept);
-        engine->Export(m_kept);
+        engine->EndPassage();
+        HandOverLearned();
     }
 
     LatestValue<NoiseProfile> m_toAudio, m_fromAudio;
     NoiseProfile m_known;            // user-interface thread
     std::uint32_t m_generation = 0;  // user-interface thread
     std::uint32_t m_taken = 0;       // audio thread
-    NoiseProfile m_kept;
 };
 
 }  // namespace Corvo::DSP::DenoiserPrivate

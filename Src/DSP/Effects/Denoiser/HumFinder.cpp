@@ -22,14 +22,19 @@ void Lower(float* values, const float* others, std::size_t count) {
 
 void HumFinder::Prepare(Arena& arena, std::size_t bins, std::size_t values) {
     m_bins = bins;
-    m_framesInPiece = 0;
-    m_pieces = 0;
-    m_begun = false;
     for (auto* each :
          {&m_smooth, &m_minimum, &m_sum, &m_lowest, &m_valley, &m_mean, &m_found, &m_level, &m_low})
         *each = arena.Take(values);
     m_minima.Take(arena, kPieces, values);
     m_means.Take(arena, kPieces, values);
+}
+
+void HumFinder::Start() {
+    m_framesInPiece = 0;
+    m_pieces = 0;
+    m_begun = false;
+    std::fill_n(m_level, m_bins, 0.0f);
+    std::fill_n(m_low, m_bins, 0.0f);
 }
 
 void HumFinder::SetMaterial(bool music, double hopSeconds) {

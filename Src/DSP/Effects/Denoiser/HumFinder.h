@@ -11,6 +11,8 @@ namespace Corvo::DSP::Denoising {
 class HumFinder {
 public:
     void Prepare(Arena& arena, std::size_t bins, std::size_t values);
+    // Forgets what it heard and found.
+    void Start();
     // Speech lets lines in after 2 s; music, whose notes are steady too, after 4 s of greater steadiness.
     void SetMaterial(bool music, double hopSeconds);
 

@@ -113,6 +113,7 @@ void NoiseTracker::Prepare(Arena& arena, WindowTables& track, const TrackerTable
 void NoiseTracker::Start(const float* profile) {
     m_profile = profile;
     m_frames = 0;
+    m_hum.Start();
     std::ranges::fill(m_follow, 1.0f);
     if (!profile) return;
     m_kernels->logarithm(profile, m_logProfile, m_track->Values());
@@ -188,7 +189,8 @@ NoiseAt NoiseTracker::At(std::size_t size, std::int64_t centre) const {
     // The middle of frame k lies at (k - 1) hops.
     const std::int64_t hop = m_track->length / kOverlap;
     const std::int64_t above = (centre + hop - 1) / hop + 1;  // the first whose middle is not before `centre`
-    const std::int64_t oldest = std::max(m_started, m_done - kKept + 1);
+    // After a new start m_done is from before, until the first frame since is complete.
+    const std::int64_t oldest = std::min(std::max(m_started, m_done - kKept + 1), m_done);
     if (above > m_done) return {ring[m_done], ring[m_done], 0.0f};
     if (above <= oldest) return {ring[oldest], ring[oldest], 0.0f};
     const auto share = static_cast<float>(centre - (above - 2) * hop) / static_cast<float>(hop);

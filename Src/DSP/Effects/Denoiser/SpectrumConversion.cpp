@@ -12,8 +12,8 @@ constexpr std::size_t kResponseBins = 3;  // of the shorter window, to either si
 
 void Resample(const float* from, std::size_t fromCount, double step, float* to, std::size_t count) {
     for (std::size_t i = 0; i < count; ++i) {
-        const double place = step * static_cast<double>(i);
-        const std::size_t below = std::min(static_cast<std::size_t>(place), fromCount - 1);
+        const double place = std::min(step * static_cast<double>(i), static_cast<double>(fromCount - 1));
+        const auto below = static_cast<std::size_t>(place);
         const std::size_t above = std::min(below + 1, fromCount - 1);
         const auto share = static_cast<float>(place - std::floor(place));
         to[i] = from[below] + (from[above] - from[below]) * share;

@@ -35,6 +35,18 @@ void Put(Bytes& chunk, std::size_t at, T value) {
     std::memcpy(chunk.data() + at, &value, sizeof value);
 }
 
+// A chunk's profile alone.
+Bytes ProfileOf(DenoiserProcessor& denoiser) {
+    const auto chunk = Chunk(denoiser);
+    return {chunk.begin() + kSecondsAt, chunk.end()};
+}
+
+// Learns on without an end.
+void Open(DenoiserProcessor& denoiser, std::vector<float> noise, const tWAVEFORMATEX& format) {
+    denoiser.SetParam(kLearn, 1.0f, false);
+    ProcessBlock(denoiser, noise.data(), static_cast<int>(noise.size()), format);
+}
+
 // Catches passages that replace each other or count by number instead of length, a clear that leaves
 // something, a profile that does not survive what it should.
 TEST(DenoiserProfile, AddsPassagesUpUntilCleared) {
@@ -56,6 +68,18 @@ TEST(DenoiserProfile, AddsPassagesUpUntilCleared) {
     denoiser.Cleanup();
     denoiser.InitProcessing(64, &format);
     EXPECT_NEAR(denoiser.LearnedSeconds(), 4.02, 1e-6);
+    for (const bool whole : {true, false}) {
+        const double before = denoiser.LearnedSeconds();
+        denoiser.InitProcessing(48000, &format);
+        Open(denoiser, White(1.0, 0.01), format);
+        if (whole)
+            denoiser.InitProcessing(64, &format);
+        else
+            denoiser.InitResetProcessingLight(true);
+        denoiser.SetParam(kLearn, 0.0f, false);
+        Clean(denoiser, std::vector<float>(64), format);
+        EXPECT_NEAR(denoiser.LearnedSeconds(), before + 1.0, 1e-6) << "a start ends the passage";
+    }
     denoiser.SetParam(kClear, 1.0f, false);
     EXPECT_EQ(denoiser.GetParam(kClear), 0.0f);
     EXPECT_EQ(denoiser.LearnedSeconds(), 0.0);
@@ -78,7 +102,17 @@ TEST(DenoiserProfile, WhatTheUserDidLastWins) {
     const auto& nothing = std::vector<float>(64);
     Clean(denoiser, nothing, format);
     EXPECT_NEAR(Density(denoiser), 0.04, 0.002);
+    denoiser.InitProcessing(24000, &format);
+    Open(denoiser, white, format);
+    denoiser.SetSettingsChunk(Chunk(loaded));
+    Clean(denoiser, nothing, format);
+    EXPECT_EQ(ProfileOf(denoiser), ProfileOf(loaded)) << "the open passage is no part of it";
+    denoiser.InitProcessing(24000, &format);
+    Open(denoiser, white, format);
     denoiser.SetParam(kClear, 1.0f, true);  // automation, on the audio thread
+    Open(denoiser, nothing, format);
+    denoiser.SetSettingsChunk(Chunk(denoiser));
+    EXPECT_EQ(denoiser.GetParam(kLearn), 0.0f) << "loading starts no passage";
     Clean(denoiser, nothing, format);
     EXPECT_EQ(denoiser.LearnedSeconds(), 0.0);
 }
@@ -124,7 +158,23 @@ TEST(DenoiserProfile, TravelsInTheChunk) {
     const auto hiss = Noise<float>(4 * 96000, std::sqrt(3.0 * 0.02));
     const auto cleaned = Clean(other, hiss, fast);
     EXPECT_NEAR(Level(hiss, 0.5, 1.5, 192000) - Level(cleaned, 0.5, 1.5, 192000), 25.0, 2.0);
-    EXPECT_EQ(Chunk(other).size(), chunk.size()) << "using it elsewhere does not change it";
+    for (const int rate : {8000, 48000}) {
+        const auto elsewhere = Format<float>(2, rate);
+        other.InitProcessing(64, &elsewhere);
+    }
+    EXPECT_EQ(ProfileOf(other), ProfileOf(denoiser)) << "using it elsewhere does not change it";
+}
+
+// Catches a mono recording cleaned with the left channel's noise alone.
+TEST(DenoiserProfile, IsTheMeanOfItsChannelsInMono) {
+    DenoiserProcessor denoiser;
+    auto uneven = White(2.0, 0.039);
+    for (std::size_t i = 0; i < uneven.size(); i += 2) uneven[i] *= 0.16f;
+    Learn(denoiser, uneven, Format<float>(2));
+    denoiser.SetParam(kProfile, kLearned, false);
+    const auto hiss = White(2.0, 0.02, 2);
+    const auto cleaned = Clean(denoiser, hiss, Format<float>(1));
+    EXPECT_NEAR(Level(hiss, 0.5, 1.5) - Level(cleaned, 0.5, 1.5), 25.0, 2.0);
 }
 
 // Catches trust in a chunk's profile. A chunk that is refused changes neither settings nor profile.
@@ -168,6 +218,14 @@ TEST(DenoiserProfile, RefusesABrokenChunkWhole) {
             Put(chunk, fault.at, static_cast<std::int32_t>(fault.value));
         refuse(chunk, fault.fault);
     }
+    auto one = good;  // a second channel, without spectra
+    Put(one, kChannelsAt, std::int32_t{2});
+    one.resize(one.size() + 5 * 4);
+    refuse(one, "channels with different lengths");
+    auto empty = good;  // seconds and no spectra
+    empty.resize(kSpectraAt);
+    Put(empty, kChannelsAt, std::int32_t{0});
+    refuse(empty, "seconds without spectra");
     // An older layout has fewer parameters, in which case the rest stay at their defaults.
     Bytes few = good;
     Put(few, 8, std::int32_t{4});
