@@ -89,7 +89,7 @@ double PitchControl::MeanSinceNote(const PitchTrack& track, std::int64_t now) co
     int count = 0;
     for (std::int64_t i = std::max(m_noteStart, now - Frames(kVibratoMean) + 1); i <= now; ++i)
         if (track.At(i).hz > 0.0) {
-            sum += track.At(i).cents;
+            sum += track.At(i).steady;
             ++count;
         }
     return sum / count;
@@ -128,7 +128,8 @@ void PitchControl::Rest(PitchTrack::Frame& frame, double correction) {
 void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchScale& scale,
                         const PitchControlSettings& settings) {
     const std::int64_t now = track.Count();
-    PitchTrack::Frame& frame = track.Add({place, hz, hz > 0.0 ? scale.CentsOf(hz) : 0.0, 0.0, -1, 0.0});
+    PitchTrack::Frame& frame = track.Add({place, hz, hz > 0.0 ? scale.CentsOf(hz) : 0.0});
+    frame.steady = frame.cents;
     const auto silent = static_cast<double>(now - m_lastVoiced) * m_frame;
     if (!(hz > 0.0)) {
         if (silent > kForgetNote) m_note = {};
@@ -137,7 +138,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
     m_lastVoiced = now;
     const bool fresh = m_note.number < 0;
     if (!fresh && silent > kGap + m_frame / 2.0) {
-        m_voiceStart = now;
+        m_voiceStart = m_noteStart = now;
         m_correction = settings.shift;
         m_output = m_target;
     }
@@ -146,7 +147,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
 
     const auto [decisive, frames] = Median(track, now, settings.hold);
     const bool outlier = frames >= 3 && std::abs(frame.cents - decisive) > kOutlier;
-    const double heard = outlier ? decisive : frame.cents;
+    const double heard = frame.steady = outlier ? decisive : frame.cents;
     if (fresh) {
         m_note = scale.Nearest(decisive);
         m_since = 1e9;

@@ -175,6 +175,26 @@ TEST(PitchDoctor, TakesBackTheShiftOfAMisjudgedOnset) {
     }
 }
 
+// What is misheard as a voice stops is no reason to move the next note.
+TEST(PitchDoctor, LeavesRepeatedNotesInTuneAlone) {
+    for (int phase = 0; phase < 8; ++phase)
+        for (const double pause : {0.03, 0.06, 0.07, 0.08}) {
+            const double length = 0.42 + phase / (8.0 * kA3);
+            PitchDoctor effect;
+            BuiltinEditor editor;
+            effect.SetEditor(&editor);
+            const auto voice =
+                Sing(2.2, kRate, [&](double t) { return std::fmod(t, length + pause) < length ? kA3 : 0.0; });
+            Render(effect, voice, Format<double>(1), {512});
+            std::vector<PitchReading> readings;
+            effect.TakeReadings(readings);
+            ASSERT_GT(readings.size(), 300u);
+            for (const auto& reading : readings)
+                ASSERT_LT(std::abs(reading.correctionCents), 5.0f)
+                    << reading.position << ", phase " << phase << ", pause " << pause;
+        }
+}
+
 TEST(PitchDoctor, KeepsTheStereoImage) {
     const auto voice = Sing(0.6, kRate, 228.0);
     std::vector<double> stereo;
