@@ -34,6 +34,7 @@ private:
     bool IsCalm(const PitchTrack& track, std::int64_t now) const;
     void ChooseNote(double cents, const PitchScale& scale, const PitchControlSettings& settings,
                     std::int64_t now);
+    void MoveTo(const PitchScale::Note& note, std::int64_t now);
     bool IsElsewhere(double cents, const PitchScale::Note& nearest) const;
     double Target(double transition);
     double MeanSinceNote(const PitchTrack& track, std::int64_t now) const;

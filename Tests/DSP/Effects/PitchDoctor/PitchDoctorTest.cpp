@@ -175,6 +175,24 @@ TEST(PitchDoctor, TakesBackTheShiftOfAMisjudgedOnset) {
     }
 }
 
+// While the voice holds its note.
+TEST(PitchDoctor, FollowsEditsOfTheScale) {
+    PitchDoctor effect;
+    Set(effect, Exactly({}));
+    const auto format = Format<double>(1);
+    effect.InitProcessing(kRate, &format);
+    const auto second = Sing(1.0, kRate, 222.0);
+    const auto heard = [&](const Settings& edit) {
+        Set(effect, edit);
+        auto block = second;
+        ProcessBlock(effect, block.data(), kRate, format);
+        return Cents(PitchOf(block), kA3);
+    };
+    EXPECT_NEAR(heard({}), 0.0, 0.5);
+    EXPECT_NEAR(heard({{"Note A", "Off"}}), 100.0, 0.5);
+    EXPECT_NEAR(heard({{"Scale root", "D"}, {"Temperament", "Pythagorean"}}), 113.685, 0.5);
+}
+
 // What is misheard as a voice stops is no reason to move the next note.
 TEST(PitchDoctor, LeavesRepeatedNotesInTuneAlone) {
     for (int phase = 0; phase < 8; ++phase)
