@@ -22,11 +22,12 @@ struct PitchReading {
 struct DecidedNote {
     std::int64_t start, end;  // positions of its first and last reading
     std::int32_t note;        // MIDI number
-    float heardCents;         // mean of what was sung, in cents above the note
+    float heardCents;         // median of what was sung, in cents above the note
 };
 
 // The notes of readings in their order. In frames: a pause of up to `longestPause` does not end a note, and a
-// note shorter than `shortest` is left out, as a glide touches notes on its way.
+// note shorter than `shortest` is left out, as a glide touches notes on its way; the note before it goes on
+// if the voice is back within both.
 DSP_API std::vector<DecidedNote> NotesOf(const std::vector<PitchReading>& readings, std::int64_t longestPause,
                                          std::int64_t shortest);
 

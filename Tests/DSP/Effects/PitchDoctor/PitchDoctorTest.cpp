@@ -286,6 +286,21 @@ TEST(PitchDoctor, TellsAnEditorWhatItHears) {
     EXPECT_TRUE(NotesOf(readings, 1440, 48000).empty()) << "shorter than asked for";
 }
 
+// A short note and a misheard reading within a long note.
+TEST(PitchDoctor, ListsNotesWithoutWhatIsShort) {
+    std::vector<PitchReading> readings;
+    for (int i = 0; i < 60; ++i) {
+        const bool between = i >= 30 && i < 36;
+        readings.push_back({100 * i, i == 10 ? 440.0f : 221.0f, 0.0f, between ? 58 : 57, 220.0f});
+    }
+    const auto notes = NotesOf(readings, 300, 1000);
+    ASSERT_EQ(notes.size(), 1u);
+    EXPECT_EQ(notes[0].start, 0);
+    EXPECT_EQ(notes[0].end, 5900);
+    EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(221.0, 220.0), 0.01);
+    EXPECT_EQ(NotesOf(readings, 300, 100).size(), 3u);
+}
+
 TEST(PitchDoctor, AnnouncesAnotherLatency) {
     PitchDoctor effect;
     EXPECT_EQ(effect.GetLatency(), 0);
