@@ -6,8 +6,7 @@ namespace Corvo::DSP {
 namespace {
 
 // Seconds.
-constexpr double kKeepCorrection = 0.03, kForgetNote = 0.06, kGap = 0.0107, kOnset = 0.0107,
-                 kQuickHold = 0.01;
+constexpr double kKeepCorrection = 0.03, kForgetNote = 0.06, kGap = 0.0107, kQuickHold = 0.01;
 constexpr double kYoung = 0.12, kMayStartAgain = 0.08, kVibratoMean = 0.182, kToleranceMean = 0.08;
 constexpr double kMedianHolds = 1.3, kMedianLeast = 0.016, kMedianMost = 0.027;
 // Cents.
@@ -122,8 +121,13 @@ void PitchControl::Fill(PitchTrack& track, std::int64_t now, double target,
         const double error = std::clamp(target - frame.cents, -kLargestError, kLargestError);
         m_correction = keep * m_correction + (1.0 - keep) * (settings.ratio * error + settings.shift);
         frame.correction = m_correction;
-        frame.note = m_note.number;
-        frame.noteCents = m_note.cents;
+    }
+}
+
+void PitchControl::NameOnset(PitchTrack& track, std::int64_t now) const {
+    for (std::int64_t i = now - FramesOpen(); i <= now; ++i) {
+        track.At(i).note = m_note.number;
+        track.At(i).noteCents = m_note.cents;
     }
 }
 
@@ -175,6 +179,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
     const double error = target - heard + settings.keepVibrato * (heard - MeanSinceNote(track, now));
     const double weight = Weight(error, settings.tolerance, fresh);
     const double keep = settings.retune > 0.0 ? std::exp(-m_frame / settings.retune) : 0.0;
+    if (fresh) NameOnset(track, now);
     if (fresh && weight == 1.0) Fill(track, now, target, settings, keep);
     const double wanted =
         settings.ratio * weight * std::clamp(error, -kLargestError, kLargestError) + settings.shift;

@@ -27,8 +27,12 @@ public:
     // frames with which a note sets in are filled in afterwards.
     void Step(PitchTrack& track, double place, double hz, const PitchScale& scale,
               const PitchControlSettings& settings);
+    // So many frames before the newest may still get their note.
+    std::int64_t FramesOpen() const { return Frames(kOnset) - 1; }
 
 private:
+    static constexpr double kOnset = 0.0107;  // seconds for which a voice has to be calm
+
     std::int64_t Frames(double seconds) const;
     std::pair<double, std::size_t> Median(const PitchTrack& track, std::int64_t now, double hold) const;
     bool IsCalm(const PitchTrack& track, std::int64_t now) const;
@@ -41,6 +45,7 @@ private:
     double Weight(double error, double tolerance, bool fresh);
     void Fill(PitchTrack& track, std::int64_t now, double target, const PitchControlSettings& settings,
               double keep);
+    void NameOnset(PitchTrack& track, std::int64_t now) const;
     void Rest(PitchTrack::Frame& frame, double correction);
 
     double m_frame;  // seconds

@@ -7,9 +7,12 @@
 
 namespace Corvo::DSP {
 
-// What the pitch correction heard and did at one moment, for editors and for lists of notes.
+// What the pitch correction heard and did at one moment, for editors and for lists of notes. Positions begin
+// at 0 again with InitProcessing, Cleanup and InitResetProcessingLight, and go on over edits of the settings;
+// readings that were not taken before that are still there. They come up to 10 ms after the voice was heard,
+// when its note is known.
 struct PitchReading {
-    std::int64_t position = 0;     // frames of input since InitProcessing or Cleanup
+    std::int64_t position = 0;     // frames of input since the stream began
     float heardHz = 0.0f;          // 0: not voiced
     float correctionCents = 0.0f;  // so much higher is the output
     std::int32_t note = -1;        // the MIDI number of the note that is meant; -1 while none is decided

@@ -228,7 +228,7 @@ TEST(PitchDoctor, KeepsTheStereoImage) {
 
 // Places in the stream are counted anew now and then. Catches a part that is left out, by a click or by a
 // reading at a wrong place.
-TEST(PitchDoctor, GoesOnForHours) {
+TEST(PitchDoctor, CountsPlacesAnew) {
     constexpr int kLowRate = 8000;
     constexpr std::size_t kPiece = 8000, kPieces = 540;  // 4.3 million frames
     PitchDoctor effect;
@@ -284,6 +284,16 @@ TEST(PitchDoctor, TellsAnEditorWhatItHears) {
     EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(225.0, 220.0), 10.0);
     EXPECT_NEAR(static_cast<double>(notes[1].start), 24000.0, 2000.0);
     EXPECT_TRUE(NotesOf(readings, 1440, 48000).empty()) << "shorter than asked for";
+    // Another latency begins no other stream.
+    EXPECT_GE(readings.front().position, 0);
+    readings.clear();
+    Set(effect, {{"Lowest pitch", "160"}});
+    auto more = voice;
+    ProcessBlock(effect, more.data(), kRate, format);
+    effect.TakeReadings(readings);
+    const auto begun = readings.front().position;
+    EXPECT_GE(begun, kRate);
+    EXPECT_LT(begun, kRate + 1500);
 }
 
 // A short note and a misheard reading within a long note.
