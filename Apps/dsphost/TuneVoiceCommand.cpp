@@ -43,7 +43,7 @@ struct Scale {
     std::string root = "C", mode = "Chromatic";
 };
 
-// "A minor", "Bb dorian", "chromatic".
+// "A minor", "Am", "Bb dorian", "A" (major), "chromatic".
 Scale ParseScale(const std::string& text, Effect& effect) {
     static constexpr std::array<std::pair<const char*, const char*>, 5> kFlats{
         {{"Db", "C#"}, {"Eb", "D#"}, {"Gb", "F#"}, {"Ab", "G#"}, {"Bb", "A#"}}};
@@ -53,13 +53,19 @@ Scale ParseScale(const std::string& text, Effect& effect) {
     const auto blank = std::min(text.find(' '), text.size());
     scale.root = text.substr(0, blank);
     scale.mode = Trimmed(text.substr(blank));
+    if (scale.mode.empty()) {
+        const bool minor = scale.root.size() > 1 && scale.root.back() == 'm';
+        if (minor) scale.root.pop_back();
+        scale.mode = minor ? "minor" : "major";
+    }
     for (const auto& [flat, sharp] : kFlats)
         if (SameNoCase(scale.root, flat)) scale.root = sharp;
     const auto same = [&](const std::string& root) { return SameNoCase(root, scale.root); };
-    if (std::ranges::none_of(roots, same) || scale.mode.empty())
+    if (std::ranges::none_of(roots, same))
         throw UserError(
             "--scale cannot be \"" + text +
-            "\"; accepted: a root and a mode, such as \"A minor\"; modes: " + Joined(modes, ", "));
+            "\"; accepted: a root and a mode, such as \"A minor\", or short, \"Am\" or \"A\"; modes: " +
+            Joined(modes, ", "));
     if (SameNoCase(scale.mode, "minor")) scale.mode = "Natural minor";
     scale.mode = modes[FindName(scale.mode, modes, "scale mode")];
     return scale;
@@ -155,6 +161,10 @@ void RunTuneVoice(TuneVoiceArguments arguments) {
     curve.seconds = static_cast<double>(output.FramesWritten()) / curve.rate;
     curve.notes = NotesOf(curve.readings, std::llround(kLongestPause * curve.rate),
                           std::llround(kShortestNote * curve.rate));
+    for (auto& note : curve.notes) {  // the voice may sound to the end, and is heard a little later
+        note.start = std::min(note.start, output.FramesWritten());
+        note.end = std::min(note.end, output.FramesWritten());
+    }
     curve.title = arguments.scale;
     std::vector<OutputFile*> together{&output.Complete()};
     if (notes) {

@@ -1,5 +1,6 @@
 #include "TuneVoiceNotes.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <cmath>
@@ -14,6 +15,8 @@ using namespace std::string_view_literals;
 
 void AppendNumber(std::string& text, double value, int digits, char end) {
     std::array<char, 64> number;
+    const double unit = std::pow(10.0, digits);
+    value = std::round(value * unit) / unit + 0.0;  // not "-0.0"
     const auto result =
         std::to_chars(number.data(), number.data() + number.size(), value, std::chars_format::fixed, digits);
     text.append(number.data(), result.ptr) += end;

@@ -148,7 +148,7 @@ private:
         for (const auto& reading : m_curve.readings) {
             if (!reading.IsVoiced()) continue;
             const double time = Seconds(reading.position);
-            double pitch = 69.0 + 12.0 * std::log2(static_cast<double>(reading.heardHz) / m_curve.concertHz);
+            double pitch = 69.0 + 12.0 * std::log2(static_cast<double>(reading.heardHz) / 440.0);
             if (corrected) pitch += static_cast<double>(reading.correctionCents) / 100.0;
             if (time - lastTime > kLongestStep || std::abs(pitch - lastPitch) > kLeap) flush();
             lastTime = time;

@@ -12,7 +12,6 @@ namespace dsphost {
 struct VoiceCurve {
     std::vector<Corvo::DSP::PitchReading> readings;
     std::vector<Corvo::DSP::DecidedNote> notes;
-    double concertHz = 440.0;
     int rate = 48000;
     double seconds = 0.0;
     std::string title;

@@ -88,7 +88,7 @@ const Refusal kLines[] = {
     {"denoise in.wav o.wav --residue taken.wav --learn 3:5", "taken.wav|-y"},
     {"tune-voice second.wav o.wav --scale \"H minor\"", "H minor|A minor"},
     {"tune-voice second.wav o.wav --scale \"A nonsense\"", "nonsense|scale mode"},
-    {"tune-voice second.wav o.wav --scale A", "root and a mode"},
+    {"tune-voice second.wav o.wav --scale Hm", "Hm|root and a mode"},
     {"tune-voice second.wav o.wav --retune fast", "Retune speed|fast|400"},
     {"tune-voice second.wav o.wav --lowest 80", "Lowest pitch|55, 75, 110, 160"},
     {"tune-voice second.wav o.wav --notes n.txt", "n.txt|.csv|.mid"},

@@ -15,7 +15,7 @@
 
 namespace Corvo::DSP {
 
-// The work of VoicePitchDetector, in steps that stand still in the stream. A frame's work is spread over the
+// The work of VoicePitchDetector, in steps at fixed places of the stream. A frame's work is spread over the
 // steps of a hop:
 //
 //   last but one  the full band of the frame to come is transformed,

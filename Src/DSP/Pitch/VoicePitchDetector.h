@@ -54,7 +54,7 @@ public:
     VoicePitchDetector(const VoicePitchDetector&) = delete;
     VoicePitchDetector& operator=(const VoicePitchDetector&) = delete;
 
-    // As newly made, with the limits last set.
+    // Forgets what it heard; the limits stay as last set.
     void Clear();
     // Take effect with the next frame.
     void SetHighest(double hz);

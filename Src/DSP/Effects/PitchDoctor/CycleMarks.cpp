@@ -87,7 +87,7 @@ bool CycleMarks::ExtendUnvoiced(const PitchTrack& track) {
     if (next + reach > end) return false;
     double place = next;
     for (int round = 0; round < 3; ++round) place += FromEnergy(place, period);
-    if (place > next + kNear * m_unvoicedDistance) {  // a gap would open: one more without voice
+    if (place > next + kNear * m_unvoicedDistance) {  // too far for one grain: unvoiced once more
         Add({next, m_unvoicedDistance, false});
         return true;
     }

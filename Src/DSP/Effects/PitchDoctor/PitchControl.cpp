@@ -6,13 +6,12 @@ namespace Corvo::DSP {
 namespace {
 
 // Seconds.
-constexpr double kKeepCorrection = 0.03, kForgetNote = 0.06, kGap = 0.0107, kOnset = 0.0107;
+constexpr double kKeepCorrection = 0.03, kForgetNote = 0.06, kGap = 0.0107, kQuickHold = 0.01;
 constexpr double kYoung = 0.12, kMayStartAgain = 0.08, kVibratoMean = 0.182, kToleranceMean = 0.08;
 constexpr double kMedianHolds = 1.3, kMedianLeast = 0.016, kMedianMost = 0.027;
 // Cents.
 constexpr double kOutlier = 350.0, kAgree = 100.0, kYoungHysteresis = 5.0, kFar = 200.0, kNearer = 50.0;
 constexpr double kLargestMean = 50.0, kLargestError = 1300.0, kNothing = 0.01;
-constexpr double kQuickHold = 0.4;  // share of the hold
 
 constexpr std::size_t kMostMedian = 32;
 
@@ -51,6 +50,9 @@ bool PitchControl::IsCalm(const PitchTrack& track, std::int64_t now) const {
 void PitchControl::ChooseNote(double cents, const PitchScale& scale, const PitchControlSettings& settings,
                               std::int64_t now) {
     const auto nearest = scale.Nearest(cents);
+    const auto held = scale.Find(m_note.number);
+    if (held.number < 0) return MoveTo(nearest, now);  // the scale was edited
+    m_note = held;
     const bool young = static_cast<double>(now - m_voiceStart) * m_frame < kYoung;
     const double gain = std::abs(cents - m_note.cents) - std::abs(cents - nearest.cents);
     if (nearest.number == m_note.number || gain <= (young ? kYoungHysteresis : settings.hysteresis)) {
@@ -60,9 +62,13 @@ void PitchControl::ChooseNote(double cents, const PitchScale& scale, const Pitch
     m_rivalFrames = nearest.number == m_rival ? m_rivalFrames + 1 : 1;
     m_rival = nearest.number;
     const bool quick = young || std::abs(cents - m_note.cents) > kFar;
-    if (m_rivalFrames * m_frame < settings.hold * (quick ? kQuickHold : 1.0)) return;
+    if (m_rivalFrames * m_frame < (quick ? std::min(settings.hold, kQuickHold) : settings.hold)) return;
+    MoveTo(nearest, now);
+}
+
+void PitchControl::MoveTo(const PitchScale::Note& note, std::int64_t now) {
     m_from = m_output;
-    m_note = nearest;
+    m_note = note;
     m_since = 0.0;
     m_rivalFrames = 0;
     m_noteStart = now;
@@ -89,7 +95,7 @@ double PitchControl::MeanSinceNote(const PitchTrack& track, std::int64_t now) co
     int count = 0;
     for (std::int64_t i = std::max(m_noteStart, now - Frames(kVibratoMean) + 1); i <= now; ++i)
         if (track.At(i).hz > 0.0) {
-            sum += track.At(i).cents;
+            sum += track.At(i).steady;
             ++count;
         }
     return sum / count;
@@ -112,11 +118,16 @@ void PitchControl::Fill(PitchTrack& track, std::int64_t now, double target,
                         const PitchControlSettings& settings, double keep) {
     for (std::int64_t i = now - Frames(kOnset) + 1; i < now; ++i) {
         auto& frame = track.At(i);
-        m_correction =
-            keep * m_correction + (1.0 - keep) * (settings.ratio * (target - frame.cents) + settings.shift);
+        const double error = std::clamp(target - frame.cents, -kLargestError, kLargestError);
+        m_correction = keep * m_correction + (1.0 - keep) * (settings.ratio * error + settings.shift);
         frame.correction = m_correction;
-        frame.note = m_note.number;
-        frame.noteCents = m_note.cents;
+    }
+}
+
+void PitchControl::NameOnset(PitchTrack& track, std::int64_t now) const {
+    for (std::int64_t i = now - FramesOpen(); i <= now; ++i) {
+        track.At(i).note = m_note.number;
+        track.At(i).noteCents = m_note.cents;
     }
 }
 
@@ -128,7 +139,8 @@ void PitchControl::Rest(PitchTrack::Frame& frame, double correction) {
 void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchScale& scale,
                         const PitchControlSettings& settings) {
     const std::int64_t now = track.Count();
-    PitchTrack::Frame& frame = track.Add({place, hz, hz > 0.0 ? scale.CentsOf(hz) : 0.0, 0.0, -1, 0.0});
+    PitchTrack::Frame& frame = track.Add({place, hz, hz > 0.0 ? scale.CentsOf(hz) : 0.0});
+    frame.steady = frame.cents;
     const auto silent = static_cast<double>(now - m_lastVoiced) * m_frame;
     if (!(hz > 0.0)) {
         if (silent > kForgetNote) m_note = {};
@@ -137,7 +149,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
     m_lastVoiced = now;
     const bool fresh = m_note.number < 0;
     if (!fresh && silent > kGap + m_frame / 2.0) {
-        m_voiceStart = now;
+        m_voiceStart = m_noteStart = now;
         m_correction = settings.shift;
         m_output = m_target;
     }
@@ -146,7 +158,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
 
     const auto [decisive, frames] = Median(track, now, settings.hold);
     const bool outlier = frames >= 3 && std::abs(frame.cents - decisive) > kOutlier;
-    const double heard = outlier ? decisive : frame.cents;
+    const double heard = frame.steady = outlier ? decisive : frame.cents;
     if (fresh) {
         m_note = scale.Nearest(decisive);
         m_since = 1e9;
@@ -167,6 +179,7 @@ void PitchControl::Step(PitchTrack& track, double place, double hz, const PitchS
     const double error = target - heard + settings.keepVibrato * (heard - MeanSinceNote(track, now));
     const double weight = Weight(error, settings.tolerance, fresh);
     const double keep = settings.retune > 0.0 ? std::exp(-m_frame / settings.retune) : 0.0;
+    if (fresh) NameOnset(track, now);
     if (fresh && weight == 1.0) Fill(track, now, target, settings, keep);
     const double wanted =
         settings.ratio * weight * std::clamp(error, -kLargestError, kLargestError) + settings.shift;

@@ -27,19 +27,25 @@ public:
     // frames with which a note sets in are filled in afterwards.
     void Step(PitchTrack& track, double place, double hz, const PitchScale& scale,
               const PitchControlSettings& settings);
+    // So many frames before the newest may still get their note.
+    std::int64_t FramesOpen() const { return Frames(kOnset) - 1; }
 
 private:
+    static constexpr double kOnset = 0.0107;  // seconds for which a voice has to be calm
+
     std::int64_t Frames(double seconds) const;
     std::pair<double, std::size_t> Median(const PitchTrack& track, std::int64_t now, double hold) const;
     bool IsCalm(const PitchTrack& track, std::int64_t now) const;
     void ChooseNote(double cents, const PitchScale& scale, const PitchControlSettings& settings,
                     std::int64_t now);
+    void MoveTo(const PitchScale::Note& note, std::int64_t now);
     bool IsElsewhere(double cents, const PitchScale::Note& nearest) const;
     double Target(double transition);
     double MeanSinceNote(const PitchTrack& track, std::int64_t now) const;
     double Weight(double error, double tolerance, bool fresh);
     void Fill(PitchTrack& track, std::int64_t now, double target, const PitchControlSettings& settings,
               double keep);
+    void NameOnset(PitchTrack& track, std::int64_t now) const;
     void Rest(PitchTrack::Frame& frame, double correction);
 
     double m_frame;  // seconds

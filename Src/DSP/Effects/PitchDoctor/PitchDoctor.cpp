@@ -33,7 +33,7 @@ struct PitchDoctor::Engines {
         rate = wanted;
     }
     void Use(PitchDoctorEngine* engine) {
-        if (engine && engine != inUse) engine->Clear();
+        if (engine && engine != inUse) engine->Clear(inUse ? inUse->Position() : 0);
         inUse = engine;
     }
     template <typename Sample>

@@ -44,7 +44,7 @@ PitchDoctorEngine::PitchDoctorEngine(double rate, double lowestHz)
     Clear();
 }
 
-void PitchDoctorEngine::Clear() {
+void PitchDoctorEngine::Clear(std::int64_t start) {
     m_detector.Clear();
     m_track.Clear();
     m_control.Clear();
@@ -53,6 +53,7 @@ void PitchDoctorEngine::Clear() {
     for (auto& input : m_input) input.Clear();
     m_untilStep = m_detector.StepSamples();
     m_origin = 0;
+    m_start = start;
     m_fresh = true;
 }
 
@@ -104,9 +105,11 @@ void PitchDoctorEngine::Step(PitchReadingRing* readings) {
 }
 
 void PitchDoctorEngine::Publish(PitchReadingRing& readings) const {
-    const auto& frame = m_track.At(m_track.Count() - 1);
+    const std::int64_t index = m_track.Count() - 1 - m_control.FramesOpen();
+    if (index < 0) return;
+    const auto& frame = m_track.At(index);
     PitchReading reading;
-    reading.position = m_origin + std::llround(frame.place);
+    reading.position = m_start + std::max<std::int64_t>(m_origin + std::llround(frame.place), 0);
     reading.heardHz = static_cast<float>(frame.hz);
     reading.correctionCents = static_cast<float>(frame.correction);
     reading.note = frame.note;

@@ -27,7 +27,7 @@ struct PitchDoctorVoice {
     double mix = 1.0;
 };
 
-// Hears, decides and shifts one stream for one lowest pitch. Work is done in steps that stand still in the
+// Hears, decides and shifts one stream for one lowest pitch. Work is done in steps at fixed places of the
 // stream, so that the output does not depend on how it is cut.
 class PitchDoctorEngine {
 public:
@@ -36,7 +36,10 @@ public:
     static int LatencyOf(double rate, double lowestHz);
 
     int Latency() const { return m_latency; }
-    void Clear();
+    // The next frame is number `start` of the stream that readings tell places of.
+    void Clear(std::int64_t start = 0);
+    // Frames of that stream so far.
+    std::int64_t Position() const { return m_start + m_origin + m_input[0].End(); }
     void Cook(const PitchDoctorVoice& voice);
 
     // One or two channels in place, `stride` from a channel's sample to its next. `readings`: null for none.
@@ -80,7 +83,8 @@ private:
     double m_mix = 1.0;
     bool m_fresh = true;  // nothing was processed since Clear
     int m_untilStep = 1;
-    std::int64_t m_origin = 0;  // of the places, in the stream
+    std::int64_t m_origin = 0;  // of the places, in what came since Clear
+    std::int64_t m_start = 0;   // of that, in the stream
     std::array<Block, 2> m_block{}, m_wet{};
 };
 

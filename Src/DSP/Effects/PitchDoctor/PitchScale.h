@@ -18,6 +18,12 @@ struct PitchScale {
         double cents = 0.0;
     };
 
+    // The note where the scale has it now; number -1 when it is not allowed.
+    Note Find(int number) const {
+        if (number < 0 || !allowed[static_cast<std::size_t>(number % 12)]) return {};
+        return {number, 1200.0 * (number / 12) + cents[static_cast<std::size_t>(number % 12)]};
+    }
+
     double CentsOf(double hz) const { return 6900.0 + 1200.0 * std::log2(hz / concertHz); }
 
     Note Nearest(double at) const {

@@ -17,6 +17,7 @@ public:
         double correction = 0.0;  // cents
         int note = -1;            // MIDI number; -1: none decided
         double noteCents = 0.0;   // where the note stands
+        double steady = 0.0;      // the cents without outliers
     };
 
     explicit PitchTrack(double rate) : m_rate(rate) {}

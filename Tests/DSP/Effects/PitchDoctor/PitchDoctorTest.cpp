@@ -175,6 +175,44 @@ TEST(PitchDoctor, TakesBackTheShiftOfAMisjudgedOnset) {
     }
 }
 
+// While the voice holds its note.
+TEST(PitchDoctor, FollowsEditsOfTheScale) {
+    PitchDoctor effect;
+    Set(effect, Exactly({}));
+    const auto format = Format<double>(1);
+    effect.InitProcessing(kRate, &format);
+    const auto second = Sing(1.0, kRate, 222.0);
+    const auto heard = [&](const Settings& edit) {
+        Set(effect, edit);
+        auto block = second;
+        ProcessBlock(effect, block.data(), kRate, format);
+        return Cents(PitchOf(block), kA3);
+    };
+    EXPECT_NEAR(heard({}), 0.0, 0.5);
+    EXPECT_NEAR(heard({{"Note A", "Off"}}), 100.0, 0.5);
+    EXPECT_NEAR(heard({{"Scale root", "D"}, {"Temperament", "Pythagorean"}}), 113.685, 0.5);
+}
+
+// What is misheard as a voice stops is no reason to move the next note.
+TEST(PitchDoctor, LeavesRepeatedNotesInTuneAlone) {
+    for (int phase = 0; phase < 8; ++phase)
+        for (const double pause : {0.03, 0.06, 0.07, 0.08}) {
+            const double length = 0.42 + phase / (8.0 * kA3);
+            PitchDoctor effect;
+            BuiltinEditor editor;
+            effect.SetEditor(&editor);
+            const auto voice =
+                Sing(2.2, kRate, [&](double t) { return std::fmod(t, length + pause) < length ? kA3 : 0.0; });
+            Render(effect, voice, Format<double>(1), {512});
+            std::vector<PitchReading> readings;
+            effect.TakeReadings(readings);
+            ASSERT_GT(readings.size(), 300u);
+            for (const auto& reading : readings)
+                ASSERT_LT(std::abs(reading.correctionCents), 5.0f)
+                    << reading.position << ", phase " << phase << ", pause " << pause;
+        }
+}
+
 TEST(PitchDoctor, KeepsTheStereoImage) {
     const auto voice = Sing(0.6, kRate, 228.0);
     std::vector<double> stereo;
@@ -190,7 +228,7 @@ TEST(PitchDoctor, KeepsTheStereoImage) {
 
 // Places in the stream are counted anew now and then. Catches a part that is left out, by a click or by a
 // reading at a wrong place.
-TEST(PitchDoctor, GoesOnForHours) {
+TEST(PitchDoctor, CountsPlacesAnew) {
     constexpr int kLowRate = 8000;
     constexpr std::size_t kPiece = 8000, kPieces = 540;  // 4.3 million frames
     PitchDoctor effect;
@@ -246,6 +284,31 @@ TEST(PitchDoctor, TellsAnEditorWhatItHears) {
     EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(225.0, 220.0), 10.0);
     EXPECT_NEAR(static_cast<double>(notes[1].start), 24000.0, 2000.0);
     EXPECT_TRUE(NotesOf(readings, 1440, 48000).empty()) << "shorter than asked for";
+    // Another latency begins no other stream.
+    EXPECT_GE(readings.front().position, 0);
+    readings.clear();
+    Set(effect, {{"Lowest pitch", "160"}});
+    auto more = voice;
+    ProcessBlock(effect, more.data(), kRate, format);
+    effect.TakeReadings(readings);
+    const auto begun = readings.front().position;
+    EXPECT_GE(begun, kRate);
+    EXPECT_LT(begun, kRate + 1500);
+}
+
+// A short note and a misheard reading within a long note.
+TEST(PitchDoctor, ListsNotesWithoutWhatIsShort) {
+    std::vector<PitchReading> readings;
+    for (int i = 0; i < 60; ++i) {
+        const bool between = i >= 30 && i < 36;
+        readings.push_back({100 * i, i == 10 ? 440.0f : 221.0f, 0.0f, between ? 58 : 57, 220.0f});
+    }
+    const auto notes = NotesOf(readings, 300, 1000);
+    ASSERT_EQ(notes.size(), 1u);
+    EXPECT_EQ(notes[0].start, 0);
+    EXPECT_EQ(notes[0].end, 5900);
+    EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(221.0, 220.0), 0.01);
+    EXPECT_EQ(NotesOf(readings, 300, 100).size(), 3u);
 }
 
 TEST(PitchDoctor, AnnouncesAnotherLatency) {
