@@ -42,11 +42,8 @@ constexpr std::array kEffects{
                .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
-    EffectCase{.name = "Denoiser",
-               .make = Make<DenoiserProcessor>,
-               .splices = true,
-               .bounded = true,
-               .loadsOff = 1},
+    EffectCase{
+        .name = "Denoiser", .make = Make<DenoiserProcessor>, .splices = true, .bounded = true, .loadsOff = 1},
     EffectCase{.name = "Cantrix", .make = Make<PitchDoctor>, .splices = true},
 };
 
