@@ -18,7 +18,7 @@ class Arena {
 public:
     void Reserve(std::size_t count) { m_memory.assign(count, 0.0f); }
     void Reset() {
-        m_memory.assign(m_memory.size(), 0.0f);
+        std::fill_n(m_memory.begin(), std::min(m_taken, m_memory.size()), 0.0f);
         m_taken = 0;
     }
     std::size_t Taken() const { return m_taken; }

@@ -32,7 +32,8 @@ struct EngineSettings {
 // out. Only Prepare allocates.
 //
 // All work is counted from the stream's first sample and done in pieces every kUnit samples or less, so the
-// output does not depend on how the stream is cut, and no block pays for a whole long transform.
+// output does not depend on how the stream is cut. A window's work is spread over several pieces, but one
+// transform is never divided: a short block may have to do a whole one of the longest window.
 class DenoiserEngine {
 public:
     // Makes all memory for a rate and any settings, and starts a stream with nothing learned.

@@ -45,22 +45,24 @@ struct State;
 // stays. Blocks with more channels pass unchanged. Interleaved and planar blocks, 32- and 64-bit; other
 // widths pass unchanged. Samples that are not finite count as 0, and those above +120 dB as that much.
 //
-// Latency: of "FFT size", in samples at 44.1 and 48 kHz 9216, 5120, 2048 or 1024; at other rates times the
-// power of two that keeps the windows nearest to as long in seconds. It changes with that parameter; sound
+// Latency: by "FFT size" 9216, 5120, 2048 or 1024 samples at 44.1 and 48 kHz. At other rates it is that times
+// a power of two, so that the windows last about as long in seconds. It changes with that parameter; sound
 // then passes as it is until the new windows have filled and know the noise, up to 0.4 s. A host that changes
 // the rate without InitProcessing keeps the windows' lengths. Until it prepares, nothing is learned and what
 // was learned is not used.
 //
 // Threads: as in CorvoEffectBase. Learning is switched like every parameter; a passage ends with the block
-// that finds it switched off, and the profile crosses between the threads as a whole. Learned noise survives
-// Cleanup, InitProcessing and presets.
+// that finds it switched off, and with InitProcessing, InitResetProcessingLight, Cleanup and another format.
+// Loading or clearing a profile drops the passage still open. Neither thread ever sees a profile half
+// changed. Learned noise survives Cleanup, InitProcessing and presets.
 //
 // Settings chunk, little-endian, as long as what it holds: tag and version, 4 bytes each; the parameters'
 // plain values in their order, as doubles behind a 4-byte count (fewer leave the rest at their defaults); the
 // seconds of noise learned (a double), its rate and number of channels, 4 bytes each; then per channel, and
 // for windows of 512, 1024, 2048, 4096 and 8192 at 44.1 and 48 kHz, the mean power per bin as doubles behind
-// a count (0: not learned). A profile from another rate is interpolated. A chunk that is cut short, has
-// counts that do not fit or holds values that no profile has changes nothing.
+// a count (0: not learned; the same for every channel). A profile from another rate is interpolated; in mono
+// the mean of two channels is used. A chunk changes nothing if it is cut short, has counts that do not fit or
+// holds values that no profile has. Loading leaves "Learn" off.
 class DSP_API DenoiserProcessor : public CorvoEffect {
 public:
     DenoiserProcessor();

@@ -15,8 +15,9 @@ using Denoising::NoiseProfile;
 // The engine, and the learned noise on its way between the threads.
 //
 // The audio thread learns and hands the whole profile to the user-interface thread, which keeps it for the
-// chunk; a chunk's profile, or none after "Clear profile", goes the other way. Each of those gets a number,
-// so that what was learned before it and arrives later is dropped.
+// chunk. In the other direction goes the profile of a chunk that is loaded, or an empty one after "Clear
+// profile". Every load and every clear has a number, the generation, and a learned profile carries the
+// generation it started from. One that arrives with an older generation is dropped.
 struct State {
     tWAVEFORMATEX format{};  // the audio thread's
     std::unique_ptr<DenoiserEngine> engine;

@@ -90,6 +90,7 @@ float SizeReducer::Cost(int step) const {
 }
 
 void SizeReducer::Run(int step, const Job& job) {
+    if (step == 0) m_settings = m_next;
     const auto [stage, index] = At(step);
     const std::int64_t evidence = job.frame - m_plan.ahead, gains = job.frame - Delay();
     switch (stage) {

@@ -46,7 +46,8 @@ public:
         m_floor = floor;
         m_logFloor = logFloor;
     }
-    void SetGains(const GainSettings& settings) { m_settings = settings; }
+    // From the next frame on.
+    void SetGains(const GainSettings& settings) { m_next = settings; }
 
     int Steps() const { return static_cast<int>(2 * m_channels + 4 * m_pieces + 1); }
     // Nanoseconds or so.
@@ -96,7 +97,7 @@ private:
     SizePlan m_plan{};
     WindowTables* m_tables = nullptr;
     std::size_t m_channels = 0, m_values = 0, m_pieces = 0;
-    GainSettings m_settings{};
+    GainSettings m_settings{}, m_next{};  // the frame's at hand, and the next one's
     const float *m_curve = nullptr, *m_floor = nullptr, *m_logFloor = nullptr;
 
     std::array<float, 32> m_evidenceWeights{};

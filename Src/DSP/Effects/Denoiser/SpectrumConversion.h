@@ -22,7 +22,9 @@ private:
     std::size_t m_fromBins = 0, m_toBins = 0, m_ratio = 1;
     bool m_shorter = false;
     float m_scale = 1.0f;  // of the windows' energies
-    Floats m_response;  // of the shorter window, from the middle on; m_ratio bins apart are one of its bins
+    // The shorter window's frequency response, from its middle upwards. It is given at the longer window's
+    // bins, m_ratio of which make one bin of the shorter window.
+    Floats m_response;
     Floats m_mirrored, m_seen;
 };
 

@@ -80,6 +80,10 @@ void WindowTables::SetRate(double rate, int blendLength) {
     const std::size_t gridBins = static_cast<std::size_t>(blendLength) / 2 + 1, last = Half();
     const std::size_t bands = RiskBandCount(rate);
     riskRanges = {};
+    const auto ratio = static_cast<std::size_t>(std::max(length / blendLength, 1));
+    std::array<float, 2 * kMostRatioOfLengths> hann;
+    const auto shape = std::span(hann).first(2 * ratio - 1);
+    HannWeights(shape);
     for (std::size_t band = 0; band < bands; ++band) {
         auto& weights = riskBands[band];
         std::ranges::fill(weights, 0.0f);
@@ -88,10 +92,6 @@ void WindowTables::SetRate(double rate, int blendLength) {
             const double weight = RiskBandWeight(band, static_cast<double>(grid) * width);
             if (weight == 0.0) continue;
             if (length > blendLength) {
-                const auto ratio = static_cast<std::size_t>(length / blendLength);
-                std::array<float, 2 * kMostRatioOfLengths> hann;
-                const auto shape = std::span(hann).first(2 * ratio - 1);
-                HannWeights(shape);
                 for (std::size_t i = 0; i < shape.size(); ++i) {
                     const std::size_t place = grid * ratio + i;  // ratio - 1 too high, so never negative
                     add(std::min(place < ratio - 1 ? 0 : place - (ratio - 1), last), weight * shape[i]);

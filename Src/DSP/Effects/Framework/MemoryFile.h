@@ -8,8 +8,8 @@
 
 namespace KivFiles {
 
-// A byte stream. For hosts and for settings that do not fit a fixed layout; nothing inside uses it yet. The
-// order of the virtual operations is part of the contract.
+// A byte stream. For hosts and for settings that do not fit a fixed layout, such as the Denoiser's. The order
+// of the virtual operations is part of the contract.
 class DSP_API CFileBase {
 public:
     enum Origin : int { FromStart = 0, FromCurrent = 1, FromEnd = 2 };

@@ -47,6 +47,12 @@ void Open(DenoiserProcessor& denoiser, std::vector<float> noise, const tWAVEFORM
     ProcessBlock(denoiser, noise.data(), static_cast<int>(noise.size()), format);
 }
 
+void Close(DenoiserProcessor& denoiser, const tWAVEFORMATEX& format) {
+    float sample = 0.0f;
+    denoiser.SetParam(kLearn, 0.0f, false);
+    ProcessBlock(denoiser, &sample, 1, format);
+}
+
 // Catches passages that replace each other or count by number instead of length, a clear that leaves
 // something, a profile that does not survive what it should.
 TEST(DenoiserProfile, AddsPassagesUpUntilCleared) {
@@ -76,8 +82,7 @@ TEST(DenoiserProfile, AddsPassagesUpUntilCleared) {
             denoiser.InitProcessing(64, &format);
         else
             denoiser.InitResetProcessingLight(true);
-        denoiser.SetParam(kLearn, 0.0f, false);
-        Clean(denoiser, std::vector<float>(64), format);
+        Close(denoiser, format);
         EXPECT_NEAR(denoiser.LearnedSeconds(), before + 1.0, 1e-6) << "a start ends the passage";
     }
     denoiser.SetParam(kClear, 1.0f, false);
@@ -105,16 +110,16 @@ TEST(DenoiserProfile, WhatTheUserDidLastWins) {
     denoiser.InitProcessing(24000, &format);
     Open(denoiser, white, format);
     denoiser.SetSettingsChunk(Chunk(loaded));
-    Clean(denoiser, nothing, format);
+    Close(denoiser, format);
     EXPECT_EQ(ProfileOf(denoiser), ProfileOf(loaded)) << "the open passage is no part of it";
     denoiser.InitProcessing(24000, &format);
     Open(denoiser, white, format);
     denoiser.SetParam(kClear, 1.0f, true);  // automation, on the audio thread
-    Open(denoiser, nothing, format);
+    Close(denoiser, format);
+    EXPECT_EQ(denoiser.LearnedSeconds(), 0.0);
+    denoiser.SetParam(kLearn, 1.0f, false);
     denoiser.SetSettingsChunk(Chunk(denoiser));
     EXPECT_EQ(denoiser.GetParam(kLearn), 0.0f) << "loading starts no passage";
-    Clean(denoiser, nothing, format);
-    EXPECT_EQ(denoiser.LearnedSeconds(), 0.0);
 }
 
 // Catches allocations in learning and in handing over.
@@ -163,6 +168,9 @@ TEST(DenoiserProfile, TravelsInTheChunk) {
         other.InitProcessing(64, &elsewhere);
     }
     EXPECT_EQ(ProfileOf(other), ProfileOf(denoiser)) << "using it elsewhere does not change it";
+    denoiser.SetParam(kProfile, kLearned, false);
+    const auto sound = White(1.0, 0.01, 3);
+    EXPECT_EQ(Clean(other, sound, stereo), Clean(denoiser, sound, stereo)) << "nor what is used";
 }
 
 // Catches a mono recording cleaned with the left channel's noise alone.
