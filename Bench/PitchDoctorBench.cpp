@@ -10,7 +10,7 @@
 #include "Support/Voice.h"
 
 // What does the correction of a sung voice cost, and the detector alone? A host has to make room for the
-// dearest block: BM_PitchDoctorBlocks says how much dearer than the median it is. The arguments are the
+// slowest block: BM_PitchDoctorBlocks says how much slower than the median it is. The arguments are the
 // block's size, the lowest pitch (0 55, 1 75, 2 110, 3 160 Hz) and whether formants are moved.
 namespace {
 
@@ -84,7 +84,7 @@ void BM_PitchDoctorBlocks(benchmark::State& state) {
     std::ranges::sort(fastest);
     const double median = fastest[fastest.size() / 2];
     state.counters["median_us"] = 1e6 * median;
-    state.counters["dearest_to_median"] = fastest.back() / median;
+    state.counters["slowest_to_median"] = fastest.back() / median;
 }
 BENCHMARK(BM_PitchDoctorBlocks)->DenseRange(0, 3)->Iterations(1)->Unit(benchmark::kMillisecond);
 

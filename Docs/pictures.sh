@@ -54,7 +54,27 @@ draw spectrum build/noisy-voice/noisy.wav denoise-profile.png --size 960x400 --l
     --profile build/noisy-voice/profile
 speech=$(mktemp -d)
 trap 'rm -r "$speech"' EXIT
-espeak-ng -w "$speech/in.wav" "Why were you away a year, Roy? We owe you a yellow lion."
-build/apps/bin/dsphost tune-voice "$speech/in.wav" "$speech/out.wav" --scale "A minor" -y -q --size 960x480 \
+# A sung line: MIDI note, cents off, seconds, depth of the vibrato in cents; note 0 is a breath.
+awk 'BEGIN {
+    rate = 44100; pi = atan2(0, -1); print "; Sample Rate " rate; print "; Channels 1"
+    count = split("57 -38 .45 0  59 32 .4 0  60 -30 .4 0  64 35 1 28  0 0 .15 0  62 -35 .4 0  60 -42 .35 0  57 28 1.1 24", v)
+    for (k = 1; k <= count; k += 4) {
+        if (v[k] == 0) pitch = level = 0
+        for (t = 0; t < v[k + 2]; t += 1 / rate) {
+            wanted = v[k] + (v[k + 1] + v[k + 3] * (t > .3) * sin(2 * pi * 5.4 * t)) / 100
+            pitch = pitch > 0 ? pitch + (wanted - pitch) / (.035 * rate) : wanted - (v[k] > 0) * 1.2
+            level += ((v[k] > 0) - level) / (.02 * rate)
+            f = v[k] > 0 ? 440 * exp((pitch - 69) / 12 * log(2)) : 0
+            phase += 2 * pi * f / rate
+            sum = 0
+            for (h = 1; f > 0 && h <= 14; ++h)
+                sum += sin(h * phase) * (.1 / h + .3 / (1 + ((h * f - 700) / 150) ^ 2) + .1 / (1 + ((h * f - 1100) / 200) ^ 2))
+            print frame / rate, level * sum / 2
+            frame += 1
+        }
+    }
+}' >"$speech/in.dat"
+sox "$speech/in.dat" "$speech/in.wav"
+build/apps/bin/dsphost tune-voice "$speech/in.wav" "$speech/out.wav" --scale "A minor" --retune 10 -y -q --size 960x480 \
     --curve Docs/pictures/tune-voice.png --font build/fonts/Montserrat_400Regular.ttf
 echo Docs/pictures/tune-voice.png

@@ -43,8 +43,9 @@ static_assert(sizeof(PitchDoctorSettings) == 4 * 32);
 // of the vibrato as is asked for. Transposition and offset come on top. What is not voiced passes unchanged.
 //
 // Blocks are interleaved or planar, mono or stereo; 64-bit samples are double, every other width is taken for
-// float. Both channels are corrected alike, by the pitch of their mean, so that the image stays. Channels
-// after the second pass unchanged. The output does not depend on how a stream is cut.
+// float. Both channels are corrected alike, by the pitch of their mean, so that the image stays;
+// what has opposite phase in them (L = -R) cancels in the mean and is not corrected. Channels after the
+// second pass unchanged and without the delay. The output does not depend on how a stream is cut.
 //
 // GetLatency follows the lowest pitch: 1.6 of its periods, rounded up to 64 frames (at 48 kHz 1408, 1024, 704
 // and 512). When it changes, WantRefreshAllParams is raised, and the output begins anew from silence. The
@@ -52,6 +53,10 @@ static_assert(sizeof(PitchDoctorSettings) == 4 * 32);
 //
 // "Follow tuner" takes concert pitch and notes from the tuner's class-wide calibration and temperament, which
 // are read when the effect derives its state: in front of the first block after an edit.
+//
+// Cost: blocks in which a pitch is worked out take longer than the others. The slowest block of 64 frames
+// takes 2 times as long as the median one at 48 kHz, 5 times at 96 kHz and 9 times at 192 kHz (9 % of the
+// time it lasts), of 32 frames 2, 9 and 18 times (22 %).
 //
 // Settings chunk: 136 bytes, the number 1, the number of settings (32), the settings. A chunk of fewer
 // settings leaves the others at their defaults, of more the rest is not read. Values out of range are kept,
