@@ -104,7 +104,7 @@ public:
     // std::bad_alloc, which InitProcessing and Process catch.
     virtual void CheckCookProperties(const tWAVEFORMATEX* format, bool force);
 
-    // State, on the user-interface thread: the settings chunk is a fixed little-endian layout of
+    // State, on the user-interface thread: the settings chunk is a little-endian layout, at present of
     // GetSettingsChunkSize() bytes.
 
     // Makes `chunk` exactly that long and writes it.
