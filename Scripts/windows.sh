@@ -30,7 +30,7 @@ say "building ($target)"
 fresh=()
 if [ -f $build/CMakeCache.txt ] && ! grep -qF "$prefix/" $build/CMakeCache.txt; then fresh=(--fresh); fi
 cmake --preset "$target" "${fresh[@]}" > /dev/null
-cmake --build --preset "$target" --target DSPDll dsp_tests record_effects dsphost fuzz_replay
+cmake --build --preset "$target" --target DSPDll dsp_tests c_interface_tests record_effects dsphost fuzz_replay
 root_ready
 
 # Every part runs even when one before it failed, so that one run tells all.
@@ -120,6 +120,7 @@ try_other_compilers() {
 }
 
 part "tests under Wine" test_program dsp_tests
+part "tests of the C interface under Wine" test_program c_interface_tests
 part "hardening" Tests/Package/hardening.sh $build/bin/{DSPDll.dll,dsphost.exe}
 part "exported names" Tests/Exports/exports.sh check $build/bin/DSPDll.dll
 part "the native build and this one" compare_builds
