@@ -102,8 +102,7 @@ private:
     FrameRing m_power, m_logPower, m_noise;
     std::array<FrameRing, 4> m_converted;
     float *m_re = nullptr, *m_im = nullptr, *m_meanPower = nullptr, *m_meanLog = nullptr;
-    float *m_logShape = nullptr, *m_shape = nullptr, *m_white = nullptr, *m_logWhite = nullptr,
-          *m_logProfile = nullptr;
+    float *m_logShape = nullptr, *m_white = nullptr, *m_logWhite = nullptr, *m_logProfile = nullptr;
     float *m_order = nullptr, *m_level = nullptr;
     std::vector<float> m_levels, m_smooth, m_candidates, m_flatness, m_follow;
 };

@@ -69,9 +69,11 @@ SizeReducer::Step SizeReducer::At(int step) const {
 }
 
 float SizeReducer::Cost(int step) const {
-    const auto [stage, index] = At(step);
-    const auto bins = [&](float each) { return each * static_cast<float>(To(index) - From(index)); };
-    switch (stage) {
+    const Step place = At(step);
+    const auto bins = [&](float each) {
+        return each * static_cast<float>(To(place.index) - From(place.index));
+    };
+    switch (place.stage) {
         case Stage::Analyse:
         case Stage::Synthesise:
             return 1.6f * static_cast<float>(m_tables->length);
