@@ -120,7 +120,7 @@ dsp_status DSP_CALL dsp_effect_latency(dsp_effect* effect, int32_t* frames) {
 
 dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position) {
     return With<EffectStream>(effect, [position](EffectStream& stream) -> dsp_status {
-        if (!Within(position, 0, EffectStream::kLastFrame)) return DSP_OUT_OF_RANGE;
+        if (!Within(position, -EffectStream::kLastFrame, EffectStream::kLastFrame)) return DSP_OUT_OF_RANGE;
         stream.Seek(position);
         return DSP_OK;
     });

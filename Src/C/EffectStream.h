@@ -46,7 +46,7 @@ public:
     int Channels() const { return m_format.nChannels; }
 
     // Positions, and those of points, stay far from where 64 bits end.
-    static constexpr std::int64_t kLastFrame = std::int64_t{1} << 62;
+    static constexpr std::int64_t kLastFrame = std::int64_t{1} << 61;
     void Seek(std::int64_t position);
     // Replaces the automation of an external parameter.
     void Automate(int parameter, std::span<const dsp_point> points);

@@ -119,7 +119,8 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_process_planar_f64(dsp_effect* effect, 
                                                             int32_t frames);
 /* How many frames the output is later than the input, at the prepared format; may change with parameters. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_latency(dsp_effect* effect, int32_t* frames);
-/* The stream position of the next block, in frames from 0, which automation is played by. What sounds goes
+/* The stream position of the next block, in frames, which automation is played by; negative
+ * while an earlier latency runs out. What sounds goes
  * on: see reset. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position);
 
