@@ -153,7 +153,7 @@ TEST_P(EveryEffectForgets, Overflows) {
                 for (int i = 0; setting > 0.0f && i < effect.GetParamCount(); ++i)
                     effect.SetParam(i, GetParam().mayGrow && i < 4 ? 0.0f : setting, false);
             };
-            const auto run = [&](std::span<const Flood> floods) {
+            const auto run = [&](const auto& floods) {
                 return ExpectToForget<Sample>(
                     "settings at " + std::to_string(setting),
                     [] { return std::make_unique<EffectSubject<Sample>>(Make()); }, floods, edit);
