@@ -17,8 +17,8 @@ inline std::vector<double> Sing(double seconds, int rate, const std::function<do
         const double f = hz(static_cast<double>(i) / rate);
         phase += f / rate;
         for (int h = 1; f > 0.0 && h * f < std::min(0.45 * rate, 5000.0); ++h) {
-            const double near = (h * f - 700.0) / 150.0, second = (h * f - 1100.0) / 200.0;
-            const double level = 0.1 / h + 0.2 / (1.0 + near * near) + 0.1 / (1.0 + second * second);
+            const double first = (h * f - 700.0) / 150.0, second = (h * f - 1100.0) / 200.0;
+            const double level = 0.1 / h + 0.2 / (1.0 + first * first) + 0.1 / (1.0 + second * second);
             samples[i] += 0.3 * level * std::sin(2.0 * std::numbers::pi * h * phase + h * h);
         }
     }
