@@ -29,6 +29,12 @@ struct Word {
     std::uint32_t bits;
     float plain;
 };
+// A value that the chunk does not keep.
+constexpr Word Unkept(int value) {
+    Word word(value);
+    word.bits = 0;
+    return word;
+}
 
 // One parameter, or a pair of them.
 struct Row {
@@ -52,6 +58,24 @@ struct Row {
     }
 };
 
+using Rows = std::vector<Row>;
+
+// The same row for every label, each eight bytes further on.
+Rows Bands(std::initializer_list<const wchar_t*> labels, Row row) {
+    Rows rows;
+    for (const auto* const label : labels) {
+        row.label = label;
+        rows.push_back(row);
+        row.at[0] += 8;
+    }
+    return rows;
+}
+Rows Joined(Rows rows, const Rows& second, const Rows& third) {
+    rows.insert(rows.end(), second.begin(), second.end());
+    rows.insert(rows.end(), third.begin(), third.end());
+    return rows;
+}
+
 enum class Leading { None, Kept, Version1, Version1AndCount };
 
 struct Contract {
@@ -60,7 +84,7 @@ struct Contract {
     Leading leading;
     // Of the layout in which a word has 8 bytes; 0 where there was none or it is tested apart.
     std::size_t oldWords;
-    std::vector<Row> rows;
+    Rows rows;
     struct {
         int count = 0;
         std::uint64_t sum = 0xCBF29CE484222325;  // FNV-1a of names and chunks, of an own record's of names
@@ -208,9 +232,9 @@ const Contract kContracts[] = {
      .paired = true},
     {.name = "Denoiser", .image = "builtinDenoiser.png", .icon = "BuiltinPlugins/Denoiser@3x.png",
      .chunkSize = 252, .leading = Leading::Kept, .oldWords = 0,
-     .rows = {
+     .rows = Joined({
         {L"Profile", L"", List, {12}, {0, 1, 2}, {L"Learned", L"Following", L"Adaptive"}, 0.5f, 1},
-        {L"Learn", L"", Switch, {20}, {0, 1, 1}, {L"Off ", L"On ", L"On "}, 0.5f, 1},
+        {L"Learn", L"", Switch, {20}, {0, Unkept(1), Unkept(1)}, {L"Off ", L"On ", L"On "}, 0.5f, 1},
         {L"Clear profile", L"", Switch, {28}, {0, 0, 0}, {L"Off ", L"On ", L"On "}, 0.5f, 1},
         {L"Reduction", L"dB", Continuous, {36}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
         {L"Sensitivity", L"dB", Continuous, {44}, {-60, 0, 60}, {L"-6.0 dB", L"0.0 dB", L"6.0 dB"}, 0.5f, 0.1},
@@ -220,23 +244,11 @@ const Contract kContracts[] = {
         {L"FFT size", L"", List, {76}, {0, 1, 3}, {L"512 + 2048 + 8192", L"512 + 4096", L"1024"}, 0.5f, 1},
         {L"Material", L"", List, {84}, {0, 0, 1}, {L"Speech", L"Speech", L"Music"}, 0.5f, 1},
         {L"Listen", L"", List, {92}, {0, 0, 1}, {L"Output", L"Output", L"Residue"}, 0.5f, 1},
-        {L"Mix", L"%", Continuous, {100}, {0, 500, 1000}, {L"0.0 %", L"50.0 %", L"100.0 %"}, 0.5f, 0.1},
-        {L"Gain 63 Hz", L"dB", Continuous, {108}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 125 Hz", L"dB", Continuous, {116}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 250 Hz", L"dB", Continuous, {124}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 500 Hz", L"dB", Continuous, {132}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 1 kHz", L"dB", Continuous, {140}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 2 kHz", L"dB", Continuous, {148}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 4 kHz", L"dB", Continuous, {156}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Gain 8 kHz", L"dB", Continuous, {164}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1},
-        {L"Range 63 Hz", L"dB", Continuous, {172}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 125 Hz", L"dB", Continuous, {180}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 250 Hz", L"dB", Continuous, {188}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 500 Hz", L"dB", Continuous, {196}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 1 kHz", L"dB", Continuous, {204}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 2 kHz", L"dB", Continuous, {212}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 4 kHz", L"dB", Continuous, {220}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1},
-        {L"Range 8 kHz", L"dB", Continuous, {228}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1}},
+        {L"Mix", L"%", Continuous, {100}, {0, 500, 1000}, {L"0.0 %", L"50.0 %", L"100.0 %"}, 0.5f, 0.1}},
+        Bands({L"Gain 63 Hz", L"Gain 125 Hz", L"Gain 250 Hz", L"Gain 500 Hz", L"Gain 1 kHz", L"Gain 2 kHz", L"Gain 4 kHz", L"Gain 8 kHz"},
+              {L"", L"dB", Continuous, {108}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1}),
+        Bands({L"Range 63 Hz", L"Range 125 Hz", L"Range 250 Hz", L"Range 500 Hz", L"Range 1 kHz", L"Range 2 kHz", L"Range 4 kHz", L"Range 8 kHz"},
+              {L"", L"dB", Continuous, {172}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1})),
      .presets = {10, 0x6379DADD34EAE13A},
      .sections = {"Profile", "Reduction", "Engine", "Gains", "Ranges"}},
 };
@@ -313,7 +325,7 @@ TEST_P(EveryEffectContract, StoresAndShowsEveryParameter) {
             effect->SetParam(external, value, false);
             if (row.step != 0.0)
                 EXPECT_EQ(DoubleAt(Chunk(*effect), row.at[side]),
-                          static_cast<double>(row.words[i].plain) * row.step);
+                          row.words[i].bits == 0 ? 0.0 : static_cast<double>(row.words[i].plain) * row.step);
             else
                 EXPECT_EQ(WordAt(Chunk(*effect), row.at[side]), row.words[i].bits);
             EXPECT_EQ(effect->GetParamPlain(real), contract.ownRecord ? 0.0f : row.words[i].plain);

@@ -5,8 +5,7 @@
 #include "DSP/Effects/Denoiser/DenoiserPresets.h"
 #include "DSP/Effects/Denoiser/DenoiserState.h"
 #include "DSP/Effects/Denoiser/DenoiserTable.h"
-#include "DSP/Effects/Framework/MemoryFile.h"
-#include "DSP/Effects/Parameters/LittleEndian.h"
+#include "DSP/Effects/Framework/FileValues.h"
 #include "Threads/SharedRecord.h"
 
 // The settings chunk: the parameters and the learned noise.
@@ -15,31 +14,25 @@ namespace {
 
 using namespace Denoising;
 using KivFiles::CMemoryFile;
+using KivFiles::ReadValue;
+using KivFiles::WriteValue;
 
 constexpr std::int32_t kVersion = 1;
 constexpr float kMostPower = 1e30f;
-
-template <typename T>
-void Write(CMemoryFile& file, T value) {
-    const auto bytes = LittleEndianBytes(value);
-    if (file.Write(bytes.data(), sizeof(T)) != sizeof(T)) throw CorvoException("Error writing data");
-}
-
-template <typename T>
-T Read(CMemoryFile& file) {
-    std::array<std::uint8_t, sizeof(T)> bytes;
-    if (file.Read(bytes.data(), sizeof(T)) != sizeof(T)) throw CorvoException("Error reading data");
-    return LittleEndianValue<T>(bytes);
-}
 
 void Require(bool valid) {
     if (!valid) throw CorvoException("Error reading data");
 }
 
+// Never kept: a project that is opened neither learns from another passage nor clears its profile.
+bool IsMomentary(const ParameterRow& row) {
+    return row.word == WordAt(&Settings::learn) || row.word == WordAt(&Settings::clear);
+}
+
 void WriteProfile(CMemoryFile& file, const NoiseProfile& profile) {
-    Write(file, profile.seconds);
-    Write(file, profile.rate);
-    Write(file, profile.channels);
+    WriteValue(file, profile.seconds);
+    WriteValue(file, profile.rate);
+    WriteValue(file, profile.channels);
     for (std::size_t c = 0; c < profile.channels; ++c)
         for (const auto& spectrum : profile.power[c])
             KivFiles::WriteDoubles(file, {spectrum.begin(), spectrum.end()});
@@ -47,9 +40,9 @@ void WriteProfile(CMemoryFile& file, const NoiseProfile& profile) {
 
 NoiseProfile ReadProfile(CMemoryFile& file) {
     NoiseProfile profile;
-    profile.seconds = Read<double>(file);
-    profile.rate = Read<std::uint32_t>(file);
-    profile.channels = Read<std::uint32_t>(file);
+    profile.seconds = ReadValue<double>(file);
+    profile.rate = ReadValue<std::uint32_t>(file);
+    profile.channels = ReadValue<std::uint32_t>(file);
     Require(std::isfinite(profile.seconds) && profile.seconds >= 0.0 &&
             profile.channels <= profile.power.size() && (profile.rate > 0 || profile.channels == 0));
     for (std::size_t c = 0; c < profile.channels; ++c)
@@ -85,11 +78,13 @@ int DenoiserProcessor::GetSettingsChunkSize() {
 
 void DenoiserProcessor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) try {
     CMemoryFile file;
-    Write(file, m_chunk_tag);
-    Write(file, kVersion);
+    WriteValue(file, m_chunk_tag);
+    WriteValue(file, kVersion);
     std::vector<double> values;
     for (const auto& row : Table().rows)
-        values.push_back(PlainValue(row, static_cast<std::int32_t>(LoadWord(&m_settings, row.word))));
+        values.push_back(IsMomentary(row)
+                             ? 0.0
+                             : PlainValue(row, static_cast<std::int32_t>(LoadWord(&m_settings, row.word))));
     KivFiles::WriteDoubles(file, values);
     WriteProfile(file, m_state->Known());
     chunk.assign(file.Data(), file.Data() + file.GetLength());
@@ -101,18 +96,16 @@ void DenoiserProcessor::SetSettingsChunk(const std::vector<std::uint8_t>& chunk)
     // Only read from.
     CMemoryFile file(const_cast<std::uint8_t*>(chunk.data()), static_cast<std::int64_t>(chunk.size()));
     try {
-        const auto tag = Read<std::int32_t>(file);
-        Require(Read<std::int32_t>(file) == kVersion);
+        const auto tag = ReadValue<std::int32_t>(file);
+        Require(ReadValue<std::int32_t>(file) == kVersion);
         std::vector<double> values;
         KivFiles::ReadDoubles(file, values);
         Require(std::ranges::all_of(values, [](double value) { return std::isfinite(value); }));
         auto words = WordsOf(DenoiserPresets::kPresets[0].settings);
         for (std::size_t i = 0; i < std::min(values.size(), Table().rows.size()); ++i) {
             const auto& row = Table().rows[i];
-            words[row.word] = static_cast<std::uint32_t>(WordOf(row, values[i]));
+            if (!IsMomentary(row)) words[row.word] = static_cast<std::uint32_t>(WordOf(row, values[i]));
         }
-        words[WordAt(&Settings::clear)] = 0;
-        words[WordAt(&Settings::learn)] = 0;  // the passage was another sound's
         auto profile = ReadProfile(file);
         m_chunk_tag = tag;
         m_state->Load(std::move(profile));

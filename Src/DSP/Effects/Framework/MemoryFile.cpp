@@ -6,32 +6,17 @@
 #include <cstring>
 #include <limits>
 
-#include "DSP/Effects/Parameters/LittleEndian.h"
+#include "DSP/Effects/Framework/FileValues.h"
 
 namespace KivFiles {
 namespace {
 
 using Corvo::CorvoException;
-using Corvo::DSP::LittleEndianBytes;
-using Corvo::DSP::LittleEndianValue;
 
 // Growth is linear on purpose: the files are small, and 32-bit hosts are short of contiguous memory.
 constexpr std::int32_t kGrowth = 102400;
 
 constexpr std::int32_t kFirstRoom = 4096;  // elements to make room for before they have been seen
-
-template <typename T>
-void WriteValue(CFileBase& file, T value) {
-    const auto bytes = LittleEndianBytes(value);
-    if (file.Write(bytes.data(), sizeof(T)) != sizeof(T)) throw CorvoException("Error writing data");
-}
-
-template <typename T>
-T ReadValue(CFileBase& file) {
-    std::array<std::uint8_t, sizeof(T)> bytes;
-    if (file.Read(bytes.data(), sizeof(T)) != sizeof(T)) throw CorvoException("Error reading data");
-    return LittleEndianValue<T>(bytes);
-}
 
 }  // namespace
 
