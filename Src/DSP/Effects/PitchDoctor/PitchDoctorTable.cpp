@@ -1,6 +1,7 @@
 #include "DSP/Effects/PitchDoctor/PitchDoctorTable.h"
 
 #include <cmath>
+#include <concepts>
 
 #include "DSP/Effects/Parameters/ParameterText.h"
 #include "Spectrum/Tuner/Tuner.h"
@@ -113,12 +114,16 @@ constexpr Shown List(std::span<const Choice> choices) {
 constexpr Shown kOnOff{[](const ParameterRow&, double n) { return FormatSwitch(n >= 0.5); },
                        ParameterTexts::ReadOnOff};
 
-template <std::size_t N>
-constexpr std::array<Choice, N> Choices(const std::array<const char*, N>& texts) {
+template <std::size_t N, std::invocable<std::size_t> Name>
+constexpr std::array<Choice, N> Choices(Name name) {
     std::array<Choice, N> choices{};
     for (std::size_t i = 0; i < N; ++i)
-        choices[i] = {texts[i], static_cast<float>(i) / static_cast<float>(N - 1)};
+        choices[i] = {name(i), static_cast<float>(i) / static_cast<float>(N - 1)};
     return choices;
+}
+template <std::size_t N>
+constexpr std::array<Choice, N> Choices(const std::array<const char*, N>& texts) {
+    return Choices<N>([&](std::size_t i) { return texts[i]; });
 }
 template <std::size_t N>
 constexpr Storage ListOf(const std::array<Choice, N>&) {
@@ -148,16 +153,9 @@ constexpr std::array kModes{
     Mode{"Mixolydian",       {1, 0, 1, 0, 1, 1, 0, 1, 0, 1, 1, 0}},
     Mode{"Whole tone",       {1, 0, 1, 0, 1, 0, 1, 0, 1, 0, 1, 0}},
 };
-constexpr auto kModeChoices = [] {
-    std::array<const char*, kModes.size()> names{};
-    for (std::size_t i = 0; i < names.size(); ++i) names[i] = kModes[i].name;
-    return Choices(names);
-}();
-constexpr auto kTemperamentChoices = [] {
-    std::array<const char*, kTemperaments> names{};
-    for (std::size_t i = 0; i < names.size(); ++i) names[i] = kTemperamentNames[i];
-    return Choices(names);
-}();
+constexpr auto kModeChoices = Choices<kModes.size()>([](std::size_t i) { return kModes[i].name; });
+constexpr auto kTemperamentChoices =
+    Choices<kTemperaments>([](std::size_t i) -> const char* { return kTemperamentNames[i]; });
 constexpr auto kLowestChoices = Choices<4>({"55", "75", "110", "160"});
 constexpr Shown kLowestShown{ParameterTexts::Number, ParameterTexts::ReadChoice, 1.0, 0, 0, kLowestChoices};
 
