@@ -31,7 +31,7 @@ double Sound(Subject<float>& subject) {
 }
 
 void ExpectToSurvive(const std::string& name, const MakeSubject<float>& make) {
-    if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "allocations cannot be made to fail here";
+    if (!FailingAllocations::CanFail()) GTEST_SKIP() << "allocations cannot be made to fail here";
     const auto other = make();
     other->Prepare();
     const double expected = Sound(*other);

@@ -1,15 +1,26 @@
 #include "Support/AudioThreadRules.h"
 
 #include <array>
+#include <cerrno>
+#include <cstddef>
 
-#if defined(__linux__) && !defined(__SANITIZE_ADDRESS__) && !defined(__SANITIZE_THREAD__)
+// GCC tells of its sanitizers by macros, Clang by features.
+#if defined(__has_feature)
+#define HAS_FEATURE(name) __has_feature(name)
+#else
+#define HAS_FEATURE(name) 0
+#endif
+#if defined(__SANITIZE_ADDRESS__) || HAS_FEATURE(address_sanitizer)
+// The sanitizer's own functions stand behind malloc; operator new is replaced alone.
+#define REPLACES_NEW 1
+#include <cstdlib>
+#include <new>
+#elif defined(__linux__) && !defined(__SANITIZE_THREAD__) && !HAS_FEATURE(thread_sanitizer)
 #define COUNTS_CALLS 1
 #include <dlfcn.h>
 #include <pthread.h>
 #include <time.h>
 
-#include <cerrno>
-#include <cstddef>
 #include <typeinfo>
 #endif
 
@@ -24,7 +35,7 @@ thread_local int t_untilFailure = -1;  // allocations; below 0 none fails
 thread_local bool t_failureLasts = false, t_failed = false;
 thread_local std::array<int, kKinds> t_counts{};
 
-#if COUNTS_CALLS
+#if COUNTS_CALLS || REPLACES_NEW
 void Note(Kind kind) {
     if (t_counting) ++t_counts[kind];
 }
@@ -42,6 +53,24 @@ void* Allocated(Allocate allocate) {
     if (t_untilFailure > 0) --t_untilFailure;
     return allocate();
 }
+#endif
+
+#if REPLACES_NEW
+constexpr std::size_t kUsualAlignment = __STDCPP_DEFAULT_NEW_ALIGNMENT__;
+
+void* NewOrNull(std::size_t size, std::size_t alignment = kUsualAlignment) {
+    return Allocated([=] {
+        void* place = nullptr;
+        return posix_memalign(&place, alignment, size) == 0 ? place : nullptr;
+    });
+}
+void* New(std::size_t size, std::size_t alignment = kUsualAlignment) {
+    if (void* const memory = NewOrNull(size, alignment)) return memory;
+    throw std::bad_alloc();
+}
+#endif
+
+#if COUNTS_CALLS
 
 template <typename Result>
 Result Counted(Kind kind, Result result) {
@@ -92,7 +121,38 @@ bool AudioThreadRules::CanCount() {
 #endif
 }
 
+bool FailingAllocations::CanFail() {
+#if REPLACES_NEW
+    return true;
+#else
+    return AudioThreadRules::CanCount();
+#endif
+}
+
 }  // namespace TestSupport
+
+#if REPLACES_NEW
+using TestSupport::New;
+using TestSupport::NewOrNull;
+void* operator new(std::size_t size) { return New(size); }
+void* operator new[](std::size_t size) { return New(size); }
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept { return NewOrNull(size); }
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept { return NewOrNull(size); }
+void* operator new(std::size_t size, std::align_val_t alignment) {
+    return New(size, static_cast<std::size_t>(alignment));
+}
+void* operator new[](std::size_t size, std::align_val_t alignment) {
+    return New(size, static_cast<std::size_t>(alignment));
+}
+void operator delete(void* memory) noexcept { std::free(memory); }
+void operator delete[](void* memory) noexcept { std::free(memory); }
+void operator delete(void* memory, std::size_t) noexcept { std::free(memory); }
+void operator delete[](void* memory, std::size_t) noexcept { std::free(memory); }
+void operator delete(void* memory, std::align_val_t) noexcept { std::free(memory); }
+void operator delete[](void* memory, std::align_val_t) noexcept { std::free(memory); }
+void operator delete(void* memory, std::size_t, std::align_val_t) noexcept { std::free(memory); }
+void operator delete[](void* memory, std::size_t, std::align_val_t) noexcept { std::free(memory); }
+#endif
 
 #if COUNTS_CALLS
 using namespace TestSupport;
