@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# fuzz.sh [SECONDS]: builds everything with Clang, warnings as errors, and lets each fuzzer run its share of the time
+# fuzz.sh [SECONDS]: builds as ./check asan does, with Clang, warnings as errors, and lets each fuzzer run its share of the time
 # (60 s in all when nothing is said). ./check fuzz
 # Corpora grow in build/fuzz. An input that fails is left in build/fuzz/failed/TARGET: mend the fault, and keep the
 # input in Fuzz/Failed/TARGET under a name that says what it was.
@@ -8,11 +8,11 @@ cd "$(dirname "$0")/.."
 source Scripts/common.sh
 seconds=${1:-60}
 
-need_packages "${BUILD_PACKAGES[@]}" "${TEST_PACKAGES[@]}" "${FUZZ_PACKAGES[@]}"
-say "building (clang)"
-build_preset clang
+need_packages "${BUILD_PACKAGES[@]}" "${TEST_PACKAGES[@]}" "${CLANG_PACKAGES[@]}"
+say "building (asan)"
+build_preset asan
 
-work=build/fuzz programs=build/clang/bin
+work=build/fuzz programs=build/asan/bin
 Fuzz/seeds.sh $programs/dsphost $work/seeds
 fuzzers=($programs/fuzz_[A-Z]*)
 share=$(((seconds + ${#fuzzers[@]} - 1) / ${#fuzzers[@]}))

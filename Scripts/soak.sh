@@ -8,7 +8,7 @@ cd "$(dirname "$0")/.."
 source Scripts/common.sh
 seconds=${1:-600} seed=${2:-$RANDOM}
 
-need_packages "${BUILD_PACKAGES[@]}" "${TEST_PACKAGES[@]}"
+need_packages "${BUILD_PACKAGES[@]}" "${TEST_PACKAGES[@]}" "${CLANG_PACKAGES[@]}"
 say "building (asan)"
 build_preset asan fuzz_replay
 
