@@ -3,6 +3,7 @@
 #include "Spectrum/Fft/CorvoFFT.h"
 #include "Support/AudioThreadRules.h"
 #include "Support/EveryEffect.h"
+#include "Support/Sanitizers.h"
 #include "Support/Subjects.h"
 
 using namespace TestSupport;
@@ -30,13 +31,16 @@ double Sound(Subject<float>& subject) {
     return Energy(block);
 }
 
+// An engine of "New" in which memory failed is never touched again, not even to free it.
+bool LosesItsEngine(const std::string& name) { return name.starts_with("New") || name == "Pitch Shift"; }
+
 void ExpectToSurvive(const std::string& name, const MakeSubject<float>& make) {
     if (!FailingAllocations::CanFail()) GTEST_SKIP() << "allocations cannot be made to fail here";
     const auto other = make();
     other->Prepare();
     const double expected = Sound(*other);
     for (const bool lasting : {false, true})
-        for (int after = 0; after < 300; ++after) {
+        for (int after = 0; after < 300; after += 1 + (WITH_ADDRESS_SANITIZER ? after / 8 : 0)) {
             SCOPED_TRACE(name + (lasting ? ", lasting after " : ", once after ") + std::to_string(after));
             std::unique_ptr<Subject<float>> subject;
             auto block = Input();
@@ -48,7 +52,7 @@ void ExpectToSurvive(const std::string& name, const MakeSubject<float>& make) {
                 }
             };
             {
-                const FailingAllocations failing(after, lasting);
+                const FailingAllocations failing(after, lasting, LosesItsEngine(name));
                 attempt([&] { subject = make(); });
                 if (subject) {
                     attempt([&] { subject->Prepare(); });
@@ -74,7 +78,7 @@ class FailingMemory : public EveryEffect {};
 INSTANTIATE_TEST_SUITE_P(All, FailingMemory, testing::ValuesIn(AllEffects()), EffectTestName);
 
 TEST_P(FailingMemory, CostsOnePreparation) {
-    ExpectToSurvive("default", [] { return std::make_unique<EffectSubject<float>>(Make()); });
+    ExpectToSurvive(GetParam().name, [] { return std::make_unique<EffectSubject<float>>(Make()); });
 }
 
 TEST(FailingMemoryTest, CostsOnePreparationBesideTheEffects) {

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <atomic>
+#include <type_traits>
 
 namespace Corvo::DSP {
 
@@ -13,6 +14,9 @@ namespace Corvo::DSP {
 template <typename Value>
 class LatestValue {
 public:
+    // Written out because Clang 14 takes the implicit one for one that never throws.
+    LatestValue() noexcept(std::is_nothrow_default_constructible_v<Value>) {}
+
     // Writer: fill Draft() completely, then Publish() it. A published value that was not taken is replaced.
     Value& Draft() { return m_slots[m_draft]; }
     void Publish() {

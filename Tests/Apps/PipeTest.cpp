@@ -7,15 +7,12 @@
 
 #include "Apps/Program.h"
 #include "AudioReader.h"
+#include "Support/Sanitizers.h"
 #include "WavHeader.h"
 
 using namespace std::string_literals;
 
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool kSanitized = true;
-#else
-constexpr bool kSanitized = false;
-#endif
+constexpr bool kSanitized = WITH_ADDRESS_SANITIZER || WITH_THREAD_SANITIZER;
 
 namespace AppTest {
 namespace {

@@ -4,18 +4,16 @@
 #include <cerrno>
 #include <cstddef>
 
-// GCC tells of its sanitizers by macros, Clang by features.
-#if defined(__has_feature)
-#define HAS_FEATURE(name) __has_feature(name)
-#else
-#define HAS_FEATURE(name) 0
-#endif
-#if defined(__SANITIZE_ADDRESS__) || HAS_FEATURE(address_sanitizer)
+#include "Support/Sanitizers.h"
+
+#if WITH_ADDRESS_SANITIZER
 // The sanitizer's own functions stand behind malloc; operator new is replaced alone.
 #define REPLACES_NEW 1
+#include <sanitizer/lsan_interface.h>
+
 #include <cstdlib>
 #include <new>
-#elif defined(__linux__) && !defined(__SANITIZE_THREAD__) && !HAS_FEATURE(thread_sanitizer)
+#elif defined(__linux__) && !WITH_THREAD_SANITIZER
 #define COUNTS_CALLS 1
 #include <dlfcn.h>
 #include <pthread.h>
@@ -103,13 +101,22 @@ std::string AudioThreadRules::Broken() const {
     return text;
 }
 
-FailingAllocations::FailingAllocations(int after, bool lasting) {
+FailingAllocations::FailingAllocations(int after, bool lasting, bool losesMemory)
+    : m_losesMemory(losesMemory) {
+#if REPLACES_NEW
+    if (m_losesMemory) __lsan_disable();
+#endif
     t_untilFailure = after;
     t_failureLasts = lasting;
     t_failed = false;
 }
 
-FailingAllocations::~FailingAllocations() { t_untilFailure = -1; }
+FailingAllocations::~FailingAllocations() {
+    t_untilFailure = -1;
+#if REPLACES_NEW
+    if (m_losesMemory) __lsan_enable();
+#endif
+}
 
 bool FailingAllocations::Reached() const { return t_failed; }
 

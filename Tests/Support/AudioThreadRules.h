@@ -22,10 +22,11 @@ public:
 };
 
 // While one of these lives, the allocations of its thread fail: one of them, after so many that do not, or it
-// and all that follow.
+// and all that follow. What is then lost for good is a leak that the address sanitizer reports, unless that
+// is expected.
 class FailingAllocations {
 public:
-    FailingAllocations(int after, bool lasting);
+    FailingAllocations(int after, bool lasting, bool losesMemory);
     ~FailingAllocations();
     FailingAllocations(const FailingAllocations&) = delete;
     FailingAllocations& operator=(const FailingAllocations&) = delete;
@@ -34,6 +35,9 @@ public:
 
     // Where AudioThreadRules::CanCount, and under the address sanitizer.
     static bool CanFail();
+
+private:
+    [[maybe_unused]] bool m_losesMemory;
 };
 
 }  // namespace TestSupport
