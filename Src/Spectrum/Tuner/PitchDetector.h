@@ -13,6 +13,7 @@ namespace Corvo {
 struct Pitch {
     double hz = 0.0;  // 0: none
     float prominence = 0.0f;
+    double expectedHz = 0.0;  // where the pitch expected is now, if it is still heard; else 0
 };
 
 // The five ways to find the pitch of a power spectrum. Each method has a file of its own.
@@ -24,6 +25,9 @@ public:
     // measures the floor of the spectrum to analyse, and with `keepDenoised` keeps that spectrum without it.
     void Prepare(const SpectrumFormat& format);
     void MeasureFloor(std::span<const float> power, bool keepDenoised);
+    // What was heard up to now, 0 for nothing: TuneHPSdenoise prefers it to another pitch that explains the
+    // peaks hardly better, and looks for it beside one that explains them much better.
+    void Expect(double hz) { m_expectedHz = hz; }
 
     // Of the peaks above the floor, the fundamental that explains them best. With `denoise` they are those of
     // the spectrum without its floor, which must have been kept.
@@ -57,6 +61,7 @@ private:
     PitchCandidates m_candidates;
     HarmonicProduct m_product;
     std::vector<float> m_denoised;
+    double m_expectedHz = 0.0;
 };
 
 template <typename Score>

@@ -11,6 +11,7 @@
 namespace Corvo {
 class Analyser;
 class PitchDetector;
+struct Pitch;
 struct NearestNote;
 }  // namespace Corvo
 
@@ -106,7 +107,8 @@ public:
     // A sensitivity says which pitches are sought; how far above the noise floor a partial must stand to keep
     // a note alive and how far to begin one, and how far below the loudest it may lie (method 1 has limits of
     // its own); how long a note is held and when it is dropped; how often another must be heard before it
-    // replaces the note shown (a first one twice in succession); and how many partials method 2 sums.
+    // replaces the note shown (a first one twice in succession, within 25 cents); and how many partials
+    // method 2 sums.
     // Choosing method 1 makes these five until a sensitivity is set.
     void SetSensibilityPreset(int preset);
     int GetSensibilityPreset() const;
@@ -145,12 +147,13 @@ public:
     int GetOctave() const;
     // The pitch last heard of the note shown, Hz. 0 without a note.
     double GetFrequency() const;
-    // What the last analysis heard, whether or not it is the note shown yet; 0 when it heard nothing or none
-    // has come for long. Hz.
+    // Where the pitch shown was at the last analysis, Hz: that of the note, or where it has glided to since,
+    // before another note is shown. 0 when it was not heard or no analysis has come for long, and for what is
+    // heard but not shown yet.
     double GetHeardFrequency() const;
     // How far the pitch shown is from the note, positive when sharp. 0 without a note.
     float GetErrorCents() const;
-    // By how many decibels the strongest partial (the product, with method 1) stood out. 0 without a note.
+    // By how many decibels the partials together (the product, with method 1) stood out. 0 without a note.
     float GetProminence() const;
     // The mean pitch of the last half second or a little more, if it stayed within 10 cents, else 0. Hz.
     double GetStableFrequency() const;
@@ -181,7 +184,7 @@ private:
     void ResetPeakMemories(bool forgetNote);
     void Hear(double hz, float prominence, const Corvo::NearestNote& heard);
     // `seconds`: since the analysis before.
-    void Follow(double hz, float prominence, double seconds);
+    void Follow(const Corvo::Pitch& pitch, double seconds);
     void RememberPitch(double hz, double seconds);
     void ForgetPitches();
     // After so many refreshes without the note shown.
@@ -210,6 +213,7 @@ private:
     TunedNote m_announced;
     TunedNote m_other;  // heard instead of the note shown, so often in succession
     int m_otherCount = 0;
+    double m_otherHz = 0.0;  // the last of them
     // In refreshes: between analyses, since the last one, and without the note shown up to that.
     double m_period = 1.0, m_waited = 0.0, m_missed = 0.0;
     std::array<double, kLongestMemory> m_pitches{};  // of the note shown, octaves above 1 Hz

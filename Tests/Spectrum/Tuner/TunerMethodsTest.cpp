@@ -137,7 +137,7 @@ TEST_F(TunerTest, HearsAsTheSensitivitySays) {
                         hz > row.lowest && hz < row.highest ? hz : 0.0, 0.1);
 
         for (const auto& [decibels, heard] : {std::pair{row.onset - 0.2, false},
-                                              {row.onset + 0.2, true},
+                                              {row.onset + 0.2, false},
                                               {row.onset + 0.2, true},
                                               {row.partial + 0.2, true},
                                               {row.partial - 0.2, false}}) {
