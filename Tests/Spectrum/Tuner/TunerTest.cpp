@@ -143,6 +143,23 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
     }
 }
 
+// What is given as heard belongs to the note shown: nothing while a pitch falls as a drum's does, or for
+// another note before it is shown; where a glide has led; and the note itself beside another.
+TEST_F(TunerTest, GivesNothingThatItDoesNotShow) {
+    const auto low = TunerSounds::Sound(TunerSounds::Kind::Sawtooth, 220.0, kTunerRate, kLength, 0.0);
+    const auto high = TunerSounds::Sound(TunerSounds::Kind::Sawtooth, 311.1, kTunerRate, kLength, 0.0);
+    TunerProbe probe;
+    const auto expectHeard = [&probe](const std::vector<float>& sound, double hz) {
+        probe.Tune(sound.data());
+        EXPECT_NEAR(probe.tuner.GetHeardFrequency(), hz, 0.2);
+    };
+    for (int i = 4; i >= 0; --i) expectHeard(Sharp(30.0 * i), 0.0);
+    for (const double cents : {0.0, 40.0, 80.0}) expectHeard(Sharp(cents), 440.0 * std::exp2(cents / 1200.0));
+    expectHeard(Sharp(500.0), 0.0);
+    for (int i = 0; i < 3; ++i) probe.Tune(low.data());
+    for (int i = 0; i < 2; ++i) expectHeard(TunerSounds::Mixed(low, high, 1.2f), 220.0);
+}
+
 // Takes a steady pitch for the nearest note, one that wanders by more than 10 cents for nothing. Refreshed
 // every 30 ms, half a second is 18 analyses from the one that shows the note, which is the second.
 TEST_F(TunerTest, Calibrates) {
