@@ -160,6 +160,20 @@ TEST_F(TunerTest, GivesNothingThatItDoesNotShow) {
     for (int i = 0; i < 2; ++i) expectHeard(TunerSounds::Mixed(low, high, 1.2f), 220.0);
 }
 
+// Weak odd partials make a sound one of an octave lower, but not while its even ones are heard as a note.
+TEST_F(TunerTest, KeepsItsOctaveInDoubt) {
+    const auto partials = [](const std::vector<int>& numbers) {
+        return TunerSounds::Partials(numbers, 110.0, kTunerRate, kLength);
+    };
+    const auto even = partials({2, 4, 6, 8, 10, 12});
+    const auto doubtful = TunerSounds::Mixed(even, partials({1, 3, 5, 7, 9, 11}), 0.15f);
+    TunerProbe probe;
+    EXPECT_NEAR(probe.Hear(doubtful.data()), 110.0, 0.1);
+    EXPECT_NEAR(probe.Hear(even.data()), 220.0, 0.1);
+    for (int i = 0; i < 3; ++i) probe.Tune(doubtful.data());
+    EXPECT_NEAR(probe.tuner.GetFrequency(), 220.0, 0.1);
+}
+
 // Takes a steady pitch for the nearest note, one that wanders by more than 10 cents for nothing. Refreshed
 // every 30 ms, half a second is 18 analyses from the one that shows the note, which is the second.
 TEST_F(TunerTest, Calibrates) {
