@@ -37,7 +37,7 @@ Pitch PitchDetector::TuneHPSdenoise(std::span<const float> power, bool denoise) 
         return kBelieved * explained;
     });
     Pitch pitch = InterpolatePitchAndAssignOutputValues(peaks, best);
-    if (kHeardBeside * mostExpected <= most) return pitch;
+    if (stillHeard == best || kHeardBeside * mostExpected <= most) return pitch;
     const Pitch still = InterpolatePitchAndAssignOutputValues(peaks, stillHeard);
     if (still.prominence >= m_sensitivity.onsetDb) pitch.expectedHz = still.hz;
     return pitch;
