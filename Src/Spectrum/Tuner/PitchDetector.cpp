@@ -38,6 +38,11 @@ void PitchDetector::MeasureFloor(std::span<const float> power, bool keepDenoised
     if (keepDenoised) m_peaks.RemoveFloor(power, m_denoised);
 }
 
+const Pitch& PitchDetector::Keep(const Pitch& pitch) {
+    m_beforeHz = m_now.hz;
+    return m_now = pitch;
+}
+
 std::span<const SpectralPeak> PitchDetector::Peaks(std::span<const float> power) {
     return m_peaks.FilterPeaks(power, power, m_sensitivity);
 }

@@ -42,6 +42,11 @@ public:
     // Two-way mismatch: the candidate with the least distances from its partials to the peaks and back.
     Pitch TuneTWMorig(std::span<const float> power);
 
+    // Notes what a method found. That, and the pitch found before it.
+    const Pitch& Keep(const Pitch& pitch);
+    const Pitch& Now() const { return m_now; }
+    double Before() const { return m_beforeHz; }
+
     // Empty unless it was kept at the last analysis.
     const std::vector<float>& Denoised() const { return m_denoised; }
 
@@ -61,7 +66,8 @@ private:
     PitchCandidates m_candidates;
     HarmonicProduct m_product;
     std::vector<float> m_denoised;
-    double m_expectedHz = 0.0;
+    double m_expectedHz = 0.0, m_beforeHz = 0.0;
+    Pitch m_now;
 };
 
 template <typename Score>

@@ -187,10 +187,10 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
                 return m_detector->TuneLegacy(spectrum);
         }
     };
-    const Corvo::Pitch pitch = detect();
+    const Corvo::Pitch& pitch = m_detector->Keep(detect());
     const double seconds = static_cast<double>(hopLength >= 1 ? hopLength : window) / samplingRate;
     m_period = std::max(kRefreshRate * seconds, 1.0);
-    Follow(pitch, std::max(seconds, kShortestPeriod));
+    Follow(pitch.hz, pitch.prominence, std::max(seconds, kShortestPeriod));
     m_waited = 0.0;
     return GetTunedNote() != m_announced;
 }
@@ -219,26 +219,25 @@ void Tuner::DoAsAsked() {
 }
 
 // The note shown follows the pitch at once; another replaces it only when it has been heard often enough.
-void Tuner::Follow(const Corvo::Pitch& pitch, double seconds) {
+void Tuner::Follow(double hz, float prominence, double seconds) {
     const Corvo::TunerSensitivity& sensitivity = m_detector->Sensitivity();
-    const double hz = pitch.hz;
     const bool heard = hz > 0.0;
     const Corvo::NearestNote nearest = heard ? TunerNotes::Shared().FindNearest(hz) : Corvo::NearestNote{};
     const TunedNote note{nearest.note, nearest.octave}, shown = GetTunedNote();
     const bool same = heard && note == shown;
-    const bool other = heard && !same && pitch.prominence >= sensitivity.onsetDb;
-    const bool again = note == m_other && (shown.note >= 0 || AreNear(hz, m_otherHz, kSteadyOctaves));
+    const bool other = heard && !same && prominence >= sensitivity.onsetDb;
+    const bool again =
+        note == m_other && (shown.note >= 0 || AreNear(hz, m_detector->Before(), kSteadyOctaves));
     m_otherCount = !other ? 0 : again ? m_otherCount + 1 : 1;
     m_other = note;
-    m_otherHz = hz;
     const int needed = shown.note < 0 ? kFirstConfirmations
                                       : static_cast<int>(std::ceil(sensitivity.confirmCount / m_period));
     const bool shows = same || (other && m_otherCount >= needed);
     const bool glides = other && AreNear(hz, m_heardFrequency, kGlideOctaves);
-    m_heardFrequency = shows || glides ? hz : pitch.expectedHz;
+    m_heardFrequency = shows || glides ? hz : m_detector->Now().expectedHz;
     if (shows) {
         if (!same) ResetPeakMemories(false);
-        Hear(hz, pitch.prominence, nearest);
+        Hear(hz, prominence, nearest);
         RememberPitch(hz, seconds);
     } else if (other) {
         ForgetPitches();

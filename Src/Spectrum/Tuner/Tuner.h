@@ -11,7 +11,6 @@
 namespace Corvo {
 class Analyser;
 class PitchDetector;
-struct Pitch;
 struct NearestNote;
 }  // namespace Corvo
 
@@ -184,7 +183,7 @@ private:
     void ResetPeakMemories(bool forgetNote);
     void Hear(double hz, float prominence, const Corvo::NearestNote& heard);
     // `seconds`: since the analysis before.
-    void Follow(const Corvo::Pitch& pitch, double seconds);
+    void Follow(double hz, float prominence, double seconds);
     void RememberPitch(double hz, double seconds);
     void ForgetPitches();
     // After so many refreshes without the note shown.
@@ -213,7 +212,6 @@ private:
     TunedNote m_announced;
     TunedNote m_other;  // heard instead of the note shown, so often in succession
     int m_otherCount = 0;
-    double m_otherHz = 0.0;  // the last of them
     // In refreshes: between analyses, since the last one, and without the note shown up to that.
     double m_period = 1.0, m_waited = 0.0, m_missed = 0.0;
     std::array<double, kLongestMemory> m_pitches{};  // of the note shown, octaves above 1 Hz
