@@ -128,26 +128,28 @@ void DrawPitchTrace(Sonogram& sonogram, DrawTarget& target, const RectF& rectang
     const CoordinatesAndFrequencies& map = sonogram.GetFrequencyMap();
     std::vector<PointF>& trace = ViewAccess::Trace(sonogram);
     constexpr float kLargestStep = 1.09f;  // one and a half semitones from column to column is another note
+    constexpr float kLongestGap = 0.1f;    // seconds that a note may go unheard without a gap in its line
     const float perRow = rectangle.height / static_cast<float>(bitmap.height);
     const float perColumn = rectangle.width / static_cast<float>(bitmap.width);
     const float width = Look::kTraceWidth * target.Scale();
     trace.reserve(static_cast<std::size_t>(bitmap.width));
     target.PushClip(rectangle);
+    const int longestGap =
+        static_cast<int>(kLongestGap * static_cast<float>(Sonogram::GetColumnsPerSecond()));
     for (int column = 0; column < bitmap.width;) {
         trace.clear();
-        float before = sonogram.GetPitch(column);
-        for (; column < bitmap.width; ++column) {
+        float before = 0.0f;
+        for (int last = column; column < bitmap.width && column <= last + 1 + longestGap; ++column) {
             const float pitch = sonogram.GetPitch(column);
-            if (!(pitch > 0.0f) || pitch > before * kLargestStep || before > pitch * kLargestStep) break;
+            if (!(pitch > 0.0f)) continue;
+            if (before > 0.0f && (pitch > before * kLargestStep || before > pitch * kLargestStep)) break;
             trace.push_back({rectangle.x + (static_cast<float>(column) + 0.5f) * perColumn,
                              Bottom(rectangle) - map.FrequencyToX(pitch) * perRow});
             before = pitch;
+            last = column;
         }
         const auto count = static_cast<int>(trace.size());
-        if (count == 0) {
-            ++column;
-            continue;
-        }
+        if (count == 0) continue;
         target.Polyline(trace.data(), count, {{Look::kGround, 200}, 2.0f * width});
         target.Polyline(trace.data(), count, {{Look::kTrace}, width});
     }

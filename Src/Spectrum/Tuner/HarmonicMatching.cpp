@@ -25,6 +25,8 @@ constexpr double kUsualInharmonicity = 5e-4;
 constexpr double kDoubt = 3.0;
 // Peaks that miss the fit by more standard deviations than this belong to something else.
 constexpr double kOutlier = 6.0;
+// A fit that explains less than this share of what it set out from has taken partials for others.
+constexpr float kStillExplained = 0.5f;
 
 // Partials at n sqrt(square + stretch (n^2 - 1)): the first one's square, and what a stiff string adds.
 // Exactly a straight line over n^2, fitted by weighted least squares. A stretch is as unlikely as the strings
@@ -142,7 +144,9 @@ double RefineFundamental(std::span<const SpectralPeak> peaks, double fundamental
         if (off * off <= kOutlier * kOutlier * peaks[i].variance) add(belonging, peaks[i], numbers[i]);
     }
     const double fitted = belonging.w > 0.0 ? belonging.Fit(slopeWeight).First() : series.First();
-    return fitted > 0.0 ? fitted : fundamental;
+    if (!(fitted > 0.0)) return fundamental;
+    const float before = HarmonicMatching(peaks, fundamental);
+    return HarmonicMatching(peaks, fitted) >= kStillExplained * before ? fitted : fundamental;
 }
 
 }  // namespace Corvo

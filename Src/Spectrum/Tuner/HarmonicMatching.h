@@ -36,7 +36,7 @@ float HarmonicMatching(std::span<const SpectralPeak> peaks, double fundamental);
 
 // The frequency, in bins, of the first partial of the sound whose fundamental is about `fundamental`: the
 // best weighted fit of partials f_n = n f sqrt(1 + B n^2), B small, to the peaks that belong to it. As given,
-// when none does.
+// when none does or the fit explains the peaks less well.
 double RefineFundamental(std::span<const SpectralPeak> peaks, double fundamental);
 
 }  // namespace Corvo

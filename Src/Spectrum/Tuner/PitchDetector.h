@@ -13,6 +13,7 @@ namespace Corvo {
 struct Pitch {
     double hz = 0.0;  // 0: none
     float prominence = 0.0f;
+    double expectedHz = 0.0;  // where the pitch expected is now, if it is still heard; else 0
 };
 
 // The five ways to find the pitch of a power spectrum. Each method has a file of its own.
@@ -24,6 +25,9 @@ public:
     // measures the floor of the spectrum to analyse, and with `keepDenoised` keeps that spectrum without it.
     void Prepare(const SpectrumFormat& format);
     void MeasureFloor(std::span<const float> power, bool keepDenoised);
+    // What was heard up to now, 0 for nothing: TuneHPSdenoise prefers it to another pitch that explains the
+    // peaks hardly better, and looks for it beside one that explains them much better.
+    void Expect(double hz) { m_expectedHz = hz; }
 
     // Of the peaks above the floor, the fundamental that explains them best. With `denoise` they are those of
     // the spectrum without its floor, which must have been kept.
@@ -37,6 +41,11 @@ public:
     Pitch TuneLegacy(std::span<const float> power);
     // Two-way mismatch: the candidate with the least distances from its partials to the peaks and back.
     Pitch TuneTWMorig(std::span<const float> power);
+
+    // Notes what a method found. That, and the pitch found before it.
+    const Pitch& Keep(const Pitch& pitch);
+    const Pitch& Now() const { return m_now; }
+    double Before() const { return m_beforeHz; }
 
     // Empty unless it was kept at the last analysis.
     const std::vector<float>& Denoised() const { return m_denoised; }
@@ -57,6 +66,8 @@ private:
     PitchCandidates m_candidates;
     HarmonicProduct m_product;
     std::vector<float> m_denoised;
+    double m_expectedHz = 0.0, m_beforeHz = 0.0;
+    Pitch m_now;
 };
 
 template <typename Score>

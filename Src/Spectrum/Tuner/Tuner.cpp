@@ -25,6 +25,9 @@ constexpr double kStableSeconds = 0.5;
 constexpr double kStableOctaves = 10.0 / 1200.0;
 // The first analysis of an attack often hears its noise, the second one the note.
 constexpr int kFirstConfirmations = 2;
+// A pitch that moves faster from one analysis to the next, as many a drum's does, is no first note yet; one
+// that moves less than the second has not become another by a jump.
+constexpr double kSteadyOctaves = 25.0 / 1200.0, kGlideOctaves = 1.0 / 12.0;
 // An analysis this much later than its hop says, in refreshes, is taken to be missing: hosts feed in blocks.
 constexpr double kLate = 8.0;
 constexpr double kLargestCalibration = 50.0;  // cents
@@ -52,6 +55,10 @@ void TellOfTuning() {
 void Calibrate(double base) {
     TunerNotes::Shared().SetBase(base);
     TellOfTuning();
+}
+
+bool AreNear(double hz, double other, double octaves) {
+    return hz > 0.0 && other > 0.0 && std::abs(std::log2(hz / other)) < octaves;
 }
 
 bool Within(int index, std::size_t count) { return index >= 0 && static_cast<std::size_t>(index) < count; }
@@ -163,6 +170,7 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
     const std::span<const float> spectrum(power.data(), bins);
 
     m_detector->MeasureFloor(spectrum, denoise || g_choices.showDenoised);
+    m_detector->Expect(GetHeardFrequency() > 0.0 || !IsTracking() ? GetHeardFrequency() : GetFrequency());
 
     const auto detect = [&]() -> Corvo::Pitch {
         if (denoise) return m_detector->TuneHPSdenoise(spectrum, true);
@@ -179,10 +187,10 @@ bool Tuner::Analyse(const std::vector<float>& power, int fftLength, int hopLengt
                 return m_detector->TuneLegacy(spectrum);
         }
     };
-    const auto [hz, prominence] = detect();
+    const Corvo::Pitch& pitch = m_detector->Keep(detect());
     const double seconds = static_cast<double>(hopLength >= 1 ? hopLength : window) / samplingRate;
     m_period = std::max(kRefreshRate * seconds, 1.0);
-    Follow(hz, prominence, std::max(seconds, kShortestPeriod));
+    Follow(pitch.hz, pitch.prominence, std::max(seconds, kShortestPeriod));
     m_waited = 0.0;
     return GetTunedNote() != m_announced;
 }
@@ -218,12 +226,16 @@ void Tuner::Follow(double hz, float prominence, double seconds) {
     const TunedNote note{nearest.note, nearest.octave}, shown = GetTunedNote();
     const bool same = heard && note == shown;
     const bool other = heard && !same && prominence >= sensitivity.onsetDb;
-    m_otherCount = !other ? 0 : note == m_other ? m_otherCount + 1 : 1;
+    const bool again =
+        note == m_other && (shown.note >= 0 || AreNear(hz, m_detector->Before(), kSteadyOctaves));
+    m_otherCount = !other ? 0 : again ? m_otherCount + 1 : 1;
     m_other = note;
-    m_heardFrequency = same || other ? hz : 0.0;
     const int needed = shown.note < 0 ? kFirstConfirmations
                                       : static_cast<int>(std::ceil(sensitivity.confirmCount / m_period));
-    if (same || (other && m_otherCount >= needed)) {
+    const bool shows = same || (other && m_otherCount >= needed);
+    const bool glides = other && AreNear(hz, m_heardFrequency, kGlideOctaves);
+    m_heardFrequency = shows || glides ? hz : m_detector->Now().expectedHz;
+    if (shows) {
         if (!same) ResetPeakMemories(false);
         Hear(hz, prominence, nearest);
         RememberPitch(hz, seconds);

@@ -106,7 +106,8 @@ public:
     // A sensitivity says which pitches are sought; how far above the noise floor a partial must stand to keep
     // a note alive and how far to begin one, and how far below the loudest it may lie (method 1 has limits of
     // its own); how long a note is held and when it is dropped; how often another must be heard before it
-    // replaces the note shown (a first one twice in succession); and how many partials method 2 sums.
+    // replaces the note shown (a first one twice in succession, within 25 cents); and how many partials
+    // method 2 sums.
     // Choosing method 1 makes these five until a sensitivity is set.
     void SetSensibilityPreset(int preset);
     int GetSensibilityPreset() const;
@@ -145,12 +146,13 @@ public:
     int GetOctave() const;
     // The pitch last heard of the note shown, Hz. 0 without a note.
     double GetFrequency() const;
-    // What the last analysis heard, whether or not it is the note shown yet; 0 when it heard nothing or none
-    // has come for long. Hz.
+    // Where the pitch shown was at the last analysis, Hz: that of the note, or where it has glided to since,
+    // before another note is shown. 0 when it was not heard or no analysis has come for long, and for what is
+    // heard but not shown yet.
     double GetHeardFrequency() const;
     // How far the pitch shown is from the note, positive when sharp. 0 without a note.
     float GetErrorCents() const;
-    // By how many decibels the strongest partial (the product, with method 1) stood out. 0 without a note.
+    // By how many decibels the partials together (the product, with method 1) stood out. 0 without a note.
     float GetProminence() const;
     // The mean pitch of the last half second or a little more, if it stayed within 10 cents, else 0. Hz.
     double GetStableFrequency() const;

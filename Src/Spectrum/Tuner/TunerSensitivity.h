@@ -8,7 +8,7 @@ namespace Corvo {
 //
 //   lowestHz, highestHz  pitches sought; the lowest also gives the first bin searched
 //   partialDb            a peak this far above the noise floor is a partial, and keeps the note alive
-//   onsetDb              a partial this far above the floor is needed to begin a note or change to another
+//   onsetDb              partials that together stand this far above it begin a note or change to another
 //   rangeDb              partials this far below the strongest one count for nothing
 //   releaseCount         refreshes without the note until it is dropped
 //   holdCount            refreshes without the note for which the tuner still counts as tracking it

@@ -169,6 +169,21 @@ TEST_F(Readings, TraceStandsInThePitchsRow) {
     EXPECT_NEAR(heard.back().x, Right(m_plot), 2.0f);
 }
 
+// Catches gaps where a note went unheard for a tenth of a second, and lines across silence or to another
+// note.
+TEST_F(Readings, TraceGoesOnOverAMoment) {
+    HearIntoSonogram(440.0, 0.5);
+    for (const auto& [hz, columns] :
+         {std::pair{440.0f, 5}, {0.0f, 3}, {440.0f, 1}, {0.0f, 4}, {440.0f, 2}, {500.0f, 3}})
+        for (int i = 0; i < columns; ++i)
+            analyser.GetSonogram()->Step(*analyser.GetSpectrumDrawer(), true, hz);
+    analyser.SetTunerOn(true);
+    std::vector<std::size_t> lengths;
+    for (const auto& [points, colour] : ShowSonogram().lines)
+        if (colour == Look::kTrace) lengths.push_back(points.size());
+    EXPECT_EQ(lengths, (std::vector<std::size_t>{6, 2, 3}));
+}
+
 // Catches a dial, a needle or an arrow that is mirrored, and labels that are not the needle's.
 TEST_F(Readings, NeedleAndArrowAreOnTheErrorsSide) {
     for (const double cents : {-40.0, 0.0, 20.0}) {

@@ -61,7 +61,7 @@ TEST_F(TunerAnalyserTest, TunesEveryFrameWhileOn) {
 // The answer to a frame is a window twice as long, whose spectrum has each frequency at twice the bin.
 TEST_F(TunerAnalyserTest, SkipsAFrameWhoseBuffersWereRebuilt) {
     Answer(kMessageFrameReady, 1227);
-    for (const std::size_t length : {8192u, 16384u}) {
+    for (const std::size_t length : {8192u, 16384u, 16384u}) {
         EXPECT_EQ(m_tuner.GetHeardFrequency(), 0.0);
         EXPECT_TRUE(Tune(TestSupport::Sine<float>(length, 440.0, kRate)));
     }
@@ -101,7 +101,8 @@ TEST_F(TunerAnalyserTest, KnowsItsWindow) {
             for (const Kind kind : {Kind::Sine, Kind::MissingFundamental})
                 for (const double hz : {82.4, 221.3, 2093.0}) {
                     m_analyser.SetTunerOn(true);
-                    ASSERT_TRUE(Tune(TunerSounds::Sound(kind, hz, kRate, 8192, 0.3)));
+                    for (int i = 0; i < 2; ++i)
+                        ASSERT_TRUE(Tune(TunerSounds::Sound(kind, hz, kRate, 8192, 0.3)));
                     EXPECT_NEAR(m_tuner.GetHeardFrequency() * 8192 / kRate, hz * 8192 / kRate,
                                 kBins[windowType])
                         << "window " << windowType << " padded to " << fftLength << ", " << hz << " Hz";

@@ -56,11 +56,11 @@ public:
     void Show(const float* samples, bool denoise = false) {
         for (int i = 0; i < 2; ++i) Tune(samples, denoise);
     }
-    // What one analysis hears, whatever came before.
+    // What analyses of one sound hear, whatever came before.
     double Hear(const float* samples) { return Hear(Transform(samples)); }
     double Hear(const std::vector<float>& power) {
         tuner.Forget();
-        Tune(power);
+        for (int i = 0; i < 2; ++i) Tune(power);
         return tuner.GetHeardFrequency();
     }
 

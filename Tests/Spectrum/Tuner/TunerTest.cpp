@@ -143,6 +143,37 @@ TEST_F(TunerTest, HoldsAndReleasesByTheSensitivity) {
     }
 }
 
+// What is given as heard belongs to the note shown: nothing while a pitch falls as a drum's does, or for
+// another note before it is shown; where a glide has led; and the note itself beside another.
+TEST_F(TunerTest, GivesNothingThatItDoesNotShow) {
+    const auto low = TunerSounds::Sound(TunerSounds::Kind::Sawtooth, 220.0, kTunerRate, kLength, 0.0);
+    const auto high = TunerSounds::Sound(TunerSounds::Kind::Sawtooth, 311.1, kTunerRate, kLength, 0.0);
+    TunerProbe probe;
+    const auto expectHeard = [&probe](const std::vector<float>& sound, double hz) {
+        probe.Tune(sound.data());
+        EXPECT_NEAR(probe.tuner.GetHeardFrequency(), hz, 0.2);
+    };
+    for (int i = 4; i >= 0; --i) expectHeard(Sharp(30.0 * i), 0.0);
+    for (const double cents : {0.0, 40.0, 80.0}) expectHeard(Sharp(cents), 440.0 * std::exp2(cents / 1200.0));
+    expectHeard(Sharp(500.0), 0.0);
+    for (int i = 0; i < 3; ++i) probe.Tune(low.data());
+    for (int i = 0; i < 2; ++i) expectHeard(TunerSounds::Mixed(low, high, 1.2f), 220.0);
+}
+
+// Weak odd partials make a sound one of an octave lower, but not while its even ones are heard as a note.
+TEST_F(TunerTest, KeepsItsOctaveInDoubt) {
+    const auto partials = [](const std::vector<int>& numbers) {
+        return TunerSounds::Partials(numbers, 110.0, kTunerRate, kLength);
+    };
+    const auto even = partials({2, 4, 6, 8, 10, 12});
+    const auto doubtful = TunerSounds::Mixed(even, partials({1, 3, 5, 7, 9, 11}), 0.15f);
+    TunerProbe probe;
+    EXPECT_NEAR(probe.Hear(doubtful.data()), 110.0, 0.1);
+    EXPECT_NEAR(probe.Hear(even.data()), 220.0, 0.1);
+    for (int i = 0; i < 3; ++i) probe.Tune(doubtful.data());
+    EXPECT_NEAR(probe.tuner.GetFrequency(), 220.0, 0.1);
+}
+
 // Takes a steady pitch for the nearest note, one that wanders by more than 10 cents for nothing. Refreshed
 // every 30 ms, half a second is 18 analyses from the one that shows the note, which is the second.
 TEST_F(TunerTest, Calibrates) {
