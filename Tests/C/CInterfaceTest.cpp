@@ -70,7 +70,9 @@ public:
     void* closed = nullptr;
 
 private:
-    void Add(dsp_status status, void* handle) {
+    // By reference: by value the handle might be read before it is made.
+    template <typename Handle>
+    void Add(dsp_status status, Handle* const& handle) {
         EXPECT_EQ(status, DSP_OK);
         all.push_back(handle);
     }
