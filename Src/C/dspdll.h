@@ -243,7 +243,9 @@ typedef struct dsp_band {
 } dsp_band;
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_create(dsp_equaliser** equaliser, dsp_error* error);
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_bands(dsp_equaliser* equaliser, int32_t* count);
-/* All bands at once. While it is prepared, bands that were there glide to their new shape. */
+/* All bands at once. While it is prepared, each place in the array glides to its new shape within some 3200
+ * frames. A band that is new, removed, bypassed or flat (0 dB, no pass) is so from the next frame on, as the
+ * equaliser leaves it out: take a peak or shelf to 0.1 dB first and let it arrive, where that would click. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_set_bands(dsp_equaliser* equaliser, const dsp_band* bands,
                                                       int32_t count, dsp_error* error);
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_band(dsp_equaliser* equaliser, int32_t band, dsp_band* record);
