@@ -2,14 +2,12 @@
 
 #include <pybind11/stl.h>
 
-#include "DSP/Effects/EffectKinds.h"
-
 namespace python {
 
 namespace py = pybind11;
 
 Effect::Effect(const std::string& name)
-    : m_name(name), m_effect(Made<dsp_effect>([&](dsp_effect** handle, dsp_error* error) {
+    : m_effect(Made<dsp_effect>([&](dsp_effect** handle, dsp_error* error) {
           return dsp_effect_create(name.c_str(), handle, error);
       })) {}
 
@@ -71,7 +69,7 @@ std::vector<std::string> Effect::Presets() const {
     return names;
 }
 
-int Effect::DefaultPreset() const { return Corvo::DSP::FindEffectKind(m_name)->make()->GetDefaultPreset(); }
+int Effect::DefaultPreset() const { return Asked(dsp_effect_default_preset, m_effect); }
 
 void Effect::SetPreset(int index) { Check(dsp_effect_set_preset(m_effect.get(), index)); }
 

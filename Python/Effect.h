@@ -40,7 +40,6 @@ public:
 private:
     std::string ParameterText(int index, int which) const;
 
-    std::string m_name;
     Owned<dsp_effect> m_effect;
 };
 

@@ -56,6 +56,7 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
         {
             const AudioThreadRules rules;
             effect->Process(reinterpret_cast<double*>(block.data()), 256, &format, flags);
+            if (force) effect->InitResetProcessingLight(true);
             broken = rules.Broken();
         }
         ASSERT_EQ(broken, "") << what;

@@ -1,6 +1,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <iterator>
 #include <memory>
 #include <span>
 #include <vector>
@@ -60,6 +61,28 @@ const std::vector<float>* PowersOf(kivspectrum& analyser, int which) {
     }
 }
 
+struct Switch {
+    void (kivspectrum::*set)(bool);
+    bool (kivspectrum::*get)() const;
+};
+constexpr Switch kSwitches[]{
+    {&kivspectrum::SetOn, &kivspectrum::GetOn},
+    {&kivspectrum::SetTunerOn, &kivspectrum::GetTunerOn},
+    {&kivspectrum::SetFrozen, &kivspectrum::GetFrozen},
+    {&kivspectrum::ShowSonogram, &kivspectrum::IsShowSonogram},
+    {&kivspectrum::SetShowInfoBox, &kivspectrum::IsShowInfoBox},
+};
+static_assert(DSP_SHOW_INFO + 1 == std::size(kSwitches));
+
+// call(kivspectrum&, const Switch&)
+template <typename Call>
+dsp_status WithSwitch(dsp_analyser* analyser, int32_t which, Call call) {
+    return WithAnalyser(analyser, [&](kivspectrum& a) -> dsp_status {
+        if (!Within(which, 0, DSP_SHOW_INFO)) return DSP_OUT_OF_RANGE;
+        return call(a, kSwitches[which]);
+    });
+}
+
 dsp_status GiveMenu(int32_t entry, const char* Corvo::AnalyserMenuEntry::*text, char* buffer, size_t size,
                     size_t* needed) {
     if (!Within(entry, 0, dsp_menu_entries() - 1)) return DSP_OUT_OF_RANGE;
@@ -77,27 +100,14 @@ dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, d
 }
 
 dsp_status DSP_CALL dsp_analyser_switch(dsp_analyser* analyser, int32_t which, int32_t on) {
-    return WithAnalyser(analyser, [&](kivspectrum& a) -> dsp_status {
-        switch (which) {
-            case DSP_ANALYSER_ON:
-                a.SetOn(on != 0);
-                break;
-            case DSP_TUNER_ON:
-                a.SetTunerOn(on != 0);
-                break;
-            case DSP_FROZEN:
-                a.SetFrozen(on != 0);
-                break;
-            case DSP_SHOW_SONOGRAM:
-                a.ShowSonogram(on != 0);
-                break;
-            case DSP_SHOW_INFO:
-                a.SetShowInfoBox(on != 0);
-                break;
-            default:
-                return DSP_OUT_OF_RANGE;
-        }
+    return WithSwitch(analyser, which, [on](kivspectrum& a, const Switch& found) {
+        (a.*found.set)(on != 0);
         return DSP_OK;
+    });
+}
+dsp_status DSP_CALL dsp_analyser_is_on(dsp_analyser* analyser, int32_t which, int32_t* on) {
+    return WithSwitch(analyser, which, [on](kivspectrum& a, const Switch& found) {
+        return Give<int32_t>((a.*found.get)(), on);
     });
 }
 

@@ -79,6 +79,13 @@ dsp_status DSP_CALL dsp_converter_frames(dsp_converter* converter, int64_t in_fr
     });
 }
 
+dsp_status DSP_CALL dsp_converter_factors(dsp_converter* converter, int32_t* up, int32_t* down) {
+    return With<Converter>(converter, [&](Converter& c) {
+        if (up) *up = c.converter.Up();
+        if (down) *down = c.converter.Down();
+    });
+}
+
 dsp_status DSP_CALL dsp_converter_process(dsp_converter* converter, const void* in, int32_t frames, void* out,
                                           int32_t capacity, int32_t* written) {
     return With<Converter>(converter, [&](Converter& c) -> dsp_status {

@@ -126,6 +126,12 @@ dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position) {
     });
 }
 
+dsp_status DSP_CALL dsp_effect_rewind(dsp_effect* effect, int64_t position) {
+    if (const dsp_status status = dsp_effect_seek(effect, position); status != DSP_OK) return status;
+    return With<EffectStream>(effect,
+                              [](EffectStream& stream) { stream.effect->InitResetProcessingLight(true); });
+}
+
 dsp_status DSP_CALL dsp_effect_start_tail(dsp_effect* effect, int64_t max_frames) {
     return With<EffectStream>(effect, [=](EffectStream& stream) { stream.effect->StartTail(max_frames); });
 }

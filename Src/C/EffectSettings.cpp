@@ -175,6 +175,12 @@ dsp_status DSP_CALL dsp_effect_set_preset(dsp_effect* effect, int32_t preset) {
     });
 }
 
+dsp_status DSP_CALL dsp_effect_default_preset(dsp_effect* effect, int32_t* preset) {
+    return With<EffectStream>(effect, [preset](EffectStream& stream) {
+        return Give(stream.effect->NumPresets() > 0 ? stream.effect->GetDefaultPreset() : -1, preset);
+    });
+}
+
 dsp_status DSP_CALL dsp_effect_state(dsp_effect* effect, void* bytes, size_t size, size_t* needed) {
     return With<EffectStream>(effect, [&](EffectStream& stream) {
         const auto state = StateOf(*stream.effect);

@@ -122,6 +122,12 @@ dsp_status DSP_CALL dsp_equaliser_invert(dsp_equaliser* equaliser, int32_t inver
     return With<Equaliser>(equaliser, [invert](Equaliser& eq) { eq.Invert(invert != 0); });
 }
 
+dsp_status DSP_CALL dsp_equaliser_is_inverted(dsp_equaliser* equaliser, int32_t* inverted) {
+    return With<Equaliser>(equaliser, [inverted](Equaliser& eq) {
+        return Give<int32_t>(eq.Record().GetPhaseShift(), inverted);
+    });
+}
+
 dsp_status DSP_CALL dsp_equaliser_prepare(dsp_equaliser* equaliser, const dsp_format* format,
                                           dsp_error* error) {
     return With<Equaliser>(equaliser, error,

@@ -91,9 +91,10 @@ typedef struct dsp_format {
 /* ---- Effects ----
  *
  * Create, set up, prepare, then process block by block; prepare again when the format changes. Processing,
- * seek, the side-chain's samples, the tail and its gap belong to the audio thread. Parameters, presets,
- * state, texts, latency and tempo_changed belong to one other thread, at the same time. Prepare, reset,
- * automate, the tempo callback and the side-chain's channels are called while neither thread uses the effect.
+ * seek, rewind, the side-chain's samples, the tail and its gap belong to the audio thread. Parameters,
+ * presets, state, texts, latency and tempo_changed belong to one other thread, at the same time. Prepare,
+ * reset, automate, the tempo callback and the side-chain's channels are called while neither thread uses the
+ * effect.
  */
 
 typedef struct dsp_effect dsp_effect;
@@ -123,6 +124,9 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_latency(dsp_effect* effect, int32_t* fr
  * while an earlier latency runs out. What sounds goes
  * on: see reset. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position);
+/* Seek for a playback that jumps: the delay lines of Echo, Chorus, Cantrix and Denoiser are cleared, at a
+ * small part of what reset costs. What other effects remember goes on. */
+DSP_C_API dsp_status DSP_CALL dsp_effect_rewind(dsp_effect* effect, int64_t position);
 
 /* Ringing out, when the stream has ended: start with the most frames the tail may have; process blocks of
  * silence until `finished`; of each block the first `frames` are output; end. What still sounds then, as
@@ -213,6 +217,8 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_presets(dsp_effect* effect, int32_t* co
 DSP_C_API dsp_status DSP_CALL dsp_effect_preset_name(dsp_effect* effect, int32_t preset, char* buffer,
                                                      size_t size, size_t* needed);
 DSP_C_API dsp_status DSP_CALL dsp_effect_set_preset(dsp_effect* effect, int32_t preset);
+/* The preset that a new effect has; -1 where there are none. */
+DSP_C_API dsp_status DSP_CALL dsp_effect_default_preset(dsp_effect* effect, int32_t* preset);
 
 /* All settings as bytes, to be stored and given back. DSP_NOT_UNDERSTOOD, with nothing changed, for bytes
  * that are no settings of this effect. */
@@ -243,12 +249,15 @@ typedef struct dsp_band {
 } dsp_band;
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_create(dsp_equaliser** equaliser, dsp_error* error);
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_bands(dsp_equaliser* equaliser, int32_t* count);
-/* All bands at once. While it is prepared, bands that were there glide to their new shape. */
+/* All bands at once. While it is prepared, each place in the array glides to its new shape within some 3200
+ * frames. A band that is new, removed, bypassed or flat (0 dB, no pass) is so from the next frame on, as the
+ * equaliser leaves it out: take a peak or shelf to 0.1 dB first and let it arrive, where that would click. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_set_bands(dsp_equaliser* equaliser, const dsp_band* bands,
                                                       int32_t count, dsp_error* error);
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_band(dsp_equaliser* equaliser, int32_t band, dsp_band* record);
 /* Inverted polarity. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_invert(dsp_equaliser* equaliser, int32_t invert);
+DSP_C_API dsp_status DSP_CALL dsp_equaliser_is_inverted(dsp_equaliser* equaliser, int32_t* inverted);
 /* `max_frames` is not used: nothing is cut. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_prepare(dsp_equaliser* equaliser, const dsp_format* format,
                                                     dsp_error* error);
@@ -279,6 +288,8 @@ DSP_C_API dsp_status DSP_CALL dsp_converter_create(const dsp_conversion* convers
 /* Frames that a recording of so many becomes, and the most that one block of so many gives. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_frames(dsp_converter* converter, int64_t in_frames,
                                                    int64_t* out_frames, int64_t* most_of_a_block);
+/* It converts by up / down, which differs from the rates' ratio only with `nearest`. Either may be null. */
+DSP_C_API dsp_status DSP_CALL dsp_converter_factors(dsp_converter* converter, int32_t* up, int32_t* down);
 /* Converts a block into `out`, which has room for `capacity` frames: at least the most that the block gives,
  * else DSP_TOO_SMALL and nothing is done. The buffers must not overlap. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_process(dsp_converter* converter, const void* in, int32_t frames,
@@ -331,9 +342,11 @@ DSP_C_API dsp_status DSP_CALL dsp_transform_f64(dsp_transform* transform, double
 
 typedef struct dsp_analyser dsp_analyser;
 DSP_C_API dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, dsp_error* error);
-/* Switches: the analyser (on at first), its tuner (off at first), its frozen state. */
+/* Switches: the analyser (on at first), its tuner, its frozen state, and what a drawing of it shows beside
+ * the spectrum. */
 enum { DSP_ANALYSER_ON = 0, DSP_TUNER_ON = 1, DSP_FROZEN = 2, DSP_SHOW_SONOGRAM = 3, DSP_SHOW_INFO = 4 };
 DSP_C_API dsp_status DSP_CALL dsp_analyser_switch(dsp_analyser* analyser, int32_t which, int32_t on);
+DSP_C_API dsp_status DSP_CALL dsp_analyser_is_on(dsp_analyser* analyser, int32_t which, int32_t* on);
 /* Interleaved; the mean of the channels, 1 to 64, is analysed. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_feed_f32(dsp_analyser* analyser, const float* samples,
                                                     int32_t frames, int32_t channels);

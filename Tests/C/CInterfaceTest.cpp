@@ -1,10 +1,12 @@
 #include <algorithm>
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <limits>
 #include <map>
 #include <string>
+#include <thread>
 #include <tuple>
 #include <type_traits>
 #include <utility>
@@ -70,7 +72,9 @@ public:
     void* closed = nullptr;
 
 private:
-    void Add(dsp_status status, void* handle) {
+    // By reference: by value the handle might be read before it is made.
+    template <typename Handle>
+    void Add(dsp_status status, Handle* const& handle) {
         EXPECT_EQ(status, DSP_OK);
         all.push_back(handle);
     }
@@ -259,6 +263,60 @@ TEST(CInterface, ProcessesLikeTheClasses) {
             EXPECT_EQ(std::memcmp(got.data(), expected.data(), sizeof(double) * got.size()), 0)
                 << (planar ? "planar" : "interleaved");
         }
+    }
+}
+
+// Catches races between the two threads of every object, and with the table of handles (under the thread
+// sanitizer), and statuses that depend on what the other thread does.
+TEST(CInterface, IsEditedAndAskedWhileItProcesses) {
+    const dsp_format format{sizeof(dsp_format), 8000, 2, DSP_F32, 64};
+    for (const auto& kind : Corvo::DSP::EffectKinds()) {
+        SCOPED_TRACE(kind.name);
+        dsp_effect* effect = nullptr;
+        dsp_analyser* analyser = nullptr;
+        ASSERT_EQ(dsp_effect_create(kind.name, &effect, nullptr), DSP_OK);
+        ASSERT_EQ(dsp_analyser_create(8000, &analyser, nullptr), DSP_OK);
+        ASSERT_EQ(dsp_effect_prepare(effect, &format, nullptr), DSP_OK);
+        std::atomic<bool> started{false}, done{false};
+        std::thread audio([&] {
+            for (int block = 0; !done || block < 50; ++block) {
+                auto samples = TestSupport::Noise<float>(2 * 100);
+                ASSERT_EQ(dsp_effect_process_f32(effect, samples.data(), 100), DSP_OK);
+                ASSERT_EQ(dsp_analyser_feed_f32(analyser, samples.data(), 100, 2), DSP_OK);
+                if (block % 7 == 0) {
+                    ASSERT_EQ(dsp_effect_rewind(effect, 0), DSP_OK);
+                }
+                started = true;
+            }
+        });
+        while (!started) std::this_thread::yield();
+        std::vector<std::byte> state(1 << 20);
+        int32_t parameters = 0, presets = 0, latency = 0;
+        std::size_t needed = 0;
+        char text[200];
+        ASSERT_EQ(dsp_effect_parameters(effect, &parameters), DSP_OK);
+        ASSERT_EQ(dsp_effect_presets(effect, &presets), DSP_OK);
+        for (int round = 0; round < 10; ++round) {
+            dsp_effect* other = nullptr;
+            EXPECT_EQ(dsp_effect_create("Gain", &other, nullptr), DSP_OK);
+            for (int32_t p = 0; p < parameters; ++p) {
+                EXPECT_EQ(dsp_effect_set(effect, p, static_cast<float>((p + round) % 11) / 10.0f), DSP_OK);
+                EXPECT_EQ(dsp_effect_parameter_text(effect, p, DSP_TEXT_VALUE, text, sizeof text, nullptr),
+                          DSP_OK);
+            }
+            EXPECT_EQ(dsp_effect_latency(effect, &latency), DSP_OK);
+            EXPECT_EQ(dsp_effect_state(effect, state.data(), state.size(), &needed), DSP_OK);
+            EXPECT_EQ(dsp_effect_set_state(effect, state.data(), needed, nullptr), DSP_OK);
+            if (presets > 0) {
+                EXPECT_EQ(dsp_effect_set_preset(effect, round % presets), DSP_OK);
+            }
+            EXPECT_EQ(dsp_analyser_refresh(analyser, nullptr), DSP_OK);
+            EXPECT_EQ(dsp_close(other), DSP_OK);
+        }
+        done = true;
+        audio.join();
+        EXPECT_EQ(dsp_close(analyser), DSP_OK);
+        EXPECT_EQ(dsp_close(effect), DSP_OK);
     }
 }
 

@@ -92,6 +92,8 @@ static void UseEffects(float* samples) {
     OK(dsp_effect_create("Echo", &echo, &g_error));
     OK(dsp_effect_presets(echo, &count));
     EXPECT(count > 1 && dsp_effect_set_preset(echo, count) == DSP_OUT_OF_RANGE);
+    OK(dsp_effect_default_preset(echo, &i));
+    EXPECT(i >= 0 && i < count);
     OK(dsp_effect_set_preset(echo, 1));
     OK(dsp_effect_automate(echo, 0, points, 2));
     OK(dsp_effect_automate(echo, 0, NULL, 0));
@@ -106,6 +108,12 @@ static void UseEffects(float* samples) {
     OK(dsp_effect_tempo_callback(echo, NULL, NULL));
     OK(dsp_effect_reset(echo));
     OK(dsp_effect_seek(echo, 1000));
+    samples[0] = 1.0f;
+    OK(dsp_effect_process_f32(echo, samples, 256));
+    OK(dsp_effect_rewind(echo, 0));
+    memset(samples, 0, kFrames * sizeof *samples);
+    OK(dsp_effect_process_f32(echo, samples, kFrames));
+    for (i = 0; i < kFrames; ++i) EXPECT(samples[i] == 0.0f);
     EXPECT(dsp_effect_seek(echo, INT64_MAX) == DSP_OUT_OF_RANGE);
     OK(dsp_close(echo));
 }
@@ -158,12 +166,16 @@ static void UseEqualiser(void) {
     const double hz[] = {1000.0, 20.0};
     double real[2], imaginary[2];
     dsp_equaliser* equaliser = NULL;
+    int32_t inverted = 0;
     OK(dsp_equaliser_create(&equaliser, &g_error));
     OK(dsp_equaliser_set_bands(equaliser, &band, 1, &g_error));
     OK(dsp_equaliser_prepare(equaliser, &format, &g_error));
     OK(dsp_equaliser_response(equaliser, hz, real, imaginary, 2));
     EXPECT(fabs(20.0 * log10(hypot(real[0], imaginary[0])) + 12.0) < 0.01);
     EXPECT(fabs(hypot(real[1], imaginary[1]) - 1.0) < 0.01);
+    OK(dsp_equaliser_invert(equaliser, 1));
+    OK(dsp_equaliser_is_inverted(equaliser, &inverted));
+    EXPECT(inverted == 1);
     band.gain = 0.05;
     EXPECT(dsp_equaliser_set_bands(equaliser, &band, 1, &g_error) == DSP_OUT_OF_RANGE);
     OK(dsp_close(equaliser));
@@ -192,6 +204,8 @@ static void UseConverterAndPitchShift(const float* sine) {
     OK(dsp_converter_create(&conversion, &converter, &g_error));
     OK(dsp_converter_frames(converter, kFrames, &frames, &most));
     EXPECT(frames == 44100 && most >= frames);
+    OK(dsp_converter_factors(converter, &total, &written));
+    EXPECT(total == 147 && written == 160);
     EXPECT(dsp_converter_process(converter, sine, kFrames, out, 44000, &written) == DSP_TOO_SMALL);
     OK(dsp_converter_process(converter, sine, kFrames, out, (int32_t)most, &total));
     do {
@@ -241,6 +255,9 @@ static void UseAnalyser(const float* sine) {
     EXPECT(dsp_analyser_command(analyser, 1) == DSP_UNKNOWN);
     OK(dsp_analyser_switch(analyser, DSP_TUNER_ON, 1));
     OK(dsp_analyser_switch(analyser, DSP_SHOW_SONOGRAM, 1));
+    OK(dsp_analyser_is_on(analyser, DSP_SHOW_SONOGRAM, &checked));
+    OK(dsp_analyser_is_on(analyser, DSP_FROZEN, &fresh));
+    EXPECT(checked == 1 && fresh == 0);
     OK(dsp_sonogram_resize(analyser, 64, 32));
     for (i = 0; i + 1600 <= kFrames; i += 1600) {
         OK(dsp_analyser_feed_f32(analyser, sine + i, 1600, 1));

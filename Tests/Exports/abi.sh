@@ -1,28 +1,39 @@
 #!/usr/bin/env bash
 # What a compiled host relies on beyond names: the order of virtual operations, and where the fields of records lie.
-# DSPDll.abi beside this script describes the types that hosts get, as abidw reads them from the library; it is
-# compared with abidiff. What is added after everything else is no fault.
+# DSPDll.abi and DSPDrawing.abi beside this script describe the types that hosts get, as abidw reads them from the
+# libraries; they are compared with abidiff. What is added after everything else is no fault.
 #
-#   abi.sh check INSTALLED   fails when a host built against the description would not fit the installed library
-#   abi.sh update            builds and installs the library and describes it anew
+#   abi.sh check INSTALLED   fails when a host built against the descriptions would not fit the installed libraries
+#   abi.sh update            builds and installs the libraries and describes them anew
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
-baseline=$here/DSPDll.abi
+
+# DSPDrawing is there where it was built.
+libraries() { find "$1" -name 'libDSP*.so' | sort; }
+baseline_of() { echo "$here/$(basename "$1" .so | sed 's/^lib//').abi"; }
 
 # Only types from public headers, without the places they stand in and without indentation: it would be a third more.
 describe() {
-    local library
-    library=$(find "$1" -name libDSPDll.so)
     abidw --headers-dir "$1/include" --drop-private-types --drop-undefined-syms --no-show-locs --no-corpus-path \
         --no-comp-dir-path --no-elf-needed --no-parameter-names --type-id-style hash \
-        --suppressions "$here/abi.suppr" "$library" | sed 's/^ *//'
+        --suppressions "$here/abi.suppr" "$2" | sed 's/^ *//'
 }
 
 check() {
-    local report
     now=$(mktemp)
     trap 'rm -f "$now"' EXIT
-    describe "$1" > "$now"
+    local library checked=0
+    for library in $(libraries "$1"); do
+        check_library "$1" "$library"
+        checked=$((checked + 1))
+    done
+    [ $checked != 0 ] || { echo "no library in $1"; return 1; }
+}
+
+check_library() {
+    local report baseline
+    baseline=$(baseline_of "$2")
+    describe "$1" "$2" > "$now"
     report=$(abidiff --no-added-syms --suppressions "$here/abi.suppr" "$baseline" "$now") || {
         # What moved, once; abidiff says it for every function that it touches.
         grep -E '^ *\[D\]|vtable offset of .* changed|size changed|offset changed|(referenced|pointed to) type .(class|struct)|. at offset |type of .* changed' \
@@ -32,7 +43,7 @@ check() {
         echo "review the difference."
         return 1
     }
-    echo "hosts built against Tests/Exports/DSPDll.abi fit"
+    echo "hosts built against Tests/Exports/$(basename "$baseline") fit"
 }
 
 update() {
@@ -42,7 +53,8 @@ update() {
     cmake --preset release > /dev/null
     cmake --build --preset release --target DSPDll DSPDrawing dsphost
     cmake --install build/release --prefix "$installed" > /dev/null
-    describe "$installed" > "$baseline"
+    local library
+    for library in $(libraries "$installed"); do describe "$installed" "$library" > "$(baseline_of "$library")"; done
     git --no-pager diff --stat -- "$here"
 }
 

@@ -19,7 +19,7 @@ for language in cpp c; do
         > "$work/example/example.$language"
     [ -s "$work/example/example.$language" ]
 done
-cp "$here/CMakeLists.txt" "$here/drawing.cpp" "$work/example/"
+cp "$here/CMakeLists.txt" "$here/drawing.cpp" "$source_dir/Tests/C/consumer.c" "$work/example/"
 
 cmake -G Ninja -S "$work/example" -B "$work/by-cmake" -DCMAKE_PREFIX_PATH="$work/installed" \
     -DCMAKE_CXX_COMPILER="$compiler" >/dev/null
@@ -41,6 +41,7 @@ if [ -n "$drawing" ]; then
     "$work/drawing"
 fi
 
+"$work/by-cmake/consumer"
 in_c=$("$work/by-cmake/c_example")
 echo "the example in C says: $in_c"
 [ "${in_c% *}" = "after 0.64 s:" ] && [ "${in_c##* }" != 0.0000 ]
