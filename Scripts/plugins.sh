@@ -157,7 +157,7 @@ render_with_ardour() {
     expect "$uri" "$folder.wav" 0 "$preset" || { echo "with the preset '$preset'"; return 1; }
 }
 try_ardour() {
-    local status=0 vst3=$work/home/.vst3/gain.vst3
+    local status=0 vst3=$work/home/.vst3/dspdll-gain.vst3
     LD_LIBRARY_PATH=/usr/lib/ardour7 timeout 60 /usr/lib/ardour7/ardour-vst3-scanner -f "$vst3" 2>&1 | grep 'Found Plugin' ||
         { echo "Ardour's VST3 scanner finds nothing in $vst3"; status=1; }
     local uri plugins=("VST3 urn:dspdll:gain")

@@ -44,7 +44,7 @@ struct Block {
     std::span<const Change> changes;
 };
 
-// Notes what is wrong with the plug-in at hand; printed at once, the same text only once.
+// Notes what is wrong with the plug-in at hand. Printed at once; what differs only in its digits, only once.
 void Finding(const std::string& text);
 inline void Expect(bool condition, const std::string& otherwise) {
     if (!condition) Finding(otherwise);

@@ -59,8 +59,8 @@ void CheckBadSamples(PluginFile& file, std::size_t index) {
     const auto plugin = file.Create(index);
     Signal input = Noise(Channels(plugin->inputs), 24000);
     std::size_t at = 6000;
-    for (const float bad : {std::numeric_limits<float>::quiet_NaN(), std::numeric_limits<float>::infinity(),
-                            -std::numeric_limits<float>::infinity(), 1e30f, 1e-42f})
+    constexpr float kInfinity = std::numeric_limits<float>::infinity();
+    for (const float bad : {std::numeric_limits<float>::quiet_NaN(), kInfinity, -kInfinity, 1e-42f})
         for (auto& channel : input) channel[at++] = bad;
     const Signal output = RenderAt(*plugin, 48000, input);
     Expect(IsFinite(output), "is not finite when its input is not");

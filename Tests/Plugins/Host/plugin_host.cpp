@@ -1,6 +1,7 @@
 // plugin_host FILE...
 // Does to CLAP and VST3 plug-ins what a strict host may do, and prints what it finds. Exits 0 when it found
 // nothing, 1 otherwise.
+#include <cctype>
 #include <chrono>
 #include <cstdio>
 #include <exception>
@@ -40,7 +41,9 @@ void CheckFile(const std::filesystem::path& path) {
 
 void Finding(const std::string& text) {
     const std::lock_guard lock(g_mutex);
-    if (!g_findings.insert(g_subject + ": " + text).second) return;
+    std::string kind = g_subject + text;
+    std::erase_if(kind, [](unsigned char c) { return std::isdigit(c); });
+    if (!g_findings.insert(kind).second) return;
     std::printf("%s: %s\n", g_subject.c_str(), text.c_str());
     std::fflush(stdout);
 }
