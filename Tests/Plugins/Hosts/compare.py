@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
 """compare.py EXPECTED FILE [LATENCY]: whether FILE is EXPECTED that many frames later.
-compare.py --sounds FILE: whether FILE has sound, and only finite samples."""
+compare.py --sounds FILE [NAME...]: whether every channel of FILE has sound, and only finite samples; their names."""
 import sys
 
 import numpy
@@ -18,9 +18,8 @@ def read(name):
 
 if sys.argv[1] == "--sounds":
     samples, _ = read(sys.argv[2])
-    if not len(samples) or abs(samples).max() < 1e-4:
-        sys.exit(f"{sys.argv[2]} is silent")
-    sys.exit()
+    silent = [name for name, peak in zip(sys.argv[3:], abs(samples).max(axis=0)) if peak < 1e-4]
+    sys.exit(f"{sys.argv[2]} is silent: {', '.join(silent)}" if silent or not abs(samples).max() > 1e-4 else 0)
 
 (expected, rate), (found, found_rate) = read(sys.argv[1]), read(sys.argv[2])
 latency = int(sys.argv[3]) if len(sys.argv) > 3 else 0
