@@ -59,8 +59,9 @@ bool KeepsFractions(CorvoEffectBase& effect, int parameter) {
 std::optional<Curve::Point> PointAt(CorvoEffectBase& effect, int parameter, double number) {
     try {
         const float position = effect.GetParamValueNormalizedFromText(parameter, std::to_string(number));
-        if (!(position >= 0.0f && position <= 1.0f)) return {};
-        return Curve::Point{static_cast<double>(position), number};
+        // Some readers go beyond the end by a rounding.
+        if (!(position >= 0.0f && position <= 1.01f)) return {};
+        return Curve::Point{std::min(static_cast<double>(position), 1.0), number};
     } catch (const std::exception&) {
         return {};
     }
@@ -72,7 +73,7 @@ std::vector<Curve::Point> PointsOf(CorvoEffectBase& effect, int parameter, doubl
     const double steps = std::round((most - least) / resolution);
     const double stride = resolution * std::max(1.0, std::ceil(steps / kTablePoints));
     std::vector<double> numbers;
-    for (double number = least; number < most; number += stride)
+    for (double number = least; number <= most + 0.5 * resolution; number += stride)
         numbers.push_back(std::round(number / resolution) * resolution);
     for (int i = 0; i <= kTablePoints; ++i)
         if (const auto shown = NumberIn(ShownAt(effect, parameter, static_cast<float>(i) / kTablePoints)))
@@ -114,6 +115,8 @@ float Curve::Position(float number) const {
     return static_cast<float>(p0 + (wanted - n0) / (above->number - n0) * (above->position - p0));
 }
 
+double ReadCurve::Resolution() const { return std::pow(10.0, -decimals); }
+
 std::string ShownAt(CorvoEffectBase& effect, int parameter, float position) {
     // Some texts show what is stored, whatever they are asked for.
     effect.SetParam(parameter, position, false);
@@ -124,52 +127,60 @@ std::string ShownAt(CorvoEffectBase& effect, int parameter, float position) {
     return first == text.npos ? "" : text.substr(first, text.find_last_not_of(' ') - first + 1);
 }
 
+// The lowest number, or the highest, that is shown between a position with one and the end without.
+double LastNumber(CorvoEffectBase& effect, int parameter, float with, float without) {
+    for (int i = 0; i < 24; ++i) {
+        const float middle = 0.5f * (with + without);
+        (NumberIn(ShownAt(effect, parameter, middle)) ? with : without) = middle;
+    }
+    return NumberIn(ShownAt(effect, parameter, with))->value;
+}
+
 ReadCurve CurveOf(CorvoEffectBase& effect, int parameter) {
     ReadCurve read;
     if (DependsOnLists(effect, parameter)) return read;
-    std::optional<ShownNumber> shown[kSamples + 1];
-    for (int i = 0; i <= kSamples; ++i) {
-        const std::string text = ShownAt(effect, parameter, static_cast<float>(i) / kSamples);
-        shown[i] = NumberIn(text);
-        const bool end = i == 0 || i == kSamples;
-        if (!shown[i] && !end) return read;
-        if (!shown[i]) read.endTexts[i == 0 ? 0 : 1] = text;
-    }
+    std::vector<std::optional<ShownNumber>> shown;
+    for (int i = 0; i <= kSamples; ++i)
+        shown.push_back(NumberIn(ShownAt(effect, parameter, static_cast<float>(i) / kSamples)));
+    const auto has = [](const auto& number) { return number.has_value(); };
+    const auto begin = std::ranges::find_if(shown, has);
+    const auto end = std::find_if(shown.rbegin(), shown.rend(), has).base();
+    if (end - begin < kSamples / 2 || !std::all_of(begin, end, has)) return read;
+    const auto lowest = static_cast<int>(begin - shown.begin()),
+               highest = static_cast<int>(end - shown.begin()) - 1;
+    const bool hasFirst = lowest == 0, hasLast = highest == kSamples;
     read.isNumber = true;
     read.decimals = shown[kSamples / 2]->decimals;
-    const double resolution = std::pow(10.0, -read.decimals);
+    const double resolution = read.Resolution();
+    if (!hasFirst) read.endTexts[0] = ShownAt(effect, parameter, 0.0f);
+    if (!hasLast) read.endTexts[1] = ShownAt(effect, parameter, 1.0f);
+    read.keepsFractions = KeepsFractions(effect, parameter);
 
     // A line? From the ends that show numbers, else from the middle and the other end.
     const double middle = shown[kSamples / 2]->value;
-    const double last = shown[kSamples] ? shown[kSamples]->value : 2.0 * middle - shown[0]->value;
-    double first = shown[0] ? shown[0]->value : 2.0 * middle - last;
-    bool line = true;
-    for (int i = 1; i < kSamples; ++i)
+    const double last = hasLast ? shown.back()->value : 2.0 * middle - begin->value().value;
+    const double first = hasFirst ? shown.front()->value : 2.0 * middle - last;
+    bool line = lowest <= 1 && highest >= kSamples - 1;
+    for (int i = lowest; i <= highest; ++i)
         line = line && std::abs(first + (last - first) * i / kSamples - shown[i]->value) < 1.01 * resolution;
     if (line) {
-        read.curve = Curve(first, last, KeepsFractions(effect, parameter) ? 0.0 : 0.02 * resolution);
+        read.curve = Curve(first, last, read.keepsFractions ? 0.0 : 0.02 * resolution);
         return read;
     }
-    // What shows no number at its end goes on below the smallest number, and above the largest.
-    first = shown[1]->value;
-    for (float position = 1.0f / kSamples; !shown[0] && position > 1e-6f; position *= 0.5f)
-        if (const auto lower = NumberIn(ShownAt(effect, parameter, position)))
-            first = std::min(first, lower->value);
-    auto points = PointsOf(effect, parameter, shown[0] ? shown[0]->value : first,
-                           shown[kSamples] ? last : shown[kSamples - 1]->value, resolution);
+    // An end without a number stands one step beyond the others.
+    const auto at = [](int sample) { return static_cast<float>(sample) / kSamples; };
+    const double least = hasFirst ? first : LastNumber(effect, parameter, at(lowest), 0.0f);
+    const double most = hasLast ? last : LastNumber(effect, parameter, at(highest), 1.0f);
+    auto points = PointsOf(effect, parameter, least, most, resolution);
     if (points.size() < 2) return {};
-    if (points.front().position > 0.0) {
-        if (shown[0])
-            points.front().position = 0.0;
-        else
-            points.insert(points.begin(), {0.0, points.front().number - 10.0 * resolution});
-    }
-    if (points.back().position < 1.0) {
-        if (shown[kSamples])
-            points.back().position = 1.0;
-        else
-            points.push_back({1.0, points.back().number + 10.0 * resolution});
-    }
+    if (hasFirst)
+        points.front().position = 0.0;
+    else if (points.front().position > 0.0)
+        points.insert(points.begin(), {0.0, points.front().number - resolution});
+    if (hasLast)
+        points.back().position = 1.0;
+    else if (points.back().position < 1.0)
+        points.push_back({1.0, points.back().number + resolution});
     read.curve = Curve(std::move(points));
     return read;
 }

@@ -35,7 +35,9 @@ struct ReadCurve {
     bool isNumber = false;  // else the texts hold none, or depend on other parameters
     Curve curve;
     int decimals = 0;
-    std::string endTexts[2];  // of an end that shows no number: "-Inf. dB", "Off"
+    bool keepsFractions = false;  // the effect stores more than it shows
+    double Resolution() const;    // of the last decimal
+    std::string endTexts[2];      // of an end that shows no number: "-Inf. dB", "Off"
 };
 ReadCurve CurveOf(DSP::CorvoEffectBase& effect, int parameter);
 

@@ -10,6 +10,9 @@ namespace Corvo::Plugins {
 
 using DSP::CorvoEffectBase;
 
+// A control of so few steps jumps; others glide.
+constexpr float kMostSteps = 30.0f;
+
 // Reads the ports of an effect from its own descriptions and texts.
 struct LayoutMaker {
     const PluginRow& row;
@@ -60,12 +63,17 @@ struct LayoutMaker {
         port.curve = read.curve;
         port.least = port.curve.Least();
         port.most = port.curve.Most();
-        port.whole = read.isNumber && read.decimals == 0 && port.most - port.least <= 128.0f;
-        port.logarithmic = port.least > 0.0f && port.curve.Number(0.5f) < 0.3f * (port.least + port.most);
+        port.resolution = read.isNumber ? read.Resolution() * (read.keepsFractions ? 0.01 : 1.0) : 0.01;
+        port.whole = read.isNumber && !read.keepsFractions && read.decimals == 0 &&
+                     port.most - port.least <= kMostSteps;
+        const float middle = port.curve.Number(0.5f), product = port.least * port.most;
+        port.logarithmic = port.least > 0.0f && std::abs(middle - std::sqrt(product)) <
+                                                    std::abs(middle - 0.5f * (port.least + port.most));
         if (!read.endTexts[0].empty()) port.points.push_back({read.endTexts[0], port.least});
         if (!read.endTexts[1].empty()) port.points.push_back({read.endTexts[1], port.most});
         port.comment = ShownAt(*tried, port.parameter, 0.0f);
         port.comment.append(" to ").append(ShownAt(*tried, port.parameter, 1.0f));
+        if (!read.isNumber) port.comment.append(", with the settings of a new instance");
     }
 
     int GroupOf(int parameter) {
@@ -110,7 +118,10 @@ float Port::Position(float value) const {
 }
 
 float Port::Value(float position) const {
-    if (m_choices.empty()) return curve.Number(position);
+    if (m_choices.empty())
+        // Plus 0, for no negative one.
+        return static_cast<float>(
+            std::round(static_cast<double>(curve.Number(position)) / resolution) * resolution + 0.0);
     const auto distance = [position](float choice) { return std::abs(choice - position); };
     return static_cast<float>(std::ranges::min_element(m_choices, {}, distance) - m_choices.begin());
 }

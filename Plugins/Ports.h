@@ -24,7 +24,8 @@ struct Port {
     EffectParameterType type = EffectParameterType::Continuous;
     float least = 0.0f, most = 1.0f;
     float start = 0.0f;         // what a new instance has
-    bool whole = false;         // whole numbers only
+    bool whole = false;         // a few whole numbers only
+    double resolution = 1.0;    // of the values that are told
     bool logarithmic = false;   // the knob has ratios, not differences
     std::vector<Point> points;  // values with a text: all of a list or switch, ends that show no number
     Curve curve;                // of a continuous one
