@@ -83,8 +83,8 @@ input_of() {
     file=$work/in$channels.wav
     if [ "$ports" != "$channels" ]; then
         file=$work/in$channels-side.wav
-        [ -e "$file" ] || ffmpeg -v error -y -i "$work/in$channels.wav" -c:a pcm_f32le "$file" \
-            -af "$([ "$channels" = 1 ] && echo 'pan=2c|c0=c0|c1=c0' || echo 'pan=4c|c0=c0|c1=c1|c2=c0|c3=c1')"
+        [ -e "$file" ] || ffmpeg -v error -y -i "$work/in$channels.wav" -c:a pcm_f32le \
+            -af "$([ "$channels" = 1 ] && echo 'pan=2c|c0=c0|c1=c0' || echo 'pan=4c|c0=c0|c1=c1|c2=c0|c3=c1')" "$file"
     fi
     echo "$file"
 }
@@ -130,7 +130,7 @@ render_with_ffmpeg() {
 # All of them at once, a metronome through every plug-in: each has to come out of it.
 play_with_jalv() {
     local uri name i running=() outputs=()
-    jackd -n "$JACK_DEFAULT_SERVER" --no-realtime --no-zombies --timeout 5000 -d dummy -r 48000 -p 2048 > "$work/jackd.log" 2>&1 &
+    jackd -n "$JACK_DEFAULT_SERVER" --no-realtime --timeout 5000 -d dummy -r 48000 -p 2048 > "$work/jackd.log" 2>&1 &
     running+=($!)
     trap 'kill "${running[@]}" 2> /dev/null || :' EXIT
     timeout 20 jack_wait -w > /dev/null 2>&1
