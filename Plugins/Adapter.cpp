@@ -12,7 +12,7 @@
 namespace Corvo::Plugins {
 namespace {
 
-constexpr int kStep = 16;         // frames between two steps of a glide
+constexpr int kStep = 4;          // frames between two steps of a glide
 constexpr double kGlide = 0.010;  // seconds
 constexpr double kBypass = 0.020;
 constexpr double kLongestLag = 0.5;  // seconds of latency that the bypass can follow
@@ -122,7 +122,7 @@ void Adapter::ReadBack() {
         const Port& port = Ports()[i];
         Control& control = m_controls[i];
         control.position = control.target = m_effect->GetParam(port.parameter);
-        control.wanted = port.Value(control.position);
+        control.wanted = port.ValueOf(*m_effect);
         control.edited = control.touched = false;
         control.stepsLeft = 0;
     }
@@ -161,7 +161,7 @@ void Adapter::TakeEdits(bool glide) {
         if (!control.edited.exchange(false)) continue;
         const Port& port = Ports()[i];
         control.target = port.Position(control.wanted);
-        const bool glides = glide && port.type == EffectParameterType::Continuous && !port.whole;
+        const bool glides = glide && port.glides;
         m_gliding += static_cast<int>(glides) - static_cast<int>(control.stepsLeft > 0);
         control.stepsLeft = glides ? m_glideSteps : 0;
         control.touched = !m_fresh;
@@ -379,7 +379,8 @@ bool Adapter::FromText(int index, const std::string& text, float& value) {
         const auto copy = Copy();
         const float position = copy->GetParamValueNormalizedFromText(port.parameter, text);
         if (!(position >= 0.0f)) return false;
-        value = port.Value(std::min(position, 1.0f));
+        copy->SetParam(port.parameter, std::min(position, 1.0f), false);
+        value = port.ValueOf(*copy);
         return true;
     } catch (const std::logic_error&) {
         return false;

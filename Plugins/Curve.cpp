@@ -111,7 +111,10 @@ float Curve::Position(float number) const {
         return static_cast<float>((wanted + std::copysign(wanted == 0.0 ? 0.0 : m_nudge, wanted) - m_first) /
                                   (m_last - m_first));
     const auto above = std::ranges::lower_bound(m_points, wanted, {}, &Point::number);
+    // Where a number is known its position is exact: it may be the edge of what shows it.
+    if (static_cast<float>(above->number) == number) return static_cast<float>(above->position);
     const auto& [p0, n0] = above[-1];
+    if (static_cast<float>(n0) == number) return static_cast<float>(p0);
     return static_cast<float>(p0 + (wanted - n0) / (above->number - n0) * (above->position - p0));
 }
 
@@ -120,6 +123,10 @@ double ReadCurve::Resolution() const { return std::pow(10.0, -decimals); }
 std::string ShownAt(CorvoEffectBase& effect, int parameter, float position) {
     // Some texts show what is stored, whatever they are asked for.
     effect.SetParam(parameter, position, false);
+    return Shown(effect, parameter, position);
+}
+
+std::string Shown(CorvoEffectBase& effect, int parameter, float position) {
     const auto wide = effect.GetParameterFormattedText(parameter, static_cast<double>(position));
     std::string text;
     for (const wchar_t c : wide) text += static_cast<char>(c);
@@ -134,6 +141,12 @@ double LastNumber(CorvoEffectBase& effect, int parameter, float with, float with
         (NumberIn(ShownAt(effect, parameter, middle)) ? with : without) = middle;
     }
     return NumberIn(ShownAt(effect, parameter, with))->value;
+}
+
+bool ReadNumber(const std::string& text, float& number) {
+    const auto found = NumberIn(text);
+    if (found) number = static_cast<float>(found->value);
+    return found.has_value();
 }
 
 ReadCurve CurveOf(CorvoEffectBase& effect, int parameter) {

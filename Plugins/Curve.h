@@ -41,7 +41,11 @@ struct ReadCurve {
 };
 ReadCurve CurveOf(DSP::CorvoEffectBase& effect, int parameter);
 
-// What the control shows at a position, without blanks around it.
+// What the control shows at a position, without blanks around it; the first one sets it.
 std::string ShownAt(DSP::CorvoEffectBase& effect, int parameter, float position);
+std::string Shown(DSP::CorvoEffectBase& effect, int parameter, float position);
+
+// The number in such a text, at its start or after a bar; false where there is none.
+bool ReadNumber(const std::string& text, float& number);
 
 }  // namespace Corvo::Plugins

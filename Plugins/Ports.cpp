@@ -63,9 +63,12 @@ struct LayoutMaker {
         port.curve = read.curve;
         port.least = port.curve.Least();
         port.most = port.curve.Most();
-        port.resolution = read.isNumber ? read.Resolution() * (read.keepsFractions ? 0.01 : 1.0) : 0.01;
+        port.isNumber = read.isNumber;
+        port.resolution = read.isNumber ? read.Resolution() * (read.keepsFractions ? 0.01 : 1.0) : 1e-4;
         port.whole = read.isNumber && !read.keepsFractions && read.decimals == 0 &&
                      port.most - port.least <= kMostSteps;
+        // What depends on other settings may mean a note: it jumps.
+        port.glides = read.isNumber && !port.whole && !row.smooth;
         const float middle = port.curve.Number(0.5f), product = port.least * port.most;
         port.logarithmic = port.least > 0.0f && std::abs(middle - std::sqrt(product)) <
                                                     std::abs(middle - 0.5f * (port.least + port.most));
@@ -104,7 +107,7 @@ struct LayoutMaker {
                 SetRange(port, description);
             else
                 SetChoices(port, description);
-            port.start = port.Value(fresh->GetParam(parameter));
+            port.start = port.ValueOf(*fresh);
             layout.ports.push_back(std::move(port));
         }
         return std::move(layout);
@@ -124,6 +127,14 @@ float Port::Value(float position) const {
             std::round(static_cast<double>(curve.Number(position)) / resolution) * resolution + 0.0);
     const auto distance = [position](float choice) { return std::abs(choice - position); };
     return static_cast<float>(std::ranges::min_element(m_choices, {}, distance) - m_choices.begin());
+}
+
+float Port::ValueOf(CorvoEffectBase& effect) const {
+    const float position = effect.GetParam(parameter);
+    float number = 0.0f;
+    if (isNumber && ReadNumber(Shown(effect, parameter, position), number))
+        return std::clamp(number, least, most);
+    return Value(position);
 }
 
 const Layout& LayoutOf(const PluginRow& row, int channels) {

@@ -25,6 +25,8 @@ struct Port {
     float least = 0.0f, most = 1.0f;
     float start = 0.0f;         // what a new instance has
     bool whole = false;         // a few whole numbers only
+    bool glides = false;        // moves to its values in small steps
+    bool isNumber = false;      // the effect shows numbers
     double resolution = 1.0;    // of the values that are told
     bool logarithmic = false;   // the knob has ratios, not differences
     std::vector<Point> points;  // values with a text: all of a list or switch, ends that show no number
@@ -32,6 +34,8 @@ struct Port {
 
     float Position(float value) const;  // 0..1, as the effect takes it
     float Value(float position) const;
+    // The value of the effect's parameter as it stands: the number that it shows.
+    float ValueOf(DSP::CorvoEffectBase& effect) const;
 
 private:
     friend struct LayoutMaker;

@@ -15,7 +15,7 @@
 #include <vector>
 
 #include "Adapter.h"
-#include "Lv2/Lv2Ports.h"
+#include "Lv2Ports.h"
 
 // Every plug-in as LV2. No feature is required: without the map of identifiers there is neither stored state
 // nor tempo, without the options blocks are cut at 4096 frames.

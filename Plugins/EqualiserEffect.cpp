@@ -1,4 +1,4 @@
-#include "Equaliser/EqualiserEffect.h"
+#include "EqualiserEffect.h"
 
 #include <algorithm>
 #include <charconv>
@@ -104,8 +104,11 @@ void EqualiserEffect::CheckCookProperties(const tWAVEFORMATEX* format, bool forc
         m_record.bands[band] = {kTypes[type].type | (words[kOn] != 0 ? 0 : _eq_data::kBypassBand),
                                 words[kFrequency], words[kGain], words[kQ]};
     }
-    m_equaliser.Cook(!cook.afresh, false, &m_record, static_cast<int>(format->nSamplesPerSec),
-                     std::min<int>(format->nChannels, MaxNumChannels));
+    const auto rate = static_cast<int>(format->nSamplesPerSec);
+    if (cook.afresh)
+        m_equaliser.Cook(false, false, &m_record, rate, std::min<int>(format->nChannels, MaxNumChannels));
+    else
+        m_equaliser.CookBandsOnly(true, false, m_record, rate);
 }
 
 void EqualiserEffect::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,

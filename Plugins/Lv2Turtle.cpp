@@ -9,7 +9,7 @@
 #include <string_view>
 
 #include "Adapter.h"
-#include "Lv2/Lv2Ports.h"
+#include "Lv2Ports.h"
 
 // Writes what LV2 hosts read about the plug-ins and their presets: dsp_lv2_turtle FOLDER BINARY
 namespace {

@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "Adapter.h"
-#include "Dpf/PluginChoice.h"
+#include "PluginChoice.h"
 
 namespace Corvo::Plugins {
 namespace {

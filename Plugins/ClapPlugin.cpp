@@ -351,8 +351,8 @@ const clap_plugin_factory_t kFactory{
 
 }  // namespace
 
-const clap_plugin_entry_t clap_entry{
-    CLAP_VERSION, [](const char*) { return true; }, [] {},
-    [](const char* id) -> const void* {
-        return std::strcmp(id, CLAP_PLUGIN_FACTORY_ID) == 0 ? &kFactory : nullptr;
-    }};
+const clap_plugin_entry_t clap_entry{CLAP_VERSION, [](const char*) { return true; }, [] {},
+                                     [](const char* id) -> const void* {
+                                         return std::strcmp(id, CLAP_PLUGIN_FACTORY_ID) == 0 ? &kFactory
+                                                                                             : nullptr;
+                                     }};
