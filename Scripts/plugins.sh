@@ -129,7 +129,7 @@ render_with_ffmpeg() {
 
 # All of them at once, a metronome through every plug-in: each has to come out of it.
 play_with_jalv() {
-    local uri name i running=() outputs=()
+    local uri name port i running=() outputs=()
     jackd -n "$JACK_DEFAULT_SERVER" --no-realtime --timeout 5000 -d dummy -r 48000 -p 2048 > "$work/jackd.log" 2>&1 &
     running+=($!)
     trap 'kill "${running[@]}" 2> /dev/null || :' EXIT
@@ -137,15 +137,13 @@ play_with_jalv() {
     timeout 300 jack_metro -b 300 -D 100 -n metro > "$work/metro.log" 2>&1 &
     running+=($!)
     for uri in $(uris); do
-        # It reads commands until its input ends.
-        timeout -k 5 100 jalv -x -n "${uri##*:}" "$uri" > "$work/jalv-${uri##*:}.log" 2>&1 < <(sleep 100) &
-        running+=($!)
-    done
-    for uri in $(uris); do
         name=${uri##*:}
-        for ((i = 0; i < 200; ++i)); do
-            if jack_lsp "$name:" 2> /dev/null | grep -q :out; then break; fi
-            sleep 0.1
+        # It reads commands until its input ends.
+        timeout -k 5 200 jalv -x -n "$name" "$uri" > "$work/jalv-$name.log" 2>&1 < <(sleep 200) &
+        running+=($!)
+        for ((i = 0; i < 100; ++i)); do
+            if jack_lsp "$name:" 2> /dev/null | grep -q "^$name:out"; then break; fi
+            sleep 0.05
         done
         jack_lsp "$name:" 2> /dev/null | grep "^$name:out" > "$work/outputs" ||
             { echo "$uri does not start in jalv: $(cat "$work/jalv-$name.log")"; return 1; }
