@@ -129,7 +129,8 @@ render_with_ffmpeg() {
 
 # All of them at once, a metronome through every plug-in: each has to come out of it.
 play_with_jalv() {
-    local uri name port i running=() outputs=()
+    local uri name port i outputs=()
+    running=()  # for the trap, which comes when this function has ended
     jackd -n "$JACK_DEFAULT_SERVER" --no-realtime --timeout 5000 -d dummy -r 48000 -p 2048 > "$work/jackd.log" 2>&1 &
     running+=($!)
     trap 'kill "${running[@]}" 2> /dev/null || :' EXIT
