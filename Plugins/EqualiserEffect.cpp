@@ -86,7 +86,7 @@ int KindOf(int index) { return Exists(index) ? index % EqualiserEffect::kKinds :
 EqualiserEffect::EqualiserEffect() {
     for (int i = 0; i < kBands * kKinds; ++i)
         m_words[static_cast<std::size_t>(i)] = kDefaults[i / kKinds][i % kKinds];
-    m_record.numBands = kBands;
+    for (auto& record : m_records) record.numBands = kBands;
 }
 
 bool EqualiserEffect::DoSetParam(int index, float normalised, bool) {
@@ -101,14 +101,15 @@ void EqualiserEffect::CheckCookProperties(const tWAVEFORMATEX* format, bool forc
     for (std::size_t band = 0; band < kBands; ++band) {
         const auto* const words = &m_words[band * kKinds];
         const auto type = std::clamp(words[kType].load(), 0, kLastType);
-        m_record.bands[band] = {kTypes[type].type | (words[kOn] != 0 ? 0 : _eq_data::kBypassBand),
-                                words[kFrequency], words[kGain], words[kQ]};
+        m_records[0].bands[band] = {kTypes[type].type | (words[kOn] != 0 ? 0 : _eq_data::kBypassBand),
+                                    words[kFrequency], words[kGain], words[kQ]};
     }
     const auto rate = static_cast<int>(format->nSamplesPerSec);
     if (cook.afresh)
-        m_equaliser.Cook(false, false, &m_record, rate, std::min<int>(format->nChannels, MaxNumChannels));
+        m_equaliser.Cook(false, false, m_records.data(), rate,
+                         std::min<int>(format->nChannels, MaxNumChannels));
     else
-        m_equaliser.CookBandsOnly(true, false, m_record, rate);
+        m_equaliser.CookBandsOnly(true, false, m_records[0], rate);
 }
 
 void EqualiserEffect::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,
@@ -117,10 +118,10 @@ void EqualiserEffect::ProcessInternal(double* buffer, int frames, const tWAVEFOR
     const int channels = std::min<int>(format->nChannels, MaxNumChannels);
     for (int channel = 0; channel < channels; ++channel)
         if (format->wBitsPerSample == 64)
-            m_equaliser.ProcessSingle(buffer, frames, format->nChannels, false, channel, &m_record);
+            m_equaliser.ProcessSingle(buffer, frames, format->nChannels, false, channel, m_records.data());
         else
             m_equaliser.ProcessSingle(reinterpret_cast<float*>(buffer), frames, format->nChannels, false,
-                                      channel, &m_record);
+                                      channel, m_records.data());
 }
 
 void EqualiserEffect::Cleanup() { MarkStale(); }
