@@ -91,7 +91,7 @@ void Adapter::Prepare(double rate, int frames) {
         m_side[c].assign(m_sideChannels > 0 ? piece : 0, 0.0f);
         m_dry[c].assign(ring, 0.0f);
     }
-    m_interleaved.assign(m_planar ? 0 : piece * static_cast<std::size_t>(m_channels), 0.0f);
+    m_interleaved.assign(m_planar || m_channels == 1 ? 0 : 2 * piece, 0.0f);
     m_glideSteps = std::max(1, static_cast<int>(kGlide * rate / kStep));
     m_mixStep = static_cast<float>(1.0 / (kBypass * rate));
     Restart();
@@ -258,18 +258,20 @@ void Adapter::ProcessPiece(const float* const* in, float* const* out, const floa
 
 void Adapter::TakeInput(const float* const* in, int frames) {
     const auto count = static_cast<std::size_t>(frames);
+    if (m_interleaved.empty())
+        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+            for (std::size_t i = 0; i < count; ++i) m_wet[c][i] = Finite(in[c][i]);
+    else
+        for (std::size_t i = 0; i < count; ++i) {
+            m_interleaved[2 * i] = Finite(in[0][i]);
+            m_interleaved[2 * i + 1] = Finite(in[1][i]);
+        }
     // The ring is needed only where something may be mixed with it.
-    const bool keep = m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f;
-    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
-        float* const wet = m_wet[c].data();
-        for (std::size_t i = 0; i < count; ++i) wet[i] = Finite(in[c][i]);
-        if (!keep) continue;
-        auto& ring = m_dry[c];
-        const std::size_t first = std::min(count, ring.size() - m_dryAt);
-        std::copy_n(wet, first, ring.data() + m_dryAt);
-        std::copy_n(wet + first, count - first, ring.data());
-    }
-    m_dryAt = (m_dryAt + count) & (m_dry[0].size() - 1);
+    const std::size_t mask = m_dry[0].size() - 1;
+    if (m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f)
+        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+            for (std::size_t i = 0; i < count; ++i) m_dry[c][(m_dryAt + i) & mask] = Finite(in[c][i]);
+    m_dryAt = (m_dryAt + count) & mask;
 }
 
 void Adapter::TakeSide(const float* const* side, int frames) {
@@ -296,31 +298,26 @@ void Adapter::ProcessEffect(int frames) {
         m_effect->ProcessNoninterleaved(channels, frames, &m_format, flags);
         return;
     }
-    if (m_channels == 1) {
-        m_effect->Process(m_wet[0].data(), frames, &m_format, flags);
-        return;
-    }
-    const auto count = static_cast<std::size_t>(frames);
-    float *const left = m_wet[0].data(), *const right = m_wet[1].data(), *const both = m_interleaved.data();
-    for (std::size_t i = 0; i < count; ++i) {
-        both[2 * i] = left[i];
-        both[2 * i + 1] = right[i];
-    }
-    m_effect->Process(both, frames, &m_format, flags);
-    for (std::size_t i = 0; i < count; ++i) {
-        left[i] = both[2 * i];
-        right[i] = both[2 * i + 1];
-    }
+    m_effect->Process(m_interleaved.empty() ? m_wet[0].data() : m_interleaved.data(), frames, &m_format,
+                      flags);
 }
 
 void Adapter::Give(float* const* out, int frames) {
     const auto count = static_cast<std::size_t>(frames);
     const float goal = m_goal;
-    if (m_mix == 1.0f && goal == 1.0f) {
+    const bool wetOnly = m_mix == 1.0f && goal == 1.0f;
+    if (!m_interleaved.empty()) {
+        float* const left = wetOnly ? out[0] : m_wet[0].data();
+        float* const right = wetOnly ? out[1] : m_wet[1].data();
+        for (std::size_t i = 0; i < count; ++i) {
+            left[i] = Finite(m_interleaved[2 * i]);
+            right[i] = Finite(m_interleaved[2 * i + 1]);
+        }
+    } else if (wetOnly) {
         for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
             for (std::size_t i = 0; i < count; ++i) out[c][i] = Finite(m_wet[c][i]);
-        return;
     }
+    if (wetOnly) return;
     const std::size_t mask = m_dry[0].size() - 1;
     const std::size_t from = m_dryAt - count - static_cast<std::size_t>(m_latency.load());
     const float step = goal > m_mix ? m_mixStep : -m_mixStep;

@@ -114,7 +114,7 @@ private:
     int m_longest = 0;  // frames of a piece
     int m_glideSteps = 1;
     std::array<std::vector<float>, 2> m_wet, m_side;
-    std::vector<float> m_interleaved;
+    std::vector<float> m_interleaved;         // for an effect that takes stereo so; else empty
     std::array<std::vector<float>, 2> m_dry;  // rings of the input
     std::size_t m_dryAt = 0;                  // where the next frame is written
     bool m_sideHeard = false;
