@@ -7,7 +7,8 @@
 #include <stdexcept>
 #include <thread>
 
-#include "DSP/Effects/ParameterInput.h"
+#include "DSP/Effects/EffectKinds.h"
+#include "DSP/Effects/SettingsInput.h"
 
 namespace Corvo::Plugins {
 namespace {
@@ -42,9 +43,10 @@ private:
     bool m_open = false;
 };
 
-Adapter::Adapter(const PluginRow& row, int channels)
+Adapter::Adapter(const PluginRow& row, int channels, Start start)
     : m_row(row),
       m_channels(channels),
+      m_start(start),
       m_layout(LayoutOf(row, channels)),
       m_effect(row.Make()),
       m_planar(m_effect->SupportsNoninterleaved()),
@@ -75,6 +77,8 @@ void Adapter::Tempo(double bpm, int numerator, int denominator) {
 
 void Adapter::Prepare(double rate, int frames) {
     const Gate gate(m_busy, Gate::If::Waiting);
+    m_longest = 0;
+    TakeEdits(false);
     m_longest = std::clamp(frames, kStep, kLongestPiece);
     m_format = {};
     m_format.nChannels = static_cast<std::uint16_t>(m_channels);
@@ -87,10 +91,9 @@ void Adapter::Prepare(double rate, int frames) {
         m_side[c].assign(m_sideChannels > 0 ? piece : 0, 0.0f);
         m_dry[c].assign(ring, 0.0f);
     }
-    m_interleaved.assign(m_planar ? 0 : piece * static_cast<std::size_t>(m_channels), 0.0f);
+    m_interleaved.assign(m_planar || m_channels == 1 ? 0 : 2 * piece, 0.0f);
     m_glideSteps = std::max(1, static_cast<int>(kGlide * rate / kStep));
     m_mixStep = static_cast<float>(1.0 / (kBypass * rate));
-    TakeEdits(false);
     Restart();
 }
 
@@ -143,46 +146,73 @@ void Adapter::Set(int index, float value) {
     m_edits = true;
 }
 
+void Adapter::Recall(const std::vector<float>& values) {
+    const auto copy = Copy();
+    for (std::size_t i = 0; i < m_controls.size() && i < values.size(); ++i) {
+        const Port& port = Ports()[i];
+        const float value = std::clamp(values[i], port.least, port.most);
+        if (!std::isfinite(values[i])) continue;
+        const float before = copy->GetParam(port.parameter);
+        copy->SetParam(port.parameter, port.Position(value), false);
+        if (copy->GetParam(port.parameter) == before)
+            m_controls[i].wanted = value;
+        else if (port.type == EffectParameterType::Switch)
+            Set(static_cast<int>(i), value);  // one that the settings do not keep
+    }
+}
+
 float Adapter::Value(int port) const { return m_controls[static_cast<std::size_t>(port)].wanted; }
 
 // A list is set as by a user: some effects make things ready then. Nothing else happens at the same time.
 void Adapter::Apply(std::size_t index, float position) {
     const Port& port = Ports()[index];
     m_controls[index].position = position;
-    const bool automated = port.type != EffectParameterType::List && !m_fresh;
+    const bool early = m_longest == 0 || (m_fresh && m_start == Start::WithFirstValues);
+    const bool automated = port.type != EffectParameterType::List && !early;
     m_effect->SetParam(port.parameter, position, automated);
 }
 
-void Adapter::TakeEdits(bool glide) {
-    if (!m_edits.exchange(false)) return;
-    bool lists = false;
+// Of the lists, or of all others. Whether there were any.
+bool Adapter::TakeEditsOf(bool lists, bool glide) {
+    bool any = false;
     for (std::size_t i = 0; i < m_controls.size(); ++i) {
         Control& control = m_controls[i];
-        if (!control.edited.exchange(false)) continue;
         const Port& port = Ports()[i];
+        if ((port.type == EffectParameterType::List) != lists || !control.edited.exchange(false)) continue;
+        any = true;
         control.target = port.Position(control.wanted);
         const bool glides = glide && port.glides;
         m_gliding += static_cast<int>(glides) - static_cast<int>(control.stepsLeft > 0);
         control.stepsLeft = glides ? m_glideSteps : 0;
-        control.touched = !m_fresh;
-        if (glides) continue;
-        Apply(i, control.target);
-        lists = lists || port.type == EffectParameterType::List;
+        control.touched = true;
+        if (!glides) Apply(i, control.target);
     }
-    // Nothing was heard yet: the sound begins with these values.
-    if (m_fresh && m_longest > 0) Restart();
-    if (!lists) return;
-    // A list may move other parameters with it.
+    return any;
+}
+
+void Adapter::ReadBackOthers() {
     for (std::size_t i = 0; i < m_controls.size(); ++i) {
         Control& control = m_controls[i];
         if (control.stepsLeft > 0 || control.edited) continue;
         const float position = m_effect->GetParam(Ports()[i].parameter);
         control.touched = false;
-        if (position == control.position || Ports()[i].Position(control.wanted) == position) continue;
+        const Port& port = Ports()[i];
+        const float value = port.Value(position), before = control.wanted;
+        const double step =
+            std::max(1.01 * port.resolution, 5e-4 * static_cast<double>(port.most - port.least));
         control.position = control.target = position;
-        control.wanted = Ports()[i].Value(position);
+        if (std::abs(value - before) <= static_cast<float>(step)) continue;
+        control.wanted = value;
         m_otherValues = true;
     }
+}
+
+void Adapter::TakeEdits(bool glide) {
+    if (!m_edits.exchange(false)) return;
+    // Lists first: one may move other parameters with it, those that the host leaves alone.
+    if (TakeEditsOf(true, false)) ReadBackOthers();
+    TakeEditsOf(false, glide);
+    if (m_fresh && m_start == Start::WithFirstValues) Restart();
 }
 
 void Adapter::StepGlides() {
@@ -228,18 +258,20 @@ void Adapter::ProcessPiece(const float* const* in, float* const* out, const floa
 
 void Adapter::TakeInput(const float* const* in, int frames) {
     const auto count = static_cast<std::size_t>(frames);
+    if (m_interleaved.empty())
+        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+            for (std::size_t i = 0; i < count; ++i) m_wet[c][i] = Finite(in[c][i]);
+    else
+        for (std::size_t i = 0; i < count; ++i) {
+            m_interleaved[2 * i] = Finite(in[0][i]);
+            m_interleaved[2 * i + 1] = Finite(in[1][i]);
+        }
     // The ring is needed only where something may be mixed with it.
-    const bool keep = m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f;
-    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
-        float* const wet = m_wet[c].data();
-        for (std::size_t i = 0; i < count; ++i) wet[i] = Finite(in[c][i]);
-        if (!keep) continue;
-        auto& ring = m_dry[c];
-        const std::size_t first = std::min(count, ring.size() - m_dryAt);
-        std::copy_n(wet, first, ring.data() + m_dryAt);
-        std::copy_n(wet + first, count - first, ring.data());
-    }
-    m_dryAt = (m_dryAt + count) & (m_dry[0].size() - 1);
+    const std::size_t mask = m_dry[0].size() - 1;
+    if (m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f)
+        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+            for (std::size_t i = 0; i < count; ++i) m_dry[c][(m_dryAt + i) & mask] = Finite(in[c][i]);
+    m_dryAt = (m_dryAt + count) & mask;
 }
 
 void Adapter::TakeSide(const float* const* side, int frames) {
@@ -266,31 +298,26 @@ void Adapter::ProcessEffect(int frames) {
         m_effect->ProcessNoninterleaved(channels, frames, &m_format, flags);
         return;
     }
-    if (m_channels == 1) {
-        m_effect->Process(m_wet[0].data(), frames, &m_format, flags);
-        return;
-    }
-    const auto count = static_cast<std::size_t>(frames);
-    float *const left = m_wet[0].data(), *const right = m_wet[1].data(), *const both = m_interleaved.data();
-    for (std::size_t i = 0; i < count; ++i) {
-        both[2 * i] = left[i];
-        both[2 * i + 1] = right[i];
-    }
-    m_effect->Process(both, frames, &m_format, flags);
-    for (std::size_t i = 0; i < count; ++i) {
-        left[i] = both[2 * i];
-        right[i] = both[2 * i + 1];
-    }
+    m_effect->Process(m_interleaved.empty() ? m_wet[0].data() : m_interleaved.data(), frames, &m_format,
+                      flags);
 }
 
 void Adapter::Give(float* const* out, int frames) {
     const auto count = static_cast<std::size_t>(frames);
     const float goal = m_goal;
-    if (m_mix == 1.0f && goal == 1.0f) {
+    const bool wetOnly = m_mix == 1.0f && goal == 1.0f;
+    if (!m_interleaved.empty()) {
+        float* const left = wetOnly ? out[0] : m_wet[0].data();
+        float* const right = wetOnly ? out[1] : m_wet[1].data();
+        for (std::size_t i = 0; i < count; ++i) {
+            left[i] = Finite(m_interleaved[2 * i]);
+            right[i] = Finite(m_interleaved[2 * i + 1]);
+        }
+    } else if (wetOnly) {
         for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
-            std::copy_n(m_wet[c].data(), count, out[c]);
-        return;
+            for (std::size_t i = 0; i < count; ++i) out[c][i] = Finite(m_wet[c][i]);
     }
+    if (wetOnly) return;
     const std::size_t mask = m_dry[0].size() - 1;
     const std::size_t from = m_dryAt - count - static_cast<std::size_t>(m_latency.load());
     const float step = goal > m_mix ? m_mixStep : -m_mixStep;
@@ -300,7 +327,7 @@ void Adapter::Give(float* const* out, int frames) {
         for (std::size_t i = 0; i < count; ++i) {
             if (mix != goal) mix = std::clamp(mix + step, 0.0f, 1.0f);
             const float dry = m_dry[c][(from + i) & mask];
-            out[c][i] = mix == 0.0f ? dry : dry + mix * (m_wet[c][i] - dry);
+            out[c][i] = mix == 0.0f ? dry : Finite(dry + mix * (m_wet[c][i] - dry));
         }
     }
     m_mix = mix;
@@ -322,12 +349,14 @@ std::vector<std::uint8_t> Adapter::State() {
     const auto touched = [](const Control& control) { return control.touched || control.edited; };
     if (std::ranges::none_of(m_controls, touched)) return chunk;
     const auto copy = Copy();
-    for (std::size_t i = 0; i < m_controls.size(); ++i) {
-        const Port& port = Ports()[i];
-        const float position = port.Position(m_controls[i].wanted);
-        if (touched(m_controls[i]) && copy->GetParam(port.parameter) != position)
-            copy->SetParam(port.parameter, position, false);
-    }
+    for (const bool lists : {true, false})
+        for (std::size_t i = 0; i < m_controls.size(); ++i) {
+            const Port& port = Ports()[i];
+            const bool isList = port.type == EffectParameterType::List;
+            if (isList != lists || !touched(m_controls[i]) || port.momentary) continue;
+            const float position = port.Position(m_controls[i].wanted);
+            if (copy->GetParam(port.parameter) != position) copy->SetParam(port.parameter, position, false);
+        }
     copy->GetSettingsChunk(chunk);
     return chunk;
 }
@@ -344,6 +373,9 @@ bool Adapter::TakeState(const std::vector<std::uint8_t>& bytes) {
     other->GetSettingsChunk(before);
     another->GetSettingsChunk(after);
     if (before != after) return false;
+    // Nor are settings taken that no control gives: such a file is damaged.
+    const DSP::EffectKind* const kind = DSP::FindEffectKind(m_row.name);
+    if (kind && !DSP::ParameterOutOfRange(*kind, *other).empty()) return false;
     const Gate gate(m_busy, Gate::If::Waiting);
     m_effect->SetSettingsChunk(bytes);
     ReadBack();
@@ -377,10 +409,13 @@ bool Adapter::FromText(int index, const std::string& text, float& value) {
     if (port.type != EffectParameterType::Continuous) return false;
     try {
         const auto copy = Copy();
-        const float position = copy->GetParamValueNormalizedFromText(port.parameter, text);
-        if (!(position >= 0.0f)) return false;
-        copy->SetParam(port.parameter, std::min(position, 1.0f), false);
+        const float read = copy->GetParamValueNormalizedFromText(port.parameter, text);
+        if (!(read >= 0.0f)) return false;
+        const float position = PositionThatShows(*copy, port.parameter, std::min(read, 1.0f), text);
+        copy->SetParam(port.parameter, position, false);
         value = port.ValueOf(*copy);
+        // Several places may show the same number, and a text tell them apart.
+        if (Text(index, value) != text) value = port.curve.Number(position);
         return true;
     } catch (const std::logic_error&) {
         return false;

@@ -20,7 +20,12 @@ namespace Corvo::Plugins {
 // Prepare and Reset. Run neither allocates nor waits, unless the effect's own row says that it may.
 class Adapter final : CorvoEffectHostCallback {
 public:
-    Adapter(const PluginRow& row, int channels);  // 1 or 2; throws std::bad_alloc
+    // What the values of the first block after preparation are: changes like all others, or what the sound
+    // begins with. For formats that hand over values with the first block only; that block may allocate then.
+    enum class Start { AsPrepared, WithFirstValues };
+
+    // For 1 or 2 channels. Throws std::bad_alloc.
+    Adapter(const PluginRow& row, int channels, Start start = Start::AsPrepared);
     ~Adapter() override;
 
     const PluginRow& Row() const { return m_row; }
@@ -36,6 +41,9 @@ public:
     // to it over some milliseconds while sound is processed.
     void Set(int port, float value);
     float Value(int port) const;
+    // After TakeState: the values that a host had set. They are told again where the effect stores the same
+    // for them, being coarser.
+    void Recall(const std::vector<float>& values);
     // Over 20 ms from the effect to its delayed input, or back.
     void Bypass(bool on) { m_bypass = on; }
     bool Bypassed() const { return m_bypass; }
@@ -79,6 +87,8 @@ private:
     void ReadBack();
     void Apply(std::size_t port, float position);
     void TakeEdits(bool glide);
+    bool TakeEditsOf(bool lists, bool glide);
+    void ReadBackOthers();
     void StepGlides();
     void Restart();
     void ProcessPiece(const float* const* in, float* const* out, const float* const* side, int frames);
@@ -90,6 +100,7 @@ private:
 
     const PluginRow& m_row;
     const int m_channels;
+    const Start m_start;
     const Layout& m_layout;
     const std::unique_ptr<DSP::CorvoEffectBase> m_effect;
     const bool m_planar;
@@ -103,7 +114,7 @@ private:
     int m_longest = 0;  // frames of a piece
     int m_glideSteps = 1;
     std::array<std::vector<float>, 2> m_wet, m_side;
-    std::vector<float> m_interleaved;
+    std::vector<float> m_interleaved;         // for an effect that takes stereo so; else empty
     std::array<std::vector<float>, 2> m_dry;  // rings of the input
     std::size_t m_dryAt = 0;                  // where the next frame is written
     bool m_sideHeard = false;

@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <bit>
 #include <cmath>
 #include <cstring>
 #include <exception>
@@ -25,7 +26,8 @@ using namespace Corvo::Plugins;
 
 constexpr char kVersion[] = DSP_PLUGIN_VERSION;
 constexpr clap_id kBypass = 0;
-// In front of the settings chunk: these letters, and whether the effect is bypassed.
+// In front of the settings chunk: these letters, whether the effect is bypassed, and the values of all ports,
+// which may be finer than what an effect stores.
 constexpr std::uint8_t kStateTag[]{'D', 'S', 'P', '1'};
 
 void CopyText(char* to, std::size_t size, const std::string& text) {
@@ -285,6 +287,11 @@ private:
         Adapter& adapter = Of(plugin).m_adapter;
         std::vector<std::uint8_t> bytes(std::begin(kStateTag), std::end(kStateTag));
         bytes.push_back(adapter.Bypassed());
+        for (std::size_t i = 0; i < adapter.Ports().size(); ++i) {
+            const auto word = std::bit_cast<std::uint32_t>(adapter.Value(static_cast<int>(i)));
+            for (int shift = 0; shift < 32; shift += 8)
+                bytes.push_back(static_cast<std::uint8_t>(word >> shift));
+        }
         const auto settings = adapter.State();
         bytes.insert(bytes.end(), settings.begin(), settings.end());
         for (std::size_t done = 0; done < bytes.size();) {
@@ -305,13 +312,21 @@ private:
             if (count == 0) break;
             bytes.insert(bytes.end(), buffer, buffer + count);
         }
-        constexpr std::size_t kHeader = std::size(kStateTag) + 1;
-        if (bytes.size() < kHeader || !std::equal(std::begin(kStateTag), std::end(kStateTag), bytes.begin()))
-            return false;
         ClapPlugin& self = Of(plugin);
-        const bool bypass = bytes[kHeader - 1] != 0;
-        if (!self.m_adapter.TakeState({bytes.begin() + kHeader, bytes.end()})) return false;
-        self.m_adapter.Bypass(bypass);
+        constexpr std::size_t kTag = std::size(kStateTag);
+        const std::size_t ports = self.m_adapter.Ports().size(), header = kTag + 1 + 4 * ports;
+        if (bytes.size() < header || !std::equal(std::begin(kStateTag), std::end(kStateTag), bytes.begin()))
+            return false;
+        const auto settings = bytes.begin() + static_cast<std::ptrdiff_t>(header);
+        if (!self.m_adapter.TakeState({settings, bytes.end()})) return false;
+        self.m_adapter.Bypass(bytes[kTag] != 0);
+        std::vector<float> values;
+        for (std::size_t i = 0; i < ports; ++i) {
+            std::uint32_t word = 0;
+            for (std::size_t byte = 4; byte-- > 0;) word = word << 8 | bytes[kTag + 1 + 4 * i + byte];
+            values.push_back(std::bit_cast<float>(word));
+        }
+        self.m_adapter.Recall(values);
         self.TellValues();
         return true;
     } catch (const std::exception&) {

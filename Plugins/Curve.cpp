@@ -56,12 +56,27 @@ bool KeepsFractions(CorvoEffectBase& effect, int parameter) {
     return std::abs(effect.GetParam(parameter) - kOdd) < 1e-6f;
 }
 
+// The first of the positions around one, nearest first, of which something is true; else that one.
+template <typename IsTrue>
+float Nearby(float position, IsTrue isTrue) {
+    constexpr float kStride = 5e-5f;
+    for (int i = 0; i < 40; ++i)
+        for (const float other :
+             {position + static_cast<float>(i) * kStride, position - static_cast<float>(i) * kStride})
+            if (other >= 0.0f && other <= 1.0f && isTrue(other)) return other;
+    return position;
+}
+
 std::optional<Curve::Point> PointAt(CorvoEffectBase& effect, int parameter, double number) {
     try {
         const float position = effect.GetParamValueNormalizedFromText(parameter, std::to_string(number));
         // Some readers go beyond the end by a rounding.
         if (!(position >= 0.0f && position <= 1.01f)) return {};
-        return Curve::Point{std::min(static_cast<double>(position), 1.0), number};
+        const float shows = Nearby(std::min(position, 1.0f), [&](float other) {
+            const auto shown = NumberIn(ShownAt(effect, parameter, other));
+            return shown && std::abs(shown->value - number) < 1e-6;
+        });
+        return Curve::Point{static_cast<double>(shows), number};
     } catch (const std::exception&) {
         return {};
     }
@@ -141,6 +156,10 @@ double LastNumber(CorvoEffectBase& effect, int parameter, float with, float with
         (NumberIn(ShownAt(effect, parameter, middle)) ? with : without) = middle;
     }
     return NumberIn(ShownAt(effect, parameter, with))->value;
+}
+
+float PositionThatShows(CorvoEffectBase& effect, int parameter, float position, const std::string& text) {
+    return Nearby(position, [&](float place) { return ShownAt(effect, parameter, place) == text; });
 }
 
 bool ReadNumber(const std::string& text, float& number) {

@@ -45,6 +45,10 @@ ReadCurve CurveOf(DSP::CorvoEffectBase& effect, int parameter);
 std::string ShownAt(DSP::CorvoEffectBase& effect, int parameter, float position);
 std::string Shown(DSP::CorvoEffectBase& effect, int parameter, float position);
 
+// The position next to `position` that shows the text, or that one where there is none: readers and stored
+// values may be a step apart.
+float PositionThatShows(DSP::CorvoEffectBase& effect, int parameter, float position, const std::string& text);
+
 // The number in such a text, at its start or after a bar; false where there is none.
 bool ReadNumber(const std::string& text, float& number);
 

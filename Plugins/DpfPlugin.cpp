@@ -42,7 +42,10 @@ using namespace Corvo::Plugins;
 constexpr char kStateKey[] = "settings";
 constexpr int kChannels = DSP_PLUGIN_CHANNELS;
 
-std::uint32_t PresetCount() { return static_cast<std::uint32_t>(Adapter(Chosen(), kChannels).Presets()); }
+// A plug-in without presets has one, where it starts: DPF does not do with none.
+std::uint32_t PresetCount() {
+    return static_cast<std::uint32_t>(std::max(Adapter(Chosen(), kChannels).Presets(), 1));
+}
 std::uint32_t PortCount() { return static_cast<std::uint32_t>(LayoutOf(Chosen(), kChannels).ports.size()); }
 
 // An adapter as DPF wants it. Parameter 0 is the bypass; port i of the adapter is the parameter i + 1.
@@ -104,7 +107,7 @@ protected:
         portGroup.symbol = SymbolOf(groups[group]).c_str();
     }
     void initProgramName(std::uint32_t index, String& name) override {
-        name = m_adapter.PresetName(static_cast<int>(index)).c_str();
+        name = m_adapter.Presets() == 0 ? "Default" : m_adapter.PresetName(static_cast<int>(index)).c_str();
     }
     void initState(std::uint32_t, State& state) override {
         state.hints = kStateIsBase64Blob | kStateIsOnlyForDSP;
@@ -122,7 +125,12 @@ protected:
         else
             m_adapter.Set(static_cast<int>(index) - 1, value);
     }
-    void loadProgram(std::uint32_t index) override { m_adapter.TakePreset(static_cast<int>(index)); }
+    void loadProgram(std::uint32_t index) override {
+        if (m_adapter.Presets() == 0)
+            m_adapter.TakeState(m_first);
+        else
+            m_adapter.TakePreset(static_cast<int>(index));
+    }
     String getState(const char*) const override {
         const auto bytes = m_adapter.State();
         return String::asBase64(bytes.data(), bytes.size());
@@ -149,6 +157,7 @@ private:
 
     // Asking for the state is no change of it.
     mutable Adapter m_adapter;
+    const std::vector<std::uint8_t> m_first = m_adapter.State();
 };
 
 }  // namespace

@@ -51,7 +51,7 @@ protected:
 private:
     std::array<std::atomic<std::int32_t>, kBands * kKinds> m_words;
     DSP::ParEQ m_equaliser;
-    std::array<DSP::builtin_effects_data, MaxNumChannels> m_records;  // of the audio thread, by channel
+    std::array<DSP::builtin_effects_data, MaxNumChannels> m_records;  // of the audio thread
     tWAVEFORMATEX m_format{};
 };
 

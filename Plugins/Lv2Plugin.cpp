@@ -57,7 +57,7 @@ class Lv2Plugin {
 public:
     Lv2Plugin(const PluginRow& row, int channels, double rate, const LV2_Feature* const* features)
         : m_ids(static_cast<const LV2_URID_Map*>(Feature(features, LV2_URID__map))),
-          m_adapter(row, channels),
+          m_adapter(row, channels, Adapter::Start::WithFirstValues),
           m_order{channels, m_adapter.SideChannels(), row.tempo},
           m_rate(rate),
           m_ports(static_cast<std::size_t>(m_order.FirstControl()) + m_adapter.Ports().size()),

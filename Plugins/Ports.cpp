@@ -46,6 +46,8 @@ struct LayoutMaker {
     }
 
     void SetChoices(Port& port, const DSP::ParameterDescription& description) {
+        tried->SetParam(port.parameter, 1.0f, false);
+        port.momentary = port.type == EffectParameterType::Switch && tried->GetParam(port.parameter) == 0.0f;
         for (const auto& choice : description.choices) {
             port.points.push_back({choice.text, static_cast<float>(port.points.size())});
             port.m_choices.push_back(choice.normalised);
