@@ -50,6 +50,9 @@ inline void Expect(bool condition, const std::string& otherwise) {
     if (!condition) Finding(otherwise);
 }
 
+// `broken` says what the audio thread did that it must not do; empty when nothing.
+void ExpectRealTime(const std::string& broken);
+
 enum class Thread { Main, Audio };
 Thread CurrentThread();
 // Runs the work on a thread of its own that counts as the audio thread, and waits for it.
