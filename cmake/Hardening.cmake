@@ -5,7 +5,7 @@ if(WIN32)
     # is not executable are what this linker makes anyway.
     enable_language(C)
     foreach(language C CXX)
-        string(APPEND CMAKE_${language}_STANDARD_LIBRARIES " -Wl,-Bstatic -lssp -Wl,-Bdynamic")
+        string(APPEND CMAKE_${language}_STANDARD_LIBRARIES " -l:libssp.a")
     endforeach()
 else()
     list(APPEND dsp_hardening -fcf-protection)

@@ -112,6 +112,10 @@ void ParEQ::Cook(bool smooth, bool bypassAll, builtin_effects_data* data, int sa
     }
 }
 
+void ParEQ::CookBandsOnly(bool smooth, bool bypassAll, const builtin_effects_data& data, int sampleRate) {
+    for (const auto& channel : m_channels) CookBands(channel->bands, data, sampleRate, smooth, bypassAll);
+}
+
 void ParEQ::ResetProcessing() { *m_glide_counter = 0; }
 
 EqChannel* ParEQ::Channel(int channel) const {

@@ -46,6 +46,10 @@ public:
     // record's count keep what they have. A null record changes nothing.
     void Cook(bool smooth, bool bypassAll, builtin_effects_data* data, int sampleRate, int numChannels);
 
+    // As Cook, for the channels that are there and without touching their analysers, which lock: once cooked
+    // in full, an equaliser takes new bands this way between two blocks of the audio thread.
+    void CookBandsOnly(bool smooth, bool bypassAll, const builtin_effects_data& data, int sampleRate);
+
     // What the cooked bands make of a sine of `frequency` Hz once all glides have ended, polarity included.
     // `records` as for processing. 1 for a channel that was never cooked.
     std::complex<double> GetResponse(int channel, double frequency, int sampleRate,

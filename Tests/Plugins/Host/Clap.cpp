@@ -1,0 +1,378 @@
+// CLAP over the C headers.
+#include <clap/entry.h>
+#include <clap/ext/audio-ports.h>
+#include <clap/ext/latency.h>
+#include <clap/ext/params.h>
+#include <clap/ext/state.h>
+#include <clap/ext/thread-check.h>
+#include <clap/plugin-factory.h>
+#include <clap/plugin-features.h>
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstring>
+#include <set>
+#include <stdexcept>
+#include <utility>
+
+#include "Instance.h"
+#include "Module.h"
+#include "Support/AudioThreadRules.h"
+
+namespace PluginHost {
+namespace {
+
+void ExpectThread(Thread thread, const char* call) {
+    Expect(CurrentThread() == thread, std::string("calls the host's ") + call + " from the wrong thread");
+}
+
+// The host that the plug-in sees.
+const clap_host_params_t kHostParams{
+    [](const clap_host_t*, clap_param_rescan_flags) { ExpectThread(Thread::Main, "params.rescan"); },
+    [](const clap_host_t*, clap_id, clap_param_clear_flags) { ExpectThread(Thread::Main, "params.clear"); },
+    [](const clap_host_t*) {
+        Expect(CurrentThread() != Thread::Audio, "calls params.request_flush on the audio thread");
+    }};
+const clap_host_latency_t kHostLatency{
+    [](const clap_host_t*) { ExpectThread(Thread::Main, "latency.changed"); }};
+const clap_host_state_t kHostState{
+    [](const clap_host_t*) { ExpectThread(Thread::Main, "state.mark_dirty"); }};
+const clap_host_thread_check_t kHostThreads{
+    [](const clap_host_t*) { return CurrentThread() == Thread::Main; },
+    [](const clap_host_t*) { return CurrentThread() == Thread::Audio; }};
+
+const void* HostExtension(const clap_host_t*, const char* id) {
+    const std::string name = id;
+    if (name == CLAP_EXT_PARAMS) return &kHostParams;
+    if (name == CLAP_EXT_LATENCY) return &kHostLatency;
+    if (name == CLAP_EXT_STATE) return &kHostState;
+    if (name == CLAP_EXT_THREAD_CHECK) return &kHostThreads;
+    return nullptr;
+}
+
+bool g_callbackWanted = false;
+const clap_host_t kHost{CLAP_VERSION,
+                        nullptr,
+                        "plugin_host",
+                        "DSPDll",
+                        "",
+                        "1.0",
+                        HostExtension,
+                        [](const clap_host_t*) {},
+                        [](const clap_host_t*) {},
+                        [](const clap_host_t*) { g_callbackWanted = true; }};
+
+// A list of events in both directions that never allocates once it is made.
+struct Events {
+    static constexpr std::size_t kMost = 8192;
+    std::vector<clap_event_param_value_t> events;
+    clap_input_events_t in{this, Size, Get};
+    clap_output_events_t out{this, Push};
+    std::uint32_t lastFrame = 0;
+
+    Events() { events.reserve(kMost); }
+    Events(const Events&) = delete;
+
+    void Set(std::span<const Change> changes, std::uint16_t space = CLAP_CORE_EVENT_SPACE_ID) {
+        events.clear();
+        for (const Change& change : changes.first(std::min(changes.size(), kMost)))
+            events.push_back(
+                {{sizeof(clap_event_param_value_t), change.frame, space, CLAP_EVENT_PARAM_VALUE, 0},
+                 change.parameter,
+                 nullptr,
+                 -1,
+                 -1,
+                 -1,
+                 -1,
+                 change.value});
+    }
+
+    static std::uint32_t Size(const clap_input_events_t* list) {
+        return static_cast<std::uint32_t>(static_cast<Events*>(list->ctx)->events.size());
+    }
+    static const clap_event_header_t* Get(const clap_input_events_t* list, std::uint32_t index) {
+        return &static_cast<Events*>(list->ctx)->events[index].header;
+    }
+    static bool Push(const clap_output_events_t*, const clap_event_header_t* event) {
+        Expect(event && event->size >= sizeof(clap_event_header_t), "sends the host a malformed event");
+        return true;
+    }
+};
+
+struct Stream {
+    Bytes bytes;
+    std::size_t most, position = 0;
+
+    static std::int64_t Read(const clap_istream_t* stream, void* buffer, std::uint64_t size) {
+        auto& self = *static_cast<Stream*>(stream->ctx);
+        const std::size_t count =
+            std::min({static_cast<std::size_t>(size), self.most, self.bytes.size() - self.position});
+        if (count) std::memcpy(buffer, self.bytes.data() + self.position, count);
+        self.position += count;
+        return static_cast<std::int64_t>(count);
+    }
+    static std::int64_t Write(const clap_ostream_t* stream, const void* buffer, std::uint64_t size) {
+        auto& self = *static_cast<Stream*>(stream->ctx);
+        const std::size_t count = std::min(static_cast<std::size_t>(size), self.most);
+        const char* bytes = static_cast<const char*>(buffer);
+        self.bytes.insert(self.bytes.end(), bytes, bytes + count);
+        return static_cast<std::int64_t>(count);
+    }
+};
+
+class ClapInstance : public Instance {
+public:
+    explicit ClapInstance(const clap_plugin_t* plugin) : m_plugin(plugin) {
+        if (!plugin->init(plugin)) throw std::runtime_error("init fails");
+        m_params = Extension<clap_plugin_params_t>(CLAP_EXT_PARAMS);
+        m_state = Extension<clap_plugin_state_t>(CLAP_EXT_STATE);
+        m_latency = Extension<clap_plugin_latency_t>(CLAP_EXT_LATENCY);
+        if (!m_params || !m_state) throw std::runtime_error("has no parameters or no state");
+        Expect(!plugin->get_extension(plugin, "no.such.extension"), "has an extension that does not exist");
+        ReadParameters();
+        ReadPorts(true, inputs);
+        ReadPorts(false, outputs);
+    }
+    ~ClapInstance() override {
+        RunCallback();
+        m_plugin->destroy(m_plugin);
+    }
+
+    std::optional<std::string> Text(const Parameter& parameter, double value) override {
+        std::array<char, 256> text{};
+        if (!m_params->value_to_text(m_plugin, parameter.id, value, text.data(), text.size())) return {};
+        std::array<char, 4> little{'x', 'x', 'x', 'x'};
+        m_params->value_to_text(m_plugin, parameter.id, value, little.data(), 3);
+        Expect(little[3] == 'x' && std::memchr(little.data(), 0, 3), "writes past the end of a short text");
+        return text.data();
+    }
+    std::optional<double> Value(const Parameter& parameter, const std::string& text) override {
+        double value = 0;
+        if (!m_params->text_to_value(m_plugin, parameter.id, text.c_str(), &value)) return {};
+        return value;
+    }
+    double Get(const Parameter& parameter) override {
+        double value = NAN;
+        Expect(m_params->get_value(m_plugin, parameter.id, &value), "get_value fails for " + parameter.name);
+        return value;
+    }
+
+    std::optional<Bytes> Save(std::size_t most) override {
+        Stream stream{{}, most};
+        const clap_ostream_t out{&stream, Stream::Write};
+        if (!m_state->save(m_plugin, &out)) return {};
+        return stream.bytes;
+    }
+    bool Load(const Bytes& bytes, std::size_t most) override {
+        Stream stream{bytes, most};
+        const clap_istream_t in{&stream, Stream::Read};
+        return m_state->load(m_plugin, &in);
+    }
+
+    bool Activate(double rate, std::uint32_t maxFrames) override {
+        if (!m_plugin->activate(m_plugin, rate, 1, maxFrames)) return false;
+        OnAudioThread([&] { m_started = m_plugin->start_processing(m_plugin); });
+        m_active = true;
+        return m_started;
+    }
+    void Deactivate() override {
+        if (m_started) OnAudioThread([&] { m_plugin->stop_processing(m_plugin); });
+        if (m_active) m_plugin->deactivate(m_plugin);
+        m_started = m_active = false;
+        RunCallback();
+    }
+    std::uint32_t Latency() override { return m_latency ? m_latency->get(m_plugin) : 0; }
+
+    void Flush(std::span<const Change> changes) override {
+        m_events.Set(changes);
+        m_params->flush(m_plugin, &m_events.in, &m_events.out);
+    }
+    void FlushActive(std::span<const Change> changes) override { Flush(changes); }
+
+    bool Process(const Block& block) override {
+        m_events.Set(block.changes);
+        return Run(block) != CLAP_PROCESS_ERROR;
+    }
+    void Reset() override { m_plugin->reset(m_plugin); }
+
+    bool SetChannels(int channels) override {
+        return std::all_of(outputs.begin(), outputs.end(),
+                           [=](const Port& p) { return p.channels == channels; });
+    }
+
+    void CheckFormat() override {
+        clap_param_info_t info{};
+        const auto beyond = m_params->count(m_plugin);
+        double value = 0;
+        char text[32];
+        Expect(!m_params->get_info(m_plugin, beyond, &info), "describes a parameter that it does not have");
+        Expect(!m_params->get_value(m_plugin, 0x7fffffff, &value), "has a value for an unknown parameter");
+        Expect(!m_params->value_to_text(m_plugin, 0x7fffffff, 0, text, 32),
+               "has texts for an unknown parameter");
+        std::vector<Change> all;
+        for (const Parameter& p : parameters)
+            if (!p.readOnly) all.push_back({p.id, p.initial == p.minimum ? p.maximum : p.minimum, 0});
+        m_events.Set(all, 0xb33f);
+        m_params->flush(m_plugin, &m_events.in, &m_events.out);
+        for (const Parameter& p : parameters)
+            Expect(p.readOnly || std::abs(Get(p) - p.initial) <= 1e-6 * (p.maximum - p.minimum),
+                   p.name + " follows an event of another name space");
+        const Change unknown{0x7fffffff, 0.5, 0};
+        Flush({&unknown, 1});
+    }
+
+private:
+    template <typename Table>
+    const Table* Extension(const char* id) const {
+        return static_cast<const Table*>(m_plugin->get_extension(m_plugin, id));
+    }
+
+    void ReadParameters() {
+        for (std::uint32_t i = 0; i < m_params->count(m_plugin); ++i) {
+            clap_param_info_t info{};
+            Expect(m_params->get_info(m_plugin, i, &info), "get_info fails");
+            const auto has = [&](auto flag) { return (info.flags & static_cast<unsigned>(flag)) != 0; };
+            const double range = info.max_value - info.min_value;
+            parameters.push_back({info.id, info.name, info.min_value, info.max_value, info.default_value,
+                                  has(CLAP_PARAM_IS_STEPPED) ? static_cast<int>(range) : 0,
+                                  has(CLAP_PARAM_IS_READONLY), has(CLAP_PARAM_IS_AUTOMATABLE),
+                                  has(CLAP_PARAM_IS_BYPASS), has(CLAP_PARAM_IS_HIDDEN)});
+        }
+    }
+    void ReadPorts(bool input, std::vector<Port>& ports) {
+        const auto* audio = Extension<clap_plugin_audio_ports_t>(CLAP_EXT_AUDIO_PORTS);
+        if (!audio) throw std::runtime_error("has no audio ports");
+        std::set<clap_id> ids;
+        for (std::uint32_t i = 0; i < audio->count(m_plugin, input); ++i) {
+            clap_audio_port_info_t info{};
+            Expect(audio->get(m_plugin, i, input, &info), "describes a port that it does not have");
+            Expect(ids.insert(info.id).second, "two ports have one id");
+            const std::string type = info.port_type ? info.port_type : "";
+            Expect(type != CLAP_PORT_MONO || info.channel_count == 1, "a mono port has not one channel");
+            Expect(type != CLAP_PORT_STEREO || info.channel_count == 2, "a stereo port has not two channels");
+            Expect(i == 0 || !(info.flags & CLAP_AUDIO_PORT_IS_MAIN),
+                   "a port that is not the first is the main one");
+            ports.push_back({info.name, static_cast<int>(info.channel_count),
+                             (info.flags & CLAP_AUDIO_PORT_IS_MAIN) != 0});
+        }
+        clap_audio_port_info_t info{};
+        const auto count = static_cast<std::uint32_t>(ports.size());
+        Expect(!audio->get(m_plugin, count, input, &info), "describes one port more than it counts");
+    }
+
+    clap_process_status Run(const Block& block) {
+        std::array<clap_audio_buffer_t, 4> in{}, out{};
+        Divide(inputs, block.inputs, in);
+        Divide(outputs, block.outputs, out);
+        clap_event_transport_t transport{};
+        transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
+        transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
+        transport.tempo = 120;
+        const clap_process_t process{m_time,
+                                     block.frames,
+                                     &transport,
+                                     in.data(),
+                                     out.data(),
+                                     static_cast<std::uint32_t>(inputs.size()),
+                                     static_cast<std::uint32_t>(outputs.size()),
+                                     &m_events.in,
+                                     &m_events.out};
+        m_time += block.frames;
+        std::string broken;
+        clap_process_status status;
+        {
+            TestSupport::AudioThreadRules rules;
+            status = m_plugin->process(m_plugin, &process);
+            broken = rules.Broken();
+        }
+        ExpectRealTime(broken);
+        return status;
+    }
+    static void Divide(const std::vector<Port>& ports, std::span<float* const> channels,
+                       std::array<clap_audio_buffer_t, 4>& buffers) {
+        std::size_t channel = 0;
+        for (std::size_t i = 0; i < ports.size() && i < buffers.size(); ++i) {
+            buffers[i].data32 = const_cast<float**>(channels.data() + channel);
+            buffers[i].channel_count = static_cast<std::uint32_t>(ports[i].channels);
+            channel += buffers[i].channel_count;
+        }
+    }
+    void RunCallback() {
+        if (std::exchange(g_callbackWanted, false)) m_plugin->on_main_thread(m_plugin);
+    }
+
+    const clap_plugin_t* m_plugin;
+    const clap_plugin_params_t* m_params;
+    const clap_plugin_state_t* m_state;
+    const clap_plugin_latency_t* m_latency;
+    Events m_events;
+    std::int64_t m_time = 0;
+    bool m_active = false, m_started = false;
+};
+
+class ClapFile : public PluginFile {
+public:
+    explicit ClapFile(const std::filesystem::path& file) : m_module(file) {
+        m_entry = m_module.Find<const clap_plugin_entry_t>("clap_entry");
+        if (!m_entry || !clap_version_is_compatible(m_entry->clap_version))
+            throw std::runtime_error("has no entry of this version");
+        if (!m_entry->init(file.string().c_str())) throw std::runtime_error("its entry's init fails");
+        m_factory = static_cast<const clap_plugin_factory_t*>(m_entry->get_factory(CLAP_PLUGIN_FACTORY_ID));
+        if (!m_factory) throw std::runtime_error("has no plug-in factory");
+        Expect(!m_entry->get_factory("no.such.factory"), "has a factory that does not exist");
+        Expect(!m_factory->get_plugin_descriptor(m_factory, m_factory->get_plugin_count(m_factory)),
+               "describes one plug-in more than it has");
+        for (std::size_t i = 0; i < Count(); ++i) CheckDescriptor(*Descriptor(i));
+    }
+    ~ClapFile() override { m_entry->deinit(); }
+
+    std::size_t Count() const override { return m_factory->get_plugin_count(m_factory); }
+    std::string Name(std::size_t index) const override { return Descriptor(index)->name; }
+
+    std::unique_ptr<Instance> Create(std::size_t index) override {
+        const clap_plugin_descriptor_t* descriptor = Descriptor(index);
+        const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, descriptor->id);
+        if (!plugin) throw std::runtime_error("cannot be created");
+        Expect(std::strcmp(plugin->desc->id, descriptor->id) == 0, "its instance has another id");
+        return std::make_unique<ClapInstance>(plugin);
+    }
+
+private:
+    const clap_plugin_descriptor_t* Descriptor(std::size_t index) const {
+        return m_factory->get_plugin_descriptor(m_factory, static_cast<std::uint32_t>(index));
+    }
+    void CheckDescriptor(const clap_plugin_descriptor_t& d) const {
+        const std::pair<const char*, const char*> texts[]{{d.id, "id"},
+                                                          {d.name, "name"},
+                                                          {d.vendor, "vendor"},
+                                                          {d.version, "version"},
+                                                          {d.description, "description"}};
+        for (const auto& [text, name] : texts) Expect(text && *text, std::string("has no ") + name);
+        std::set<std::string> features;
+        for (const char** feature = d.features; feature && *feature; ++feature)
+            Expect(features.insert(*feature).second, std::string("names twice the feature ") + *feature);
+        Expect(features.count(CLAP_PLUGIN_FEATURE_AUDIO_EFFECT) == 1,
+               "does not say that it is an audio effect");
+        for (const std::string& id : {std::string(d.id) + "x", std::string("no.such.plugin")})
+            if (const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, id.c_str())) {
+                Finding("creates a plug-in of the unknown id " + id);
+                plugin->destroy(plugin);
+            }
+        // Never initialised.
+        const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, d.id);
+        if (plugin) plugin->destroy(plugin);
+    }
+
+    Module m_module;
+    const clap_plugin_entry_t* m_entry;
+    const clap_plugin_factory_t* m_factory;
+};
+
+}  // namespace
+
+std::unique_ptr<PluginFile> OpenClap(const std::filesystem::path& file) {
+    return std::make_unique<ClapFile>(file);
+}
+
+}  // namespace PluginHost

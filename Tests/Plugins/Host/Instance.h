@@ -1,0 +1,105 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <span>
+#include <string>
+#include <vector>
+
+// What the checks see of a plug-in, whatever its format.
+namespace PluginHost {
+
+using Bytes = std::vector<char>;
+
+struct Parameter {
+    std::uint32_t id;
+    std::string name;
+    double minimum, maximum, initial;
+    int steps;  // one less than it has values; 0 where it is continuous
+    bool readOnly, automatable, bypass, hidden;
+
+    double At(double part) const;  // the value at 0..1 of the range, a whole step where it has steps
+};
+
+struct Port {
+    std::string name;
+    int channels;
+    bool main;
+};
+
+struct Change {
+    std::uint32_t parameter;
+    double value;
+    std::uint32_t frame;
+};
+
+// Channels of all ports in their order. An output may be the memory of the input with its number.
+struct Block {
+    std::span<float*const> inputs, outputs;
+    std::uint32_t frames;
+    std::span<const Change> changes;
+};
+
+// Notes what is wrong with the plug-in at hand. Printed at once; what differs only in its digits, only once.
+void Finding(const std::string& text);
+inline void Expect(bool condition, const std::string& otherwise) {
+    if (!condition) Finding(otherwise);
+}
+
+// `broken` says what the audio thread did that it must not do; empty when nothing.
+void ExpectRealTime(const std::string& broken);
+
+enum class Thread { Main, Audio };
+Thread CurrentThread();
+// Runs the work on a thread of its own that counts as the audio thread, and waits for it.
+void OnAudioThread(const std::function<void()>& work);
+
+// One plug-in in the host. All calls belong to the main thread, but for Process, Reset and FlushActive.
+class Instance {
+public:
+    virtual ~Instance() = default;
+
+    std::vector<Parameter> parameters;
+    std::vector<Port> inputs, outputs;
+
+    virtual std::optional<std::string> Text(const Parameter&, double value) = 0;
+    virtual std::optional<double> Value(const Parameter&, const std::string& text) = 0;
+    virtual double Get(const Parameter&) = 0;
+
+    // The streams move at most so many bytes per call.
+    virtual std::optional<Bytes> Save(std::size_t most) = 0;
+    virtual bool Load(const Bytes&, std::size_t most) = 0;
+
+    virtual bool Activate(double rate, std::uint32_t maxFrames) = 0;
+    virtual void Deactivate() = 0;
+    virtual std::uint32_t Latency() = 0;
+
+    virtual void Flush(std::span<const Change>) = 0;        // while inactive
+    virtual void FlushActive(std::span<const Change>) = 0;  // without audio
+    virtual bool Process(const Block&) = 0;
+    virtual void Reset() = 0;
+
+    // One channel everywhere, or two; false when the plug-in has no such layout. While inactive.
+    virtual bool SetChannels(int channels) = 0;
+    // The plug-in's own rules for this format, such as what events it must leave alone.
+    virtual void CheckFormat() = 0;
+};
+
+// A file of a format. Loading it checks what it says of itself.
+class PluginFile {
+public:
+    virtual ~PluginFile() = default;
+    virtual std::size_t Count() const = 0;
+    virtual std::string Name(std::size_t index) const = 0;
+    virtual std::unique_ptr<Instance> Create(std::size_t index) = 0;
+};
+
+// Throw std::runtime_error where there is nothing to check.
+std::unique_ptr<PluginFile> OpenClap(const std::filesystem::path&);
+std::unique_ptr<PluginFile> OpenVst3(const std::filesystem::path&);
+
+}  // namespace PluginHost

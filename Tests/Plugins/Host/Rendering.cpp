@@ -1,0 +1,112 @@
+#include <algorithm>
+#include <atomic>
+#include <cmath>
+#include <thread>
+
+#include "Checks.h"
+
+namespace PluginHost {
+namespace {
+thread_local Thread t_thread = Thread::Main;
+}
+
+Thread CurrentThread() { return t_thread; }
+
+void OnAudioThread(const std::function<void()>& work) {
+    if (t_thread == Thread::Audio) return work();
+    std::thread([&] {
+        t_thread = Thread::Audio;
+        work();
+    }).join();
+}
+
+double Parameter::At(double part) const {
+    const double place = steps > 0 ? std::round(part * steps) / steps : part;
+    return minimum + place * (maximum - minimum);
+}
+
+int Channels(const std::vector<Port>& ports) {
+    int channels = 0;
+    for (const Port& port : ports) channels += port.channels;
+    return channels;
+}
+
+Signal Noise(int channels, std::size_t frames, float level, unsigned seed) {
+    std::mt19937 random(seed);
+    Signal signal(static_cast<std::size_t>(channels), std::vector<float>(frames));
+    for (auto& channel : signal)
+        for (float& sample : channel) sample = level * (static_cast<float>(random()) / 2147483648.0f - 1.0f);
+    return signal;
+}
+
+Signal Render(Instance& plugin, const Signal& input, const Way& way) {
+    const std::size_t frames = input.at(0).size();
+    Signal in = input;
+    Signal out(static_cast<std::size_t>(Channels(plugin.outputs)), std::vector<float>(frames, 99.0f));
+    std::vector<float*> ins(in.size()), outs(out.size());
+    std::vector<Change> changes;
+    std::mt19937 random(7);
+    std::size_t next = 0;
+    bool failed = false;
+    OnAudioThread([&] {
+        for (std::size_t at = 0; at < frames;) {
+            const std::uint32_t wanted =
+                way.mixed ? static_cast<std::uint32_t>(random() % (way.block + 1)) : way.block;
+            const std::size_t count = std::min<std::size_t>(wanted, frames - at);
+            for (std::size_t c = 0; c < ins.size(); ++c) ins[c] = in[c].data() + at;
+            for (std::size_t c = 0; c < outs.size(); ++c)
+                outs[c] = way.inPlace && c < ins.size() ? ins[c] : out[c].data() + at;
+            changes.clear();
+            for (; next < way.changes.size() && way.changes[next].frame < at + count; ++next) {
+                changes.push_back(way.changes[next]);
+                changes.back().frame -=
+                    static_cast<std::uint32_t>(std::min<std::size_t>(at, changes.back().frame));
+            }
+            failed |= !plugin.Process({ins, outs, static_cast<std::uint32_t>(count), changes});
+            at += count;
+        }
+    });
+    Expect(!failed, "process fails");
+    if (way.inPlace) std::copy_n(in.begin(), std::min(in.size(), out.size()), out.begin());
+    return out;
+}
+
+Signal RenderAt(Instance& plugin, double rate, const Signal& input, const Way& way) {
+    Expect(plugin.Activate(rate, way.block), "cannot be activated at " + std::to_string(rate) + " Hz");
+    Signal output = Render(plugin, input, way);
+    plugin.Deactivate();
+    return output;
+}
+
+bool IsFinite(const Signal& signal) {
+    for (const auto& channel : signal)
+        if (!std::all_of(channel.begin(), channel.end(), [](float sample) { return std::isfinite(sample); }))
+            return false;
+    return true;
+}
+
+bool FiniteWhile(Instance& plugin, const std::function<void()>& work) {
+    const Signal input = Noise(Channels(plugin.inputs), 256);
+    std::atomic<bool> working = true, finite = true;
+    std::thread audio([&] {
+        t_thread = Thread::Audio;
+        while (working)
+            if (!IsFinite(Render(plugin, input))) finite = false;
+    });
+    work();
+    working = false;
+    audio.join();
+    return finite;
+}
+
+double LargestDifference(const Signal& a, const Signal& b) {
+    double largest = 0;
+    for (std::size_t c = 0; c < a.size(); ++c)
+        for (std::size_t i = 0; i < a[c].size(); ++i) {
+            const double difference = std::abs(static_cast<double>(a[c][i]) - b[c][i]);
+            if (!(difference <= largest)) largest = difference;
+        }
+    return largest;
+}
+
+}  // namespace PluginHost

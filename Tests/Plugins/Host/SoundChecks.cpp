@@ -1,0 +1,147 @@
+// Sound: whatever a host sends in, however it divides it.
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+#include "Checks.h"
+
+namespace PluginHost {
+namespace {
+
+bool HasSubnormals(const Signal& signal) {
+    for (const auto& channel : signal)
+        for (const float sample : channel)
+            if (std::fpclassify(sample) == FP_SUBNORMAL) return true;
+    return false;
+}
+
+double Energy(const Signal& signal, std::size_t from) {
+    double energy = 0;
+    for (const auto& channel : signal)
+        for (std::size_t i = from; i < channel.size(); ++i)
+            energy += static_cast<double>(channel[i]) * channel[i];
+    return energy;
+}
+
+void CheckRatesAndBlocks(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    const int channels = Channels(plugin->inputs);
+    for (const double rate : {22050.0, 32000.0, 44100.0, 48000.0, 88200.0, 96000.0, 192000.0, 44099.5})
+        for (const std::uint32_t block : {1u, 2u, 17u, 64u, 480u, 1023u, 4096u}) {
+            const Signal input = Noise(channels, block < 64 ? 256 : 4096);
+            Expect(IsFinite(RenderAt(*plugin, rate, input, {.block = block})),
+                   "is not finite at " + std::to_string(rate) + " Hz in blocks of " + std::to_string(block));
+        }
+    Expect(IsFinite(RenderAt(*plugin, 48000, Noise(channels, 48000), {.block = 1024, .mixed = true})),
+           "is not finite in blocks of changing length");
+}
+
+void CheckRepeats(PluginFile& file, std::size_t index) {
+    const auto fresh = file.Create(index), plugin = file.Create(index), inPlace = file.Create(index);
+    const Signal input = Noise(Channels(fresh->inputs), 24000);
+    const Signal expected = RenderAt(*fresh, 48000, input);
+    const auto expect = [&](const Signal& output, const std::string& text) {
+        const double difference = LargestDifference(expected, output);
+        Expect(difference < 1e-5, text + " (by " + std::to_string(difference) + ")");
+    };
+    // Only the main ports share memory, and only when they are alike.
+    if (plugin->inputs.front().channels == plugin->outputs.front().channels)
+        expect(RenderAt(*inPlace, 48000, input, {.inPlace = true}), "sounds otherwise in place");
+    plugin->Activate(48000, 256);
+    Render(*plugin, Noise(Channels(plugin->inputs), 30000, 0.9f, 3));
+    OnAudioThread([&] { plugin->Reset(); });
+    expect(Render(*plugin, input), "sounds otherwise after a reset");
+    plugin->Deactivate();
+    expect(RenderAt(*plugin, 48000, input), "sounds otherwise after it was activated anew");
+}
+
+void CheckBadSamples(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    Signal input = Noise(Channels(plugin->inputs), 24000);
+    std::size_t at = 6000;
+    constexpr float kInfinity = std::numeric_limits<float>::infinity();
+    for (const float bad : {std::numeric_limits<float>::quiet_NaN(), kInfinity, -kInfinity, 1e-42f})
+        for (auto& channel : input) channel[at++] = bad;
+    const Signal output = RenderAt(*plugin, 48000, input);
+    Expect(IsFinite(output), "is not finite when its input is not");
+    const auto fresh = file.Create(index);
+    const double now = Energy(output, 18000),
+                 usual = Energy(RenderAt(*fresh, 48000, Noise(Channels(fresh->inputs), 24000)), 18000);
+    Expect(now > 0.25 * usual && now < 4 * usual,
+           "does not sound as before a quarter of a second after bad samples");
+}
+
+void CheckSilence(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    Signal input = Noise(Channels(plugin->inputs), 3 * 48000);
+    for (auto& channel : input) std::fill(channel.begin() + 4800, channel.end(), 0.0f);
+    const Signal output = RenderAt(*plugin, 48000, input, {.block = 512});
+    Expect(IsFinite(output) && !HasSubnormals(output), "sends denormal numbers while it fades to silence");
+}
+
+void CheckExtremes(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    std::mt19937 random(11);
+    const Signal input = Noise(Channels(plugin->inputs), 2400, 0.9f);
+    plugin->Activate(48000, 256);
+    const auto expect = [&](const std::vector<Change>& changes, const std::string& when) {
+        Expect(IsFinite(Render(*plugin, input, {.changes = changes})), "is not finite " + when);
+    };
+    expect(ForAll(*plugin, [] { return 0.0; }), "with every parameter at its minimum");
+    expect(ForAll(*plugin, [] { return 1.0; }), "with every parameter at its maximum");
+    for (const Parameter& p : plugin->parameters) {
+        if (p.readOnly || p.hidden) continue;
+        expect({{p.id, p.minimum, 0}, {p.id, p.maximum, 1200}}, "with extreme values of " + p.name);
+        expect({{p.id, p.initial, 0}}, "with the default of " + p.name);
+    }
+    for (int round = 0; round < 50; ++round) {
+        std::vector<Change> changes;
+        for (std::uint32_t frame = 0; frame < 2400; frame += 300) {
+            const auto more = ForAll(
+                *plugin, [&] { return static_cast<double>(random()) / 4294967295.0; }, frame);
+            changes.insert(changes.end(), more.begin(), more.end());
+        }
+        expect(changes, "under random changes, round " + std::to_string(round));
+    }
+    plugin->Deactivate();
+}
+
+void CheckLayouts(PluginFile& file, std::size_t index) {
+    int layouts = 0;
+    for (const int channels : {1, 2}) {
+        const auto plugin = file.Create(index);
+        if (!plugin->SetChannels(channels)) continue;
+        ++layouts;
+        const Signal output = RenderAt(*plugin, 48000, Noise(Channels(plugin->inputs), 4800));
+        Expect(static_cast<int>(output.size()) >= channels && IsFinite(output), "its layouts do not sound");
+    }
+    Expect(layouts > 0, "is neither mono nor stereo");
+}
+
+// A side-chain that is there has to be heard at some setting.
+void CheckSideChain(PluginFile& file, std::size_t index) {
+    const auto with = file.Create(index), without = file.Create(index);
+    if (with->inputs.size() < 2) return;
+    const auto main = static_cast<std::ptrdiff_t>(with->inputs.front().channels);
+    Signal loud = Noise(Channels(with->inputs), 9600, 0.9f), silent = loud;
+    for (auto channel = silent.begin() + main; channel != silent.end(); ++channel)
+        std::fill(channel->begin(), channel->end(), 0.0f);
+    std::mt19937 random(2);
+    double difference = 0;
+    for (int round = 0; round < 20 && difference < 1e-4; ++round) {
+        const auto changes = ForAll(*with, [&] { return static_cast<double>(random()) / 4294967295.0; });
+        difference = LargestDifference(RenderAt(*with, 48000, loud, {.changes = changes}),
+                                       RenderAt(*without, 48000, silent, {.changes = changes}));
+    }
+    Expect(difference >= 1e-4, "does not hear its side-chain");
+}
+
+}  // namespace
+
+void CheckSound(PluginFile& file, std::size_t index) {
+    for (const auto check : {CheckRatesAndBlocks, CheckRepeats, CheckBadSamples, CheckSilence, CheckExtremes,
+                             CheckLayouts, CheckSideChain})
+        check(file, index);
+}
+
+}  // namespace PluginHost

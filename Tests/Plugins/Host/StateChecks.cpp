@@ -1,0 +1,113 @@
+// States: what a session keeps must come back, and what is no state must do no harm.
+#include <algorithm>
+#include <cmath>
+
+#include "Checks.h"
+
+namespace PluginHost {
+namespace {
+
+constexpr std::size_t kAll = 1 << 30;
+
+void ExpectSameValues(Instance& plugin, Instance& other, const std::string& when) {
+    int differing = 0;
+    std::string first;
+    for (std::size_t i = 0; i < plugin.parameters.size(); ++i) {
+        const Parameter& p = plugin.parameters[i];
+        if (p.readOnly || p.hidden) continue;
+        const double ours = plugin.Get(p), theirs = other.Get(other.parameters[i]);
+        if (std::abs(ours - theirs) <= 1e-6 * (p.maximum - p.minimum)) continue;
+        if (++differing == 1)
+            first =
+                p.name + " is " + std::to_string(theirs) + " and not " + std::to_string(ours) + " " + when;
+    }
+    if (differing) Finding(first + " (" + std::to_string(differing) + " parameters differ)");
+}
+
+void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
+    std::mt19937 random(seed);
+    const auto plugin = file.Create(index), restored = file.Create(index), slow = file.Create(index);
+    std::vector<Change> changes =
+        ForAll(*plugin, [&] { return static_cast<double>(random()) / 4294967295.0; });
+    for (const Parameter& p : plugin->parameters)
+        if (p.bypass && seed % 3 == 0) changes.push_back({p.id, p.maximum, 0});
+    plugin->Flush(changes);
+    const auto state = plugin->Save(kAll), inPieces = plugin->Save(17);
+    if (!state || !inPieces) return Finding("its state cannot be saved");
+    Expect(*state == *inPieces, "its state differs when the stream takes 17 bytes at a time");
+    Expect(restored->Load(*state, kAll), "refuses its own state");
+    ExpectSameValues(*plugin, *restored, "after the state came back");
+    Expect(restored->Save(kAll) == state, "saves other bytes than it was given");
+    Expect(slow->Load(*state, 23), "refuses its own state that comes 23 bytes at a time");
+    ExpectSameValues(*plugin, *slow, "after the state came 23 bytes at a time");
+
+    // The same values with a block, and while it runs without audio.
+    const auto active = file.Create(index);
+    active->Activate(48000, 64);
+    const Signal input = Noise(Channels(active->inputs), 64);
+    if (seed % 2)
+        Render(*active, input, {.block = 64, .changes = changes});
+    else
+        OnAudioThread([&] { active->FlushActive(changes); });
+    active->Deactivate();
+    ExpectSameValues(*plugin, *active, seed % 2 ? "set with a block" : "set without audio");
+    Expect(active->Save(kAll) == state, "saves another state where its values came otherwise");
+
+    const Signal noise = Noise(Channels(plugin->inputs), 12000);
+    const double difference =
+        LargestDifference(RenderAt(*plugin, 48000, noise), RenderAt(*restored, 48000, noise));
+    Expect(difference < 1e-5,
+           "sounds otherwise (by " + std::to_string(difference) + ") after its state came back");
+}
+
+void CheckHarm(PluginFile& file, std::size_t index) {
+    const auto fresh = file.Create(index), plugin = file.Create(index);
+    const auto state = fresh->Save(kAll);
+    if (!state || state->empty()) return Finding("has no state to save");
+    Expect(!plugin->Load({}, kAll), "takes an empty stream for a state");
+    ExpectSameValues(*fresh, *plugin, "after an empty state");
+    std::mt19937 random(5);
+    for (int i = 0; i < 40; ++i) {
+        Bytes broken = *state;
+        if (i % 2) broken.resize(random() % state->size());
+        for (int hits = i; hits > 0 && !broken.empty(); --hits)
+            broken[random() % broken.size()] = static_cast<char>(random());
+        plugin->Load(broken, kAll);
+        Expect(IsFinite(RenderAt(*plugin, 48000, Noise(Channels(plugin->inputs), 256))),
+               "does not sound finite after a broken state");
+        for (const Parameter& p : plugin->parameters) {
+            const double value = plugin->Get(p);
+            Expect(value >= p.minimum && value <= p.maximum,
+                   p.name + " leaves its range after a broken state");
+        }
+    }
+    Expect(plugin->Load(*state, kAll), "refuses its own state after broken ones");
+    ExpectSameValues(*fresh, *plugin, "after broken states and its own");
+}
+
+// What a host may ask for on its main thread while audio runs.
+void CheckBesideAudio(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    const auto state = plugin->Save(kAll);
+    if (!state) return;
+    plugin->Activate(48000, 256);
+    const bool finite = FiniteWhile(*plugin, [&] {
+        for (int i = 0; i < 40; ++i) {
+            plugin->Save(kAll);
+            plugin->Load(*state, kAll);
+            for (const Parameter& p : plugin->parameters) plugin->Text(p, plugin->Get(p));
+        }
+    });
+    plugin->Deactivate();
+    Expect(finite, "is not finite while the main thread saves and loads its state");
+}
+
+}  // namespace
+
+void CheckState(PluginFile& file, std::size_t index) {
+    for (unsigned seed = 1; seed <= 6; ++seed) CheckRestoring(file, index, seed);
+    CheckHarm(file, index);
+    CheckBesideAudio(file, index);
+}
+
+}  // namespace PluginHost

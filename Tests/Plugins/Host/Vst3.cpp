@@ -1,0 +1,528 @@
+// VST3 over the C description of its interfaces.
+#include <travesty/audio_processor.h>
+#include <travesty/component.h>
+#include <travesty/edit_controller.h>
+#include <travesty/factory.h>
+#include <travesty/host.h>
+#include <travesty/message.h>
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+#include <cstring>
+#include <stdexcept>
+
+#include "Checks.h"
+#include "Module.h"
+#include "Support/AudioThreadRules.h"
+
+namespace PluginHost {
+namespace {
+
+std::string Narrow(const std::int16_t* text) {
+    std::string narrow;
+    for (; *text; ++text) {  // the basic plane is all that plug-ins use
+        const unsigned c = static_cast<std::uint16_t>(*text);
+        const auto add = [&](unsigned byte) { narrow += static_cast<char>(byte); };
+        if (c < 0x80) {
+            add(c);
+        } else if (c < 0x800) {
+            add(0xc0 | c >> 6), add(0x80 | (c & 0x3f));
+        } else {
+            add(0xe0 | c >> 12), add(0x80 | (c >> 6 & 0x3f)), add(0x80 | (c & 0x3f));
+        }
+    }
+    return narrow;
+}
+
+// What the host hands to plug-ins: a table of functions behind a pointer. They live as long as the host, so
+// nobody counts who holds them.
+template <const v3_tuid& kId>
+v3_result V3_API Query(void* self, const v3_tuid iid, void** object) {
+    const bool known = v3_tuid_match(iid, kId) || v3_tuid_match(iid, v3_funknown_iid);
+    *object = known ? self : nullptr;
+    return known ? V3_OK : V3_NO_INTERFACE;
+}
+template <typename Functions, const v3_tuid& kId>
+struct Table : v3_funknown {
+    Functions functions;
+    explicit Table(const Functions& f)
+        : v3_funknown{Query<kId>, [](void*) { return 1u; }, [](void*) { return 1u; }}, functions(f) {}
+};
+
+using ApplicationTable = Table<v3_host_application, v3_host_application_iid>;
+ApplicationTable g_application({[](void*, v3_str_128 name) -> v3_result {
+                                    name[0] = 'h';
+                                    name[1] = 0;
+                                    return V3_OK;
+                                },
+                                [](void*, v3_tuid, v3_tuid, void**) -> v3_result {
+                                    return V3_NOT_IMPLEMENTED;
+                                }});
+ApplicationTable* g_applicationObject = &g_application;
+
+void ExpectMainThread(const char* call) {
+    Expect(CurrentThread() == Thread::Main,
+           std::string("calls the host's ") + call + " from the wrong thread");
+}
+using HandlerTable = Table<v3_component_handler, v3_component_handler_iid>;
+HandlerTable g_handler(
+    {[](void*, v3_param_id) -> v3_result { return ExpectMainThread("begin_edit"), V3_OK; },
+     [](void*, v3_param_id, double) -> v3_result { return ExpectMainThread("perform_edit"), V3_OK; },
+     [](void*, v3_param_id) -> v3_result { return ExpectMainThread("end_edit"), V3_OK; },
+     [](void*, std::int32_t) -> v3_result { return ExpectMainThread("restart_component"), V3_OK; }});
+HandlerTable* g_handlerObject = &g_handler;
+
+using StreamTable = Table<v3_bstream, v3_bstream_iid>;
+struct Stream {
+    StreamTable* table;
+    Bytes bytes;
+    std::size_t most, position = 0;
+
+    static Stream& Of(void* self) { return *static_cast<Stream*>(self); }
+    static v3_result V3_API Read(void* self, void* buffer, std::int32_t size, std::int32_t* done) {
+        Stream& s = Of(self);
+        const std::size_t count =
+            std::min({static_cast<std::size_t>(std::max(size, 0)), s.most, s.bytes.size() - s.position});
+        if (count) std::memcpy(buffer, s.bytes.data() + s.position, count);
+        s.position += count;
+        if (done) *done = static_cast<std::int32_t>(count);
+        return V3_OK;
+    }
+    static v3_result V3_API Write(void* self, void* buffer, std::int32_t size, std::int32_t* done) {
+        Stream& s = Of(self);
+        const std::size_t count = std::min(static_cast<std::size_t>(std::max(size, 0)), s.most);
+        const char* bytes = static_cast<const char*>(buffer);
+        s.bytes.resize(std::max(s.bytes.size(), s.position + count));
+        std::copy_n(bytes, count, s.bytes.begin() + static_cast<std::ptrdiff_t>(s.position));
+        s.position += count;
+        if (done) *done = static_cast<std::int32_t>(count);
+        return V3_OK;
+    }
+    static v3_result V3_API Seek(void* self, std::int64_t to, std::int32_t mode, std::int64_t* result) {
+        Stream& s = Of(self);
+        const std::int64_t size = static_cast<std::int64_t>(s.bytes.size());
+        const std::int64_t from = mode == V3_SEEK_SET   ? 0
+                                  : mode == V3_SEEK_CUR ? static_cast<std::int64_t>(s.position)
+                                                        : size;
+        s.position = static_cast<std::size_t>(std::clamp<std::int64_t>(from + to, 0, size));
+        if (result) *result = static_cast<std::int64_t>(s.position);
+        return V3_OK;
+    }
+    static v3_result V3_API Tell(void* self, std::int64_t* position) {
+        *position = static_cast<std::int64_t>(Of(self).position);
+        return V3_OK;
+    }
+};
+StreamTable g_stream({Stream::Read, Stream::Write, Stream::Seek, Stream::Tell});
+
+// The changes of one block: a queue per parameter, all made beforehand.
+using QueueTable = Table<v3_param_value_queue, v3_param_value_queue_iid>;
+struct Queue {
+    QueueTable* table;
+    v3_param_id id = 0;
+    std::vector<Change> points;
+
+    static Queue& Of(void* self) { return *static_cast<Queue*>(self); }
+};
+QueueTable g_queue({[](void* self) { return Queue::Of(self).id; },
+                    [](void* self) { return static_cast<std::int32_t>(Queue::Of(self).points.size()); },
+                    [](void* self, std::int32_t index, std::int32_t* frame, double* value) -> v3_result {
+                        const auto& points = Queue::Of(self).points;
+                        if (index < 0 || static_cast<std::size_t>(index) >= points.size())
+                            return V3_INVALID_ARG;
+                        *frame = static_cast<std::int32_t>(points[static_cast<std::size_t>(index)].frame);
+                        *value = points[static_cast<std::size_t>(index)].value;
+                        return V3_OK;
+                    },
+                    [](void*, std::int32_t, double value, std::int32_t* index) -> v3_result {
+                        Expect(value >= 0 && value <= 1, "sends a value outside of 0..1");
+                        if (index) *index = 0;
+                        return V3_OK;
+                    }});
+using ChangesTable = Table<v3_param_changes, v3_param_changes_iid>;
+struct Changes {
+    ChangesTable* table;
+    std::vector<Queue> queues;
+    std::size_t used = 0;
+
+    static Changes& Of(void* self) { return *static_cast<Changes*>(self); }
+    void Set(std::span<const Change> changes) {
+        for (std::size_t i = 0; i < used; ++i) queues[i].points.clear();
+        used = 0;
+        for (const Change& change : changes) {
+            std::size_t i = 0;
+            while (i < used && queues[i].id != change.parameter) ++i;
+            if (i == queues.size()) continue;
+            used = std::max(used, i + 1);
+            queues[i].id = change.parameter;
+            if (queues[i].points.size() < queues[i].points.capacity()) queues[i].points.push_back(change);
+        }
+    }
+};
+v3_param_value_queue** QueueAt(void* self, std::int32_t index) {
+    auto& queues = Changes::Of(self).queues;
+    return reinterpret_cast<v3_param_value_queue**>(&queues[static_cast<std::size_t>(index)]);
+}
+ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Changes::Of(self).used); }, QueueAt,
+                        [](void* self, v3_param_id*, std::int32_t* index) {
+                            if (index) *index = 0;
+                            return QueueAt(self, 0);
+                        }});
+
+// A plug-in's interface, counted.
+template <typename Interface>
+class Held {
+public:
+    Held() = default;
+    Held(const Held&) = delete;
+    ~Held() { Release(); }
+
+    void** Slot() { return reinterpret_cast<void**>(&m_object); }
+    Interface** Get() const { return m_object; }
+    Interface* operator->() const { return v3_cpp_obj(m_object); }
+    explicit operator bool() const { return m_object != nullptr; }
+    void Release() {
+        if (m_object) v3_cpp_obj_unref(m_object);
+        m_object = nullptr;
+    }
+
+private:
+    Interface** m_object = nullptr;
+};
+
+constexpr std::size_t kQueues = 512, kPoints = 64;
+
+class Vst3Instance : public Instance {
+public:
+    Vst3Instance(v3_plugin_factory** factory, const v3_tuid id) {
+        if (v3_cpp_obj(factory)->create_instance(factory, id, v3_component_iid, m_component.Slot()) != V3_OK)
+            throw std::runtime_error("cannot be created");
+        const auto context = reinterpret_cast<v3_funknown**>(&g_applicationObject);
+        if (v3_cpp_obj_initialize(m_component.Get(), context) != V3_OK)
+            throw std::runtime_error("initialize fails");
+        v3_cpp_obj_query_interface(m_component.Get(), v3_audio_processor_iid,
+                                   reinterpret_cast<v3_audio_processor***>(m_processor.Slot()));
+        if (!m_processor) throw std::runtime_error("has no audio processor");
+        FindController(factory, context);
+        m_controller->set_component_handler(m_controller.Get(),
+                                            reinterpret_cast<v3_component_handler**>(&g_handlerObject));
+        for (Changes* changes : {&m_in, &m_out}) {
+            changes->queues.resize(kQueues, Queue{&g_queue, 0, {}});
+            for (Queue& queue : changes->queues) queue.points.reserve(kPoints);
+        }
+        ReadParameters();
+        ReadPorts();
+    }
+    ~Vst3Instance() override {
+        if (m_controllerIsOther) {
+            Connect(false);
+            v3_cpp_obj_terminate(m_controller.Get());
+        }
+        m_controller.Release();
+        m_processor.Release();
+        v3_cpp_obj_terminate(m_component.Get());
+    }
+
+    std::optional<std::string> Text(const Parameter& parameter, double value) override {
+        v3_str_128 text{};
+        if (m_controller->get_parameter_string_for_value(m_controller.Get(), parameter.id, value, text) !=
+            V3_OK)
+            return {};
+        m_lastText.assign(text, text + 128);
+        return Narrow(text);
+    }
+    // Takes the text that Text gave last.
+    std::optional<double> Value(const Parameter& parameter, const std::string&) override {
+        double value = 0;
+        if (m_controller->get_parameter_value_for_string(m_controller.Get(), parameter.id, m_lastText.data(),
+                                                         &value) != V3_OK)
+            return {};
+        return value;
+    }
+    double Get(const Parameter& parameter) override {
+        return m_controller->get_parameter_normalised(m_controller.Get(), parameter.id);
+    }
+
+    std::optional<Bytes> Save(std::size_t most) override {
+        Stream stream{&g_stream, {}, most};
+        if (m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&stream)) != V3_OK)
+            return {};
+        return stream.bytes;
+    }
+    bool Load(const Bytes& bytes, std::size_t most) override {
+        Stream stream{&g_stream, bytes, most};
+        const auto state = reinterpret_cast<v3_bstream**>(&stream);
+        if (m_component->set_state(m_component.Get(), state) != V3_OK) return false;
+        stream.position = 0;
+        return !m_controllerIsOther || m_controller->set_component_state(m_controller.Get(), state) == V3_OK;
+    }
+
+    bool Activate(double rate, std::uint32_t maxFrames) override {
+        v3_process_setup setup{V3_REALTIME, V3_SAMPLE_32, static_cast<std::int32_t>(maxFrames), rate};
+        m_rate = rate;
+        if (m_processor->setup_processing(m_processor.Get(), &setup) != V3_OK) return false;
+        if (m_component->set_active(m_component.Get(), true) != V3_OK) return false;
+        OnAudioThread([&] { m_processor->set_processing(m_processor.Get(), true); });
+        return true;
+    }
+    void Deactivate() override {
+        OnAudioThread([&] { m_processor->set_processing(m_processor.Get(), false); });
+        m_component->set_active(m_component.Get(), false);
+    }
+    std::uint32_t Latency() override { return m_processor->get_latency_samples(m_processor.Get()); }
+
+    // A host sends a change to both halves; the processor gets it with a block.
+    void Flush(std::span<const Change> changes) override {
+        for (const Change& change : changes)
+            m_controller->set_parameter_normalised(m_controller.Get(), change.parameter, change.value);
+        RenderAt(*this, 48000, Signal(static_cast<std::size_t>(Channels(inputs)), std::vector<float>(64)),
+                 {.block = 64, .changes = changes});
+    }
+    void FlushActive(std::span<const Change> changes) override { Process({{}, {}, 0, changes}); }
+
+    bool Process(const Block& block) override {
+        m_in.Set(block.changes);
+        std::array<v3_audio_bus_buffers, 4> in{}, out{};
+        const bool audio = !block.outputs.empty();
+        Divide(inputs, block.inputs, in);
+        Divide(outputs, block.outputs, out);
+        v3_process_context context{};
+        context.state = V3_PROCESS_CTX_PLAYING | V3_PROCESS_CTX_TEMPO_VALID;
+        context.sample_rate = m_rate;
+        context.bpm = 120;
+        v3_process_data data{};
+        data.nframes = static_cast<std::int32_t>(block.frames);
+        data.num_input_buses = audio ? static_cast<std::int32_t>(inputs.size()) : 0;
+        data.num_output_buses = audio ? static_cast<std::int32_t>(outputs.size()) : 0;
+        data.inputs = audio && !inputs.empty() ? in.data() : nullptr;
+        data.outputs = audio ? out.data() : nullptr;
+        data.input_params = reinterpret_cast<v3_param_changes**>(&m_in);
+        data.output_params = reinterpret_cast<v3_param_changes**>(&m_out);
+        data.ctx = &context;
+        std::string broken;
+        v3_result result;
+        {
+            TestSupport::AudioThreadRules rules;
+            result = m_processor->process(m_processor.Get(), &data);
+            broken = rules.Broken();
+        }
+        ExpectRealTime(broken);
+        return result == V3_OK;
+    }
+    void Reset() override {
+        m_processor->set_processing(m_processor.Get(), false);
+        m_processor->set_processing(m_processor.Get(), true);
+    }
+
+    bool SetChannels(int channels) override {
+        const v3_speaker_arrangement one = channels == 1 ? V3_SPEAKER_M : V3_SPEAKER_L | V3_SPEAKER_R;
+        std::vector<v3_speaker_arrangement> in(inputs.size(), one), out(outputs.size(), one);
+        if (m_processor->set_bus_arrangements(m_processor.Get(), in.data(),
+                                              static_cast<std::int32_t>(in.size()), out.data(),
+                                              static_cast<std::int32_t>(out.size())) != V3_OK)
+            return false;
+        v3_speaker_arrangement now = 0;
+        m_processor->get_bus_arrangement(m_processor.Get(), V3_OUTPUT, 0, &now);
+        Expect(now == one, "accepts a layout that it does not have afterwards");
+        ReadPorts();
+        return true;
+    }
+
+    void CheckFormat() override {
+        v3_param_info info{};
+        const auto count = m_controller->get_parameter_count(m_controller.Get());
+        Expect(m_controller->get_parameter_info(m_controller.Get(), count, &info) != V3_OK,
+               "describes a parameter that it does not have");
+        v3_str_128 text{};
+        Expect(m_controller->get_parameter_string_for_value(m_controller.Get(), 0x7fffffff, 0, text) != V3_OK,
+               "has texts for an unknown parameter");
+        v3_speaker_arrangement odd = V3_SPEAKER_LFE;
+        Expect(m_processor->set_bus_arrangements(m_processor.Get(), &odd, 1, &odd, 1) != V3_OK ||
+                   outputs.size() != 1,
+               "accepts a layout of one bass channel");
+        Expect(m_processor->can_process_sample_size(m_processor.Get(), V3_SAMPLE_32) == V3_OK,
+               "cannot process 32-bit samples");
+        for (const Parameter& p : parameters)
+            for (const double value : {0.0, 0.25, p.initial, 1.0}) {
+                const double plain =
+                    m_controller->normalised_parameter_to_plain(m_controller.Get(), p.id, value);
+                const double back =
+                    m_controller->plain_parameter_to_normalised(m_controller.Get(), p.id, plain);
+                Expect(p.steps || p.hidden || std::abs(back - value) < 1e-4,
+                       p.name + ": " + std::to_string(value) + " is " + std::to_string(back) +
+                           " after the way through plain values");
+            }
+        const Change unknown{0x7fffffff, 0.5, 0};
+        Flush({&unknown, 1});
+    }
+
+private:
+    void FindController(v3_plugin_factory** factory, v3_funknown** context) {
+        const auto slot = reinterpret_cast<v3_edit_controller***>(m_controller.Slot());
+        if (v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid, slot) == V3_OK) {
+            return;
+        }
+        v3_tuid id{};
+        m_component->get_controller_class_id(m_component.Get(), id);
+        if (v3_cpp_obj(factory)->create_instance(factory, id, v3_edit_controller_iid, m_controller.Slot()) !=
+            V3_OK)
+            throw std::runtime_error("has no controller");
+        v3_cpp_obj_initialize(m_controller.Get(), context);
+        m_controllerIsOther = true;
+        Connect(true);
+    }
+    // The two halves may talk to each other.
+    void Connect(bool on) {
+        Held<v3_connection_point> ours, theirs;
+        v3_cpp_obj_query_interface(m_component.Get(), v3_connection_point_iid,
+                                   reinterpret_cast<v3_connection_point***>(ours.Slot()));
+        v3_cpp_obj_query_interface(m_controller.Get(), v3_connection_point_iid,
+                                   reinterpret_cast<v3_connection_point***>(theirs.Slot()));
+        if (!ours || !theirs) return;
+        const auto join = [on](auto& a, auto& b) {
+            on ? a->connect(a.Get(), b.Get()) : a->disconnect(a.Get(), b.Get());
+        };
+        join(ours, theirs);
+        join(theirs, ours);
+    }
+
+    void ReadParameters() {
+        for (std::int32_t i = 0; i < m_controller->get_parameter_count(m_controller.Get()); ++i) {
+            v3_param_info info{};
+            Expect(m_controller->get_parameter_info(m_controller.Get(), i, &info) == V3_OK,
+                   "get_parameter_info fails");
+            const auto has = [&](int flag) { return (info.flags & flag) != 0; };
+            parameters.push_back({info.param_id, Narrow(info.title), 0, 1, info.default_normalised_value,
+                                  info.step_count, has(V3_PARAM_READ_ONLY), has(V3_PARAM_CAN_AUTOMATE),
+                                  has(V3_PARAM_IS_BYPASS), has(V3_PARAM_IS_HIDDEN)});
+        }
+    }
+    void ReadPorts() {
+        for (const bool input : {true, false}) {
+            std::vector<Port>& ports = input ? inputs : outputs;
+            ports.clear();
+            const std::int32_t direction = input ? V3_INPUT : V3_OUTPUT;
+            const std::int32_t count = m_component->get_bus_count(m_component.Get(), V3_AUDIO, direction);
+            v3_bus_info info{};
+            for (std::int32_t i = 0; i < count; ++i) {
+                Expect(m_component->get_bus_info(m_component.Get(), V3_AUDIO, direction, i, &info) == V3_OK,
+                       "get_bus_info fails");
+                Expect(info.bus_type != V3_MAIN || i == 0, "a bus that is not the first is a main one");
+                ports.push_back({Narrow(info.bus_name), info.channel_count, info.bus_type == V3_MAIN});
+                m_component->activate_bus(m_component.Get(), V3_AUDIO, direction, i, true);
+            }
+            Expect(m_component->get_bus_info(m_component.Get(), V3_AUDIO, direction, count, &info) != V3_OK,
+                   "describes one bus more than it counts");
+        }
+    }
+    static void Divide(const std::vector<Port>& ports, std::span<float* const> channels,
+                       std::array<v3_audio_bus_buffers, 4>& buffers) {
+        std::size_t channel = 0;
+        for (std::size_t i = 0; i < ports.size() && i < buffers.size() && !channels.empty(); ++i) {
+            buffers[i].num_channels = ports[i].channels;
+            buffers[i].channel_buffers_32 = const_cast<float**>(channels.data() + channel);
+            channel += static_cast<std::size_t>(ports[i].channels);
+        }
+    }
+
+    Held<v3_component> m_component;
+    Held<v3_audio_processor> m_processor;
+    Held<v3_edit_controller> m_controller;
+    bool m_controllerIsOther = false;
+    Changes m_in{&g_changes, {}}, m_out{&g_changes, {}};
+    std::vector<std::int16_t> m_lastText;
+    double m_rate = 48000;
+};
+
+class Vst3File : public PluginFile {
+public:
+    explicit Vst3File(const std::filesystem::path& file) : m_module(Binary(file)) {
+#ifdef _WIN32
+        if (auto* init = m_module.Find<bool()>("InitDll")) init();
+#else
+        auto* entry = m_module.Find<bool(void*)>("ModuleEntry");
+        if (!entry || !m_module.Find<bool()>("ModuleExit"))
+            throw std::runtime_error("has no ModuleEntry, ModuleExit");
+        entry(nullptr);
+#endif
+        auto* get = m_module.Find<v3_plugin_factory**()>("GetPluginFactory");
+        m_factory = get ? get() : nullptr;
+        if (!m_factory) throw std::runtime_error("has no factory");
+        v3_factory_info info{};
+        v3_cpp_obj(m_factory)->get_factory_info(m_factory, &info);
+        Expect(*info.vendor, "its factory has no vendor");
+        ReadClasses();
+    }
+    ~Vst3File() override {
+        v3_cpp_obj_unref(m_factory);
+#ifdef _WIN32
+        const char* exit = "ExitDll";
+#else
+        const char* exit = "ModuleExit";
+#endif
+        if (auto* leave = m_module.Find<bool()>(exit)) leave();
+    }
+
+    std::size_t Count() const override { return m_effects.size(); }
+    std::string Name(std::size_t index) const override { return m_effects[index].name; }
+    std::unique_ptr<Instance> Create(std::size_t index) override {
+        return std::make_unique<Vst3Instance>(m_factory, m_effects[index].class_id);
+    }
+
+private:
+    // The library inside of a bundle, or the file itself.
+    static std::filesystem::path Binary(const std::filesystem::path& file) {
+        if (!std::filesystem::is_directory(file)) return file;
+#ifdef _WIN32
+        return file / "Contents/x86_64-win" / file.filename();
+#else
+        return file / "Contents/x86_64-linux" / file.stem().concat(".so");
+#endif
+    }
+
+    void ReadClasses() {
+        v3_plugin_factory_2** factory2 = nullptr;
+        v3_cpp_obj_query_interface(m_factory, v3_plugin_factory_2_iid, &factory2);
+        const std::int32_t count = v3_cpp_obj(m_factory)->num_classes(m_factory);
+        for (std::int32_t i = 0; i < count; ++i) {
+            v3_class_info info{};
+            Expect(v3_cpp_obj(m_factory)->get_class_info(m_factory, i, &info) == V3_OK,
+                   "get_class_info fails");
+            if (std::strcmp(info.category, "Audio Module Class") != 0) continue;
+            m_effects.push_back(info);
+            Expect(*info.name, "has no name");
+            v3_class_info_2 more{};
+            if (!factory2 || v3_cpp_obj(factory2)->get_class_info_2(factory2, i, &more) != V3_OK) {
+                Finding("has no description of the second kind");
+                continue;
+            }
+            Expect(std::strcmp(more.name, info.name) == 0, "its descriptions differ in the name");
+            Expect(std::string(more.sub_categories).rfind("Fx", 0) == 0,
+                   "its category does not begin with Fx");
+            Expect(*more.version && *more.vendor && *more.sdk_version,
+                   "has no version, vendor or SDK version");
+        }
+        if (factory2) v3_cpp_obj_unref(factory2);
+        if (m_effects.empty()) throw std::runtime_error("has no effect");
+        v3_class_info info{};
+        Expect(v3_cpp_obj(m_factory)->get_class_info(m_factory, count, &info) != V3_OK,
+               "describes one class more than it has");
+        void* object = nullptr;
+        const v3_tuid unknown{1, 2, 3};
+        Expect(v3_cpp_obj(m_factory)->create_instance(m_factory, unknown, v3_component_iid, &object) != V3_OK,
+               "creates a plug-in of an unknown id");
+    }
+
+    Module m_module;
+    v3_plugin_factory** m_factory;
+    std::vector<v3_class_info> m_effects;
+};
+
+}  // namespace
+
+std::unique_ptr<PluginFile> OpenVst3(const std::filesystem::path& file) {
+    return std::make_unique<Vst3File>(file);
+}
+
+}  // namespace PluginHost

@@ -1,0 +1,69 @@
+// plugin_host FILE...
+// Does to CLAP and VST3 plug-ins what a strict host may do, and prints what it finds. Exits 0 when it found
+// nothing, 1 otherwise.
+#include <cctype>
+#include <chrono>
+#include <cstdio>
+#include <exception>
+#include <mutex>
+#include <set>
+
+#include "Checks.h"
+
+namespace PluginHost {
+namespace {
+
+std::mutex g_mutex;
+std::set<std::string> g_findings;
+std::string g_subject;
+
+void CheckFile(const std::filesystem::path& path) {
+    g_subject = path.filename().string();
+    const auto begin = std::chrono::steady_clock::now();
+    const bool clap = path.extension() == ".clap";
+    const auto file = clap ? OpenClap(path) : OpenVst3(path);
+    Expect(file->Count() > 0, "has no plug-in");
+    Expect(std::chrono::steady_clock::now() - begin < std::chrono::seconds(1),
+           "takes more than a second to scan");
+    for (std::size_t i = 0; i < file->Count(); ++i) {
+        g_subject = path.filename().string() + ", " + file->Name(i) + " (" + (clap ? "CLAP" : "VST3") + ")";
+        const auto before = g_findings.size();
+        for (const auto check : {CheckLife, CheckParameters, CheckState, CheckSound, CheckTiming})
+            check(*file, i);
+        const std::chrono::duration<double> time = std::chrono::steady_clock::now() - begin;
+        std::printf("%s: %zu findings, %.1f s\n", g_subject.c_str(), g_findings.size() - before,
+                    time.count());
+        std::fflush(stdout);
+    }
+}
+
+}  // namespace
+
+void Finding(const std::string& text) {
+    const std::lock_guard lock(g_mutex);
+    std::string kind = g_subject + text;
+    std::erase_if(kind, [](unsigned char c) { return std::isdigit(c); });
+    if (!g_findings.insert(kind).second) return;
+    std::printf("%s: %s\n", g_subject.c_str(), text.c_str());
+    std::fflush(stdout);
+}
+
+void ExpectRealTime(const std::string& broken) {
+    // Its engine allocates and waits; where a format can say so, the plug-in does.
+    if (g_subject.find("Pitch Shift") == std::string::npos)
+        Expect(broken.empty(), "does on the audio thread: " + broken);
+}
+
+}  // namespace PluginHost
+
+int main(int count, char** arguments) {
+    using namespace PluginHost;
+    for (int i = 1; i < count; ++i) try {
+            CheckFile(arguments[i]);
+        } catch (const std::exception& error) {
+            Finding(error.what());
+        }
+    if (count < 2) std::fprintf(stderr, "usage: plugin_host FILE.clap|FILE.vst3...\n");
+    std::printf("%d files, %zu findings\n", count - 1, g_findings.size());
+    return count < 2 || !g_findings.empty();
+}
