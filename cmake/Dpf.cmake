@@ -10,6 +10,12 @@ if(NOT DSP_DPF_DIR)
         "Elsewhere than in /usr/share/dpf they are found with -DDSP_DPF_DIR=FOLDER.")
 endif()
 enable_language(C)  # of its generator
+if(WIN32)
+    # One file is one plug-in: nothing after the hardening's library is linked as a DLL again.
+    foreach(language C CXX)
+        string(REPLACE " -Wl,-Bdynamic" "" CMAKE_${language}_STANDARD_LIBRARIES "${CMAKE_${language}_STANDARD_LIBRARIES}")
+    endforeach()
+endif()
 set(DPF_ROOT_DIR ${DSP_DPF_DIR})
 include(${DSP_DPF_DIR}/cmake/DPF-plugin.cmake)
 
