@@ -34,6 +34,9 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "dspdll-analyser: no window can be opened: %s\n", SDL_GetError());
         return 1;
     }
+    // Pictures go straight to the screen there, without a detour over a graphics library.
+    if (SDL_strcmp(SDL_GetCurrentVideoDriver(), "x11") == 0)
+        SDL_SetHint(SDL_HINT_FRAMEBUFFER_ACCELERATION, "0");
     int status = 0;
     try {
         analyser::Program(options).Run();
