@@ -247,7 +247,8 @@ public:
     void SetEnvelopeTime(std::int64_t time);
     std::int64_t GetEnvelopeTime() const;
 
-    // What the host needs to know of an external parameter below GetParamCount(), choices included.
+    // What the host needs to know of an external parameter below GetParamCount(), choices included. Without a
+    // table the choices are those of GetParameterAvailableValues, at even distances from 0 to 1.
     ParameterDescription Describe(int index);
     // False when envelopes are kept but never played.
     bool PlaysAutomation() const;

@@ -118,7 +118,13 @@ ParameterDescription CorvoEffectBase::Describe(int index) {
     description.unit = Narrow(GetParamUnitsText(index));
     description.type = GetParameterTypeAutomatable(index);
     const ParameterRow* const row = RowOf(index);
-    if (!row) return description;
+    if (!row) {
+        const auto texts = GetParameterAvailableValues(index);
+        const auto last = static_cast<float>(texts.size()) - 1.0f;
+        for (const auto& text : texts)
+            description.choices.push_back({text, static_cast<float>(description.choices.size()) / last});
+        return description;
+    }
     if (SeparateLeftRightControls() != 0) description.label = Narrow(row->label);
     const auto& [minimum, maximum, neutral] = row->range;
     description.neutral = minimum == 0.0f && maximum == 1.0f

@@ -1,0 +1,389 @@
+#include "Adapter.h"
+
+#include <algorithm>
+#include <bit>
+#include <cmath>
+#include <limits>
+#include <stdexcept>
+#include <thread>
+
+#include "DSP/Effects/ParameterInput.h"
+
+namespace Corvo::Plugins {
+namespace {
+
+constexpr int kStep = 16;         // frames between two steps of a glide
+constexpr double kGlide = 0.010;  // seconds
+constexpr double kBypass = 0.020;
+constexpr double kLongestLag = 0.5;  // seconds of latency that the bypass can follow
+constexpr int kLongestPiece = 4096;
+
+float Finite(float sample) { return std::abs(sample) <= std::numeric_limits<float>::max() ? sample : 0.0f; }
+
+}  // namespace
+
+// Sets parameters apart from each other: the thread that processes goes on without, others wait for it.
+class Adapter::Gate {
+public:
+    enum class If { Free, Waiting };
+    Gate(std::atomic_flag& busy, If when) : m_busy(busy) {
+        while (!(m_open = !m_busy.test_and_set(std::memory_order_acquire)) && when == If::Waiting)
+            std::this_thread::yield();
+    }
+    ~Gate() {
+        if (m_open) m_busy.clear(std::memory_order_release);
+    }
+    Gate(const Gate&) = delete;
+    Gate& operator=(const Gate&) = delete;
+    explicit operator bool() const { return m_open; }
+
+private:
+    std::atomic_flag& m_busy;
+    bool m_open = false;
+};
+
+Adapter::Adapter(const PluginRow& row, int channels)
+    : m_row(row),
+      m_channels(channels),
+      m_layout(LayoutOf(row, channels)),
+      m_effect(row.Make()),
+      m_planar(m_effect->SupportsNoninterleaved()),
+      m_controls(m_layout.ports.size()) {
+    m_effect->SetHostCallback(this);
+    if (m_effect->GetNumSidechainBusses() > 0) {
+        m_sideChannels = std::min(channels, m_effect->GetSidechainBusNumChannelsMax(0));
+        m_effect->SetSidechainBusNumChannels(0, m_sideChannels);
+    }
+    ReadBack();
+}
+
+Adapter::~Adapter() = default;
+
+void Adapter::GetTimeSignature(int& numerator, int& denominator) {
+    numerator = m_numerator;
+    denominator = m_denominator;
+}
+
+void Adapter::Tempo(double bpm, int numerator, int denominator) {
+    if (!(bpm > 0.0 && std::isfinite(bpm)) || numerator <= 0 || denominator <= 0) return;
+    if (bpm == m_bpm && numerator == m_numerator && denominator == m_denominator) return;
+    m_bpm = bpm;
+    m_numerator = numerator;
+    m_denominator = denominator;
+    m_effect->NotifyTempoChanged();
+}
+
+void Adapter::Prepare(double rate, int frames) {
+    const Gate gate(m_busy, Gate::If::Waiting);
+    m_longest = std::clamp(frames, kStep, kLongestPiece);
+    m_format = {};
+    m_format.nChannels = static_cast<std::uint16_t>(m_channels);
+    m_format.nSamplesPerSec = static_cast<std::uint32_t>(std::lround(std::clamp(rate, 1000.0, 768000.0)));
+    m_format.wBitsPerSample = 32;
+    const auto piece = static_cast<std::size_t>(m_longest);
+    const auto ring = std::bit_ceil(piece + static_cast<std::size_t>(kLongestLag * rate));
+    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+        m_wet[c].assign(piece, 0.0f);
+        m_side[c].assign(m_sideChannels > 0 ? piece : 0, 0.0f);
+        m_dry[c].assign(ring, 0.0f);
+    }
+    m_interleaved.assign(m_planar ? 0 : piece * static_cast<std::size_t>(m_channels), 0.0f);
+    m_glideSteps = std::max(1, static_cast<int>(kGlide * rate / kStep));
+    m_mixStep = static_cast<float>(1.0 / (kBypass * rate));
+    TakeEdits(false);
+    Restart();
+}
+
+void Adapter::Reset() {
+    const Gate gate(m_busy, Gate::If::Waiting);
+    TakeEdits(false);
+    for (auto& ring : m_dry) std::ranges::fill(ring, 0.0f);
+    Restart();
+}
+
+void Adapter::Restart() {
+    m_effect->Cleanup();
+    m_effect->InitProcessing(m_longest, &m_format);
+    m_mix = m_goal = m_bypass ? 0.0f : 1.0f;
+    m_sideHeard = false;
+    m_fresh = true;
+    UpdateLatency();
+}
+
+void Adapter::UpdateLatency() {
+    const auto most = static_cast<int>(m_dry[0].size()) - m_longest;
+    m_latency = std::clamp(m_effect->GetLatency(), 0, std::max(most, 0));
+}
+
+// The values that the effect has, after it changed as a whole.
+void Adapter::ReadBack() {
+    m_gliding = 0;
+    for (std::size_t i = 0; i < m_controls.size(); ++i) {
+        const Port& port = Ports()[i];
+        Control& control = m_controls[i];
+        control.position = control.target = m_effect->GetParam(port.parameter);
+        control.wanted = port.Value(control.position);
+        control.edited = control.touched = false;
+        control.stepsLeft = 0;
+    }
+    m_edits = false;
+}
+
+void Adapter::Set(int index, float value) {
+    const Port& port = Ports()[static_cast<std::size_t>(index)];
+    Control& control = m_controls[static_cast<std::size_t>(index)];
+    if (!std::isfinite(value)) return;
+    value = std::clamp(value, port.least, port.most);
+    if (port.whole) value = std::round(value);
+    // Hosts write numbers as text; what comes back must not edit settings that are finer than a port.
+    const float before = control.wanted;
+    if (std::abs(value - before) <= 1e-6f * (std::abs(before) + port.most - port.least)) return;
+    control.wanted = value;
+    control.edited = true;
+    m_edits = true;
+}
+
+float Adapter::Value(int port) const { return m_controls[static_cast<std::size_t>(port)].wanted; }
+
+// A list is set as by a user: some effects make things ready then. Nothing else happens at the same time.
+void Adapter::Apply(std::size_t index, float position) {
+    const Port& port = Ports()[index];
+    m_controls[index].position = position;
+    const bool automated = port.type != EffectParameterType::List && !m_fresh;
+    m_effect->SetParam(port.parameter, position, automated);
+}
+
+void Adapter::TakeEdits(bool glide) {
+    if (!m_edits.exchange(false)) return;
+    bool lists = false;
+    for (std::size_t i = 0; i < m_controls.size(); ++i) {
+        Control& control = m_controls[i];
+        if (!control.edited.exchange(false)) continue;
+        const Port& port = Ports()[i];
+        control.target = port.Position(control.wanted);
+        const bool glides = glide && port.type == EffectParameterType::Continuous && !port.whole;
+        m_gliding += static_cast<int>(glides) - static_cast<int>(control.stepsLeft > 0);
+        control.stepsLeft = glides ? m_glideSteps : 0;
+        control.touched = !m_fresh;
+        if (glides) continue;
+        Apply(i, control.target);
+        lists = lists || port.type == EffectParameterType::List;
+    }
+    // Nothing was heard yet: the sound begins with these values.
+    if (m_fresh && m_longest > 0) Restart();
+    if (!lists) return;
+    // A list may move other parameters with it.
+    for (std::size_t i = 0; i < m_controls.size(); ++i) {
+        Control& control = m_controls[i];
+        if (control.stepsLeft > 0 || control.edited) continue;
+        const float position = m_effect->GetParam(Ports()[i].parameter);
+        control.touched = false;
+        if (position == control.position || Ports()[i].Position(control.wanted) == position) continue;
+        control.position = control.target = position;
+        control.wanted = Ports()[i].Value(position);
+        m_otherValues = true;
+    }
+}
+
+void Adapter::StepGlides() {
+    for (std::size_t i = 0; i < m_controls.size(); ++i) {
+        Control& control = m_controls[i];
+        if (control.stepsLeft == 0) continue;
+        const float left = control.target - control.position;
+        Apply(i, control.stepsLeft == 1 ? control.target
+                                        : control.position + left / static_cast<float>(control.stepsLeft));
+        if (--control.stepsLeft == 0) --m_gliding;
+    }
+}
+
+void Adapter::Run(const float* const* in, float* const* out, const float* const* side, int frames) {
+    if (m_longest == 0) return;
+    const Gate gate(m_busy, Gate::If::Free);
+    if (gate) TakeEdits(!m_fresh);
+    m_goal = m_bypass ? 0.0f : 1.0f;
+    for (int done = 0; done < frames;) {
+        const bool gliding = gate && m_gliding > 0;
+        if (gliding) StepGlides();
+        const int piece = std::min(frames - done, gliding ? kStep : m_longest);
+        std::array<const float*, 2> from{}, beside{};
+        std::array<float*, 2> to{};
+        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+            from[c] = in[c] + done;
+            to[c] = out[c] + done;
+            if (side && c < static_cast<std::size_t>(m_sideChannels) && side[c]) beside[c] = side[c] + done;
+        }
+        ProcessPiece(from.data(), to.data(), beside.data(), piece);
+        done += piece;
+        m_fresh = false;
+    }
+    UpdateLatency();
+}
+
+void Adapter::ProcessPiece(const float* const* in, float* const* out, const float* const* side, int frames) {
+    TakeSide(side, frames);
+    TakeInput(in, frames);
+    ProcessEffect(frames);
+    Give(out, frames);
+}
+
+void Adapter::TakeInput(const float* const* in, int frames) {
+    const auto count = static_cast<std::size_t>(frames);
+    // The ring is needed only where something may be mixed with it.
+    const bool keep = m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f;
+    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+        float* const wet = m_wet[c].data();
+        for (std::size_t i = 0; i < count; ++i) wet[i] = Finite(in[c][i]);
+        if (!keep) continue;
+        auto& ring = m_dry[c];
+        const std::size_t first = std::min(count, ring.size() - m_dryAt);
+        std::copy_n(wet, first, ring.data() + m_dryAt);
+        std::copy_n(wet + first, count - first, ring.data());
+    }
+    m_dryAt = (m_dryAt + count) & (m_dry[0].size() - 1);
+}
+
+void Adapter::TakeSide(const float* const* side, int frames) {
+    if (m_sideChannels == 0 || !side[0]) return;
+    double* channels[2]{};
+    for (std::size_t c = 0; c < static_cast<std::size_t>(m_sideChannels); ++c) {
+        const float* const from = side[c] ? side[c] : side[0];
+        float loudest = 0.0f;
+        for (std::size_t i = 0; i < static_cast<std::size_t>(frames); ++i) {
+            m_side[c][i] = Finite(from[i]);
+            loudest = std::max(loudest, std::abs(m_side[c][i]));
+        }
+        m_sideHeard = m_sideHeard || loudest > 0.0f;
+        channels[c] = reinterpret_cast<double*>(m_side[c].data());
+    }
+    if (m_sideHeard) m_effect->SetSidechainBuffer(0, channels);
+}
+
+void Adapter::ProcessEffect(int frames) {
+    DSP::ProcessFlags flags;
+    if (m_planar) {
+        double* channels[2]{reinterpret_cast<double*>(m_wet[0].data()),
+                            reinterpret_cast<double*>(m_wet[1].data())};
+        m_effect->ProcessNoninterleaved(channels, frames, &m_format, flags);
+        return;
+    }
+    if (m_channels == 1) {
+        m_effect->Process(m_wet[0].data(), frames, &m_format, flags);
+        return;
+    }
+    const auto count = static_cast<std::size_t>(frames);
+    float *const left = m_wet[0].data(), *const right = m_wet[1].data(), *const both = m_interleaved.data();
+    for (std::size_t i = 0; i < count; ++i) {
+        both[2 * i] = left[i];
+        both[2 * i + 1] = right[i];
+    }
+    m_effect->Process(both, frames, &m_format, flags);
+    for (std::size_t i = 0; i < count; ++i) {
+        left[i] = both[2 * i];
+        right[i] = both[2 * i + 1];
+    }
+}
+
+void Adapter::Give(float* const* out, int frames) {
+    const auto count = static_cast<std::size_t>(frames);
+    const float goal = m_goal;
+    if (m_mix == 1.0f && goal == 1.0f) {
+        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+            std::copy_n(m_wet[c].data(), count, out[c]);
+        return;
+    }
+    const std::size_t mask = m_dry[0].size() - 1;
+    const std::size_t from = m_dryAt - count - static_cast<std::size_t>(m_latency.load());
+    const float step = goal > m_mix ? m_mixStep : -m_mixStep;
+    float mix = m_mix;
+    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+        mix = m_mix;
+        for (std::size_t i = 0; i < count; ++i) {
+            if (mix != goal) mix = std::clamp(mix + step, 0.0f, 1.0f);
+            const float dry = m_dry[c][(from + i) & mask];
+            out[c][i] = mix == 0.0f ? dry : dry + mix * (m_wet[c][i] - dry);
+        }
+    }
+    m_mix = mix;
+}
+
+std::unique_ptr<DSP::CorvoEffectBase> Adapter::Copy() {
+    std::vector<std::uint8_t> chunk;
+    m_effect->GetSettingsChunk(chunk);
+    auto copy = m_row.Make();
+    copy->SetSettingsChunk(chunk);
+    copy->SetHostCallback(this);
+    return copy;
+}
+
+// Ports on their way count as arrived; and an effect may keep what was automated to itself.
+std::vector<std::uint8_t> Adapter::State() {
+    std::vector<std::uint8_t> chunk;
+    m_effect->GetSettingsChunk(chunk);
+    const auto touched = [](const Control& control) { return control.touched || control.edited; };
+    if (std::ranges::none_of(m_controls, touched)) return chunk;
+    const auto copy = Copy();
+    for (std::size_t i = 0; i < m_controls.size(); ++i) {
+        const Port& port = Ports()[i];
+        const float position = port.Position(m_controls[i].wanted);
+        if (touched(m_controls[i]) && copy->GetParam(port.parameter) != position)
+            copy->SetParam(port.parameter, position, false);
+    }
+    copy->GetSettingsChunk(chunk);
+    return chunk;
+}
+
+bool Adapter::TakeState(const std::vector<std::uint8_t>& bytes) {
+    // An effect leaves everything as it was, without a word, when it does not take a chunk: one that is read
+    // makes two different instances the same.
+    const auto other = m_row.Make(), another = m_row.Make();
+    std::vector<std::uint8_t> before, after;
+    for (int i = 0; i < other->GetParamCount(); ++i) other->SetParam(i, 0.0f, false);
+    for (int i = 0; i < another->GetParamCount(); ++i) another->SetParam(i, 1.0f, false);
+    other->SetSettingsChunk(bytes);
+    another->SetSettingsChunk(bytes);
+    other->GetSettingsChunk(before);
+    another->GetSettingsChunk(after);
+    if (before != after) return false;
+    const Gate gate(m_busy, Gate::If::Waiting);
+    m_effect->SetSettingsChunk(bytes);
+    ReadBack();
+    UpdateLatency();
+    return true;
+}
+
+void Adapter::TakePreset(int preset) {
+    if (preset < 0 || preset >= Presets()) return;
+    const Gate gate(m_busy, Gate::If::Waiting);
+    m_effect->SetPreset(preset);
+    ReadBack();
+    UpdateLatency();
+}
+
+std::string Adapter::Text(int index, float value) {
+    const Port& port = Ports()[static_cast<std::size_t>(index)];
+    if (port.type != EffectParameterType::Continuous)
+        return port.points[static_cast<std::size_t>(std::lround(std::clamp(value, port.least, port.most)))]
+            .text;
+    return ShownAt(*Copy(), port.parameter, port.Position(value));
+}
+
+bool Adapter::FromText(int index, const std::string& text, float& value) {
+    const Port& port = Ports()[static_cast<std::size_t>(index)];
+    for (const auto& point : port.points)
+        if (point.text == text) {
+            value = point.value;
+            return true;
+        }
+    if (port.type != EffectParameterType::Continuous) return false;
+    try {
+        const auto copy = Copy();
+        const float position = copy->GetParamValueNormalizedFromText(port.parameter, text);
+        if (!(position >= 0.0f)) return false;
+        value = port.Value(std::min(position, 1.0f));
+        return true;
+    } catch (const std::logic_error&) {
+        return false;
+    }
+}
+
+}  // namespace Corvo::Plugins

@@ -1,0 +1,54 @@
+#include "PluginTable.h"
+
+#include <algorithm>
+#include <iterator>
+
+#include "DSP/Effects/EffectKinds.h"
+#include "Equaliser/EqualiserEffect.h"
+
+namespace Corvo::Plugins {
+namespace {
+
+// clang-format off
+constexpr PluginRow kRows[]{
+    // name         id            code    version  LV2                       CLAP                VST3          real time, tempo
+    {"Gain",        "gain",        "DGai", 2, "AmplifierPlugin",  "utility",          "Tools",        true, false,  "Level, stereo width, pan and polarity"},
+    {"Compressor",  "compressor",  "DCmp", 2, "CompressorPlugin", "compressor",       "Dynamics",     true, false,  "Compressor, limiter, gate and expander on a transfer curve, with side-chain"},
+    {"Tremolo",     "tremolo",     "DTrm", 2, "ModulatorPlugin",  "tremolo",          "Modulation",   true, false,  "Tremolo, auto-pan and ring modulation"},
+    {"Equaliser",   "equaliser",   "DEqu", 2, "ParaEQPlugin",     "equalizer",        "EQ",           true, false,  "Eight gliding bands: peaks, shelves and passes"},
+    {"Valvex",      "valvex",      "DVal", 2, "DistortionPlugin", "distortion",       "Distortion",   true, false,  "Tube distortion of four shapes, oversampled up to 16 times"},
+    {"Echo",        "echo",        "DEch", 2, "DelayPlugin",      "delay",            "Delay",        true, true,   "Stereo delay in milliseconds or notes of the host's tempo"},
+    {"Chorus",      "chorus",      "DCho", 2, "ChorusPlugin",     "chorus",           "Modulation",   true, false,  "Chorus and flanger"},
+    {"Phaser",      "phaser",      "DPha", 2, "PhaserPlugin",     "phaser",           "Modulation",   true, false,  "1 to 30 all-pass stages with feedback"},
+    {"Reverb",      "reverb",      "DRev", 2, "ReverbPlugin",     "reverb",           "Reverb",       true, false,  "Early reflections and damped combs"},
+    {"Cantrix",     "cantrix",     "DCan", 2, "PitchPlugin",      "pitch-correction", "Pitch Shift",  true, false,  "Pitch correction of a voice to a scale; formants stay"},
+    {"Pitch Shift", "pitch-shift", "DPit", 2, "PitchPlugin",      "pitch-shifter",    "Pitch Shift",  false, false, "Transposes by up to an octave up"},
+    {"Denoiser",    "denoiser",    "DDen", 2, "SpectralPlugin",   "restoration",      "Restoration",  true, false,  "Takes steady noise out of recordings, learned or found while it plays"},
+};
+// clang-format on
+
+}  // namespace
+
+std::unique_ptr<DSP::CorvoEffectBase> PluginRow::Make() const {
+    const DSP::EffectKind* const kind = DSP::FindEffectKind(name);
+    if (!kind) return std::make_unique<EqualiserEffect>();
+    return kind->MakeReady();
+}
+
+std::span<const PluginRow> PluginRows() { return kRows; }
+
+const PluginRow* FindPluginRow(std::string_view id) {
+    const auto* const found =
+        std::ranges::find_if(kRows, [id](const PluginRow& row) { return row.id == id; });
+    return found == std::end(kRows) ? nullptr : found;
+}
+
+std::string PluginUri(const PluginRow& row, int channels) {
+    return std::string("urn:dspdll:") + row.id + (channels == 1 ? "-mono" : "");
+}
+
+std::string PluginName(const PluginRow& row, int channels) {
+    return std::string(row.name) + (channels == 1 ? " (mono)" : "");
+}
+
+}  // namespace Corvo::Plugins

@@ -1,0 +1,36 @@
+#pragma once
+
+#include <memory>
+#include <span>
+#include <string>
+#include <string_view>
+
+#include "DSP/Effects/Framework/CorvoEffectBase.h"
+
+namespace Corvo::Plugins {
+
+// What distinguishes one plug-in from another. Everything else comes from its effect.
+struct PluginRow {
+    const char* name;          // what GetName() of the effect says
+    const char* id;            // part of the identifiers and file names; never changes
+    const char* code;          // four letters, its identity as VST3; never changes
+    int minorVersion;          // odd while it grows; raised when ports are added
+    const char* lv2Class;      // of the LV2 specification
+    const char* clapFeature;   // of CLAP's list
+    const char* vst3Category;  // after "Fx|"
+    bool realTime;             // false: its engine may allocate or wait while it processes
+    bool tempo;                // follows the host's tempo
+    const char* about;
+
+    std::unique_ptr<DSP::CorvoEffectBase> Make() const;  // throws std::bad_alloc
+};
+
+// Every plug-in, in the order in which hosts list them. Any thread.
+std::span<const PluginRow> PluginRows();
+const PluginRow* FindPluginRow(std::string_view id);  // null where there is none
+
+// A plug-in comes for one channel and for two.
+std::string PluginUri(const PluginRow& row, int channels);
+std::string PluginName(const PluginRow& row, int channels);
+
+}  // namespace Corvo::Plugins

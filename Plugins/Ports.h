@@ -1,0 +1,52 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Curve.h"
+#include "PluginTable.h"
+
+namespace Corvo::Plugins {
+
+// A control as a host sees it.
+struct Port {
+    struct Point {
+        std::string text;
+        float value;
+    };
+
+    int parameter = 0;    // external index of the effect
+    std::string symbol;   // unique within the plug-in; never changes
+    std::string name;     // " L" and " R" where the effect has sides
+    std::string unit;     // empty where numbers have none
+    std::string comment;  // its range, in the effect's words
+    int group = -1;       // of Layout::groups
+    EffectParameterType type = EffectParameterType::Continuous;
+    float least = 0.0f, most = 1.0f;
+    float start = 0.0f;         // what a new instance has
+    bool whole = false;         // a few whole numbers only
+    double resolution = 1.0;    // of the values that are told
+    bool logarithmic = false;   // the knob has ratios, not differences
+    std::vector<Point> points;  // values with a text: all of a list or switch, ends that show no number
+    Curve curve;                // of a continuous one
+
+    float Position(float value) const;  // 0..1, as the effect takes it
+    float Value(float position) const;
+
+private:
+    friend struct LayoutMaker;
+    std::vector<float> m_choices;  // positions of the points of a list or switch
+};
+
+struct Layout {
+    std::vector<Port> ports;
+    std::vector<std::string> groups;
+};
+
+// The ports of a plug-in. Made once each, on the first call; any thread, not the audio thread.
+const Layout& LayoutOf(const PluginRow& row, int channels);
+
+// A name as an identifier: letters, digits and "_".
+std::string SymbolOf(const std::string& name);
+
+}  // namespace Corvo::Plugins
