@@ -2,6 +2,7 @@
 
 #include <array>
 #include <atomic>
+#include <memory>
 #include <optional>
 #include <string>
 
@@ -96,7 +97,7 @@ private:
     void DrawSentences(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
 
     Shell& m_shell;
-    Corvo::DrawingCairo m_drawing;
+    std::unique_ptr<Corvo::DrawingCairo> m_drawing;  // made with the first picture
     std::array<kivspectrum, 2> m_analysers;  // the second is the right channel's, where they are apart
     std::atomic<bool> m_apart{false}, m_heard{false};
     std::atomic<float> m_peak{0.0f};

@@ -162,7 +162,8 @@ void View::Draw(cairo_t* context, int width, int height, float dpi) {
     m_width = width;
     m_height = height;
     m_dpi = dpi;
-    Corvo::DrawingCairo::DrawTarget target(m_drawing, context, dpi);
+    if (!m_drawing) m_drawing = std::make_unique<Corvo::DrawingCairo>();
+    Corvo::DrawingCairo::DrawTarget target(*m_drawing, context, dpi);
     const RectF whole{0.0f, 0.0f, static_cast<float>(width), static_cast<float>(height)};
     RectF picture = whole;
     m_bar = {};
