@@ -24,8 +24,9 @@ need_packages() {
 }
 
 BUILD_PACKAGES=(g++ cmake ninja-build ccache pkg-config libxsimd-dev libsndfile1-dev libcli11-dev
-    nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev fonts-dejavu-core)
+    nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev libsdl2-dev fonts-dejavu-core)
 TEST_PACKAGES=(libgtest-dev binutils abigail-tools)
+PLUGIN_PACKAGES=(dpf-source libx11-dev libxcursor-dev libxext-dev libxrandr-dev libgl-dev)
 FUZZ_PACKAGES=(clang libclang-rt-dev)
 
 # What installs them by hand.

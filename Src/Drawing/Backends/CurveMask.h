@@ -3,7 +3,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "Picture/Geometry.h"
+#include "Drawing/DrawTarget.h"
 
 namespace Corvo {
 
