@@ -10,8 +10,12 @@ source Scripts/common.sh
 need_packages "${BUILD_PACKAGES[@]}" "${PLUGIN_PACKAGES[@]}" xvfb xdotool imagemagick sox jalv jackd2 sonic-pi-samples
 say "building"
 build_preset release dspdll-analyser dsphost
-cmake --preset plugins -DDSP_SANITIZE=address -B build/plugins-asan > /dev/null
-cmake --build build/plugins-asan --target dspdll-analyser-plugin
+cmake --preset asan -B build/plugins-asan -DDSP_BUILD_PLUGINS=ON -DDSP_BUILD_APPS=OFF -DDSP_BUILD_TESTS=OFF > /dev/null
+sanitizer=$(g++ -print-file-name=libasan.so)
+# What describes the bundle loads the plug-in, which wants the sanitizer loaded before.
+cmake --build build/plugins-asan --target dspdll-analyser-plugin-lv2 ||
+    (cd build/plugins-asan/lv2/dspdll-analyser-plugin.lv2 &&
+        LD_PRELOAD=$sanitizer ASAN_OPTIONS=detect_leaks=0 ../../bin/lv2_ttl_generator ./dspdll-analyser-plugin.so)
 
 seconds=${1:-60}
 work=$(mktemp -d)
@@ -121,7 +125,7 @@ jobs+=($!)
 sleep 2
 export JACK_DEFAULT_SERVER=analyser$$ LV2_PATH=$PWD/build/plugins-asan/lv2 ASAN_OPTIONS=detect_leaks=0:log_path=$work/asan
 for ((i = 0; i < 20; ++i)); do
-    LD_PRELOAD=$(g++ -print-file-name=libasan.so) timeout -s INT 4 jalv.gtk3 urn:dspdll:analyser > "$work/jalv" 2>&1 &
+    LD_PRELOAD=$sanitizer timeout -s INT 4 jalv.gtk3 urn:dspdll:analyser > "$work/jalv" 2>&1 &
     sleep 2.5
     [ $i != 10 ] || import -window root "$work/plugin.png"
     wait $! || true
