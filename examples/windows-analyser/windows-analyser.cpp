@@ -1,7 +1,7 @@
 // The analyser in a plain window with Direct2D, fed from a WAV file (16 bits), as if it were played.
 //     windows-analyser.exe FILE.wav [PICTURE.bmp]    with a picture: writes the last one of the file, and
 //     ends
-// The right button opens the analyser's own menu; the keys 1 to 4 choose the view.
+// The right button opens the analyser's menu; the keys 1 to 4 choose the view.
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
@@ -26,12 +26,10 @@
 using Microsoft::WRL::ComPtr;
 
 namespace {
-
 struct Wave {
     int rate = 0, channels = 0;
     std::vector<float> samples;  // interleaved
 };
-
 // Without samples for what is no WAV file with 16 bits.
 Wave ReadWave(const char* path) {
     std::ifstream file(path, std::ios::binary);
@@ -48,7 +46,7 @@ Wave ReadWave(const char* path) {
     return number(format + 22, std::uint16_t{}) == 16 && wave.rate > 0 && wave.channels > 0 ? wave : Wave{};
 }
 
-// Draws on any render target of Direct2D; the back-end belongs to the target.
+// The back-end belongs to the target.
 void Draw(kivspectrum& analyser, Corvo::DrawingD2D& drawing, ID2D1RenderTarget& target, float dpi) {
     const D2D1_SIZE_U size = target.GetPixelSize();
     Corvo::DrawingD2D::DrawTarget to(drawing, dpi);
@@ -74,7 +72,8 @@ void SavePicture(kivspectrum& analyser, ID2D1Factory& factory, const std::string
     must(target->EndDraw());
     std::vector<BYTE> pixels(std::size_t{4} * width * height);
     must(image->CopyPixels(nullptr, 4 * width, static_cast<UINT>(pixels.size()), pixels.data()));
-    const BITMAPFILEHEADER header{0x4D42, 0, 0, 0, sizeof(BITMAPFILEHEADER) + sizeof(BITMAPINFOHEADER)};
+    constexpr DWORD kHeaders = sizeof(BITMAPFILEHEADER) + sizeof(BITMAPINFOHEADER);
+    const BITMAPFILEHEADER header{0x4D42, kHeaders + static_cast<DWORD>(pixels.size()), 0, 0, kHeaders};
     const BITMAPINFOHEADER info{
         sizeof info, static_cast<LONG>(width), -static_cast<LONG>(height), 1, 32, 0, 0, 0, 0, 0, 0};
     std::ofstream file(path, std::ios::binary);
@@ -162,7 +161,6 @@ LRESULT CALLBACK Handle(HWND window, UINT message, WPARAM first, LPARAM second) 
 }
 
 }  // namespace
-
 int main(int argc, char** argv) {
     Window self;
     if (argc > 1) self.wave = ReadWave(argv[1]);
@@ -186,8 +184,9 @@ int main(int argc, char** argv) {
     if (!window) return 1;
     SetWindowLongPtrA(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(&self));
     if (argc > 2) {
-        do self.Paint(window);
-        while (self.Step());
+        self.Paint(window);  // sizes the sonogram
+        while (self.Step()) continue;
+        self.Paint(window);
         if (!self.target) return 1;  // nothing came into the window
         SavePicture(self.analyser, *self.factory.Get(), argv[2], 984, 661);
         return 0;
