@@ -27,7 +27,7 @@ View::View(Shell& shell) : m_shell(shell) {
     kivspectrum& first = GetAnalyser();
     first.SetOn(true);
     first.SetTunerOn(true);
-    Do(1267);  // an overlap of 93.75 %: a new spectrum at every refresh
+    Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
     Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
     Do(kShowBoth);
     m_choices = 0;

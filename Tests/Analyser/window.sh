@@ -115,7 +115,7 @@ say "a broken settings file, a file that is none, and no sound system"
 printf 'rubbish' > "$XDG_CONFIG_HOME/dspdll/analyser.conf"
 start "$0" 2> "$work/said"
 stop
-[ "$(wc -l < "$work/said")" = 2 ] || fail "two lines were expected: $(cat "$work/said")"
+[ "$(grep -c '^dspdll-analyser: ' "$work/said")" = 2 ] || fail "two sentences were expected: $(cat "$work/said")"
 SDL_AUDIODRIVER=nosuch start
 stop
 
