@@ -24,9 +24,10 @@ need_packages() {
 }
 
 BUILD_PACKAGES=(g++ cmake ninja-build ccache pkg-config libxsimd-dev libsndfile1-dev libcli11-dev
-    nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev fonts-dejavu-core)
+    nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev libsdl2-dev fonts-dejavu-core)
 TEST_PACKAGES=(libgtest-dev binutils abigail-tools)
 CLANG_PACKAGES=(clang libclang-rt-dev)
+PLUGIN_PACKAGES=(dpf-source libx11-dev libxcursor-dev libxext-dev libxrandr-dev libgl-dev)
 
 # What installs them by hand.
 install_command() { echo "apt-get install --no-install-recommends ${BUILD_PACKAGES[*]} ${TEST_PACKAGES[*]}"; }

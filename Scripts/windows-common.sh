@@ -22,7 +22,7 @@ skip() {
 [ "$(id -u)" = 0 ] || skip "needs root (packages, and mounts for Wine)"
 mkdir -p "$cache"
 
-WINDOWS_PACKAGES=("${own_packages[@]}" clang lld llvm dpkg-dev googletest sonic-pi-samples util-linux zip unzip
+WINDOWS_PACKAGES=("${own_packages[@]}" clang lld llvm dpkg-dev googletest sonic-pi-samples sox util-linux zip unzip
     "${BUILD_PACKAGES[@]}" "${TEST_PACKAGES[@]}")
 need_windows_packages() {
     need_packages "${WINDOWS_PACKAGES[@]}" >&2 || skip "packages are missing and could not be installed (no network?)"

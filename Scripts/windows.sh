@@ -119,6 +119,25 @@ try_other_compilers() {
     echo "a program of the other compiler family found every function and used some"
 }
 
+# The example of a window with the analyser, built against the package as a host would; its picture is of the end
+# of a recording.
+try_window() {
+    local flags="-std=c++20 -O2 -Wall -Wextra -Werror -msse2 -mfpmath=sse"
+    [ "$target" != win32 ] || flags+=" -mstackrealign -faligned-new=8"
+    "$processor-w64-mingw32-g++-posix" $flags -mwindows -I $package/include/DSPDll \
+        examples/windows-analyser/windows-analyser.cpp $package/lib/libDSPDll.dll.a -ld2d1 -lole32 -lwindowscodecs -luuid \
+        -o $programs/windows-analyser.exe
+    sox "$(dpkg -L sonic-pi-samples | grep -m1 '/guit_em9\.flac$')" -b 16 $programs/guitar.wav
+    on_wine $programs/windows-analyser.exe guitar.wav window.bmp
+    python3 - $programs/window.bmp <<'END'
+import sys
+pixels = open(sys.argv[1], "rb").read()[54:]
+colours = {pixels[i:i + 3] for i in range(0, len(pixels), 4)}
+assert len(pixels) == 4 * 984 * 661 and len(colours) > 200, (len(pixels), len(colours))
+print("the window's picture has", len(colours), "colours")
+END
+}
+
 part "tests under Wine" test_program dsp_tests
 part "tests of the C interface under Wine" test_program c_interface_tests
 part "hardening" Tests/Package/hardening.sh $build/bin/{DSPDll.dll,dsphost.exe}
@@ -127,6 +146,7 @@ part "the native build and this one" compare_builds
 part "inputs that failed once" replay_failed
 part "package" try_package
 part "C interface" try_c_interface
+part "window" try_window
 part "other compilers" try_other_compilers
 
 [ ${#failed[@]} = 0 ] || {

@@ -10,4 +10,9 @@ struct RectF {
     float x, y, width, height;
 };
 
+// The left and upper edges belong to a rectangle.
+inline bool Contains(const RectF& r, PointF p) {
+    return p.x >= r.x && p.x < r.x + r.width && p.y >= r.y && p.y < r.y + r.height;
+}
+
 }  // namespace Corvo

@@ -286,8 +286,25 @@ bool Analyser::AdvanceSonogram() {
     const Lock lock(m_lock);
     if (!state.showSonogram || !state.on || state.frozen || m_drawer->GetSamplingFrequency() <= 0)
         return false;
+    ++m_sonogramRefreshes;
     const double pitch = state.tunerOn ? m_tuner->GetHeardFrequency() : 0.0;
     return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch));
+}
+
+AnalyserReading Analyser::ReadingAt(PointF place) const {
+    using Plot = AnalyserReading::Plot;
+    const Lock lock(m_lock);
+    if (shown.map && Contains(shown.spectrum, place))
+        return {Plot::Spectrum, shown.map->XToFrequency(place.x), shown.map->YToLevel(place.y)};
+    if (!Contains(shown.sonogram, place)) return {};
+    const RectF& axis = shown.sonogramAxis;
+    const double rows = m_sonogram->GetBitmap().height;
+    const double ago = (shown.sonogram.x + shown.sonogram.width - place.x) /
+                       static_cast<double>(Sonogram::GetColumnsPerSecond());
+    const double fromBelow = (axis.y + axis.height - place.y) * rows / axis.height;
+    return {Plot::Sonogram, m_sonogram->GetFrequencyMap().XToFrequency(fromBelow),
+            m_sonogram->GetPointAmplitude(place.x, place.y, axis), m_sonogram->GetTimeAtRightEdge() - ago,
+            SonogramSeconds() - ago};
 }
 
 }  // namespace Corvo

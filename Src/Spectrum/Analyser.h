@@ -4,11 +4,15 @@
 #include <cstdint>
 #include <limits>
 #include <memory>
+#include <optional>
 #include <vector>
 
+#include "Picture/Geometry.h"
 #include "Platform/CriticalSection.h"
+#include "Spectrum/AnalyserReading.h"
 #include "Spectrum/CaptureBuffer.h"
 #include "Spectrum/Fft/CorvoFFT.h"
+#include "Spectrum/Scales/CoordinatesAndFrequencies.h"
 #include "Spectrum/Scales/SpectrumSettings.h"
 
 class SpectrumDrawer;
@@ -31,6 +35,13 @@ struct AnalyserState {
     std::atomic<float> pointerX{kNowhere}, pointerY{kNowhere};
 };
 
+// Where the plots of a picture stand.
+struct ShownPlots {
+    RectF spectrum{}, sonogram{};
+    RectF sonogramAxis{};                          // where the sonogram's whole picture would stand
+    std::optional<CoordinatesAndFrequencies> map;  // of the spectrum
+};
+
 // One analyser: captures the newest samples of a signal, windows and transforms them, hands the power
 // spectrum to its drawer for smoothing and its tuner for the pitch, and keeps the sonogram going. It knows of
 // no other analyser and no menu: settings come with each call.
@@ -45,6 +56,10 @@ public:
     ~Analyser();
 
     AnalyserState state;
+    // With the lock: what the last picture shows, and what every picture is to show.
+    ShownPlots shown;
+    FrequencySpan span;
+    AnalyserReading marker;
 
     CaptureBuffer& GetCapture() { return m_capture; }
     CriticalSection& GetLock() const { return m_lock; }
@@ -97,8 +112,13 @@ public:
 
     // The sonogram's part of a display refresh. True when its picture has new columns.
     bool AdvanceSonogram();
+    // Of the sonogram's picture since its beginning.
+    double SonogramSeconds() const { return m_sonogramRefreshes / kRefreshesPerSecond; }
+    AnalyserReading ReadingAt(PointF place) const;
 
 private:
+    static constexpr double kRefreshesPerSecond = 30.0;
+
     void BuildAgain();
     void Build(const SpectrumSettings& settings, bool reset);
     void BuildTransform();
@@ -114,6 +134,7 @@ private:
     bool m_powerIsFrame = false;      // m_power was made since the buffers were built
     bool m_frameForSonogram = false;  // processed since its last step
     std::atomic<bool> m_transforming{false};
+    double m_sonogramRefreshes = 0.0;
 
     CaptureBuffer m_capture;
     std::vector<float> m_samples;    // the copy that an analysis works on

@@ -172,6 +172,8 @@ void kivspectrum::ToggleTuner() {
     allocate(1);
     init();
 }
+void kivspectrum::ShowTuner(bool show) { m_analyser->state.tunerVisible = show && GetTunerOn(); }
+bool kivspectrum::IsShowTuner() const { return m_analyser->state.tunerVisible; }
 void kivspectrum::SetFrozen(bool frozen) {
     const Lock classLock(AnalyserLock());
     if (m_analyser->state.frozen.exchange(frozen) && !frozen) allocate(1);
@@ -187,3 +189,24 @@ void kivspectrum::SetShowInfoBox(bool show) { m_analyser->state.showInfoBox = sh
 bool kivspectrum::IsShowInfoBox() const { return m_analyser->state.showInfoBox; }
 void kivspectrum::SetPointer(float x, float y) { m_analyser->SetPointer(x, y); }
 void kivspectrum::ClearPointer() { m_analyser->ClearPointer(); }
+void kivspectrum::SetFrequencySpan(const Corvo::FrequencySpan& span) {
+    const bool usable = span.lowest >= 0.0 && span.lowest < span.highest;
+    const Lock lock(m_analyser->GetLock());
+    m_analyser->span = usable ? span : Corvo::FrequencySpan{};
+}
+Corvo::FrequencySpan kivspectrum::GetFrequencySpan() const {
+    const Lock lock(m_analyser->GetLock());
+    return m_analyser->span;
+}
+Corvo::AnalyserReading kivspectrum::GetReading(float x, float y) const {
+    return m_analyser->ReadingAt({x, y});
+}
+void kivspectrum::SetMarker(const Corvo::AnalyserReading& reading) {
+    const Lock lock(m_analyser->GetLock());
+    m_analyser->marker = reading;
+}
+void kivspectrum::ClearMarker() { SetMarker({}); }
+Corvo::AnalyserReading kivspectrum::GetMarker() const {
+    const Lock lock(m_analyser->GetLock());
+    return m_analyser->marker;
+}

@@ -8,6 +8,7 @@
 
 #include "Picture/DrawingBitmap.h"
 #include "Platform/Export.h"
+#include "Spectrum/AnalyserReading.h"
 #include "Spectrum/Scales/SpectrumSettings.h"
 
 class SpectrumDrawer;
@@ -165,6 +166,9 @@ public:
     bool GetTunerOn() const;
     // Switches the tuner off when it runs, else tuner and analyser on, with fresh buffers.
     void ToggleTuner();
+    // Whether a tuner that runs stands in a strip above the other views, as it does once it is switched on.
+    void ShowTuner(bool show);
+    bool IsShowTuner() const;
     // A frozen analyser runs no analysis; a thawed one has fresh buffers.
     void SetFrozen(bool frozen);
     bool GetFrozen() const;
@@ -182,6 +186,20 @@ public:
     // Where the mouse is, in the coordinates of the drawing; the info box tells what is there.
     void SetPointer(float x, float y);
     void ClearPointer();
+
+    // The stretch of the frequency axis that spectrum and sonogram show: all of it, which {0, 0} stands for,
+    // unless lowest < highest. What the axis does not have is cut off; down to a sixteenth of the axis the
+    // sonogram keeps up with it. Any thread.
+    void SetFrequencySpan(const Corvo::FrequencySpan& span);
+    Corvo::FrequencySpan GetFrequencySpan() const;
+    // What the picture drawn last shows at a place in its coordinates. Display thread.
+    Corvo::AnalyserReading GetReading(float x, float y) const;
+    // Marks a reading, of another plot than None: it stays at its frequency and moment, and the info box at
+    // the pointer tells how far away from it that is. Display thread.
+    void SetMarker(const Corvo::AnalyserReading& reading);
+    void ClearMarker();
+    // Of plot None when there is no marker.
+    Corvo::AnalyserReading GetMarker() const;
 
     // Drawing, with any back-end (its header makes these templates): into `rectangle`, in pixels of the
     // target, whatever its size. One thread draws for all analysers; it is the display thread, or the menu's

@@ -30,6 +30,8 @@ TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
         mine.SetOn(true);
         if (command == 1300) other.ToggleTuner();
         mine.ShowSonogram(true);
+        mine.SetFrequencySpan({1.0 * number, 2000.0});
+        mine.ShowTuner(number % 2 == 0);
         Corvo::Sonogram::SetSpeedIndex(command % 9);
         Corvo::Sonogram::SetColourScheme(command % 7);
     };
@@ -43,6 +45,7 @@ TEST_F(AnalyserThreads, FeedPrepareAndChooseAtOnce) {
             frames += second.GetFFTFor3DSonogram(48000, nullptr, true, false);
             for (kivspectrum* const analyser : {&first, &second})
                 analyser->DoDraw<TestSupport::NoDrawing>(target, {0.0f, 0.0f, 160.0f, 120.0f});
+            first.SetMarker(first.GetReading(80.0f, 60.0f));
         }
     };
     WhileAnotherThread(feed, [&] {

@@ -10,6 +10,7 @@
 #include <fontconfig/fontconfig.h>
 #include <pango/pangocairo.h>
 
+#include "Drawing/Backends/CurveMask.h"
 #include "Drawing/Backends/ResourceKeys.h"
 #include "Drawing/Backends/SlotCache.h"
 #include "Drawing/DrawingFont.h"
@@ -69,6 +70,28 @@ bool AddPath(cairo_t* context, const PointF* points, int count) {
     return added >= 2;
 }
 
+// The part of a surface of pixels that drawing can reach, in the context's coordinates; nothing where these
+// are no pixels, or the surface has none.
+bool ReachablePixels(cairo_t* context, RectF& reach) {
+    cairo_surface_t* const surface = cairo_get_group_target(context);
+    if (cairo_surface_get_type(surface) != CAIRO_SURFACE_TYPE_IMAGE) return false;
+    double xScale = 1.0, yScale = 1.0, xOffset = 0.0, yOffset = 0.0;
+    cairo_surface_get_device_scale(surface, &xScale, &yScale);
+    cairo_surface_get_device_offset(surface, &xOffset, &yOffset);
+    cairo_matrix_t matrix;
+    cairo_get_matrix(context, &matrix);
+    const auto whole = [](double value) { return value == std::floor(value); };
+    if (xScale != 1.0 || yScale != 1.0 || matrix.xx != 1.0 || matrix.yy != 1.0 || matrix.xy != 0.0 ||
+        matrix.yx != 0.0 || !whole(matrix.x0 + xOffset) || !whole(matrix.y0 + yOffset))
+        return false;
+    double left = 0.0, top = 0.0, right = 0.0, bottom = 0.0;
+    cairo_clip_extents(context, &left, &top, &right, &bottom);
+    reach = {static_cast<float>(std::floor(left)), static_cast<float>(std::floor(top)),
+             static_cast<float>(std::ceil(right) - std::floor(left)),
+             static_cast<float>(std::ceil(bottom) - std::floor(top))};
+    return true;
+}
+
 // Whether the rectangle is width x height pixels of the surface, upright, whatever the context's scale is.
 bool CoversPixels(cairo_t* context, const RectF& r, int width, int height) {
     double xScale = 1.0, yScale = 1.0;
@@ -87,6 +110,7 @@ struct DrawingCairo::Resources {
     SlotCache<InkKey, DrawingBrush, kKeptInks> brushes;
     SlotCache<StrokeKey, DrawingPen*, kKeptStrokes> pens;
     SlotCache<TextKey, LaidOutText, kKeptTexts> texts;
+    CurveMask curve;
     PangoContext* textContext = MakeTextContext();
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
 
@@ -185,7 +209,29 @@ void DrawingCairo::DrawTarget::Clear(ColourReference colour) {
 }
 
 void DrawingCairo::DrawTarget::Polyline(const PointF* points, int count, const Stroke& stroke) {
-    if (Use(stroke) && AddPath(m_context, points, count)) cairo_stroke(m_context);
+    if (!Use(stroke)) return;
+    if (DrawCurve(points, count, stroke.width)) return;
+    if (AddPath(m_context, points, count)) cairo_stroke(m_context);
+}
+
+// A curve with many points, on pixels; false for everything else.
+bool DrawingCairo::DrawTarget::DrawCurve(const PointF* points, int count, float width) {
+    constexpr int kFewPoints = 64;
+    constexpr float kSparse = 3.0f;  // pixels between points
+    RectF reach;
+    if (count < kFewPoints || !IsUsable(points[0]) || !IsUsable(points[count - 1]) ||
+        points[count - 1].x - points[0].x > kSparse * static_cast<float>(count))
+        return false;
+    for (int i = 0; i < count; ++i)
+        if (!IsUsable(points[i])) return false;
+    if (!CurveMask::IsCurve(points, count) || !ReachablePixels(m_context, reach)) return false;
+    CurveMask& curve = m_drawing.m_resources->curve;
+    if (!curve.Draw(points, count, width, reach)) return true;
+    cairo_surface_t* const mask = cairo_image_surface_create_for_data(
+        curve.Pixels(), CAIRO_FORMAT_A8, curve.Width(), curve.Height(), curve.Stride());
+    cairo_mask_surface(m_context, mask, curve.Left(), curve.Top());
+    cairo_surface_destroy(mask);
+    return true;
 }
 
 void DrawingCairo::DrawTarget::FillPolygon(const PointF* points, int count, Ink ink) {

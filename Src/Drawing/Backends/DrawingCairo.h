@@ -58,6 +58,7 @@ public:
 private:
     void Use(Ink ink);
     bool Use(const Stroke& stroke);
+    bool DrawCurve(const PointF* points, int count, float width);
 
     DrawingCairo& m_drawing;
     cairo_t* m_context;

@@ -4,6 +4,7 @@
 #include <cmath>
 
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ShortText.h"
 
 namespace Corvo {
@@ -101,12 +102,35 @@ void DrawInfoBox(DrawTarget& target, const RectF& bounds, PointF corner, std::st
                 TextAlign::Left, em, ink);
 }
 
-void DrawPointerBox(DrawTarget& target, const RectF& plot, PointF pointer, std::string_view text) {
+void DrawPointerBox(DrawTarget& target, const RectF& plot, PointF pointer, std::string_view text,
+                    std::string_view difference) {
     const float gap = Look::kGap * target.Scale();
-    const bool rightwards = pointer.x < Centre(plot).x;
-    const float x =
-        rightwards ? pointer.x + 2.0f * gap : pointer.x - 2.0f * gap - InfoBoxOf(target, text).width;
-    DrawInfoBox(target, Shrunk(plot, gap, gap, gap, gap), {x, pointer.y + 2.0f * gap}, text, {Look::kText});
+    const RectF inner = Shrunk(plot, gap, gap, gap, gap);
+    const auto box = [&](std::string_view line, float y, ColourReference colour) {
+        const bool rightwards = pointer.x < Centre(plot).x;
+        const float x =
+            rightwards ? pointer.x + 2.0f * gap : pointer.x - 2.0f * gap - InfoBoxOf(target, line).width;
+        DrawInfoBox(target, inner, {x, y}, line, {colour});
+    };
+    const float height = InfoBoxOf(target, text).height + gap / 2.0f;
+    const float below = pointer.y + 2.0f * gap;
+    if (difference.empty()) return box(text, below, Look::kText);
+    const float y = std::min(below, Bottom(inner) - 2.0f * height);
+    box(text, y, Look::kText);
+    box(difference, y + height, Look::kMarker);
+}
+
+void DrawMarker(DrawTarget& target, const RectF& plot, PointF at, bool upright) {
+    const float width = std::max(std::round(target.Scale()), 1.0f), arm = 4.0f * target.Scale();
+    const Ink ink{Look::kMarker, 200};
+    target.PushClip(plot);
+    if (upright)
+        target.FillRectangle({std::floor(at.x), plot.y, width, plot.height}, ink);
+    else
+        target.FillRectangle({plot.x, std::floor(at.y), plot.width, width}, ink);
+    const PointF diamond[] = {{at.x - arm, at.y}, {at.x, at.y - arm}, {at.x + arm, at.y}, {at.x, at.y + arm}};
+    if (Contains(plot, at)) target.FillPolygon(diamond, 4, {Look::kMarker});
+    target.PopClip();
 }
 
 }  // namespace Corvo

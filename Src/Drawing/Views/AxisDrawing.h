@@ -31,7 +31,10 @@ AxisRoom RoomForLevels(const DrawTarget& target, float length);
 // A line of text in a box of its own, moved to stay within `bounds`; left out where it does not fit.
 void DrawInfoBox(DrawTarget& target, const RectF& bounds, PointF corner, std::string_view text, Ink ink);
 RectF InfoBoxOf(DrawTarget& target, std::string_view text);
-// Beside the pointer, on the side where there is more room.
-void DrawPointerBox(DrawTarget& target, const RectF& plot, PointF pointer, std::string_view text);
+// Beside the pointer, on the side where there is more room; `difference`, unless it is empty, below the text.
+void DrawPointerBox(DrawTarget& target, const RectF& plot, PointF pointer, std::string_view text,
+                    std::string_view difference);
+// A pinned place: a line across the plot, and a diamond where `at` lies within it.
+void DrawMarker(DrawTarget& target, const RectF& plot, PointF at, bool upright);
 
 }  // namespace Corvo

@@ -1,12 +1,9 @@
 #pragma once
 
-#include <algorithm>
-#include <cmath>
+#include "Picture/DrawingColour.h"
 
-#include "Drawing/DrawTarget.h"
-#include "Drawing/PrimitiveArguments.h"
-
-// Colours and sizes of everything drawn. Texts keep a contrast of 4.5:1 or more on the ground they stand on.
+// Colours and sizes of everything drawn, also for hosts that draw something beside it. Texts keep a contrast
+// of 4.5:1 or more on the ground they stand on.
 namespace Corvo::Look {
 
 // clang-format off
@@ -20,6 +17,7 @@ constexpr ColourReference kBox        = ColourFromRgb(0x1D242E);
 constexpr ColourReference kCurve      = ColourFromRgb(0x4CC2FF);
 constexpr ColourReference kPeaks      = ColourFromRgb(0xF2A65A);
 constexpr ColourReference kPointer    = ColourFromRgb(0xE8EDF3);
+constexpr ColourReference kMarker     = ColourFromRgb(0xFF8AD8);
 constexpr ColourReference kTrace      = ColourFromRgb(0x7CFF6B);
 constexpr ColourReference kInTune     = ColourFromRgb(0x5BE08A);
 constexpr ColourReference kNeedle     = ColourFromRgb(0xF5F7FA);
@@ -39,30 +37,3 @@ constexpr float kLeastPlot   = 48.0f;  // a plot with less on either side gets n
 // clang-format on
 
 }  // namespace Corvo::Look
-
-namespace Corvo {
-
-inline float Right(const RectF& r) { return r.x + r.width; }
-inline float Bottom(const RectF& r) { return r.y + r.height; }
-inline PointF Centre(const RectF& r) { return {r.x + r.width / 2.0f, r.y + r.height / 2.0f}; }
-
-inline bool Contains(const RectF& r, PointF p) {
-    return p.x >= r.x && p.x < Right(r) && p.y >= r.y && p.y < Bottom(r);
-}
-
-// Without what `left`, `top`, `right` and `bottom` take from the sides; never less than nothing.
-inline RectF Shrunk(const RectF& r, float left, float top, float right, float bottom) {
-    return {r.x + left, r.y + top, std::max(r.width - left - right, 0.0f),
-            std::max(r.height - top - bottom, 0.0f)};
-}
-
-// To whole pixels, so that edges are crisp.
-inline RectF Snapped(const RectF& r) {
-    const float x = std::round(r.x), y = std::round(r.y);
-    return {x, y, std::round(Right(r)) - x, std::round(Bottom(r)) - y};
-}
-
-// False for what a view draws nothing on: less than a pixel, not a number, or beyond any surface.
-inline bool IsDrawable(const RectF& r) { return IsUsable(r) && r.width >= 1.0f && r.height >= 1.0f; }
-
-}  // namespace Corvo

@@ -37,6 +37,10 @@ ShortText& ShortText::AddFrequency(double hz) {
     return AddNumber(hz / 1000.0, hz < 9999.5 ? 3 : 2).Add(" kHz");
 }
 
+ShortText& ShortText::AddDifference(double value, int decimals) {
+    return Add(value < 0.0 ? "" : "+").AddNumber(value, decimals);
+}
+
 ShortText& ShortText::AddNote(double hz) {
     if (!(hz >= kLowestNamed && hz <= kHighestNamed)) return *this;
     const double semitone = SemitoneOf(hz);

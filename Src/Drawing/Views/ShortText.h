@@ -16,6 +16,8 @@ public:
     ShortText& AddNumber(double value, int decimals);
     // "55.03 Hz", "440.0 Hz" or "1.250 kHz".
     ShortText& AddFrequency(double hz);
+    // "+12.3", and a real minus sign.
+    ShortText& AddDifference(double value, int decimals);
     // "A4 +12c": the note of equal temperament on A = 440 Hz that is nearest; nothing outside 8 Hz..32 kHz.
     ShortText& AddNote(double hz);
     // "A4", in the tuner's naming, from the number of semitones above C-1.

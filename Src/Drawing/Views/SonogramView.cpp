@@ -7,10 +7,12 @@
 
 #include "Drawing/Views/AxisDrawing.h"
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ShortText.h"
 #include "Drawing/Views/SpectrumView.h"
 #include "Drawing/Views/ViewAccess.h"
 #include "Drawing/Views/Views.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/Sonogram/Sonogram.h"
 
 namespace Corvo {
@@ -20,19 +22,78 @@ namespace {
 float MarkAt(float at, float first, float last) { return std::max(std::min(std::floor(at), last), first); }
 
 void DrawSonogramInfo(kivspectrum& analyser, DrawTarget& target, const RectF& plot) {
-    const PointF pointer = ViewAccess::Pointer(analyser);
-    if (!Contains(plot, pointer)) return;
-    const Sonogram& sonogram = *analyser.GetSonogram();
-    const double rows = sonogram.GetBitmap().height;
-    const double hz =
-        sonogram.GetFrequencyMap().XToFrequency((Bottom(plot) - pointer.y) * rows / plot.height);
-    const float level = sonogram.GetPointAmplitude(pointer.x, pointer.y, plot);
-    const double ago = (Right(plot) - pointer.x) / static_cast<double>(Sonogram::GetColumnsPerSecond());
-    const ShortText text = DescribeSpectrum(hz, level, LevelScale::Decibels)
+    const AnalyserReading pointed = ViewAccess::PointedAt(analyser);
+    if (pointed.plot != AnalyserReading::Plot::Sonogram) return;
+    const ShortText text = DescribeSpectrum(pointed.frequency, pointed.level, LevelScale::Decibels)
                                .Add("   ")
-                               .AddNumber(sonogram.GetTimeAtRightEdge() - ago, 2)
+                               .AddNumber(pointed.seconds, 2)
                                .Add(" s");
-    DrawPointerBox(target, plot, pointer, text.View());
+    const ShortText difference =
+        DescribeDifference(ViewAccess::Marker(analyser), pointed, LevelScale::Decibels);
+    DrawPointerBox(target, plot, ViewAccess::Pointer(analyser), text.View(), difference.View());
+}
+
+void DrawSonogramMarker(kivspectrum& analyser, DrawTarget& target, const RectF& plot, float y) {
+    const AnalyserReading& marker = ViewAccess::Marker(analyser);
+    if (marker.plot == AnalyserReading::Plot::None) return;
+    const double ago = ViewAccess::SonogramSeconds(analyser) - marker.since;
+    const bool here = marker.plot == AnalyserReading::Plot::Sonogram;
+    const double x = here ? Right(plot) - ago * Sonogram::GetColumnsPerSecond() : plot.x - 1.0;
+    DrawMarker(target, plot, {static_cast<float>(std::max(x, plot.x - 1.0)), y}, false);
+}
+
+// The map of what is shown of the frequency axis, upright: x counts pixels from the lower edge.
+CoordinatesAndFrequencies UprightMap(float height, const SpectrumSettings& settings, int samplingRate,
+                                     const FrequencySpan& span) {
+    const RectF upright{0.0f, 0.0f, height, 1.0f};
+    const CoordinatesAndFrequencies map = ShownMap(upright, settings, samplingRate, span);
+    const FrequencyScale scale = map.GetFrequencyScale();
+    const bool bands = scale == FrequencyScale::Octaves || scale == FrequencyScale::ThirdOctaves;
+    return {upright,
+            map.GetLowest(),
+            map.GetHighest(),
+            bands ? FrequencyScale::Logarithmic : scale,
+            LevelScale::Decibels,
+            1.0f};
+}
+
+// Where the whole axis would stand so that `shown` fills the plot.
+RectF WholeAxis(const RectF& plot, const CoordinatesAndFrequencies& shown,
+                const CoordinatesAndFrequencies& whole) {
+    const double lowest = whole.FrequencyToX(shown.GetLowest());
+    const double part = (whole.FrequencyToX(shown.GetHighest()) - lowest) / static_cast<double>(plot.height);
+    constexpr double kMostTimes = 16.0;
+    if (!(part > 0.0 && part < 0.9999)) return plot;
+    const double times = std::min(1.0 / part, kMostTimes);
+    const auto height = static_cast<float>(std::min(std::round(times * plot.height), 32000.0));
+    const auto below = static_cast<float>(std::round(lowest * static_cast<double>(height / plot.height)));
+    return {plot.x, Bottom(plot) + below - height, plot.width, height};
+}
+
+// As many rows as the axis has pixels, while the picture stays small enough to be moved 30 times a second.
+int RowsOf(const RectF& axis) {
+    constexpr float kMostPixels = 4.0e6f;
+    return static_cast<int>(std::min(axis.height, kMostPixels / std::max(axis.width, 1.0f)));
+}
+
+void DrawFrequencies(DrawTarget& target, const RectF& rectangle, const CoordinatesAndFrequencies& map,
+                     float perRow, bool notes) {
+    const float scale = target.Scale(), gap = Look::kGap * scale;
+    AxisRoom room = RoomBeside(target, rectangle.height);
+    // In the map's rows.
+    room = {rectangle.height / perRow, room.line / perRow, room.label / perRow};
+    AxisTicks ticks = FrequencyTicks(map, room, notes);
+    ticks.Place([&](double hz) { return Bottom(rectangle) - map.FrequencyToX(hz) * perRow; });
+    const float width = std::max(std::round(scale), 1.0f);
+    for (const AxisTick& tick : ticks.All()) {
+        const float length = tick.rank < AxisTick::kUnlabelled ? 0.75f * gap : 0.4f * gap;
+        target.FillRectangle({Right(rectangle) - length,
+                              MarkAt(tick.at, rectangle.y, Bottom(rectangle) - width), length, width},
+                             {Look::kLabel});
+    }
+    const float beyond = kCapHeight * Look::kLabelSize * scale / 2.0f + 1.0f;
+    DrawLabelColumn(target, ticks, rectangle.y - beyond, Bottom(rectangle) + beyond,
+                    Right(rectangle) - 1.5f * gap, TextAlign::Right);
 }
 
 }  // namespace
@@ -65,23 +126,8 @@ void DrawPicture(const Sonogram& sonogram, DrawTarget& target, const RectF& rect
 void DrawFrequencyScale(const Sonogram& sonogram, DrawTarget& target, const RectF& rectangle, bool notes) {
     const int rows = sonogram.GetBitmap().height;
     if (!IsDrawable(rectangle) || rows < 1) return;
-    const CoordinatesAndFrequencies& map = sonogram.GetFrequencyMap();
-    const float scale = target.Scale(), gap = Look::kGap * scale;
-    const float perRow = rectangle.height / static_cast<float>(rows);
-    AxisRoom room = RoomBeside(target, rectangle.height);
-    room = {static_cast<float>(rows), room.line / perRow, room.label / perRow};  // in the map's rows
-    AxisTicks ticks = FrequencyTicks(map, room, notes);
-    ticks.Place([&](double hz) { return Bottom(rectangle) - map.FrequencyToX(hz) * perRow; });
-    const float width = std::max(std::round(scale), 1.0f);
-    for (const AxisTick& tick : ticks.All()) {
-        const float length = tick.rank < AxisTick::kUnlabelled ? 0.75f * gap : 0.4f * gap;
-        target.FillRectangle({Right(rectangle) - length,
-                              MarkAt(tick.at, rectangle.y, Bottom(rectangle) - width), length, width},
-                             {Look::kLabel});
-    }
-    const float beyond = kCapHeight * Look::kLabelSize * scale / 2.0f + 1.0f;
-    DrawLabelColumn(target, ticks, rectangle.y - beyond, Bottom(rectangle) + beyond,
-                    Right(rectangle) - 1.5f * gap, TextAlign::Right);
+    DrawFrequencies(target, rectangle, sonogram.GetFrequencyMap(),
+                    rectangle.height / static_cast<float>(rows), notes);
 }
 
 void DrawIntensityScale(Sonogram& sonogram, DrawTarget& target, const RectF& rectangle) {
@@ -162,12 +208,24 @@ void DrawSonogramAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     const std::lock_guard lock(ViewAccess::Lock(analyser));
     Sonogram& sonogram = *analyser.GetSonogram();
     const SonogramLayout layout = LayOutSonogram(target, rectangle, view);
-    sonogram.CheckPixelBufferSize(layout.plot, 0);
+    const int prepared = analyser.GetSpectrumDrawer()->GetSamplingFrequency();
+    const int rate = prepared > 0 ? prepared : ViewAccess::SamplingRate(analyser);
+    const CoordinatesAndFrequencies shown =
+        UprightMap(layout.plot.height, view, rate, ViewAccess::Span(analyser));
+    const RectF axis = WholeAxis(layout.plot, shown, UprightMap(layout.plot.height, view, rate, {}));
+    ViewAccess::Shown(analyser).sonogram = layout.plot;
+    ViewAccess::Shown(analyser).sonogramAxis = axis;
+    sonogram.CheckPixelBufferSize(layout.plot, RowsOf(axis));
     target.PushClip(rectangle);
     target.FillRectangle(rectangle, {Look::kGround});
-    DrawPicture(sonogram, target, layout.plot);
-    if (analyser.GetTunerOn()) DrawPitchTrace(sonogram, target, layout.plot);
-    DrawFrequencyScale(sonogram, target, layout.frequencies, view.view_flag_d);
+    target.PushClip(layout.plot);
+    DrawPicture(sonogram, target, axis);
+    if (analyser.GetTunerOn()) DrawPitchTrace(sonogram, target, axis);
+    target.PopClip();
+    DrawSonogramMarker(analyser, target, layout.plot,
+                       Bottom(layout.plot) - shown.FrequencyToX(ViewAccess::Marker(analyser).frequency));
+    if (IsDrawable(layout.frequencies))
+        DrawFrequencies(target, layout.frequencies, shown, 1.0f, view.view_flag_d);
     DrawTimeline(sonogram, target, layout.timeline);
     DrawIntensityScale(sonogram, target, layout.intensity);
     if (analyser.IsShowInfoBox() && view.view_flag_c != 0) DrawSonogramInfo(analyser, target, layout.plot);
@@ -175,6 +233,7 @@ void DrawSonogramAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
 }
 
 void DrawSonogram(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
+    ViewAccess::ForgetPlots(analyser);
     DrawSonogramAs(analyser, target, rectangle, kivspectrum::GetSettings());
 }
 

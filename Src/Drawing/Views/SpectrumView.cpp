@@ -7,6 +7,7 @@
 
 #include "Drawing/Views/AxisDrawing.h"
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ViewAccess.h"
 #include "Drawing/Views/Views.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
@@ -90,11 +91,14 @@ void DrawSpectrumInfo(kivspectrum& analyser, DrawTarget& target, const RectF& pl
         target.Line({plot.x, pointer.y}, {Right(plot), pointer.y}, hair);
         const ShortText text =
             DescribeSpectrum(map.XToFrequency(pointer.x), map.YToLevel(pointer.y), map.GetLevelScale());
-        return DrawPointerBox(target, plot, pointer, text.View());
+        const ShortText difference = DescribeDifference(ViewAccess::Marker(analyser),
+                                                        ViewAccess::PointedAt(analyser), map.GetLevelScale());
+        return DrawPointerBox(target, plot, pointer, text.View(), difference.View());
     }
     const SpectrumDrawer& drawer = *analyser.GetSpectrumDrawer();
     const SpectrumPeak peak = drawer.HighestPeak(map.GetLowest());
     if (ShowsBands(map) || !(peak.level > -VerticalRangeOf(drawer.GetSettings()))) return;
+    if (peak.frequency > map.GetHighest()) return;
     ShortText text;
     text.Add("Peak   ").Add(DescribeSpectrum(peak.frequency, peak.level, LevelScale::Decibels).View());
     constexpr float kMostOfWidth = 0.35f;
@@ -104,6 +108,20 @@ void DrawSpectrumInfo(kivspectrum& analyser, DrawTarget& target, const RectF& pl
 }
 
 }  // namespace
+
+CoordinatesAndFrequencies ShownMap(const RectF& rectangle, const SpectrumSettings& settings, int samplingRate,
+                                   const FrequencySpan& span) {
+    const CoordinatesAndFrequencies whole = SpectrumMap(rectangle, settings, samplingRate);
+    const double lowest = std::max(span.lowest, whole.GetLowest());
+    const double highest = std::min(span.highest, whole.GetHighest());
+    if (!(lowest < highest)) return whole;
+    return {rectangle,
+            lowest,
+            highest,
+            whole.GetFrequencyScale(),
+            whole.GetLevelScale(),
+            VerticalRangeOf(settings)};
+}
 
 bool IsLargeEnough(const RectF& plot, float scale) {
     return plot.width >= Look::kLeastPlot * scale && plot.height >= Look::kLeastPlot * scale;
@@ -131,6 +149,22 @@ ShortText DescribeSpectrum(double hz, double level, LevelScale scale) {
     return text.AddNumber(level, 4);
 }
 
+ShortText DescribeDifference(const AnalyserReading& marker, const AnalyserReading& pointed,
+                             LevelScale scale) {
+    using Plot = AnalyserReading::Plot;
+    ShortText text;
+    if (marker.plot == Plot::None || pointed.plot == Plot::None) return text;
+    text.Add("\u0394   ").AddDifference(pointed.frequency - marker.frequency, 1).Add(" Hz");
+    if (marker.frequency > 0.0 && pointed.frequency > 0.0)
+        text.Add("   ").AddDifference(12.0 * std::log2(pointed.frequency / marker.frequency), 2).Add(" st");
+    if (marker.plot != pointed.plot) return text;
+    const bool decibels = pointed.plot == Plot::Sonogram || scale == LevelScale::Decibels;
+    text.Add("   ").AddDifference(pointed.level - marker.level, decibels ? 1 : 4).Add(decibels ? " dB" : "");
+    if (pointed.plot == Plot::Sonogram)
+        text.Add("   ").AddDifference(pointed.since - marker.since, 2).Add(" s");
+    return text;
+}
+
 void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle,
                     const SpectrumSettings& view) {
     if (!IsDrawable(rectangle)) return;
@@ -139,8 +173,10 @@ void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     const SpectrumLayout layout = LayOutSpectrum(target, rectangle, view);
     const RectF& plot = layout.plot;
     const int prepared = drawer.GetSamplingFrequency();
-    const CoordinatesAndFrequencies map =
-        SpectrumMap(plot, view, prepared > 0 ? prepared : ViewAccess::SamplingRate(analyser));
+    const CoordinatesAndFrequencies map = ShownMap(
+        plot, view, prepared > 0 ? prepared : ViewAccess::SamplingRate(analyser), ViewAccess::Span(analyser));
+    ViewAccess::Shown(analyser).spectrum = plot;
+    ViewAccess::Shown(analyser).map = map;
     target.PushClip(rectangle);
     target.FillRectangle(rectangle, {Look::kGround});
     target.FillRectangle(plot, {Look::kPlot});
@@ -154,7 +190,7 @@ void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
         target.Polyline(points.data(), static_cast<int>(points.size()),
                         {{colour}, Look::kHairline * target.Scale()});
     };
-    drawer.AgePeaks();
+    if (!analyser.GetFrozen()) drawer.AgePeaks();
     if (view.peak_hold_mode != 0) other(drawer.GetPeaks(), Look::kPeaks);
     const std::vector<float>& denoised = analyser.GetTuner()->GetDenoisedSpectrum();
     if (analyser.GetTunerOn() && Tuner::GetShowDenoisedSpectrum() && !denoised.empty())
@@ -162,11 +198,18 @@ void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     drawer.ComputeSpectrumPoints(plot, nullptr, count, map, kMode, 0, 0.0f, &drawer.GetPowerSmoothed());
     DrawCurve(target, plot, map, drawer.GetXYPoints(), CurveStyleOf(view), ViewAccess::Outline(analyser));
     target.PopClip();
+    const AnalyserReading& marker = ViewAccess::Marker(analyser);
+    if (marker.plot != AnalyserReading::Plot::None)
+        DrawMarker(target, plot,
+                   {map.FrequencyToX(marker.frequency),
+                    marker.plot == AnalyserReading::Plot::Spectrum ? map.LevelToY(marker.level) : -1.0f},
+                   true);
     if (analyser.IsShowInfoBox() && view.view_flag_c != 0) DrawSpectrumInfo(analyser, target, plot, map);
     target.PopClip();
 }
 
 void DrawSpectrum(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
+    ViewAccess::ForgetPlots(analyser);
     DrawSpectrumAs(analyser, target, rectangle, kivspectrum::GetSettings());
 }
 

@@ -6,6 +6,7 @@
 #include <string_view>
 
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ShortText.h"
 #include "Drawing/Views/Views.h"
 #include "Spectrum/Tuner/Tuner.h"

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <mutex>
 #include <vector>
 
 #include "Picture/Geometry.h"
@@ -16,6 +17,16 @@ struct ViewAccess {
     static PointF Pointer(const kivspectrum& a) {
         const AnalyserState& state = a.m_analyser->state;
         return {state.pointerX, state.pointerY};
+    }
+    // With the lock.
+    static ShownPlots& Shown(const kivspectrum& a) { return a.m_analyser->shown; }
+    static const FrequencySpan& Span(const kivspectrum& a) { return a.m_analyser->span; }
+    static const AnalyserReading& Marker(const kivspectrum& a) { return a.m_analyser->marker; }
+    static double SonogramSeconds(const kivspectrum& a) { return a.m_analyser->SonogramSeconds(); }
+    static AnalyserReading PointedAt(const kivspectrum& a) { return a.m_analyser->ReadingAt(Pointer(a)); }
+    static void ForgetPlots(const kivspectrum& a) {
+        const std::lock_guard lock(Lock(a));
+        a.m_analyser->shown = {};
     }
     static int SamplingRate(const kivspectrum& a) { return a.m_analyser->state.samplingRate; }
     static bool IsTunerVisible(const kivspectrum& a) { return a.m_analyser->state.tunerVisible; }

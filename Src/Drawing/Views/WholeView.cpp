@@ -2,6 +2,7 @@
 #include <cmath>
 
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/SonogramView.h"
 #include "Drawing/Views/SpectrumView.h"
 #include "Drawing/Views/ViewAccess.h"
@@ -12,6 +13,7 @@ namespace Corvo {
 
 void DrawSonogramAndSpectrum(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
+    ViewAccess::ForgetPlots(analyser);
     constexpr float kSpectrum = 0.4f;
     const float height = std::round(kSpectrum * rectangle.height);
     const RectF upper{rectangle.x, rectangle.y, rectangle.width, height};
@@ -28,6 +30,7 @@ void DrawSonogramAndSpectrum(kivspectrum& analyser, DrawTarget& target, const Re
 void DrawWhole(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle) {
     if (!IsDrawable(rectangle)) return;
     const auto mode = analyser.GetDisplayMode();
+    if (mode == kivspectrum::display_tuner) ViewAccess::ForgetPlots(analyser);
     if (mode == kivspectrum::display_tuner) return DrawTuner(analyser, target, rectangle);
     constexpr float kShare = 0.25f, kLeast = 36.0f, kMost = 180.0f;
     const float wanted =

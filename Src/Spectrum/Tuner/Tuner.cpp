@@ -308,6 +308,11 @@ bool TunerCalibrateNow(const Tuner& tuner) {
     Calibrate(Tuner::GetCalibrationBase() * std::exp2(limited / 1200.0));
     return true;
 }
+bool TunerCalibrateTo(double concertPitchHz) {
+    if (!(concertPitchHz >= 220.0 && concertPitchHz <= 880.0)) return false;
+    Calibrate(concertPitchHz / 4.0);
+    return true;
+}
 void TunerCalibrateReset() { Calibrate(TunerNotes::kStandardBase); }
 bool TunerIsNonstandardCalibration() { return Tuner::GetCalibrationBase() != TunerNotes::kStandardBase; }
 bool TunerCalibrationNotStandardOrNotUseEqualTemperament() {

@@ -223,6 +223,9 @@ private:
 // than 100 cents another call may be needed. False, with nothing changed, unless the pitch has stayed within
 // 10 cents for half a second. Like the reset it tells the tuning listener. Any thread.
 DSP_API bool TunerCalibrateNow(const Tuner& tuner);
+// So that the A which the orchestra tunes to, two octaves above the base, has this frequency; false, with
+// nothing changed, outside 220..880 Hz.
+DSP_API bool TunerCalibrateTo(double concertPitchHz);
 DSP_API void TunerCalibrateReset();
 DSP_API bool TunerIsNonstandardCalibration();
 DSP_API bool TunerCalibrationNotStandardOrNotUseEqualTemperament();

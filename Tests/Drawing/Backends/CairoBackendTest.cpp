@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <cmath>
+#include <vector>
+
 #include <dlfcn.h>
 
 #include <cairo.h>
@@ -8,6 +11,7 @@
 #include "Drawing/DrawingFont.h"
 #include "Drawing/Views/ShownAnalyser.h"
 #include "Support/DrawingSurface.h"
+#include "Support/Signals.h"
 
 using namespace Corvo;
 using TestSupport::DrawingSurface;
@@ -29,6 +33,54 @@ extern "C" struct _PangoLayout* pango_layout_new(struct _PangoContext* context) 
 namespace {
 
 class CairoBackend : public ViewTest {};
+
+// Catches curves that are drawn column by column otherwise than as outlines: elsewhere, thicker or torn.
+TEST_F(CairoBackend, CurvesAreAsOutlined) {
+    constexpr int kSide = 200;
+    for (const float width : {1.0f, 1.5f, 3.0f, 8.0f}) {
+        std::vector<PointF> points;
+        const auto noise = TestSupport::Noise<float>(kSide);
+        for (int i = 0; i < kSide - 20; ++i) {
+            const auto x = static_cast<float>(i);
+            const float y = 100.0f + 60.0f * std::sin(x / 9.0f) +
+                            (i > 90 ? 30.0f * noise[static_cast<std::size_t>(i)] : 0.0f);
+            points.push_back({x + 10.25f, y});
+        }
+        const auto picture = [&](bool outlined) {
+            cairo_surface_t* const image = cairo_image_surface_create(CAIRO_FORMAT_RGB24, kSide, kSide);
+            cairo_t* const context = cairo_create(image);
+            if (outlined) {
+                cairo_set_source_rgb(context, 1.0, 1.0, 1.0);
+                cairo_set_line_width(context, width);
+                cairo_set_line_join(context, CAIRO_LINE_JOIN_ROUND);
+                cairo_set_line_cap(context, CAIRO_LINE_CAP_ROUND);
+                for (const PointF& p : points) cairo_line_to(context, p.x, p.y);
+                cairo_stroke(context);
+            } else {
+                DrawingCairo drawing;
+                DrawingCairo::DrawTarget target(drawing, context, 96.0f);
+                target.Polyline(points.data(), static_cast<int>(points.size()), {{0xFFFFFF}, width});
+            }
+            cairo_surface_flush(image);
+            const unsigned char* const bytes = cairo_image_surface_get_data(image);
+            std::vector<int> levels;
+            for (int y = 0; y < kSide; ++y)
+                for (int x = 0; x < kSide; ++x)
+                    levels.push_back(bytes[y * cairo_image_surface_get_stride(image) + 4 * x]);
+            cairo_destroy(context);
+            cairo_surface_destroy(image);
+            return levels;
+        };
+        const auto fast = picture(false), plain = picture(true);
+        double off = 0.0, covered = 0.0;
+        for (std::size_t i = 0; i < fast.size(); ++i) {
+            EXPECT_NEAR(fast[i], plain[i], 60) << width << " at " << i;
+            off += std::abs(fast[i] - plain[i]);
+            covered += plain[i];
+        }
+        EXPECT_LT(off, 0.06 * covered) << width;  // the outlines come in coarse steps
+    }
+}
 
 // Catches a back-end that keeps fewer texts than a picture has, and so lays all of them out for every one.
 TEST_F(CairoBackend, LaysOutNothingTwice) {

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ShownAnalyser.h"
 #include "Support/RecordingDrawing.h"
 
@@ -262,6 +263,37 @@ TEST_F(Readings, PointerReadsWhatTheLabelsSay) {
         EXPECT_NEAR(Reading(text, "dB"), seconds > -1.0 ? -20.0 : -kRange, 1.0) << text;
         EXPECT_NEAR(Reading(text, " s"), seconds, 0.02) << text;
     }
+}
+
+// Catches a stretch of the axis that the two plots show differently, a place that reads as another, and a
+// marker that does not tell how far it is or does not scroll with the picture.
+TEST_F(Readings, BothPlotsShowTheSpanAndTheMarker) {
+    using Plot = Corvo::AnalyserReading::Plot;
+    kivspectrum::settings.time_smoothing = 0;
+    analyser.SetFrequencySpan({500.0, 2000.0});
+    HearIntoSonogram(1000.0, 0.5);
+    Show(&kivspectrum::DoDrawSonogramAndSpectrum<Recording>);
+    const auto middleOf = [&](Plot plot, bool upright) {
+        for (float at = 0.0f; at < 2000.0f; ++at) {
+            const auto reading = upright ? analyser.GetReading(1200.0f, at) : analyser.GetReading(at, 100.0f);
+            if (reading.plot == plot && reading.frequency > (upright ? 0.0 : 1000.0) &&
+                reading.frequency < 1010.0)
+                return reading;
+        }
+        return Corvo::AnalyserReading{};
+    };
+    const auto spectrum = middleOf(Plot::Spectrum, false), sonogram = middleOf(Plot::Sonogram, true);
+    EXPECT_NEAR(spectrum.frequency, 1000.0, 10.0);
+    EXPECT_NEAR(sonogram.frequency, 1000.0, 10.0);
+    EXPECT_NEAR(sonogram.level, -6.0, 2.0);  // between bins
+    analyser.SetMarker(sonogram);
+    m_shown.Hear(1000.0, 0.5, 1.0);
+    analyser.SetPointer(1200.0f, 330.0f);
+    const std::string difference = Show(&kivspectrum::DoDrawSonogramAndSpectrum<Recording>).texts.back().text;
+    EXPECT_TRUE(difference.starts_with("\u0394")) << difference;
+    EXPECT_NEAR(Reading(difference, " s"), 1.0, 0.04) << difference;
+    analyser.SetFrequencySpan({7.0, 7.0});
+    EXPECT_EQ(analyser.GetFrequencySpan(), Corvo::FrequencySpan{});
 }
 
 // Catches a curve or a readout that has its peak at another frequency or level than the sine.

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "Drawing/Views/Look.h"
+#include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ShownAnalyser.h"
 #include "Support/AudioThreadRules.h"
 #include "Support/RecordingDrawing.h"

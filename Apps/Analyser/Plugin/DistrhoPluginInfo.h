@@ -1,0 +1,21 @@
+#pragma once
+
+// What DPF asks at compile time.
+#define DISTRHO_PLUGIN_BRAND "DSPDll"
+#define DISTRHO_PLUGIN_NAME "Analyser"
+#define DISTRHO_PLUGIN_URI "urn:dspdll:analyser"
+#define DISTRHO_PLUGIN_CLAP_ID "urn:dspdll:analyser"
+#define DISTRHO_PLUGIN_CLAP_FEATURES "audio-effect", "analyzer", "stereo"
+#define DISTRHO_PLUGIN_LV2_CATEGORY "lv2:SpectralPlugin"
+#define DISTRHO_PLUGIN_VST3_CATEGORIES "Fx|Analyzer|Stereo"
+#define DISTRHO_PLUGIN_NUM_INPUTS 2
+#define DISTRHO_PLUGIN_NUM_OUTPUTS 2
+#define DISTRHO_PLUGIN_IS_RT_SAFE 1
+#define DISTRHO_PLUGIN_HAS_UI 1
+#define DISTRHO_PLUGIN_WANT_DIRECT_ACCESS 1
+#define DISTRHO_PLUGIN_WANT_STATE 1
+#define DISTRHO_PLUGIN_WANT_FULL_STATE 1
+#define DISTRHO_UI_DEFAULT_WIDTH 960
+#define DISTRHO_UI_DEFAULT_HEIGHT 600
+#define DISTRHO_UI_USER_RESIZABLE 1
+#define DISTRHO_UI_USE_CAIRO 1

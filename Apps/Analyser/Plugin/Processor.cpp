@@ -1,0 +1,81 @@
+#include "Processor.h"
+
+#include <algorithm>
+#include <array>
+#include <chrono>
+#include <cmath>
+
+#include "Spectrum/Tuner/Tuner.h"
+
+namespace analyser {
+namespace {
+
+constexpr unsigned kBlock = 256;
+constexpr float kSilence = -120.0f, kLoudest = 24.0f, kFallPerSecond = 20.0f;
+
+}  // namespace
+
+Processor::Processor() : m_view(*this), m_thread([this] { Refresh(); }) {}
+
+Processor::~Processor() {
+    {
+        const std::lock_guard lock(m_mutex);
+        m_ended = true;
+    }
+    m_end.notify_one();
+    m_thread.join();
+}
+
+void Processor::Refresh() {
+    using Clock = std::chrono::steady_clock;
+    constexpr auto kPeriod = std::chrono::nanoseconds(1'000'000'000 / 30);
+    auto next = Clock::now();
+    std::unique_lock lock(m_mutex);
+    while (!m_ended) {
+        if (m_view.Refresh()) m_changed = true;
+        next = std::max(next + kPeriod, Clock::now());
+        m_end.wait_until(lock, next, [this] { return m_ended; });
+    }
+}
+
+void Processor::Process(const float* const inputs[2], float* const outputs[2], unsigned frames, double rate) {
+    std::array<float, std::size_t{2} * kBlock> block;
+    for (unsigned from = 0; from < frames; from += kBlock) {
+        const unsigned count = std::min(kBlock, frames - from);
+        float peak = 0.0f;
+        for (unsigned i = 0; i < count; ++i)
+            for (unsigned channel = 0; channel < 2; ++channel) {
+                const float sample = inputs[channel][from + i];
+                block[2 * i + channel] = sample;
+                peak = std::max(peak, std::abs(sample));
+            }
+        m_view.Feed(block.data(), static_cast<int>(count), 2);
+        m_tone.AddTo(block.data(), static_cast<int>(count), 2, rate);
+        for (unsigned i = 0; i < count; ++i)
+            for (unsigned channel = 0; channel < 2; ++channel)
+                outputs[channel][from + i] = block[2 * i + channel];
+        const float now = peak > 1e-6f ? std::min(20.0f * std::log10(peak), kLoudest) : kSilence;
+        const float fallen = GetLevel() - kFallPerSecond * static_cast<float>(count / rate);
+        m_level.store(std::max(now, std::max(fallen, kSilence)), std::memory_order_relaxed);
+    }
+}
+
+void Processor::SetRate(double rate) {
+    m_rate = rate;
+    Hold(*this)->SetSamplingRate(static_cast<int>(rate));
+}
+
+void Processor::SetClipboard(std::function<bool(const std::string&)> copy) {
+    const std::lock_guard lock(m_mutex);
+    m_copy = std::move(copy);
+    if (!m_copy) m_tone.Set(false, 440.0);
+}
+
+std::string Processor::Source() const {
+    return IsToneOn() ? "The reference tone is added to what comes in"
+                      : std::to_string(std::lround(m_rate)) + " Hz, passed through untouched";
+}
+
+void Processor::SetTone(bool on) { m_tone.Set(on, 4.0 * Tuner::GetCalibrationBase()); }
+
+}  // namespace analyser

@@ -1,0 +1,71 @@
+#pragma once
+
+#include <atomic>
+#include <condition_variable>
+#include <functional>
+#include <mutex>
+#include <string>
+#include <thread>
+
+#include "Shell.h"
+#include "Tone.h"
+#include "View.h"
+
+namespace analyser {
+
+// What a plug-in hears and what its window shows. The audio thread feeds; a thread of its own refreshes the
+// view 30 times a second, whether or not there is a window, so that the notes are published; windows and
+// hosts use the view while they hold it.
+class Processor : public Shell {
+public:
+    Processor();
+    ~Processor() override;
+    Processor(const Processor&) = delete;
+    Processor& operator=(const Processor&) = delete;
+
+    // Audio thread. `outputs` get the inputs' samples to the bit unless the reference tone is asked for; they
+    // may be the inputs.
+    void Process(const float* const inputs[2], float* const outputs[2], unsigned frames, double rate);
+    // What the tuner shows; 0 frequency and note -1 without one. Any thread.
+    const Tuner& GetTuner() const { return *m_view.GetAnalyser().GetTuner(); }
+    bool IsTunerOn() const { return m_view.GetAnalyser().GetTunerOn(); }
+    // dB of the highest sample, which falls by 20 dB a second. Any thread.
+    float GetLevel() const { return m_level.load(std::memory_order_relaxed); }
+
+    // Not on the audio thread: the view, for as long as what is returned lives.
+    class Hold {
+    public:
+        explicit Hold(Processor& processor) : m_lock(processor.m_mutex), m_view(processor.m_view) {}
+        View* operator->() { return &m_view; }
+
+    private:
+        std::unique_lock<std::mutex> m_lock;
+        View& m_view;
+    };
+    void SetRate(double rate);
+    // Whether the picture has changed since the last call.
+    bool TakeChanged() { return m_changed.exchange(false); }
+    // The window's clipboard while there is a window; null takes it away, and the reference tone with it.
+    void SetClipboard(std::function<bool(const std::string&)> copy);
+
+    std::string Source() const override;
+    bool Copy(const std::string& text) override { return m_copy && m_copy(text); }
+    bool IsToneOn() const override { return m_tone.IsOn(); }
+    void SetTone(bool on) override;
+
+private:
+    void Refresh();
+
+    Tone m_tone;
+    std::function<bool(const std::string&)> m_copy;
+    std::atomic<float> m_level{-120.0f};
+    std::atomic<bool> m_changed{true};
+    std::atomic<double> m_rate{48000.0};
+    View m_view;
+    std::mutex m_mutex;
+    std::condition_variable m_end;
+    bool m_ended = false;
+    std::thread m_thread;  // last: it uses all of the others
+};
+
+}  // namespace analyser

@@ -1,0 +1,252 @@
+#include "View.h"
+
+#include <algorithm>
+#include <cmath>
+#include <utility>
+
+#include "Commands.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Tuner/Tuner.h"
+
+namespace analyser {
+namespace {
+
+using Plot = Corvo::AnalyserReading::Plot;
+
+constexpr float kHeard = 0.001f;       // -60 dB
+constexpr float kDragDistance = 4.0f;  // in 1/96 inch
+constexpr double kZoomStep = 0.8, kNarrowest = 1.0 / 16.0;
+constexpr int kSaidFor = 120;  // refreshes
+
+Corvo::RectF Unit() { return {0.0f, 0.0f, 1.0f, 1.0f}; }
+
+}  // namespace
+
+View::View(Shell& shell) : m_shell(shell) {
+    kivspectrum& first = GetAnalyser();
+    first.SetOn(true);
+    first.SetTunerOn(true);
+    Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
+    Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
+    Do(kShowBoth);
+    m_choices = 0;
+}
+
+void View::Feed(const float* samples, int frames, int channels) {
+    if (!samples || frames < 1 || channels < 1) return;
+    float peak = 0.0f;
+    for (int i = 0; i < frames * channels; ++i) peak = std::max(peak, std::abs(samples[i]));
+    if (peak > m_peak.load(std::memory_order_relaxed)) m_peak.store(peak, std::memory_order_relaxed);
+    if (peak > kHeard) m_heard.store(true, std::memory_order_relaxed);
+    const bool apart = m_apart.load(std::memory_order_relaxed) && channels > 1;
+    m_analysers[0].Feed(samples, frames, channels, apart ? 1 : channels);
+    if (apart) m_analysers[1].Feed(samples + 1, frames, channels, 1);
+}
+
+void View::SetSamplingRate(int rate) {
+    m_rate = rate;
+    for (kivspectrum& each : m_analysers) each.set_parameters(rate);
+}
+
+int View::Rate() const {
+    const int prepared = GetAnalyser().GetSpectrumDrawer()->GetSamplingFrequency();
+    return prepared > 0 ? prepared : m_rate;
+}
+
+void View::StartOver() {
+    for (kivspectrum& each : m_analysers) {
+        each.GetSonogram()->Clear();
+        each.GetTuner()->Forget();
+        each.peak_reset();
+    }
+    m_dirty = true;
+}
+
+void View::SetTime(double seconds) {
+    for (kivspectrum& each : m_analysers) each.GetSonogram()->SetTimeAtRightEdge(seconds);
+}
+
+bool View::Refresh() {
+    // A file that rests leaves its last picture as it is.
+    const auto playback = m_shell.GetPlayback();
+    if (!playback || playback->playing)
+        for (kivspectrum& each : m_analysers)
+            if (each.Refresh()) m_dirty = true;
+    if (m_saidFor > 0 && --m_saidFor == 0) {
+        m_said.clear();
+        m_dirty = true;
+    }
+    return std::exchange(m_dirty, false);
+}
+
+// The channels apart: the second shows as the first does, but has no tuner of its own.
+void View::FollowFirst() {
+    const kivspectrum& first = GetAnalyser();
+    kivspectrum& second = m_analysers[1];
+    const bool apart = kivspectrum::GetSettings().view_flag_a != 0;
+    m_apart.store(apart, std::memory_order_relaxed);
+    second.SetOn(apart && first.GetOn());
+    if (second.GetFrozen() != first.GetFrozen()) second.SetFrozen(first.GetFrozen());
+    while (second.GetDisplayMode() != first.GetDisplayMode()) second.ToggleDisplayMode();
+    second.SetFrequencySpan(first.GetFrequencySpan());
+}
+
+void View::ShowMode(kivspectrum::_display_mode mode) {
+    kivspectrum& first = GetAnalyser();
+    while (first.GetDisplayMode() != mode) first.ToggleDisplayMode();
+    if (mode != kivspectrum::display_tuner || first.GetTunerOn()) return;
+    first.ToggleTuner();
+    first.ShowTuner(false);
+}
+
+Corvo::AnalyserReading View::ReadingAt(float x, float y) const {
+    const Corvo::AnalyserReading reading = GetAnalyser().GetReading(x, y);
+    return reading.plot != Plot::None || !m_apart ? reading : m_analysers[1].GetReading(x, y);
+}
+
+void View::Pin(const Corvo::AnalyserReading& reading) {
+    for (kivspectrum& each : m_analysers) each.SetMarker(reading);
+}
+
+// Places along the whole axis, from 0 to 1.
+void View::SetSpan(double low, double high) {
+    const auto whole = SpectrumMap(Unit(), kivspectrum::GetSettings(), Rate());
+    const bool all = high - low >= 0.9999;
+    GetAnalyser().SetFrequencySpan(
+        all ? Corvo::FrequencySpan{}
+            : Corvo::FrequencySpan{whole.XToFrequency(low), whole.XToFrequency(high)});
+    FollowFirst();
+}
+
+void View::Zoom(double aroundHz, double factor) {
+    const auto whole = SpectrumMap(Unit(), kivspectrum::GetSettings(), Rate());
+    const auto span = GetAnalyser().GetFrequencySpan();
+    const bool all = span == Corvo::FrequencySpan{};
+    const double low = all ? 0.0 : std::max(static_cast<double>(whole.FrequencyToX(span.lowest)), 0.0);
+    const double high = all ? 1.0 : std::min(static_cast<double>(whole.FrequencyToX(span.highest)), 1.0);
+    const double width = std::clamp((high - low) * factor, kNarrowest, 1.0);
+    const double around = aroundHz > 0.0 ? whole.FrequencyToX(aroundHz) : (low + high) / 2.0;
+    const double share = high > low ? std::clamp((around - low) / (high - low), 0.0, 1.0) : 0.5;
+    const double from = std::clamp(around - share * width, 0.0, 1.0 - width);
+    SetSpan(from, from + width);
+}
+
+// What stood at one frequency stands at another one's place then.
+void View::Pan(double fromHz, double toHz) {
+    const auto whole = SpectrumMap(Unit(), kivspectrum::GetSettings(), Rate());
+    const auto span = GetAnalyser().GetFrequencySpan();
+    if (span == Corvo::FrequencySpan{}) return;
+    const double low = whole.FrequencyToX(span.lowest), width = whole.FrequencyToX(span.highest) - low;
+    const double moved = whole.FrequencyToX(fromHz) - whole.FrequencyToX(toHz);
+    const double from = std::clamp(low + moved, 0.0, std::max(1.0 - width, 0.0));
+    SetSpan(from, from + width);
+}
+
+void View::PointTo(float x, float y) {
+    m_pointer = {x, y};
+    m_dirty = true;
+    if (m_menu.IsOpen()) {
+        m_menu.PointTo(m_pointer);
+        return;
+    }
+    for (kivspectrum& each : m_analysers) each.SetPointer(x, y);
+    if (!m_drag) return;
+    const float distance = kDragDistance * m_dpi / 96.0f;
+    if (std::hypot(x - m_drag->x, y - m_drag->y) > distance) m_drag->moved = true;
+    if (!m_drag->moved) return;
+    if (m_drag->seeks) return SeekTo(x);
+    const auto now = ReadingAt(x, y);
+    if (now.plot != m_drag->start.plot || now.plot == Plot::None) return;
+    Pan(m_drag->start.frequency, now.frequency);
+}
+
+void View::PointerLeft() {
+    for (kivspectrum& each : m_analysers) each.ClearPointer();
+    m_pointer = {-1.0f, -1.0f};
+    m_dirty = true;
+}
+
+void View::Press(const PointerPress& press) {
+    m_dirty = true;
+    m_keysShown = false;
+    const Corvo::PointF place{press.x, press.y};
+    if (m_menu.IsOpen()) {
+        if (const auto chosen = m_menu.Press(place)) Do(*chosen);
+        return;
+    }
+    if (press.button == Button::Right) {
+        for (kivspectrum& each : m_analysers) each.ClearPointer();
+        return m_menu.Open(MakeMenu(), place);
+    }
+    const auto reading = ReadingAt(press.x, press.y);
+    if (press.clicks == 2 && reading.plot != Plot::None) {
+        m_drag.reset();
+        Pin({});
+        Do(kWholeRange);
+        return;
+    }
+    m_drag = Drag{reading, press.x, press.y};
+    m_drag->seeks = Contains(m_bar.timeline, place);
+    if (m_drag->seeks) SeekTo(press.x);
+}
+
+void View::Release(float x, float y) {
+    if (!m_drag) return;
+    const bool click = !m_drag->moved && !m_drag->seeks;
+    m_drag.reset();
+    const auto reading = ReadingAt(x, y);
+    if (click && reading.plot != Plot::None) Pin(reading);
+    m_dirty = true;
+}
+
+void View::SeekTo(float x) {
+    const auto playback = m_shell.GetPlayback();
+    if (!playback || m_bar.timeline.width <= 0.0f) return;
+    const double share = std::clamp((x - m_bar.timeline.x) / m_bar.timeline.width, 0.0f, 1.0f);
+    m_shell.Seek(share * playback->length);
+    m_dirty = true;
+}
+
+void View::Wheel(float x, float y, float steps, bool control) {
+    if (m_menu.IsOpen() || !std::isfinite(steps)) return;
+    if (control) {
+        Do(steps > 0.0f ? kFaster : kSlower);
+        return;
+    }
+    const auto reading = ReadingAt(x, y);
+    if (reading.plot == Plot::None) return;
+    Zoom(reading.frequency, std::pow(kZoomStep, std::clamp(static_cast<double>(steps), -8.0, 8.0)));
+    m_dirty = true;
+}
+
+bool View::KeyDown(const KeyPress& press) {
+    if (m_menu.IsOpen()) {
+        m_dirty = true;
+        if (const auto chosen = m_menu.KeyDown(press)) Do(*chosen);
+        return true;
+    }
+    if (press.key == kKeyEscape) {
+        const bool used = m_keysShown || GetAnalyser().GetMarker().plot != Plot::None;
+        m_keysShown = false;
+        Pin({});
+        m_dirty = m_dirty || used;
+        return used;
+    }
+    const CommandRow* const row = FindCommand(press);
+    return row && Do(row->command);
+}
+
+void View::SetTrouble(std::string sentence) {
+    if (sentence == m_trouble) return;
+    m_trouble = std::move(sentence);
+    m_dirty = true;
+}
+
+void View::Say(std::string sentence) {
+    m_said = std::move(sentence);
+    m_saidFor = kSaidFor;
+    m_dirty = true;
+}
+
+}  // namespace analyser

@@ -1,0 +1,21 @@
+#pragma once
+
+namespace Corvo {
+
+// A stretch of the frequency axis, Hz.
+struct FrequencySpan {
+    double lowest = 0.0, highest = 0.0;
+    bool operator==(const FrequencySpan&) const = default;
+};
+
+// What a place in an analyser's picture stands for.
+struct AnalyserReading {
+    enum class Plot { None, Spectrum, Sonogram };
+    Plot plot = Plot::None;
+    double frequency = 0.0;  // Hz
+    double level = 0.0;      // in the spectrum of its scale's unit, in the sonogram dB below full scale
+    double seconds = 0.0;    // in the sonogram: what its timeline says there
+    double since = 0.0;      // the same moment counted from the sonogram's beginning, which does not move
+};
+
+}  // namespace Corvo

@@ -1,0 +1,96 @@
+#include "Processor.h"
+
+#include <chrono>
+#include <cmath>
+#include <cstring>
+#include <thread>
+#include <vector>
+
+#include "Analyser/ViewFixture.h"
+#include "Spectrum/Tuner/Tuner.h"
+#include "Support/Signals.h"
+#include "Support/TwoThreads.h"
+
+namespace {
+
+using namespace analyser;
+using Hold = Processor::Hold;
+
+class ProcessorTest : public ViewTest {
+protected:
+    static constexpr double kRate = 48000.0;
+    void Process(const std::vector<float>& left, const std::vector<float>& right, std::vector<float>& outLeft,
+                 std::vector<float>& outRight) {
+        const float* const inputs[2] = {left.data(), right.data()};
+        float* const outputs[2] = {outLeft.data(), outRight.data()};
+        m_processor.Process(inputs, outputs, static_cast<unsigned>(left.size()), kRate);
+    }
+    Processor m_processor;
+};
+
+// Catches a bit that changes on the way, and a tone that sounds by itself or stays when the window has gone.
+TEST_F(ProcessorTest, PassesTheSoundThroughUnlessToneIsAskedFor) {
+    auto left = TestSupport::Noise<float>(1000), right = TestSupport::Noise<float>(1000);
+    left[7] = std::nanf("");
+    right[9] = -0.0f;
+    std::vector<float> outLeft(1000), outRight(1000);
+    const auto same = [&] {
+        Process(left, right, outLeft, outRight);
+        return std::memcmp(left.data(), outLeft.data(), 4000) == 0 &&
+               std::memcmp(right.data(), outRight.data(), 4000) == 0;
+    };
+    m_processor.SetClipboard([](const std::string&) { return true; });
+    EXPECT_TRUE(same());
+    Hold(m_processor)->Do(kTone);
+    EXPECT_FALSE(same());
+    m_processor.SetClipboard({});
+    for (int i = 0; i < 3; ++i) same();  // fades out
+    EXPECT_TRUE(same());
+}
+
+// Catches outputs that need a window, and a note that is another's.
+TEST_F(ProcessorTest, PublishesTheNoteWithoutAWindow) {
+    m_processor.SetRate(kRate);
+    const auto sine = TestSupport::Sine<float>(1600, 330.0, kRate, 0.25);
+    std::vector<float> outLeft(1600), outRight(1600);
+    const Tuner& tuner = m_processor.GetTuner();
+    for (int i = 0; i < 150 && !tuner.IsTuned(); ++i) {
+        Process(sine, sine, outLeft, outRight);
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    }
+    EXPECT_EQ(tuner.GetTunedNote(), (TunedNote{7, 4}));  // E4
+    EXPECT_NEAR(tuner.GetFrequency(), 330.0, 1.0);
+    EXPECT_NEAR(m_processor.GetLevel(), -12.0, 1.0);
+}
+
+// One thread feeds, one draws, one chooses and points, and the processor's own refreshes. Caught by the
+// sanitizers and by the test never ending.
+TEST_F(ProcessorTest, FeedsDrawsAndChoosesAtOnce) {
+    const auto noise = TestSupport::Noise<float>(512);
+    std::vector<float> outLeft(512), outRight(512);
+    AnalyserTest::Canvas canvas;
+    int drawn = 0;
+    const auto choose = [&](int round) {
+        const int command = 1200 + round % 203;
+        // The longest lengths only take time.
+        if (!((command >= 1209 && command <= 1213) || (command >= 1228 && command <= 1232)))
+            Hold(m_processor)->Do(command);
+        Hold(m_processor)->Do(kShowSpectrum + round % 5);
+        Hold(m_processor)->Wheel(static_cast<float>(round % 960), 300.0f, 1.0f, round % 7 == 0);
+        Hold(m_processor)->PointTo(static_cast<float>(round % 960), 400.0f);
+    };
+    TestSupport::WhileAnotherThread([&](int) { Process(noise, noise, outLeft, outRight); },
+                                    [&] {
+                                        TestSupport::WhileAnotherThread(choose, [&] {
+                                            const auto end = std::chrono::steady_clock::now() +
+                                                             std::chrono::milliseconds(500);
+                                            for (; std::chrono::steady_clock::now() < end; ++drawn) {
+                                                Hold hold(m_processor);
+                                                canvas.Draw(*hold.operator->());
+                                            }
+                                        });
+                                    });
+    EXPECT_GT(drawn, 0);
+}
+
+}  // namespace

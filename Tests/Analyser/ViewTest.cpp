@@ -1,0 +1,243 @@
+#include "View.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+#include <map>
+#include <string>
+
+#include "Analyser/ViewFixture.h"
+#include "Spectrum/AnalyserMenu.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Tuner/Tuner.h"
+#include "Support/Signals.h"
+
+namespace {
+
+using namespace analyser;
+using Plot = Corvo::AnalyserReading::Plot;
+
+class LiveView : public ViewTest {
+protected:
+    void SetUp() override { Draw(); }
+    void Draw() { m_canvas.Draw(m_view); }
+    void Hear(double hz, double amplitude, double seconds = 0.5) {
+        constexpr int kRate = 48000, kRefresh = kRate / 30;
+        m_view.SetSamplingRate(kRate);
+        const auto sine =
+            TestSupport::Sine<float>(static_cast<std::size_t>(seconds * kRate), hz, kRate, amplitude);
+        for (std::size_t i = 0; i + kRefresh <= sine.size(); i += kRefresh) {
+            m_view.Feed(sine.data() + i, kRefresh, 1);
+            m_view.Refresh();
+        }
+        Draw();
+    }
+    void Press(char32_t key, bool control = false) {
+        m_view.KeyDown({key, control});
+        Draw();
+    }
+    // The first place from the left or, upright, from above that shows a frequency from `hz` on.
+    Corvo::PointF PlaceOf(Plot plot, double hz) {
+        for (float y = 595.0f; y > 0.0f; y -= 1.0f)
+            for (float x = 60.0f; x < 900.0f; x += 1.0f) {
+                const auto reading = m_view.GetAnalyser().GetReading(x, y);
+                if (reading.plot != plot) continue;
+                if (reading.frequency >= hz) return {x, y};
+                if (plot == Plot::Sonogram) break;
+            }
+        return {-1.0f, -1.0f};
+    }
+    double FrequencyAt(Corvo::PointF place) {
+        return m_view.GetAnalyser().GetReading(place.x, place.y).frequency;
+    }
+
+    AnalyserTest::TestShell m_shell;
+    View m_view{m_shell};
+    AnalyserTest::Canvas m_canvas;
+};
+
+// Catches a key that does nothing or something else than its line says.
+TEST_F(LiveView, KeysDoWhatTheirLinesSay) {
+    kivspectrum& first = m_view.GetAnalyser();
+    EXPECT_EQ(first.GetDisplayMode(), kivspectrum::display_both);
+    EXPECT_TRUE(first.IsShowTuner());
+    for (const auto& [key, mode] : {std::pair{U'1', kivspectrum::display_spectrum},
+                                    {U'2', kivspectrum::display_sonogram},
+                                    {U'4', kivspectrum::display_tuner},
+                                    {U'3', kivspectrum::display_both}}) {
+        Press(key);
+        EXPECT_EQ(first.GetDisplayMode(), mode);
+    }
+    Press(U't');
+    EXPECT_FALSE(first.IsShowTuner());
+    EXPECT_TRUE(first.GetTunerOn()) << "the trace and the plug-in's outputs go on";
+    Press(U' ');
+    EXPECT_TRUE(first.GetFrozen());
+    Press(U' ');
+    EXPECT_FALSE(first.GetFrozen());
+    Press(U'f');
+    EXPECT_TRUE(m_shell.full);
+    Press(U'a');
+    EXPECT_TRUE(m_shell.tone);
+    for (int i = 0; i < 200; ++i) Press(U',');
+    EXPECT_DOUBLE_EQ(Tuner::GetCalibrationBase(), 380.0 / 4.0);
+    for (int i = 0; i < 200; ++i) Press(U'.');
+    EXPECT_DOUBLE_EQ(Tuner::GetCalibrationBase(), 480.0 / 4.0);
+    m_view.Do(kFirstReference + 5);
+    Hear(445.0, 0.5, 1.5);
+    Press(U'c');
+    EXPECT_NEAR(4.0 * Tuner::GetCalibrationBase(), 445.0, 0.2);
+    Press(U'c', true);
+    EXPECT_NE(m_shell.copied.find("A4"), std::string::npos) << m_shell.copied;
+    EXPECT_FALSE(m_view.KeyDown({U'y'}));
+}
+
+// Catches an entry of the library's or our own that takes more than two keys, or is missing.
+TEST_F(LiveView, EveryEntryOfTheMenuIsTwoKeysAway) {
+    const std::string keys = "123456789abcdefghijklmnopqrstuvwxyz";
+    Press(U'm');
+    ASSERT_TRUE(m_view.IsMenuOpen());
+    Press(kKeyEscape);
+    EXPECT_FALSE(m_view.IsMenuOpen());
+    int found = 0;
+    for (const char group : keys)
+        for (const char entry : keys) {
+            for (const char key : {'m', group, entry}) m_view.KeyDown({static_cast<char32_t>(key)});
+            if (m_view.IsMenuOpen())
+                while (m_view.IsMenuOpen()) m_view.KeyDown({kKeyEscape});
+            else
+                ++found;
+        }
+    const auto own = std::ranges::count_if(Commands(), [](const CommandRow& row) {
+        return *row.group != '\0' && row.group != std::string("File");
+    });
+    // Beside these: speeds, colours, references, inputs.
+    EXPECT_EQ(found,
+              static_cast<int>(own + 9 + 7 + 13 + 2 + static_cast<long>(Corvo::AnalyserMenu().size())));
+}
+
+// Catches a choice that is not kept, a switch that comes back on, and a broken file that changes something.
+TEST_F(LiveView, SettingsComeBackAsTheyWere) {
+    const std::string fresh = m_view.GetSettings();
+    for (const int command : {kShowSonogram + 0, kTunerStrip + 0, kFirstSpeed + 7, kFirstColours + 3, 1283,
+                              1223, 1242, 1306, 1314, 1345, 1326, 1343, 1289, 1309})
+        m_view.Do(command);
+    TunerCalibrateTo(442.5);
+    const std::string chosen = m_view.GetSettings();
+    ASSERT_TRUE(m_view.SetSettings(fresh));
+    EXPECT_EQ(m_view.GetSettings(), fresh);
+    for (std::size_t length = 0; length < chosen.size(); length += 7)
+        if (!m_view.SetSettings(chosen.substr(0, length))) {
+            EXPECT_EQ(m_view.GetSettings(), fresh) << length;
+        } else {
+            m_view.SetSettings(fresh);
+        }
+    for (const char* broken :
+         {"", "other\n", "analyser settings 1\nView = 9\n", "analyser settings 1\nnonsense\n",
+          "analyser settings 1\nTuner reference = nan\n"}) {
+        EXPECT_FALSE(m_view.SetSettings(broken)) << broken;
+        EXPECT_EQ(m_view.GetSettings(), fresh) << broken;
+    }
+    ASSERT_TRUE(m_view.SetSettings(chosen));
+    EXPECT_EQ(m_view.GetSettings(), chosen);
+}
+
+// Catches a zoom that loses what is pointed at, a drag that goes the other way, and a reset that is none.
+TEST_F(LiveView, WheelAndDragMoveTheFrequencies) {
+    Hear(1000.0, 0.5);
+    for (const Plot plot : {Plot::Spectrum, Plot::Sonogram}) {
+        const Corvo::PointF place = PlaceOf(plot, 1000.0);
+        m_view.Wheel(place.x, place.y, 5.0f, false);
+        Draw();
+        EXPECT_NEAR(FrequencyAt(place), 1000.0, 25.0);
+        const auto span = m_view.GetAnalyser().GetFrequencySpan();
+        EXPECT_GT(span.lowest, 100.0);
+        EXPECT_LT(span.highest, 10000.0);
+        const Corvo::PointF to = plot == Plot::Spectrum ? Corvo::PointF{place.x + 40, place.y}
+                                                        : Corvo::PointF{place.x, place.y - 20};
+        m_view.Press({Button::Left, place.x, place.y});
+        m_view.PointTo(to.x, to.y);
+        m_view.Release(to.x, to.y);
+        Draw();
+        EXPECT_NEAR(FrequencyAt(to), 1000.0, 25.0);
+        EXPECT_EQ(m_view.GetAnalyser().GetMarker().plot, Plot::None) << "a drag is no click";
+        m_view.Press({Button::Left, to.x, to.y});
+        m_view.Release(to.x, to.y);
+        EXPECT_NEAR(m_view.GetAnalyser().GetMarker().frequency, 1000.0, 25.0);
+        m_view.Press({Button::Left, to.x, to.y, 2});
+        m_view.Release(to.x, to.y);
+        Draw();
+        EXPECT_EQ(m_view.GetAnalyser().GetFrequencySpan(), Corvo::FrequencySpan{});
+        EXPECT_EQ(m_view.GetAnalyser().GetMarker().plot, Plot::None);
+    }
+}
+
+// Catches files that are cut off, levels that are not those of the picture, and one file that takes another's
+// place.
+TEST_F(LiveView, WritesThePictureAndItsNumbers) {
+    namespace fs = std::filesystem;
+    const fs::path folder = fs::temp_directory_path() / "analyser_view_test";
+    fs::remove_all(folder);
+    m_view.SetFolder(folder.string());
+    Hear(1500.0, 0.1, 2.0);
+    for (const char32_t key : {U'p', U'p', U's', U'd'}) Press(key);
+    std::map<std::string, int> endings;
+    for (const auto& entry : fs::directory_iterator(folder)) ++endings[entry.path().extension().string()];
+    EXPECT_EQ(endings, (std::map<std::string, int>{{".csv", 2}, {".pdf", 1}, {".png", 2}, {".svg", 1}}));
+    double loudest = 0.0, level = -1000.0;
+    for (const auto& entry : fs::directory_iterator(folder)) {
+        std::ifstream file(entry.path());
+        std::string text((std::istreambuf_iterator<char>(file)), {});
+        const std::string ending = entry.path().extension().string();
+        const std::map<std::string, std::string> ends{
+            {".png", "IEND"}, {".pdf", "%%EOF"}, {".svg", "</svg>"}, {".csv", "\n"}};
+        EXPECT_NE(text.rfind(ends.at(ending)), std::string::npos) << ending;
+        if (ending != ".csv") continue;
+        double hz = 0.0, decibels = 0.0;
+        for (std::size_t at = text.find('\n') + 1; at < text.size(); at = text.find('\n', at) + 1)
+            if (std::sscanf(text.c_str() + at, "%lf,%lf", &hz, &decibels) == 2 && decibels > level) {
+                level = decibels;
+                loudest = hz;
+            }
+    }
+    EXPECT_NEAR(loudest, 1500.0, 6.0);
+    EXPECT_NEAR(level, -20.0, 1.5);
+    fs::remove_all(folder);
+    m_view.SetFolder("/proc/nowhere");
+    Press(U'p');  // says so, and nothing else happens
+}
+
+// Catches a click beside its place in the file, and a picture that goes on while the file rests.
+TEST_F(LiveView, TheTimelineSeeks) {
+    m_shell.playback = Playback{0.0, 100.0, true};
+    Draw();
+    double before = -1.0;
+    for (float x = 200.0f; x <= 700.0f; x += 100.0f) {
+        m_view.Press({Button::Left, x, 590.0f});
+        m_view.Release(x, 590.0f);
+        EXPECT_GT(m_shell.playback->position, before);
+        before = m_shell.playback->position;
+    }
+    Press(kKeyLeft);
+    EXPECT_NEAR(m_shell.playback->position, before - 5.0, 1e-9);
+    Press(U'k');
+    EXPECT_FALSE(m_shell.playback->playing);
+}
+
+// Catches channels that are mixed although they are to be shown apart.
+TEST_F(LiveView, ShowsTheChannelsApart) {
+    m_view.Do(1282);
+    m_view.SetSamplingRate(48000);
+    const auto left = TestSupport::Sine<float>(48000, 1000.0, 48000, 0.5);
+    std::vector<float> stereo(2 * left.size());
+    for (std::size_t i = 0; i < left.size(); ++i) stereo[2 * i] = left[i];
+    for (std::size_t i = 0; i + 1600 <= left.size(); i += 1600) {
+        m_view.Feed(stereo.data() + 2 * i, 1600, 2);
+        m_view.Refresh();
+    }
+    Draw();
+    const auto peak = m_view.GetAnalyser().GetSpectrumDrawer()->HighestPeak(20.0);
+    EXPECT_NEAR(peak.level, -6.0, 0.5) << "the mean of both would have -12 dB";
+}
+
+}  // namespace

@@ -1,0 +1,133 @@
+#!/usr/bin/env bash
+# window.sh [SECONDS]
+# The live analyser in a real window, on a display and with sound devices of its own: ./check analyser. Its pictures
+# are compared with dsphost's of the same moment, keys and clicks are sent to it, its window changes size a hundred
+# times, its memory is watched for SECONDS (60), and the plug-in's window opens and closes 20 times in a host.
+set -euo pipefail
+cd "$(dirname "$0")/../.."
+source Scripts/common.sh
+
+need_packages "${BUILD_PACKAGES[@]}" "${PLUGIN_PACKAGES[@]}" xvfb xdotool imagemagick sox jalv jackd2 sonic-pi-samples
+say "building"
+build_preset release dspdll-analyser dsphost
+build_preset plugins dspdll-analyser-plugin
+
+seconds=${1:-60}
+work=$(mktemp -d)
+program=$PWD/build/release/bin/dspdll-analyser host=$PWD/build/release/bin/dsphost
+recording=$(dpkg -L sonic-pi-samples | grep -m1 '/guit_em9\.flac$')
+export XDG_CONFIG_HOME=$work/config SDL_AUDIODRIVER=disk SDL_DISKAUDIOFILEIN=$work/in.raw SDL_DISKAUDIOFILE=/dev/null
+exec {free}> "$work/display"
+Xvfb -displayfd $free -screen 0 2600x1500x24 -dpi 96 > /dev/null 2>&1 &
+jobs=($!)
+trap 'kill "${jobs[@]}" 2> /dev/null || true; wait; rm -r "$work"' EXIT
+until [ -s "$work/display" ]; do sleep 0.1; done
+DISPLAY=:$(cat "$work/display")
+export DISPLAY
+
+failed=0
+fail() { echo "FAILED: $*"; failed=1; }
+start() {  # ARGUMENT...: leaves pid and window
+    "$program" --save-to "$work/out" "$@" & pid=$!
+    jobs+=($pid)
+    window=
+    for ((i = 0; i < 100 && ${#window} == 0; ++i)); do
+        sleep 0.1
+        window=$(xdotool search --pid $pid 2> /dev/null | tail -1) || true
+    done
+    xdotool mousemove 2590 1490
+    sleep 1
+}
+stop() { kill $pid && wait $pid || fail "the program ended with $?"; }
+keys() { for key in "$@"; do xdotool key --window "$window" "$key"; sleep 0.2; done; }
+chosen() { grep -qxF "$1" "$XDG_CONFIG_HOME/dspdll/analyser.conf" || fail "not chosen: $1"; }
+of() { soxi -D "$1" | awk '{print int($1) + 3}'; }
+
+say "the same pictures as dsphost's"
+for case in "1280x720 96 24" "900x520 96 24" "2400x1400 192 48"; do
+    read -r size dpi bar <<< "$case"
+    whole=${size%x*}x$((${size#*x} - bar))
+    for view in both:3 sonogram:2; do
+        rm -rf "$XDG_CONFIG_HOME"
+        start --no-audio "$recording" --size "$size" --dpi "$dpi"
+        keys t "${view#*:}"
+        sleep "$(of "$recording")"
+        import -window "$window" "$work/live.png"
+        stop
+        spectrum=()
+        [ ${view%:*} = sonogram ] || spectrum=(--spectrum)
+        "$host" sonogram "$recording" "$work/host.png" --pitch --size "$whole" --dpi "$dpi" --speed 4 -q -y "${spectrum[@]}"
+        convert "$work/live.png" -crop "$whole+0+0" +repage "$work/part.png"
+        off=$(compare -metric MAE "$work/part.png" "$work/host.png" null: 2>&1 | sed 's/.*(\(.*\))/\1/') || true
+        echo "${view%:*} $size at $dpi dots per inch: mean difference $off"
+        awk "BEGIN { exit !($off < 0.03) }" || fail "${view%:*} $size differs from dsphost's picture"
+    done
+done
+
+say "an input, keys, clicks and files"
+sox -n -r 48000 -c 2 -e floating-point -b 32 "$SDL_DISKAUDIOFILEIN" synth 60 sine 440 vol 0.5
+rm -rf "$XDG_CONFIG_HOME"
+start --size 1000x600
+sleep 2
+keys p
+sleep 1
+loudest=$(sort -t, -k2 -g -r "$work"/out/*.csv | grep -m1 '^[0-9]') || true
+echo "the loudest row: $loudest"
+awk -F, '{ exit !($1 > 434 && $1 < 446 && $2 > -8 && $2 < -5) }' <<< "$loudest" || fail "440 Hz at -6 dB are not heard"
+for line in 1:0 2:1 4:3 3:2; do
+    keys "${line%:*}"
+    sleep 2.5
+    chosen "View = ${line#*:}"
+done
+keys t bracketright comma
+xdotool mousemove --window "$window" 500 300 click 3
+keys h 2
+xdotool mousemove --window "$window" 500 300 click --repeat 3 4
+sleep 2.5
+chosen "Tuner above = 0"
+chosen "Sonogram speed = 5"
+chosen "Tuner reference = 439"
+
+say "a hundred sizes"
+for ((i = 0; i < 100; ++i)); do xdotool windowsize "$window" $((RANDOM % 1600 + 80)) $((RANDOM % 1000 + 60)); done
+xdotool windowsize --sync "$window" 800 500
+sleep 1
+import -window "$window" "$work/resized.png"
+[ "$(identify -format %wx%h "$work/resized.png")" = 800x500 ] || fail "the window is not 800x500"
+[ "$(identify -format %k "$work/resized.png")" -gt 100 ] || fail "the window is empty"
+
+say "$seconds seconds of memory"
+resident() { awk '/VmRSS/ {print $2}' /proc/$pid/status; }
+sleep 5
+before=$(resident)
+sleep "$seconds"
+after=$(resident)
+echo "from $before to $after KiB"
+[ "$after" -lt $((before + 2048)) ] || fail "the memory grows"
+stop
+
+say "a broken settings file, a file that is none, and no sound system"
+printf 'rubbish' > "$XDG_CONFIG_HOME/dspdll/analyser.conf"
+start "$0" 2> "$work/said"
+stop
+[ "$(grep -c '^dspdll-analyser: ' "$work/said")" = 2 ] || fail "two sentences were expected: $(cat "$work/said")"
+SDL_AUDIODRIVER=nosuch start
+stop
+
+say "the plug-in's window, 20 times"
+jackd -r -n "analyser$$" -d dummy -r 48000 -p 256 > /dev/null 2>&1 &
+jobs+=($!)
+sleep 2
+export JACK_DEFAULT_SERVER=analyser$$ LV2_PATH=$PWD/build/plugins/lv2
+for ((i = 0; i < 20; ++i)); do
+    timeout -s INT 4 jalv.gtk3 urn:dspdll:analyser > "$work/jalv" 2>&1 &
+    sleep 2.5
+    [ $i != 10 ] || import -window root "$work/plugin.png"
+    status=0
+    wait $! || status=$?
+    [ $status = 124 ] || fail "the host ended with $status: $(tail -3 "$work/jalv")"
+done
+[ "$(identify -format %k "$work/plugin.png")" -gt 50 ] || fail "the plug-in shows nothing"
+
+[ $failed = 0 ] && echo "the live analyser: everything passed"
+exit $failed
