@@ -140,8 +140,8 @@ void PitchDoctor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
 
 void PitchDoctor::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
-    if (frames < 1) return;
     const int channels = format->nChannels;
+    if (frames < 1 || channels < 1) return;
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&]<typename Sample>(Sample* samples) {
         m_engines->Run<Sample>({samples, samples + 1}, std::min(channels, MaxNumChannels), frames, channels);
     });
