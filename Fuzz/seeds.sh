@@ -4,7 +4,7 @@
 # needs no seeds: all bytes are valid there.
 set -euo pipefail
 host=$1 to=$2
-mkdir -p "$to"/{AudioFile,Automation,ChainText}
+mkdir -p "$to"/{AudioFile,Automation,ChainText,ScaleText}
 
 # A WAV file of `samples` 16-bit samples of noise, for the host to convert.
 samples=600
@@ -21,6 +21,10 @@ for kind in wav flac ogg aiff w64 caf au rf64; do
     { printf '\1'; cat "$to/noise.as.$kind"; } > "$to/AudioFile/$kind-pipe"
 done
 rm "$to"/noise.*
+
+printf 'A minor' > "$to/ScaleText/words"
+printf 'Bbm' > "$to/ScaleText/short"
+printf ' chromatic ' > "$to/ScaleText/blanks"
 
 cat > "$to/Automation/pairs" <<'END'
 [{"effect": "Tremolo", "parameter": "Depth", "points": [[0.0, 0.2], [0.15, 0.9]]},

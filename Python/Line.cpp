@@ -85,16 +85,16 @@ void Line::Prepare(int sample) {
                                    : dsp_equaliser_prepare(station->equaliser.get(), &format, error);
         });
     m_sample = sample;
-    Rewind();
+    GoToStart(dsp_effect_seek);
 }
 
 // Each effect's automation is timed by what it hears, which is late by what comes before it.
-void Line::Rewind() {
+void Line::GoToStart(dsp_status(DSP_CALL* go)(dsp_effect*, std::int64_t)) {
     m_position = 0;
     std::int64_t delay = 0;
     for (const auto& station : m_stations)
         if (station->effect) {
-            Check(dsp_effect_seek(station->effect.get(), -delay));
+            Check(go(station->effect.get(), -delay));
             delay += Asked(dsp_effect_latency, station->effect);
         }
 }
@@ -103,6 +103,12 @@ void Line::Reset() {
     const py::gil_scoped_release released;
     const std::lock_guard guard(m_lock);
     if (m_sample >= 0) Prepare(m_sample);
+}
+
+void Line::Rewind() {
+    const py::gil_scoped_release released;
+    const std::lock_guard guard(m_lock);
+    if (m_sample >= 0) GoToStart(dsp_effect_rewind);
 }
 
 int Line::Latency() {
@@ -213,6 +219,9 @@ void DefineLine(py::module_& module) {
         .def("__call__", &Line::Call, py::arg("x"))
         .def("process", &Line::Process)
         .def("reset", &Line::Reset, "Forgets the sound and begins anew.")
+        .def("rewind", &Line::Rewind,
+             "Begins at position 0 with delay lines cleared: quicker than reset, but what else sounds goes "
+             "on.")
         .def_property_readonly("latency", &Line::Latency, "Frames that the output is later than the input.")
         .def_property_readonly("longest_gap", &Line::LongestGap,
                                "Seconds that may pass between two echoes, as the settings are now.")

@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
 # fuzz.sh [SECONDS]: builds as ./check asan does, with Clang, warnings as errors, and lets each fuzzer run its share of the time
 # (60 s in all when nothing is said). ./check fuzz
-# Corpora grow in build/fuzz. An input that fails is left in build/fuzz/failed/TARGET: mend the fault, and keep the
-# input in Fuzz/Failed/TARGET under a name that says what it was.
+# Sessions are long from the start: from short ones a minute never gets there. Corpora grow in build/fuzz. An input
+# that fails is left in build/fuzz/failed/TARGET: mend the fault, and keep the input in Fuzz/Failed/TARGET under a
+# name that says what it was.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 source Scripts/common.sh
@@ -26,7 +27,7 @@ fuzz() {
     mkdir -p "$work/corpus/$target" "$work/failed/$target" "$work/seeds/$target"
     local known=()  # what failed before
     [ ! -d "Fuzz/Failed/$target" ] || known=("Fuzz/Failed/$target")
-    "$program" -max_total_time="$share" -timeout=20 -rss_limit_mb=3000 -max_len=8192 -print_final_stats=1 \
+    "$program" -max_total_time="$share" -timeout=20 -rss_limit_mb=3000 -max_len=8192 -len_control=0 -print_final_stats=1 \
         -artifact_prefix="$work/failed/$target/" "$work/corpus/$target" "$work/seeds/$target" "${known[@]}" 2>&1 |
         grep -v '^dsphost: warning' > "$report" || {
         tail -n 60 "$report"

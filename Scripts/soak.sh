@@ -12,7 +12,7 @@ need_packages "${BUILD_PACKAGES[@]}" "${TEST_PACKAGES[@]}" "${CLANG_PACKAGES[@]}
 say "building (asan)"
 build_preset asan fuzz_replay
 
-say "seed $seed, $seconds s"
+say "$seconds s"
 # What was freed is kept for a while to be watched: little of it, so that growth is seen.
 export ASAN_OPTIONS=allocator_may_return_null=1:quarantine_size_mb=16
 export LSAN_OPTIONS=suppressions=$PWD/Tests/leaks.supp:print_suppressions=0

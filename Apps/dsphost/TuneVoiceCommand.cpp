@@ -1,5 +1,4 @@
 #include <algorithm>
-#include <array>
 #include <cmath>
 #include <memory>
 #include <optional>
@@ -16,6 +15,7 @@
 #include "Errors.h"
 #include "Progress.h"
 #include "Render.h"
+#include "Scale.h"
 #include "Text.h"
 #include "TuneVoiceNotes.h"
 #include "TuneVoicePicture.h"
@@ -32,44 +32,6 @@ using Corvo::DSP::PitchReading;
 constexpr int kMostChannels = 2;
 constexpr double kLongestPause = 0.03;  // seconds that do not end a note
 constexpr double kShortestNote = 0.06;
-
-std::vector<std::string> ChoicesOf(Effect& effect, int parameter) {
-    std::vector<std::string> names;
-    for (const auto& choice : effect.Describe(parameter).choices) names.push_back(choice.text);
-    return names;
-}
-
-struct Scale {
-    std::string root = "C", mode = "Chromatic";
-};
-
-// "A minor", "Am", "Bb dorian", "A" (major), "chromatic".
-Scale ParseScale(const std::string& text, Effect& effect) {
-    static constexpr std::array<std::pair<const char*, const char*>, 5> kFlats{
-        {{"Db", "C#"}, {"Eb", "D#"}, {"Gb", "F#"}, {"Ab", "G#"}, {"Bb", "A#"}}};
-    const auto roots = ChoicesOf(effect, 0), modes = ChoicesOf(effect, 1);
-    Scale scale;
-    if (Trimmed(text).empty() || SameNoCase(Trimmed(text), scale.mode)) return scale;
-    const auto blank = std::min(text.find(' '), text.size());
-    scale.root = text.substr(0, blank);
-    scale.mode = Trimmed(text.substr(blank));
-    if (scale.mode.empty()) {
-        const bool minor = scale.root.size() > 1 && scale.root.back() == 'm';
-        if (minor) scale.root.pop_back();
-        scale.mode = minor ? "minor" : "major";
-    }
-    for (const auto& [flat, sharp] : kFlats)
-        if (SameNoCase(scale.root, flat)) scale.root = sharp;
-    const auto same = [&](const std::string& root) { return SameNoCase(root, scale.root); };
-    if (std::ranges::none_of(roots, same))
-        throw UserError(
-            "--scale cannot be \"" + text +
-            "\"; accepted: a root and a mode, such as \"A minor\", or short, \"Am\" or \"A\"; modes: " +
-            Joined(modes, ", "));
-    if (SameNoCase(scale.mode, "minor")) scale.mode = "Natural minor";
-    scale.mode = modes[FindName(scale.mode, modes, "scale mode")];
-    return scale;
-}
 
 // The effect as a station of a chain, which keeps what it heard.
 class VoiceTuner : public ChainElement {

@@ -173,6 +173,14 @@ def test_a_stream_keeps_its_type_and_lets_go_of_the_effect():
     assert stream.position == 0 and stream(noise(100, np.float64)).dtype == np.float64
 
 
+def test_a_rewound_stream_has_no_echoes():
+    stream = dsp.Chain([dsp.Gain(), dsp.Echo()]).stream(RATE, 2)
+    stream(noise(RATE))
+    assert np.any(stream(np.zeros((100, 2), np.float32)))
+    stream.rewind()
+    assert stream.position == 0 and not np.any(stream(np.zeros((RATE, 2), np.float32)))
+
+
 def test_automation_is_met_to_the_frame():
     level = dsp.Chorus("Off", wet_level=-float("inf"), dry_level=0)
     level.automate("Dry level", [(0.0, "0 dB"), (0.5, "-20 dB")])

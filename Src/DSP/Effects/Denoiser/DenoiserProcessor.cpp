@@ -1,7 +1,7 @@
 #include "DSP/Effects/Denoiser/DenoiserProcessor.h"
 
 #include <algorithm>
-#include <cmath>
+#include <limits>
 
 #include "DSP/Effects/Denoiser/DenoiserPresets.h"
 #include "DSP/Effects/Denoiser/DenoiserState.h"
@@ -15,6 +15,7 @@ namespace {
 using namespace Denoising;
 
 constexpr int kClear = 2;  // parameter
+constexpr double kHighestRate = 1e9;
 
 std::size_t ChannelsOf(const tWAVEFORMATEX& format) {
     return std::clamp<std::size_t>(format.nChannels, 1, kMostChannels);
@@ -68,7 +69,7 @@ double DenoiserProcessor::LearnedSeconds() { return m_state->Known().seconds; }
 
 bool DenoiserProcessor::LearnedDensity(double rate, float* density, int bins) {
     const auto& profile = m_state->Known();
-    if (!profile.Learned() || bins < 2 || !(std::isfinite(rate) && rate > 0.0)) return false;
+    if (!profile.Learned() || bins < 2 || !(rate > 0.0 && rate <= kHighestRate)) return false;
     const int length = 2 * (bins - 1);
     // The longest of what was learned that is no longer than asked for, or else the shortest.
     std::size_t which = kLengths;
@@ -84,7 +85,8 @@ bool DenoiserProcessor::LearnedDensity(double rate, float* density, int bins) {
                         channel.data(), channel.size(), length, rate);
         // The windows' squares sum up to half their length.
         const float scale = 2.0f / static_cast<float>(length) / static_cast<float>(profile.channels);
-        for (std::size_t bin = 0; bin < channel.size(); ++bin) density[bin] += scale * channel[bin];
+        for (std::size_t bin = 0; bin < channel.size(); ++bin)
+            density[bin] = std::min(density[bin] + scale * channel[bin], std::numeric_limits<float>::max());
     }
     return true;
 }

@@ -84,7 +84,7 @@ public:
     double LearnedSeconds();
     // The learned noise as power density, the mean of the channels: noise that is white and has variance v
     // has v in every bin. Bin k of `bins` stands for k * rate / 2 / (bins - 1) Hz. False, with nothing
-    // written, without a profile or for a rate that is not finite and above 0. User-interface thread;
+    // written, without a profile or for a rate that is not above 0 and at most 1e9. User-interface thread;
     // allocates.
     bool LearnedDensity(double rate, float* density, int bins);
 

@@ -26,9 +26,11 @@ struct PhaserImpl {
         last = 0.0;
     }
     // With a feedback of 100 % the chain can overflow, and would stay so. Whatever the stage, that shows at
-    // the end of the chain within a frame.
+    // the end of the chain within a frame. Without stages it may hold a number from a block of doubles that
+    // is none for floats.
+    template <typename Sample>
     void ClearUnlessFinite() {
-        if (!std::isfinite(last)) Clear();
+        if (!std::isfinite(static_cast<Sample>(last))) Clear();
     }
 
     // The all-passes' coefficients in the next frames, at most a piece of the oscillator. They are the

@@ -74,7 +74,7 @@ void Run(std::array<PhaserImpl*, 2> engines, std::array<Sample*, 2> samples, int
     for (std::size_t i = 0; i < stages; ++i)
         keep(memories[i], [i](PhaserImpl& engine) -> double& { return engine.memories[i]; });
     keep(last, [](PhaserImpl& engine) -> double& { return engine.last; });
-    for (std::size_t c = 0; c < channels; ++c) engines[c]->ClearUnlessFinite();
+    for (std::size_t c = 0; c < channels; ++c) engines[c]->template ClearUnlessFinite<Sample>();
 }
 
 }  // namespace Corvo::DSP::PhaserKernel

@@ -269,8 +269,12 @@ void GrainSynthesis::Render(std::array<const SampleHistory<double>*, 2> input, i
         const Grain& g = grain(number);
         const double open = std::ceil(g.centre - g.left / g.speed - start);
         const double close = std::ceil(last(g) - start);
-        const int begin = static_cast<int>(std::max(open, 0.0));
-        const int end = static_cast<int>(std::min(close, static_cast<double>(frames)));
+        // At a rate of a few Hz a period may have no length, and its grain no place.
+        if (!(open < close)) continue;
+        const auto within = [frames](double place) {
+            return static_cast<int>(std::clamp<double>(place, 0, frames));
+        };
+        const int begin = within(open), end = within(close);
         if (begin >= end) continue;
         for (int i = begin; i < end; ++i) {
             const double place = (start + i - g.centre) * g.speed;
