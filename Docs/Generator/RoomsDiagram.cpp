@@ -65,13 +65,14 @@ std::string DrawRooms(const std::string& readmePath) {
             svg.Text(column(0), row(i) + 4, "public headers", "start", "tick");
             continue;
         }
-        svg.Text(column(i) - 4, row(i) + 4, "■", "start", "tick");
+        svg.Text(column(i), row(i) + 5, "■");
+        svg.Line(column(0), row(i), column(i) - 6, row(i), "grid");
         for (const auto& use : rooms[i].uses) {
             const auto used = std::ranges::find(rooms, use, &Room::name);
             if (used == rooms.end()) throw std::runtime_error("the table has no room " + use);
             const auto j = static_cast<std::size_t>(used - rooms.begin());
-            svg.Line(column(i) - 6, row(i), column(j) + 2, row(i), "grid");
-            svg.Line(column(j), row(i), column(j), row(j) + 8, "arrow thin");
+            svg.Line(column(j), row(i), column(j), row(j) + 8, "arrow");
+            svg.Text(column(j), row(i) + 4, "●");
         }
     }
     return svg.Figure(right, row(rooms.size()), "rooms",
