@@ -9,7 +9,7 @@
 namespace docs {
 namespace {
 
-constexpr double kWidth = 640, kHeight = 320, kLeft = 58, kRight = 14, kTop = 34, kBottom = 46;
+constexpr double kWidth = 640, kHeight = 320, kLeft = 58, kRight = 24, kTop = 34, kBottom = 46;
 constexpr std::size_t kColours = 4;
 
 double Across(const Axis& axis, double value) {

@@ -21,6 +21,8 @@ struct Place {
 };
 using Way = std::vector<Place>;
 
+bool HasBox(const Place& place) { return place.text != "in" && place.text != "out"; }
+
 Way ReadWay(std::string_view line) {
     Way way;
     for (const auto& text : Split(line, "->")) {
@@ -60,8 +62,7 @@ void SetOut(Way& main, const std::vector<Way>& beside) {
 
 void DrawPlace(Svg& svg, const Place& place, double middle) {
     const auto parts = Split(place.text, "|");
-    if (place.text != "in" && place.text != "out")
-        svg.Box(place.left, middle - kBoxHeight / 2, place.width, kBoxHeight);
+    if (HasBox(place)) svg.Box(place.left, middle - kBoxHeight / 2, place.width, kBoxHeight);
     double y = middle + 5 - 8 * static_cast<double>(parts.size() - 1);
     for (const auto& part : parts) {
         svg.Text(place.Middle(), y, part);
@@ -84,13 +85,14 @@ void DrawBeside(Svg& svg, const Way& main, Way way, double middle, double row) {
     }
     const auto point = [](double px, double py) { return Number(px) + ',' + Number(py) + ' '; };
     // Ways that leave a place and ways that reach it stand apart.
-    const double start = from.Middle() + 6, end = to.Middle() - 6, edge = middle + kBoxHeight / 2;
-    std::string points = point(start, edge) + point(start, row);
+    const auto edge = [&](const Place& place) { return middle + (HasBox(place) ? kBoxHeight / 2 : 12); };
+    const double start = from.Middle() + 6, end = to.Middle() - 6;
+    std::string points = point(start, edge(from)) + point(start, row);
     for (std::size_t i = 1; i + 1 < way.size(); ++i) {
         svg.Path(points + point(forward ? way[i].left : way[i].Right(), row), "arrow");
         points = point(forward ? way[i].Right() : way[i].left, row);
     }
-    svg.Path(points + point(end, row) + point(end, edge), "arrow");
+    svg.Path(points + point(end, row) + point(end, edge(to)), "arrow");
 }
 
 }  // namespace

@@ -9,9 +9,8 @@ namespace docs {
 //   in -> tone filter -> boost -> shape -> out      the main way, from left to right
 //   in -> level meter -> boost                      a way beside it, between two places of the main one
 //   shape -> feedback -> boost                      the same, backwards
-// "|" breaks a line within a box. A place with no box around it is one of `in`, `out`, `+`, `x` and
-// those that begin with either of the last two. Throws std::invalid_argument for a way that begins or ends
-// nowhere.
+// "|" breaks a line within a box; `in` and `out` have none. Places on the main way have different names.
+// Throws std::invalid_argument for a way that begins or ends elsewhere.
 std::string DrawFlow(std::string_view text);
 
 }  // namespace docs

@@ -136,7 +136,7 @@ std::string DrawResponse(const Wanted& wanted) {
     });
     return DrawChart(
         {"frequency, Hz", 20, 20000, {20, 50, 100, 200, 500, 1000, 2000, 5000, 10000, 20000}, true},
-        {"gain, dB", -36, 12, Ticks(-36, 12, 12)}, curves);
+        {"gain, dB", -36, 24, Ticks(-36, 24, 12)}, curves);
 }
 
 // The curves of both sides, or one where they are the same.

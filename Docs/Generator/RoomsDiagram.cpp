@@ -66,7 +66,7 @@ std::string DrawRooms(const std::string& readmePath) {
             continue;
         }
         svg.Text(column(i), row(i) + 5, "■");
-        svg.Line(column(0), row(i), column(i) - 6, row(i), "grid");
+        if (i > 0) svg.Line(column(0), row(i), column(i) - 6, row(i), "grid");
         for (const auto& use : rooms[i].uses) {
             const auto used = std::ranges::find(rooms, use, &Room::name);
             if (used == rooms.end()) throw std::runtime_error("the table has no room " + use);
