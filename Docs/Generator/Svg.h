@@ -73,7 +73,7 @@ public:
                        std::string_view description) const {
         return "<div class=\"" + std::string(kind) + "\"><svg viewBox=\"0 0 " + Number(width) + ' ' +
                Number(height) + "\" width=\"" + Number(width) + "\" height=\"" + Number(height) +
-               "\" style=\"min-width:min(600px," + Number(width) + "px)" + "\" role=\"img\" aria-label=\"" +
+               "\" style=\"--width:" + Number(width) + "px" + "\" role=\"img\" aria-label=\"" +
                Escaped(description) +
                "\">\n<defs><marker id=\"head\" viewBox=\"0 0 8 8\" refX=\"7\" refY=\"4\" markerWidth=\"7\" "
                "markerHeight=\"7\" orient=\"auto\"><path d=\"M0,0 L8,4 L0,8 z\" "
