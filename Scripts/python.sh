@@ -5,7 +5,7 @@ cd "$(dirname "$0")/.."
 source Scripts/common.sh
 
 need_packages "${BUILD_PACKAGES[@]}" pybind11-dev python3-dev python3-numpy python3-pytest python3-soundfile \
-    python3-distributed python3-matplotlib python3-tqdm mypy
+    python3-distributed python3-matplotlib python3-tqdm mypy sonic-pi-samples
 # Debian's Python, whose packages these are, even where another one comes first.
 python=/usr/bin/python3
 say "building (python)"
@@ -14,6 +14,12 @@ cmake --build --preset python
 say "testing (python)"
 export PYTHONDONTWRITEBYTECODE=1
 PYTHONPATH=$PWD/build/python $python -m pytest -q -p no:cacheprovider Tests/Python
+
+# The blocks of Python in the documentation.
+recordings=build/python/recordings
+mkdir -p $recordings
+cp "$(dpkg -L sonic-pi-samples | grep -m1 '/guit_em9\.')" $recordings/in.flac
+PYTHONPATH=$PWD/build/python $python Scripts/doc-blocks.py build/python $recordings --python README.md
 
 say "installing (python)"
 prefix=build/python/installed

@@ -89,5 +89,5 @@ END {
     }
     if (!headers) complain("Src", "no installed header is found in any CMakeLists.txt")
     exit failed
-}' README.md $(find Src -name CMakeLists.txt) $(find Src Apps Plugins Python Fuzz -name '*.h' -o -name '*.cpp' | LC_ALL=C sort)
+}' README.md $(find Src -name CMakeLists.txt) $(find Src Apps Plugins Python Fuzz Docs -name '*.h' -o -name '*.cpp' | LC_ALL=C sort)
 echo "every room includes what the table allows"

@@ -1,0 +1,66 @@
+#include "Chart.h"
+
+#include <algorithm>
+#include <cmath>
+#include <stdexcept>
+
+#include "Svg.h"
+
+namespace docs {
+namespace {
+
+constexpr double kWidth = 640, kHeight = 320, kLeft = 58, kRight = 24, kTop = 34, kBottom = 46;
+constexpr std::size_t kColours = 4;
+
+double Across(const Axis& axis, double value) {
+    return kLeft + axis.Place(value) * (kWidth - kLeft - kRight);
+}
+double Up(const Axis& axis, double value) {
+    return kHeight - kBottom - axis.Place(value) * (kHeight - kTop - kBottom);
+}
+
+}  // namespace
+
+double Axis::Place(double value) const {
+    if (logarithmic) return std::log(std::max(value, from / 2) / from) / std::log(to / from);
+    return (value - from) / (to - from);
+}
+
+std::string DrawChart(const Axis& across, const Axis& up, const std::vector<Curve>& curves) {
+    if (curves.size() > kColours) throw std::invalid_argument("more curves than colours");
+    Svg svg;
+    for (const double tick : across.ticks) {
+        svg.Line(Across(across, tick), kTop, Across(across, tick), kHeight - kBottom, "grid");
+        svg.Text(Across(across, tick), kHeight - kBottom + 17, Number(tick, 3), "middle", "tick");
+    }
+    for (const double tick : up.ticks) {
+        svg.Line(kLeft, Up(up, tick), kWidth - kRight, Up(up, tick), "grid");
+        svg.Text(kLeft - 6, Up(up, tick) + 4, Number(tick, 3), "end", "tick");
+    }
+    svg.Text((kLeft + kWidth - kRight) / 2, kHeight - 8, across.title, "middle", "tick");
+    svg.Text(4, 13, up.title, "start", "tick");
+
+    double legend = kWidth - kRight;
+    for (std::size_t i = curves.size(); i-- > 0;) {
+        const auto& curve = curves[i];
+        const std::string colour = "curve colour" + std::to_string(i);
+        std::string points;
+        bool inside = false;
+        for (const auto& [x, y] : curve.points) {
+            inside |= y >= up.from && y <= up.to;
+            // What leaves the picture runs along its edge.
+            points +=
+                Number(Across(across, x), 2) + ',' + Number(Up(up, std::clamp(y, up.from, up.to)), 2) + ' ';
+        }
+        if (!inside) throw std::invalid_argument("the curve \"" + curve.label + "\" is not in the picture");
+        svg.Path(points, colour);
+        if (curve.label.empty()) continue;
+        svg.Text(legend, 13, curve.label, "end", "tick");
+        legend -= static_cast<double>(Characters(curve.label)) * 7.2 + 8;
+        svg.Line(legend - 20, 9, legend, 9, colour);
+        legend -= 34;
+    }
+    return svg.Figure(kWidth, kHeight, "chart", up.title + " over " + across.title);
+}
+
+}  // namespace docs

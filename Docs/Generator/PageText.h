@@ -1,0 +1,23 @@
+#pragma once
+
+#include <functional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace docs {
+
+// The parts of a text, without the blanks around them; parts with nothing else are left out.
+std::vector<std::string> Split(std::string_view text, std::string_view separator);
+// "name: rest" as both; without a colon all is name.
+std::pair<std::string, std::string> NameAndRest(std::string_view line);
+
+// What a person wrote about an effect: Markdown whose sections ("## Heading") stand in a fixed order.
+// Throws std::runtime_error, naming the file, when it cannot be read or a section is missing or unknown.
+std::vector<std::string> ReadSections(const std::string& path, const std::vector<std::string>& headings);
+
+// Replaces each block in a fence of the given kind ("```kind") by what `draw` makes of its lines.
+std::string ReplaceFences(std::string_view markdown, std::string_view kind,
+                          const std::function<std::string(std::string_view)>& draw);
+
+}  // namespace docs

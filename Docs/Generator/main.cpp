@@ -1,0 +1,42 @@
+#include <exception>
+#include <filesystem>
+#include <fstream>
+#include <iostream>
+#include <stdexcept>
+
+#include "EffectPage.h"
+#include "RoomsDiagram.h"
+
+namespace {
+
+void Write(const std::filesystem::path& path, const std::string& text) {
+    std::ofstream file(path, std::ios::binary);
+    file << text;
+    if (!file.flush()) throw std::runtime_error(path.string() + " cannot be written");
+}
+
+}  // namespace
+
+// dsp_pages SOURCE TARGET: the pages made from the library, from the project's folder into another one.
+int main(int count, char** arguments) try {
+    if (count != 3) throw std::invalid_argument("usage: dsp_pages SOURCE TARGET");
+    const std::filesystem::path source = arguments[1], target = arguments[2];
+    std::filesystem::create_directories(target / "effects");
+    std::string list;
+    for (const auto& kind : Corvo::DSP::EffectKinds()) {
+        const std::string file = docs::FileName(kind.name) + ".md";
+        const auto text = source / "Docs" / "Effects" / file;
+        try {
+            Write(target / "effects" / file, docs::EffectPage(kind, text.string()));
+        } catch (const std::exception& error) {
+            throw std::runtime_error(text.string() + ": " + error.what());
+        }
+        list += file + '\n';
+    }
+    Write(target / "effects" / "index.md", "# Effects\n\n```{toctree}\n" + list + "```\n");
+    Write(target / "rooms.html", docs::DrawRooms((source / "README.md").string()));
+    return 0;
+} catch (const std::exception& error) {
+    std::cerr << error.what() << '\n';
+    return 1;
+}
