@@ -51,7 +51,7 @@ TEST_F(ProcessorTest, PassesTheSoundThroughUnlessToneIsAskedFor) {
 // Catches outputs that need a window, and a note that is another's.
 TEST_F(ProcessorTest, PublishesTheNoteWithoutAWindow) {
     m_processor.SetRate(kRate);
-    const auto sine = TestSupport::Sine<float>(1600, 330.0, kRate, 0.25);
+    const auto sine = TestSupport::Sine<float>(1600, 330.0, static_cast<int>(kRate), 0.25);
     std::vector<float> outLeft(1600), outRight(1600);
     const Tuner& tuner = m_processor.GetTuner();
     for (int i = 0; i < 150 && !tuner.IsTuned(); ++i) {
