@@ -79,7 +79,8 @@ struct Session : Fuzz::EffectSettings {
         effect->SetEnvelopeTime(input.Flag() ? 0 : input.Raw<std::int64_t>());
     }
     void SideChain() {
-        effect->SetSidechainBusNumChannels(input.Between(0, 1), input.Between(0, 3));
+        const int bus = input.Between(0, 1);
+        effect->SetSidechainBusNumChannels(bus, input.Between(0, 3));
         sideChain = input.Samples<double>(700);
         static double* channels[2];
         channels[0] = channels[1] = sideChain.data();
