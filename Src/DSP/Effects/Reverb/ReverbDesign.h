@@ -68,7 +68,7 @@ struct ReverbDesign {
 
 private:
     void Derive(const ReverbPrivate::_transform_props& s, std::size_t side, double rate) {
-        constexpr std::int32_t kSilent = -450;
+        constexpr std::int32_t kSilent = -450, kLoudest = 100;
         constexpr std::array<int, kCombs> kBase{4, 7, 15, 29, 31, 34};
         constexpr std::array<double, kCombs> kSeconds{0.05, 0.056, 0.061, 0.068, 0.072, 0.078};
         constexpr double kLeast = 1e-5, kMost = 0.9999;
@@ -91,8 +91,8 @@ private:
 
         channel.reflections = s.mix[side] * 0.0005;
         channel.tail = (1.0 - channel.reflections) * 0.16666667;
-        channel.wet = GainFromTenthsOfDb(s.wet[side], kSilent);
-        channel.dry = GainFromTenthsOfDb(s.dry[side], kSilent);
+        channel.wet = GainFromTenthsOfDb(s.wet[side], kSilent, kLoudest);
+        channel.dry = GainFromTenthsOfDb(s.dry[side], kSilent, kLoudest);
     }
 };
 
