@@ -1,4 +1,6 @@
 // An analyser as a display has it: samples, every entry of the menu, stored settings, refreshes and pictures.
+#include <array>
+
 #include "AnalyserPicture.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/Sonogram/Sonogram.h"
@@ -29,9 +31,11 @@ struct Session {
     void Refresh() { analyser.Refresh(); }
     void Prepare() {
         const std::vector<float>* spectrum = nullptr;
-        if (analyser.GetFFTFor3DSonogram(rate, &spectrum, input.Flag(), input.Flag()))
+        std::array<bool, 6> flags;
+        for (bool& flag : flags) flag = input.Flag();
+        if (analyser.GetFFTFor3DSonogram(rate, &spectrum, flags[0], flags[1]))
             Fuzz::Require(!spectrum->empty(), "a frame has a spectrum");
-        analyser.PrepareFFTForDrawing(rate, input.Flag(), input.Flag(), input.Flag(), input.Flag());
+        analyser.PrepareFFTForDrawing(rate, flags[2], flags[3], flags[4], flags[5]);
     }
     void Rate() {
         rate = input.Flag() ? input.Between(8000, 60000) : input.Raw<std::int32_t>();
@@ -39,10 +43,9 @@ struct Session {
     }
     void Picture() { Fuzz::DrawAnything(input, analyser); }
     void Pointer() {
-        if (input.Flag())
-            analyser.SetPointer(input.Raw<float>(), input.Raw<float>());
-        else
-            analyser.SetPointer(input.Value() * 400.0f, input.Value() * 300.0f);
+        const bool any = input.Flag();
+        const float x = any ? input.Raw<float>() : input.Value() * 400.0f;
+        analyser.SetPointer(x, any ? input.Raw<float>() : input.Value() * 300.0f);
         if (input.Flag()) analyser.ClearPointer();
     }
     void Switch() {
@@ -103,8 +106,10 @@ struct Session {
     void Colours() {
         Corvo::Sonogram::SetSpeedIndex(input.Between(-1, 9));
         Corvo::Sonogram::SetColourScheme(input.Between(-1, 9));
-        analyser.GetSonogram()->GetPointAmplitude(input.Raw<float>(), input.Raw<float>(), {0, 0, 100, 100});
-        analyser.GetSonogram()->ColorFromAmplitude(input.Raw<float>(), input.Flag());
+        const auto x = input.Raw<float>(), y = input.Raw<float>();
+        analyser.GetSonogram()->GetPointAmplitude(x, y, {0, 0, 100, 100});
+        const auto amplitude = input.Raw<float>();
+        analyser.GetSonogram()->ColorFromAmplitude(amplitude, input.Flag());
     }
 };
 

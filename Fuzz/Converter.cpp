@@ -39,10 +39,12 @@ constexpr void (Stream::*kFormats[])() = {
 
 bool SetUp(Input& input, SamplingFrequencyConverter& converter) {
     static constexpr int kRates[]{44100, 48000, 8000, 96000, 192000, 11025, 1, 0, -1};
-    if (input.Flag()) return converter.InitConversion(input.OneOf(kRates), input.OneOf(kRates)) == 1;
-    if (input.Flag())
-        return converter.InitConversion(input.Between(-1, 60000), input.Between(-1, 60000)) == 1;
-    return converter.InitConversionByFactors(input.Between(-1, 400), input.Between(-1, 400)) == 1;
+    const int kind = input.Between(0, 2);
+    const auto number = [&] {
+        return kind == 0 ? input.OneOf(kRates) : input.Between(-1, kind == 1 ? 60000 : 400);
+    };
+    const int from = number(), to = number();
+    return (kind < 2 ? converter.InitConversion(from, to) : converter.InitConversionByFactors(from, to)) == 1;
 }
 
 const Fuzz::Target target("Converter", [](Input& input) {
@@ -51,9 +53,11 @@ const Fuzz::Target target("Converter", [](Input& input) {
     if (!SetUp(input, converter)) return;
     Stream stream{.input = input, .converter = converter, .channels = input.Between(1, 6)};
     converter.Init(stream.channels);
-    if (input.Flag())
+    if (input.Flag()) {
+        const auto curve = input.OneOf(kCurves);
         stream.dithers.assign(static_cast<std::size_t>(stream.channels),
-                              MakeDither(input.OneOf(kCurves), input.Flag() ? 16 : 24));
+                              MakeDither(curve, input.Flag() ? 16 : 24));
+    }
     design = converter;
     for (int step = 0; step < 60 && !input.AtEnd(); ++step) switch (input.Between(0, 9)) {
             case 0:

@@ -57,9 +57,11 @@ const Fuzz::Target target("Equaliser", [](Input& input) {
             case 1:
                 rate = input.Flag() ? input.OneOf(kRates) : input.Raw<std::int32_t>();
                 [[fallthrough]];
-            case 2:
-                eq->Cook(input.Flag(), input.Flag(), &record, rate, input.Between(-1, kChannels));
+            case 2: {
+                const bool a = input.Flag(), b = input.Flag();
+                eq->Cook(a, b, &record, rate, input.Between(-1, kChannels));
                 break;
+            }
             case 3:
                 Play<float>(input, *eq, records);
                 break;

@@ -12,7 +12,8 @@
 namespace Fuzz {
 
 // Turns the bytes of a fuzzer into decisions. Past the end everything reads as 0, so all bytes are a valid
-// input, and a shorter one makes the same decisions up to its end.
+// input, and a shorter one makes the same decisions up to its end. Each compiler reads the arguments of one
+// call in an order of its own: at most one of them may ask for a decision.
 class Input {
 public:
     explicit Input(std::span<const std::uint8_t> bytes) : m_rest(bytes) {}
@@ -45,7 +46,8 @@ public:
         return step == 255 ? Raw<float>() : static_cast<float>(step) / 254.0f;
     }
     std::vector<std::uint8_t> Bytes(int longest) {
-        const auto count = std::min(static_cast<std::size_t>(Between(0, longest)), m_rest.size());
+        const auto wanted = static_cast<std::size_t>(Between(0, longest));
+        const auto count = std::min(wanted, m_rest.size());
         const auto bytes = m_rest.first(count);
         m_rest = m_rest.subspan(count);
         return {bytes.begin(), bytes.end()};

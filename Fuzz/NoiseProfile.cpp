@@ -51,7 +51,8 @@ const Fuzz::Target target("NoiseProfile", [](Input& input) {
     static const auto learned = Learned();
     const int bins = input.Between(0, 5000);
     const double rate = input.Flag() ? 48000.0 : input.Raw<double>();
-    const auto format = Format(input.Flag() ? 48000 : input.Between(1, 50000), input.Between(1, 2));
+    const int formatRate = input.Flag() ? 48000 : input.Between(1, 50000);
+    const auto format = Format(formatRate, input.Between(1, 2));
     auto bytes = learned;
     if (input.Flag()) {
         for (int i = input.Between(0, 8); i > 0; --i) {

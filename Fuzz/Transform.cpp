@@ -39,12 +39,16 @@ const Fuzz::Target target("Transform", [](Input& input) {
     CorvoFFT fft;
     void* block = nullptr;
     for (int step = 0; step < 40 && !input.AtEnd(); ++step) switch (input.Between(0, 5)) {
-            case 0:
-                fft.Allocate(input.Between(-2, kLongest), input.Flag());
+            case 0: {
+                const int length = input.Between(-2, kLongest);
+                fft.Allocate(length, input.Flag());
                 break;
-            case 1:
-                fft.AllocateReal(input.Between(-2, kLongest), input.Flag());
+            }
+            case 1: {
+                const int length = input.Between(-2, kLongest);
+                fft.AllocateReal(length, input.Flag());
                 break;
+            }
             case 2:
                 Transform<float>(input, fft);
                 break;

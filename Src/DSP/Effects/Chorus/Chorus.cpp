@@ -20,7 +20,7 @@ using Props = ChorusPrivate::_transform_props;
 using Sides = std::array<ChorusPrivate::Side, 2>;
 using ChorusPresets::kPresets;
 
-constexpr std::int32_t kSilent = -960;
+constexpr std::int32_t kSilent = -960, kLoudest = 100;
 
 // clang-format off
 constexpr std::array<ParameterRow, 10> kRows{{
@@ -101,8 +101,8 @@ bool Chorus::InitState(const Props& settings, bool reset) {
     for (std::size_t i = 0; i < 2; ++i) {
         auto& side = (*m_sides)[i];
         side.oscillator.SetIncrement(kRadiansPerStep / static_cast<double>(hz) * settings.frequency[i]);
-        side.wet = GainFromTenthsOfDb(settings.wet[i], kSilent);
-        side.dry = GainFromTenthsOfDb(settings.dry[i], kSilent);
+        side.wet = GainFromTenthsOfDb(settings.wet[i], kSilent, kLoudest);
+        side.dry = GainFromTenthsOfDb(settings.dry[i], kSilent, kLoudest);
         const auto delay = std::clamp<std::int64_t>(settings.delay[i] * hz / 10000, 0, longest);
         const auto depth = std::clamp<std::int64_t>(settings.depth[i] * delay / 1000, 0, delay);
         side.base = static_cast<int>(delay - depth);

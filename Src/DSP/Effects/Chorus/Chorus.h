@@ -33,8 +33,8 @@ struct Side;
 // so that the delay runs from the whole ring down to nothing.
 //
 // Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for float.
-// The delay lines hold floats. Channels after the second pass unchanged, and so does everything when there
-// was no memory for the ring. No latency.
+// The delay lines hold floats, of what is beyond them the largest. Channels after the second pass unchanged,
+// and so does everything when there was no memory for the ring. No latency.
 //
 // Memory: InitProcessing makes a ring for 10 s. Settings from a chunk beyond that, or beyond the ring when
 // the format changed without InitProcessing, are limited to what the ring holds. The ring keeps its contents

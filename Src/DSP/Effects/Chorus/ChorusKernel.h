@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <limits>
 
 #include "DSP/Parts/SineOscillator.h"
 
@@ -48,6 +49,12 @@ struct Side {
     }
 
 private:
+    static float Kept(float sample) { return sample; }
+    // What no float can hold would come back as an infinity, and between two samples as no number at all.
+    static float Kept(double sample) {
+        constexpr double kMost = std::numeric_limits<float>::max();
+        return static_cast<float>(std::clamp(sample, -kMost, kMost));
+    }
     // At least 1: a ring that became shorter may have left the index at its end, for one frame.
     int FramesToWrap(const Ring& ring) const {
         return std::max((ring.length - write + ring.channels - 1) / ring.channels, 1);
@@ -69,7 +76,7 @@ private:
             next -= next >= length ? length : 0;
             const double x = *samples, here = memory[at];
             const double delayed = (memory[next] - here) * fractions[i] + here;
-            *written = static_cast<float>(x);
+            *written = Kept(*samples);
             *samples = static_cast<Sample>(delayed * wet + x * dry);
         }
         write += frames * step;

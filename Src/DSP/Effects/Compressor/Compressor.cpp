@@ -23,7 +23,6 @@ namespace {
 enum Pair { kAttack, kRelease, kOutGain, kThreshold, kRatio, kStereoLink, kMakeUp, kMonitor };
 
 constexpr std::int32_t kShortestTime = 1, kLongestTime = 100000;
-constexpr std::int32_t kHighestOutGain = 200;  // tenths of a decibel
 constexpr int kDefaultPreset = 1;
 constexpr int kChunkSize = 16112;
 constexpr double kHighestRatioShown = 100.0;

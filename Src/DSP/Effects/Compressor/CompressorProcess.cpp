@@ -47,7 +47,7 @@ void Compressor::InitState(bool forced) {
         c.attack[channel] = coefficient(parameters.attack[channel] * fs * 0.00001);
         // Ten times slower than the attack at the same setting; projects were mixed with that.
         c.release[channel] = coefficient(parameters.release[channel] * fs * 0.0001);
-        c.outGain[channel] = GainFromTenthsOfDb(parameters.outGain[channel], kSilentOutGain);
+        c.outGain[channel] = GainFromTenthsOfDb(parameters.outGain[channel], kSilentOutGain, kHighestOutGain);
         if (parameters.makeUp != 0) {
             const double fullScale = curves.m_comp_map[channel].end()[-1].y;
             c.outGain[channel] *= fullScale * kMostMakeUp > 1.0 ? 1.0 / fullScale : kMostMakeUp;

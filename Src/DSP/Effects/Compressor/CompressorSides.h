@@ -13,8 +13,8 @@
 
 namespace Corvo::DSP::CompressorPrivate {
 
-constexpr std::int32_t kMonitorFlag = 1;       // of the flags word
-constexpr std::int32_t kSilentOutGain = -960;  // tenths of a decibel
+constexpr std::int32_t kMonitorFlag = 1;                              // of the flags word
+constexpr std::int32_t kSilentOutGain = -960, kHighestOutGain = 200;  // tenths of a decibel
 
 // Settings as they travel between the threads, with the number of the user interface's submission that they
 // are, or derive from.

@@ -25,6 +25,7 @@ using namespace EchoDelay;
 using namespace EchoPresets;
 
 constexpr std::int32_t kFeedbackFloor = -300, kEchoFloor = -300, kOutputFloor = -960;
+constexpr std::int32_t kLoudestEcho = 100, kLoudestOutput = 200;
 // The echo is silent at -300 already, and shows that as a number.
 constexpr std::int32_t kEchoShownSilent = -960;
 
@@ -74,6 +75,7 @@ const EffectTable& Table() {
 }
 
 constexpr double kMixStep = 0.0005;
+constexpr std::int32_t kMostMix = 2000;
 constexpr double kLongestTimeMs = 10000.0, kLongestNoteMs = 60000.0;
 constexpr int kShortestDelay = 10;  // samples
 
@@ -154,12 +156,12 @@ bool Echo::InitState(bool reset) {
     const double longest = IsTempo(settings.mode) ? kLongestNoteMs : kLongestTimeMs;
     std::array<int, 2> lengths;
     for (std::size_t i = 0; i < 2; ++i) {
-        const double wet = settings.mix[i] * kMixStep;
-        m_delay->sides[i] = {.feedback = GainFromTenthsOfDb(settings.decay[i], kFeedbackFloor),
-                             .echo = GainFromTenthsOfDb(settings.delayGain[i], kEchoFloor),
+        const double wet = std::clamp(settings.mix[i], 0, kMostMix) * kMixStep;
+        m_delay->sides[i] = {.feedback = GainFromTenthsOfDb(settings.decay[i], kFeedbackFloor, kLoudestEcho),
+                             .echo = GainFromTenthsOfDb(settings.delayGain[i], kEchoFloor, kLoudestEcho),
                              .wet = wet,
                              .dry = 1.0 - wet,
-                             .output = GainFromTenthsOfDb(settings.outGain[i], kOutputFloor)};
+                             .output = GainFromTenthsOfDb(settings.outGain[i], kOutputFloor, kLoudestOutput)};
         // Settings of any origin: a delay beyond its mode's range is the longest there is.
         const double ms = std::min(DelayMs(settings.mode, settings.depth[i]), longest);
         lengths[i] = static_cast<int>(std::max(ms * hz * 0.001, static_cast<double>(kShortestDelay)));

@@ -42,7 +42,7 @@ struct ReverbDesign {
     int allPass = 1;
     bool filtersInput = true;
 
-    // Settings from anywhere: words that size a buffer or a loop are brought into their ranges.
+    // Settings from anywhere: words that size a buffer or a loop, and levels, are brought into their ranges.
     ReverbDesign(const ReverbPrivate::_transform_props& s, double rate) {
         constexpr std::array<double, kCombs> kDamping{0.46, 0.48, 0.5, 0.52, 0.53, 0.55};
         // The left side's damping serves both: the right one is kept and shown only.
@@ -68,7 +68,7 @@ struct ReverbDesign {
 
 private:
     void Derive(const ReverbPrivate::_transform_props& s, std::size_t side, double rate) {
-        constexpr std::int32_t kSilent = -450;
+        constexpr std::int32_t kSilent = -450, kLoudest = 100, kMixTop = 2000;
         constexpr std::array<int, kCombs> kBase{4, 7, 15, 29, 31, 34};
         constexpr std::array<double, kCombs> kSeconds{0.05, 0.056, 0.061, 0.068, 0.072, 0.078};
         constexpr double kLeast = 1e-5, kMost = 0.9999;
@@ -89,10 +89,10 @@ private:
         const double ratio = std::clamp(1.0 - 0.366 / (s.length[side] * 0.001), kLeast, kMost);
         for (std::size_t i = 0; i < kCombs; ++i) channel.feedback[i] = (1.0 - damping[i]) * ratio;
 
-        channel.reflections = s.mix[side] * 0.0005;
+        channel.reflections = std::clamp(s.mix[side], 0, kMixTop) * 0.0005;
         channel.tail = (1.0 - channel.reflections) * 0.16666667;
-        channel.wet = GainFromTenthsOfDb(s.wet[side], kSilent);
-        channel.dry = GainFromTenthsOfDb(s.dry[side], kSilent);
+        channel.wet = GainFromTenthsOfDb(s.wet[side], kSilent, kLoudest);
+        channel.dry = GainFromTenthsOfDb(s.dry[side], kSilent, kLoudest);
     }
 };
 

@@ -132,9 +132,9 @@ void Autovol::InitState(const Props& settings, const tWAVEFORMATEX& format, bool
         auto& side = (*m_sides)[i];
         if (force) side.oscillator.SetPhase(0.0);
         side.oscillator.SetIncrement(kRadiansPerRateStep * settings.rate[i] / hz);
-        // Words of a chunk may be anything; they sound like the nearest that the knobs reach.
-        const double gain = GainFromTenthsOfDb(std::min(settings.outGain[i], kLoudest), kSilent);
+        const double gain = GainFromTenthsOfDb(settings.outGain[i], kSilent, kLoudest);
         const double signedGain = settings.invert[i] == 1 ? -gain : gain;
+        // Words of a chunk may be anything; they sound like the nearest that the knobs reach.
         const double depth = std::clamp(settings.depth[i], 0, kWhole) * kPerMille;
         const double mix = std::clamp(settings.mix[i], 0, kWhole) * kPerMille;
         if (settings.ringMod[i] == 1) {
