@@ -13,7 +13,7 @@
 namespace Corvo::Plugins {
 namespace {
 
-constexpr int kStep = 4;          // frames between two steps of a glide
+constexpr int kStep = 4;          // frames between two steps of a glide, and of a short piece
 constexpr double kGlide = 0.010;  // seconds
 constexpr double kBypass = 0.020;
 constexpr double kLongestLag = 0.5;  // seconds of latency that the bypass can follow
@@ -236,7 +236,7 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
     for (int done = 0; done < frames;) {
         const bool gliding = gate && m_gliding > 0;
         if (gliding) StepGlides();
-        const int piece = std::min(frames - done, gliding ? kStep : m_longest);
+        const int piece = std::min(frames - done, gliding || m_row.shortPieces ? kStep : m_longest);
         std::array<const float*, 2> from{}, beside{};
         std::array<float*, 2> to{};
         for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {

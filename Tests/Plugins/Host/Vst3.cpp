@@ -295,12 +295,13 @@ public:
     }
     std::uint32_t Latency() override { return m_processor->get_latency_samples(m_processor.Get()); }
 
-    // A host sends a change to both halves; the processor gets it with a block.
+    // A host sends a change to both halves; the processor gets it without audio.
     void Flush(std::span<const Change> changes) override {
         for (const Change& change : changes)
             m_controller->set_parameter_normalised(m_controller.Get(), change.parameter, change.value);
-        RenderAt(*this, 48000, Signal(static_cast<std::size_t>(Channels(inputs)), std::vector<float>(64)),
-                 {.block = 64, .changes = changes});
+        Expect(Activate(48000, 64), "cannot be activated");
+        OnAudioThread([&] { FlushActive(changes); });
+        Deactivate();
     }
     void FlushActive(std::span<const Change> changes) override { Process({{}, {}, 0, changes}); }
 
