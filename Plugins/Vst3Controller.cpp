@@ -45,7 +45,8 @@ double Vst3Plugin::Value(v3_param_id id) {
     return index ? m_values[*index].load() : 0.0;
 }
 
-// The processor gets the same value from the host, with a block; a program it would have to wait for.
+// The processor gets the same value from the host, with a block; a program it would have to wait for. Hosts
+// may hold a lock here that restart_component takes: what a program changes is sent with the next block.
 v3_result Vst3Plugin::SetValue(v3_param_id id, double normalised) {
     const auto index = m_parameters.Find(id);
     if (!index || !std::isfinite(normalised)) return V3_INVALID_ARG;
@@ -55,9 +56,9 @@ v3_result Vst3Plugin::SetValue(v3_param_id id, double normalised) {
     if (const int program = ProgramNow(); program != before) {
         m_adapter.TakePreset(program);
         ShowValues();
-        Restart(V3_RESTART_PARAM_VALUES_CHANGED);
+        m_sendAll = true;
     }
-    TellLatency();
+    if (id == Vst3Parameters::kLatency) TellLatency();
     return V3_OK;
 }
 

@@ -124,6 +124,7 @@ private:
     bool m_active = false, m_ran = false;
     bool m_sideIsMono = false;
     std::atomic<bool> m_sideIsOn{false};
+    std::atomic<bool> m_sendAll{false};  // values, with the next block
     std::atomic<int> m_toldLatency{0};
     int m_sentLatency = 0;
 };

@@ -149,12 +149,13 @@ void Vst3Plugin::TakeChange(v3_param_id id, double normalised) {
 
 // What became different by itself. The host hands it to the controller on its own thread.
 void Vst3Plugin::Send(v3_param_changes** changes) {
-    if (m_adapter.TakeOtherValues())
+    const bool all = m_sendAll.exchange(false);
+    if (m_adapter.TakeOtherValues() || all)
         for (std::size_t i = 0; i < m_adapter.Ports().size(); ++i) {
             const auto id = static_cast<v3_param_id>(i + 1);
             const auto plain = static_cast<double>(m_adapter.Value(static_cast<int>(i)));
             const double value = m_parameters.Normalised(id, plain);
-            if (std::abs(value - m_values[id]) < 1e-5) continue;
+            if (!all && std::abs(value - m_values[id]) < 1e-5) continue;
             m_values[id] = value;
             SendValue(changes, id, value);
         }
