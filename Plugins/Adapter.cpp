@@ -13,7 +13,7 @@
 namespace Corvo::Plugins {
 namespace {
 
-constexpr int kStep = 4;          // frames between two steps of a glide
+constexpr int kStep = 4;          // frames between two steps of a glide, and of a short piece
 constexpr double kGlide = 0.010;  // seconds
 constexpr double kBypass = 0.020;
 constexpr double kLongestLag = 0.5;  // seconds of latency that the bypass can follow
@@ -52,14 +52,19 @@ Adapter::Adapter(const PluginRow& row, int channels, Start start)
       m_planar(m_effect->SupportsNoninterleaved()),
       m_controls(m_layout.ports.size()) {
     m_effect->SetHostCallback(this);
-    if (m_effect->GetNumSidechainBusses() > 0) {
-        m_sideChannels = std::min(channels, m_effect->GetSidechainBusNumChannelsMax(0));
-        m_effect->SetSidechainBusNumChannels(0, m_sideChannels);
-    }
+    SetChannels(channels);
     ReadBack();
 }
 
 Adapter::~Adapter() = default;
+
+void Adapter::SetChannels(int channels) {
+    m_longest = 0;
+    m_channels = channels;
+    if (m_effect->GetNumSidechainBusses() == 0) return;
+    m_sideChannels = std::min(channels, m_effect->GetSidechainBusNumChannelsMax(0));
+    m_effect->SetSidechainBusNumChannels(0, m_sideChannels);
+}
 
 void Adapter::GetTimeSignature(int& numerator, int& denominator) {
     numerator = m_numerator;
@@ -154,10 +159,7 @@ void Adapter::Recall(const std::vector<float>& values) {
         if (!std::isfinite(values[i])) continue;
         const float before = copy->GetParam(port.parameter);
         copy->SetParam(port.parameter, port.Position(value), false);
-        if (copy->GetParam(port.parameter) == before)
-            m_controls[i].wanted = value;
-        else if (port.type == EffectParameterType::Switch)
-            Set(static_cast<int>(i), value);  // one that the settings do not keep
+        if (copy->GetParam(port.parameter) == before) m_controls[i].wanted = value;
     }
 }
 
@@ -234,7 +236,7 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
     for (int done = 0; done < frames;) {
         const bool gliding = gate && m_gliding > 0;
         if (gliding) StepGlides();
-        const int piece = std::min(frames - done, gliding ? kStep : m_longest);
+        const int piece = std::min(frames - done, gliding || m_row.shortPieces ? kStep : m_longest);
         std::array<const float*, 2> from{}, beside{};
         std::array<float*, 2> to{};
         for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {

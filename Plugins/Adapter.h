@@ -32,6 +32,8 @@ public:
     const std::vector<Port>& Ports() const { return m_layout.ports; }
     int Channels() const { return m_channels; }
     int SideChannels() const { return m_sideChannels; }  // of the side-chain; 0 without one
+    // 1 or 2 channels from the next preparation on; nothing is processed until then. The ports stay.
+    void SetChannels(int channels);
 
     // Makes all memory, for blocks of about `frames`; longer ones are cut. Throws std::bad_alloc.
     void Prepare(double rate, int frames);
@@ -61,6 +63,7 @@ public:
     bool TakeState(const std::vector<std::uint8_t>& bytes);
     int Presets() { return m_effect->NumPresets(); }
     std::string PresetName(int preset) { return m_effect->GetPresetName(preset); }
+    int StartPreset() { return m_effect->GetDefaultPreset(); }  // that a new instance has
     void TakePreset(int preset);
     // True once after values changed that the host did not set.
     bool TakeOtherValues() { return m_otherValues.exchange(false); }
@@ -99,7 +102,7 @@ private:
     void UpdateLatency();
 
     const PluginRow& m_row;
-    const int m_channels;
+    int m_channels;
     const Start m_start;
     const Layout& m_layout;
     const std::unique_ptr<DSP::CorvoEffectBase> m_effect;

@@ -9,7 +9,6 @@
 
 #include <algorithm>
 #include <atomic>
-#include <bit>
 #include <cmath>
 #include <cstring>
 #include <exception>
@@ -17,7 +16,7 @@
 #include <string>
 #include <vector>
 
-#include "Adapter.h"
+#include "SavedState.h"
 
 // Every plug-in as CLAP. Parameter 0 is the bypass; port i of the adapter is the parameter i + 1.
 namespace {
@@ -26,9 +25,6 @@ using namespace Corvo::Plugins;
 
 constexpr char kVersion[] = DSP_PLUGIN_VERSION;
 constexpr clap_id kBypass = 0;
-// In front of the settings chunk: these letters, whether the effect is bypassed, and the values of all ports,
-// which may be finer than what an effect stores.
-constexpr std::uint8_t kStateTag[]{'D', 'S', 'P', '1'};
 
 void CopyText(char* to, std::size_t size, const std::string& text) {
     const std::size_t count = std::min(text.size(), size - 1);
@@ -228,7 +224,7 @@ private:
         const ClapPlugin& self = Of(plugin);
         const Port& port = self.m_adapter.Ports()[index - 1];
         const auto& groups = LayoutOf(self.m_adapter.Row(), self.m_adapter.Channels()).groups;
-        info->flags = CLAP_PARAM_IS_AUTOMATABLE;
+        info->flags = port.momentary ? 0u : static_cast<std::uint32_t>(CLAP_PARAM_IS_AUTOMATABLE);
         if (port.whole) info->flags |= CLAP_PARAM_IS_STEPPED;
         CopyText(info->name, sizeof info->name, port.name);
         if (port.group >= 0)
@@ -284,16 +280,7 @@ private:
 
     // State.
     static bool Save(const clap_plugin_t* plugin, const clap_ostream_t* stream) try {
-        Adapter& adapter = Of(plugin).m_adapter;
-        std::vector<std::uint8_t> bytes(std::begin(kStateTag), std::end(kStateTag));
-        bytes.push_back(adapter.Bypassed());
-        for (std::size_t i = 0; i < adapter.Ports().size(); ++i) {
-            const auto word = std::bit_cast<std::uint32_t>(adapter.Value(static_cast<int>(i)));
-            for (int shift = 0; shift < 32; shift += 8)
-                bytes.push_back(static_cast<std::uint8_t>(word >> shift));
-        }
-        const auto settings = adapter.State();
-        bytes.insert(bytes.end(), settings.begin(), settings.end());
+        const auto bytes = SaveState(Of(plugin).m_adapter);
         for (std::size_t done = 0; done < bytes.size();) {
             const auto written = stream->write(stream, bytes.data() + done, bytes.size() - done);
             if (written <= 0) return false;
@@ -313,20 +300,7 @@ private:
             bytes.insert(bytes.end(), buffer, buffer + count);
         }
         ClapPlugin& self = Of(plugin);
-        constexpr std::size_t kTag = std::size(kStateTag);
-        const std::size_t ports = self.m_adapter.Ports().size(), header = kTag + 1 + 4 * ports;
-        if (bytes.size() < header || !std::equal(std::begin(kStateTag), std::end(kStateTag), bytes.begin()))
-            return false;
-        const auto settings = bytes.begin() + static_cast<std::ptrdiff_t>(header);
-        if (!self.m_adapter.TakeState({settings, bytes.end()})) return false;
-        self.m_adapter.Bypass(bytes[kTag] != 0);
-        std::vector<float> values;
-        for (std::size_t i = 0; i < ports; ++i) {
-            std::uint32_t word = 0;
-            for (std::size_t byte = 4; byte-- > 0;) word = word << 8 | bytes[kTag + 1 + 4 * i + byte];
-            values.push_back(std::bit_cast<float>(word));
-        }
-        self.m_adapter.Recall(values);
+        if (!LoadState(self.m_adapter, bytes)) return false;
         self.TellValues();
         return true;
     } catch (const std::exception&) {

@@ -118,12 +118,12 @@ float Curve::Number(float position) const {
     return static_cast<float>(n0 + (at - p0) / (above->position - p0) * (above->number - n0));
 }
 
-float Curve::Position(float number) const {
+float Curve::PositionOf(float number, double nudge) const {
     if (number <= Least()) return m_points.empty() ? 0.0f : static_cast<float>(m_points.front().position);
     if (number >= Most()) return m_points.empty() ? 1.0f : static_cast<float>(m_points.back().position);
     const auto wanted = static_cast<double>(number);
     if (m_points.empty())
-        return static_cast<float>((wanted + std::copysign(wanted == 0.0 ? 0.0 : m_nudge, wanted) - m_first) /
+        return static_cast<float>((wanted + std::copysign(wanted == 0.0 ? 0.0 : nudge, wanted) - m_first) /
                                   (m_last - m_first));
     const auto above = std::ranges::lower_bound(m_points, wanted, {}, &Point::number);
     // Where a number is known its position is exact: it may be the edge of what shows it.

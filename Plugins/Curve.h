@@ -20,11 +20,15 @@ public:
     explicit Curve(std::vector<Point> points);
 
     float Number(float position) const;
-    float Position(float number) const;
+    float Position(float number) const { return PositionOf(number, m_nudge); }
+    // Without the nudge: the exact reverse of Number.
+    float Place(float number) const { return PositionOf(number, 0.0); }
     float Least() const { return static_cast<float>(m_first); }
     float Most() const { return static_cast<float>(m_last); }
 
 private:
+    float PositionOf(float number, double nudge) const;
+
     double m_first = 0.0, m_last = 1.0;
     double m_nudge = 0.0;  // away from 0: the effect cuts what it stores
     std::vector<Point> m_points;

@@ -19,7 +19,9 @@ struct PluginRow {
     const char* clapFeature;   // of CLAP's list
     const char* vst3Category;  // after "Fx|"
     bool realTime;             // false: its engine may allocate or wait while it processes
+    bool shortPieces;          // its lag grows with the length of what it gets at a time
     bool tempo;                // follows the host's tempo
+    bool rings;                // sounds on when its input has ended
     bool smooth;               // the effect itself moves smoothly to what it is set to, or is too slow to
     const char* about;
 

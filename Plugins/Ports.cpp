@@ -45,9 +45,18 @@ struct LayoutMaker {
         return false;
     }
 
+    // Switched on, an action is off again in what is stored.
+    bool IsAction(int parameter) {
+        std::vector<std::uint8_t> chunk;
+        tried->SetParam(parameter, 1.0f, false);
+        tried->GetSettingsChunk(chunk);
+        const auto other = row.Make();
+        other->SetSettingsChunk(chunk);
+        return other->GetParam(parameter) == 0.0f;
+    }
+
     void SetChoices(Port& port, const DSP::ParameterDescription& description) {
-        tried->SetParam(port.parameter, 1.0f, false);
-        port.momentary = port.type == EffectParameterType::Switch && tried->GetParam(port.parameter) == 0.0f;
+        port.momentary = port.type == EffectParameterType::Switch && IsAction(port.parameter);
         for (const auto& choice : description.choices) {
             port.points.push_back({choice.text, static_cast<float>(port.points.size())});
             port.m_choices.push_back(choice.normalised);

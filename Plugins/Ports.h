@@ -26,7 +26,7 @@ struct Port {
     float start = 0.0f;         // what a new instance has
     bool whole = false;         // a few whole numbers only
     bool glides = false;        // moves to its values in small steps
-    bool momentary = false;     // a switch that does something and stands at off again
+    bool momentary = false;     // a switch that does something, and is no setting: off after loading
     bool isNumber = false;      // the effect shows numbers
     double resolution = 1.0;    // of the values that are told
     bool logarithmic = false;   // the knob has ratios, not differences

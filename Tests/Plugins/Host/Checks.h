@@ -32,12 +32,12 @@ bool IsFinite(const Signal&);
 bool FiniteWhile(Instance&, const std::function<void()>& work);
 double LargestDifference(const Signal&, const Signal&);
 
-// A value for every parameter that a host may set; `of` gives its place in the range, 0..1.
+// A value for every parameter that a host may automate; `of` gives its place in the range, 0..1.
 template <typename Of>
 std::vector<Change> ForAll(const Instance& plugin, Of of, std::uint32_t frame = 0) {
     std::vector<Change> changes;
     for (const Parameter& parameter : plugin.parameters)
-        if (!parameter.readOnly && !parameter.hidden && !parameter.bypass)
+        if (parameter.automatable && !parameter.bypass)
             changes.push_back({parameter.id, parameter.At(of()), frame});
     return changes;
 }

@@ -332,6 +332,7 @@ public:
 
     std::unique_ptr<Instance> Create(std::size_t index) override {
         const clap_plugin_descriptor_t* descriptor = Descriptor(index);
+        if (m_created.insert(index).second) CheckCreation(*descriptor);
         const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, descriptor->id);
         if (!plugin) throw std::runtime_error("cannot be created");
         Expect(std::strcmp(plugin->desc->id, descriptor->id) == 0, "its instance has another id");
@@ -354,6 +355,9 @@ private:
             Expect(features.insert(*feature).second, std::string("names twice the feature ") + *feature);
         Expect(features.count(CLAP_PLUGIN_FEATURE_AUDIO_EFFECT) == 1,
                "does not say that it is an audio effect");
+    }
+
+    void CheckCreation(const clap_plugin_descriptor_t& d) const {
         for (const std::string& id : {std::string(d.id) + "x", std::string("no.such.plugin")})
             if (const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, id.c_str())) {
                 Finding("creates a plug-in of the unknown id " + id);
@@ -365,6 +369,7 @@ private:
     }
 
     Module m_module;
+    std::set<std::size_t> m_created;
     const clap_plugin_entry_t* m_entry;
     const clap_plugin_factory_t* m_factory;
 };

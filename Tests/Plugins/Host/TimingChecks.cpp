@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cmath>
 #include <numbers>
+#include <numeric>
 
 #include "Checks.h"
 
@@ -15,23 +16,24 @@ const Parameter* Bypass(const Instance& plugin) {
 }
 
 struct Lag {
-    std::size_t frames;
-    double likeness;  // of the output to the input that much earlier, 0..1
+    std::size_t frames = 0;
+    double likeness = 0;  // of the whole output to the input that much earlier, 0..1
 };
 
-// Over lags up to 3/4 of the signal.
+double Energy(const std::vector<float>& signal, std::size_t count) {
+    return std::inner_product(signal.begin(), signal.begin() + static_cast<std::ptrdiff_t>(count),
+                              signal.begin(), 1e-12);
+}
+
+// What sounds before or behind the burst counts against it: reverbs and echoes have no lag to measure.
 Lag MeasuredLag(const std::vector<float>& input, const std::vector<float>& output, std::size_t burst) {
-    Lag best{0, 0};
-    double energy = 0;
-    for (std::size_t i = 0; i < burst; ++i) energy += static_cast<double>(input[i]) * input[i];
+    Lag best;
+    const double energy = std::sqrt(Energy(input, burst) * Energy(output, output.size()));
     for (std::size_t lag = 0; lag + burst <= output.size(); ++lag) {
-        double sum = 0, heard = 0;
-        for (std::size_t i = 0; i < burst; ++i) {
-            sum += static_cast<double>(input[i]) * output[i + lag];
-            heard += static_cast<double>(output[i + lag]) * output[i + lag];
-        }
-        const double likeness = std::abs(sum) / std::sqrt(energy * heard + 1e-12);
-        if (likeness > best.likeness) best = {lag, likeness};
+        const double sum =
+            std::inner_product(input.begin(), input.begin() + static_cast<std::ptrdiff_t>(burst),
+                               output.begin() + static_cast<std::ptrdiff_t>(lag), 0.0);
+        if (const double likeness = std::abs(sum) / energy; likeness > best.likeness) best = {lag, likeness};
     }
     return best;
 }

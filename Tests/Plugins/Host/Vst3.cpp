@@ -5,11 +5,13 @@
 #include <travesty/factory.h>
 #include <travesty/host.h>
 #include <travesty/message.h>
+#include <travesty/unit.h>
 
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstring>
+#include <set>
 #include <stdexcept>
 
 #include "Checks.h"
@@ -65,12 +67,19 @@ void ExpectMainThread(const char* call) {
     Expect(CurrentThread() == Thread::Main,
            std::string("calls the host's ") + call + " from the wrong thread");
 }
+bool g_choosing = false;  // a program
 using HandlerTable = Table<v3_component_handler, v3_component_handler_iid>;
-HandlerTable g_handler(
-    {[](void*, v3_param_id) -> v3_result { return ExpectMainThread("begin_edit"), V3_OK; },
-     [](void*, v3_param_id, double) -> v3_result { return ExpectMainThread("perform_edit"), V3_OK; },
-     [](void*, v3_param_id) -> v3_result { return ExpectMainThread("end_edit"), V3_OK; },
-     [](void*, std::int32_t) -> v3_result { return ExpectMainThread("restart_component"), V3_OK; }});
+HandlerTable g_handler({[](void*, v3_param_id) -> v3_result { return ExpectMainThread("begin_edit"), V3_OK; },
+                        [](void*, v3_param_id, double) -> v3_result {
+                            return ExpectMainThread("perform_edit"), V3_OK;
+                        },
+                        [](void*, v3_param_id) -> v3_result { return ExpectMainThread("end_edit"), V3_OK; },
+                        [](void*, std::int32_t) -> v3_result {
+                            ExpectMainThread("restart_component");
+                            // Hosts deadlock on it.
+                            Expect(!g_choosing, "calls restart_component while a program is chosen");
+                            return V3_OK;
+                        }});
 HandlerTable* g_handlerObject = &g_handler;
 
 using StreamTable = Table<v3_bstream, v3_bstream_iid>;
@@ -135,9 +144,13 @@ QueueTable g_queue({[](void* self) { return Queue::Of(self).id; },
                         *value = points[static_cast<std::size_t>(index)].value;
                         return V3_OK;
                     },
-                    [](void*, std::int32_t, double value, std::int32_t* index) -> v3_result {
-                        Expect(value >= 0 && value <= 1, "sends a value outside of 0..1");
-                        if (index) *index = 0;
+                    [](void* self, std::int32_t frame, double value, std::int32_t* index) -> v3_result {
+                        if (!(value >= 0 && value <= 1)) Finding("sends a value outside of 0..1");
+                        *index = 0;
+                        const Queue& queue = Queue::Of(self);
+                        auto& points = Queue::Of(self).points;
+                        if (points.size() == points.capacity()) return V3_FALSE;
+                        points.push_back({queue.id, value, static_cast<std::uint32_t>(frame)});
                         return V3_OK;
                     }});
 using ChangesTable = Table<v3_param_changes, v3_param_changes_iid>;
@@ -165,9 +178,13 @@ v3_param_value_queue** QueueAt(void* self, std::int32_t index) {
     return reinterpret_cast<v3_param_value_queue**>(&queues[static_cast<std::size_t>(index)]);
 }
 ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Changes::Of(self).used); }, QueueAt,
-                        [](void* self, v3_param_id*, std::int32_t* index) {
-                            if (index) *index = 0;
-                            return QueueAt(self, 0);
+                        [](void* self, v3_param_id* id, std::int32_t* index) {
+                            Changes& changes = Changes::Of(self);
+                            if (changes.used == changes.queues.size())
+                                return static_cast<v3_param_value_queue**>(nullptr);
+                            changes.queues[changes.used].id = *id;
+                            *index = static_cast<std::int32_t>(changes.used++);
+                            return QueueAt(self, *index);
                         }});
 
 // A plug-in's interface, counted.
@@ -269,15 +286,23 @@ public:
     void Deactivate() override {
         OnAudioThread([&] { m_processor->set_processing(m_processor.Get(), false); });
         m_component->set_active(m_component.Get(), false);
+        // What the processor sent goes to the controller.
+        for (std::size_t i = 0; i < m_out.used; ++i)
+            for (const Change& change : m_out.queues[i].points)
+                Expect(m_controller->set_parameter_normalised(m_controller.Get(), change.parameter,
+                                                              change.value) == V3_OK,
+                       "does not know a parameter that it sends");
+        m_out.Set({});
     }
     std::uint32_t Latency() override { return m_processor->get_latency_samples(m_processor.Get()); }
 
-    // A host sends a change to both halves; the processor gets it with a block.
+    // A host sends a change to both halves; the processor gets it without audio.
     void Flush(std::span<const Change> changes) override {
         for (const Change& change : changes)
             m_controller->set_parameter_normalised(m_controller.Get(), change.parameter, change.value);
-        RenderAt(*this, 48000, Signal(static_cast<std::size_t>(Channels(inputs)), std::vector<float>(64)),
-                 {.block = 64, .changes = changes});
+        Expect(Activate(48000, 64), "cannot be activated");
+        OnAudioThread([&] { FlushActive(changes); });
+        Deactivate();
     }
     void FlushActive(std::span<const Change> changes) override { Process({{}, {}, 0, changes}); }
 
@@ -353,11 +378,43 @@ public:
                        p.name + ": " + std::to_string(value) + " is " + std::to_string(back) +
                            " after the way through plain values");
             }
+        CheckPrograms();
         const Change unknown{0x7fffffff, 0.5, 0};
         Flush({&unknown, 1});
     }
 
 private:
+    // Each has a name, and choosing another one changes values.
+    void CheckPrograms() {
+        Held<v3_unit_information> units;
+        v3_cpp_obj_query_interface(m_controller.Get(), v3_unit_information_iid,
+                                   reinterpret_cast<v3_unit_information***>(units.Slot()));
+        v3_param_info info{};
+        v3_program_list_info list{};
+        for (std::int32_t i = 0; i < m_controller->get_parameter_count(m_controller.Get()); ++i) {
+            m_controller->get_parameter_info(m_controller.Get(), i, &info);
+            if (!(info.flags & V3_PARAM_PROGRAM_CHANGE)) continue;
+            if (!units || units->get_program_list_info(units.Get(), 0, &list) != V3_OK ||
+                list.programCount != info.step_count + 1)
+                return Finding("has other programs than its program parameter");
+            std::set<std::vector<double>> all;
+            for (std::int32_t program = list.programCount; program-- > 0;) {
+                v3_str_128 name{};
+                units->get_program_name(units.Get(), list.id, program, name);
+                const double value = static_cast<double>(program) / std::max(info.step_count, 1);
+                g_choosing = true;
+                m_controller->set_parameter_normalised(m_controller.Get(), info.param_id, value);
+                g_choosing = false;
+                Expect(name[0], "has a program without name");
+                std::vector<double> values;
+                for (const Parameter& p : parameters)
+                    if (p.automatable) values.push_back(Get(p));
+                all.insert(values);
+            }
+            Expect(all.size() > 1 || list.programCount == 1, "its programs are all the same");
+        }
+    }
+
     void FindController(v3_plugin_factory** factory, v3_funknown** context) {
         const auto slot = reinterpret_cast<v3_edit_controller***>(m_controller.Slot());
         if (v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid, slot) == V3_OK) {

@@ -1,0 +1,16 @@
+#pragma once
+
+#include <cstdint>
+#include <vector>
+
+#include "Adapter.h"
+
+namespace Corvo::Plugins {
+
+// What CLAP and VST3 hosts keep of a plug-in: whether it is bypassed, the values of all ports, which may be
+// finer than what an effect stores, and its settings chunk. Not on the audio thread; throw std::bad_alloc.
+std::vector<std::uint8_t> SaveState(Adapter& adapter);
+// False, with nothing changed, for bytes that are no such state of this effect.
+bool LoadState(Adapter& adapter, const std::vector<std::uint8_t>& bytes);
+
+}  // namespace Corvo::Plugins
