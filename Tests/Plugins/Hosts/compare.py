@@ -1,6 +1,7 @@
 #!/usr/bin/env python3
-"""compare.py EXPECTED FILE [LATENCY]: whether FILE is EXPECTED that many frames later.
-compare.py --sounds FILE [NAME...]: whether every channel of FILE has sound, and only finite samples; their names."""
+"""compare.py EXPECTED FILE LATENCY [LEAD]: whether FILE is EXPECTED, without its first LEAD frames, that many frames
+later; more channels of it than EXPECTED has are left out.
+compare.py --sounds FILE...: whether every channel of every file has sound, and only finite samples."""
 import sys
 
 import numpy
@@ -17,13 +18,13 @@ def read(name):
 
 
 if sys.argv[1] == "--sounds":
-    samples, _ = read(sys.argv[2])
-    silent = [name for name, peak in zip(sys.argv[3:], abs(samples).max(axis=0)) if peak < 1e-4]
-    sys.exit(f"{sys.argv[2]} is silent: {', '.join(silent)}" if silent or not abs(samples).max() > 1e-4 else 0)
+    silent = [name for name in sys.argv[2:] if not (abs(read(name)[0]).max(axis=0, initial=0) > 1e-4).all()]
+    sys.exit(f"silent: {', '.join(silent)}" if silent or not sys.argv[2:] else 0)
 
 (expected, rate), (found, found_rate) = read(sys.argv[1]), read(sys.argv[2])
-latency = int(sys.argv[3]) if len(sys.argv) > 3 else 0
-found = found[latency:]
+latency, lead = (int(number) for number in (sys.argv[3:] + ["0"])[:2])
+found = found[latency:, :expected.shape[1]]
+expected = expected[lead:]
 frames = min(len(expected), len(found))
 if rate != found_rate or expected.shape[1] != found.shape[1] or frames < len(expected) - latency - 8192:
     sys.exit(f"{sys.argv[2]} has {len(found)} frames of {found.shape[1]} channels at {found_rate} Hz, not "
