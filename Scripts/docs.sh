@@ -20,6 +20,8 @@ build/release/bin/dsp_pages . "$source"
 cp -r Docs/Site/. Docs/*.md Docs/pictures "$source"
 # The README is a page of the site, too, where the guides stand beside it.
 sed 's:(Docs/:(:g' README.md >"$source/readme.md"
+cp -r examples "$source"
+sed -i 's:(../examples/:(examples/:g' "$source/examples.md"
 cp Src/Threads/README.md "$source/threads.md"
 sed -i -e "/^{{rooms}}$/{r $source/rooms.html" -e 'd}' "$source/house.md"
 rm "$source/rooms.html"
