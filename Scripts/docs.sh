@@ -5,15 +5,17 @@ cd "$(dirname "$0")/.."
 source Scripts/common.sh
 
 need_packages "${BUILD_PACKAGES[@]}" furo python3-myst-parser doxygen doxygen-awesome-css codespell sonic-pi-samples \
-    espeak-ng sox libsox-fmt-base parallel
+    espeak-ng sox libsox-fmt-base parallel man-db zsh
 docs=$PWD/build/docs source=$PWD/build/docs/source
 export PYTHONDONTWRITEBYTECODE=1
 
 say "building"
-build_preset release dsphost dsp_pages
+build_preset release dsphost dsphost_shell_files dsp_pages
 rm -rf "$docs"
 mkdir -p "$source"
 cmake --install build/release --prefix "$docs/installed" >/dev/null
+
+Tests/Package/shell.sh "$docs/installed"
 
 say "writing pages"
 build/release/bin/dsp_pages . "$source"
