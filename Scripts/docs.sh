@@ -5,21 +5,25 @@ cd "$(dirname "$0")/.."
 source Scripts/common.sh
 
 need_packages "${BUILD_PACKAGES[@]}" furo python3-myst-parser doxygen doxygen-awesome-css codespell sonic-pi-samples \
-    espeak-ng sox libsox-fmt-base parallel
+    espeak-ng sox libsox-fmt-base parallel man-db zsh
 docs=$PWD/build/docs source=$PWD/build/docs/source
 export PYTHONDONTWRITEBYTECODE=1
 
 say "building"
-build_preset release dsphost dsp_pages
+build_preset release dsphost dsphost_shell_files dsp_pages
 rm -rf "$docs"
 mkdir -p "$source"
 cmake --install build/release --prefix "$docs/installed" >/dev/null
+
+Tests/Package/shell.sh "$docs/installed"
 
 say "writing pages"
 build/release/bin/dsp_pages . "$source"
 cp -r Docs/Site/. Docs/*.md Docs/pictures "$source"
 # The README is a page of the site, too, where the guides stand beside it.
 sed 's:(Docs/:(:g' README.md >"$source/readme.md"
+cp -r examples "$source"
+sed -i 's:(../examples/:(examples/:g' "$source/examples.md"
 cp Src/Threads/README.md "$source/threads.md"
 sed -i -e "/^{{rooms}}$/{r $source/rooms.html" -e 'd}' "$source/house.md"
 rm "$source/rooms.html"

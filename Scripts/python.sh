@@ -15,6 +15,8 @@ say "testing (python)"
 export PYTHONDONTWRITEBYTECODE=1
 PYTHONPATH=$PWD/build/python $python -m pytest -q -p no:cacheprovider Tests/Python
 
+PYTHONPATH=$PWD/build/python $python examples/08-python.py
+
 # The blocks of Python in the documentation.
 recordings=build/python/recordings
 mkdir -p $recordings

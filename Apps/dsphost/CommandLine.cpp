@@ -14,11 +14,15 @@
 #include "AudioReader.h"
 #include "Errors.h"
 #include "Process.h"
+#include "ShellFiles.h"
 #include "Text.h"
 
 // Every command and its options. The parser's header takes seconds to compile: no other file includes it.
 namespace dsphost {
 namespace {
+
+// Types of values that shells complete; so are words with | between them.
+constexpr const char *kFile = "FILE", *kEffect = "EFFECT";
 
 // The command, and the record that its options fill and `run` gets.
 template <typename Arguments>
@@ -31,7 +35,9 @@ std::pair<CLI::App&, Arguments&> Add(CLI::App& app, const char* name, const char
 }
 
 void AddInput(CLI::App& command, ReadingOptions& reading) {
-    command.add_option("IN", reading.input, "Audio file, or - for standard input")->required();
+    command.add_option("IN", reading.input, "Audio file, or - for standard input")
+        ->required()
+        ->type_name(kFile);
     command.add_option_function<std::string>(
         "--spool-limit", [&reading](const std::string& size) { reading.spoolLimit = ParseSpoolLimit(size); },
         "Most that a temporary file may take for input that does not stream (8G)");
@@ -39,11 +45,13 @@ void AddInput(CLI::App& command, ReadingOptions& reading) {
 
 void AddAudioOutput(CLI::App& command, std::string& output) {
     command.add_option("OUT", output, "Audio file by its ending, or - for WAV on standard output")
-        ->required();
+        ->required()
+        ->type_name(kFile);
 }
 
 void AddFormat(CLI::App& command, std::string& format) {
-    command.add_option("--format", format, "s16, s24, f32 or f64; the input's when left out");
+    command.add_option("--format", format, "Of the samples; the input's when left out")
+        ->type_name("s16|s24|f32|f64");
 }
 
 void AddWriting(CLI::App& command, WritingOptions& writing) {
@@ -54,13 +62,15 @@ void AddWriting(CLI::App& command, WritingOptions& writing) {
 void AddPicture(CLI::App& command, PictureOptions& o) {
     command.add_option("--size", o.size, "Of the picture, WIDTHxHEIGHT in pixels (1280x720)");
     command.add_option("--dpi", o.dpi, "Dots per inch that texts and lines are sized for (96)");
-    command.add_option("--font", o.font, "The typeface's file, where Montserrat is not installed");
+    command.add_option("--font", o.font, "The typeface, where Montserrat is not installed")->type_name(kFile);
 }
 
 void AddDrawing(CLI::App& command, PictureOptions& o) {
     AddPicture(command, o);
-    command.add_option("--scale", o.scale, "Frequency scale: log or linear");
-    command.add_option("--view", o.view, "Display options: " + Joined(ViewNames(), ", "))->delimiter(',');
+    command.add_option("--scale", o.scale, "Frequency scale")->type_name("log|linear");
+    command.add_option("--view", o.view, "Display options, separated by commas")
+        ->type_name(Joined(ViewNames(), "|"))
+        ->delimiter(',');
 }
 
 void AddConvert(CLI::App& app) {
@@ -70,7 +80,7 @@ void AddConvert(CLI::App& app) {
     AddAudioOutput(command, a.output);
     command.add_option("--rate", a.rate, "Sample rate in Hz")->required();
     AddFormat(command, a.format);
-    command.add_option("--dither", a.dither, "none, tpdf, shaped or shaped-strong");
+    command.add_option("--dither", a.dither, "For s16 and s24")->type_name("none|tpdf|shaped|shaped-strong");
     command.add_flag("--exact", a.exact, "By the exact ratio of the rates, whatever its factors");
     AddWriting(command, a.writing);
 }
@@ -82,10 +92,10 @@ void AddDenoise(CLI::App& app) {
     AddAudioOutput(command, a.output);
     command.add_option("--learn", a.learn, "FROM:TO, seconds that hold noise only; as often as there are")
         ->allow_extra_args(false);
-    command.add_option("--profile", a.profile, "File of noise learned before");
-    command.add_option("--save-profile", a.saveProfile, "Writes what was learned");
+    command.add_option("--profile", a.profile, "File of noise learned before")->type_name(kFile);
+    command.add_option("--save-profile", a.saveProfile, "Writes what was learned")->type_name(kFile);
     command.add_option("--set", a.settings, "\"label=value, ...\", as of the effect Denoiser");
-    command.add_option("--residue", a.residue, "Audio file of what was taken away");
+    command.add_option("--residue", a.residue, "Audio file of what was taken away")->type_name(kFile);
     AddFormat(command, a.format);
     AddWriting(command, a.writing);
 }
@@ -93,7 +103,7 @@ void AddDenoise(CLI::App& app) {
 void AddEffects(CLI::App& app) {
     const auto [command, a] =
         Add(app, "effects", "Lists the effects, or one effect's parameters and presets", RunEffects);
-    command.add_option("NAME", a.effect, "One effect");
+    command.add_option("NAME", a.effect, "One effect")->type_name(kEffect);
     command.add_flag("--json", a.json, "As JSON");
 }
 
@@ -103,7 +113,7 @@ void AddPitch(CLI::App& app) {
     AddInput(command, a);
     AddAudioOutput(command, a.output);
     command.add_option("--semitones", a.semitones, "How far, -36 to 36")->required();
-    command.add_option("--engine", a.engine, "new (default) or classic");
+    command.add_option("--engine", a.engine, "new when left out")->type_name("new|classic");
     command.add_option("--quality", a.quality, "new: 0 to 9; classic: 0 to 13; default 4");
     command.add_option("--speed", a.speed, "new only: playback speed, 0.1 to 10; moves the pitch along");
     AddFormat(command, a.format);
@@ -113,7 +123,7 @@ void AddPitch(CLI::App& app) {
 void AddEqCurve(CLI::App& app) {
     const auto [command, a] =
         Add(app, "eq-curve", "Writes the frequency response of the equaliser", RunEqCurve);
-    command.add_option("OUT", a.output, "CSV file, or - for standard output")->required();
+    command.add_option("OUT", a.output, "CSV file, or - for standard output")->required()->type_name(kFile);
     command.add_option("--fx", a.effect, "\"EQ: FREQ TYPE [GAIN_DB] [q=Q]; ...\"")
         ->required()
         ->allow_extra_args(false);
@@ -130,9 +140,11 @@ void AddRender(CLI::App& app) {
     command
         .add_option("--fx", a.effects,
                     "\"NAME: label=value, ...\"; once per effect, in the order of processing")
+        ->type_name(kEffect)
         ->allow_extra_args(false);
-    command.add_option("--automation", a.automation, "JSON file of parameter moves");
+    command.add_option("--automation", a.automation, "JSON file of parameter moves")->type_name(kFile);
     command.add_option("--save-chunk", a.chunks, "Writes the effect's settings; once per --fx")
+        ->type_name(kFile)
         ->allow_extra_args(false);
     AddFormat(command, a.format);
     command.add_option("--tail", a.tail, "Seconds after the input's end, or auto: until it has died away");
@@ -146,7 +158,7 @@ void AddSonogram(CLI::App& app) {
     const auto [command, a] =
         Add(app, "sonogram", "Draws how the spectrum of an audio file changes", RunSonogram);
     AddInput(command, a);
-    command.add_option("OUT", a.output, "PNG picture")->required();
+    command.add_option("OUT", a.output, "PNG picture")->required()->type_name(kFile);
     command.add_option("--scheme", a.scheme, "Colours, 0 to 6");
     command.add_option(
         "--speed", a.speed,
@@ -162,13 +174,18 @@ void AddSpectrum(CLI::App& app) {
     const auto [command, a] =
         Add(app, "spectrum", "Writes the mean spectrum of an audio file, its channels mixed", RunSpectrum);
     AddInput(command, a);
-    command.add_option("OUT", a.picture, "PNG picture: the mean, and the highest levels as a thin line");
-    command.add_option("--csv", a.csv, "Table of frequencies and mean levels, 0 dB a full-scale sine");
+    command.add_option("OUT", a.picture, "PNG picture: the mean, and the highest levels as a thin line")
+        ->type_name(kFile);
+    command.add_option("--csv", a.csv, "Table of frequencies and mean levels, 0 dB a full-scale sine")
+        ->type_name(kFile);
     command.add_option("--length", a.length, "Samples per transform, a power of two from 128 to 524288");
-    command.add_option("--window", a.window, "rectangular, triangular, hann, hamming or blackman");
+    command.add_option("--window", a.window, "Shape of the windows")
+        ->type_name("rectangular|triangular|hann|hamming|blackman");
     command.add_option("--overlap", a.overlap, "Share of a window that the next one repeats, 0 to 0.99");
-    command.add_option("--profile", a.profile,
-                       "File of noise learned by denoise, to be drawn under the mean; a column of the table");
+    command
+        .add_option("--profile", a.profile,
+                    "File of noise learned by denoise, to be drawn under the mean; a column of the table")
+        ->type_name(kFile);
     AddDrawing(command, a.drawing);
     AddWriting(command, a.writing);
 }
@@ -177,10 +194,12 @@ void AddTuner(CLI::App& app) {
     const auto [command, a] =
         Add(app, "tuner", "Names the notes of an audio file and draws the tuner", RunTuner);
     AddInput(command, a);
-    command.add_option("OUT", a.output, "PNG picture of the panel while the longest note sounds")->required();
+    command.add_option("OUT", a.output, "PNG picture of the panel while the longest note sounds")
+        ->required()
+        ->type_name(kFile);
     command.add_flag("--json", a.json, "What was heard 30 times a second, on standard output");
     command.add_option("--at", a.at, "The moment to draw instead, in seconds");
-    command.add_option("--method", a.method, "Of detection: " + Joined(DetectionMethods(), ", "));
+    command.add_option("--method", a.method, "Of detection")->type_name(Joined(DetectionMethods(), "|"));
     command.add_option("--temperament", a.temperament, "Equal, Pythagorean, Vallotti, ...");
     command.add_option("--sensitivity", a.sensitivity, "Standard, Noisy environment, Sensitive, ...");
     AddDrawing(command, a.drawing);
@@ -197,11 +216,38 @@ void AddTuneVoice(CLI::App& app) {
     command.add_option("--transition", a.transition, "Milliseconds from note to note, 0 to 500 (40)");
     command.add_option("--ratio", a.ratio, "Per cent of the error taken away, 0 to 100 (100)");
     command.add_option("--lowest", a.lowest, "Hz: the lowest pitch sung, 55, 75, 110 or 160 (75)");
-    command.add_option("--notes", a.notes, "The notes decided, as .csv or .mid");
-    command.add_option("--curve", a.curve, "PNG picture: the pitch heard and corrected over the notes");
+    command.add_option("--notes", a.notes, "The notes decided, as .csv or .mid")->type_name(kFile);
+    command.add_option("--curve", a.curve, "PNG picture: the pitch heard and corrected over the notes")
+        ->type_name(kFile);
     AddFormat(command, a.format);
     AddPicture(command, a.drawing);
     AddWriting(command, a.writing);
+}
+
+// The tables above, for the manual and the shells.
+ShellOption Described(const CLI::Option& option) {
+    ShellOption described{option.get_name(true),
+                          option.get_description(),
+                          option.get_type_name(),
+                          {},
+                          option.get_positional(),
+                          option.get_required(),
+                          option.get_items_expected_max() > 1};
+    if (option.get_items_expected_max() == 0) described.type.clear();
+    if (described.isPlace) return described;
+    for (const auto& name : option.get_snames()) described.names.push_back("-" + name);
+    for (const auto& name : option.get_lnames()) described.names.push_back("--" + name);
+    return described;
+}
+
+std::vector<ShellCommand> Described(const CLI::App& app) {
+    std::vector<ShellCommand> commands;
+    for (const auto* command : app.get_subcommands({})) {
+        commands.push_back({command->get_name(), command->get_description(), {}});
+        for (const auto* option : command->get_options())
+            commands.back().options.push_back(Described(*option));
+    }
+    return commands;
 }
 
 // Told here, because the parser would only say that a command is missing.
@@ -234,6 +280,8 @@ void RunCommandLine(int count, char** arguments) {
     for (const auto add : {AddConvert, AddDenoise, AddEffects, AddPitch, AddEqCurve, AddRender, AddSonogram,
                            AddSpectrum, AddTuner, AddTuneVoice})
         add(app);
+    if (count == 3 && arguments[1] == std::string_view("--write-for"))
+        return Print(WriteFor(arguments[2], Described(app)));
     CheckCommand(app, count, arguments);
     try {
         app.parse(count, arguments);

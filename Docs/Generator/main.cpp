@@ -5,6 +5,7 @@
 #include <stdexcept>
 
 #include "EffectPage.h"
+#include "EqualiserPage.h"
 #include "RoomsDiagram.h"
 
 namespace {
@@ -23,16 +24,19 @@ int main(int count, char** arguments) try {
     const std::filesystem::path source = arguments[1], target = arguments[2];
     std::filesystem::create_directories(target / "effects");
     std::string list;
-    for (const auto& kind : Corvo::DSP::EffectKinds()) {
-        const std::string file = docs::FileName(kind.name) + ".md";
+    const auto write = [&](const std::string& file, const auto& page) {
         const auto text = source / "Docs" / "Effects" / file;
         try {
-            Write(target / "effects" / file, docs::EffectPage(kind, text.string()));
+            Write(target / "effects" / file, page(text.string()));
         } catch (const std::exception& error) {
             throw std::runtime_error(text.string() + ": " + error.what());
         }
         list += file + '\n';
-    }
+    };
+    for (const auto& kind : Corvo::DSP::EffectKinds())
+        write(docs::FileName(kind.name) + ".md",
+              [&](const std::string& text) { return docs::EffectPage(kind, text); });
+    write("equaliser.md", docs::EqualiserPage);
     Write(target / "effects" / "index.md", "# Effects\n\n```{toctree}\n" + list + "```\n");
     Write(target / "rooms.html", docs::DrawRooms((source / "README.md").string()));
     return 0;

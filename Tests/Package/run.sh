@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Installs the build into a folder, moves that folder, and builds and runs the README's example against it
-# with find_package and with pkg-config.
+# with find_package and with pkg-config, and the examples.
 set -euo pipefail
 source_dir=$1 build_dir=$2 compiler=$3
 here=$(cd "$(dirname "$0")" && pwd)
@@ -27,6 +27,12 @@ cmake --build "$work/by-cmake" >/dev/null
 by_cmake=$("$work/by-cmake/example")
 drawing=$(find "$work/installed" -name dspdrawing.pc)
 if [ -n "$drawing" ]; then "$work/by-cmake/drawing"; fi
+
+# The examples, as a user builds them.
+cmake -G Ninja -S "$source_dir/examples" -B "$work/examples" -DCMAKE_PREFIX_PATH="$work/installed" \
+    -DCMAKE_CXX_COMPILER="$compiler" >/dev/null
+cmake --build "$work/examples" >/dev/null
+ctest --test-dir "$work/examples" --no-tests=error --output-on-failure
 
 pc=$(find "$work/installed" -name dspdll.pc)
 export PKG_CONFIG_PATH=${pc%/*}
