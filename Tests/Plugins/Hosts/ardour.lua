@@ -19,10 +19,11 @@ end
 
 local function put_in_plugin()
     local track
-    for route in session:new_audio_track(tonumber(channels), tonumber(channels), nil, 1, "T",
+    for route in session:new_audio_track(tonumber(channels), 2, nil, 1, "T",
             ARDOUR.PresentationInfo.max_order, ARDOUR.TrackMode.Normal, true):iter() do
         track = route
     end
+    if channels == "1" then track:pan_azimuth_control():set_value(0, PBD.GroupControlDisposition.NoGroup) end
     if kind == "VST3" then
         local name = id
         id = nil

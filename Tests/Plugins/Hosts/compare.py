@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """compare.py EXPECTED FILE LATENCY [LEAD]: whether FILE is EXPECTED, without its first LEAD frames, that many frames
 later; more channels of it than EXPECTED has are left out.
-compare.py --sounds FILE...: whether every channel of every file has sound, and only finite samples."""
+compare.py --sounds FILE...: whether every file has sound, and only finite samples."""
 import sys
 
 import numpy
@@ -18,7 +18,7 @@ def read(name):
 
 
 if sys.argv[1] == "--sounds":
-    silent = [name for name in sys.argv[2:] if not (abs(read(name)[0]).max(axis=0, initial=0) > 1e-4).all()]
+    silent = [name for name in sys.argv[2:] if not (abs(read(name)[0]).max(axis=0, initial=0) > 1e-4).any()]
     sys.exit(f"silent: {', '.join(silent)}" if silent or not sys.argv[2:] else 0)
 
 (expected, rate), (found, found_rate) = read(sys.argv[1]), read(sys.argv[2])
