@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cairo.h>
+#include <pango/pangocairo.h>
 
 #include "Drawing/Backends/DrawingCairo.h"
 #include "Target.h"
@@ -26,7 +27,9 @@ inline constexpr Draw kPictures[] = {
 
 // One picture of the analyser, of any size at any place, on a surface of its own.
 inline void DrawAnything(Input& input, kivspectrum& analyser) {
-    static DrawingCairo drawing;
+    // Texts of any size fill the fonts' caches for as long as a process goes on.
+    pango_cairo_font_map_set_default(nullptr);
+    DrawingCairo drawing;
     const int width = input.Between(1, 400), height = input.Between(1, 300);
     const bool usual = input.Flag();
     const auto edge = [&](int limit) { return usual ? static_cast<float>(limit) : input.Raw<float>(); };
