@@ -115,20 +115,20 @@ input_of() {
     echo "$file"
 }
 
-# expect URI FILE LATENCY [PRESET] [BLOCKS]: whether the file is the library's own result so many frames later. BLOCKS
-# of 1024 frames of silence came before it.
+# expect URI FILE LATENCY [PRESET] [LEAD]: whether the file is the library's own result so many frames later. LEAD frames
+# of silence came before it.
 expect() {
-    local uri=$1 preset=${4:-} blocks=${5:-0} effect in out
+    local uri=$1 preset=${4:-} lead=${5:-0} effect in out
     effect=$(effect_of "$uri") in=$work/in$(channels_of "$uri").wav
-    out="$work/reference-${uri##*:}${preset:+-preset}-$blocks.wav"
-    if [ "$blocks" != 0 ]; then
-        [ -e "${in%.wav}-$blocks.wav" ] ||
-            ffmpeg -v error -y -i "$in" -af "adelay=$((1024 * blocks))S:all=1" -c:a pcm_f32le "${in%.wav}-$blocks.wav"
-        in=${in%.wav}-$blocks.wav
+    out="$work/reference-${uri##*:}${preset:+-preset}-$lead.wav"
+    if [ "$lead" != 0 ]; then
+        [ -e "${in%.wav}-$lead.wav" ] ||
+            ffmpeg -v error -y -i "$in" -af "adelay=${lead}S:all=1" -c:a pcm_f32le "${in%.wav}-$lead.wav"
+        in=${in%.wav}-$lead.wav
     fi
     [ -e "$out" ] || "$dsphost" render -q -y --precision 32 --format f32 --block 1024 "$in" "$out" \
         --fx "$effect${preset:+: preset=$preset}" >&2 || return 1
-    "$python" "$hosts/compare.py" "$out" "$2" "$3" $((1024 * blocks))
+    "$python" "$hosts/compare.py" "$out" "$2" "$3" $lead
 }
 sounds() { "$python" "$hosts/compare.py" --sounds "$@"; }
 
@@ -210,7 +210,7 @@ render_with_ardour() {
     [ "$(sed -n 's/^LATENCY //p' <<< "$log")" = "$(latency_of "$uri")" ] ||
         { echo "$1: not the latency of $(latency_of "$uri"): $(grep LATENCY <<< "$log")"; return 1; }
     "$python" "$hosts/ardour_region.py" "$folder" "$work/in$channels.wav" || return 1
-    # On a busy machine this Ardour exports silence at times, or crashes, with anyone's plug-ins.
+    # This Ardour's export crashes at times, with the plug-ins of others too, and on a busy machine is silent.
     for blocks in 1 2 3; do
         if log=$(timeout 60 ardour7-export -s 48000 -b float -o "$folder.wav" "$folder" t 2>&1); then
             if log=$("$python" "$hosts/compare.py" --sounds "$folder.wav" 2>&1); then break; fi
@@ -220,10 +220,10 @@ render_with_ardour() {
     done
     # Where a range begins in Ardour's blocks, this engine's pieces depend on.
     if [[ $uri == *:pitch-shift* ]]; then return 0; fi
-    # Ardour lets the plug-in run through some blocks of silence before the range, in which oscillators go on: 6 of
-    # them, or another number when the machine is busy.
+    # Ardour lets the plug-in run through silence before the range, in which oscillators go on: 2 s and 6 blocks, or
+    # another number of blocks when the machine is busy.
     for blocks in 6 5 7 8 4 {9..40}; do
-        if said=$(expect "$uri" "$folder.wav" 0 "$preset" $blocks 2>&1); then return 0; fi
+        if said=$(expect "$uri" "$folder.wav" 0 "$preset" $((96000 + 1024 * blocks)) 2>&1); then return 0; fi
         [ $blocks != 6 ] || log=$said
     done
     echo "$log, with the preset '$preset'"
