@@ -66,6 +66,7 @@ function(dsp_add_plugin NAME)
             dpf__add_lv2_ttl_generator()
             add_custom_command(TARGET ${module} POST_BUILD
                 COMMAND lv2_ttl_generator $<TARGET_FILE:${module}> > /dev/null
+                COMMAND sed -i "/ mod:/d" ${NAME}.ttl  # a vocabulary that no package describes
                 WORKING_DIRECTORY ${file}
                 VERBATIM)
             add_dependencies(${module} lv2_ttl_generator)

@@ -8,8 +8,8 @@
 namespace Corvo {
 namespace {
 
-constexpr int kCuts = 4;  // of a pixel's width
-constexpr int kShares[kCuts] = {64, 64, 64, 63};
+constexpr int kCuts = 8;  // of a pixel's width
+constexpr int kShares[kCuts] = {32, 32, 32, 32, 32, 32, 32, 31};
 constexpr float kNone = std::numeric_limits<float>::max();
 
 struct Range {

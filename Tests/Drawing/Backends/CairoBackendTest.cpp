@@ -74,11 +74,11 @@ TEST_F(CairoBackend, CurvesAreAsOutlined) {
         const auto fast = picture(false), plain = picture(true);
         double off = 0.0, covered = 0.0;
         for (std::size_t i = 0; i < fast.size(); ++i) {
-            EXPECT_NEAR(fast[i], plain[i], 60) << width << " at " << i;
+            EXPECT_NEAR(fast[i], plain[i], 32) << width << " at " << i;
             off += std::abs(fast[i] - plain[i]);
             covered += plain[i];
         }
-        EXPECT_LT(off, 0.06 * covered) << width;  // the outlines come in coarse steps
+        EXPECT_LT(off, 0.03 * covered) << width;
     }
 }
 
