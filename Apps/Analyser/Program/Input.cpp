@@ -1,5 +1,7 @@
 #include "Input.h"
 
+#include "FloatSound.h"
+
 #include <algorithm>
 
 namespace analyser {
@@ -26,11 +28,7 @@ bool Input::Want(const std::string& name) {
 
 bool Input::Retry() {
     if (m_device) return true;
-    SDL_AudioSpec wanted{}, got{};
-    wanted.freq = 48000;
-    wanted.format = AUDIO_F32SYS;
-    wanted.channels = 2;
-    wanted.samples = 512;
+    SDL_AudioSpec wanted = FloatSound(48000, 2, 512), got{};
     wanted.callback = Take;
     wanted.userdata = this;
     m_device = SDL_OpenAudioDevice(m_wanted.empty() ? nullptr : m_wanted.c_str(), 1, &wanted, &got,

@@ -4,6 +4,8 @@
 #include <cstddef>
 #include <filesystem>
 
+#include "FloatSound.h"
+
 namespace analyser {
 namespace {
 
@@ -26,11 +28,8 @@ std::string Player::Open(const std::string& path, bool sound) {
     m_info = info;
     m_name = name;
     if (sound) {
-        SDL_AudioSpec wanted{};
-        wanted.freq = info.samplerate;
-        wanted.format = AUDIO_F32SYS;
-        wanted.channels = static_cast<Uint8>(info.channels <= kMostOutputs ? info.channels : 1);
-        wanted.samples = 1024;
+        const SDL_AudioSpec wanted =
+            FloatSound(info.samplerate, info.channels <= kMostOutputs ? info.channels : 1, 1024);
         m_device = SDL_OpenAudioDevice(nullptr, 0, &wanted, nullptr, 0);
     }
     Seek(0.0);

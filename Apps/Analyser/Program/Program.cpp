@@ -10,6 +10,7 @@
 
 #include "Drawing/Views/Look.h"
 #include "Files.h"
+#include "FloatSound.h"
 #include "Spectrum/Tuner/Tuner.h"
 
 namespace analyser {
@@ -294,11 +295,7 @@ void Program::SetTone(bool on) {
     m_tone.Set(on && m_hasAudio, 4.0 * Tuner::GetCalibrationBase());
     if (!on) return;
     if (!m_toneDevice && m_hasAudio) {
-        SDL_AudioSpec wanted{}, got{};
-        wanted.freq = 48000;
-        wanted.format = AUDIO_F32SYS;
-        wanted.channels = 2;
-        wanted.samples = 1024;
+        SDL_AudioSpec wanted = FloatSound(48000, 2, 1024), got{};
         wanted.userdata = this;
         wanted.callback = [](void* program, Uint8* bytes, int count) {
             auto& self = *static_cast<Program*>(program);
