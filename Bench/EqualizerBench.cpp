@@ -36,19 +36,6 @@ struct Library {
     Corvo::DSP::ParEQ eq;
 };
 
-// The glide written with the library's exponential.
-struct ExponentialProgress {
-    static bool Step(double& value, double start, double target) {
-        const double tiny = 1e-14f;
-        if (std::abs(target) < tiny && std::abs(value) < tiny) return value = 0.0, false;
-        const double rel = std::abs(value - target) / std::max(std::abs(start - target), tiny);
-        const double k = rel >= 1.0 ? 0.0009 : 9e-5 * std::exp(5.0 * (1.0 - rel));
-        value = (1.0 - k) * value + k * target;
-        if (!(rel < 0.01)) return true;
-        return value = target, false;
-    }
-};
-
 struct PlainForm {
     template <typename Sample>
     void Process(Sample* samples, builtin_effects_data* records) {
@@ -56,7 +43,7 @@ struct PlainForm {
         eq.Process(samples, kFrames, kChannels, records);
     }
     void Cook(bool smooth, builtin_effects_data& data) { eq.Cook(smooth, false, data, kRate); }
-    Plain::ParEQ<ExponentialProgress> eq{kChannels};
+    Plain::ParEQ<Plain::ExponentialProgress> eq{kChannels};
 };
 
 template <typename Eq, typename Sample, bool Gliding>

@@ -12,6 +12,19 @@ namespace Plain {
 
 using Corvo::DSP::builtin_effects_data;
 
+// The glide written with the library's exponential.
+struct ExponentialProgress {
+    static bool Step(double& value, double start, double target) {
+        const double tiny = 1e-14f;
+        if (std::abs(target) < tiny && std::abs(value) < tiny) return value = 0.0, false;
+        const double rel = std::abs(value - target) / std::max(std::abs(start - target), tiny);
+        const double k = rel >= 1.0 ? 0.0009 : 9e-5 * std::exp(5.0 * (1.0 - rel));
+        value = (1.0 - k) * value + k * target;
+        if (!(rel < 0.01)) return true;
+        return value = target, false;
+    }
+};
+
 // The equaliser written the obvious way: channel by channel, band by band, sample by sample.
 template <typename Progress = Corvo::DSP::AudioParameterProgressAlternate>
 class ParEQ {
