@@ -41,12 +41,12 @@ public:
           m_filter(*converter.pairs),
           m_state(state),
           m_block(block),
-          m_step(toNextOutput) {}
+          m_step(static_cast<std::ptrdiff_t>(toNextOutput)) {}
 
     void Run(int frames) {
         State state = m_state;
         Block block = m_block;
-        std::int64_t step = m_step;
+        std::ptrdiff_t step = m_step;
         const double *const phases = m_filter.phases.data(), *const advance = m_filter.advance.data();
         for (int i = 0; i < frames; ++i) {
             m_sample = Read(block);
@@ -88,11 +88,11 @@ private:
         }
     }
 
-    const std::int64_t m_up, m_down;
+    const std::ptrdiff_t m_up, m_down;
     const PolePairLowPass& m_filter;
     State m_state;
     Block m_block;
-    std::int64_t m_step;
+    std::ptrdiff_t m_step;
     Lanes m_sample = Lanes(0.0);
     int m_written = 0;
 };
