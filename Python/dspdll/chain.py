@@ -14,6 +14,8 @@ class Chain(Processor):
     can be set up further, and may stand in other chains, too."""
 
     def __init__(self, processors: Iterable[Processor]) -> None:
+        if isinstance(processors, Processor) or not isinstance(processors, Iterable):
+            raise TypeError(f"a chain takes a list of effects: [{processors!r}]")
         self._parts = tuple(processors)
         for part in self._parts:
             if not isinstance(part, Processor):

@@ -8,6 +8,10 @@ from . import _native
 from .effect import Effect, Table
 
 
+def _told(table, index):
+    return f"{table.accepted(index)}; {table.defaults[index]} at first"
+
+
 def _document(name, table):
     """The class's help: every parameter, and the presets."""
     lines = [f"{name}(preset=None, **parameters)", "",
@@ -16,11 +20,9 @@ def _document(name, table):
         if table.is_side(attribute):
             continue
         label = next(n for n, i in table.names.items() if i is indices)
-        choices = [choice.text.strip() for choice in table.parameters[indices[0]].choices]
-        accepted = ", ".join(choices) if choices else " to ".join(table.ranges[indices[0]])
         sides = [a for a, i in table.attributes.items() if table.is_side(a) and set(i) < set(indices)]
         alone = f" ({', '.join(sides)}: one side)" if sides else ""
-        lines += [f'{attribute}, "{label}"{alone}', f"    {accepted}; {table.defaults[indices[0]]} at first"]
+        lines += [f'{attribute}, "{label}"{alone}', f"    {_told(table, indices[0])}"]
     if table.presets:
         quoted = ", ".join(f'"{preset}"' for preset in table.presets)
         lines += ["", f"Presets, {table.default_preset!r} at first:"]
@@ -42,8 +44,7 @@ def _class(kind):
                         for attribute, indices in table.attributes.items()}
     members = {"_table": table, "__doc__": _document(name, table), "__module__": __package__}
     for attribute, indices in table.attributes.items():
-        accepted = " to ".join(table.ranges[indices[0]])
-        members[attribute] = _property(indices, f"{accepted}; {table.defaults[indices[0]]} at first")
+        members[attribute] = _property(indices, _told(table, indices[0]))
     keywords = [inspect.Parameter(a, inspect.Parameter.KEYWORD_ONLY, default=None) for a in table.attributes]
     preset = inspect.Parameter("preset", inspect.Parameter.POSITIONAL_OR_KEYWORD, default=None)
     members["__signature__"] = inspect.Signature([preset, *keywords])
