@@ -128,6 +128,9 @@ template <typename Player>
 Spectra Analyse(kivspectrum& analyser, Player& player, bool keepAll) {
     Spectra spectra;
     spectra.mean.resize(analyser.GetPower().size());
+    if (keepAll)
+        spectra.all.reserve(spectra.mean.size() *
+                            static_cast<std::size_t>(1 + player.Left() / kivspectrum::settings.hop_length));
     for (int wanted = kivspectrum::settings.window_length; spectra.windows == 0 || player.Left() >= wanted;
          wanted = kivspectrum::settings.hop_length) {
         player.Feed(analyser, wanted);
@@ -152,6 +155,17 @@ py::array_t<float> Shares(const Values& powers, double full) {
     return shares;
 }
 
+// As an array of (windows, bins) that takes the memory over: a long recording's windows are a large part of
+// it.
+py::array_t<float> AllShares(Spectra& spectra, double full) {
+    for (float& power : spectra.all) power = static_cast<float>(static_cast<double>(power) / full);
+    auto kept = std::make_unique<std::vector<float>>(std::move(spectra.all));
+    const auto bins = static_cast<py::ssize_t>(spectra.mean.size());
+    float* const values = kept->data();
+    const py::capsule owner(kept.release(), [](void* all) { delete static_cast<std::vector<float>*>(all); });
+    return py::array_t<float>({spectra.windows, bins}, values, owner);
+}
+
 // (mean, peaks, all or None), each as powers relative to a full-scale sine's; all is (windows, bins).
 py::tuple SpectraOf(const py::array& x, int rate, int type, int length, float overlap, bool keepAll,
                     int axis) {
@@ -165,9 +179,7 @@ py::tuple SpectraOf(const py::array& x, int rate, int type, int length, float ov
         full = Corvo::FullScalePower(kivspectrum::GetSettings());
     });
     py::object all = py::none();
-    if (keepAll)
-        all = Shares(spectra.all, full)
-                  .reshape({spectra.windows, static_cast<py::ssize_t>(spectra.mean.size())});
+    if (keepAll) all = AllShares(spectra, full);
     return py::make_tuple(Shares(spectra.mean, full), Shares(peaks, full), all);
 }
 

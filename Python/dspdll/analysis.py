@@ -20,7 +20,9 @@ _FLOOR = 1e-30
 
 def decibels(shares: Audio) -> Audio:
     """Powers relative to a full-scale sine's, in dB; -300 for nothing."""
-    levels: Audio = 10.0 * np.log10(np.maximum(shares, _FLOOR))
+    levels: Audio = np.maximum(shares, _FLOOR, out=shares)  # in place: sonograms are large
+    np.log10(levels, out=levels)
+    levels *= 10.0
     return levels
 
 
