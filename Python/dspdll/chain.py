@@ -2,7 +2,7 @@
 
 from __future__ import annotations
 
-from typing import Iterable, Iterator, List, Tuple
+from typing import Iterable, Iterator, List
 
 from .processor import Processor
 
@@ -35,6 +35,3 @@ class Chain(Processor):
 
     def __repr__(self) -> str:
         return f"Chain([{', '.join(map(repr, self._parts))}])"
-
-    def __reduce__(self) -> Tuple[type, Tuple[Tuple[Processor, ...]]]:
-        return Chain, (self._parts,)

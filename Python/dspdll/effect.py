@@ -368,8 +368,13 @@ class Effect(Processor):
 
     # Copies and texts.
 
-    def __reduce__(self) -> Tuple[Any, ...]:
-        return _restore, (self._table.kind, self._preset, self.state, self._tempo, self._automation)
+    def __getstate__(self) -> Dict[str, Any]:
+        return {**super().__getstate__(), "_native": self.state}
+
+    def __setstate__(self, kept: Dict[str, Any]) -> None:
+        native = _native.Effect(self._table.kind)
+        native.set_state(kept["_native"])
+        super().__setstate__({**kept, "_native": native})
 
     def __repr__(self) -> str:
         """Shows the preset, and what differs from it."""
@@ -387,15 +392,3 @@ class Effect(Processor):
             if left.intersection(indices) and len({now[index] for index in indices}) == 1:
                 left.difference_update(indices)
                 yield f"{name}={now[indices[0]]!r}"
-
-
-def _restore(kind: str, preset: Optional[str], state: bytes, tempo: float,
-             automation: Dict[int, List[Tuple[float, float]]]) -> Effect:
-    from .effects import by_kind
-
-    effect = by_kind(kind)()
-    effect._native.set_state(state)
-    effect._preset = preset
-    effect._tempo = tempo
-    effect._automation = dict(automation)
-    return effect

@@ -51,11 +51,6 @@ def _class(kind):
     return type(name, (Effect,), members)
 
 
-def by_kind(kind):
-    """The class of the effect that the library calls `kind`."""
-    return _classes[kind]
-
-
-_classes = {kind: _class(kind) for kind in _native.kinds()}
-__all__ = [c.__name__ for c in _classes.values()]
-globals().update((c.__name__, c) for c in _classes.values())
+_classes = [_class(kind) for kind in _native.kinds()]
+__all__ = [c.__name__ for c in _classes]
+globals().update((c.__name__, c) for c in _classes)

@@ -113,9 +113,6 @@ class Equalizer(Processor):
     def __repr__(self) -> str:
         return f"Equalizer({[str(band) for band in self._bands]}{', invert=True' if self._invert else ''})"
 
-    def __reduce__(self) -> Tuple[Any, ...]:
-        return _restore, (self._bands, self._invert)
-
 
 def _band(band: Union[Band, str, Mapping[str, Any]]) -> Band:
     if isinstance(band, str):
@@ -125,7 +122,3 @@ def _band(band: Union[Band, str, Mapping[str, Any]]) -> Band:
     if not isinstance(band, Band):
         raise TypeError(f"a band is a text, a Band or a mapping, not {band!r}")
     return band
-
-
-def _restore(bands: Tuple[Band, ...], invert: bool) -> Equalizer:
-    return Equalizer(bands, invert=invert)

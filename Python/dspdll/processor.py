@@ -4,7 +4,7 @@ from __future__ import annotations
 
 import itertools
 import operator
-from typing import TYPE_CHECKING, Any, Iterable, Iterator, List, Optional, Tuple, Union
+from typing import TYPE_CHECKING, Any, Dict, Iterable, Iterator, List, Optional, Tuple, Union
 
 import numpy as np
 
@@ -66,6 +66,9 @@ class Stream(_native.Line):
     shape and type, later by `latency` frames. All blocks have the type of the first one, float32 or float64.
     Later changes to the effects it was made of do not reach it.
     """
+
+    def __repr__(self) -> str:
+        return f"<Stream of {self.channels} channels at {self.rate} Hz, {self.position} frames processed>"
 
     def flush(self, tail: Tail = 0.0) -> Audio:
         """What is still inside when the signal has ended: `latency` frames, and the tail; always of two
@@ -140,6 +143,15 @@ class Processor:
 
     def _changed(self) -> None:
         object.__setattr__(self, "_revision", next(_revisions))
+
+    def __getstate__(self) -> Dict[str, Any]:
+        kept = dict(self.__dict__)  # at once: another thread may be processing
+        kept.pop("_spare", None)
+        return kept
+
+    def __setstate__(self, kept: Dict[str, Any]) -> None:
+        self.__dict__.update(kept)
+        self._changed()
 
     def _stations(self) -> List["Processor"]:
         """What it consists of, in order."""

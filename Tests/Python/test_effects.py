@@ -65,7 +65,7 @@ def test_layouts_and_copies(effect):
     left = fx(x[:, 0], RATE)
     assert left.shape == (3000,) and np.array_equal(fx(x[:, :1], RATE)[:, 0], left)
     for twin in (copy.copy(fx), copy.deepcopy(fx), pickle.loads(pickle.dumps(fx)), eval(repr(fx), vars(dsp))):
-        assert twin is not fx and repr(twin) == repr(fx) and np.array_equal(twin(x, RATE), y)
+        assert twin is not fx and type(twin) is effect and repr(twin) == repr(fx) and np.array_equal(twin(x, RATE), y)
     assert fx(x[:0], RATE).shape == (0, 2)
 
 
@@ -234,6 +234,21 @@ def test_threads():
     while any(thread.is_alive() for thread in threads):
         counted += 1
     assert counted > 1000 and len(results) == 3 and all(np.array_equal(result, expected) for result in results)
+
+
+class Quieter(dsp.Gain):
+    """An effect of a user's own."""
+
+
+def test_copies_keep_class_and_automation():
+    fx = dsp.Chain([Quieter(gain=-20), dsp.Tremolo(), dsp.Equalizer(["80 highpass"], invert=True)])
+    fx[1].automate("Mix", [(0, 0), (0.01, 1)])
+    fx[1].tempo = 90
+    expected = fx(noise(3000), RATE)
+    for twin in (copy.deepcopy(fx), pickle.loads(pickle.dumps(fx))):
+        assert type(twin[0]) is Quieter and np.array_equal(twin(noise(3000), RATE), expected)
+        twin[1].tempo = fx[1].tempo + 1
+        assert fx[1].tempo == 90
 
 
 def test_an_interrupt_ends_a_long_call():
