@@ -31,8 +31,6 @@ dsp_status GiveKey(dsp_effect* effect, double* const* channels) {
     return dsp_effect_sidechain_f64(effect, 0, channels);
 }
 
-void DSP_CALL TellTempo(void* user, dsp_tempo* tempo) { tempo->bpm = static_cast<dsp_tempo*>(user)->bpm; }
-
 }  // namespace
 
 Line::Line(int rate, int channels, int axis)
@@ -56,8 +54,8 @@ void Line::AddEffect(const std::string& name, const std::string& state,
             jumps.push_back({std::llround(seconds * m_rate), value, 0.0f});
         Check(dsp_effect_automate(effect, parameter, jumps.data(), jumps.size()));
     }
-    station->tempo.bpm = bpm;
-    Check(dsp_effect_tempo_callback(effect, TellTempo, &station->tempo));
+    station->bpm = bpm;
+    Check(dsp_effect_tempo_callback(effect, TellTempo, &station->bpm));
     station->keyChannels = keyChannels;
     if (keyChannels > 0) Check(dsp_effect_sidechain_channels(effect, 0, keyChannels));
     m_stations.push_back(std::move(station));

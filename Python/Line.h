@@ -54,7 +54,7 @@ private:
     struct Station {
         Owned<dsp_effect> effect;  // or:
         Owned<dsp_equaliser> equaliser;
-        dsp_tempo tempo{};
+        double bpm = 0.0;
         int keyChannels = 0;
     };
     // Where a block comes from and goes to.

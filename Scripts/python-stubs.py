@@ -11,7 +11,7 @@ def stub(cls):
     preset = f"Optional[Literal[{presets}]]" if presets else "None"
     doc = cls.__doc__.replace("\\", "\\\\").replace("\n", "\n    ").replace("\n    \n", "\n\n")
     lines = [f"class {cls.__name__}(Effect):", f'    """{doc}\n    """',
-             f"    def __init__(self, preset: {preset} = ..., *, "
+             f"    def __init__(self, preset: {preset} = ..., *, tempo: float = ..., "
              + ", ".join(f"{a}: Value = ..." for a in table.attributes) + ") -> None: ..."]
     # Any: a number, a text or a switch, as the parameter is.
     return "\n".join(lines + [f"    {a}: Any" for a in table.attributes])

@@ -97,8 +97,6 @@ class Table:
         self.sidechain_channels: int = native.sidechain_channels()
         self.parameters = native.parameters()
         self.defaults = [shown(native, index) for index in range(len(self.parameters))]
-        self.ranges = [(native.value_to_text(index, 0.0), native.value_to_text(index, 1.0))
-                       for index in range(len(self.parameters))]
         # Lists whose texts are more than a number: "512 + 2048" and "512 + 4096".
         self.wordy = {index for index, parameter in enumerate(self.parameters)
                       if len({read_number(choice.text) for choice in parameter.choices}) < len(parameter.choices)}
@@ -118,9 +116,9 @@ class Table:
             raise UnknownParameter(f"{self.kind} has no parameter {name!r}; " + self.suggestion(str(name), self.names))
         return indices
 
-    def accepted(self, index: int) -> str:
+    def accepted(self, index: int, native: _native.Effect) -> str:
         choices = [choice.text.strip() for choice in self.parameters[index].choices]
-        return ", ".join(choices) if choices else " to ".join(self.ranges[index])
+        return ", ".join(choices) if choices else " to ".join(ends(native, index))
 
     def is_side(self, name: str) -> bool:
         """Whether `name`, a label or its attribute, is one side of a pair that has a name, too."""
@@ -134,13 +132,18 @@ class Table:
     def describe(self, label: str, native: _native.Effect) -> Parameter:
         index = self.labels[label][0]
         parameter = self.parameters[index]
-        return Parameter(label, attribute_name(label), parameter.unit.strip(), self.ranges[index],
+        return Parameter(label, attribute_name(label), parameter.unit.strip(), ends(native, index),
                          tuple(choice.text.strip() for choice in parameter.choices), self.defaults[index],
                          shown(native, index))
 
 
 def shown(native: _native.Effect, index: int) -> str:
     return native.text(index)
+
+
+def ends(native: _native.Effect, index: int) -> Tuple[str, str]:
+    """The texts of the lowest and highest value; a mode beside the parameter may change them."""
+    return native.value_to_text(index, 0.0), native.value_to_text(index, 1.0)
 
 
 def suggestion(name: str, accepted: Iterable[str], told: Iterable[str]) -> str:
@@ -174,15 +177,14 @@ class Effect(Processor):
     _tempo: float
     _automation: Dict[int, List[Tuple[float, float]]]
 
-    def __init__(self, preset: Optional[str] = None, **parameters: Value) -> None:
+    def __init__(self, preset: Optional[str] = None, *, tempo: float = 120.0, **parameters: Value) -> None:
         if not hasattr(type(self), "_table"):
             raise TypeError("Effect is what all effects have in common; make one of these: "
                             + ", ".join(c.__name__ for c in Effect.__subclasses__()))
         self._native = _native.Effect(self._table.kind)
         self._preset = self._table.default_preset
-        self._tempo = 120.0
         self._automation = {}
-        self._changed()
+        self.tempo = tempo
         if preset is not None:
             self.preset = preset
         table = self._table
@@ -234,18 +236,23 @@ class Effect(Processor):
             text = "inf" if value > 0 else "-inf"
         else:
             text = np.format_float_positional(float(value), trim="-")
-        ends = self._table.ranges[index]
-        number, lowest, highest = map(read_number, (text, *ends))
+        number, lowest, highest = map(read_number, (text, *ends(self._native, index)))
         try:
             normalised = self._native.text_to_value(index, text)
-            # What the library limits would be another value than the one asked for.
-            fits = (number is None or lowest is None or highest is None or normalised not in (0.0, 1.0)
-                    or lowest - _slack(lowest) <= number <= highest + _slack(highest))
+            # What the library limits would be another value than the one asked for, as a number among words is.
+            if number is None or self._table.parameters[index].choices:
+                fits = True
+            elif lowest is None or highest is None:
+                fits = lowest is not highest
+            else:
+                fits = (normalised not in (0.0, 1.0)
+                        or lowest - _slack(lowest) <= number <= highest + _slack(highest))
         except ValueError:
             fits = False
         if not fits:
             label = self._table.parameters[index].label
-            raise ValueError(f"{label} cannot be {value!r}; accepted: {self._table.accepted(index)}")
+            raise ValueError(f"{label} cannot be {value!r}; accepted: "
+                             + self._table.accepted(index, self._native))
         return normalised
 
     def __setattr__(self, name: str, value: Any) -> None:
@@ -311,6 +318,7 @@ class Effect(Processor):
         if not is_number(bpm) or not 1.0 <= bpm <= 1000.0:
             raise ValueError(f"the tempo can be 1 to 1000 bpm, not {bpm!r}")
         self._tempo = float(bpm)
+        self._native.set_tempo(self._tempo)
         self._changed()
 
     def automate(self, name: str, points: Iterable[Tuple[float, Value]], *, ramp: Optional[float] = None) -> None:
@@ -374,17 +382,21 @@ class Effect(Processor):
     def __setstate__(self, kept: Dict[str, Any]) -> None:
         native = _native.Effect(self._table.kind)
         native.set_state(kept["_native"])
+        native.set_tempo(kept["_tempo"])
         super().__setstate__({**kept, "_native": native})
 
     def __repr__(self) -> str:
-        """Shows the preset, and what differs from it."""
+        """Shows the preset, and what differs from it; automation is not shown."""
         return f"{type(self).__name__}({', '.join(self._differences())})"
 
     def _differences(self) -> Iterator[str]:
         plain = _native.Effect(self._table.kind)
+        plain.set_tempo(self._tempo)
         if self._preset is not None:
             plain.set_preset(self.presets.index(self._preset))
             yield f"preset={self._preset!r}"
+        if self._tempo != 120.0:
+            yield f"tempo={self._tempo!r}"
         now = [shown(self._native, index) for index in range(len(self._table.parameters))]
         left = {index for index, text in enumerate(now) if text != shown(plain, index)}
         # Names stand before labels: both sides at once where they say the same.

@@ -217,8 +217,11 @@ def test_sidechain_and_tempo():
     click[0] = 0.5
     places = []
     for bpm in (60, 120):
-        echo = dsp.Echo("Single delay", depth_mode="Tempo (straight)")
-        echo.tempo = bpm
+        echo = dsp.Echo("Single delay", depth_mode="Tempo (straight)", tempo=bpm)
+        assert f"({240000 // bpm} ms)" in echo.parameters["Depth L"].range[1]
+        assert eval(repr(echo), vars(dsp)).tempo == bpm
+        with pytest.raises(ValueError, match=r"accepted: 1/256 .* to Measure"):
+            echo.depth = 500
         places.append(np.flatnonzero(np.abs(echo(click, RATE)[100:, 0]) > 1e-3)[0] + 100)
     assert places[0] == pytest.approx(2 * places[1], abs=2)
 
