@@ -77,6 +77,7 @@ void Line::AddEqualizer(const std::vector<std::tuple<int, int, double, int>>& ba
 
 void Line::Prepare(int sample) {
     const dsp_format format{sizeof(dsp_format), m_rate, m_channels, sample, kBlock};
+    m_sample = -1;  // until all are prepared
     for (const auto& station : m_stations)
         Explained([&](dsp_error* error) {
             return station->effect ? dsp_effect_prepare(station->effect.get(), &format, error)
