@@ -10,6 +10,7 @@
 #include "Arrays.h"
 #include "C/AnalyserHandle.h"
 #include "Handle.h"
+#include "Interrupt.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
 #include "Spectrum/Scales/SpectrumScales.h"
@@ -39,6 +40,7 @@ public:
     Session(int rate, const Window& window)
         : m_guard(Lock()),
           m_before(kivspectrum::GetSettings()),
+          m_speedBefore(Corvo::Sonogram::GetSpeedIndex()),
           m_handle(Made<dsp_analyser>([rate](dsp_analyser** handle, dsp_error* error) {
               return dsp_analyser_create(rate, handle, error);
           })) {
@@ -56,6 +58,7 @@ public:
     ~Session() {
         m_handle.reset();
         kivspectrum::settings = m_before;
+        Corvo::Sonogram::SetSpeedIndex(m_speedBefore);
     }
     Session(const Session&) = delete;
     Session& operator=(const Session&) = delete;
@@ -71,6 +74,7 @@ private:
 
     std::lock_guard<std::mutex> m_guard;
     Corvo::SpectrumSettings m_before;
+    int m_speedBefore;
     Owned<dsp_analyser> m_handle;
     kivspectrum* m_analyser = nullptr;
 };
@@ -88,6 +92,7 @@ public:
         if (given > 0) Gather(m_from, m_fed, given, channels, m_block.data());
         analyser.Feed(m_block.data(), frames, static_cast<int>(channels), static_cast<int>(channels));
         m_fed += frames;
+        m_interrupt.Check();
     }
     py::ssize_t Fed() const { return m_fed; }
     py::ssize_t Left() const { return m_shape.frames - m_fed; }
@@ -96,6 +101,7 @@ private:
     Strided<const Sample> m_from;
     Shape m_shape;
     py::ssize_t m_fed = 0;
+    Interrupt m_interrupt;
     std::vector<Sample> m_block;
 };
 
@@ -122,6 +128,9 @@ template <typename Player>
 Spectra Analyse(kivspectrum& analyser, Player& player, bool keepAll) {
     Spectra spectra;
     spectra.mean.resize(analyser.GetPower().size());
+    if (keepAll)
+        spectra.all.reserve(spectra.mean.size() *
+                            static_cast<std::size_t>(1 + player.Left() / kivspectrum::settings.hop_length));
     for (int wanted = kivspectrum::settings.window_length; spectra.windows == 0 || player.Left() >= wanted;
          wanted = kivspectrum::settings.hop_length) {
         player.Feed(analyser, wanted);
@@ -146,6 +155,17 @@ py::array_t<float> Shares(const Values& powers, double full) {
     return shares;
 }
 
+// As an array of (windows, bins) that takes the memory over: a long recording's windows are a large part of
+// it.
+py::array_t<float> AllShares(Spectra& spectra, double full) {
+    for (float& power : spectra.all) power = static_cast<float>(static_cast<double>(power) / full);
+    auto kept = std::make_unique<std::vector<float>>(std::move(spectra.all));
+    const auto bins = static_cast<py::ssize_t>(spectra.mean.size());
+    float* const values = kept->data();
+    const py::capsule owner(kept.release(), [](void* all) { delete static_cast<std::vector<float>*>(all); });
+    return py::array_t<float>({spectra.windows, bins}, values, owner);
+}
+
 // (mean, peaks, all or None), each as powers relative to a full-scale sine's; all is (windows, bins).
 py::tuple SpectraOf(const py::array& x, int rate, int type, int length, float overlap, bool keepAll,
                     int axis) {
@@ -159,9 +179,7 @@ py::tuple SpectraOf(const py::array& x, int rate, int type, int length, float ov
         full = Corvo::FullScalePower(kivspectrum::GetSettings());
     });
     py::object all = py::none();
-    if (keepAll)
-        all = Shares(spectra.all, full)
-                  .reshape({spectra.windows, static_cast<py::ssize_t>(spectra.mean.size())});
+    if (keepAll) all = AllShares(spectra, full);
     return py::make_tuple(Shares(spectra.mean, full), Shares(peaks, full), all);
 }
 
@@ -262,7 +280,6 @@ py::array DrawSonogram(const py::array& x, int rate, int type, int length, bool 
         Session session(rate, pitch ? TunerWindow(rate) : Window{type, length, kDisplayOverlap});
         auto& analyser = session.Analyser();
         auto& sonogram = *analyser.GetSonogram();
-        const int speedBefore = Corvo::Sonogram::GetSpeedIndex();
         analyser.SetTunerOn(pitch);
         analyser.ShowSonogram(true);
         picture->Draw(session.Handle(), DSP_VIEW_SONOGRAM);  // makes the sonogram as wide as it can be
@@ -283,7 +300,6 @@ py::array DrawSonogram(const py::array& x, int rate, int type, int length, bool 
             analyser.GetSpectrumDrawer()->AgePeaks();  // as drawing every refresh would
         });
         picture->Draw(session.Handle(), DSP_VIEW_SONOGRAM);
-        Corvo::Sonogram::SetSpeedIndex(speedBefore);
     });
     return picture->Pixels();
 }

@@ -112,6 +112,13 @@ void Scatter(const From* block, py::ssize_t frames, py::ssize_t channels, const 
     }
 }
 
+// What is an array or can become one, as a list can.
+inline py::array AnyArray(const py::object& x) {
+    auto array = py::array::ensure(x);
+    if (!array) throw py::type_error("not an array of samples: " + py::repr(x).cast<std::string>());
+    return array;
+}
+
 // call(float()) or call(double()) for what the array holds; TypeError for anything else.
 template <typename Call>
 auto ByType(const py::array& x, Call call) {

@@ -8,6 +8,7 @@
 #include "Arrays.h"
 #include "DSP/Equalizer/BuiltinEffectsData.h"
 #include "Handle.h"
+#include "Interrupt.h"
 
 namespace python {
 namespace {
@@ -36,6 +37,7 @@ py::array ConvertAs(const py::array& x, int inRate, int outRate, bool nearest, i
         std::vector<Sample> in(static_cast<std::size_t>(kBlock * channels));
         std::vector<Sample> out(static_cast<std::size_t>(most * channels));
         py::ssize_t stands = 0;
+        Interrupt interrupt;
         int written = 0;
         const auto keepWritten = [&] {
             Scatter(out.data(), std::min<py::ssize_t>(written, outFrames - stands), channels, to, stands);
@@ -47,6 +49,7 @@ py::array ConvertAs(const py::array& x, int inRate, int outRate, bool nearest, i
             Check(dsp_converter_process(converter.get(), in.data(), static_cast<int>(count), out.data(),
                                         static_cast<int>(most), &written));
             keepWritten();
+            interrupt.Check();
         }
         do {
             Check(dsp_converter_finish(converter.get(), out.data(), static_cast<int>(most), &written));
@@ -70,6 +73,7 @@ py::array ShiftAs(const py::array& x, const dsp_shift& settings, int axis) {
     {
         const py::gil_scoped_release released;
         std::vector<float> block(static_cast<std::size_t>(kBlock * shape.channels));
+        Interrupt interrupt;
         const auto take = [&] {
             for (int written = kBlock; written == kBlock;) {
                 Check(dsp_pitch_shift_take(engine.get(), block.data(), kBlock, &written));
@@ -81,6 +85,7 @@ py::array ShiftAs(const py::array& x, const dsp_shift& settings, int axis) {
             Gather(from, done, count, shape.channels, block.data());
             Check(dsp_pitch_shift_feed(engine.get(), block.data(), static_cast<int>(count)));
             take();
+            interrupt.Check();
         }
         Check(dsp_pitch_shift_finish(engine.get()));
         take();
@@ -98,6 +103,7 @@ py::array Convert(const py::array& x, int inRate, int outRate, bool nearest, int
 
 py::array Shift(const py::array& x, int rate, double semitones, const std::string& engine, int quality,
                 double speed, int axis) {
+    if (!(speed > 0.0)) throw std::invalid_argument("the speed can be 0.1 to 10");  // 0 would count as 1
     if (engine != "new" && engine != "classic")
         throw std::invalid_argument("there is no engine \"" + engine + "\"; there are new, classic");
     const dsp_shift settings{

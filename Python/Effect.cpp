@@ -60,6 +60,11 @@ float Effect::TextToValue(int index, const std::string& text) const {
 
 bool Effect::PlaysAutomation() { return dsp_effect_automate(m_effect.get(), 0, nullptr, 0) == DSP_OK; }
 
+void Effect::SetTempo(double bpm) {
+    m_bpm = bpm;
+    Check(dsp_effect_tempo_callback(m_effect.get(), TellTempo, &m_bpm));
+}
+
 std::vector<std::string> Effect::Presets() const {
     std::vector<std::string> names;
     const int count = Asked(dsp_effect_presets, m_effect);
@@ -118,6 +123,7 @@ void DefineEffect(py::module_& module) {
         .def("value_to_text", &Effect::ValueToText)
         .def("text_to_value", &Effect::TextToValue)
         .def("plays_automation", &Effect::PlaysAutomation)
+        .def("set_tempo", &Effect::SetTempo)
         .def("presets", &Effect::Presets)
         .def("default_preset", &Effect::DefaultPreset)
         .def("set_preset", &Effect::SetPreset)

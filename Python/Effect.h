@@ -26,6 +26,8 @@ public:
     std::string ValueToText(int index, float value) const;
     float TextToValue(int index, const std::string& text) const;
     bool PlaysAutomation();
+    // Texts of parameters in notes say how long those are.
+    void SetTempo(double bpm);
 
     std::vector<std::string> Presets() const;
     int DefaultPreset() const;
@@ -40,6 +42,7 @@ public:
 private:
     std::string ParameterText(int index, int which) const;
 
+    double m_bpm = 120.0;
     Owned<dsp_effect> m_effect;
 };
 

@@ -20,4 +20,6 @@ void Throw(dsp_status status, const char* text) {
     }
 }
 
+void DSP_CALL TellTempo(void* bpm, dsp_tempo* tempo) { tempo->bpm = *static_cast<const double*>(bpm); }
+
 }  // namespace python

@@ -17,6 +17,8 @@ template <typename Opaque>
 using Owned = std::unique_ptr<Opaque, Closer>;
 
 [[noreturn]] void Throw(dsp_status status, const char* text);
+// For effects that follow a tempo: `bpm` points to a double.
+void DSP_CALL TellTempo(void* bpm, dsp_tempo* tempo);
 inline void Check(dsp_status status) {
     if (status != DSP_OK) Throw(status, "");
 }

@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <cmath>
 
+#include "Interrupt.h"
+
 namespace python {
 namespace {
 
@@ -29,8 +31,6 @@ dsp_status GiveKey(dsp_effect* effect, double* const* channels) {
     return dsp_effect_sidechain_f64(effect, 0, channels);
 }
 
-void DSP_CALL TellTempo(void* user, dsp_tempo* tempo) { tempo->bpm = static_cast<dsp_tempo*>(user)->bpm; }
-
 }  // namespace
 
 Line::Line(int rate, int channels, int axis)
@@ -54,12 +54,11 @@ void Line::AddEffect(const std::string& name, const std::string& state,
             jumps.push_back({std::llround(seconds * m_rate), value, 0.0f});
         Check(dsp_effect_automate(effect, parameter, jumps.data(), jumps.size()));
     }
-    station->tempo.bpm = bpm;
-    Check(dsp_effect_tempo_callback(effect, TellTempo, &station->tempo));
+    station->bpm = bpm;
+    Check(dsp_effect_tempo_callback(effect, TellTempo, &station->bpm));
     station->keyChannels = keyChannels;
     if (keyChannels > 0) Check(dsp_effect_sidechain_channels(effect, 0, keyChannels));
     m_stations.push_back(std::move(station));
-    m_sample = -1;
 }
 
 void Line::AddEqualizer(const std::vector<std::tuple<int, int, double, int>>& bands, bool invert) {
@@ -74,11 +73,11 @@ void Line::AddEqualizer(const std::vector<std::tuple<int, int, double, int>>& ba
     });
     Check(dsp_equaliser_invert(station->equaliser.get(), invert));
     m_stations.push_back(std::move(station));
-    m_sample = -1;
 }
 
 void Line::Prepare(int sample) {
     const dsp_format format{sizeof(dsp_format), m_rate, m_channels, sample, kBlock};
+    m_sample = -1;  // until all are prepared
     for (const auto& station : m_stations)
         Explained([&](dsp_error* error) {
             return station->effect ? dsp_effect_prepare(station->effect.get(), &format, error)
@@ -158,7 +157,9 @@ void Line::Run(const Passage<Sample>& p) {
     // Where the result stands as it is processed, one copy is enough.
     const bool direct = p.skip == 0 && p.to.Interleaved(m_channels);
     if (direct) Gather(p.from, 0, p.frames, m_channels, p.to.At(0));
+    Interrupt interrupt;
     for (py::ssize_t done = 0; done < p.total;) {
+        interrupt.Check();
         const auto count = std::min<py::ssize_t>(kBlock, p.total - done);
         const auto given = std::clamp<py::ssize_t>(p.frames - done, 0, count);
         Sample* const block = direct ? p.to.At(done) : scratch;
@@ -178,6 +179,7 @@ void Line::Run(const Passage<Sample>& p) {
 
 template <typename Sample>
 py::array Line::ProcessAs(const py::array& x, py::ssize_t extra, py::ssize_t skip, const py::object& key) {
+    if (extra < 0 || skip < 0) throw std::invalid_argument("frames before and behind cannot be below 0");
     const Shape shape = ShapeOf(x, x.ndim() == 1 ? 0 : m_axis, 2);
     if (shape.channels != m_channels)
         throw std::invalid_argument("the stream has " + std::to_string(m_channels) + " channels, the block " +
@@ -189,8 +191,9 @@ py::array Line::ProcessAs(const py::array& x, py::ssize_t extra, py::ssize_t ski
     passage.total = shape.frames + extra;
     passage.skip = std::min(skip, passage.total);
     if (!key.is_none()) {
-        keyArray = py::array_t<Sample, py::array::forcecast>::ensure(key);
-        if (!keyArray) throw py::type_error("the side-chain is no array of samples");
+        keyArray = AnyArray(key);
+        ByType(keyArray, [](auto) {});
+        keyArray = py::array_t<Sample, py::array::forcecast>(keyArray);
         const Shape keyShape = ShapeOf(keyArray, keyArray.ndim() == 1 ? 0 : m_axis, 2);
         if (keyShape.frames != shape.frames)
             throw std::invalid_argument("the side-chain has " + std::to_string(keyShape.frames) +
@@ -207,6 +210,8 @@ py::array Line::ProcessAs(const py::array& x, py::ssize_t extra, py::ssize_t ski
     return result;
 }
 
+py::array Line::Call(const py::object& x) { return Process(AnyArray(x), 0, 0, py::none()); }
+
 py::array Line::Process(const py::array& x, py::ssize_t extra, py::ssize_t skip, const py::object& key) {
     return ByType(x, [&](auto sample) { return ProcessAs<decltype(sample)>(x, extra, skip, key); });
 }
@@ -214,10 +219,10 @@ py::array Line::Process(const py::array& x, py::ssize_t extra, py::ssize_t skip,
 void DefineLine(py::module_& module) {
     py::class_<Line>(module, "Line")
         .def(py::init<int, int, int>(), py::arg("rate"), py::arg("channels"), py::arg("axis"))
-        .def("add_effect", &Line::AddEffect)
-        .def("add_equalizer", &Line::AddEqualizer)
+        .def("_add_effect", &Line::AddEffect)
+        .def("_add_equalizer", &Line::AddEqualizer)
         .def("__call__", &Line::Call, py::arg("x"))
-        .def("process", &Line::Process)
+        .def("_process", &Line::Process)
         .def("reset", &Line::Reset, "Forgets the sound and begins anew.")
         .def("rewind", &Line::Rewind,
              "Begins at position 0 with delay lines cleared: quicker than reset, but what else sounds goes "

@@ -2,6 +2,7 @@
 
 #include <pybind11/numpy.h>
 
+#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -15,7 +16,7 @@
 namespace python {
 
 // Effects and equalisers one behind the other, for one stream: what the package calls a Stream. Build it with
-// Add..., then process; the first block's type decides whether it works in floats or doubles.
+// Add... before anything else; the first block's type decides whether it works in floats or doubles.
 //
 // Any thread, one after the other: a second one waits. The interpreter's lock is released while samples are
 // processed.
@@ -32,9 +33,9 @@ public:
     void AddEqualizer(const std::vector<std::tuple<int, int, double, int>>& bands, bool invert);
 
     // A block of any length becomes a block of the same shape and type.
-    pybind11::array Call(const pybind11::array& x) { return Process(x, 0, 0, pybind11::none()); }
+    pybind11::array Call(const pybind11::object& x);
     // The same, followed by `extra` frames of silence, without the first `skip` frames of the result. `key`
-    // is an array for the side-chain, as long as x, or None.
+    // is an array of either type for the side-chain, as long as x, or None.
     pybind11::array Process(const pybind11::array& x, py::ssize_t extra, py::ssize_t skip,
                             const pybind11::object& key);
     // Forgets the sound and begins at position 0.
@@ -53,7 +54,7 @@ private:
     struct Station {
         Owned<dsp_effect> effect;  // or:
         Owned<dsp_equaliser> equaliser;
-        dsp_tempo tempo{};
+        double bpm = 0.0;
         int keyChannels = 0;
     };
     // Where a block comes from and goes to.
@@ -77,8 +78,8 @@ private:
     const int m_rate, m_channels, m_axis;
     std::vector<std::unique_ptr<Station>> m_stations;
     std::mutex m_lock;
-    int m_sample = -1;  // DSP_F32 or DSP_F64; -1 before the first preparation
-    std::int64_t m_position = 0;
+    std::atomic<int> m_sample = -1;  // DSP_F32 or DSP_F64; -1 before the first preparation
+    std::atomic<std::int64_t> m_position = 0;
     std::vector<double> m_block, m_key;  // memory for a block of either type
 };
 

@@ -4,6 +4,7 @@
 #include "Analysis.h"
 #include "Conversion.h"
 #include "Effect.h"
+#include "Interrupt.h"
 #include "Line.h"
 
 // The package's inner module: what its Python files are written on top of.
@@ -15,6 +16,7 @@ PYBIND11_MODULE(_native, module) {
     const std::uint32_t version = dsp_version();
     module.attr("version") = std::to_string(version >> 16) + "." + std::to_string(version >> 8 & 255) + "." +
                              std::to_string(version & 255);
+    python::Interrupt::FindMainThread();
     python::DefineEffect(module);
     python::DefineLine(module);
     python::DefineConversion(module);

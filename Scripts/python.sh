@@ -9,6 +9,8 @@ need_packages "${BUILD_PACKAGES[@]}" pybind11-dev python3-dev python3-numpy pyth
 # Debian's Python, whose packages these are, even where another one comes first.
 python=/usr/bin/python3
 say "building (python)"
+# What was configured with another Python would keep that one's headers.
+grep -qs "_Python_EXECUTABLE:INTERNAL=$python\$" build/python/CMakeCache.txt || rm -f build/python/CMakeCache.txt
 cmake --preset python -DPython_EXECUTABLE=$python >/dev/null
 cmake --build --preset python
 say "testing (python)"

@@ -13,11 +13,13 @@ packages dspdll and soundfile.
 """
 
 import argparse
+import collections
 import functools
 import json
 import runpy
 import sys
 import time
+import warnings
 from pathlib import Path
 
 import numpy as np
@@ -89,16 +91,25 @@ def told(error):
 
 
 def do(job, pairs):
-    """Runs on a worker. For each file the seconds of audio, and what went wrong or ""."""
+    """Runs on a worker. For each file the seconds of audio, and what went wrong or ""; the job's warnings stand there
+    beside seconds above 0."""
     done = []
     for source, target in pairs:
         try:
             target.parent.mkdir(parents=True, exist_ok=True)
-            job(source, target)
-            done.append((soundfile.info(source).duration, ""))
+            with warnings.catch_warnings(record=True) as remarks:
+                warnings.simplefilter("always", UserWarning)
+                job(source, target)
+            done.append((seconds_of(source), "; ".join(str(remark.message) for remark in remarks)))
         except Exception as error:  # whatever it is, it is this file's alone
             done.append((0.0, told(error)))
     return done
+
+
+def seconds_of(source):
+    with soundfile.SoundFile(source) as file:
+        # Of some files that were cut off the number of frames is unknown, and the highest there is.
+        return max(file.frames, 1) / file.samplerate if file.frames < 2**60 else 1.0
 
 
 def to_do(folder, out, ending):
@@ -107,8 +118,9 @@ def to_do(folder, out, ending):
     sources = [path for path in folder.rglob("*")
                if path.suffix.lower() in ENDINGS and path.is_file() and out not in path.parents]
     pairs = [(source, (out / source.relative_to(folder)).with_suffix(ending or source.suffix)) for source in sources]
-    if len({target for _, target in pairs}) < len(pairs):
-        pairs = [(source, target.with_name(source.name + target.suffix)) for source, target in pairs]
+    counts = collections.Counter(target for _, target in pairs)
+    pairs = [(source, target.with_name(source.name + target.suffix) if counts[target] > 1 else target)
+             for source, target in pairs]
     missing = [(source, target) for source, target in pairs
                if not target.exists() or target.stat().st_mtime < source.stat().st_mtime]
     return sorted(missing, key=lambda pair: -pair[0].stat().st_size), len(pairs) - len(missing)
@@ -153,32 +165,43 @@ def main():
     options = parser.parse_args()
     if not options.source.is_dir():
         parser.error(f"{options.source} is no folder")
+    if options.target.resolve() in (options.source.resolve(), *options.source.resolve().parents):
+        parser.error("OUT is IN or holds it; results need a folder of their own")
+    if options.ending and not options.ending.startswith("."):
+        options.ending = "." + options.ending
     if options.measure:
         measure, ending = MEASURES[options.measure]
         job = measuring(measure)
     else:
-        chain = runpy.run_path(str(options.chain))["chain"] if options.chain else usual_chain()
+        chain = usual_chain()
+        if options.chain:
+            if not options.chain.is_file():
+                parser.error(f"{options.chain} is no file")
+            chain = runpy.run_path(str(options.chain)).get("chain")
+            if not isinstance(chain, dsp.Processor):
+                parser.error(f"{options.chain} sets no `chain`, as chain = dsp.Chain([...]) does")
         ending = options.ending
         job = rendering(chain)
     pairs, before = to_do(options.source.resolve(), options.target.resolve(), ending)
     print(f"{len(pairs)} files to do, {before} done before")
     if not pairs:
         return 0
-    failures, audio = [], 0.0
+    failures, remarks, audio = [], [], 0.0
     with cluster(options.scheduler, options.workers) as client:
         start = time.time()
         for count, (source, seconds, error) in enumerate(run(client, job, pairs, max(1, options.per_task)), 1):
             audio += seconds
             if error:
-                failures.append((source.relative_to(options.source.resolve()), error))
+                (remarks if seconds else failures).append((source.relative_to(options.source.resolve()), error))
             if sys.stderr.isatty():
                 print(f"\r{count} of {len(pairs)}", end="", file=sys.stderr)
         took = time.time() - start
     print(f"{len(pairs) - len(failures)} files, {audio / 3600:.2f} hours of audio in {took:.1f} s")
-    if failures:
-        width = max(len(str(name)) for name, _ in failures)
-        print(f"{len(failures)} files failed:")
-        for name, error in sorted(failures):
+    for rows, heading in ((remarks, "files are done, but:"), (failures, "files failed:")):
+        width = max((len(str(name)) for name, _ in rows), default=0)
+        if rows:
+            print(f"{len(rows)} {heading}")
+        for name, error in sorted(rows):
             print(f"  {str(name):{width}}  {error}")
     return 1 if failures else 0
 

@@ -6,13 +6,13 @@ run side by side."""
 from __future__ import annotations
 
 from dataclasses import dataclass, field
-from typing import Any, List, Tuple
+from typing import Any, List, Optional, Tuple
 
 import numpy as np
 
 from . import _native
 from .picture import Drawn
-from .processor import Audio, whole_rate
+from .processor import Audio, is_number, whole_axis, whole_rate
 
 WINDOWS = ("rectangular", "triangular", "hann", "hamming", "blackman")
 _FLOOR = 1e-30
@@ -20,8 +20,15 @@ _FLOOR = 1e-30
 
 def decibels(shares: Audio) -> Audio:
     """Powers relative to a full-scale sine's, in dB; -300 for nothing."""
-    levels: Audio = 10.0 * np.log10(np.maximum(shares, _FLOOR))
+    levels: Audio = np.maximum(shares, _FLOOR, out=shares)  # in place: sonograms are large
+    np.log10(levels, out=levels)
+    levels *= 10.0
     return levels
+
+
+def as_array(values: Audio, dtype: Any, copy: Optional[bool]) -> Audio:
+    """What NumPy asks __array__ for; `copy` is new in its version 2."""
+    return np.array(values, dtype) if copy else np.asarray(values, dtype)
 
 
 def axes(ax: Any) -> Any:
@@ -32,7 +39,7 @@ def axes(ax: Any) -> Any:
     return matplotlib.pyplot.subplots(layout="constrained")[1]
 
 
-@dataclass(repr=False)
+@dataclass(repr=False, eq=False)
 class Spectrum(Drawn):
     """frequencies: (bins,), Hz from 0 up. levels: (bins,), the mean of all windows, dB below a full-scale sine.
     peaks: (bins,), the highest level that each frequency reached. numpy.asarray gives the levels."""
@@ -44,8 +51,8 @@ class Spectrum(Drawn):
     window: str
     length: int
 
-    def __array__(self, dtype: Any = None) -> Audio:
-        return np.asarray(self.levels, dtype)
+    def __array__(self, dtype: Any = None, copy: Optional[bool] = None) -> Audio:
+        return as_array(self.levels, dtype, copy)
 
     @property
     def peak(self) -> Tuple[float, float]:
@@ -76,7 +83,7 @@ class Spectrum(Drawn):
                                      self.length, width, height, dpi)
 
 
-@dataclass(repr=False)
+@dataclass(repr=False, eq=False)
 class Sonogram(Drawn):
     """frequencies: (bins,), Hz. times: (windows,), seconds, the middle of each window. levels: (bins, windows),
     dB below a full-scale sine. numpy.asarray gives the levels. It keeps the recording's mean of channels for
@@ -91,8 +98,8 @@ class Sonogram(Drawn):
     pitch: bool
     _samples: Audio = field(repr=False)
 
-    def __array__(self, dtype: Any = None) -> Audio:
-        return np.asarray(self.levels, dtype)
+    def __array__(self, dtype: Any = None, copy: Optional[bool] = None) -> Audio:
+        return as_array(self.levels, dtype, copy)
 
     def __repr__(self) -> str:
         return (f"<Sonogram of {self.levels.shape[1]} windows, {self.levels.shape[0]} bins up to {self.rate / 2:g} Hz, "
@@ -115,7 +122,7 @@ class Sonogram(Drawn):
                                      width, height, dpi, 0)
 
 
-@dataclass(repr=False)
+@dataclass(repr=False, eq=False)
 class Tuning(Drawn):
     """What the tuner heard, 30 times a second. times: (readings,), seconds. frequencies: Hz, and cents: how far
     that is from the note, both NaN where nothing was heard. notes: names with octaves, "" for none.
@@ -128,8 +135,8 @@ class Tuning(Drawn):
     rate: int
     _samples: Audio = field(repr=False)
 
-    def __array__(self, dtype: Any = None) -> Audio:
-        return np.asarray(self.frequencies, dtype)
+    def __array__(self, dtype: Any = None, copy: Optional[bool] = None) -> Audio:
+        return as_array(self.frequencies, dtype, copy)
 
     def _longest(self) -> Tuple[int, int]:
         """First reading and number of them, of the note that was heard longest in one piece."""
@@ -178,7 +185,7 @@ class Tuning(Drawn):
 
 
 def _mono(x: Audio, axis: int) -> Audio:
-    return np.asarray(x if x.ndim == 1 else x.mean(axis=1 - axis), np.float32)
+    return np.asarray(x if x.ndim == 1 else x.mean(axis=1 - whole_axis(axis, 2)), np.float32)
 
 
 def _spectra(x: Audio, rate: int, window: str, length: int, overlap: float, everything: bool, axis: int) -> Any:
@@ -186,9 +193,9 @@ def _spectra(x: Audio, rate: int, window: str, length: int, overlap: float, ever
         raise ValueError(f"window cannot be {window!r}; accepted: {', '.join(WINDOWS)}")
     if length not in [2**n for n in range(7, 20)]:
         raise ValueError(f"length cannot be {length!r}; accepted: powers of two from 128 to 524288")
-    if not 0.0 <= overlap <= 0.99:
+    if not is_number(overlap) or not 0.0 <= overlap <= 0.99:
         raise ValueError(f"overlap cannot be {overlap!r}; accepted: 0 to 0.99 of a window")
-    return _native.spectra(x, rate, WINDOWS.index(window), length, overlap, everything, axis)
+    return _native.spectra(x, rate, WINDOWS.index(window), int(length), overlap, everything, axis)
 
 
 def _frequencies(rate: int, length: int) -> Audio:

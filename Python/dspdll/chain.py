@@ -2,7 +2,7 @@
 
 from __future__ import annotations
 
-from typing import Iterable, Iterator, List, Tuple
+from typing import Iterable, Iterator, List
 
 from .processor import Processor
 
@@ -14,6 +14,8 @@ class Chain(Processor):
     can be set up further, and may stand in other chains, too."""
 
     def __init__(self, processors: Iterable[Processor]) -> None:
+        if isinstance(processors, Processor) or not isinstance(processors, Iterable):
+            raise TypeError(f"a chain takes a list of effects: [{processors!r}]")
         self._parts = tuple(processors)
         for part in self._parts:
             if not isinstance(part, Processor):
@@ -33,6 +35,3 @@ class Chain(Processor):
 
     def __repr__(self) -> str:
         return f"Chain([{', '.join(map(repr, self._parts))}])"
-
-    def __reduce__(self) -> Tuple[type, Tuple[Tuple[Processor, ...]]]:
-        return Chain, (self._parts,)

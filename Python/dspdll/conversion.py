@@ -26,8 +26,8 @@ def pitch(x: Audio, rate: float, semitones: float, *, engine: str = "new", quali
     """Shifts the pitch, -36 to 36 semitones; what comes out stands where it stood.
 
     x: (frames,) or (frames, channels) with 1 or 2 channels, float32 or float64, processed as float32.
-    engine: "new" or "classic". quality: from 0, the fastest, to 4.
+    engine: "new" or "classic". quality: from 0, the fastest, to 9, with "classic" to 13.
     speed: 0.1 to 10, with the engine "new" only: how fast it plays, pitch along with it; the result has
         frames / speed frames."""
-    return _native.pitch(np.asarray(x), whole_rate(rate), float(semitones), engine, operator.index(quality),
+    return _native.pitch(np.asarray(x), whole_rate(rate), float(semitones), str(engine), operator.index(quality),
                          float(speed), operator.index(axis))

@@ -10,10 +10,11 @@ from typing import Any, ClassVar, Dict, Iterable, Iterator, List, Mapping, Optio
 import numpy as np
 
 from . import _native
-from .processor import Audio, Processor, Stream
+from .processor import Audio, Processor, Stream, is_number
 
 Value = Union[float, str, bool]
 _CONTINUOUS, _SWITCH = 0, 1
+_MOST_STEPS = 10**7  # of one parameter's automation
 
 
 def read_number(text: str) -> Optional[float]:
@@ -26,7 +27,7 @@ def read_number(text: str) -> Optional[float]:
 
 def attribute_name(label: str) -> str:
     """ "Wet level L" is called wet_level_l in Python."""
-    return re.sub(r"\W+", "_", label.strip()).strip("_").lower()
+    return re.sub(r"\W+", "_", label.replace("#", " sharp").strip()).strip("_").lower()
 
 
 @dataclass(frozen=True)
@@ -96,8 +97,9 @@ class Table:
         self.sidechain_channels: int = native.sidechain_channels()
         self.parameters = native.parameters()
         self.defaults = [shown(native, index) for index in range(len(self.parameters))]
-        self.ranges = [(native.value_to_text(index, 0.0), native.value_to_text(index, 1.0))
-                       for index in range(len(self.parameters))]
+        # Lists whose texts are more than a number: "512 + 2048" and "512 + 4096".
+        self.wordy = {index for index, parameter in enumerate(self.parameters)
+                      if len({read_number(choice.text) for choice in parameter.choices}) < len(parameter.choices)}
         # By label, and both of a left/right pair by the name without a side.
         self.labels: Dict[str, List[int]] = {}
         names: Dict[str, List[int]] = {}
@@ -114,6 +116,10 @@ class Table:
             raise UnknownParameter(f"{self.kind} has no parameter {name!r}; " + self.suggestion(str(name), self.names))
         return indices
 
+    def accepted(self, index: int, native: _native.Effect) -> str:
+        choices = [choice.text.strip() for choice in self.parameters[index].choices]
+        return ", ".join(choices) if choices else " to ".join(ends(native, index))
+
     def is_side(self, name: str) -> bool:
         """Whether `name`, a label or its attribute, is one side of a pair that has a name, too."""
         indices = self.names.get(name, self.attributes.get(name, []))
@@ -126,13 +132,18 @@ class Table:
     def describe(self, label: str, native: _native.Effect) -> Parameter:
         index = self.labels[label][0]
         parameter = self.parameters[index]
-        return Parameter(label, attribute_name(label), parameter.unit.strip(), self.ranges[index],
+        return Parameter(label, attribute_name(label), parameter.unit.strip(), ends(native, index),
                          tuple(choice.text.strip() for choice in parameter.choices), self.defaults[index],
                          shown(native, index))
 
 
 def shown(native: _native.Effect, index: int) -> str:
     return native.text(index)
+
+
+def ends(native: _native.Effect, index: int) -> Tuple[str, str]:
+    """The texts of the lowest and highest value; a mode beside the parameter may change them."""
+    return native.value_to_text(index, 0.0), native.value_to_text(index, 1.0)
 
 
 def suggestion(name: str, accepted: Iterable[str], told: Iterable[str]) -> str:
@@ -166,18 +177,18 @@ class Effect(Processor):
     _tempo: float
     _automation: Dict[int, List[Tuple[float, float]]]
 
-    def __init__(self, preset: Optional[str] = None, **parameters: Value) -> None:
+    def __init__(self, preset: Optional[str] = None, *, tempo: float = 120.0, **parameters: Value) -> None:
         if not hasattr(type(self), "_table"):
             raise TypeError("Effect is what all effects have in common; make one of these: "
                             + ", ".join(c.__name__ for c in Effect.__subclasses__()))
         self._native = _native.Effect(self._table.kind)
         self._preset = self._table.default_preset
-        self._tempo = 120.0
         self._automation = {}
-        self._changed()
+        self.tempo = tempo
         if preset is not None:
             self.preset = preset
         table = self._table
+        parameters = {name: value for name, value in parameters.items() if value is not None}
         for name in parameters:
             if name not in table.attributes:
                 raise TypeError(f"{type(self).__name__} has no parameter {name!r}; "
@@ -192,6 +203,9 @@ class Effect(Processor):
     def __getitem__(self, name: str) -> Any:
         return self._get(self._table.find(name))
 
+    __iter__ = None
+    __contains__ = None
+
     def __setitem__(self, name: str, value: Value) -> None:
         self._set(self._table.find(name), value)
 
@@ -200,7 +214,7 @@ class Effect(Processor):
         if self._table.parameters[indices[0]].kind == _SWITCH and text.lower() in ("off", "on"):
             return text.lower() == "on"
         number = read_number(text)
-        return text if number is None else number
+        return text if number is None or indices[0] in self._table.wordy else number
 
     def _set(self, indices: List[int], value: Value) -> None:
         values = [self._normalised(index, value) for index in indices]
@@ -214,25 +228,31 @@ class Effect(Processor):
         elif isinstance(value, str):
             # "-Inf. dB", as some show it, is not the only way to write it.
             text = f"{read_number(value):g}" if np.isinf(read_number(value) or 0.0) else value.strip()
+        elif not is_number(value):
+            raise TypeError(f"a parameter is set by a number, a text, True or False, not by {value!r}")
         elif np.isnan(value):
             raise ValueError("a parameter cannot be NaN")
         elif np.isinf(value):
             text = "inf" if value > 0 else "-inf"
         else:
             text = np.format_float_positional(float(value), trim="-")
-        ends = self._table.ranges[index]
-        number, lowest, highest = map(read_number, (text, *ends))
+        number, lowest, highest = map(read_number, (text, *ends(self._native, index)))
         try:
             normalised = self._native.text_to_value(index, text)
-            # What the library limits would be another value than the one asked for.
-            fits = (number is None or lowest is None or highest is None or normalised not in (0.0, 1.0)
-                    or lowest - _slack(lowest) <= number <= highest + _slack(highest))
+            # What the library limits would be another value than the one asked for, as a number among words is.
+            if number is None or self._table.parameters[index].choices:
+                fits = True
+            elif lowest is None or highest is None:
+                fits = lowest is not highest
+            else:
+                fits = (normalised not in (0.0, 1.0)
+                        or lowest - _slack(lowest) <= number <= highest + _slack(highest))
         except ValueError:
             fits = False
         if not fits:
-            parameter = self._table.parameters[index]
-            choices = ", ".join(choice.text.strip() for choice in parameter.choices)
-            raise ValueError(f"{parameter.label} cannot be {value!r}; accepted: " + (choices or " to ".join(ends)))
+            label = self._table.parameters[index].label
+            raise ValueError(f"{label} cannot be {value!r}; accepted: "
+                             + self._table.accepted(index, self._native))
         return normalised
 
     def __setattr__(self, name: str, value: Any) -> None:
@@ -295,9 +315,10 @@ class Effect(Processor):
 
     @tempo.setter
     def tempo(self, bpm: float) -> None:
-        if not 1.0 <= bpm <= 1000.0:
+        if not is_number(bpm) or not 1.0 <= bpm <= 1000.0:
             raise ValueError(f"the tempo can be 1 to 1000 bpm, not {bpm!r}")
         self._tempo = float(bpm)
+        self._native.set_tempo(self._tempo)
         self._changed()
 
     def automate(self, name: str, points: Iterable[Tuple[float, Value]], *, ramp: Optional[float] = None) -> None:
@@ -318,27 +339,31 @@ class Effect(Processor):
 
     def _lane(self, index: int, points: List[Tuple[float, Value]], ramp: Optional[float]) -> List[Tuple[float, float]]:
         lane = []
-        for seconds, value in points:
+        for point in points:
+            try:
+                seconds, value = point
+            except (TypeError, ValueError):
+                raise ValueError(f"a point is (seconds, value), not {point!r}") from None
             normalised = self._normalised(index, value) if isinstance(value, str) else float(value)
             if not 0.0 <= normalised <= 1.0:
                 raise ValueError("a point's value is a number from 0, the lowest, to 1, the highest, or a text such as "
                                  f"{self._table.defaults[index]!r}; not {value!r}")
-            if not 0.0 <= seconds < 1e9:
+            if not is_number(seconds) or not 0.0 <= seconds < 1e9:
                 raise ValueError(f"a point's time is in seconds from 0 on, not {seconds!r}")
             lane.append((float(seconds), normalised))
         lane.sort(key=lambda point: point[0])
         if ramp is None or len(lane) < 2:
             return lane
-        if not ramp > 0.0:
-            raise ValueError(f"ramp is in seconds above 0, not {ramp!r}")
         times, values = zip(*lane)
+        if not ramp > 0.0 or (times[-1] - times[0]) / ramp > _MOST_STEPS:
+            raise ValueError(f"ramp is in seconds above 0, for up to {_MOST_STEPS} steps, not {ramp!r}")
         steps = np.append(np.arange(times[0], times[-1], ramp), times[-1])
         return list(zip(steps.tolist(), np.interp(steps, times, values).tolist()))
 
     # Processing.
 
     def _add_to(self, line: Stream, key_channels: int) -> None:
-        line.add_effect(self._table.kind, self.state, sorted(self._automation.items()), self._tempo, key_channels)
+        line._add_effect(self._table.kind, self.state, sorted(self._automation.items()), self._tempo, key_channels)
 
     def _key_channels(self, sidechain: Audio, axis: int) -> int:
         most = self._table.sidechain_channels
@@ -351,18 +376,27 @@ class Effect(Processor):
 
     # Copies and texts.
 
-    def __reduce__(self) -> Tuple[Any, ...]:
-        return _restore, (self._table.kind, self._preset, self.state, self._tempo, self._automation)
+    def __getstate__(self) -> Dict[str, Any]:
+        return {**super().__getstate__(), "_native": self.state}
+
+    def __setstate__(self, kept: Dict[str, Any]) -> None:
+        native = _native.Effect(self._table.kind)
+        native.set_state(kept["_native"])
+        native.set_tempo(kept["_tempo"])
+        super().__setstate__({**kept, "_native": native})
 
     def __repr__(self) -> str:
-        """Shows the preset, and what differs from it."""
+        """Shows the preset, and what differs from it; automation is not shown."""
         return f"{type(self).__name__}({', '.join(self._differences())})"
 
     def _differences(self) -> Iterator[str]:
         plain = _native.Effect(self._table.kind)
+        plain.set_tempo(self._tempo)
         if self._preset is not None:
             plain.set_preset(self.presets.index(self._preset))
             yield f"preset={self._preset!r}"
+        if self._tempo != 120.0:
+            yield f"tempo={self._tempo!r}"
         now = [shown(self._native, index) for index in range(len(self._table.parameters))]
         left = {index for index, text in enumerate(now) if text != shown(plain, index)}
         # Names stand before labels: both sides at once where they say the same.
@@ -370,15 +404,3 @@ class Effect(Processor):
             if left.intersection(indices) and len({now[index] for index in indices}) == 1:
                 left.difference_update(indices)
                 yield f"{name}={now[indices[0]]!r}"
-
-
-def _restore(kind: str, preset: Optional[str], state: bytes, tempo: float,
-             automation: Dict[int, List[Tuple[float, float]]]) -> Effect:
-    from .effects import by_kind
-
-    effect = by_kind(kind)()
-    effect._native.set_state(state)
-    effect._preset = preset
-    effect._tempo = tempo
-    effect._automation = dict(automation)
-    return effect

@@ -8,19 +8,21 @@ from . import _native
 from .effect import Effect, Table
 
 
-def _document(name, table):
+def _told(table, index, native):
+    return f"{table.accepted(index, native)}; {table.defaults[index]} at first"
+
+
+def _document(name, table, native):
     """The class's help: every parameter, and the presets."""
-    lines = [f"{name}(preset=None, **parameters)", "",
+    lines = [f"{name}(preset=None, *, tempo=120.0, **parameters)", "",
              f"{table.kind}, with these parameters; Effect tells how it is used.", ""]
     for attribute, indices in table.attributes.items():
         if table.is_side(attribute):
             continue
         label = next(n for n, i in table.names.items() if i is indices)
-        choices = [choice.text.strip() for choice in table.parameters[indices[0]].choices]
-        accepted = ", ".join(choices) if choices else " to ".join(table.ranges[indices[0]])
         sides = [a for a, i in table.attributes.items() if table.is_side(a) and set(i) < set(indices)]
         alone = f" ({', '.join(sides)}: one side)" if sides else ""
-        lines += [f'{attribute}, "{label}"{alone}', f"    {accepted}; {table.defaults[indices[0]]} at first"]
+        lines += [f'{attribute}, "{label}"{alone}', f"    {_told(table, indices[0], native)}"]
     if table.presets:
         quoted = ", ".join(f'"{preset}"' for preset in table.presets)
         lines += ["", f"Presets, {table.default_preset!r} at first:"]
@@ -35,26 +37,21 @@ def _property(indices, doc):
 
 
 def _class(kind):
-    table = Table(kind)
+    table, native = Table(kind), _native.Effect(kind)
     name = re.sub(r"\W+", "", kind)
     # What every effect has keeps its name; a parameter called the same gets an underscore.
     table.attributes = {attribute + "_" * hasattr(Effect, attribute): indices
                         for attribute, indices in table.attributes.items()}
-    members = {"_table": table, "__doc__": _document(name, table), "__module__": __package__}
+    members = {"_table": table, "__doc__": _document(name, table, native), "__module__": __package__}
     for attribute, indices in table.attributes.items():
-        accepted = " to ".join(table.ranges[indices[0]])
-        members[attribute] = _property(indices, f"{accepted}; {table.defaults[indices[0]]} at first")
+        members[attribute] = _property(indices, _told(table, indices[0], native))
     keywords = [inspect.Parameter(a, inspect.Parameter.KEYWORD_ONLY, default=None) for a in table.attributes]
     preset = inspect.Parameter("preset", inspect.Parameter.POSITIONAL_OR_KEYWORD, default=None)
-    members["__signature__"] = inspect.Signature([preset, *keywords])
+    tempo = inspect.Parameter("tempo", inspect.Parameter.KEYWORD_ONLY, default=120.0)
+    members["__signature__"] = inspect.Signature([preset, tempo, *keywords])
     return type(name, (Effect,), members)
 
 
-def by_kind(kind):
-    """The class of the effect that the library calls `kind`."""
-    return _classes[kind]
-
-
-_classes = {kind: _class(kind) for kind in _native.kinds()}
-__all__ = [c.__name__ for c in _classes.values()]
-globals().update((c.__name__, c) for c in _classes.values())
+_classes = [_class(kind) for kind in _native.kinds()]
+__all__ = [c.__name__ for c in _classes]
+globals().update((c.__name__, c) for c in _classes)

@@ -9,7 +9,7 @@ from typing import Any, Iterable, List, Mapping, Optional, Tuple, Union
 import numpy as np
 
 from . import _native
-from .processor import Audio, Processor, Stream, whole_rate
+from .processor import Audio, Processor, Stream, is_number, whole_rate
 
 # By the numbers that the library has for them.
 TYPES = ("highpass", "highshelf-butterworth", "peak", "lowshelf-butterworth", "lowpass", "highshelf", "lowshelf")
@@ -34,6 +34,8 @@ class Band:
         for name, number, step, lowest, highest in (("frequency", self.frequency, 1, 1, 10**6),
                                                     ("gain", self.gain, 0.1, -100, 100),
                                                     ("q", self.q if self.q is not None else 1, 1, 1, 10**5)):
+            if not is_number(number):
+                raise TypeError(f"a band's {name} is a number, not {number!r}")
             steps = number / step
             if not lowest <= number <= highest or abs(steps - round(steps)) > 1e-6:
                 raise ValueError(f"{name} cannot be {number}; accepted: {lowest} to {highest} in steps of {step}")
@@ -67,6 +69,8 @@ class Equalizer(Processor):
     around. It has no latency."""
 
     def __init__(self, bands: Iterable[Union[Band, str, Mapping[str, Any]]], *, invert: bool = False) -> None:
+        if isinstance(bands, (str, Band, Mapping)):
+            raise TypeError(f"an equaliser takes a list of bands: [{bands!r}]")
         self._bands: Tuple[Band, ...] = tuple(_band(band) for band in bands)
         self._invert = bool(invert)
         if len(self._bands) > 20:
@@ -85,7 +89,7 @@ class Equalizer(Processor):
         return [band._record() for band in self._bands]
 
     def _add_to(self, line: Stream, key_channels: int) -> None:
-        line.add_equalizer(self._records(), self._invert)
+        line._add_equalizer(self._records(), self._invert)
 
     def response(self, frequencies: Any, rate: float = 48000) -> Audio:
         """The complex response at frequencies in Hz: an array of their shape. Its level in dB is
@@ -109,15 +113,12 @@ class Equalizer(Processor):
     def __repr__(self) -> str:
         return f"Equalizer({[str(band) for band in self._bands]}{', invert=True' if self._invert else ''})"
 
-    def __reduce__(self) -> Tuple[Any, ...]:
-        return _restore, (self._bands, self._invert)
-
 
 def _band(band: Union[Band, str, Mapping[str, Any]]) -> Band:
     if isinstance(band, str):
         return Band.parse(band)
-    return band if isinstance(band, Band) else Band(**band)
-
-
-def _restore(bands: Tuple[Band, ...], invert: bool) -> Equalizer:
-    return Equalizer(bands, invert=invert)
+    if isinstance(band, Mapping):
+        return Band(**band)
+    if not isinstance(band, Band):
+        raise TypeError(f"a band is a text, a Band or a mapping, not {band!r}")
+    return band

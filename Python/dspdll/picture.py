@@ -2,6 +2,7 @@
 
 from __future__ import annotations
 
+import operator
 import struct
 import zlib
 from typing import Any
@@ -38,7 +39,7 @@ class Drawn:
         """The library's own picture as the bytes of a PNG file; sides in pixels."""
         if not DRAWS:
             raise RuntimeError("this build of the library does not draw")
-        return png(self._pixels(width, height, dpi))
+        return png(self._pixels(operator.index(width), operator.index(height), float(dpi)))
 
     def save(self, path: Any, width: int = 1280, height: int = 720, dpi: float = 96.0) -> None:
         """Writes the picture into a PNG file."""

@@ -4,7 +4,7 @@ from __future__ import annotations
 
 import itertools
 import operator
-from typing import TYPE_CHECKING, Any, Iterable, Iterator, List, Optional, Tuple, Union
+from typing import TYPE_CHECKING, Any, Dict, Iterable, Iterator, List, Optional, Tuple, Union
 
 import numpy as np
 
@@ -26,24 +26,37 @@ QUIET_LEVEL = 1e-6
 LONGEST_SECONDS = 60.0
 _BLOCK = 8192
 
+_HIGHEST_RATE = 2**31 - 1
+_MOST_SECONDS = 1e6
+
 _revisions = itertools.count()
+
+
+def is_number(value: Any) -> bool:
+    return isinstance(value, (int, float, np.integer, np.floating))
 
 
 def whole_rate(rate: float) -> int:
     """A sample rate as an integer; ValueError where it is none."""
-    if not (rate > 0 and rate == int(rate)):
+    if not (is_number(rate) and 0 < rate <= _HIGHEST_RATE and rate == int(rate)):
         raise ValueError(f"the sample rate is a whole number of Hz above 0, not {rate!r}")
     return int(rate)
 
 
 def tail_seconds(tail: Tail) -> Optional[float]:
     """None for an automatic tail."""
-    if isinstance(tail, str):
-        if tail == "auto":
-            return None
-    elif 0.0 <= tail < float("inf"):
+    if tail == "auto":
+        return None
+    if is_number(tail) and 0.0 <= float(tail) <= _MOST_SECONDS:
         return float(tail)
-    raise ValueError(f'tail is "auto" or seconds from 0 on, not {tail!r}')
+    raise ValueError(f'tail is "auto" or seconds from 0 to {_MOST_SECONDS:.0f}, not {tail!r}')
+
+
+def whole_axis(axis: int, dimensions: int) -> int:
+    """An axis from 0 on; ValueError where the array has none such."""
+    if not -dimensions <= axis < dimensions:
+        raise ValueError(f"axis {axis} is none of an array of {dimensions} dimensions")
+    return operator.index(axis) % dimensions
 
 
 class Stream(_native.Line):
@@ -53,6 +66,9 @@ class Stream(_native.Line):
     shape and type, later by `latency` frames. All blocks have the type of the first one, float32 or float64.
     Later changes to the effects it was made of do not reach it.
     """
+
+    def __repr__(self) -> str:
+        return f"<Stream of {self.channels} channels at {self.rate} Hz, {self.position} frames processed>"
 
     def flush(self, tail: Tail = 0.0) -> Audio:
         """What is still inside when the signal has ended: `latency` frames, and the tail; always of two
@@ -123,11 +139,19 @@ def _cut(x: Audio, axis: int, start: int, end: Optional[int] = None) -> Audio:
 class Processor:
     """An effect, an equaliser or a chain of them."""
 
-    _revision: int
-    _spare: Optional[Tuple[Any, Stream]]
+    _revision = -1
 
     def _changed(self) -> None:
         object.__setattr__(self, "_revision", next(_revisions))
+
+    def __getstate__(self) -> Dict[str, Any]:
+        kept = dict(self.__dict__)  # at once: another thread may be processing
+        kept.pop("_spare", None)
+        return kept
+
+    def __setstate__(self, kept: Dict[str, Any]) -> None:
+        self.__dict__.update(kept)
+        self._changed()
 
     def _stations(self) -> List["Processor"]:
         """What it consists of, in order."""
@@ -149,7 +173,7 @@ class Processor:
         """A stream with this processor's settings, for blocks that follow each other.
 
         rate in Hz, channels 1 or 2, axis that of the frames in two-dimensional blocks."""
-        return self._line(whole_rate(rate), operator.index(channels), operator.index(axis) % 2)
+        return self._line(whole_rate(rate), operator.index(channels), whole_axis(axis, 2))
 
     def __call__(self, x: Audio, rate: float, *, tail: Tail = 0.0, axis: int = 0,
                  sidechain: Optional[Audio] = None) -> Audio:
@@ -166,9 +190,7 @@ class Processor:
         another type and ValueError for shapes and numbers that cannot be."""
         x = np.asarray(x)
         rate = whole_rate(rate)
-        if not -x.ndim <= axis < max(x.ndim, 1):
-            raise ValueError(f"axis {axis} is none of an array of the shape {x.shape}")
-        axis %= max(x.ndim, 1)
+        axis = whole_axis(axis, max(x.ndim, 1))
         channels = x.shape[1 - axis] if x.ndim == 2 else 1
         if x.ndim not in (1, 2) or not 1 <= channels <= 2:
             hint = "; for (channels, frames) say axis=1" if x.ndim == 2 and x.shape[0] <= 2 and axis == 0 else ""
@@ -190,11 +212,11 @@ class Processor:
         latency = line.latency
         if seconds is None:
             # With the latency behind it; what follows then is the tail alone.
-            body = line.process(x, latency, latency, sidechain)
+            body = line._process(x, latency, latency, sidechain)
             flat = x.ndim == 1
             pieces = [p.reshape(-1) if flat else p for p in line._dies_away(rate, x.dtype)]
             result: Audio = np.concatenate([body, *pieces], axis=axis) if pieces else body
         else:
-            result = line.process(x, latency + round(rate * seconds), latency, sidechain)
+            result = line._process(x, latency + round(rate * seconds), latency, sidechain)
         self.__dict__["_spare"] = (settings, line, x.dtype)
         return result

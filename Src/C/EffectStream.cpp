@@ -28,21 +28,20 @@ EffectStream::EffectStream(const DSP::EffectKind& effectKind)
 
 void EffectStream::Prepare(const tWAVEFORMATEX& format, int maxFrames) {
     const std::size_t samples = static_cast<std::size_t>(maxFrames) * format.nChannels;
+    m_maxFrames = 0;
     m_scratch.assign(effect->SupportsNoninterleaved() ? 0 : samples, 0.0);
     m_format = format;
     m_maxFrames = maxFrames;
-    try {
-        Restart();
-    } catch (const std::bad_alloc&) {
-        m_maxFrames = 0;
-        throw;
-    }
+    Restart();
 }
 
 void EffectStream::Restart() {
     effect->Cleanup();
     effect->InitProcessing(m_maxFrames, &m_format);
-    if (!effect->IsPrepared()) throw std::bad_alloc();
+    if (!effect->IsPrepared()) {
+        m_maxFrames = 0;
+        throw std::bad_alloc();
+    }
     std::ranges::fill(m_sidechain, Pointers{});
     m_tailFrames = 0;
     Seek(0);

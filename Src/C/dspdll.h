@@ -105,7 +105,8 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_kind_name(int32_t kind, char* buffer, s
 DSP_C_API dsp_status DSP_CALL dsp_effect_create(const char* name, dsp_effect** effect, dsp_error* error);
 DSP_C_API dsp_status DSP_CALL dsp_effect_name(dsp_effect* effect, char* buffer, size_t size, size_t* needed);
 
-/* Makes all memory and starts the stream at position 0. After a failure the effect is not prepared. */
+/* Makes all memory and starts the stream at position 0. A format that cannot be changes nothing; after
+ * DSP_NO_MEMORY the effect is not prepared. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_prepare(dsp_effect* effect, const dsp_format* format,
                                                  dsp_error* error);
 /* Forgets the sound and starts the stream anew, prepared as before. */

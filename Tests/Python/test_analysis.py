@@ -62,6 +62,8 @@ def test_spectrum_is_the_mean_of_windowed_transforms(window):
               for i in range(0, len(mono) - length + 1, length // 2)]
     expected = 10 * np.log10(np.mean(powers, axis=0)), 10 * np.log10(np.max(powers, axis=0))
     assert np.abs(found.levels - expected[0])[2:].max() < 0.1 and np.abs(found.peaks - expected[1])[2:].max() < 0.1
+    turned = dsp.sonogram(x.T, RATE, length=length, window=found.window, axis=-1)
+    assert turned.png() == dsp.sonogram(x, RATE, length=length, window=found.window).png() and turned != found
     every = dsp.sonogram(x, RATE, length=length, window=found.window, overlap=0.5)
     assert every.levels.shape == (512, len(powers)) and every.times[1] == pytest.approx(1024 / RATE)
     assert np.abs(every.levels - 10 * np.log10(powers).T)[2:].max() < 0.5

@@ -3,6 +3,7 @@
 import copy
 import ctypes
 import pickle
+import signal
 import threading
 
 import dspdll as dsp
@@ -64,7 +65,7 @@ def test_layouts_and_copies(effect):
     left = fx(x[:, 0], RATE)
     assert left.shape == (3000,) and np.array_equal(fx(x[:, :1], RATE)[:, 0], left)
     for twin in (copy.copy(fx), copy.deepcopy(fx), pickle.loads(pickle.dumps(fx)), eval(repr(fx), vars(dsp))):
-        assert twin is not fx and repr(twin) == repr(fx) and np.array_equal(twin(x, RATE), y)
+        assert twin is not fx and type(twin) is effect and repr(twin) == repr(fx) and np.array_equal(twin(x, RATE), y)
     assert fx(x[:0], RATE).shape == (0, 2)
 
 
@@ -142,6 +143,16 @@ def test_parameters():
     (lambda fx: fx(noise(9).T, RATE), ValueError, r"axis=1"),
     (lambda fx: fx(noise(9), 44100.5), ValueError, "whole number of Hz"),
     (lambda fx: fx((noise(9) * 9).astype(np.int16), RATE), TypeError, "int16.*float32 or float64"),
+    (lambda fx: fx(noise(9), RATE, sidechain=np.zeros(9, np.int16)), TypeError, "int16.*float32 or float64"),
+    (lambda fx: fx(noise(9), float("inf")), ValueError, "whole number of Hz"),
+    (lambda fx: fx(noise(9), RATE, tail=1e300), ValueError, "tail is"),
+    (lambda fx: fx.stream(RATE, 2)._process(noise(9), -5, 0, None), ValueError, "below 0"),
+    (lambda fx: fx.stream(RATE, 1)("loud"), TypeError, "<U4"),
+    (lambda fx: setattr(fx, "threshold", None), TypeError, "not by None"),
+    (lambda fx: "Threshold" in fx, TypeError, "not .*iterable|not a container"),
+    (lambda fx: dsp.Chain(fx), TypeError, r"list of effects: \[Compressor"),
+    (lambda fx: dsp.Equalizer("80 highpass"), TypeError, "list of bands"),
+    (lambda fx: fx.automate("Threshold", (0, 1)), ValueError, "a point is"),
     (lambda fx: fx.stream(RATE, 1)(noise(9)), ValueError, "1 channels, the block 2"),
     (lambda fx: fx.stream(RATE, 3), ValueError, "1 or 2"),
     (lambda fx: fx(noise(9), RATE, sidechain=noise(8)), ValueError, "8 frames, the signal 9"),
@@ -206,8 +217,11 @@ def test_sidechain_and_tempo():
     click[0] = 0.5
     places = []
     for bpm in (60, 120):
-        echo = dsp.Echo("Single delay", depth_mode="Tempo (straight)")
-        echo.tempo = bpm
+        echo = dsp.Echo("Single delay", depth_mode="Tempo (straight)", tempo=bpm)
+        assert f"({240000 // bpm} ms)" in echo.parameters["Depth L"].range[1]
+        assert eval(repr(echo), vars(dsp)).tempo == bpm
+        with pytest.raises(ValueError, match=r"accepted: 1/256 .* to Measure"):
+            echo.depth = 500
         places.append(np.flatnonzero(np.abs(echo(click, RATE)[100:, 0]) > 1e-3)[0] + 100)
     assert places[0] == pytest.approx(2 * places[1], abs=2)
 
@@ -223,6 +237,47 @@ def test_threads():
     while any(thread.is_alive() for thread in threads):
         counted += 1
     assert counted > 1000 and len(results) == 3 and all(np.array_equal(result, expected) for result in results)
+
+
+class Quieter(dsp.Gain):
+    """An effect of a user's own."""
+
+
+def test_copies_keep_class_and_automation():
+    fx = dsp.Chain([Quieter(gain=-20), dsp.Tremolo(), dsp.Equalizer(["80 highpass"], invert=True)])
+    fx[1].automate("Mix", [(0, 0), (0.01, 1)])
+    fx[1].tempo = 90
+    expected = fx(noise(3000), RATE)
+    for twin in (copy.deepcopy(fx), pickle.loads(pickle.dumps(fx))):
+        assert type(twin[0]) is Quieter and np.array_equal(twin(noise(3000), RATE), expected)
+        twin[1].tempo = fx[1].tempo + 1
+        assert fx[1].tempo == 90
+
+
+def test_an_interrupt_ends_a_long_call():
+    stream = dsp.Cantrix().stream(RATE, 1)
+    def stop(*_):
+        raise KeyboardInterrupt
+    before = signal.signal(signal.SIGALRM, stop)
+    signal.setitimer(signal.ITIMER_REAL, 0.1)
+    try:
+        with pytest.raises(KeyboardInterrupt):
+            stream(np.zeros(1000 * RATE, np.float32))
+    finally:
+        signal.signal(signal.SIGALRM, before)
+    assert 0 < stream.position < 900 * RATE
+
+
+def test_every_text_that_is_shown_can_be_set():
+    for effect in EFFECTS:
+        fx = effect()
+        assert len(effect._table.attributes) == len(effect._table.names)
+        for index, label in enumerate(effect._table.labels):
+            fx._native.set(index, 0.35)
+            text = fx.parameters[label].text
+            fx[label] = text
+            assert fx.parameters[label].text.split(" - ")[0] == text.split(" - ")[0]
+    assert dsp.Denoiser(fft_size="512 + 4096").fft_size == "512 + 4096" and dsp.Valvex().oversampling == 1.0
 
 
 def test_help_and_tables_tell_everything():

@@ -33,7 +33,7 @@ def test_render_is_the_whole_array_in_blocks(tmp_path):
 
 def test_what_fails_leaves_the_target_as_it_was(tmp_path):
     source, target = tmp_path / "in.wav", tmp_path / "out.wav"
-    soundfile.write(source, noise(70000), RATE)
+    soundfile.write(source, noise(70000), 44099)
     target.write_bytes(b"before")
 
     class Breaks(dsp.Gain):
@@ -42,19 +42,43 @@ def test_what_fails_leaves_the_target_as_it_was(tmp_path):
             stream(np.zeros((1, channels), np.float32))  # so that doubles are refused later
             return stream
 
-    three = tmp_path / "three.wav"
+    three, empty = tmp_path / "three.wav", tmp_path / "empty.wav"
     soundfile.write(three, np.zeros((10, 3)), RATE)
+    soundfile.write(empty, np.zeros((0, 1)), RATE)
+    damaged = tmp_path / "damaged.flac"
+    soundfile.write(damaged, noise(70000), RATE)
+    damaged.write_bytes(damaged.read_bytes()[:50000])
     for wrong, fx, error in ((source, Breaks(), TypeError), (three, dsp.Gain(), ValueError),
-                             (tmp_path / "no.wav", dsp.Gain(), soundfile.LibsndfileError)):
+                             (tmp_path / "no.wav", dsp.Gain(), FileNotFoundError),
+                             (empty, dsp.Gain(), ValueError), (damaged, dsp.Gain(), OSError)):
         with pytest.raises(error):
             dsp.render(wrong, target, fx)
         assert target.read_bytes() == b"before"
     with pytest.raises(ValueError, match="ending"):
         dsp.render(source, tmp_path / "out.xyz", dsp.Gain())
+    with pytest.raises(FileNotFoundError, match="no folder"):
+        dsp.render(source, tmp_path / "no" / "out.wav", dsp.Gain())
+    with pytest.raises(OSError, match="out.mp3: cannot be written: .*sample rates"):
+        dsp.render(source, tmp_path / "out.mp3", dsp.Gain())
     with pytest.warns(UserWarning, match="samples were above full scale"):
         dsp.render(source, source, dsp.Gain(gain="20 dB"))  # onto itself
-    assert sorted(path.name for path in tmp_path.iterdir()) == ["in.wav", "out.wav", "three.wav"]
+    assert sorted(path.name for path in tmp_path.iterdir()) == ["damaged.flac", "empty.wav", "in.wav", "out.wav", "three.wav"]
     assert len(soundfile.read(source)[0]) == 70000
+
+
+def test_what_stands_around_the_samples(tmp_path):
+    source, target = tmp_path / "in.wav", tmp_path / "link.wav"
+    with soundfile.SoundFile(source, "w", RATE, 1) as file:
+        file.title = "Theme"
+        file.write(noise(9000)[:, 0])
+    (tmp_path / "real.wav").touch(0o600)
+    target.symlink_to("real.wav")
+    dsp.render(source, target, dsp.Gain())
+    assert target.is_symlink() and (tmp_path / "real.wav").stat().st_mode & 0o777 == 0o600
+    assert soundfile.SoundFile(tmp_path / "real.wav").title == "Theme"
+    source.write_bytes(source.read_bytes()[:10000])
+    with pytest.warns(UserWarning, match="in.wav: was cut off, after 4"):
+        dsp.render(source, target, dsp.Gain())
 
 
 def test_the_readme_example_runs(tmp_path):

@@ -49,14 +49,26 @@ bool SameChoice(std::string_view shown, std::string_view text, std::string_view 
     return SameNoCase(bare(shown), bare(text));
 }
 
+// What stands behind the unit, without its digits: " - .%" of "semitones - 17.4%".
+std::string BehindUnit(std::string_view text, std::string_view unit) {
+    std::string behind(text.substr(unit.size()));
+    std::erase_if(behind, [](char letter) { return letter >= '0' && letter <= '9'; });
+    return behind;
+}
+
 // Parsers stop where they understand no more: words, and what follows a number, count when the effect shows
-// them too. "-inf" for "-Inf. dB", "500 ms" for "499 ms", "1/4" for "1/4 (500 ms)".
+// them too. "-inf" for "-Inf. dB", "500 ms" for "499 ms", "1/4" for "1/4 (500 ms)". A second number behind
+// the unit is the first one said in another way, rounded.
 bool SaysTheSame(std::string_view shown, std::string_view text, std::string_view unit) {
     const std::size_t length = NumberLength(text);
-    const std::string_view rest = Piece(text, length);
+    const std::string_view rest = Piece(text, length), shownRest = Piece(shown, NumberLength(shown));
+    const auto hasUnit = [unit](std::string_view part) {
+        return !unit.empty() && StartsWithNoCase(part, unit);
+    };
     return StartsWithNoCase(shown, text) ||
            (length > 0 &&
-            (rest.empty() || SameNoCase(rest, unit) || SameNoCase(rest, Piece(shown, NumberLength(shown)))));
+            (rest.empty() || SameNoCase(rest, unit) || SameNoCase(rest, shownRest) ||
+             (hasUnit(rest) && hasUnit(shownRest) && BehindUnit(rest, unit) == BehindUnit(shownRest, unit))));
 }
 
 bool BeyondRange(double number, float normalised, std::string_view shown) {
