@@ -19,7 +19,6 @@ using namespace TestSupport;
 namespace {
 
 using enum Corvo::EffectParameterType;
-using Bytes = std::vector<std::uint8_t>;
 
 // A word of the settings, an integer or a float.
 struct Word {
@@ -254,15 +253,7 @@ const Contract kContracts[] = {
 };
 // clang-format on
 
-std::uint32_t WordAt(const Bytes& chunk, std::size_t at) {
-    std::uint32_t word = 0;
-    for (std::size_t i = 4; i-- > 0;) word = word << 8 | chunk.at(at + i);
-    return word;
-}
-
-double DoubleAt(const Bytes& chunk, std::size_t at) {
-    return std::bit_cast<double>(std::uint64_t{WordAt(chunk, at + 4)} << 32 | WordAt(chunk, at));
-}
+std::uint32_t WordAt(const Bytes& chunk, std::size_t at) { return At<std::uint32_t>(chunk, at); }
 
 // Word w is w + 5; the bytes above the lower four do not count.
 Bytes CountingChunk(std::size_t leading, std::size_t words, std::size_t width) {
@@ -324,7 +315,7 @@ TEST_P(EveryEffectContract, StoresAndShowsEveryParameter) {
             const float value = 0.5f * static_cast<float>(i);
             effect->SetParam(external, value, false);
             if (row.step != 0.0)
-                EXPECT_EQ(DoubleAt(Chunk(*effect), row.at[side]),
+                EXPECT_EQ(At<double>(Chunk(*effect), row.at[side]),
                           row.words[i].bits == 0 ? 0.0 : static_cast<double>(row.words[i].plain) * row.step);
             else
                 EXPECT_EQ(WordAt(Chunk(*effect), row.at[side]), row.words[i].bits);

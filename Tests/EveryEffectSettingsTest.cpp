@@ -10,8 +10,6 @@ using namespace TestSupport;
 // What every effect promises about parameters, presets and chunks.
 namespace {
 
-using Bytes = std::vector<std::uint8_t>;
-
 // Loads bytes that may be anything and runs a block, watching the block's edges.
 void ExpectHarmless(CorvoEffectBase& effect, const Bytes& chunk, const std::string& what) {
     const auto format = Format<float>();

@@ -20,21 +20,13 @@ TEST(AudioThreadRules, SeesWhatIsForbidden) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
     std::mutex mutex;
     std::unique_ptr<std::vector<int>> memory;
-    std::string broken;
-    {
-        const AudioThreadRules rules;
+    const auto forbidden = [&] {
         memory = std::make_unique<std::vector<int>>(100);
         const std::lock_guard lock(mutex);
         std::this_thread::sleep_for(std::chrono::nanoseconds(1));
-        broken = rules.Broken();
-    }
-    EXPECT_EQ(broken, "2 allocations, 1 locks, 1 waits");
-    {
-        const AudioThreadRules rules;
-        memory.reset();
-        broken = rules.Broken();
-    }
-    EXPECT_EQ(broken, "2 frees");
+    };
+    EXPECT_EQ(BrokenBy(forbidden), "2 allocations, 1 locks, 1 waits");
+    EXPECT_EQ(BrokenBy([&] { memory.reset(); }), "2 frees");
 }
 
 // Catches work on the audio thread that may stop it: edits, presets, automation and forced cooks included.
@@ -52,13 +44,10 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
     Random random(11);
     const auto process = [&](const std::string& what, bool force) {
         Corvo::DSP::ProcessFlags flags{force, false};
-        std::string broken;
-        {
-            const AudioThreadRules rules;
+        const auto broken = BrokenBy([&] {
             effect->Process(reinterpret_cast<double*>(block.data()), 256, &format, flags);
             if (force) effect->InitResetProcessingLight(true);
-            broken = rules.Broken();
-        }
+        });
         ASSERT_EQ(broken, "") << what;
         block = Noise<float>(2 * 256);
     };
