@@ -59,19 +59,18 @@ struct Row {
 
 using Rows = std::vector<Row>;
 
-// The same row for every label, each eight bytes further on.
-Rows Bands(std::initializer_list<const wchar_t*> labels, Row row) {
+// The same row for every label, each so many bytes further on.
+Rows Bands(std::size_t bytes, std::initializer_list<const wchar_t*> labels, Row row) {
     Rows rows;
     for (const auto* const label : labels) {
         row.label = label;
         rows.push_back(row);
-        row.at[0] += 8;
+        row.at[0] += bytes;
     }
     return rows;
 }
 Rows Joined(Rows rows, const Rows& second, const Rows& third) {
-    rows.insert(rows.end(), second.begin(), second.end());
-    rows.insert(rows.end(), third.begin(), third.end());
+    for (const auto* more : {&second, &third}) rows.insert(rows.end(), more->begin(), more->end());
     return rows;
 }
 
@@ -188,21 +187,11 @@ const Contract kContracts[] = {
      .pads = {"Guitar", "Guitar - Clean", "Guitar - Heavy", "Guitar - Heavier", "Drums", "Vocal"}},
     {.name = "Cantrix", .image = "builtinCantrix.png", .icon = "BuiltinPlugins/Cantrix@3x.png",
      .chunkSize = 136, .leading = Leading::Version1AndCount, .oldWords = 0,
-     .rows = {
+     .rows = Joined({
         {L"Scale root", L"", List, {8},  {0.0, 6.0, 11.0}, {L"C", L"F#", L"B"}, 0.0f},
         {L"Scale mode", L"", List, {12}, {0.0, 6.0, 12.0}, {L"Chromatic", L"Minor pentatonic", L"Whole tone"}, 0.0f},
-        {L"Note C", L"", Switch, {16}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note C#", L"", Switch, {20}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note D", L"", Switch, {24}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note D#", L"", Switch, {28}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note E", L"", Switch, {32}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note F", L"", Switch, {36}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note F#", L"", Switch, {40}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note G", L"", Switch, {44}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note G#", L"", Switch, {48}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note A", L"", Switch, {52}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note A#", L"", Switch, {56}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
-        {L"Note B", L"", Switch, {60}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f},
+        }, Bands(4, {L"Note C", L"Note C#", L"Note D", L"Note D#", L"Note E", L"Note F", L"Note F#", L"Note G", L"Note G#", L"Note A", L"Note A#", L"Note B"},
+              {L"", L"", Switch, {16}, {0.0, 1.0, 1.0}, {L"Off", L"On", L"On"}, 1.0f}), {
         {L"Retune speed",         L"ms",        Continuous, {64},  {0.0, 100.0, 400.0},     {L"0.0 ms", L"100.0 ms", L"400.0 ms"}, 0.2236068f},
         {L"Note transition time", L"ms",        Continuous, {68},  {0.0, 125.0, 500.0},     {L"0.0 ms", L"125.0 ms", L"500.0 ms"}, 0.28284273f},
         {L"Correction ratio",     L"%",         Continuous, {72},  {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}, 1.0f},
@@ -220,7 +209,7 @@ const Contract kContracts[] = {
         {L"Follow tuner",         L"",          Switch,     {120}, {0.0, 1.0, 1.0},         {L"Off", L"On", L"On"}, 0.0f},
         {L"Concert pitch",        L"Hz",        Continuous, {124}, {400.0, 440.0, 480.0},   {L"400.0 Hz", L"440.0 Hz", L"480.0 Hz"}},
         {L"Temperament",          L"",          List,       {128}, {0.0, 5.0, 10.0},        {L"Equal", L"Just (Fogliano I)", L"Vallotti"}, 0.0f},
-        {L"Mix",                  L"%",         Continuous, {132}, {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}, 1.0f}},
+        {L"Mix",                  L"%",         Continuous, {132}, {0.0, 50.0, 100.0},      {L"0.0 %", L"50.0 %", L"100.0 %"}, 1.0f}}),
      .presets = {10, 0x6F1FBE11B4299CAB},
      .sections = {"Scale", "Correction", "Voice", "Tuning", "Output"}, .pads = {"Default"}},
     {.name = "Pitch Shift", .image = "builtinPitch.png", .icon = "BuiltinPlugins/PitchShift@3x.png",
@@ -244,24 +233,20 @@ const Contract kContracts[] = {
         {L"Material", L"", List, {84}, {0, 0, 1}, {L"Speech", L"Speech", L"Music"}, 0.5f, 1},
         {L"Listen", L"", List, {92}, {0, 0, 1}, {L"Output", L"Output", L"Residue"}, 0.5f, 1},
         {L"Mix", L"%", Continuous, {100}, {0, 500, 1000}, {L"0.0 %", L"50.0 %", L"100.0 %"}, 0.5f, 0.1}},
-        Bands({L"Gain 63 Hz", L"Gain 125 Hz", L"Gain 250 Hz", L"Gain 500 Hz", L"Gain 1 kHz", L"Gain 2 kHz", L"Gain 4 kHz", L"Gain 8 kHz"},
+        Bands(8, {L"Gain 63 Hz", L"Gain 125 Hz", L"Gain 250 Hz", L"Gain 500 Hz", L"Gain 1 kHz", L"Gain 2 kHz", L"Gain 4 kHz", L"Gain 8 kHz"},
               {L"", L"dB", Continuous, {108}, {-120, 0, 120}, {L"-12.0 dB", L"0.0 dB", L"12.0 dB"}, 0.5f, 0.1}),
-        Bands({L"Range 63 Hz", L"Range 125 Hz", L"Range 250 Hz", L"Range 500 Hz", L"Range 1 kHz", L"Range 2 kHz", L"Range 4 kHz", L"Range 8 kHz"},
+        Bands(8, {L"Range 63 Hz", L"Range 125 Hz", L"Range 250 Hz", L"Range 500 Hz", L"Range 1 kHz", L"Range 2 kHz", L"Range 4 kHz", L"Range 8 kHz"},
               {L"", L"dB", Continuous, {172}, {0, 300, 600}, {L"0.0 dB", L"30.0 dB", L"60.0 dB"}, 0.5f, 0.1})),
      .presets = {10, 0x6379DADD34EAE13A},
      .sections = {"Profile", "Reduction", "Engine", "Gains", "Ranges"}},
 };
 // clang-format on
 
-std::uint32_t WordAt(const Bytes& chunk, std::size_t at) { return At<std::uint32_t>(chunk, at); }
-
 // Word w is w + 5; the bytes above the lower four do not count.
 Bytes CountingChunk(std::size_t leading, std::size_t words, std::size_t width) {
     Bytes chunk(leading + words * width, 0xEE);
     for (std::size_t at = 0; at < leading; ++at) chunk[at] = static_cast<std::uint8_t>(9 + at);
-    for (std::size_t i = 0; i < 4 * words; ++i)
-        chunk[leading + i / 4 * width + i % 4] =
-            static_cast<std::uint8_t>((static_cast<std::uint32_t>(i / 4) + 5) >> (8 * (i % 4)));
+    for (std::size_t i = 0; i < words; ++i) Put(chunk, leading + i * width, static_cast<int>(i) + 5);
     return chunk;
 }
 
@@ -318,7 +303,7 @@ TEST_P(EveryEffectContract, StoresAndShowsEveryParameter) {
                 EXPECT_EQ(At<double>(Chunk(*effect), row.at[side]),
                           row.words[i].bits == 0 ? 0.0 : static_cast<double>(row.words[i].plain) * row.step);
             else
-                EXPECT_EQ(WordAt(Chunk(*effect), row.at[side]), row.words[i].bits);
+                EXPECT_EQ(At<std::uint32_t>(Chunk(*effect), row.at[side]), row.words[i].bits);
             EXPECT_EQ(effect->GetParamPlain(real), contract.ownRecord ? 0.0f : row.words[i].plain);
             EXPECT_EQ(effect->GetParameterFormattedText(external, value), row.texts[i]);
         }
@@ -410,11 +395,11 @@ TEST_P(EveryEffectContract, TakesChunksWordByWord) {
     auto today = CountingChunk(leading, words, 4);
     const auto effect = GetParam().make();
     effect->SetSettingsChunk(today);
-    if (contract.leading == Leading::Version1 || counted) std::ranges::copy(Bytes{1, 0, 0, 0}, today.begin());
-    if (counted) std::ranges::copy(Bytes{static_cast<std::uint8_t>(words), 0, 0, 0}, today.begin() + 4);
+    if (contract.leading == Leading::Version1 || counted) Put(today, 0, 1);
+    if (counted) Put(today, 4, static_cast<int>(words));
     EXPECT_EQ(Chunk(*effect), today);
     ForEachParameter([&](const Row& row, std::size_t side, int real, int) {
-        const auto bits = WordAt(today, row.at[side]);
+        const auto bits = At<std::uint32_t>(today, row.at[side]);
         const bool isFloat = row.words[2].bits == std::bit_cast<std::uint32_t>(row.words[2].plain);
         EXPECT_EQ(effect->GetParamPlain(real),
                   isFloat ? std::bit_cast<float>(bits) : static_cast<float>(bits))

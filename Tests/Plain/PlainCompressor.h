@@ -14,7 +14,8 @@ struct Compressor {
     };
     std::array<std::vector<Point>, 2> curve;
     std::array<double, 2> attack{}, release{}, outGain{}, appliedGain{}, envelope{};
-    double smoothing = 0.0;
+    std::array<std::size_t, 2> segment{};
+    double smoothing = 0.0;  // 0 where nothing glides
 
     // Linked, both sides follow the mean of both, with the left one's times.
     template <typename Sample>
@@ -38,12 +39,14 @@ private:
     }
     double Gain(std::size_t side, double e) {
         auto& points = curve[side];
-        for (auto& p : points) {
-            p.x += (p.targetX - p.x) * smoothing;
-            p.y += (p.targetY - p.y) * smoothing;
-        }
-        std::size_t s = 0;
+        auto& s = segment[side];
+        if (smoothing > 0.0)
+            for (auto& p : points) {
+                p.x += (p.targetX - p.x) * smoothing;
+                p.y += (p.targetY - p.y) * smoothing;
+            }
         while (s + 2 < points.size() && e > points[s + 1].x) ++s;
+        while (s >= 1 && points[s].x > e) --s;
         const double width = points[s + 1].x - points[s].x;
         const double slope = width > 0.0 ? (points[s + 1].y - points[s].y) / width : 1.0;
         return e == 0.0 ? 1.0 : ((e - points[s].x) * slope + points[s].y) / e;
