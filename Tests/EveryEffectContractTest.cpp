@@ -37,18 +37,9 @@ std::uint64_t SumOf(const Bytes& bytes) {
     return sum;
 }
 
-// The words that differ among the chunks, as each of them has them. What curves are made of is left out: it
-// comes from the system's mathematics.
-std::array<std::string, 3> WordsThatDiffer(const std::array<Bytes, 3>& chunks) {
-    std::array<std::string, 3> words;
-    for (std::size_t at = 0; at + 4 <= chunks[0].size();
-         at += at == 112 && chunks[0].size() > 16000 ? 15988 : 4) {
-        const auto word = [&](std::size_t i) { return At<std::uint32_t>(chunks[i], at); };
-        if (word(0) == word(1) && word(1) == word(2)) continue;
-        for (std::size_t i = 0; i < 3; ++i)
-            words[i].append(" ").append(std::to_string(at)).append(":").append(Hex(word(i)));
-    }
-    return words;
+bool HasCurves(const Bytes& chunk) { return chunk.size() > 16000; }
+std::string WordOf(const Bytes& chunk, std::size_t at) {
+    return std::to_string(at).append(":").append(Hex(At<std::uint32_t>(chunk, at)));
 }
 
 // Every word another, exact as an integer and as a float; the bytes above the lower four do not count.
@@ -60,7 +51,7 @@ Bytes CountingChunk(std::size_t leading, std::size_t words, std::size_t width) {
 
 class EveryEffectContract : public EveryEffect {
 protected:
-    // What a parameter is, and what it is at 0, 0.5 and 1: text, value and words of the chunk.
+    // What a parameter is, and what it is from 0 to 1: text, value and words of the chunk.
     static void DescribeParameter(std::ostream& out, int external) {
         const auto effect = Make();
         const auto about = effect->Describe(external);
@@ -74,19 +65,23 @@ protected:
         }
         for (const auto& [text, value] : about.choices) out << "; " << text << "=" << Number(value);
         out << "\n";
-        std::array<Bytes, 3> chunks;
-        std::array<std::string, 3> shown;
-        for (std::size_t i = 0; i < 3; ++i) {
+        std::vector<Bytes> chunks;
+        std::vector<std::string> shown;
+        for (const float value : {0.0f, 0.25f, 0.5f, 0.75f, 1.0f}) {
             const auto moved = Make();
-            const float value = 0.5f * static_cast<float>(i);
             moved->SetParam(external, value, false);
-            chunks[i] = Chunk(*moved);
-            shown[i] = std::string("  \"").append(Text(*moved, external, value)).append("\"");
+            chunks.push_back(Chunk(*moved));
+            shown.push_back(std::string("  \"").append(Text(*moved, external, value)).append("\""));
             for (int side = 0; side < moved->GetParamCountReal() / moved->GetParamCount(); ++side)
-                shown[i].append(" ").append(Number(moved->GetParamPlain(about.real + side)));
+                shown.back().append(" ").append(Number(moved->GetParamPlain(about.real + side)));
         }
-        const auto words = WordsThatDiffer(chunks);
-        for (std::size_t i = 0; i < 3; ++i) out << shown[i] << words[i] << "\n";
+        // Curves are left out: they come from the system's mathematics.
+        for (std::size_t at = 0; at < chunks[0].size(); at += at == 112 && HasCurves(chunks[0]) ? 15988 : 4)
+            for (std::size_t i = 0; i < 5; ++i)
+                if (std::ranges::any_of(
+                        chunks, [&](const auto& c) { return WordOf(c, at) != WordOf(chunks[0], at); }))
+                    shown[i].append(" ").append(WordOf(chunks[i], at));
+        for (const auto& line : shown) out << line << "\n";
     }
 
     static std::string Now() {
@@ -109,13 +104,18 @@ protected:
         }
         out << "\n";
         for (int i = 0; i < effect->GetParamCount(); ++i) DescribeParameter(out, i);
+        out << "new";
+        for (const float value : AllParams(*effect)) out << " " << Number(value);
         for (int i = 0; i < effect->NumPresets(); ++i) {
             effect->SetPreset(i);
             const auto chunk = Chunk(*effect);
-            out << "preset " << effect->GetPresetName(i) << " "
-                << (chunk.size() > 16000 ? "of curves" : Hex(SumOf(chunk)))
-                << (effect->GetPresetValues(i) == AllParams(*effect) ? "" : ", values untold") << "\n";
+            out << "\npreset " << effect->GetPresetName(i) << " ";
+            if (!HasCurves(chunk)) out << Hex(SumOf(chunk));
+            for (int j = 0; HasCurves(chunk) && j < effect->GetParamCount(); ++j)
+                out << " " << Number(effect->GetParam(j)) << "=" << Text(*effect, j);
+            if (effect->GetPresetValues(i) != AllParams(*effect)) out << ", values untold";
         }
+        out << "\n";
         if (effect->GetSettingsChunkSize() > 200) return out.str();  // loaded by tests of their own
         // Where each word is kept, and as what.
         const auto own = Chunk(*effect);
@@ -125,8 +125,7 @@ protected:
         const auto kept = Chunk(*effect);
         out << "counting";
         for (std::size_t at = 0; at < own.size(); at += 4)
-            if (const auto word = At<std::uint32_t>(kept, at); word != At<std::uint32_t>(counting, at))
-                out << " " << at << ":" << Hex(word);
+            if (WordOf(kept, at) != WordOf(counting, at)) out << " " << WordOf(kept, at);
         for (int real = 0; real < effect->GetParamCountReal(); ++real)
             out << " " << Number(effect->GetParamPlain(real));
         out << "\n";

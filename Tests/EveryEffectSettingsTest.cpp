@@ -143,17 +143,6 @@ TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
     }
 }
 
-// Catches a new instance that differs from what it should start from.
-TEST_P(EveryEffectSettings, StartsFromItsDefaults) {
-    const auto effect = GetParam().make();
-    if (GetParam().startsBlank) GTEST_SKIP() << "the host loads a preset or a chunk first";
-    const auto fresh = AllParams(*effect);
-    effect->SetPreset(effect->GetDefaultPreset());
-    EXPECT_EQ(AllParams(*effect), fresh);
-    for (int i = 0; effect->NumPresets() == 0 && i < effect->GetParamCount(); ++i)
-        EXPECT_EQ(effect->GetParam(i), effect->Describe(i).neutral) << "parameter " << i;
-}
-
 // Catches automation that an effect says it plays and does not, or the reverse.
 TEST_P(EveryEffectSettings, PlaysAutomationIfItSaysSo) {
     const auto effect = Make();
