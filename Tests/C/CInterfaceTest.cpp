@@ -1,11 +1,9 @@
 #include <algorithm>
-#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <limits>
 #include <string>
-#include <thread>
 #include <tuple>
 #include <type_traits>
 #include <utility>
@@ -19,6 +17,7 @@
 #endif
 #include "DSP/Effects/EffectKinds.h"
 #include "Support/Signals.h"
+#include "Support/TwoThreads.h"
 
 namespace {
 
@@ -245,44 +244,38 @@ TEST(CInterface, IsEditedAndAskedWhileItProcesses) {
         ASSERT_EQ(dsp_effect_create(kind.name, &effect, nullptr), DSP_OK);
         ASSERT_EQ(dsp_analyser_create(8000, &analyser, nullptr), DSP_OK);
         ASSERT_EQ(dsp_effect_prepare(effect, &format, nullptr), DSP_OK);
-        std::atomic<bool> started{false}, done{false};
-        std::thread audio([&] {
-            for (int block = 0; !done || block < 50; ++block) {
-                auto samples = TestSupport::Noise<float>(2 * 100);
-                ASSERT_EQ(dsp_effect_process_f32(effect, samples.data(), 100), DSP_OK);
-                ASSERT_EQ(dsp_analyser_feed_f32(analyser, samples.data(), 100, 2), DSP_OK);
-                if (block % 7 == 0) {
-                    ASSERT_EQ(dsp_effect_rewind(effect, 0), DSP_OK);
+        const auto audio = [&](int block) {
+            auto samples = TestSupport::Noise<float>(2 * 100);
+            EXPECT_EQ(dsp_effect_process_f32(effect, samples.data(), 100), DSP_OK);
+            EXPECT_EQ(dsp_analyser_feed_f32(analyser, samples.data(), 100, 2), DSP_OK);
+            EXPECT_EQ(block % 7 == 0 ? dsp_effect_rewind(effect, 0) : DSP_OK, DSP_OK);
+        };
+        const auto edit = [&] {
+            std::vector<std::byte> state(1 << 20);
+            int32_t parameters = 0, presets = 0, latency = 0;
+            std::size_t needed = 0;
+            char text[200];
+            EXPECT_EQ(dsp_effect_parameters(effect, &parameters), DSP_OK);
+            EXPECT_EQ(dsp_effect_presets(effect, &presets), DSP_OK);
+            for (int round = 0; round < 10; ++round) {
+                dsp_effect* other = nullptr;
+                EXPECT_EQ(dsp_effect_create("Gain", &other, nullptr), DSP_OK);
+                for (int32_t p = 0; p < parameters; ++p) {
+                    EXPECT_EQ(dsp_effect_set(effect, p, static_cast<float>((p + round) % 11) / 10.0f),
+                              DSP_OK);
+                    EXPECT_EQ(
+                        dsp_effect_parameter_text(effect, p, DSP_TEXT_VALUE, text, sizeof text, nullptr),
+                        DSP_OK);
                 }
-                started = true;
+                EXPECT_EQ(dsp_effect_latency(effect, &latency), DSP_OK);
+                EXPECT_EQ(dsp_effect_state(effect, state.data(), state.size(), &needed), DSP_OK);
+                EXPECT_EQ(dsp_effect_set_state(effect, state.data(), needed, nullptr), DSP_OK);
+                EXPECT_EQ(presets > 0 ? dsp_effect_set_preset(effect, round % presets) : DSP_OK, DSP_OK);
+                EXPECT_EQ(dsp_analyser_refresh(analyser, nullptr), DSP_OK);
+                EXPECT_EQ(dsp_close(other), DSP_OK);
             }
-        });
-        while (!started) std::this_thread::yield();
-        std::vector<std::byte> state(1 << 20);
-        int32_t parameters = 0, presets = 0, latency = 0;
-        std::size_t needed = 0;
-        char text[200];
-        ASSERT_EQ(dsp_effect_parameters(effect, &parameters), DSP_OK);
-        ASSERT_EQ(dsp_effect_presets(effect, &presets), DSP_OK);
-        for (int round = 0; round < 10; ++round) {
-            dsp_effect* other = nullptr;
-            EXPECT_EQ(dsp_effect_create("Gain", &other, nullptr), DSP_OK);
-            for (int32_t p = 0; p < parameters; ++p) {
-                EXPECT_EQ(dsp_effect_set(effect, p, static_cast<float>((p + round) % 11) / 10.0f), DSP_OK);
-                EXPECT_EQ(dsp_effect_parameter_text(effect, p, DSP_TEXT_VALUE, text, sizeof text, nullptr),
-                          DSP_OK);
-            }
-            EXPECT_EQ(dsp_effect_latency(effect, &latency), DSP_OK);
-            EXPECT_EQ(dsp_effect_state(effect, state.data(), state.size(), &needed), DSP_OK);
-            EXPECT_EQ(dsp_effect_set_state(effect, state.data(), needed, nullptr), DSP_OK);
-            if (presets > 0) {
-                EXPECT_EQ(dsp_effect_set_preset(effect, round % presets), DSP_OK);
-            }
-            EXPECT_EQ(dsp_analyser_refresh(analyser, nullptr), DSP_OK);
-            EXPECT_EQ(dsp_close(other), DSP_OK);
-        }
-        done = true;
-        audio.join();
+        };
+        TestSupport::WhileAnotherThread(audio, edit);
         EXPECT_EQ(dsp_close(analyser), DSP_OK);
         EXPECT_EQ(dsp_close(effect), DSP_OK);
     }

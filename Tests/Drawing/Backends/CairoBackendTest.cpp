@@ -32,7 +32,7 @@ extern "C" struct _PangoLayout* pango_layout_new(struct _PangoContext* context) 
 
 namespace {
 
-class CairoBackend : public AnalyserTest {};
+class CairoBackend : public ViewTest {};
 
 // Catches curves that are drawn column by column otherwise than as outlines: elsewhere, thicker or torn.
 TEST_F(CairoBackend, CurvesAreAsOutlined) {

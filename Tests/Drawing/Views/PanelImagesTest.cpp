@@ -10,7 +10,7 @@ using namespace Corvo;
 
 namespace {
 
-class PanelImages : public AnalyserTest {};
+class PanelImages : public ViewTest {};
 
 // Catches images that stay as they are after command 1350, and ones that are made for every picture.
 TEST_F(PanelImages, AreMadeAnewWhenAsked) {

@@ -47,7 +47,7 @@ double Reading(const std::string& readout, const std::string& unit) {
 
 double Cents(double hz, double cents) { return hz * std::exp2(cents / 1200.0); }
 
-class Readings : public AnalyserTest {
+class Readings : public ViewTest {
 protected:
     using Target = Recording::DrawTarget;
     using Drawn = Recording::Drawn;

@@ -2,6 +2,8 @@
 
 #include "Spectrum/AnalyserFixture.h"
 
+using ViewTest = AnalyserTest;
+
 // An analyser that heard `seconds` of a signal, refreshed 30 times a second.
 class ShownAnalyser {
 public:

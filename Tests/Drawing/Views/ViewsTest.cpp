@@ -23,7 +23,7 @@ namespace {
 constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
 constexpr float kInfinite = std::numeric_limits<float>::infinity();
 
-class Views : public AnalyserTest {
+class Views : public ViewTest {
 protected:
     Views() {
         analyser.SetTunerOn(true);
