@@ -59,7 +59,7 @@ BENCHMARK_TEMPLATE(BM_Compressor, double)
 // The plain form, linked, with a curve of the same shape: 35 points, 0.75 of the way to a flat line.
 template <typename Sample>
 void BM_CompressorPlain(benchmark::State& state) {
-    const auto frames = static_cast<int>(state.range(0));
+    const auto frames = static_cast<std::size_t>(state.range(0));
     Plain::Compressor plain;
     for (auto& curve : plain.curve) {
         curve.push_back({0.0, 0.0});
@@ -71,14 +71,13 @@ void BM_CompressorPlain(benchmark::State& state) {
     plain.attack = {0.0060, 0.0060};
     plain.release = {0.00032, 0.00032};
     plain.outGain = plain.appliedGain = {1.0, 1.0};
-    plain.kp = 0.0013;
-    plain.smoothParameters = state.range(1) != 0;
-    TestSupport::BlockCopy block(TestSupport::Noise<Sample>(2 * static_cast<std::size_t>(frames)));
+    plain.smoothing = state.range(1) != 0 ? 0.0013 : 0.0;
+    TestSupport::BlockCopy block(TestSupport::Noise<Sample>(2 * frames));
     for (auto _ : state) {
-        plain.Linked(block.Fresh(), frames);
+        plain.Run(block.Fresh(), frames, true);
         benchmark::ClobberMemory();
     }
-    state.SetItemsProcessed(state.iterations() * frames);
+    state.SetItemsProcessed(state.iterations() * state.range(0));
 }
 BENCHMARK_TEMPLATE(BM_CompressorPlain, float)->ArgNames({"", "glide"})->ArgsProduct({{512}, {0, 1}});
 

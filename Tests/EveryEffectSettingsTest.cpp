@@ -10,8 +10,6 @@ using namespace TestSupport;
 // What every effect promises about parameters, presets and chunks.
 namespace {
 
-using Bytes = std::vector<std::uint8_t>;
-
 // Loads bytes that may be anything and runs a block, watching the block's edges.
 void ExpectHarmless(CorvoEffectBase& effect, const Bytes& chunk, const std::string& what) {
     const auto format = Format<float>();
@@ -143,17 +141,6 @@ TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
             }
         }
     }
-}
-
-// Catches a new instance that differs from what it should start from.
-TEST_P(EveryEffectSettings, StartsFromItsDefaults) {
-    const auto effect = GetParam().make();
-    if (GetParam().startsBlank) GTEST_SKIP() << "the host loads a preset or a chunk first";
-    const auto fresh = AllParams(*effect);
-    effect->SetPreset(effect->GetDefaultPreset());
-    EXPECT_EQ(AllParams(*effect), fresh);
-    for (int i = 0; effect->NumPresets() == 0 && i < effect->GetParamCount(); ++i)
-        EXPECT_EQ(effect->GetParam(i), effect->Describe(i).neutral) << "parameter " << i;
 }
 
 // Catches automation that an effect says it plays and does not, or the reverse.

@@ -1,12 +1,12 @@
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <chrono>
 #include <mutex>
 #include <thread>
 
 #include "Support/AudioThreadRules.h"
 #include "Support/EveryEffect.h"
+#include "Support/TwoThreads.h"
 
 using namespace TestSupport;
 
@@ -20,21 +20,13 @@ TEST(AudioThreadRules, SeesWhatIsForbidden) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
     std::mutex mutex;
     std::unique_ptr<std::vector<int>> memory;
-    std::string broken;
-    {
-        const AudioThreadRules rules;
+    const auto forbidden = [&] {
         memory = std::make_unique<std::vector<int>>(100);
         const std::lock_guard lock(mutex);
         std::this_thread::sleep_for(std::chrono::nanoseconds(1));
-        broken = rules.Broken();
-    }
-    EXPECT_EQ(broken, "2 allocations, 1 locks, 1 waits");
-    {
-        const AudioThreadRules rules;
-        memory.reset();
-        broken = rules.Broken();
-    }
-    EXPECT_EQ(broken, "2 frees");
+    };
+    EXPECT_EQ(BrokenBy(forbidden), "2 allocations, 1 locks, 1 waits");
+    EXPECT_EQ(BrokenBy([&] { memory.reset(); }), "2 frees");
 }
 
 // Catches work on the audio thread that may stop it: edits, presets, automation and forced cooks included.
@@ -52,13 +44,10 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
     Random random(11);
     const auto process = [&](const std::string& what, bool force) {
         Corvo::DSP::ProcessFlags flags{force, false};
-        std::string broken;
-        {
-            const AudioThreadRules rules;
+        const auto broken = BrokenBy([&] {
             effect->Process(reinterpret_cast<double*>(block.data()), 256, &format, flags);
             if (force) effect->InitResetProcessingLight(true);
-            broken = rules.Broken();
-        }
+        });
         ASSERT_EQ(broken, "") << what;
         block = Noise<float>(2 * 256);
     };
@@ -85,33 +74,28 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     for (int index = 0; index < effect->GetParamCountReal(); index += 3)
         effect->AddEnvelope(index, 2, segments);
     effect->InitProcessing(32, &format);
-    std::atomic<bool> done{false};
-    std::thread userInterface([&] {
-        Random random(13);
-        const auto good = Chunk(*effect);
-        for (int round = 0; !done || round < 20; ++round) {
-            for (int index = 0; index < effect->GetParamCount(); ++index) {
-                effect->SetParam(index, static_cast<float>(random.Unit()), false);
-                effect->GetParameterFormattedText(index, effect->GetParam(index));
-                PluginParameterInfo info;
-                effect->GetParamSectionInfo(index, info);
-            }
-            if (round % 5 == 0 && effect->NumPresets() > 0)
-                effect->SetPreset(random.Below(effect->NumPresets()));
-            if (round % 7 == 0) effect->SetSettingsChunk(good);
-            Chunk(*effect);
-            if (effect->WantsUpdateUiFromScratch()) effect->SetUpdateUiFromScratch(false);
-            std::this_thread::yield();
+    Random edits(13);
+    const auto good = Chunk(*effect);
+    const auto edit = [&](int round) {
+        for (int index = 0; index < effect->GetParamCount(); ++index) {
+            effect->SetParam(index, static_cast<float>(edits.Unit()), false);
+            effect->GetParameterFormattedText(index, effect->GetParam(index));
+            PluginParameterInfo info;
+            effect->GetParamSectionInfo(index, info);
+        }
+        if (round % 5 == 0 && effect->NumPresets() > 0) effect->SetPreset(edits.Below(effect->NumPresets()));
+        if (round % 7 == 0) effect->SetSettingsChunk(good);
+        Chunk(*effect);
+        if (effect->WantsUpdateUiFromScratch()) effect->SetUpdateUiFromScratch(false);
+    };
+    const auto input = Noise<float>(2 * 32);
+    WhileAnotherThread(edit, [&] {
+        for (int i = 0; i < 500; ++i) {
+            auto block = input;
+            effect->SetEnvelopeTime(i % 200);
+            ProcessBlock(*effect, block.data(), 32, format);
         }
     });
-    const auto input = Noise<float>(2 * 32);
-    for (int i = 0; i < 500; ++i) {
-        auto block = input;
-        effect->SetEnvelopeTime(i % 200);
-        ProcessBlock(*effect, block.data(), 32, format);
-    }
-    done = true;
-    userInterface.join();
 
     const auto donor = Make(), fresh = Make();
     Random random(17);

@@ -150,33 +150,35 @@ TEST_F(RenderCommand, KeepsTheInputsSamplesAndFormat) {
 TEST_F(RenderCommand, RoundsToNearestEvenAndClips) {
     for (const auto& [format, most] : {std::pair{"s16", 32767.0}, {"s24", 8388607.0}}) {
         SCOPED_TRACE(format);
-        const double step = 1.0 / (most + 1.0);
-        const std::vector<double> samples{0.5 * step,
-                                          1.5 * step,
-                                          -0.5 * step,
-                                          -2.5 * step,
-                                          0.49 * step,
-                                          0.51 * step,
-                                          1.0 - step,
-                                          -1.0,
-                                          1.0,
-                                          1.0 - 0.51 * step,
-                                          1.0 - 0.4 * step,
-                                          -1.0 - 0.4 * step,
-                                          -1.0 - 0.6 * step,
-                                          7.0,
-                                          -7.0,
-                                          std::nan("")};
-        const std::vector<double> expected{0,    2,    0,    -2,        0,         1,    most,      -most - 1,
-                                           most, most, most, -most - 1, -most - 1, most, -most - 1, 0};
+        const double step = 1.0 / (most + 1.0), full = most + 1.0;
+        // In steps. 1, 1 - 0.4 steps, -1 - 0.6 steps, the two sevens: these are clipped, and what is no
+        // number.
+        const std::pair<double, double> cases[] = {{0.5, 0},
+                                                   {1.5, 2},
+                                                   {-0.5, 0},
+                                                   {-2.5, -2},
+                                                   {0.49, 0},
+                                                   {0.51, 1},
+                                                   {most, most},
+                                                   {-full, -full},
+                                                   {full, most},
+                                                   {full - 0.51, most},
+                                                   {full - 0.4, most},
+                                                   {-full - 0.4, -full},
+                                                   {-full - 0.6, -full},
+                                                   {7 * full, most},
+                                                   {-7 * full, -full},
+                                                   {std::nan(""), 0}};
+        std::vector<double> samples;
+        for (const auto& [sample, expected] : cases) samples.push_back(sample * step);
         Save("in.wav", {1, 1000, kDouble, samples});
-        // 1.0, 1 - 0.4 steps, -1 - 0.6 steps, the two sevens, and what is not a number.
         EXPECT_EQ(Run(std::string("render in.wav out.wav -y --format ") + format).err,
                   "dsphost: warning: in.wav: 1 sample is not a finite number, at 0.015 s\n"
                   "dsphost: warning: out.wav: 6 samples were clipped\n");
         const Sound out = Load("out.wav");
-        ASSERT_EQ(out.samples.size(), expected.size());
-        for (std::size_t i = 0; i < expected.size(); ++i) EXPECT_EQ(out.samples[i], expected[i] * step) << i;
+        ASSERT_EQ(out.samples.size(), std::size(cases));
+        for (std::size_t i = 0; i < std::size(cases); ++i)
+            EXPECT_EQ(out.samples[i], cases[i].second * step) << i;
     }
 }
 

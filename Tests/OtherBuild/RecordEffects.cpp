@@ -28,7 +28,7 @@ constexpr double kLevelLimitDb = 0.5;
 
 struct Take {
     std::string name;
-    std::vector<double> samples;  // left and right in turn; of texts and chunks the characters and bytes
+    std::vector<double> samples;  // left and right in turn; of chunks the bytes
     double limit = 0.0;           // of their deviation, or of their levels'
     bool levels = false;          // these alone are compared
 };
@@ -46,26 +46,6 @@ std::vector<double> FixedSignal() {
     signal.insert(signal.end(), noise.begin(), noise.end());
     signal.resize(signal.size() + kSilentFrames * kChannels);
     return signal;
-}
-
-// What the effect says of itself.
-Take Texts(const EffectCase& which) {
-    Take take{std::string(which.name) + " texts", {}};
-    const auto say = [&](const auto& text) {
-        take.samples.insert(take.samples.end(), text.begin(), text.end());
-        take.samples.push_back('\n');
-    };
-    const auto effect = which.make();
-    say(effect->GetName() + " " + std::to_string(effect->GetLatency()));
-    for (int i = 0; i < effect->NumPresets(); ++i) say(effect->GetPresetName(i));
-    for (int i = 0; i < effect->GetParamCount(); ++i)
-        for (int step = 0; step <= 16; ++step) {
-            const float value = static_cast<float>(step) / 16.0f;
-            effect->SetParam(i, value, false);
-            say(effect->GetParamName(i) + effect->GetParamUnitsText(i) +
-                effect->GetParameterFormattedText(i, value));
-        }
-    return take;
 }
 
 // Every parameter at random, and one moved now and then: the settings' chunk and the sound.
@@ -115,10 +95,8 @@ Take EqualizerTake() {
 
 std::vector<Take> RecordAll() {
     std::vector<Take> takes{EqualizerTake()};
-    for (const auto& which : AllEffects()) {
+    for (const auto& which : AllEffects())
         for (const std::uint64_t seed : {1u, 2u, 3u}) RecordAtRandom(which, seed, takes);
-        takes.push_back(Texts(which));
-    }
     return takes;
 }
 

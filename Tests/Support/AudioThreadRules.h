@@ -21,6 +21,13 @@ public:
     static bool CanCount();
 };
 
+// What a call does of it.
+std::string BrokenBy(const auto& call) {
+    const AudioThreadRules rules;
+    call();
+    return rules.Broken();
+}
+
 // While one of these lives, the allocations of its thread fail: one of them, after so many that do not, or it
 // and all that follow. What is then lost for good is a leak that the address sanitizer reports, unless that
 // is expected.

@@ -39,7 +39,6 @@ constexpr std::array kEffects{
                .cuts = Cuts::Exempt,
                .splices = true,
                .engineAllocates = "the engine is locked against edits and allocates for an automated pitch",
-               .startsBlank = true,
                .textTruncates = true},
     EffectCase{.name = "Reverb", .make = Make<Reverb>},
     EffectCase{

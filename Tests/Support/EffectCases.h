@@ -35,8 +35,6 @@ struct EffectCase {
     std::size_t shortestChunk = SIZE_MAX;
     // Parameters are kept as plain floats rather than words, so a round trip may be off by a rounding.
     bool plainFloats = false;
-    // A new instance holds an empty record; the host loads a preset or a chunk first.
-    bool startsBlank = false;
     // A sweep's phase runs on through preparation, so a used instance sounds unlike a new one.
     bool phaseRunsOn = false;
     // Texts are truncated, so text -> value -> text may lose one unit of the last place.

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <algorithm>
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -63,10 +64,24 @@ std::vector<Sample> Render(CorvoEffectBase& effect, std::vector<Sample> samples,
     return samples;
 }
 
-inline std::vector<std::uint8_t> Chunk(CorvoEffectBase& effect) {
-    std::vector<std::uint8_t> chunk;
+using Bytes = std::vector<std::uint8_t>;
+
+inline Bytes Chunk(CorvoEffectBase& effect) {
+    Bytes chunk;
     effect.GetSettingsChunk(chunk);
     return chunk;
+}
+
+// A value of a chunk.
+template <typename T>
+T At(const Bytes& chunk, std::size_t offset) {
+    T value;
+    std::memcpy(&value, chunk.data() + offset, sizeof value);
+    return value;
+}
+template <typename T>
+void Put(Bytes& chunk, std::size_t offset, T value) {
+    std::memcpy(chunk.data() + offset, &value, sizeof value);
 }
 
 // Loads settings by the words of the chunk in their order; those left out are 0.

@@ -129,11 +129,10 @@ TEST(ParEQ, StaysBoundedWhateverTheRecordSays) {
                 }
 }
 
-// Peaks of 6 dB on as many channels.
 class Peaks : public testing::Test {
 protected:
     builtin_effects_data m_data = Bands({{EQ_PEAK, 1000, 60, 200}});
-    std::vector<builtin_effects_data> m_records{8, m_data};
+    std::vector<builtin_effects_data> m_records{8, m_data};  // of as many channels
     ParEQ m_eq;
 };
 

@@ -36,21 +36,12 @@ double ShareVoiced(const std::vector<VoicePitchFrame>& frames) {
 
 // Catches lags, windows and filters that fit 48 kHz only, and octaves.
 TEST(VoicePitchDetector, HearsAVoiceAtEveryRate) {
-    struct Case {
-        int rate;
-        double lowest, hz;
-    };
-    for (const auto& [rate, lowest, hz] : {Case{8000, 75, 110.3},
-                                           {8000, 75, 391.0},
-                                           {16000, 75, 220.9},
-                                           {44100, 75, 82.0},
-                                           {44100, 75, 1303.0},
-                                           {48000, 38, 41.2},
-                                           {48000, 160, 523.0},
-                                           {96000, 55, 61.7},
-                                           {192000, 75, 247.3}}) {
+    constexpr double kCases[][3] = {{8000, 75, 110.3},   {8000, 75, 391.0},   {16000, 75, 220.9},
+                                    {44100, 75, 82.0},   {44100, 75, 1303.0}, {48000, 38, 41.2},
+                                    {48000, 160, 523.0}, {96000, 55, 61.7},   {192000, 75, 247.3}};
+    for (const auto& [rate, lowest, hz] : kCases) {
         SCOPED_TRACE(std::to_string(rate) + " Hz, " + std::to_string(hz));
-        const auto frames = Hear(Sing(0.5, rate, hz), {.rate = 1.0 * rate, .lowestHz = lowest});
+        const auto frames = Hear(Sing(0.5, static_cast<int>(rate), hz), {.rate = rate, .lowestHz = lowest});
         ASSERT_GT(frames.size(), 80u);
         // Rates whose samples are coarse against the period leave a fraction of a cent more.
         const double allowed = rate < 20000 ? 3.0 : 0.3;

@@ -12,6 +12,7 @@
 #include "Drawing/Views/Look.h"
 #include "Drawing/Views/Rectangles.h"
 #include "Drawing/Views/ShownAnalyser.h"
+#include "Spectrum/Drawer/SpectrumDrawer.h"
 #include "Support/RecordingDrawing.h"
 
 // What can be read off the pictures: labels, curve, needle, arrows, lines and readouts against what was
@@ -296,24 +297,58 @@ TEST_F(Readings, BothPlotsShowTheSpanAndTheMarker) {
     EXPECT_EQ(analyser.GetFrequencySpan(), Corvo::FrequencySpan{});
 }
 
-// Catches a curve or a readout that has its peak at another frequency or level than the sine.
+// Catches a curve or a readout that has its peak at another frequency or level than the sine, and columns
+// without a point, wherever bins are denser or wider than pixels.
 TEST_F(Readings, PeakIsTheSines) {
+    auto& settings = kivspectrum::settings;
+    settings.time_smoothing = 0;
+    for (const int scale : {0, 1, 4, 5})
+        for (const int levels : {0, 1, 2})
+            for (const auto& [hz, level] : {std::pair{1000.0, -20.0}, {6000.0, 0.0}, {187.5, -60.0}}) {
+                SCOPED_TRACE(testing::Message() << "scale " << scale << ", levels " << levels << ", " << hz);
+                settings.view_option_a = scale;
+                settings.view_option_b = levels;
+                m_shown.Hear(hz, std::pow(10.0, level / 20.0));
+                const auto drawn = ShowSpectrum();
+                const auto& [text, box, middle] = drawn.texts.back();
+                EXPECT_TRUE(text.starts_with("Peak")) << text;
+                EXPECT_NEAR(Reading(text, "Hz"), hz, 2.0) << text;
+                EXPECT_NEAR(levels == 0 ? Reading(text, "dB") : level, level, 0.3) << text;
+                const auto& [curve, colour] = drawn.lines.back();
+                EXPECT_EQ(colour, Look::kCurve);
+                EXPECT_NEAR(static_cast<float>(curve.size()), m_plot.width, 2.0f);
+                const auto top = std::ranges::min_element(curve, {}, &PointF::y);
+                EXPECT_NEAR(top->x, Map().FrequencyToX(hz), 6.0f);
+                const double linear = std::pow(10.0, level / (levels == 1 ? 10.0 : 20.0));
+                const double down = levels == 0 ? -level / kRange : 1.0 - linear;
+                EXPECT_NEAR(top->y, m_plot.y + static_cast<float>(down) * m_plot.height,
+                            5.0f);  // between bins
+                const auto bin = analyser.GetSpectrumDrawer()
+                                     ->GetFFTPoints()[static_cast<std::size_t>(top - curve.begin())];
+                EXPECT_NEAR(bin, hz * 4096.0 / ShownAnalyser::kRate, 0.51);
+            }
+    settings.gain = 0.5f;
+    settings.view_option_b = 2;
+    m_shown.Hear(6000.0, 1.0);
+    const auto halved = ShowSpectrum();
+    EXPECT_NEAR(std::ranges::min(halved.lines.back().points, {}, &PointF::y).y, Centre(m_plot).y, 1.0f);
+}
+
+// The sine's whole power is in its band, and only there.
+TEST_F(Readings, BandsCollectTheirPower) {
     kivspectrum::settings.time_smoothing = 0;
-    for (const int scale : {0, 1, 4})
-        for (const auto& [hz, level] : {std::pair{1000.0, -20.0}, {6000.0, 0.0}, {187.5, -60.0}}) {
-            kivspectrum::settings.view_option_a = scale;
-            m_shown.Hear(hz, std::pow(10.0, level / 20.0));
-            const auto drawn = ShowSpectrum();
-            const auto& [text, box, middle] = drawn.texts.back();
-            EXPECT_TRUE(text.starts_with("Peak")) << text;
-            EXPECT_NEAR(Reading(text, "Hz"), hz, 2.0) << text;
-            EXPECT_NEAR(Reading(text, "dB"), level, 0.3) << text;
-            const auto& [curve, colour] = drawn.lines.back();
-            EXPECT_EQ(colour, Look::kCurve);
-            const PointF top = *std::ranges::min_element(curve, {}, &PointF::y);
-            EXPECT_NEAR(top.x, Map().FrequencyToX(hz), 6.0f);
-            EXPECT_NEAR(top.y, LevelY(level), 5.0f);  // between bins it is 0.5 dB lower
-        }
+    m_shown.Hear(85.0 * ShownAnalyser::kRate / 4096.0, 1.0);  // 996 Hz
+    for (const int scale : {2, 3}) {
+        kivspectrum::settings.view_option_a = scale;
+        const auto curve = ShowSpectrum().lines.back().points;
+        const auto top = std::ranges::min_element(curve, {}, &PointF::y);
+        const double half = std::exp2(scale == 2 ? 1.0 / 2.0 : 1.0 / 6.0);
+        EXPECT_NEAR(top[0].y, m_plot.y, 0.5f);
+        EXPECT_NEAR(top[0].x, Map().FrequencyToX(1000.0 / half), 1.0f);
+        EXPECT_NEAR(top[1].x, Map().FrequencyToX(1000.0 * half), 1.0f);
+        EXPECT_EQ(top[1].y, top[0].y);
+        EXPECT_GT(top[2].y, LevelY(-60.0));
+    }
 }
 
 // Catches a spike where the curve ends: half the rate has no bin there, but its neighbours get some of it.

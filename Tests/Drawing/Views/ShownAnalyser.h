@@ -1,30 +1,8 @@
 #pragma once
 
-#include <gtest/gtest.h>
+#include "Spectrum/AnalyserFixture.h"
 
-#include <cstddef>
-
-#include "Spectrum/Sonogram/Sonogram.h"
-#include "Spectrum/Tuner/Tuner.h"
-#include "Spectrum/kivspectrum.h"
-#include "Support/Signals.h"
-
-// Everything that all analysers share starts every test at its defaults.
-class ViewTest : public testing::Test {
-protected:
-    ViewTest() { Reset(); }
-    ~ViewTest() override { Reset(); }
-
-private:
-    static void Reset() {
-        kivspectrum::settings = {};
-        Corvo::Sonogram::SetSpeedIndex(3);
-        Corvo::Sonogram::SetColourScheme(0);
-        Tuner::SetTemperament(0);
-        Tuner::SetNoteNaming(0);
-        TunerCalibrateReset();
-    }
-};
+using ViewTest = AnalyserTest;
 
 // An analyser that heard `seconds` of a signal, refreshed 30 times a second.
 class ShownAnalyser {

@@ -3,22 +3,16 @@
 #include <algorithm>
 #include <cmath>
 #include <numeric>
-#include <optional>
-#include <tuple>
 
 #include "Spectrum/AnalyserFixture.h"
 #include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
-#include "Spectrum/Scales/CoordinatesAndFrequencies.h"
 #include "Spectrum/Scales/PowerToDecibels.h"
 
 namespace {
 
-using Corvo::FrequencyScale;
-using Corvo::LevelScale;
 using Record = kivspectrum::spectrum_settings;
 using Values = std::vector<float>;
 
-constexpr Corvo::RectF kRectangle{10.0f, 20.0f, 500.0f, 200.0f};
 constexpr int kRate = 48000;
 
 // With 8 bins and 100 analyses a second.
@@ -103,70 +97,6 @@ TEST(PowerToDecibels, IsTenLogarithms) {
         ASSERT_NEAR(level[k], k < 3 ? -298.5 : 10.0 * std::log10(power[k]) + 1.5, 1e-3) << power[k];
 }
 
-class Curve : public AnalyserTest {
-protected:
-    // The curve of a full-scale sine in the middle of `bin`.
-    void Draw(std::size_t bin, double lowest, FrequencyScale scale, LevelScale levels, float gain = 1.0f) {
-        Settings().window_length = kLength;
-        Settings().time_smoothing = 0;
-        Settings().gain = gain;
-        m_analyser.emplace();
-        m_analyser->SetOn(true);
-        Feed(*m_analyser,
-             TestSupport::Sine<float>(kLength, static_cast<double>(bin) * kRate / kLength, kRate, 1.0));
-        ASSERT_TRUE(Prepare(*m_analyser, kRate));
-        m_map.emplace(kRectangle, lowest, 20000.0, scale, levels, 90.0f);
-        int count = -1;
-        m_points.resize(1001);
-        Drawer().ComputeSpectrumPoints(kRectangle, m_points.data(), count, *m_map,
-                                       kivspectrum::display_spectrum, 1001, 0.0f, nullptr);
-        m_points.resize(static_cast<std::size_t>(count));
-        ASSERT_GE(m_points.size(), 2u);
-        const auto lower = [](const auto& a, const auto& b) { return a.y > b.y; };
-        m_top = static_cast<std::size_t>(std::max_element(m_points.begin(), m_points.end(), lower) -
-                                         m_points.begin());
-    }
-    SpectrumDrawer& Drawer() { return *m_analyser->GetSpectrumDrawer(); }
-
-    static constexpr int kLength = 4096;
-    std::optional<kivspectrum> m_analyser;
-    std::optional<CoordinatesAndFrequencies> m_map;
-    std::vector<Corvo::PointF> m_points;
-    std::size_t m_top = 0;
-};
-
-// A full-scale sine touches the top at its own frequency on every scale, wherever bins are denser or wider
-// than pixels, and no column is without a point.
-TEST_F(Curve, ShowsASineAtItsPlace) {
-    for (const auto scale :
-         {FrequencyScale::Linear, FrequencyScale::Logarithmic, FrequencyScale::Mel, FrequencyScale::Notes})
-        for (const auto levels : {LevelScale::Decibels, LevelScale::Power, LevelScale::Amplitude})
-            for (const std::size_t bin : {std::size_t{20}, std::size_t{400}, std::size_t{1500}}) {
-                Draw(bin, 20.0, scale, levels);
-                ASSERT_EQ(m_points.size(), 500u);
-                EXPECT_NEAR(m_points[m_top].y, 20.0, 0.2) << bin;
-                EXPECT_NEAR(m_points[m_top].x, m_map->FrequencyToX(static_cast<double>(bin) * kRate / 4096),
-                            1.0);
-                EXPECT_EQ(Drawer().GetFFTPoints()[m_top], static_cast<int>(bin));
-                for (const auto& point : m_points) EXPECT_TRUE(point.y >= 20.0f && point.y <= 220.0f);
-            }
-    Draw(400, 20.0, FrequencyScale::Linear, LevelScale::Amplitude, 0.5f);
-    EXPECT_NEAR(m_points[m_top].y, 120.0, 0.2);
-}
-
-// The sine's whole power is in its band, and only there.
-TEST_F(Curve, CollectsBands) {
-    for (const auto scale : {FrequencyScale::Octaves, FrequencyScale::ThirdOctaves}) {
-        Draw(85, 20.0, scale, LevelScale::Decibels);  // 996 Hz
-        const double half = scale == FrequencyScale::Octaves ? std::sqrt(2.0) : std::exp2(1.0 / 6.0);
-        EXPECT_NEAR(m_map->YToLevel(m_points[m_top].y), 0.0, 0.05);
-        EXPECT_NEAR(m_points[m_top].x, m_map->FrequencyToX(1000.0 / half), 1.0);
-        EXPECT_NEAR(m_points[m_top + 1].x, m_map->FrequencyToX(1000.0 * half), 1.0);
-        EXPECT_EQ(m_points[m_top + 1].y, m_points[m_top].y);
-        EXPECT_LT(m_map->YToLevel(m_points[m_top + 2].y), -60.0);
-    }
-}
-
 // What leaks from a louder sine below the lowest frequency is no peak, nor is the last bin; the first may be
 // one.
 TEST(SpectrumDrawer, FindsTheHighestPeak) {
@@ -176,16 +106,12 @@ TEST(SpectrumDrawer, FindsTheHighestPeak) {
     SpectrumDrawer drawer(settings);
     drawer.UpdateSamplingFrequency(16);  // a bin is 1 Hz wide
     VectorInterpolationFilterFloat none;
-    struct Case {
-        Values power;
-        double lowest, hz, decibels;
-    };
-    for (const auto& [power, lowest, hz, decibels] :
-         {Case{{0, 64, 1, 0, 0, 0, 0, 0}, 0.0, 1.0, 0.0},
-          Case{{99, 0, 0, 0, 0, 0, 0, 6.4f}, 0.0, 0.0, -300.0},
-          Case{{0, 640, 40, 1, 6.4f, 1, 0, 0}, 1.1, 4.0, -10.0},
-          Case{{0, 64, 1, 0, 0, 0, 0, 0}, std::nan(""), 1.0, 0.0},
-          Case{{0, 0, 1, 64, 64, 1, 0, 0}, 0.0, 3.5, 10.0 / 4.0 * std::log10(64.0) / 2.0}}) {
+    for (const auto& [power, lowest, hz, decibels] : std::vector<std::tuple<Values, double, double, double>>{
+             {{0, 64, 1, 0, 0, 0, 0, 0}, 0.0, 1.0, 0.0},
+             {{99, 0, 0, 0, 0, 0, 0, 6.4f}, 0.0, 0.0, -300.0},
+             {{0, 640, 40, 1, 6.4f, 1, 0, 0}, 1.1, 4.0, -10.0},
+             {{0, 64, 1, 0, 0, 0, 0, 0}, std::nan(""), 1.0, 0.0},
+             {{0, 0, 1, 64, 64, 1, 0, 0}, 0.0, 3.5, 10.0 / 4.0 * std::log10(64.0) / 2.0}}) {
         drawer.SmoothFftSpectrum(power, 1.0f, none);
         EXPECT_NEAR(drawer.HighestPeak(lowest).frequency, hz, 1e-6);
         EXPECT_NEAR(drawer.HighestPeak(lowest).level, decibels, 1e-4) << hz;

@@ -14,8 +14,8 @@ namespace {
 
 void Load(Chorus& chorus, const Plain::Chorus::Settings& s) {
     std::vector<std::int32_t> words{0};
-    for (const auto& pair : {s.frequency, s.delay, s.wet, s.dry, s.depth})
-        words.insert(words.end(), pair.begin(), pair.end());
+    for (const auto& [left, right] : {s.frequency, s.delay, s.wet, s.dry, s.depth})
+        words.insert(words.end(), {left, right});
     LoadWords(chorus, words);
 }
 

@@ -13,13 +13,8 @@ namespace {
 
 constexpr double kRate = 48000.0;
 
-double AttackCoefficient(int hundredths) {
-    return 1.0 - std::pow(10.0, -1.0 / (hundredths * kRate * 0.00001 + 1.0));
-}
-double ReleaseCoefficient(int hundredths) {
-    return 1.0 - std::pow(10.0, -1.0 / (hundredths * kRate * 0.0001 + 1.0));
-}
-double Smoothing() { return 1.0 - std::exp(-2.0 * std::numbers::pi / (kRate * 0.1)); }
+// Of a one-pole that covers 90 % of its way in that time.
+double Coefficient(double frames) { return 1.0 - std::pow(10.0, -1.0 / (frames + 1.0)); }
 
 // The plain core with the settings that a chunk holds, standing.
 Plain::Compressor PlainFrom(Compressor& effect) {
@@ -32,15 +27,14 @@ Plain::Compressor PlainFrom(Compressor& effect) {
     Plain::Compressor plain;
     for (std::size_t channel = 0; channel < 2; ++channel) {
         std::array<std::array<float, 3>, 666> points;
-        read(points[0]);
-        for (std::size_t i = 1; i < points.size(); ++i) read(points[i]);
+        for (auto& point : points) read(point);
         for (std::size_t i = 0; i < static_cast<std::size_t>(counts[channel]); ++i)
             plain.curve[channel].push_back({points[i][0], points[i][1]});
-        plain.attack[channel] = AttackCoefficient(words[channel]);
-        plain.release[channel] = ReleaseCoefficient(words[2 + channel]);
+        plain.attack[channel] = Coefficient(words[channel] * kRate * 0.00001);
+        plain.release[channel] = Coefficient(words[2 + channel] * kRate * 0.0001);
         plain.outGain[channel] = plain.appliedGain[channel] = std::pow(10.0, words[4 + channel] * 0.005);
     }
-    plain.kp = plain.kg = Smoothing();
+    plain.smoothing = 1.0 - std::exp(-2.0 * std::numbers::pi / (kRate * 0.1));
     return plain;
 }
 
@@ -52,15 +46,6 @@ std::vector<Sample> Wandering(std::size_t frames) {
         samples[i] *= static_cast<Sample>(
             Amplitude(-40.0 + 45.0 * std::sin(static_cast<double>(i / 2) * (i % 2 ? 0.0013 : 0.0007))));
     return samples;
-}
-
-template <typename Sample>
-void RunPlain(Plain::Compressor& plain, std::vector<Sample>& samples, bool linked, std::size_t from,
-              std::size_t to) {
-    const int frames = static_cast<int>(to - from);
-    if (linked) return plain.Linked(samples.data() + 2 * from, frames);
-    plain.Channel(samples.data() + 2 * from, 0, 2, frames);
-    plain.Channel(samples.data() + 2 * from + 1, 1, 2, frames);
 }
 
 void Prepare(Compressor& effect, bool linked) {
@@ -99,7 +84,7 @@ TEST(ParameterSmootherTester, GlidesLikeThePlainForm) {
         auto plain = PlainFrom(effect);
         const auto target = PlainFrom(edited);
         auto expected = input;
-        RunPlain(plain, expected, linked, 0, kEdit);
+        plain.Run(expected.data(), kEdit, linked);
         for (std::size_t channel = 0; channel < 2; ++channel) {
             ASSERT_EQ(plain.curve[channel].size(), target.curve[channel].size());
             for (std::size_t i = 0; i < target.curve[channel].size(); ++i) {
@@ -108,8 +93,7 @@ TEST(ParameterSmootherTester, GlidesLikeThePlainForm) {
             }
         }
         plain.outGain = target.outGain;
-        plain.smoothParameters = plain.smoothGain = true;
-        RunPlain(plain, expected, linked, kEdit, kFrames);
+        plain.Run(expected.data() + 2 * kEdit, kFrames - kEdit, linked);
         const auto output = Render(effect, input, Format<Sample>(), {512}, edits);
         for (std::size_t i = 0; i < output.size(); ++i)
             ASSERT_NEAR(output[i], expected[i], i < 2 * kEdit ? 0.0 : tolerance)

@@ -2,7 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <limits>
 
 #include "Support/CompressorProbe.h"
@@ -11,20 +10,6 @@ using namespace TestSupport;
 
 // Parameters, chunks and the hand-over between the threads.
 namespace {
-
-using Bytes = std::vector<std::uint8_t>;
-
-template <typename T>
-T At(const Bytes& chunk, std::size_t offset) {
-    T value;
-    std::memcpy(&value, chunk.data() + offset, sizeof value);
-    return value;
-}
-
-template <typename T>
-void Put(Bytes& chunk, std::size_t offset, T value) {
-    std::memcpy(chunk.data() + offset, &value, sizeof value);
-}
 
 constexpr std::size_t kRecord = 4, kCounts = kRecord + 96, kPoints = kRecord + 112, kPreset = 16100;
 

@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <limits>
 
 #include "DenoiserRun.h"
@@ -11,7 +10,6 @@ using namespace TestSupport;
 // The learned noise: how it is learned, kept and handed over.
 namespace {
 
-using Bytes = std::vector<std::uint8_t>;
 constexpr std::size_t kParameters = 28, kSecondsAt = 12 + 8 * kParameters, kRateAt = kSecondsAt + 8,
                       kChannelsAt = kRateAt + 4, kSpectraAt = kChannelsAt + 4;
 
@@ -28,11 +26,6 @@ double Density(DenoiserProcessor& denoiser, double rate = 48000.0) {
     for (std::size_t bin = 205; bin < 1844; ++bin)
         sum += static_cast<double>(density[bin]) / (1844.0 - 205.0);
     return sum;
-}
-
-template <typename T>
-void Put(Bytes& chunk, std::size_t at, T value) {
-    std::memcpy(chunk.data() + at, &value, sizeof value);
 }
 
 // A chunk's profile alone.
@@ -104,8 +97,7 @@ TEST(DenoiserProfile, WhatTheUserDidLastWins) {
     Learn(denoiser, white, format);
     denoiser.SetSettingsChunk(Chunk(loaded));
     EXPECT_NEAR(Density(denoiser), 0.04, 0.002);
-    const auto& nothing = std::vector<float>(64);
-    Clean(denoiser, nothing, format);
+    Clean(denoiser, std::vector<float>(64), format);
     EXPECT_NEAR(Density(denoiser), 0.04, 0.002);
     denoiser.InitProcessing(24000, &format);
     Open(denoiser, white, format);
@@ -136,13 +128,7 @@ TEST(DenoiserProfile, LearningNeitherAllocatesNorLocks) {
         if (round % 60 == 50) denoiser.SetParam(kLearn, 0.0f, false);
         if (round == 150) denoiser.SetSettingsChunk(chunk);
         if (round % 50 == 49) denoiser.SetParam(kClear, 1.0f, round > 100);
-        std::string broken;
-        {
-            const AudioThreadRules rules;
-            ProcessBlock(denoiser, block.data(), 256, format);
-            broken = rules.Broken();
-        }
-        ASSERT_EQ(broken, "") << "round " << round;
+        ASSERT_EQ(BrokenBy([&] { ProcessBlock(denoiser, block.data(), 256, format); }), "") << round;
         if (round % 9 == 0) denoiser.LearnedSeconds();
     }
 }
@@ -201,42 +187,35 @@ TEST(DenoiserProfile, RefusesABrokenChunkWhole) {
     for (std::size_t length = 0; length < good.size(); length += good.size() / 150)
         refuse(Bytes(good.begin(), good.begin() + static_cast<std::ptrdiff_t>(length)),
                "cut at " + std::to_string(length));
-    const struct {
-        const char* fault;
-        std::size_t at;
-        double value;
-        bool isDouble;
-    } faults[] = {{"another version", 4, 2, false},
-                  {"no count of parameters", 8, -1, false},
-                  {"a parameter that is no number", 12, std::numeric_limits<double>::quiet_NaN(), true},
-                  {"negative seconds", kSecondsAt, -1, true},
-                  {"endless seconds", kSecondsAt, std::numeric_limits<double>::infinity(), true},
-                  {"no rate", kRateAt, 0, false},
-                  {"a rate whose windows are longer", kRateAt, 96000, false},
-                  {"three channels", kChannelsAt, 3, false},
-                  {"a bin too many", kSpectraAt, 258, false},
-                  {"more than there is", kSpectraAt, 2147483647, false},
-                  {"negative power", kSpectraAt + 4, -1e-9, true},
-                  {"endless power", kSpectraAt + 12, 1e300, true}};
-    for (const auto& fault : faults) {
+    const auto put = [&](std::size_t at, auto value, const char* fault) {
         auto chunk = good;
-        if (fault.isDouble)
-            Put(chunk, fault.at, fault.value);
-        else
-            Put(chunk, fault.at, static_cast<std::int32_t>(fault.value));
-        refuse(chunk, fault.fault);
-    }
-    auto one = good;  // a second channel, without spectra
-    Put(one, kChannelsAt, std::int32_t{2});
+        Put(chunk, at, value);
+        refuse(chunk, fault);
+    };
+    constexpr double kEndless = std::numeric_limits<double>::infinity();
+    put(4, 2, "another version");
+    put(8, -1, "no count of parameters");
+    put(12, std::nan(""), "a parameter that is no number");
+    put(kSecondsAt, -1.0, "negative seconds");
+    put(kSecondsAt, kEndless, "endless seconds");
+    put(kRateAt, 0, "no rate");
+    put(kRateAt, 96000, "a rate whose windows are longer");
+    put(kChannelsAt, 3, "three channels");
+    put(kSpectraAt, 258, "a bin too many");
+    put(kSpectraAt, 2147483647, "more than there is");
+    put(kSpectraAt + 4, -1e-9, "negative power");
+    put(kSpectraAt + 12, 1e300, "endless power");
+    auto one = good;
+    Put(one, kChannelsAt, 2);
     one.resize(one.size() + 5 * 4);
-    refuse(one, "channels with different lengths");
-    auto empty = good;  // seconds and no spectra
+    refuse(one, "a second channel without spectra");
+    auto empty = good;
     empty.resize(kSpectraAt);
-    Put(empty, kChannelsAt, std::int32_t{0});
+    Put(empty, kChannelsAt, 0);
     refuse(empty, "seconds without spectra");
     // An older layout has fewer parameters, in which case the rest stay at their defaults.
     Bytes few = good;
-    Put(few, 8, std::int32_t{4});
+    Put(few, 8, 4);
     few.erase(few.begin() + 12 + 8 * 4, few.begin() + kSecondsAt);
     SetText(denoiser, kSensitivity, "3 dB");
     denoiser.SetSettingsChunk(few);

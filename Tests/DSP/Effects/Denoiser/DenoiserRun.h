@@ -19,13 +19,12 @@ inline void SetText(DenoiserProcessor& denoiser, int index, const std::string& t
 // Learns from `noise`, interleaved; further passages add up.
 template <typename Sample>
 void Learn(DenoiserProcessor& denoiser, std::vector<Sample> noise, const tWAVEFORMATEX& format) {
-    noise.resize(noise.size() + format.nChannels);
-    const int frames = static_cast<int>(noise.size() / format.nChannels) - 1;
+    const int frames = static_cast<int>(noise.size() / format.nChannels);
     denoiser.InitProcessing(frames, &format);
     denoiser.SetParam(kLearn, 1.0f, false);
     ProcessBlock(denoiser, noise.data(), frames, format);
     denoiser.SetParam(kLearn, 0.0f, false);
-    ProcessBlock(denoiser, noise.data() + noise.size() - format.nChannels, 1, format);
+    ProcessBlock(denoiser, std::vector<Sample>(format.nChannels).data(), 1, format);
 }
 
 // What becomes of the samples, the latency taken out.

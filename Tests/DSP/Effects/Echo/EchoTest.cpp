@@ -4,7 +4,6 @@
 
 #include <climits>
 #include <cmath>
-#include <cstring>
 #include <tuple>
 
 #include "Plain/PlainEcho.h"
@@ -19,15 +18,11 @@ namespace {
 enum { kDepthL, kMode = 2, kModeR };
 
 struct Host : CorvoEffectHostCallback {
-    double bpm;
-    int above, below;
-    Host(double tempo = 120.0, int numerator = 4, int denominator = 4)
-        : bpm(tempo), above(numerator), below(denominator) {}
+    Host(double tempo = 120.0, int above = 4, int below = 4) : bpm(tempo), signature(above, below) {}
     double GetTempo() override { return bpm; }
-    void GetTimeSignature(int& numerator, int& denominator) override {
-        numerator = above;
-        denominator = below;
-    }
+    void GetTimeSignature(int& above, int& below) override { std::tie(above, below) = signature; }
+    double bpm;
+    std::pair<int, int> signature;
 };
 
 // Mode and depths left and right; decay -6 dB left and -12 dB right, echo gain 0 dB, all wet, output 0 dB.
@@ -42,13 +37,12 @@ void Load(Echo& echo, std::int32_t mode, std::int32_t left, std::int32_t right) 
 
 // Catches a wrong note, curve or unit, and a tap that is late or has the wrong gain.
 TEST(Echo, RepeatsAnImpulseAfterTheDelayOfEveryMode) {
-    struct Case {
+    struct {
         const char* what;
         std::int32_t mode, depth;
         Host host;
         double ms;
-    };
-    const Case cases[] = {
+    } cases[] = {
         {"linear, every word its millisecond", 0, 1009, {}, 1009.0},
         {"log, middle", 1, 5000, {}, 19.0 + std::sqrt(4980.0)},
         {"eighth of a bar's quarter", 2, 6999, {}, 125.0},
@@ -62,7 +56,7 @@ TEST(Echo, RepeatsAnImpulseAfterTheDelayOfEveryMode) {
         {"a word from nowhere is the longest time", 0, INT_MAX, {}, 10000.0},
     };
     const auto format = Format<double>();
-    for (auto c : cases) {
+    for (auto& c : cases) {
         Echo echo;
         echo.SetHostCallback(&c.host);
         Load(echo, c.mode, c.depth, c.depth);
@@ -129,15 +123,14 @@ TEST(Echo, NamesItsNotes) {
 
 // Catches a delay that jumps when the mode does, and the odd rule for choosing the same mode again.
 TEST(Echo, KeepsTheDelayWhenTheModeBecomesATime) {
-    struct Case {
-        const char* what;
-        std::int32_t from, to;
-        std::array<std::int32_t, 2> before, after;  // the words, left and right
-    };
     const auto log = [](double ms) {
         return static_cast<std::int32_t>(1.0 + 1174.6484375 * std::log(ms - 19.0));
     };
-    const Case cases[] = {
+    const struct {
+        const char* what;
+        std::int32_t from, to;
+        std::array<std::int32_t, 2> before, after;  // the words, left and right
+    } cases[] = {
         {"linear to log, beyond its knob", 0, 1, {10000, 300}, {log(10000), log(300)}},
         {"below 20 ms there is no logarithm", 0, 1, {7, 19}, {1, 1}},
         {"log to linear", 1, 0, {0, 10000}, {20, 4999}},
@@ -150,8 +143,6 @@ TEST(Echo, KeepsTheDelayWhenTheModeBecomesATime) {
         Echo echo;
         Load(echo, c.from, c.before[0], c.before[1]);
         for (const int side : {kModeR, kMode}) echo.SetParam(side, static_cast<float>(c.to) / 4.0f, false);
-        std::array<std::int32_t, 7> words;
-        std::memcpy(words.data(), Chunk(echo).data(), sizeof words);
-        EXPECT_EQ((std::array{words[5], words[6]}), c.after) << c.what;
+        EXPECT_EQ((At<std::array<std::int32_t, 2>>(Chunk(echo), 20)), c.after) << c.what;
     }
 }

@@ -58,10 +58,6 @@ private:
 
 using Edits = std::vector<Probe::Record>;
 
-MP_ENVELOPE_SEGMENT Jump(std::int64_t start, float value) {
-    return {start, start, value, value, MP_CURVE_JUMP, 0};
-}
-
 }  // namespace
 
 // Catches a virtual operation that was moved, inserted or dropped: hosts call by number.
@@ -114,7 +110,11 @@ TEST(CorvoEffectBase, RoutesExternalParametersToRealOnes) {
 TEST(CorvoEffectBase, PlaysEnvelopes) {
     Probe probe(2);
     const auto format = TestSupport::Format<float>();
-    const MP_ENVELOPE_SEGMENT segments[] = {Jump(1000, 0.1f), Jump(2000, 0.2f), Jump(3000, 0.3f)};
+    MP_ENVELOPE_SEGMENT segments[3];
+    for (std::int64_t i = 1; i <= 3; ++i) {
+        const float value = 0.1f * static_cast<float>(i);
+        segments[i - 1] = {1000 * i, 1000 * i, value, value, MP_CURVE_JUMP, 0};
+    }
     const auto block = [&](std::int64_t time) {
         float frame[2]{};
         ProcessFlags flags{false, true};
@@ -127,7 +127,7 @@ TEST(CorvoEffectBase, PlaysEnvelopes) {
     EXPECT_EQ(block(5000), std::pair(Edits{}, false)) << "nothing plays before the first cook";
     EXPECT_EQ(block(0), std::pair(Edits({{1, 0.1f, true}}), true)) << "the first segment waits for nothing";
     EXPECT_EQ(block(1999), std::pair(Edits{}, false));
-    EXPECT_EQ(block(3000), std::pair(Edits({{1, 0.2f, true}, {1, 0.3f, true}}), true));
+    EXPECT_EQ(block(3000), std::pair(Edits({{1, 0.2f, true}, {1, 0.1f * 3, true}}), true));
     EXPECT_EQ(block(9000), std::pair(Edits{}, false));
 
     probe.AddEnvelope(1, 2, segments);

@@ -27,16 +27,15 @@ TEST(MemoryFile, ReadsOnlyWhatIsThere) {
     EXPECT_EQ(file.GetLength(), 1005);
     EXPECT_EQ(file.GetPosition(), 1005) << "asking for the length leaves the position";
 
-    struct Case {
-        std::int64_t position, count, expected;
-    } const cases[] = {{1000, 5, 5}, {1003, 5, 2},  {1005, 5, 0},    {2000, 5, 0},   {-1, 5, 0},
-                       {1000, 0, 0}, {1000, -1, 0}, {1004, kFar, 1}, {kFar, kFar, 0}};
-    for (const auto& c : cases) {
+    constexpr std::int64_t kCases[][3] = {{1000, 5, 5},  {1003, 5, 2},    {1005, 5, 0},
+                                          {2000, 5, 0},  {-1, 5, 0},      {1000, 0, 0},
+                                          {1000, -1, 0}, {1004, kFar, 1}, {kFar, kFar, 0}};
+    for (const auto& [position, count, expected] : kCases) {
         char read[8] = "-------";
-        file.Seek(c.position, CMemoryFile::FromStart);
-        EXPECT_EQ(file.Read(read, c.count), c.expected) << c.position << ", " << c.count;
-        EXPECT_EQ(file.GetPosition(), c.position + c.expected);
-        EXPECT_EQ(read[c.expected], '-') << "wrote past what it returned";
+        file.Seek(position, CMemoryFile::FromStart);
+        EXPECT_EQ(file.Read(read, count), expected) << position << ", " << count;
+        EXPECT_EQ(file.GetPosition(), position + expected);
+        EXPECT_EQ(read[expected], '-') << "wrote past what it returned";
     }
     file.Seek(-5, CMemoryFile::FromStart);
     EXPECT_EQ(file.Write(text, 5), 0);
@@ -53,15 +52,13 @@ TEST(MemoryFile, StreamsArraysOfDoubles) {
     EXPECT_EQ(file.GetLength(), 4 + 3 * 8);
     EXPECT_EQ(file.Data()[0], 3) << "little-endian";
     std::vector<double> read;
-    file.Seek(0, CMemoryFile::FromStart);
-    KivFiles::ReadDoubles(file, read);
-    EXPECT_EQ(read, values);
-
-    read.clear();
-    file.SetUnbounded(true);  // such a file does not know its length
-    file.Seek(0, CMemoryFile::FromStart);
-    KivFiles::ReadDoubles(file, read);
-    EXPECT_EQ(read, values);
+    for (const bool unbounded : {false, true}) {
+        read.clear();
+        file.SetUnbounded(unbounded);  // such a file does not know its length
+        file.Seek(0, CMemoryFile::FromStart);
+        KivFiles::ReadDoubles(file, read);
+        EXPECT_EQ(read, values);
+    }
     file.SetUnbounded(false);
     // A count that the bytes cannot hold must neither be believed nor spoil what the caller has.
     for (const std::int32_t count : {4, std::numeric_limits<std::int32_t>::max(), -1}) {

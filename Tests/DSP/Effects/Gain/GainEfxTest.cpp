@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdio>
 
 #include "Support/EffectRun.h"
 
@@ -70,6 +71,17 @@ TEST(GainEfx, ScalesTheFirstChannelOfOtherLayouts) {
     format.wBitsPerSample = 16;
     ProcessBlock(gain, block.data(), 2, format);
     EXPECT_EQ(block, (std::array<float, 6>{5.5f, 2, 3, 22, 5, 6}));
+}
+
+// Catches a typed value that shows its neighbour, because a tenth lies on the edge of what shows it.
+TEST(GainEfx, ATypedTenthShowsItself) {
+    GainEfx gain;
+    for (int tenths = -799; tenths <= 200; ++tenths) {
+        char text[16];
+        std::snprintf(text, sizeof text, "%.1f dB", tenths / 10.0);
+        gain.SetParam(0, gain.GetParamValueNormalizedFromText(0, text), false);
+        EXPECT_EQ(Text(gain, 0), text);
+    }
 }
 
 // Catches controls that stay hidden, or a host that is not told to rebuild them.

@@ -8,23 +8,16 @@
 #include "Support/EffectRun.h"
 
 using Corvo::DSP::Phaser;
+using Settings = Corvo::DSP::PhaserSettings;  // in the order of the chunk
 using namespace TestSupport;
 
 namespace {
 
-enum { kFeedback = 1, kWidth = 5 };
+enum { kFeedback = 1, kWidth = 5, kStages };
 
-// The settings in the order of the chunk.
-struct Settings {
-    float rate, feedback, wet, maximum, minimum, width;
-    std::int32_t stages;
-};
-
-void Load(Phaser& phaser, const Settings& s) {
+void Load(Phaser& phaser, const Settings& settings) {
     std::vector<std::int32_t> words{0};
-    for (const float value : {s.rate, s.feedback, s.wet, s.maximum, s.minimum, s.width})
-        words.push_back(std::bit_cast<std::int32_t>(value));
-    words.push_back(s.stages);
+    for (const auto word : std::bit_cast<std::array<std::int32_t, 7>>(settings)) words.push_back(word);
     LoadWords(phaser, words);
 }
 
@@ -87,4 +80,13 @@ TEST(Phaser, MovesTheRightSweepOnlyWithTheWidth) {
     phaser.SetParam(kWidth, 0.75f, false);
     right.phase = left.phase + 0.75 * 6.283185307179586;
     run("after the width");
+}
+
+// Catches a number that only doubles hold and that floats then play for ever.
+TEST(Phaser, WithoutStagesForgetsWhatIsNoFloat) {
+    Phaser phaser;
+    EXPECT_EQ(Text(phaser, kStages), "0") << "of the default preset";
+    Render(phaser, std::vector<double>(2, 1e300), Format<double>(), {1});
+    const auto floats = Render(phaser, std::vector<float>(8), Format<float>(), {2});
+    EXPECT_EQ(std::vector(floats.begin() + 4, floats.end()), std::vector<float>(4));
 }

@@ -64,12 +64,7 @@ TEST_F(PitchShiftTest, ChangesBackEndsWithoutAllocatingWhileItProcesses) {
     for (int i = 0; i < 20; ++i) {
         Load(3300 + i, 2500, i % 2);
         m_effect.SetParam(0, 0.4f, false);
-        std::string broken;
-        {
-            const AudioThreadRules rules;
-            Process();
-            broken = rules.Broken();
-        }
+        const auto broken = BrokenBy([&] { Process(); });
         const bool locksOnly = broken.ends_with("locks") && broken.find(',') == broken.npos;
         EXPECT_TRUE(i % 2 == 1 ? locksOnly : broken.empty()) << broken << ", round " << i;
     }
@@ -91,12 +86,7 @@ TEST(PitchShift, NewOnlyLocksWhileItProcesses) {
             if (i % 100 == 60) effect.SetParam(0, static_cast<float>(random.Unit()), false);
             Corvo::DSP::ProcessFlags flags;
             const int frames = i % 2 ? 64 : 1 + random.Below(4096);
-            std::string broken;
-            {
-                const AudioThreadRules rules;
-                effect.Process(block.data(), frames, &format, flags);
-                broken = rules.Broken();
-            }
+            const auto broken = BrokenBy([&] { effect.Process(block.data(), frames, &format, flags); });
             ASSERT_TRUE(broken.ends_with("locks") && broken.find(',') == broken.npos)
                 << broken << ", block " << i;
         }

@@ -7,8 +7,7 @@
 #include "Support/EffectRun.h"
 
 using Corvo::DSP::Autovol;
-using TestSupport::Format;
-using TestSupport::Render;
+using namespace TestSupport;
 
 namespace {
 
@@ -43,18 +42,15 @@ TEST(Autovol, MultipliesEachSideByItsOwnSine) {
         const double left = std::pow(10.0, 14.2 / 20.0), gains[] = {c.invert > 0.0f ? -left : left, 1.0};
         const double hertz[] = {6.0, 23.1}, depth = c.depth, mix = c.mix;
         const auto width = static_cast<std::size_t>(channels);
-        const auto input = TestSupport::Noise<Sample>(20000 * width, 1.0);
+        const auto input = Noise<Sample>(20000 * width, 1.0);
         const auto output = Render(tremolo, input, Format<Sample>(channels), {777});
         for (std::size_t i = 0; i < output.size(); ++i) {
             const std::size_t side = i % width;
-            double factor = 1.0;
-            if (side < 2) {
-                const double sine =
-                    std::sin(6.283185307179586 * hertz[side] / 48000.0 * static_cast<double>(i / width + 1));
-                const double swing =
-                    c.preset == kRobot ? mix * sine + 1.0 - mix : (depth * sine + 1.0) / (1.0 + depth);
-                factor = swing * gains[side];
-            }
+            const double turns = hertz[side % 2] / 48000.0 * static_cast<double>(i / width + 1);
+            const double sine = std::sin(2.0 * std::numbers::pi * turns);
+            const double swing =
+                c.preset == kRobot ? mix * sine + 1.0 - mix : (depth * sine + 1.0) / (1.0 + depth);
+            const double factor = side < 2 ? swing * gains[side] : 1.0;
             ASSERT_NEAR(output[i], input[i] * factor, tolerance)
                 << c.what << ", sample " << i << " of " << channels;
         }
@@ -73,7 +69,7 @@ TEST(Autovol, KeepsThePhaseThroughEditsAndDropsItOnPreparation) {
     run(std::vector(2000, 1.0));  // the phase is now a quarter of a cycle
     tremolo.SetParam(kRate, 0.0f, false);
     double still[] = {1.0, 1.0};
-    TestSupport::ProcessBlock(tremolo, still, 2, format);
+    ProcessBlock(tremolo, still, 2, format);
     EXPECT_NEAR(still[0], 1.0, 1e-12) << "stands at the top";
     EXPECT_EQ(still[0], still[1]);
     EXPECT_NEAR(run({1.0, 1.0})[1], 0.5, 1e-12) << "prepared afresh, it stands at the start";

@@ -42,33 +42,33 @@ struct Side {
 // Catches a wrong constant or branch, lanes that take the other side's values, and a mix-up of the factors.
 TEST(TubeDistorsionTest, ShapesLikeThePlainForm) {
     constexpr struct {
-        Side left, right;
+        Side sides[2];
         float oversampling;
         int factor;
     } kCases[] = {
-        {{0.1f, 0.3f, 0}, {0.1f, 0.3f, 0}, 0.0f, 1},   {{0.0f, 0.6f, 1}, {0.0f, 0.9f, 1}, 0.17f, 1},
-        {{0.05f, 0.5f, 2}, {0.2f, 0.1f, 2}, 0.0f, 1},  {{0.0f, 0.2f, 3}, {0.0f, 0.7f, 3}, 0.0f, 1},
-        {{0.0f, 0.3f, 3}, {0.0f, 1.0f, 3}, 0.0f, 1},   {{0.3f, 0.4f, 0}, {0.0f, 0.8f, 2}, 0.0f, 1},
-        {{0.3f, 0.0f, 0}, {0.0f, 0.8f, 1}, 0.0f, 1},   {{0.1f, 0.3f, 0}, {0.0f, 0.6f, 1}, 0.3f, 2},
-        {{0.1f, 0.3f, 1}, {0.1f, 0.3f, 1}, 0.5f, 4},   {{0.1f, 0.5f, 2}, {0.1f, 0.3f, 3}, 0.7f, 8},
-        {{0.1f, 0.5f, 3}, {0.1f, 0.3f, 3}, 0.75f, 12}, {{0.1f, 0.3f, 0}, {0.1f, 0.3f, 0}, 0.8f, 16},
+        {{{0.1f, 0.3f, 0}, {0.1f, 0.3f, 0}}, 0.0f, 1},   {{{0.0f, 0.6f, 1}, {0.0f, 0.9f, 1}}, 0.17f, 1},
+        {{{0.05f, 0.5f, 2}, {0.2f, 0.1f, 2}}, 0.0f, 1},  {{{0.0f, 0.2f, 3}, {0.0f, 0.7f, 3}}, 0.0f, 1},
+        {{{0.0f, 0.3f, 3}, {0.0f, 1.0f, 3}}, 0.0f, 1},   {{{0.3f, 0.4f, 0}, {0.0f, 0.8f, 2}}, 0.0f, 1},
+        {{{0.3f, 0.0f, 0}, {0.0f, 0.8f, 1}}, 0.0f, 1},   {{{0.1f, 0.3f, 0}, {0.0f, 0.6f, 1}}, 0.3f, 2},
+        {{{0.1f, 0.3f, 1}, {0.1f, 0.3f, 1}}, 0.5f, 4},   {{{0.1f, 0.5f, 2}, {0.1f, 0.3f, 3}}, 0.7f, 8},
+        {{{0.1f, 0.5f, 3}, {0.1f, 0.3f, 3}}, 0.75f, 12}, {{{0.1f, 0.3f, 0}, {0.1f, 0.3f, 0}}, 0.8f, 16},
     };
     TubeDistorsion untouched;
     EXPECT_EQ(RenderNoise(untouched), kNoise);
     for (const auto& c : kCases) {
         TubeDistorsion tube;
-        const Side* const sides[] = {&c.left, &c.right};
-        for (int side = 0; side < 2; ++side) {
-            tube.SetParam(kBoost + side, sides[side]->boost, false);
-            tube.SetParam(kDrive + side, sides[side]->drive, false);
-            tube.SetParam(kFunction + side, 0.25f * static_cast<float>(sides[side]->function), false);
+        for (const int side : {0, 1}) {
+            const auto& [boost, drive, function] = c.sides[side];
+            tube.SetParam(kBoost + side, boost, false);
+            tube.SetParam(kDrive + side, drive, false);
+            tube.SetParam(kFunction + side, 0.25f * static_cast<float>(function), false);
         }
         // The left one is kept, and that is all.
         tube.SetParam(kOversampling, 0.6f, false);
         tube.SetParam(kOversampling + 1, c.oversampling, false);
         const auto output = RenderNoise(tube);
         for (std::size_t side = 0; side < 2; ++side) {
-            const auto& [boost, drive, function] = *sides[side];
+            const auto& [boost, drive, function] = c.sides[side];
             const auto actual = Channel(output, side);
             const auto expected = Plain::Tube(Channel(kNoise, side), 10.0 * static_cast<double>(boost) + 1.0,
                                               function, static_cast<double>(drive), c.factor);
