@@ -5,8 +5,10 @@
 #include <cstddef>
 #include <numbers>
 
+#include "DSP/Pitch/ClassicKernel.h"
 #include "Platform/DenormalGuard.h"
 #include "Platform/FiniteSamples.h"
+#include "Platform/Processor.h"
 #include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
@@ -16,24 +18,10 @@ constexpr double kPi = std::numbers::pi;
 constexpr std::size_t kMostFrame = 10000;
 constexpr std::size_t kMostBins = kMostFrame / 2 + 1;
 
-// To the nearest integer for |x| below 2^51; a sum that compilers vectorise on every target.
-double Nearest(double x) {
-    constexpr double kShift = 6755399441055744.0;
-    return x + kShift - kShift;
-}
+enum Change : std::size_t { kSteady, kFell, kRose };
 
-// Cosine to 1e-10, which is far below the float that becomes of it. Without a call, so that the loop around
-// it fills the registers.
-double Cosine(double x) {
-    const double turns = Nearest(x * (1.0 / kPi));
-    const double r = x - turns * kPi, r2 = r * r;
-    const double odd = turns - 2.0 * Nearest(turns * 0.5);  // -1, 0 or 1
-    double sum = -1.0 / 87178291200.0;
-    for (const double term :
-         {1.0 / 479001600.0, -1.0 / 3628800.0, 1.0 / 40320.0, -1.0 / 720.0, 1.0 / 24.0, -0.5})
-        sum = sum * r2 + term;
-    return (1.0 + sum * r2) * (1.0 - 2.0 * odd * odd);
-}
+const ClassicPitch::Kernels& kernels =
+    HasAvx2() ? ClassicPitch::Avx2Kernels() : ClassicPitch::BaselineKernels();
 
 template <typename Table>
 std::size_t Limited(const Table& table, int index) {
@@ -55,9 +43,11 @@ double BinsOff(double phaseChange, double advance, int oversampling) {
 struct PitchAdapterCorvoOld::Channel {
     std::array<float, kMostFrame> input, output;
     std::array<float, 2 * kMostFrame> accumulator;
-    std::array<float, kMostBins> magnitude, frequency, spectrum;
-    std::array<double, kMostBins> phase;   // double: it grows without end, and a float would soon be noise
-    std::array<bool, kMostBins> negative;  // sign of the windowed sample in the last frame
+    std::array<float, kMostBins> magnitude, frequency;
+    std::array<double, kMostBins> phase;  // double: it grows without end, and a float would soon be noise
+    std::array<std::int32_t, kMostBins> last;      // the bits of the last frame's windowed samples
+    std::array<float, kMostBins> strength, moved;  // of the frame's bins before they move
+    std::array<std::int32_t, kMostBins> target;
     int rover;
     float pitch;
 };
@@ -98,9 +88,7 @@ void PitchAdapterCorvoOld::CookFactors() {
     for (std::size_t k = 0; k < m_window.size(); ++k)
         m_window[k] = 0.5 - 0.5 * std::cos(2.0 * kPi * static_cast<double>(k) / m_size);
 
-    // A real value has the phase 0 or pi, so a bin's change of phase is one of four: by the sign now (even or
-    // odd place) and the sign before.
-    constexpr double kChanges[] = {0.0, kPi, -kPi, 0.0};  // [before * 2 + now]
+    constexpr double kChanges[] = {0.0, kPi, -kPi};  // steady, fell, rose
     for (std::size_t change = 0; change < m_frequencies.size(); ++change) {
         auto& table = m_frequencies[change];
         table.resize(static_cast<std::size_t>(m_size / 2) + 1);
@@ -151,35 +139,23 @@ void PitchAdapterCorvoOld::ShiftFrame(Channel& c, float pitch) {
 
     // Analysis, and every bin moved to where the pitch takes it. Amplitudes meet there, the last frequency
     // stays.
+    kernels.analyse({c.input.data(), m_window.data(), m_frequencies[kSteady].data(),
+                     m_frequencies[kFell].data(), m_frequencies[kRose].data(), pitch, c.last.data(),
+                     c.strength.data(), c.moved.data(), c.target.data()},
+                    bins);
     std::fill_n(c.magnitude.begin(), bins, 0.0f);
     std::fill_n(c.frequency.begin(), bins, 0.0f);
     for (std::size_t k = 0; k < bins; ++k) {
-        const auto value = static_cast<float>(c.input[k] * m_window[k]);
-        const bool negative = std::signbit(value);  // of -0 too: its phase is pi
-        const std::size_t change = 2u * c.negative[k] + negative;
-        c.negative[k] = negative;
-        const float target = static_cast<float>(k) * pitch;
-        if (!(target > -1.0f && target < static_cast<float>(bins))) continue;
-        const auto j = static_cast<std::size_t>(static_cast<int>(target));
-        c.magnitude[j] += 2.0f * std::abs(value);
-        c.frequency[j] = m_frequencies[change][k] * pitch;
+        const auto j = static_cast<std::size_t>(c.target[k]);
+        if (j >= bins) break;  // as all that follow
+        c.magnitude[j] += c.strength[k];
+        c.frequency[j] = c.moved[k];
     }
 
-    // Synthesis: each bin's phase goes on by its frequency. Wrapping it keeps the cosine exact for ever.
-    const double binWidth = m_binWidth, expected = m_expectedPhase;
-    const double perBin = 2.0 * kPi, oversampling = m_oversampling;
-    for (std::size_t k = 0; k < bins; ++k) {
-        const auto bin = static_cast<double>(static_cast<int>(k));
-        const double off = (static_cast<double>(c.frequency[k]) - bin * binWidth) / binWidth;
-        const double phase = c.phase[k] + (off * perBin / oversampling + bin * expected);
-        c.phase[k] = phase - 2.0 * kPi * Nearest(phase * (0.5 / kPi));
-        c.spectrum[k] = static_cast<float>(static_cast<double>(c.magnitude[k]) * Cosine(c.phase[k]));
-    }
-
-    const double scale = static_cast<double>(m_size / 2) * m_oversampling;
-    for (std::size_t k = 0; k < bins; ++k)
-        c.accumulator[k] = static_cast<float>(c.accumulator[k] +
-                                              2.0 * m_window[k] * static_cast<double>(c.spectrum[k]) / scale);
+    kernels.synthesise({c.magnitude.data(), c.frequency.data(), m_window.data(), m_binWidth, m_expectedPhase,
+                        static_cast<double>(m_oversampling), static_cast<double>(m_size / 2) * m_oversampling,
+                        c.phase.data(), c.accumulator.data()},
+                       bins);
     std::copy_n(c.accumulator.begin(), step, c.output.begin());
     std::copy(c.accumulator.begin() + step, c.accumulator.begin() + size + step, c.accumulator.begin());
     std::copy(c.input.begin() + step, c.input.begin() + size, c.input.begin());

@@ -39,8 +39,8 @@ private:
     int m_step = 0, m_latency = 0;
     double m_expectedPhase = 0.0, m_binWidth = 0.0;
     std::vector<double> m_window;
-    // Analysis frequency of each bin for the four ways its sign can go from frame to frame; see CookFactors.
-    std::array<std::vector<float>, 4> m_frequencies;
+    // Analysis frequency of each bin for the three ways its sign can go from frame to frame; see CookFactors.
+    std::array<std::vector<float>, 3> m_frequencies;
     std::unique_ptr<std::array<Channel, 2>> m_state;
 };
 

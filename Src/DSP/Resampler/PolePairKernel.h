@@ -1,59 +1,57 @@
 #pragma once
 
-#include <array>
 #include <cstddef>
-#include <xsimd/xsimd.hpp>
 
 #include "DSP/Resampler/PolePairLowPass.h"
 
 namespace PolePairs {
 
-// Two channels at once. Each lane's result is the same whatever the other one holds.
-using Lanes = xsimd::batch<double, xsimd::sse2>;
-static_assert(Lanes::size == PolePairLowPass::kLanes);
-constexpr std::size_t kPairs = PolePairLowPass::kPairs;
-
-inline Lanes Load(const double* twice) { return Lanes::load_aligned(twice); }
-
-// The pole pairs' states after the newest sample.
+// The pole pairs after the newest sample, of two channels.
 struct State {
-    std::array<Lanes, kPairs> value, change;
-
-    static State From(const double (&stored)[2 * kPairs][PolePairLowPass::kLanes]) {
-        State state;
-        for (std::size_t k = 0; k < kPairs; ++k) {
-            state.value[k] = Lanes::load_unaligned(stored[2 * k]);
-            state.change[k] = Lanes::load_unaligned(stored[2 * k + 1]);
-        }
-        return state;
-    }
-    void To(double (&stored)[2 * kPairs][PolePairLowPass::kLanes]) const {
-        for (std::size_t k = 0; k < kPairs; ++k) {
-            value[k].store_unaligned(stored[2 * k]);
-            change[k].store_unaligned(stored[2 * k + 1]);
-        }
-    }
-
-    // Over the zeros behind the last sample to the next one.
-    void Take(const double* advance, Lanes sample) {
-        for (std::size_t k = 0; k < kPairs; ++k, advance += 2 * PolePairLowPass::kLanes) {
-            change[k] =
-                sample + change[k] * Load(advance + PolePairLowPass::kLanes) - value[k] * Load(advance);
-            value[k] += change[k];
-        }
-    }
-
-    // The output at the step that `row` of the phase table stands for, times L. `sample` is the newest.
-    Lanes Output(const double* row, Lanes sample) const {
-        constexpr std::size_t kStep = PolePairLowPass::kLanes;
-        Lanes even = sample * Load(row), odd = value[0] * Load(row + kStep);
-        row += 2 * kStep;
-        for (std::size_t k = 0; k < kPairs; ++k, row += 2 * kStep) {
-            even += change[k] * Load(row);
-            if (k + 1 < kPairs) odd += value[k + 1] * Load(row + kStep);
-        }
-        return even + odd;
-    }
+    static constexpr std::size_t kPairs = PolePairLowPass::kPairs, kLanes = PolePairLowPass::kLanes;
+    alignas(16) double value[kPairs][kLanes]{};
+    double change[kPairs][kLanes]{};
+    double sample[kLanes]{};
 };
 
+// What a run takes and gives, as frames of two channels, and where it stands: how many steps of the raised
+// rate the next output lies behind the newest sample. With `up` or more there is a sample to be taken first.
+struct Stream {
+    const double* in;
+    std::size_t frames;
+    double* out;
+    std::size_t room;
+    std::ptrdiff_t up, down, step;  // in a register on every target
+};
+
+// Runs until either samples or room are used up; what is left stands in `stream`. A channel's results are the
+// same whatever the other one holds.
+using Kernel = void (*)(const PolePairLowPass& filter, State& state, Stream& stream);
+
+// One for every processor, and one for those with AVX2. Both give the same bits.
+void RunBaseline(const PolePairLowPass& filter, State& state, Stream& stream);
+void RunAvx2(const PolePairLowPass& filter, State& state, Stream& stream);
+
+namespace {
+
+// What the kernels have in common. `Pairs` holds the state in registers.
+template <typename Pairs>
+void RunWith(const PolePairLowPass& filter, State& state, Stream& stream) {
+    Pairs pairs(state, filter.advance.data());
+    const double* const phases = filter.phases.data();
+    Stream s = stream;
+    for (;;) {
+        for (; s.step < s.up && s.room > 0; s.step += s.down, s.out += State::kLanes, --s.room)
+            pairs.Output(phases + s.step * static_cast<std::ptrdiff_t>(PolePairLowPass::kRow), s.out);
+        if (s.step < s.up || s.frames == 0) break;
+        s.step -= s.up;
+        pairs.Take(s.in);
+        s.in += State::kLanes;
+        --s.frames;
+    }
+    pairs.To(state);
+    stream = s;
+}
+
+}  // namespace
 }  // namespace PolePairs

@@ -52,7 +52,8 @@ void PutTwice(double* where, Real value) { where[0] = where[1] = static_cast<dou
 PolePairLowPass::PolePairLowPass(int upFactor, double cutoff) {
     const Poles poles = ButterworthPoles(cutoff);
     const auto steps = static_cast<std::size_t>(upFactor);
-    phases.resize(steps * kPhaseStride);
+    phases.resize(steps * kRow);
+    for (std::size_t j = 0; j < steps; ++j) PutTwice(&phases[j * kRow + kLanes], Real(-0.0));
 
     Complex unityAtDc = 1, product = 1;
     Real delay = Real(kOrder) / 2;
@@ -77,13 +78,13 @@ PolePairLowPass::PolePairLowPass(int upFactor, double cutoff) {
             if (other != s) residue /= Distance(s, other);
         Complex over = 1;  // p^L: over all steps between two samples
         for (std::size_t j = 0; j < steps; ++j) over *= pole;
-        PutTwice(&advance[kLanes * 2 * pair], std::norm(Real(1) - over));
-        PutTwice(&advance[kLanes * (2 * pair + 1)], std::norm(over));
+        PutTwice(&advance[ValueAt(pair)], std::norm(Real(1) - over));
+        PutTwice(&advance[ChangeAt(pair)], std::norm(over));
         Complex factor = static_cast<Real>(2 * upFactor) * residue;
         for (std::size_t j = 0; j < steps; ++j, factor *= pole) {
-            double* row = &phases[j * kPhaseStride + kLanes * (1 + 2 * pair)];
-            PutTwice(row, (factor * std::conj(Real(1) - over)).real());
-            PutTwice(row + kLanes, (factor * std::conj(over)).real());
+            double* row = &phases[j * kRow];
+            PutTwice(row + ValueAt(pair), (factor * std::conj(Real(1) - over)).real());
+            PutTwice(row + ChangeAt(pair), (factor * std::conj(over)).real());
         }
         ++pair;
     }

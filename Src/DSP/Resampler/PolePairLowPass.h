@@ -19,11 +19,20 @@ struct PolePairLowPass {
     static constexpr std::size_t kPairs = 5;
     static constexpr std::size_t kLanes = 2;  // every number stands here twice: two channels at once
 
-    // Per step j: L d (at step 0, else 0), then per pair L times the factors of u and c.
-    static constexpr std::size_t kPhaseStride = kLanes * (1 + 2 * kPairs);
+    // A row of factors: of the sample, -0.0, then of the pairs' c and u, those of two pairs side by side and
+    // the last one's alone. So a register holds two pairs, and all of them start at a multiple of its size.
+    static constexpr std::size_t kRow = kLanes * (2 + 2 * kPairs);
+    static constexpr std::size_t ChangeAt(std::size_t pair) {
+        return kLanes * (2 + 4 * (pair / 2) + pair % 2);
+    }
+    static constexpr std::size_t ValueAt(std::size_t pair) {
+        return ChangeAt(pair) + (pair + 1 == kPairs ? 1 : 2) * kLanes;
+    }
+
+    // Per step j a row: L d (at step 0, else 0) and L times the pairs' factors.
     std::vector<double, Corvo::AlignedAllocator<double>> phases;
-    // Per pair |1 - P|^2 and |P|^2.
-    alignas(16) std::array<double, kLanes * 2 * kPairs> advance;
+    // Per pair |P|^2 of c and |1 - P|^2 of u.
+    alignas(16) std::array<double, kRow> advance{};
 
     double groupDelay;
     double gain;

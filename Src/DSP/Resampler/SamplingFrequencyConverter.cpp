@@ -5,19 +5,24 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <new>
 #include <span>
 
 #include "DSP/Resampler/PolePairKernel.h"
 #include "Platform/DenormalGuard.h"
 #include "Platform/FiniteSamples.h"
+#include "Platform/Processor.h"
 
-using PolePairs::Lanes;
 using PolePairs::State;
 
 namespace {
 
 constexpr std::size_t kTaps = SamplingFrequencyConverter::kOrder + 1;  // of a history in use
+
+const PolePairs::Kernel kernel = Corvo::HasAvx2() ? PolePairs::RunAvx2 : PolePairs::RunBaseline;
+
+constexpr double kSilent[State::kLanes]{};
 
 // What a group of one or two channels converts.
 struct Block {
@@ -28,6 +33,24 @@ struct Block {
     CDither<double>* dither;  // null, or of a group's only channel
 };
 
+template <typename Format>
+concept FloatingPoint = requires {
+    typename Format::Value;
+};
+
+// Two samples side by side.
+using Doubles [[gnu::vector_size(16)]] = double;
+template <FloatingPoint Format>
+using Samples [[gnu::vector_size(2 * Format::kBytes)]] = typename Format::Value;
+
+template <typename To, typename From>
+void ConvertPair(const void* from, void* to) {
+    From samples;
+    std::memcpy(&samples, from, sizeof(samples));
+    const auto converted = __builtin_convertvector(samples, To);
+    std::memcpy(to, &converted, sizeof(converted));
+}
+
 // Runs one group through `block`, picking up and leaving behind its state and its read position: how many
 // steps of the raised rate the next output is away from the next input. Groups of one channel leave the
 // second lane silent.
@@ -36,65 +59,82 @@ class GroupRun {
 public:
     GroupRun(const SamplingFrequencyConverter& converter, const State& state, const Block& block,
              std::int64_t toNextOutput)
-        : m_up(converter.up),
-          m_down(converter.down),
-          m_filter(*converter.pairs),
+        : m_filter(*converter.pairs),
           m_state(state),
           m_block(block),
-          m_step(static_cast<std::ptrdiff_t>(toNextOutput)) {}
+          m_up(converter.up),
+          m_down(converter.down),
+          m_step(static_cast<std::ptrdiff_t>(toNextOutput) + converter.up) {}
 
     void Run(int frames) {
-        State state = m_state;
-        Block block = m_block;
-        std::ptrdiff_t step = m_step;
-        const double *const phases = m_filter.phases.data(), *const advance = m_filter.advance.data();
-        for (int i = 0; i < frames; ++i) {
-            m_sample = Read(block);
-            state.Take(advance, m_sample);
-            for (; step < m_up; step += m_down) {
-                Write(state.Output(phases + step * kRow, m_sample), block);
-                ++m_written;
-            }
-            step -= m_up;
+        for (std::size_t left = static_cast<std::size_t>(frames), count; left > 0; left -= count) {
+            count = std::min(left, kPiece);
+            Read(count);
+            PolePairs::Stream stream{m_in, count, m_out, kPiece, m_up, m_down, m_step};
+            do {
+                stream.out = m_out;
+                stream.room = kPiece;
+                kernel(m_filter, m_state, stream);
+                Write(kPiece - stream.room);
+            } while (stream.room == 0);
+            m_step = stream.step;
         }
-        m_state = state;
-        m_block = block;
-        m_step = step;
+    }
+    // What the filter gives at the raised rate from `step` on until the next sample, at most a piece of it.
+    const double* Raised(int step) {
+        PolePairs::Stream stream{nullptr, 0, m_out, kPiece, m_up, 1, step};
+        kernel(m_filter, m_state, stream);
+        return m_out;
     }
 
     const State& Filter() const { return m_state; }
-    Lanes Sample() const { return m_sample; }
     int Written() const { return m_written; }
 
 private:
-    static constexpr std::ptrdiff_t kRow = PolePairLowPass::kPhaseStride;
+    static constexpr std::size_t kLanes = State::kLanes, kPiece = 64;
 
-    static Lanes Read(Block& block) {
-        alignas(16) double samples[2]{};
-        for (int c = 0; c < kChannels; ++c) {
-            samples[c] = In::Read(block.in[c]);
-            block.in[c] += block.inStride;
-        }
-        return Lanes::load_aligned(samples);
+    void Read(std::size_t frames) {
+        Block block = m_block;  // what is written may be anything, as far as the compiler knows
+        double *to = m_in, *const end = m_in + kLanes * frames;
+        if constexpr (FloatingPoint<In> && kChannels == 2)
+            if (block.in[1] == block.in[0] + In::kBytes)
+                for (; to != end; to += kLanes, block.in[0] += block.inStride, block.in[1] += block.inStride)
+                    ConvertPair<Doubles, Samples<In>>(block.in[0], to);
+        for (; to != end; to += kLanes)
+            for (int c = 0; c < kChannels; ++c) {
+                to[c] = In::Read(block.in[c]);
+                block.in[c] += block.inStride;
+            }
+        m_block = block;
     }
-    static void Write(Lanes values, Block& block) {
-        alignas(16) double samples[2];
-        values.store_aligned(samples);
-        if constexpr (kChannels == 1)
-            if (block.dither) samples[0] = ApplyDither(*block.dither, samples[0]);
-        for (int c = 0; c < kChannels; ++c) {
-            Out::Write(samples[c], block.out[c]);
-            block.out[c] += block.outStride;
+    void Write(std::size_t frames) {
+        Block block = m_block;
+        const double *from = m_out, *const end = m_out + kLanes * frames;
+        if constexpr (FloatingPoint<Out> && kChannels == 2)
+            if (block.out[1] == block.out[0] + Out::kBytes)
+                for (; from != end;
+                     from += kLanes, block.out[0] += block.outStride, block.out[1] += block.outStride)
+                    ConvertPair<Samples<Out>, Doubles>(from, block.out[0]);
+        for (; from != end; from += kLanes) {
+            double values[] = {from[0], from[1]};
+            if constexpr (kChannels == 1)
+                if (block.dither) values[0] = ApplyDither(*block.dither, values[0]);
+            for (int c = 0; c < kChannels; ++c) {
+                Out::Write(values[c], block.out[c]);
+                block.out[c] += block.outStride;
+            }
         }
+        m_block = block;
+        m_written += static_cast<int>(frames);
     }
 
-    const std::ptrdiff_t m_up, m_down;
     const PolePairLowPass& m_filter;
     State m_state;
     Block m_block;
+    const std::ptrdiff_t m_up, m_down;
     std::ptrdiff_t m_step;
-    Lanes m_sample = Lanes(0.0);
     int m_written = 0;
+    alignas(16) double m_in[kLanes * kPiece]{}, m_out[kLanes * kPiece];
 };
 
 // The newest values of a stream at the raised rate, at most as many as a history holds.
@@ -102,14 +142,14 @@ struct Newest {
     std::size_t count = 0;
     std::array<std::array<double, 2>, kTaps> input, output;  // output: L times the filter's
 
-    void Add(Lanes in, Lanes out) {
+    void Add(const double* in, const double* out) {
         if (count == kTaps) {
             std::shift_left(input.begin(), input.end(), 1);
             std::shift_left(output.begin(), output.end(), 1);
             --count;
         }
-        in.store_unaligned(input[count].data());
-        out.store_unaligned(output[count].data());
+        std::copy_n(in, 2, input[count].data());
+        std::copy_n(out, 2, output[count].data());
         ++count;
     }
 };
@@ -143,27 +183,29 @@ int ConvertGroup(SamplingFrequencyConverter& c, int firstChannel, const Block& b
             for (auto& value : stored) value[firstLane + lane] = 0.0;
     }
     // A single channel may be stored in either lane; it is computed in the first.
-    double lanes[SamplingFrequencyConverter::kOrder][2]{};
-    for (std::size_t k = 0; k < std::size(lanes); ++k)
-        std::copy_n(stored[k] + firstLane, kChannels, lanes[k]);
+    State state;
+    for (std::size_t k = 0; k < State::kPairs; ++k) {
+        std::copy_n(stored[2 * k] + firstLane, kChannels, state.value[k]);
+        std::copy_n(stored[2 * k + 1] + firstLane, kChannels, state.change[k]);
+    }
 
-    GroupRun<In, Out, kChannels> run(c, State::From(lanes), block, toNextOutput);
+    GroupRun<In, Out, kChannels> run(c, state, block, toNextOutput);
     const int taps = static_cast<int>(kTaps);
     const int recorded = std::min(block.frames, (taps + c.up - 1) / c.up);
     run.Run(block.frames - recorded);
     Newest newest;
     for (int i = 0; i < recorded; ++i) {
         run.Run(1);
-        for (int step = std::max(0, c.up - taps); step < c.up; ++step) {
-            const double* row =
-                &c.pairs->phases[static_cast<std::size_t>(step) * PolePairLowPass::kPhaseStride];
-            newest.Add(step == 0 ? run.Sample() : Lanes(0.0), run.Filter().Output(row, run.Sample()));
-        }
+        const int first = std::max(0, c.up - taps);
+        const double* output = run.Raised(first);
+        for (int step = first; step < c.up; ++step, output += State::kLanes)
+            newest.Add(step == 0 ? run.Filter().sample : kSilent, output);
     }
 
-    run.Filter().To(lanes);
-    for (std::size_t k = 0; k < std::size(lanes); ++k)
-        std::copy_n(lanes[k], kChannels, stored[k] + firstLane);
+    for (std::size_t k = 0; k < State::kPairs; ++k) {
+        std::copy_n(run.Filter().value[k], kChannels, stored[2 * k] + firstLane);
+        std::copy_n(run.Filter().change[k], kChannels, stored[2 * k + 1] + firstLane);
+    }
     for (std::size_t lane = 0; lane < kChannels; ++lane) {
         const int channel = firstChannel + static_cast<int>(lane);
         Append(c.inputHistory[channel], newest.input, newest.count, lane, 1.0 / c.lowPass.gain);

@@ -7,6 +7,7 @@
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "DSP/Effects/Parameters/ParameterText.h"
 #include "DSP/Parts/SampleDispatch.h"
+#include "Platform/Processor.h"
 #include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP::GainEfx {
@@ -20,6 +21,11 @@ constexpr double kPanMakeUp = 1.4125375446227544;
 
 constexpr PlainRange kGainRange{0.0001f, 10.0f, 1.0f}, kWidthRange{0.0f, 2.0f, 1.0f},
     kPanRange{-1.0f, 1.0f, 0.0f}, kFlipRange{0.0f, 1.0f, 0.0f};
+
+template <typename Sample>
+const Kernels<Sample>& BestKernels() {
+    return HasAvx2() ? Avx2Kernels<Sample>() : BaselineKernels<Sample>();
+}
 
 // Linear over the range; what lies beyond the knob's ends is stored as it comes.
 template <const PlainRange& kRange>
@@ -206,7 +212,7 @@ void GainEfx::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* f
         const Coefficients<Sample> c{m_coef_side, m_coef_mid, m_gain_left, m_gain_right};
         const int channels = format->nChannels;
         if (channels == 2)
-            ScaleStereo(samples, frames, c);
+            BestKernels<Sample>().interleaved(samples, frames, c);
         else if (channels > 0)
             for (int i = 0; i < frames; ++i) samples[static_cast<std::ptrdiff_t>(i) * channels] *= c.left;
     });
@@ -220,7 +226,7 @@ void GainEfx::ProcessInternalNoninterleaved(double* const* channels, int frames,
     WithChannels(channels, *format, OtherWidths::Skip, [&]<typename Sample>(Sample* const* buffers) {
         const Coefficients<Sample> c{m_coef_side, m_coef_mid, m_gain_left, m_gain_right};
         if (format->nChannels == 2)
-            ScaleStereoPlanar(buffers[0], buffers[1], frames, c);
+            BestKernels<Sample>().planar(buffers[0], buffers[1], frames, c);
         else if (format->nChannels > 0)
             for (Sample* sample = buffers[0]; sample != buffers[0] + frames; ++sample) *sample *= c.left;
     });

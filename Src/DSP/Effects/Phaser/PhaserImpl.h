@@ -20,6 +20,7 @@ struct PhaserImpl {
     int stages = 0;
     std::array<double, kMaxStages> memories{};
     double last = 0.0;  // the chain's last output
+    int uncertain = 0;  // how many pieces more are rounded the slow way
 
     void Clear() {
         memories.fill(0.0);

@@ -1,0 +1,72 @@
+#pragma once
+
+#include "DSP/Pitch/ClassicKernel.h"
+
+// Loops that the compiler makes vectors of. Included by one source file per instruction set, which is
+// compiled for it; everything is local to that file, so that no copy is shared between instruction sets.
+namespace Corvo::DSP::ClassicPitch {
+
+namespace {
+
+constexpr double kPi = 3.141592653589793;
+
+// To the nearest integer for |x| below 2^51.
+inline double Nearest(double x) {
+    constexpr double kShift = 6755399441055744.0;
+    return x + kShift - kShift;
+}
+
+// Cosine to 1e-10, which is far below the float that becomes of it. Without a call, so that the loop around
+// it fills the registers.
+inline double Cosine(double x) {
+    const double turns = Nearest(x * (1.0 / kPi));
+    const double r = x - turns * kPi, r2 = r * r;
+    const double odd = turns - 2.0 * Nearest(turns * 0.5);  // -1, 0 or 1
+    constexpr double kTerms[] = {1.0 / 479001600.0, -1.0 / 3628800.0, 1.0 / 40320.0,
+                                 -1.0 / 720.0,      1.0 / 24.0,       -0.5};
+    double sum = -1.0 / 87178291200.0;
+    for (const double term : kTerms) sum = sum * r2 + term;
+    return (1.0 + sum * r2) * (1.0 - 2.0 * odd * odd);
+}
+
+void Analyse(const Analysis& a, std::size_t bins) {
+    const auto count = static_cast<std::int32_t>(bins);
+    const float pitch = a.pitch;
+    for (std::int32_t k = 0; k < count; ++k) {
+        const auto value = static_cast<float>(static_cast<double>(a.input[k]) * a.window[k]);
+        const auto bits = __builtin_bit_cast(std::int32_t, value);  // the sign of -0 counts too
+        const bool changed = (bits ^ a.last[k]) < 0;
+        const float same = a.steady[k], down = a.fell[k], up = a.rose[k];
+        const float moved = bits < 0 ? down : up;
+        a.last[k] = bits;
+        a.frequency[k] = (changed ? moved : same) * pitch;
+    }
+    // A loop of its own: with too many arrays to tell apart the compiler makes no vectors.
+    const auto beyond = static_cast<float>(count);
+    for (std::int32_t k = 0; k < count; ++k) {
+        a.strength[k] = 2.0f * __builtin_fabsf(__builtin_bit_cast(float, a.last[k]));
+        const float place = static_cast<float>(k) * pitch;
+        a.target[k] = static_cast<std::int32_t>(place > -1.0f && place < beyond ? place : beyond);
+    }
+}
+
+void Synthesise(const Synthesis& s, std::size_t bins) {
+    const double binWidth = s.binWidth, expected = s.expectedPhase, oversampling = s.oversampling,
+                 scale = s.scale;
+    const auto count = static_cast<std::int32_t>(bins);
+    for (std::int32_t k = 0; k < count; ++k) {
+        const auto bin = static_cast<double>(k);
+        const double off = (static_cast<double>(s.frequency[k]) - bin * binWidth) / binWidth;
+        const double sum = s.phase[k] + (off * (2.0 * kPi) / oversampling + bin * expected);
+        const double phase = sum - 2.0 * kPi * Nearest(sum * (0.5 / kPi));
+        s.phase[k] = phase;
+        const auto value = static_cast<float>(static_cast<double>(s.magnitude[k]) * Cosine(phase));
+        s.accumulator[k] = static_cast<float>(static_cast<double>(s.accumulator[k]) +
+                                              2.0 * s.window[k] * static_cast<double>(value) / scale);
+    }
+}
+
+constexpr Kernels kKernels{Analyse, Synthesise};
+
+}  // namespace
+}  // namespace Corvo::DSP::ClassicPitch
