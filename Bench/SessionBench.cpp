@@ -29,7 +29,7 @@ namespace {
 
 constexpr int kRate = 48000, kMostFrames = 512, kChannels = 2, kBands = 4;
 using Planes = std::array<float*, kChannels>;
-constexpr int kSoundFrames = 8192, kWarmUpFrames = 2 * kRate;
+constexpr int kSoundFrames = 2048, kWarmUpFrames = 2 * kRate;
 
 // What a track is set to.
 struct Settings {
