@@ -84,7 +84,7 @@ bool Chorus::MakeRing() {
     if (m_ring && wanted <= m_capacity) return true;
     std::unique_ptr<float[]> grown(new (std::nothrow) float[static_cast<std::size_t>(wanted)]);
     if (!grown) return m_ring != nullptr;
-    if (m_ring) std::copy_n(m_ring.get(), m_sides->front().written, grown.get());
+    if (m_ring) std::copy_n(m_ring.get(), m_sides->front().touched, grown.get());
     m_ring = std::move(grown);
     m_capacity = wanted;
     return true;
@@ -111,10 +111,10 @@ bool Chorus::InitState(const Props& settings, bool reset) {
     }
     m_ring_length = frames * channels;
     // What was never used is silent.
-    int& written = m_sides->front().written;
-    const int used = std::max(written, m_ring_length + channels);
-    std::fill(m_ring.get() + written, m_ring.get() + used, 0.0f);
-    written = used;
+    int& touched = m_sides->front().touched;
+    const int used = std::max(touched, m_ring_length + channels);
+    std::fill(m_ring.get() + touched, m_ring.get() + used, 0.0f);
+    touched = used;
     m_longest_gap = 0.0;
     for (const auto& side : *m_sides)
         if (side.channel < channels)
@@ -129,12 +129,12 @@ bool Chorus::InitState(const Props& settings, bool reset) {
 }
 
 void Chorus::InitResetProcessingLight(bool) {
-    if (m_ring) std::fill_n(m_ring.get(), m_sides->front().written, 0.0f);
+    if (m_ring) std::fill_n(m_ring.get(), m_sides->front().touched, 0.0f);
 }
 
 void Chorus::Cleanup() {
     m_ring.reset();
-    m_capacity = m_ring_length = m_sides->front().written = 0;
+    m_capacity = m_ring_length = m_sides->front().touched = 0;
     MarkStale();
 }
 

@@ -25,7 +25,7 @@ struct Side {
     int channel = 0;    // and index of its first sample in the ring
     int write = 0;      // index of the sample written next
     // Samples of the ring, from its first one on, that hold something; kept by the first side.
-    int written = 0;
+    int touched = 0;
 
     // One channel of a block.
     template <typename Sample>
