@@ -1,15 +1,20 @@
 #pragma once
 
 #include <algorithm>
+#include <array>
 
 namespace Corvo::DSP {
 
-// A delay line read and written in pieces of up to kPiece samples that are contiguous wherever they start:
+// A delay line read and written in pieces of up to Piece samples that are contiguous wherever they start:
 // behind the end of the ring its first samples are repeated. A piece may not be longer than the ring.
-template <typename T>
+//
+// It takes memory as it comes, and clearing it writes nothing: until the ring has been filled once, what was
+// never written counts as 0. So a long line costs nothing before it is used, and a page of it is touched when
+// the sound gets there.
+template <typename T, int Piece = 64>
 class PieceRing {
 public:
-    static constexpr int kPiece = 64;
+    static constexpr int kPiece = Piece;
 
     // Cells that a ring of `length` needs.
     static constexpr int Cells(int length) { return length + kPiece; }
@@ -24,28 +29,49 @@ public:
         Clear();
     }
     void Clear() {
-        std::fill_n(m_cells, Cells(m_length), T(0));
         m_position = 0;
+        m_full = false;
     }
 
-    // The oldest samples; writing them and advancing makes them the newest.
-    T* Here() { return m_cells + m_position; }
+    // The `count` oldest samples; writing them and advancing makes them the newest.
+    T* Here(int count) {
+        T* const here = m_cells + m_position;
+        if (!m_full) std::fill_n(here, std::min(count, m_length - m_position), T(0));
+        return here;
+    }
     void Advance(int count) {
         const int end = m_position + count;
         if (end > m_length) std::copy(m_cells + m_length, m_cells + end, m_cells);
         if (m_position < kPiece)
             std::copy(m_cells + m_position, m_cells + std::min(end, kPiece), m_cells + m_length + m_position);
+        m_full = m_full || end >= m_length;
         m_position = end >= m_length ? end - m_length : end;
     }
-    // From the sample that was written `delay` samples ago, 1..length.
-    const T* Before(int delay) const {
-        const int at = m_position - delay;
-        return m_cells + (at < 0 ? at + m_length : at);
+
+    // For a line that is only written here and read elsewhere.
+    void Push(const T* samples, int count) {
+        // A piece may begin before the first sample.
+        if (!m_full && m_position == 0) std::fill_n(m_cells + m_length - kPiece, kPiece, T(0));
+        std::copy_n(samples, count, m_cells + m_position);
+        Advance(count);
+    }
+    // `count` samples that were pushed one after the other, the first of them `delay` ago, 1..length. The
+    // ring is at least a piece long.
+    const T* Before(int delay, int count) const {
+        static constexpr std::array<T, kPiece> kNothing{};
+        if (!m_full && delay - count >= m_position) return kNothing.data();
+        return At(-delay);
+    }
+    // The place of a sample `offset` after the oldest one, in either direction and less than a length away.
+    const T* At(int offset) const {
+        const int at = m_position + offset;
+        return m_cells + (at < 0 ? at + m_length : at >= m_length ? at - m_length : at);
     }
 
 private:
     T* m_cells = nullptr;
     int m_length = -1, m_position = 0;
+    bool m_full = false;
 };
 
 }  // namespace Corvo::DSP

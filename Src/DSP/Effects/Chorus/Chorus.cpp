@@ -62,7 +62,7 @@ constexpr double kLongestSeconds = 10.0;
 Chorus::Chorus()
     : CorvoEffect(Table(), &m_settings),
       m_sides(std::make_unique<Sides>()),
-      m_ring(std::make_unique<float[]>(kFirstCapacity)),
+      m_ring(std::make_unique_for_overwrite<float[]>(kFirstCapacity)),
       m_capacity(kFirstCapacity) {
     for (int channel : {0, 1}) (*m_sides)[static_cast<std::size_t>(channel)].channel = channel;
     SetPreset(0);
@@ -82,9 +82,9 @@ bool Chorus::MakeRing() {
     const double hz = std::min(static_cast<double>(m_format.nSamplesPerSec), kFastestHz);
     const int wanted = Channels() * (static_cast<int>(hz * kLongestSeconds) + 1);
     if (m_ring && wanted <= m_capacity) return true;
-    std::unique_ptr<float[]> grown(new (std::nothrow) float[static_cast<std::size_t>(wanted)]());
+    std::unique_ptr<float[]> grown(new (std::nothrow) float[static_cast<std::size_t>(wanted)]);
     if (!grown) return m_ring != nullptr;
-    if (m_ring) std::copy_n(m_ring.get(), m_capacity, grown.get());
+    if (m_ring) std::copy_n(m_ring.get(), m_sides->front().touched, grown.get());
     m_ring = std::move(grown);
     m_capacity = wanted;
     return true;
@@ -110,6 +110,11 @@ bool Chorus::InitState(const Props& settings, bool reset) {
         if (side.channel < channels) frames = std::max(frames, side.base + 2 * side.amplitude);
     }
     m_ring_length = frames * channels;
+    // What was never used is silent.
+    int& touched = m_sides->front().touched;
+    const int used = std::max(touched, m_ring_length + channels);
+    std::fill(m_ring.get() + touched, m_ring.get() + used, 0.0f);
+    touched = used;
     m_longest_gap = 0.0;
     for (const auto& side : *m_sides)
         if (side.channel < channels)
@@ -124,12 +129,12 @@ bool Chorus::InitState(const Props& settings, bool reset) {
 }
 
 void Chorus::InitResetProcessingLight(bool) {
-    if (m_ring) std::fill_n(m_ring.get(), m_capacity, 0.0f);
+    if (m_ring) std::fill_n(m_ring.get(), m_sides->front().touched, 0.0f);
 }
 
 void Chorus::Cleanup() {
     m_ring.reset();
-    m_capacity = m_ring_length = 0;
+    m_capacity = m_ring_length = m_sides->front().touched = 0;
     MarkStale();
 }
 

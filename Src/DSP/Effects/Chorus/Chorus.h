@@ -36,9 +36,10 @@ struct Side;
 // The delay lines hold floats, of what is beyond them the largest. Channels after the second pass unchanged,
 // and so does everything when there was no memory for the ring. No latency.
 //
-// Memory: InitProcessing makes a ring for 10 s. Settings from a chunk beyond that, or beyond the ring when
-// the format changed without InitProcessing, are limited to what the ring holds. The ring keeps its contents
-// through edits and preparation.
+// Memory: InitProcessing makes a ring for 10 s and touches what the settings use of it; the block after an
+// edit touches what that adds. Settings from a chunk beyond that, or beyond the ring when the format changed
+// without InitProcessing, are limited to what the ring holds. The ring keeps its contents through edits and
+// preparation.
 //
 // Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API Chorus : public CorvoEffect {

@@ -24,6 +24,8 @@ struct Side {
     int base = 0;       // the read position trails the written one by `base` at the sweep's lower end
     int channel = 0;    // and index of its first sample in the ring
     int write = 0;      // index of the sample written next
+    // Samples of the ring, from its first one on, that hold something; kept by the first side.
+    int touched = 0;
 
     // One channel of a block.
     template <typename Sample>

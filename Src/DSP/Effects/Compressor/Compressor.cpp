@@ -171,8 +171,8 @@ AnyWord& WordOf(Compressor::Parameters& parameters, const ParameterRow& row) {
 Compressor::Compressor()
     : CorvoEffect(Table(), nullptr),
       m_ui(std::make_unique<UserInterfaceSide>()),
-      m_audio(std::make_unique<AudioSide>()),
-      m_hand_over(std::make_unique<HandOver>()) {
+      m_audio(std::make_unique_for_overwrite<AudioSide>()),
+      m_hand_over(std::make_unique_for_overwrite<HandOver>()) {
     m_audio->current.settings = GetPresetData(kDefaultPreset);
     SetPreset(kDefaultPreset);
 }
@@ -375,8 +375,8 @@ void Compressor::ApplyEnvelopeToUi() {
     const std::lock_guard lock(m_ui->section);
     // Curves that derive from settings submitted before the last ones are out of date.
     const auto* changed = m_hand_over->toUserInterface.Take();
-    if (changed && changed->submission == m_ui->edited.submission)
-        m_ui->edited.settings.map = changed->settings.map;
+    if (changed && changed->value.submission == m_ui->edited.submission)
+        m_ui->edited.settings.map = changed->value.settings.map;
 }
 
 }  // namespace Corvo::DSP

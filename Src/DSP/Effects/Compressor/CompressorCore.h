@@ -34,9 +34,9 @@ struct LaneSegments {
     Lanes Gather(const GlidingMap& map, Pick&& pick) const {
         return {pick(map.m_comp_map[channel[0]], segment[0]), pick(map.m_comp_map[channel[1]], segment[1])};
     }
-    Lanes Gather(const GlidingMap& map, GlidingCurve::Values GlidingCurve::*values, int next) const {
+    Lanes Gather(const GlidingMap& map, double GlidingCurve::Point::*value, int next) const {
         return Gather(map, [&](const GlidingCurve& curve, int i) {
-            return (curve.*values)[static_cast<std::size_t>(i + next)];
+            return curve.points[static_cast<std::size_t>(i + next)].*value;
         });
     }
     // Nothing in the last segment, infinity elsewhere: the upper end to which an envelope stays inside.
@@ -56,9 +56,9 @@ public:
     explicit ParameterGetter(const GlidingMap& map) : m_map(&map) {}
 
     Segment Enter(const LaneSegments& at) const {
-        return {at.Gather(*m_map, &GlidingCurve::x, 0), at.Gather(*m_map, &GlidingCurve::y, 0),
-                at.Gather(*m_map, &GlidingCurve::slope, 0),
-                xsimd::max(at.Gather(*m_map, &GlidingCurve::x, 1), at.OpenEnd(*m_map))};
+        return {at.Gather(*m_map, &GlidingCurve::Point::x, 0), at.Gather(*m_map, &GlidingCurve::Point::y, 0),
+                at.Gather(*m_map, &GlidingCurve::Point::slope, 0),
+                xsimd::max(at.Gather(*m_map, &GlidingCurve::Point::x, 1), at.OpenEnd(*m_map))};
     }
     void Advance() {}
     double X(std::size_t channel, int i) const { return m_map->m_comp_map[channel].X(i, 0.0); }
@@ -85,12 +85,12 @@ public:
 
     Segment Enter(const LaneSegments& at) const {
         const auto x = [&](int next) {
-            return Moving{at.Gather(*m_map, &GlidingCurve::x, next),
-                          at.Gather(*m_map, &GlidingCurve::offsetX, next)};
+            return Moving{at.Gather(*m_map, &GlidingCurve::Point::x, next),
+                          at.Gather(*m_map, &GlidingCurve::Point::offsetX, next)};
         };
         const auto y = [&](int next) {
-            return Moving{at.Gather(*m_map, &GlidingCurve::y, next),
-                          at.Gather(*m_map, &GlidingCurve::offsetY, next)};
+            return Moving{at.Gather(*m_map, &GlidingCurve::Point::y, next),
+                          at.Gather(*m_map, &GlidingCurve::Point::offsetY, next)};
         };
         return {x(0), y(0), x(1), y(1), at.OpenEnd(*m_map)};
     }

@@ -132,11 +132,11 @@ bool GlidingMap::SetOutFor(const CompMapStereo& wanted, double smoothing) {
 
 void GlidingMap::MoveTargets(GlidingCurve& curve, const TransferCurve& target) {
     for (std::size_t i = 0; i < m_heard.count; ++i) {
-        const Spot spot = SpotAt(target, curve.place[i]);
-        curve.x[i] = spot.x;
-        curve.y[i] = spot.y;
-        curve.offsetX[i] = m_heard.x[i] - spot.x;
-        curve.offsetY[i] = m_heard.y[i] - spot.y;
+        const Spot spot = SpotAt(target, curve.points[i].place);
+        curve.points[i].x = spot.x;
+        curve.points[i].y = spot.y;
+        curve.points[i].offsetX = m_heard.x[i] - spot.x;
+        curve.points[i].offsetY = m_heard.y[i] - spot.y;
     }
 }
 
@@ -150,11 +150,11 @@ void GlidingMap::MergePoints(GlidingCurve& curve, const TransferCurve& target) {
         const double nextWanted = wanted < count ? target.points[wanted].x : kBeyond;
         const double nextHeard = heard < m_heard.count ? m_heard.x[heard] : kBeyond;
         const double x = std::min(nextWanted, nextHeard);
-        curve.x[merged] = x;
-        curve.place[merged] = PlaceOf(x, target, wanted);
-        curve.y[merged] = SpotAt(target, curve.place[merged]).y;
-        curve.offsetX[merged] = 0.0;
-        curve.offsetY[merged] = m_heard.LevelAt(x, heard) - curve.y[merged];
+        curve.points[merged].x = x;
+        curve.points[merged].place = PlaceOf(x, target, wanted);
+        curve.points[merged].y = SpotAt(target, curve.points[merged].place).y;
+        curve.points[merged].offsetX = 0.0;
+        curve.points[merged].offsetY = m_heard.LevelAt(x, heard) - curve.points[merged].y;
         wanted += x == nextWanted;
         heard += x == nextHeard;
     }
@@ -169,15 +169,16 @@ void GlidingMap::Arrive() {
         curve.count = m_target[channel].count;
         std::size_t i = 0;
         for (const auto& point : m_target[channel]) {
-            curve.x[i] = point.x;
-            curve.y[i] = point.y;
-            curve.offsetX[i] = curve.offsetY[i] = 0.0;
-            curve.place[i] = static_cast<double>(i);
+            curve.points[i].x = point.x;
+            curve.points[i].y = point.y;
+            curve.points[i].offsetX = curve.points[i].offsetY = 0.0;
+            curve.points[i].place = static_cast<double>(i);
             ++i;
         }
         for (std::size_t next = 1; next < i; ++next) {
-            const double width = curve.x[next] - curve.x[next - 1];
-            curve.slope[next - 1] = width > 0.0 ? (curve.y[next] - curve.y[next - 1]) / width : 1.0;
+            const double width = curve.points[next].x - curve.points[next - 1].x;
+            curve.points[next - 1].slope =
+                width > 0.0 ? (curve.points[next].y - curve.points[next - 1].y) / width : 1.0;
         }
     }
 }

@@ -10,30 +10,35 @@ namespace Corvo::DSP::CompressorPrivate {
 // A curve on the audio thread: where its points are going, and how far each was from there when it set out.
 // All glide alike, so one factor that shrinks every frame tells where they are: target + factor * offset.
 // On the way there may be points that the target does not have: corners of what was heard before.
+//
+// Only the points counted are ever written: most curves need a hundredth of the room, and the rest of the
+// memory is not touched.
 struct GlidingCurve {
+    struct Point {
+        double x, y, offsetX, offsetY;
+        double place;  // on the target: the number of its point, and how far on to the next one
+        double slope;  // of the segment that begins here, once the points stand
+    };
     // Room for the points of what is heard and of a new target.
     static constexpr std::size_t kRoom = 2 * TransferCurve::kMaxPoints;
-    using Values = std::array<double, kRoom>;
-    Values x{}, y{}, offsetX{}, offsetY{};
-    Values place{};  // on the target: the number of its point, and how far on to the next one
-    Values slope{};  // of the segments, once the points stand
+    std::array<Point, kRoom> points;
     int count = 0;
 
-    double X(int i, double factor) const { return Value(x, offsetX, i, factor); }
-    double Y(int i, double factor) const { return Value(y, offsetY, i, factor); }
+    double X(int i, double factor) const {
+        const Point& point = points[static_cast<std::size_t>(i)];
+        return point.x + factor * point.offsetX;
+    }
+    double Y(int i, double factor) const {
+        const Point& point = points[static_cast<std::size_t>(i)];
+        return point.y + factor * point.offsetY;
+    }
     // The segment that holds an input level, the points being where `factor` says.
     int SegmentAt(double level, double factor) const;
-
-private:
-    static double Value(const Values& target, const Values& offset, int i, double factor) {
-        const auto at = static_cast<std::size_t>(i);
-        return target[at] + factor * offset[at];
-    }
 };
 
 // A curve as it is heard at one moment.
 struct HeardCurve {
-    GlidingCurve::Values x{}, y{};
+    std::array<double, GlidingCurve::kRoom> x, y;
     std::size_t count = 0;
 
     void Add(double level, double output);

@@ -22,7 +22,7 @@ constexpr double kMostMakeUp = 100.0;   // +40 dB
 void Compressor::TakeUiSettings() {
     const auto* newest = m_hand_over->toAudio.Take();
     if (!newest) return;
-    m_audio->current = *newest;
+    m_audio->current = newest->value;
 }
 
 void Compressor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {

@@ -4,6 +4,7 @@
 #include <atomic>
 #include <cmath>
 #include <cstdint>
+#include <memory>
 
 #include "DSP/Effects/Compressor/Compressor.h"
 #include "DSP/Effects/Compressor/CompressorCore.h"
@@ -58,9 +59,19 @@ struct AudioSide {
     }
 };
 
+// Settings on their way, which are handed over whole; until then the memory is not touched.
+union SettingsSlot {
+    SettingsSlot() {}
+    SettingsSlot& operator=(const NumberedSettings& settings) {
+        std::construct_at(&value, settings);
+        return *this;
+    }
+    NumberedSettings value;
+};
+
 // The ways across, and the single values that both sides see.
 struct HandOver {
-    LatestValue<NumberedSettings> toAudio, toUserInterface;
+    LatestValue<SettingsSlot> toAudio, toUserInterface;
     std::atomic<bool> meterOn{false}, usingSideChain{false};
     std::array<std::atomic<float>, 2> displayGain{1.0f, 1.0f};
 };

@@ -179,8 +179,7 @@ std::array<int, 2> Echo::PassFrames() const {
 bool Echo::LayRing(std::array<int, 2> lengths, bool reset) {
     const int used = std::max(lengths[0], lengths[1]), sides = Sides();
     if (!m_ring || reset || used != std::max(m_lengths[0], m_lengths[1])) {
-        // At first and on reset the memory of every edit to come is made and touched. One more for an odd
-        // length.
+        // At first and on reset the memory of every edit to come is made. One more for an odd length.
         const double hz = std::min(static_cast<double>(m_format.nSamplesPerSec), kFastestHz);
         const bool whole = reset || !m_ring;
         const int wanted = 1 + (whole ? std::max(used, static_cast<int>(kLongestTimeMs * 0.001 * hz)) : used);
@@ -190,10 +189,8 @@ bool Echo::LayRing(std::array<int, 2> lengths, bool reset) {
             m_ring = std::move(grown);
             m_capacity = wanted;
         }
-        std::fill_n(m_ring.get(), wanted, 0.0f);
-        m_delay->lines[0].ring = m_ring.get();
-        m_delay->lines[1].ring = m_ring.get() + (sides == 2 ? (used + 1) / 2 : 0);
-        m_delay->lines[0].position = m_delay->lines[1].position = 0;
+        m_delay->lines[0] = {.ring = m_ring.get()};
+        m_delay->lines[1] = {.ring = m_ring.get() + (sides == 2 ? (used + 1) / 2 : 0)};
     }
     m_lengths = lengths;
     m_delay->lines[0].length = (lengths[0] + sides - 1) / sides;
@@ -202,7 +199,8 @@ bool Echo::LayRing(std::array<int, 2> lengths, bool reset) {
 }
 
 void Echo::InitResetProcessingLight(bool) {
-    if (m_ring) std::fill_n(m_ring.get(), m_capacity, 0.0f);
+    if (!m_ring) return;
+    for (auto& line : m_delay->lines) line.Silence();
 }
 
 void Echo::Cleanup() {
@@ -234,8 +232,9 @@ void Echo::Run(Sample* samples, std::array<int, 2> frames) {
     for (const int both = channels == 2 ? std::min(frames[0], frames[1]) : 0; done < both;) {
         const int run = std::min({both - done, left.UntilWrap(), right.UntilWrap()});
         Sample* const block = samples + 2 * done;
-        if (RunEchoPair(m_delay->sides, block, run, left.Here(), right.Here()))
-            finite &= all(left.Here(), run) && all(right.Here(), run) && all(block, 2 * run);
+        float *const atLeft = left.Here(run), *const atRight = right.Here(run);
+        if (RunEchoPair(m_delay->sides, block, run, atLeft, atRight))
+            finite &= all(atLeft, run) && all(atRight, run) && all(block, 2 * run);
         left.Advance(run);
         right.Advance(run);
         done += run;
@@ -247,7 +246,7 @@ void Echo::Run(Sample* samples, std::array<int, 2> frames) {
             const int run = std::min(frames[i] - at, line.UntilWrap());
             finite &=
                 !RunEchoSide(m_delay->sides[i], samples + static_cast<std::ptrdiff_t>(at) * channels + side,
-                             channels, run, line.Here());
+                             channels, run, line.Here(run));
             line.Advance(run);
             at += run;
         }

@@ -40,8 +40,9 @@ struct Delay;
 // the ring. No latency. A delay is at least 10 samples, counted over both channels: a stereo stream is
 // delayed by half the time, in frames rounded up on the left and down on the right.
 //
-// Memory: InitProcessing makes the ring for the largest time, 10 s. Only a tempo so slow that a note is
-// longer grows it, up to 60 s, in the block that first needs it.
+// Memory: InitProcessing makes the ring for the largest time, 10 s, without touching it: a page of it is
+// touched by the block whose sound first gets there. Only a tempo so slow that a note is longer grows it, up
+// to 60 s, in the block that first needs it.
 //
 // Settings chunk: 100 bytes, the chunk tag and the settings, 24 words. Older layouts: exactly 92 bytes,
 // without the mode, which becomes "Time (linear)"; and the oldest of 180 bytes, likewise.

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstddef>
@@ -17,17 +18,32 @@ struct Side {
     double feedback, echo, wet, dry, output;
 };
 
-// The part of the ring that a side runs through.
+// The part of the ring that a side runs through. Its memory comes as it is: from `written` on the line counts
+// as silent, and a page of it is touched when the sound gets there.
 struct Line {
     float* ring = nullptr;
-    int length = 0, position = 0;
+    int length = 0, position = 0, written = 0;
 
-    float* Here() { return ring + position; }
+    // What stands in the next samples of the line.
+    float* Here(int frames) {
+        if (position + frames > written) Write(position + frames);
+        return ring + position;
+    }
+    void Silence() {
+        std::fill_n(ring, position, 0.0f);
+        written = position;
+    }
     // At least 1: a position that a shortened delay left beyond the end is used once before it wraps.
     int UntilWrap() const { return position < length ? length - position : 1; }
     void Advance(int frames) {
         position += frames;
         if (position >= length) position = 0;
+    }
+
+private:
+    void Write(int end) {
+        std::fill(ring + written, ring + end, 0.0f);
+        written = end;
     }
 };
 

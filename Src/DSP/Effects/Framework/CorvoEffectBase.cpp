@@ -102,7 +102,7 @@ void CorvoEffectBase::Attempt(Call&& call) {
 }
 
 bool CorvoEffectBase::InitProcessing(int maxFrames, const tWAVEFORMATEX* format) {
-    *m_tail = {};
+    *m_tail = {.automated = m_tail->automated};
     Attempt([&] {
         SetMaximumFramesPerBuffer(maxFrames);
         CheckCookProperties(format, true);
@@ -176,6 +176,7 @@ void CorvoEffectBase::AddEnvelope(int index, int count, const MP_ENVELOPE_SEGMEN
     if (parameter >= m_envelopes.size()) m_envelopes.resize(parameter + 1);
     std::vector<MP_ENVELOPE_SEGMENT> envelope;
     if (segments && count > 0) envelope.assign(segments, segments + count);
+    m_tail->automated |= !envelope.empty();
     m_envelopes[parameter] = std::move(envelope);
     MarkStale();
 }
@@ -201,6 +202,7 @@ void CorvoEffectBase::InitEnvelopes(bool reset) {
 
 void CorvoEffectBase::UpdateEnvelopes(ProcessFlags& flags) {
     flags.params_changed = false;
+    if (!m_tail->automated) return;  // most effects, which need not fetch an array from a cold memory
     for (std::size_t parameter = 0; parameter < m_envelope_positions.size(); ++parameter) {
         const auto& envelope = m_envelopes[parameter];
         auto& position = m_envelope_positions[parameter];

@@ -8,7 +8,7 @@
 namespace Corvo::DSP {
 
 // How an effect rings out after its input has ended: the host's wishes and the effect's report. Belongs
-// to the audio thread; CorvoEffectBase describes the use from the host's side. The base keeps its own note
+// to the audio thread; CorvoEffectBase describes the use from the host's side. The base keeps its own notes
 // here.
 struct TailRecord {
     bool restart_requested = false;       // host: begin a new tail with the next block
@@ -16,6 +16,7 @@ struct TailRecord {
     int frames_produced = 0;              // effect: frames of the last block that hold output
     bool finished = false;                // effect: nothing follows
     bool unprepared = false;              // base: memory ran out, so that blocks pass unchanged
+    bool automated = false;               // base: there was an envelope
 
     bool TailMode() const { return frames_limited_to >= 0; }
     bool TakeRestart() { return std::exchange(restart_requested, false); }
