@@ -1,6 +1,7 @@
 #include "AudioWriter.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
 
 #include "Errors.h"
@@ -8,8 +9,12 @@
 namespace dsphost {
 namespace {
 
-// Nearest integer, ties to even, of a value that is within the integer's range.
-int Rounded(double value) { return static_cast<int>(std::lrint(value)); }
+// Nearest integer, ties to even, of a value within the range of 32 bits: this far from zero doubles are whole
+// numbers, and the lowest bits are the integer's.
+std::uint32_t Rounded(double value) {
+    constexpr double kFar = 0x1.8p52;
+    return static_cast<std::uint32_t>(std::bit_cast<std::uint64_t>(value + kFar));
+}
 
 }  // namespace
 
@@ -46,17 +51,63 @@ void AudioWriter::WriteHeader(std::optional<std::int64_t> sampleBytes) {
 
 void AudioWriter::Write(const double* samples, std::int64_t frames) {
     if (frames <= 0) return;
+    if (m_output.IsStream())
+        Store(samples, frames);
+    else
+        WriteBehind(samples, frames);
+    m_frames += frames;
+}
+
+void AudioWriter::WriteBehind(const double* samples, std::int64_t frames) {
+    const auto channels = static_cast<std::size_t>(m_info.channels);
+    if (!m_behind) m_behind = std::make_unique<Relay>(BlockSamples(channels));
+    for (auto rest = static_cast<std::size_t>(frames) * channels; rest > 0;) {
+        if (!m_block) m_block = m_behind->ToFill();
+        const std::size_t filled = static_cast<std::size_t>(m_block->frames) * channels;
+        const std::size_t count = std::min(rest, m_block->samples.size() - filled);
+        std::copy_n(samples, count, m_block->samples.data() + filled);
+        m_block->frames += static_cast<std::int64_t>(count / channels);
+        samples += count;
+        rest -= count;
+        if (filled + count < m_block->samples.size()) return;
+        m_block = nullptr;
+        m_behind->Pass();
+        if (!m_ownThread)
+            m_ownThread = m_behind->Start([this] {
+                while (StoreBlock()) continue;
+            });
+        if (!m_ownThread) StoreBlock();
+    }
+}
+
+// Stores the next block that was passed on. False when there is none and none will come.
+bool AudioWriter::StoreBlock() {
+    const Block* const block = m_behind->ToTake();
+    if (!block) return false;
+    Store(block->samples.data(), block->frames);
+    m_behind->Return();
+    return true;
+}
+
+void AudioWriter::FinishBehind() {
+    if (!m_behind) return;
+    if (m_block) m_behind->Pass();
+    m_behind->Close();
+    while (!m_ownThread && StoreBlock()) continue;
+    m_behind->Finish();
+}
+
+void AudioWriter::Store(const double* samples, std::int64_t frames) {
     if (IntegerBits(m_format) > 0) {
-        WriteIntegers(samples, frames);
+        StoreIntegers(samples, frames);
     } else if (sf_writef_double(m_sound->Get(), samples, frames) != frames) {
         m_output.Bytes().ThrowIfFailed();
         throw IoError(Name() + ": " + m_sound->Error());
     }
     m_output.Bytes().ThrowIfFailed();
-    m_frames += frames;
 }
 
-void AudioWriter::WriteIntegers(const double* samples, std::int64_t frames) {
+void AudioWriter::StoreIntegers(const double* samples, std::int64_t frames) {
     const int bits = IntegerBits(m_format);
     const double scale = std::ldexp(1.0, bits - 1);
     const double lowest = -scale, highest = scale - 1.0;
@@ -66,12 +117,10 @@ void AudioWriter::WriteIntegers(const double* samples, std::int64_t frames) {
     for (std::size_t i = 0; i < count; ++i) {
         double value = samples[i] * scale;
         // What would round to a neighbour of the range is clipped too; not-a-number counts and becomes 0.
-        if (!(value >= lowest - 0.5 && value < highest + 0.5)) {
-            ++m_clipped;
-            value = value < lowest ? lowest : value > highest ? highest : 0.0;
-        }
-        value = std::min(std::max(value, lowest), highest);
-        m_integers[i] = static_cast<int>(static_cast<unsigned>(Rounded(value)) << shift);
+        // No branches: a loud passage clips here and there.
+        m_clipped += !((value >= lowest - 0.5) & (value < highest + 0.5));
+        value = std::isnan(value) ? 0.0 : std::min(std::max(value, lowest), highest);
+        m_integers[i] = static_cast<int>(Rounded(value) << shift);
     }
     if (sf_writef_int(m_sound->Get(), m_integers.data(), frames) == frames) return;
     m_output.Bytes().ThrowIfFailed();
@@ -90,6 +139,7 @@ void AudioWriter::CompleteWav() {
 }
 
 OutputFile& AudioWriter::Complete() {
+    FinishBehind();
     m_sound->Close();
     if (m_wav) CompleteWav();
     return m_output;
