@@ -3,17 +3,49 @@
 #include <algorithm>
 #include <bit>
 #include <cmath>
+#include <span>
 
 #include "Errors.h"
 
 namespace dsphost {
 namespace {
 
-// Nearest integer, ties to even, of a value within the range of 32 bits: this far from zero doubles are whole
-// numbers, and the lowest bits are the integer's.
-std::uint32_t Rounded(double value) {
-    constexpr double kFar = 0x1.8p52;
-    return static_cast<std::uint32_t>(std::bit_cast<std::uint64_t>(value + kFar));
+// Two ways to make a value an integer: which values lead into the range, and to which number within it.
+
+struct Nearest {  // ties to even
+    static bool Fits(double value, double lowest, double highest) {
+        return (value >= lowest - 0.5) & (value < highest + 0.5);
+    }
+    // This far from zero doubles are whole numbers, and their lowest bits are the integer's.
+    static std::uint32_t Integer(double value) {
+        constexpr double kFar = 0x1.8p52;
+        return static_cast<std::uint32_t>(std::bit_cast<std::uint64_t>(value + kFar));
+    }
+};
+struct TowardsZero {
+    static bool Fits(double value, double lowest, double highest) {
+        return (value > lowest - 1.0) & (value < highest + 1.0);
+    }
+    static std::uint32_t Integer(double value) {
+        return static_cast<std::uint32_t>(static_cast<std::int32_t>(value));
+    }
+};
+
+// Each sample becomes the top bits of 32, as libsndfile takes every integer. Returns how many did not fit:
+// they are clipped, and what is no number becomes 0.
+template <typename Way>
+std::int64_t ToIntegers(std::span<const double> samples, int bits, int* integers) {
+    const double scale = std::ldexp(1.0, bits - 1);
+    const double lowest = -scale, highest = scale - 1.0;
+    const int shift = 32 - bits;
+    std::int64_t clipped = 0;
+    for (const double sample : samples) {
+        const double value = sample * scale;
+        clipped += !Way::Fits(value, lowest, highest);  // no branch: a loud passage clips here and there
+        const double inside = std::isnan(value) ? 0.0 : std::min(std::max(value, lowest), highest);
+        *integers++ = static_cast<int>(Way::Integer(inside) << shift);
+    }
+    return clipped;
 }
 
 }  // namespace
@@ -109,19 +141,10 @@ void AudioWriter::Store(const double* samples, std::int64_t frames) {
 
 void AudioWriter::StoreIntegers(const double* samples, std::int64_t frames) {
     const int bits = IntegerBits(m_format);
-    const double scale = std::ldexp(1.0, bits - 1);
-    const double lowest = -scale, highest = scale - 1.0;
-    const int shift = 32 - bits;  // libsndfile takes every integer as the top bits of 32
     const auto count = static_cast<std::size_t>(frames * m_info.channels);
     m_integers.resize(count);
-    for (std::size_t i = 0; i < count; ++i) {
-        double value = samples[i] * scale;
-        // What would round to a neighbour of the range is clipped too; not-a-number counts and becomes 0.
-        // No branches: a loud passage clips here and there.
-        m_clipped += !((value >= lowest - 0.5) & (value < highest + 0.5));
-        value = std::isnan(value) ? 0.0 : std::min(std::max(value, lowest), highest);
-        m_integers[i] = static_cast<int>(Rounded(value) << shift);
-    }
+    const auto toIntegers = m_truncates ? ToIntegers<TowardsZero> : ToIntegers<Nearest>;
+    m_clipped += toIntegers({samples, count}, bits, m_integers.data());
     if (sf_writef_int(m_sound->Get(), m_integers.data(), frames) == frames) return;
     m_output.Bytes().ThrowIfFailed();
     throw IoError(Name() + ": " + m_sound->Error());
@@ -147,8 +170,8 @@ OutputFile& AudioWriter::Complete() {
 
 void AudioWriter::Commit() { Complete().Commit(); }
 
-void WarnOfClipping(const AudioWriter& writer, std::int64_t before) {
-    if (const auto count = writer.ClippedSamples() + before; count > 0)
+void WarnOfClipping(const AudioWriter& writer) {
+    if (const auto count = writer.ClippedSamples(); count > 0)
         PrintMessage("warning: " + writer.Name() + ": " + std::to_string(count) +
                      (count == 1 ? " sample was clipped" : " samples were clipped"));
 }

@@ -36,6 +36,9 @@ public:
     AudioWriter(const std::string& path, const OutputRules& rules, const AudioWriterOptions& options);
     ~AudioWriter();
 
+    // Integers are truncated towards zero instead; call it before Write.
+    void TruncateIntegers() { m_truncates = true; }
+
     // `samples`: interleaved. Throws IoError when they cannot be stored.
     void Write(const double* samples, std::int64_t frames);
     // Completes the file and puts it in its place. Throws IoError.
@@ -66,12 +69,11 @@ private:
     std::vector<int> m_integers;
     std::int64_t m_clipped = 0, m_frames = 0;
     Block* m_block = nullptr;  // being filled
-    bool m_ownThread = false;
+    bool m_truncates = false, m_ownThread = false;
     std::unique_ptr<Relay> m_behind;  // last: its thread uses the others
 };
 
-// "3 samples of out.wav were clipped" on standard error when there were any; `before` were clipped already on
-// their way to the writer.
-void WarnOfClipping(const AudioWriter& writer, std::int64_t before = 0);
+// "3 samples of out.wav were clipped" on standard error when there were any.
+void WarnOfClipping(const AudioWriter& writer);
 
 }  // namespace dsphost
