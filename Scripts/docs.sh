@@ -10,7 +10,7 @@ docs=$PWD/build/docs source=$PWD/build/docs/source
 export PYTHONDONTWRITEBYTECODE=1
 
 say "building"
-build_preset release dsphost dsphost_shell_files dsp_pages
+build_preset release dsphost dsphost_shell_files dsp_pages dspdll-analyser
 rm -rf "$docs"
 mkdir -p "$source"
 cmake --install build/release --prefix "$docs/installed" >/dev/null

@@ -116,6 +116,7 @@ void AudioReader::OpenStream(File stream) {
     m_info.format = SF_FORMAT_RAW | header->subtype | SF_ENDIAN_LITTLE;
     if (header->sampleBytes) m_frames = *header->sampleBytes / FrameBytes(*header);
     if (header->doubtfulBytes) m_doubtfulFrames = *header->doubtfulBytes / FrameBytes(*header);
+    m_streams = true;
     m_file = std::make_unique<File>(std::move(stream));
     OpenSound(header);
 }
@@ -133,12 +134,60 @@ void AudioReader::OpenSound(const std::optional<WavStreamHeader>& header) {
 int AudioReader::Read(double* samples, int frames) {
     int done = 0;
     while (done < frames) {
-        const int got = ReadSome(samples + static_cast<std::ptrdiff_t>(done) * Channels(), frames - done);
+        double* const rest = samples + static_cast<std::ptrdiff_t>(done) * Channels();
+        const int got = m_streams ? ReadSome(rest, frames - done) : ReadAhead(rest, frames - done);
         if (got == 0) break;
         done += got;
     }
     if (done < frames && !std::exchange(m_ended, true)) End();
     return done;
+}
+
+// None at the end only.
+int AudioReader::ReadAhead(double* samples, int frames) {
+    const auto channels = static_cast<std::size_t>(Channels());
+    if (!m_ahead) m_ahead = std::make_unique<Relay>(BlockSamples(channels));
+    if (m_block && m_taken == m_block->frames) {
+        m_ahead->Return();
+        m_block = nullptr;
+    }
+    if (!m_block) {
+        // What fits into one block needs no thread.
+        if (!m_ownThread && DecodeBlock())
+            m_ownThread = m_ahead->Start([this] {
+                while (DecodeBlock()) continue;
+            });
+        m_block = m_ahead->ToTake();
+        m_taken = 0;
+    }
+    if (!m_block) return 0;
+    const auto count = std::min<std::int64_t>(frames, m_block->frames - m_taken);
+    const auto* const from = m_block->samples.data() + static_cast<std::size_t>(m_taken) * channels;
+    std::copy_n(from, static_cast<std::size_t>(count) * channels, samples);
+    m_taken += count;
+    return static_cast<int>(count);
+}
+
+// Passes one more block on. False at the end.
+bool AudioReader::DecodeBlock() {
+    Block* const block = m_ahead->ToFill();
+    if (!block) return false;
+    const auto most = static_cast<std::int64_t>(block->samples.size()) / Channels();
+    const std::int64_t start = m_position;
+    bool ended = false;
+    std::exception_ptr failure;
+    try {
+        while (!ended && m_position < start + most)
+            ended = ReadSome(block->samples.data() + (m_position - start) * Channels(),
+                             static_cast<int>(start + most - m_position)) == 0;
+    } catch (...) {
+        failure = std::current_exception();
+    }
+    block->frames = m_position - start;  // those in front of the failure too
+    if (block->frames > 0) m_ahead->Pass();
+    if (!ended && !failure) return true;
+    m_ahead->Close(failure);
+    return false;
 }
 
 // None at the end only.

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "File.h"
+#include "Relay.h"
 #include "SampleFormat.h"
 #include "SoundFile.h"
 #include "WavHeader.h"
@@ -17,6 +18,9 @@ namespace dsphost {
 //
 // "-" is standard input; it and named pipes may carry anything: WAV streams through, also without a stated
 // length, and what cannot be read forwards only (FLAC, W64, ...) is first spooled to a temporary file.
+//
+// Files are read and decoded ahead, on a thread of the reader's own. Streams are not: whoever writes them
+// works at the same time anyway, and a thread that waits for them could not be ended.
 class AudioReader {
 public:
     // Throws UserError when there is nothing there, or nothing that is audio.
@@ -45,6 +49,8 @@ private:
     void OpenFile(File file);
     void OpenSound(const std::optional<WavStreamHeader>& header);
     int ReadSome(double* samples, int frames);
+    int ReadAhead(double* samples, int frames);
+    bool DecodeBlock();
     void CountNotFinite(std::span<const double> samples);
     void End();
 
@@ -56,7 +62,11 @@ private:
     std::optional<std::int64_t> m_frames, m_doubtfulFrames;
     std::int64_t m_position = 0;
     std::int64_t m_notFinite = 0, m_firstNotFinite = 0;  // samples; the frame of the first
-    bool m_cutOff = false, m_ended = false;
+    bool m_cutOff = false, m_ended = false, m_streams = false;
+    Block* m_block = nullptr;  // what was read ahead
+    std::int64_t m_taken = 0;  // frames of it
+    bool m_ownThread = false;
+    std::unique_ptr<Relay> m_ahead;  // last: its thread uses the others
 };
 
 // A number of bytes as "500M": with a K, M, G or T behind it, or nothing. Throws UserError that names

@@ -1,15 +1,52 @@
 #include "AudioWriter.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
+#include <span>
 
 #include "Errors.h"
 
 namespace dsphost {
 namespace {
 
-// Nearest integer, ties to even, of a value that is within the integer's range.
-int Rounded(double value) { return static_cast<int>(std::lrint(value)); }
+// Two ways to make a value an integer: which values lead into the range, and to which number within it.
+
+struct Nearest {  // ties to even
+    static bool Fits(double value, double lowest, double highest) {
+        return (value >= lowest - 0.5) & (value < highest + 0.5);
+    }
+    // This far from zero doubles are whole numbers, and their lowest bits are the integer's.
+    static std::uint32_t Integer(double value) {
+        constexpr double kFar = 0x1.8p52;
+        return static_cast<std::uint32_t>(std::bit_cast<std::uint64_t>(value + kFar));
+    }
+};
+struct TowardsZero {
+    static bool Fits(double value, double lowest, double highest) {
+        return (value > lowest - 1.0) & (value < highest + 1.0);
+    }
+    static std::uint32_t Integer(double value) {
+        return static_cast<std::uint32_t>(static_cast<std::int32_t>(value));
+    }
+};
+
+// Each sample becomes the top bits of 32, as libsndfile takes every integer. Returns how many did not fit:
+// they are clipped, and what is no number becomes 0.
+template <typename Way>
+std::int64_t ToIntegers(std::span<const double> samples, int bits, int* integers) {
+    const double scale = std::ldexp(1.0, bits - 1);
+    const double lowest = -scale, highest = scale - 1.0;
+    const int shift = 32 - bits;
+    std::int64_t clipped = 0;
+    for (const double sample : samples) {
+        const double value = sample * scale;
+        clipped += !Way::Fits(value, lowest, highest);  // no branch: a loud passage clips here and there
+        const double inside = std::isnan(value) ? 0.0 : std::min(std::max(value, lowest), highest);
+        *integers++ = static_cast<int>(Way::Integer(inside) << shift);
+    }
+    return clipped;
+}
 
 }  // namespace
 
@@ -46,33 +83,68 @@ void AudioWriter::WriteHeader(std::optional<std::int64_t> sampleBytes) {
 
 void AudioWriter::Write(const double* samples, std::int64_t frames) {
     if (frames <= 0) return;
+    if (m_output.IsStream())
+        Store(samples, frames);
+    else
+        WriteBehind(samples, frames);
+    m_frames += frames;
+}
+
+void AudioWriter::WriteBehind(const double* samples, std::int64_t frames) {
+    const auto channels = static_cast<std::size_t>(m_info.channels);
+    if (!m_behind) m_behind = std::make_unique<Relay>(BlockSamples(channels));
+    for (auto rest = static_cast<std::size_t>(frames) * channels; rest > 0;) {
+        if (!m_block) m_block = m_behind->ToFill();
+        const std::size_t filled = static_cast<std::size_t>(m_block->frames) * channels;
+        const std::size_t count = std::min(rest, m_block->samples.size() - filled);
+        std::copy_n(samples, count, m_block->samples.data() + filled);
+        m_block->frames += static_cast<std::int64_t>(count / channels);
+        samples += count;
+        rest -= count;
+        if (filled + count < m_block->samples.size()) return;
+        m_block = nullptr;
+        m_behind->Pass();
+        if (!m_ownThread)
+            m_ownThread = m_behind->Start([this] {
+                while (StoreBlock()) continue;
+            });
+        if (!m_ownThread) StoreBlock();
+    }
+}
+
+// Stores the next block that was passed on. False when there is none and none will come.
+bool AudioWriter::StoreBlock() {
+    const Block* const block = m_behind->ToTake();
+    if (!block) return false;
+    Store(block->samples.data(), block->frames);
+    m_behind->Return();
+    return true;
+}
+
+void AudioWriter::FinishBehind() {
+    if (!m_behind) return;
+    if (m_block) m_behind->Pass();
+    m_behind->Close();
+    while (!m_ownThread && StoreBlock()) continue;
+    m_behind->Finish();
+}
+
+void AudioWriter::Store(const double* samples, std::int64_t frames) {
     if (IntegerBits(m_format) > 0) {
-        WriteIntegers(samples, frames);
+        StoreIntegers(samples, frames);
     } else if (sf_writef_double(m_sound->Get(), samples, frames) != frames) {
         m_output.Bytes().ThrowIfFailed();
         throw IoError(Name() + ": " + m_sound->Error());
     }
     m_output.Bytes().ThrowIfFailed();
-    m_frames += frames;
 }
 
-void AudioWriter::WriteIntegers(const double* samples, std::int64_t frames) {
+void AudioWriter::StoreIntegers(const double* samples, std::int64_t frames) {
     const int bits = IntegerBits(m_format);
-    const double scale = std::ldexp(1.0, bits - 1);
-    const double lowest = -scale, highest = scale - 1.0;
-    const int shift = 32 - bits;  // libsndfile takes every integer as the top bits of 32
     const auto count = static_cast<std::size_t>(frames * m_info.channels);
     m_integers.resize(count);
-    for (std::size_t i = 0; i < count; ++i) {
-        double value = samples[i] * scale;
-        // What would round to a neighbour of the range is clipped too; not-a-number counts and becomes 0.
-        if (!(value >= lowest - 0.5 && value < highest + 0.5)) {
-            ++m_clipped;
-            value = value < lowest ? lowest : value > highest ? highest : 0.0;
-        }
-        value = std::min(std::max(value, lowest), highest);
-        m_integers[i] = static_cast<int>(static_cast<unsigned>(Rounded(value)) << shift);
-    }
+    const auto toIntegers = m_truncates ? ToIntegers<TowardsZero> : ToIntegers<Nearest>;
+    m_clipped += toIntegers({samples, count}, bits, m_integers.data());
     if (sf_writef_int(m_sound->Get(), m_integers.data(), frames) == frames) return;
     m_output.Bytes().ThrowIfFailed();
     throw IoError(Name() + ": " + m_sound->Error());
@@ -90,6 +162,7 @@ void AudioWriter::CompleteWav() {
 }
 
 OutputFile& AudioWriter::Complete() {
+    FinishBehind();
     m_sound->Close();
     if (m_wav) CompleteWav();
     return m_output;
@@ -97,8 +170,8 @@ OutputFile& AudioWriter::Complete() {
 
 void AudioWriter::Commit() { Complete().Commit(); }
 
-void WarnOfClipping(const AudioWriter& writer, std::int64_t before) {
-    if (const auto count = writer.ClippedSamples() + before; count > 0)
+void WarnOfClipping(const AudioWriter& writer) {
+    if (const auto count = writer.ClippedSamples(); count > 0)
         PrintMessage("warning: " + writer.Name() + ": " + std::to_string(count) +
                      (count == 1 ? " sample was clipped" : " samples were clipped"));
 }

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "OutputFile.h"
+#include "Relay.h"
 #include "SampleFormat.h"
 #include "SoundFile.h"
 #include "WavHeader.h"
@@ -25,12 +26,18 @@ struct AudioWriterOptions {
 // that would pass 4 GiB becomes an RF64. The same samples always give the same bytes (Ogg excepted, whose
 // streams carry a random number).
 //
+// Files are encoded and written on a thread of the writer's own, which is one block behind: a failure shows
+// in one of the next calls.
+//
 // Integers: full scale is 1; values are rounded to nearest, ties to even, without dither, and clipped.
 class AudioWriter {
 public:
     // Throws UserError when the place, the kind of file or the sample format will not do.
     AudioWriter(const std::string& path, const OutputRules& rules, const AudioWriterOptions& options);
     ~AudioWriter();
+
+    // Integers are truncated towards zero instead; call it before Write.
+    void TruncateIntegers() { m_truncates = true; }
 
     // `samples`: interleaved. Throws IoError when they cannot be stored.
     void Write(const double* samples, std::int64_t frames);
@@ -39,7 +46,7 @@ public:
     // The first half of it; the result is still to be committed.
     OutputFile& Complete();
 
-    std::int64_t ClippedSamples() const { return m_clipped; }
+    std::int64_t ClippedSamples() const { return m_clipped; }  // when it is complete
     std::int64_t FramesWritten() const { return m_frames; }
     SampleFormat Format() const { return m_format; }
     const std::string& Name() const { return m_output.Name(); }
@@ -48,7 +55,11 @@ private:
     void OpenWav(int container, const std::optional<std::int64_t>& framesAtMost);
     void WriteHeader(std::optional<std::int64_t> sampleBytes);
     void CompleteWav();
-    void WriteIntegers(const double* samples, std::int64_t frames);
+    void WriteBehind(const double* samples, std::int64_t frames);
+    bool StoreBlock();
+    void FinishBehind();
+    void Store(const double* samples, std::int64_t frames);
+    void StoreIntegers(const double* samples, std::int64_t frames);
 
     OutputFile m_output;
     SF_INFO m_info{};
@@ -57,10 +68,12 @@ private:
     std::unique_ptr<SoundFile> m_sound;
     std::vector<int> m_integers;
     std::int64_t m_clipped = 0, m_frames = 0;
+    Block* m_block = nullptr;  // being filled
+    bool m_truncates = false, m_ownThread = false;
+    std::unique_ptr<Relay> m_behind;  // last: its thread uses the others
 };
 
-// "3 samples of out.wav were clipped" on standard error when there were any; `before` were clipped already on
-// their way to the writer.
-void WarnOfClipping(const AudioWriter& writer, std::int64_t before = 0);
+// "3 samples of out.wav were clipped" on standard error when there were any.
+void WarnOfClipping(const AudioWriter& writer);
 
 }  // namespace dsphost

@@ -3,7 +3,6 @@
 #include <cstdio>
 #include <numeric>
 #include <optional>
-#include <span>
 #include <string>
 #include <vector>
 
@@ -58,17 +57,6 @@ void CheckPitch(int inRate, int outRate, const AlignedConverter& converter) {
     PrintMessage("warning: " + std::string(text) + " and drifts; " + cure);
 }
 
-// What the library stores for a value in `Out`, as a double again; counts what it had to clip.
-template <typename Out>
-void Store(std::span<double> samples, std::int64_t& clipped) {
-    for (double& value : samples) {
-        clipped += !(value * Out::kScale > -Out::kScale - 1.0 && value * Out::kScale < Out::kScale);
-        char stored[Out::kBytes];
-        Out::Write(value, stored);
-        value = Out::Read(stored);
-    }
-}
-
 }  // namespace
 
 void RunConvert(ConvertArguments arguments) {
@@ -103,25 +91,22 @@ void RunConvert(ConvertArguments arguments) {
         settings.ditherBits = bits;
         converter.emplace(settings);
     }
-    std::int64_t clipped = 0, read = 0;
+    // As the library stores these itself.
+    if (bits == 16 || bits == 24) output.TruncateIntegers();
+    std::int64_t read = 0;
     const auto most = static_cast<int>(converter->MostFrames(kBlock));
     std::vector<double> samples(kBlock * channels), converted(static_cast<std::size_t>(most) * channels);
-    const auto write = [&](int frames) {
-        const auto written = std::span(converted).first(static_cast<std::size_t>(frames) * channels);
-        if (bits == 16) Store<tipo_16bit_outd>(written, clipped);
-        if (bits == 24) Store<tipo_24bit_outd>(written, clipped);
-        output.Write(written.data(), frames);
-    };
     {
         Progress progress("convert", input.Rate(), input.Frames(), arguments.writing.quiet);
         while (const int got = input.Read(samples.data(), kBlock)) {
-            write(converter->Convert(samples.data(), got, converted.data()));
+            output.Write(converted.data(), converter->Convert(samples.data(), got, converted.data()));
             progress.Update(read += got);
         }
-        while (const int rest = converter->Finish(converted.data(), most)) write(rest);
+        while (const int rest = converter->Finish(converted.data(), most))
+            output.Write(converted.data(), rest);
     }
     output.Commit();
-    WarnOfClipping(output, clipped);
+    WarnOfClipping(output);
 }
 
 }  // namespace dsphost

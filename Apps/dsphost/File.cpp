@@ -158,13 +158,25 @@ File::File(const fs::path& path, Mode mode, std::string name)
         throw UserError(m_name + ": is a directory; name a file");
     }
     if (!m_stream) throw UserError(m_name + ": " + std::strerror(reason));
+    // What comes or goes through a pipe must not wait for more.
+    if (IdentityOf(m_stream)) EnlargeBuffer();
+}
+
+void File::EnlargeBuffer() {
+    constexpr std::size_t kBytes = 1 << 16;
+    m_buffer = std::make_unique_for_overwrite<char[]>(kBytes);
+    std::setvbuf(m_stream, m_buffer.get(), _IOFBF, kBytes);
 }
 
 File File::Temporary() {
     std::error_code error;
     const auto directory = fs::temp_directory_path(error);
     std::FILE* const stream = error ? nullptr : OpenTemporary(directory);
-    if (stream) return {stream, "temporary file in " + NameOf(directory), true};
+    if (stream) {
+        File file(stream, "temporary file in " + NameOf(directory), true);
+        file.EnlargeBuffer();
+        return file;
+    }
     throw IoError("there is no room for temporary files" +
                   (error ? std::string() : " in " + NameOf(directory)) + ": " +
                   (error ? error.message() : std::strerror(errno)));
@@ -175,7 +187,8 @@ File::File(File&& other) noexcept
       m_name(std::move(other.m_name)),
       m_owned(other.m_owned),
       m_error(other.m_error),
-      m_ahead(std::move(other.m_ahead)) {}
+      m_ahead(std::move(other.m_ahead)),
+      m_buffer(std::move(other.m_buffer)) {}
 
 File::~File() {
     if (m_stream && m_owned) std::fclose(m_stream);

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
+#include <memory>
 #include <optional>
 #include <string>
 
@@ -66,12 +67,14 @@ public:
 
 private:
     File(std::FILE* stream, std::string name, bool owned);
+    void EnlargeBuffer();
 
     std::FILE* m_stream;
     std::string m_name;
     bool m_owned = true;
     int m_error = 0;
-    std::string m_ahead;  // peeked at, not yet read
+    std::string m_ahead;               // peeked at, not yet read
+    std::unique_ptr<char[]> m_buffer;  // the stream's
 };
 
 // The whole of a small file, of `most` bytes. Throws UserError where it is larger or cannot be read.

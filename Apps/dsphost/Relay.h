@@ -1,0 +1,60 @@
+#pragma once
+
+#include <array>
+#include <condition_variable>
+#include <cstdint>
+#include <exception>
+#include <functional>
+#include <mutex>
+#include <thread>
+#include <vector>
+
+namespace dsphost {
+
+// Interleaved samples on their way from one thread to another.
+struct Block {
+    std::vector<double> samples;
+    std::int64_t frames = 0;
+};
+
+// What a block holds at most, in whole frames: enough that handing it over costs next to nothing.
+std::size_t BlockSamples(std::size_t channels);
+
+// Hands blocks from a thread that fills them to one that takes them: two of them, so that one is filled while
+// the other is worked on. One of the two threads belongs to the relay.
+//
+// Either side may close it, with the reason where something failed. What was passed on before is still taken,
+// then the taking side learns of the end, or gets the reason thrown. The filling side learns of it at once.
+class Relay {
+public:
+    explicit Relay(std::size_t samplesPerBlock);
+    ~Relay();  // closes, and waits for the thread
+
+    // Runs `work` on a thread of the relay's own; what it throws becomes the reason. False where the system
+    // has no thread to give.
+    bool Start(std::function<void()> work);
+
+    // For the side that fills: a block without frames, and its way to the other side. Null when closed.
+    Block* ToFill();
+    void Pass();
+    // For the side that takes: the next block, and its way back. Null at the end.
+    Block* ToTake();
+    void Return();
+
+    void Close(std::exception_ptr reason = {});
+    // Closes, and waits until the relay's own thread has taken everything. Throws what made it fail.
+    void Finish();
+
+private:
+    void ThrowReason() const;
+
+    std::mutex m_mutex;
+    std::condition_variable m_changed;
+    std::array<Block, 2> m_blocks;
+    std::size_t m_passed = 0, m_returned = 0;  // blocks since the start
+    bool m_closed = false;
+    std::exception_ptr m_reason;
+    std::jthread m_thread;
+};
+
+}  // namespace dsphost
