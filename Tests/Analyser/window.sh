@@ -10,7 +10,7 @@ source Scripts/common.sh
 need_packages "${BUILD_PACKAGES[@]}" "${PLUGIN_PACKAGES[@]}" xvfb xdotool imagemagick sox jalv jackd2 sonic-pi-samples
 say "building"
 build_preset release dspdll-analyser dsphost
-build_preset plugins dspdll-analyser-plugin
+build_preset plugins analyser_plugin
 
 seconds=${1:-20}
 work=$(mktemp -d)
