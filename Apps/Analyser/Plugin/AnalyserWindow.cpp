@@ -22,6 +22,7 @@ using Hold = Processor::Hold;
 using Clock = std::chrono::steady_clock;
 
 constexpr int kWidth = 960, kHeight = 600, kLeastWidth = 240, kLeastHeight = 160, kMost = 16384;
+constexpr std::uint32_t kDark = 0x0e1116;                       // where nothing is drawn yet
 constexpr double kDoubleClick = 0.4, kDoubleClickPixels = 4.0;  // seconds
 constexpr std::uint32_t kEvents = XCB_EVENT_MASK_EXPOSURE | XCB_EVENT_MASK_STRUCTURE_NOTIFY |
                                   XCB_EVENT_MASK_KEY_PRESS | XCB_EVENT_MASK_BUTTON_PRESS |
@@ -181,13 +182,14 @@ bool AnalyserWindow::Open(std::uintptr_t parent) try {
     m_targets = Atom("TARGETS");
     m_utf8 = Atom("UTF8_STRING");
     ReadKeys();
-    const std::uint32_t values[]{0, kEvents, m_screen->default_colormap};
+    const std::uint32_t values[]{kDark, kDark, XCB_GRAVITY_NORTH_WEST, kEvents, m_screen->default_colormap};
     const auto window = xcb_generate_id(m_connection);
     const auto made = xcb_create_window_checked(
         m_connection, m_screen->root_depth, window, static_cast<xcb_window_t>(parent), 0, 0,
         static_cast<std::uint16_t>(m_size.width), static_cast<std::uint16_t>(m_size.height), 0,
         XCB_WINDOW_CLASS_INPUT_OUTPUT, visual->visual_id,
-        XCB_CW_BORDER_PIXEL | XCB_CW_EVENT_MASK | XCB_CW_COLORMAP, values);
+        XCB_CW_BACK_PIXEL | XCB_CW_BORDER_PIXEL | XCB_CW_BIT_GRAVITY | XCB_CW_EVENT_MASK | XCB_CW_COLORMAP,
+        values);
     if (const auto error = Own(xcb_request_check(m_connection, made))) return false;
     m_window = window;
     m_surface.reset(cairo_xcb_surface_create(m_connection, window, visual, m_size.width, m_size.height));

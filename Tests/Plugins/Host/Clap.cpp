@@ -1,10 +1,12 @@
 // CLAP over the C headers.
 #include <clap/entry.h>
 #include <clap/ext/audio-ports.h>
+#include <clap/ext/gui.h>
 #include <clap/ext/latency.h>
 #include <clap/ext/params.h>
 #include <clap/ext/state.h>
 #include <clap/ext/thread-check.h>
+#include <clap/ext/timer-support.h>
 #include <clap/plugin-factory.h>
 #include <clap/plugin-features.h>
 
@@ -42,12 +44,24 @@ const clap_host_thread_check_t kHostThreads{
     [](const clap_host_t*) { return CurrentThread() == Thread::Main; },
     [](const clap_host_t*) { return CurrentThread() == Thread::Audio; }};
 
+std::set<clap_id> g_timers;
+const clap_host_timer_support_t kHostTimers{[](const clap_host_t*, std::uint32_t, clap_id* timer) {
+                                                *timer = g_timers.empty() ? 1 : *g_timers.rbegin() + 1;
+                                                return g_timers.insert(*timer).second;
+                                            },
+                                            [](const clap_host_t*, clap_id timer) {
+                                                Expect(g_timers.erase(timer) == 1,
+                                                       "takes away a timer that is not there");
+                                                return true;
+                                            }};
+
 const void* HostExtension(const clap_host_t*, const char* id) {
     const std::string name = id;
     if (name == CLAP_EXT_PARAMS) return &kHostParams;
     if (name == CLAP_EXT_LATENCY) return &kHostLatency;
     if (name == CLAP_EXT_STATE) return &kHostState;
     if (name == CLAP_EXT_THREAD_CHECK) return &kHostThreads;
+    if (name == CLAP_EXT_TIMER_SUPPORT) return &kHostTimers;
     return nullptr;
 }
 
@@ -197,6 +211,34 @@ public:
     }
     void Reset() override { m_plugin->reset(m_plugin); }
 
+    bool OpenWindow(std::uintptr_t parent) override {
+        m_gui = Extension<clap_plugin_gui_t>(CLAP_EXT_GUI);
+        if (!m_gui) return false;
+        Expect(!m_gui->is_api_supported(m_plugin, "no.such.api", false) &&
+                   !m_gui->create(m_plugin, "no.such.api", false),
+               "has windows of an unknown kind");
+        std::uint32_t width = 0, height = 0;
+        clap_window_t window{CLAP_WINDOW_API_X11, {}};
+        window.x11 = parent;
+        return m_gui->is_api_supported(m_plugin, window.api, false) &&
+               m_gui->create(m_plugin, window.api, false) && m_gui->get_size(m_plugin, &width, &height) &&
+               width > 0 && height > 0 && m_gui->set_parent(m_plugin, &window) && m_gui->show(m_plugin);
+    }
+    bool ResizeWindow(int width, int height) override {
+        auto fitWidth = static_cast<std::uint32_t>(width), fitHeight = static_cast<std::uint32_t>(height);
+        return m_gui->can_resize(m_plugin) && m_gui->adjust_size(m_plugin, &fitWidth, &fitHeight) &&
+               m_gui->set_size(m_plugin, fitWidth, fitHeight);
+    }
+    void Tick() override {
+        const auto* timer = Extension<clap_plugin_timer_support_t>(CLAP_EXT_TIMER_SUPPORT);
+        for (const clap_id id : g_timers) timer->on_timer(m_plugin, id);
+    }
+    void CloseWindow() override {
+        m_gui->hide(m_plugin);
+        m_gui->destroy(m_plugin);
+        Expect(g_timers.empty(), "leaves its timer behind");
+    }
+
     bool SetChannels(int channels) override {
         return std::all_of(outputs.begin(), outputs.end(),
                            [=](const Port& p) { return p.channels == channels; });
@@ -307,6 +349,7 @@ private:
     const clap_plugin_params_t* m_params;
     const clap_plugin_state_t* m_state;
     const clap_plugin_latency_t* m_latency;
+    const clap_plugin_gui_t* m_gui = nullptr;
     Events m_events;
     std::int64_t m_time = 0;
     bool m_active = false, m_started = false;

@@ -4,8 +4,8 @@
 #include <travesty/edit_controller.h>
 #include <travesty/factory.h>
 #include <travesty/host.h>
-#include <travesty/message.h>
 #include <travesty/unit.h>
+#include <travesty/view.h>
 
 #include <algorithm>
 #include <array>
@@ -23,17 +23,7 @@ namespace {
 
 std::string Narrow(const std::int16_t* text) {
     std::string narrow;
-    for (; *text; ++text) {  // the basic plane is all that plug-ins use
-        const unsigned c = static_cast<std::uint16_t>(*text);
-        const auto add = [&](unsigned byte) { narrow += static_cast<char>(byte); };
-        if (c < 0x80) {
-            add(c);
-        } else if (c < 0x800) {
-            add(0xc0 | c >> 6), add(0x80 | (c & 0x3f));
-        } else {
-            add(0xe0 | c >> 12), add(0x80 | (c >> 6 & 0x3f)), add(0x80 | (c & 0x3f));
-        }
-    }
+    for (; *text; ++text) narrow += static_cast<char>(*text);  // ours are ASCII
     return narrow;
 }
 
@@ -187,6 +177,32 @@ ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Change
                             return QueueAt(self, *index);
                         }});
 
+// A window's frame, which leads to the host's timers.
+std::set<v3_timer_handler**> g_timers;
+using LoopTable = Table<v3_run_loop, v3_run_loop_iid>;
+LoopTable g_loop({[](void*, v3_event_handler**, int) -> v3_result { return V3_OK; },
+                  [](void*, v3_event_handler**) -> v3_result { return V3_OK; },
+                  [](void*, v3_timer_handler** timer, std::uint64_t) -> v3_result {
+                      return g_timers.insert(timer).second ? V3_OK : V3_INVALID_ARG;
+                  },
+                  [](void*, v3_timer_handler** timer) -> v3_result {
+                      Expect(g_timers.erase(timer) == 1, "takes away a timer that is not there");
+                      return V3_OK;
+                  }});
+LoopTable* g_loopObject = &g_loop;
+struct FrameTable : v3_plugin_frame_cpp {
+    FrameTable() {
+        query_interface = [](void* self, const v3_tuid iid, void** object) -> v3_result {
+            if (!v3_tuid_match(iid, v3_run_loop_iid)) return Query<v3_plugin_frame_iid>(self, iid, object);
+            *object = &g_loopObject;
+            return V3_OK;
+        };
+        ref = unref = [](void*) { return 1u; };
+        frame.resize_view = [](void*, v3_plugin_view**, v3_view_rect*) -> v3_result { return V3_OK; };
+    }
+} g_frame;
+FrameTable* g_frameObject = &g_frame;
+
 // A plug-in's interface, counted.
 template <typename Interface>
 class Held {
@@ -221,7 +237,10 @@ public:
         v3_cpp_obj_query_interface(m_component.Get(), v3_audio_processor_iid,
                                    reinterpret_cast<v3_audio_processor***>(m_processor.Slot()));
         if (!m_processor) throw std::runtime_error("has no audio processor");
-        FindController(factory, context);
+        // Ours are one object.
+        v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid,
+                                   reinterpret_cast<v3_edit_controller***>(m_controller.Slot()));
+        if (!m_controller) throw std::runtime_error("has no controller");
         m_controller->set_component_handler(m_controller.Get(),
                                             reinterpret_cast<v3_component_handler**>(&g_handlerObject));
         for (Changes* changes : {&m_in, &m_out}) {
@@ -231,15 +250,7 @@ public:
         ReadParameters();
         ReadPorts();
     }
-    ~Vst3Instance() override {
-        if (m_controllerIsOther) {
-            Connect(false);
-            v3_cpp_obj_terminate(m_controller.Get());
-        }
-        m_controller.Release();
-        m_processor.Release();
-        v3_cpp_obj_terminate(m_component.Get());
-    }
+    ~Vst3Instance() override { v3_cpp_obj_terminate(m_component.Get()); }
 
     std::optional<std::string> Text(const Parameter& parameter, double value) override {
         v3_str_128 text{};
@@ -270,9 +281,7 @@ public:
     bool Load(const Bytes& bytes, std::size_t most) override {
         Stream stream{&g_stream, bytes, most};
         const auto state = reinterpret_cast<v3_bstream**>(&stream);
-        if (m_component->set_state(m_component.Get(), state) != V3_OK) return false;
-        stream.position = 0;
-        return !m_controllerIsOther || m_controller->set_component_state(m_controller.Get(), state) == V3_OK;
+        return m_component->set_state(m_component.Get(), state) == V3_OK;
     }
 
     bool Activate(double rate, std::uint32_t maxFrames) override {
@@ -338,6 +347,34 @@ public:
     void Reset() override {
         m_processor->set_processing(m_processor.Get(), false);
         m_processor->set_processing(m_processor.Get(), true);
+    }
+
+    bool OpenWindow(std::uintptr_t parent) override {
+        *m_view.Slot() = m_controller->create_view(m_controller.Get(), "editor");
+        v3_view_rect size{};
+        const auto own = reinterpret_cast<void*>(parent);
+        if (!m_view) return false;
+        m_view->set_frame(m_view.Get(), reinterpret_cast<v3_plugin_frame**>(&g_frameObject));
+        Expect(m_view->is_platform_type_supported(m_view.Get(), "NoSuchType") != V3_OK &&
+                   m_view->attached(m_view.Get(), own, "NoSuchType") != V3_OK,
+               "has windows of an unknown kind");
+        return m_view->get_size(m_view.Get(), &size) == V3_OK && size.right > 0 && size.bottom > 0 &&
+               m_view->attached(m_view.Get(), own, V3_VIEW_PLATFORM_TYPE_NATIVE) == V3_OK;
+    }
+    bool ResizeWindow(int width, int height) override {
+        v3_view_rect size{0, 0, width, height};
+        return m_view->can_resize(m_view.Get()) == V3_OK &&
+               m_view->check_size_constraint(m_view.Get(), &size) == V3_OK &&
+               m_view->on_size(m_view.Get(), &size) == V3_OK;
+    }
+    void Tick() override {
+        for (v3_timer_handler** timer : g_timers) v3_cpp_obj(timer)->on_timer(timer);
+    }
+    void CloseWindow() override {
+        Expect(m_view->removed(m_view.Get()) == V3_OK, "cannot remove its window");
+        Expect(g_timers.empty(), "leaves its timer behind");
+        m_view->set_frame(m_view.Get(), nullptr);
+        m_view.Release();
     }
 
     bool SetChannels(int channels) override {
@@ -415,35 +452,6 @@ private:
         }
     }
 
-    void FindController(v3_plugin_factory** factory, v3_funknown** context) {
-        const auto slot = reinterpret_cast<v3_edit_controller***>(m_controller.Slot());
-        if (v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid, slot) == V3_OK) {
-            return;
-        }
-        v3_tuid id{};
-        m_component->get_controller_class_id(m_component.Get(), id);
-        if (v3_cpp_obj(factory)->create_instance(factory, id, v3_edit_controller_iid, m_controller.Slot()) !=
-            V3_OK)
-            throw std::runtime_error("has no controller");
-        v3_cpp_obj_initialize(m_controller.Get(), context);
-        m_controllerIsOther = true;
-        Connect(true);
-    }
-    // The two halves may talk to each other.
-    void Connect(bool on) {
-        Held<v3_connection_point> ours, theirs;
-        v3_cpp_obj_query_interface(m_component.Get(), v3_connection_point_iid,
-                                   reinterpret_cast<v3_connection_point***>(ours.Slot()));
-        v3_cpp_obj_query_interface(m_controller.Get(), v3_connection_point_iid,
-                                   reinterpret_cast<v3_connection_point***>(theirs.Slot()));
-        if (!ours || !theirs) return;
-        const auto join = [on](auto& a, auto& b) {
-            on ? a->connect(a.Get(), b.Get()) : a->disconnect(a.Get(), b.Get());
-        };
-        join(ours, theirs);
-        join(theirs, ours);
-    }
-
     void ReadParameters() {
         for (std::int32_t i = 0; i < m_controller->get_parameter_count(m_controller.Get()); ++i) {
             v3_param_info info{};
@@ -486,7 +494,7 @@ private:
     Held<v3_component> m_component;
     Held<v3_audio_processor> m_processor;
     Held<v3_edit_controller> m_controller;
-    bool m_controllerIsOther = false;
+    Held<v3_plugin_view> m_view;
     Changes m_in{&g_changes, {}}, m_out{&g_changes, {}};
     std::vector<std::int16_t> m_lastText;
     double m_rate = 48000;
