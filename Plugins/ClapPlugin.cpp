@@ -302,27 +302,19 @@ private:
 
     // State.
     static bool Save(const clap_plugin_t* plugin, const clap_ostream_t* stream) try {
-        const auto bytes = SaveState(*Of(plugin).m_core);
-        for (std::size_t done = 0; done < bytes.size();) {
-            const auto written = stream->write(stream, bytes.data() + done, bytes.size() - done);
-            if (written <= 0) return false;
-            done += static_cast<std::size_t>(written);
-        }
-        return true;
+        return WriteAll(SaveState(*Of(plugin).m_core), [stream](const void* bytes, std::size_t count) {
+            return stream->write(stream, bytes, count);
+        });
     } catch (const std::exception&) {
         return false;
     }
     static bool Load(const clap_plugin_t* plugin, const clap_istream_t* stream) try {
         std::vector<std::uint8_t> bytes;
-        std::uint8_t buffer[4096];
-        for (;;) {
-            const auto count = stream->read(stream, buffer, sizeof buffer);
-            if (count < 0) return false;
-            if (count == 0) break;
-            bytes.insert(bytes.end(), buffer, buffer + count);
-        }
+        const auto read = [stream](void* buffer, std::size_t count) {
+            return stream->read(stream, buffer, count);
+        };
         ClapPlugin& self = Of(plugin);
-        if (!LoadState(*self.m_core, bytes)) return false;
+        if (!ReadAll(bytes, read) || !LoadState(*self.m_core, bytes)) return false;
         self.TellValues();
         return true;
     } catch (const std::exception&) {

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "SavedState.h"
 #include "Vst3Text.h"
@@ -154,14 +155,12 @@ v3_result Vst3Plugin::Arrangement(std::int32_t direction, std::int32_t bus,
 v3_result Vst3Plugin::SetState(v3_bstream** stream) {
     if (!stream) return V3_INVALID_ARG;
     std::vector<std::uint8_t> bytes;
-    std::uint8_t buffer[4096];
-    for (;;) {
+    ReadAll(bytes, [stream](void* buffer, std::size_t size) {
         std::int32_t count = 0;
-        const auto result = v3_cpp_obj(stream)->read(stream, buffer, sizeof buffer, &count);
+        const auto wanted = static_cast<std::int32_t>(size);
         // Some streams fail at their end.
-        if (result != V3_OK || count <= 0) break;
-        bytes.insert(bytes.end(), buffer, buffer + std::min<std::int32_t>(count, sizeof buffer));
-    }
+        return v3_cpp_obj(stream)->read(stream, buffer, wanted, &count) == V3_OK ? count : 0;
+    });
     if (bytes.size() < kProgramBytes) return V3_FALSE;
     std::uint32_t program = 0;
     for (std::size_t i = kProgramBytes; i-- > 0;) program = program << 8 | bytes[i];
@@ -181,14 +180,12 @@ v3_result Vst3Plugin::GetState(v3_bstream** stream) {
         bytes.push_back(static_cast<std::uint8_t>(ProgramNow() >> 8 * i));
     const auto state = SaveState(*m_core);
     bytes.insert(bytes.end(), state.begin(), state.end());
-    for (std::size_t done = 0; done < bytes.size();) {
-        std::int32_t written = 0;
-        const auto left = static_cast<std::int32_t>(bytes.size() - done);
-        if (v3_cpp_obj(stream)->write(stream, bytes.data() + done, left, &written) != V3_OK || written <= 0)
-            return V3_FALSE;
-        done += static_cast<std::size_t>(written);
-    }
-    return V3_OK;
+    const bool isWritten = WriteAll(std::move(bytes), [stream](void* from, std::size_t size) {
+        std::int32_t count = 0;
+        const auto left = static_cast<std::int32_t>(size);
+        return v3_cpp_obj(stream)->write(stream, from, left, &count) == V3_OK ? count : 0;
+    });
+    return isWritten ? V3_OK : V3_FALSE;
 }
 
 }  // namespace Corvo::Plugins

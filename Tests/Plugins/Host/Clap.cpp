@@ -18,9 +18,8 @@
 #include <stdexcept>
 #include <utility>
 
-#include "Instance.h"
+#include "Formats.h"
 #include "Module.h"
-#include "Support/AudioThreadRules.h"
 
 namespace PluginHost {
 namespace {
@@ -115,27 +114,6 @@ struct Events {
     }
 };
 
-struct Stream {
-    Bytes bytes;
-    std::size_t most, position = 0;
-
-    static std::int64_t Read(const clap_istream_t* stream, void* buffer, std::uint64_t size) {
-        auto& self = *static_cast<Stream*>(stream->ctx);
-        const std::size_t count =
-            std::min({static_cast<std::size_t>(size), self.most, self.bytes.size() - self.position});
-        if (count) std::memcpy(buffer, self.bytes.data() + self.position, count);
-        self.position += count;
-        return static_cast<std::int64_t>(count);
-    }
-    static std::int64_t Write(const clap_ostream_t* stream, const void* buffer, std::uint64_t size) {
-        auto& self = *static_cast<Stream*>(stream->ctx);
-        const std::size_t count = std::min(static_cast<std::size_t>(size), self.most);
-        const char* bytes = static_cast<const char*>(buffer);
-        self.bytes.insert(self.bytes.end(), bytes, bytes + count);
-        return static_cast<std::int64_t>(count);
-    }
-};
-
 class ClapInstance : public Instance {
 public:
     explicit ClapInstance(const clap_plugin_t* plugin) : m_plugin(plugin) {
@@ -175,13 +153,19 @@ public:
 
     std::optional<Bytes> Save(std::size_t most) override {
         Stream stream{{}, most};
-        const clap_ostream_t out{&stream, Stream::Write};
+        const clap_ostream_t out{
+            &stream, [](const clap_ostream_t* to, const void* bytes, std::uint64_t size) {
+                return static_cast<Stream*>(to->ctx)->Write(bytes, static_cast<std::int64_t>(size));
+            }};
         if (!m_state->save(m_plugin, &out)) return {};
         return stream.bytes;
     }
     bool Load(const Bytes& bytes, std::size_t most) override {
         Stream stream{bytes, most};
-        const clap_istream_t in{&stream, Stream::Read};
+        const clap_istream_t in{&stream, [](const clap_istream_t* from, void* buffer, std::uint64_t size) {
+                                    return static_cast<Stream*>(from->ctx)->Read(
+                                        buffer, static_cast<std::int64_t>(size));
+                                }};
         return m_state->load(m_plugin, &in);
     }
 
@@ -219,7 +203,7 @@ public:
                "has windows of an unknown kind");
         std::uint32_t width = 0, height = 0;
         clap_window_t window{CLAP_WINDOW_API_X11, {}};
-        window.x11 = parent;
+        window.x11 = static_cast<clap_xwnd>(parent);
         return m_gui->is_api_supported(m_plugin, window.api, false) &&
                m_gui->create(m_plugin, window.api, false) && m_gui->get_size(m_plugin, &width, &height) &&
                width > 0 && height > 0 && m_gui->set_parent(m_plugin, &window) && m_gui->show(m_plugin);
@@ -306,8 +290,9 @@ private:
 
     clap_process_status Run(const Block& block) {
         std::array<clap_audio_buffer_t, 4> in{}, out{};
-        Divide(inputs, block.inputs, in);
-        Divide(outputs, block.outputs, out);
+        using Buffer = clap_audio_buffer_t;
+        Divide(inputs, block.inputs, in, &Buffer::data32, &Buffer::channel_count);
+        Divide(outputs, block.outputs, out, &Buffer::data32, &Buffer::channel_count);
         clap_event_transport_t transport{};
         transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
         transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
@@ -322,24 +307,7 @@ private:
                                      &m_events.in,
                                      &m_events.out};
         m_time += block.frames;
-        std::string broken;
-        clap_process_status status;
-        {
-            TestSupport::AudioThreadRules rules;
-            status = m_plugin->process(m_plugin, &process);
-            broken = rules.Broken();
-        }
-        ExpectRealTime(broken);
-        return status;
-    }
-    static void Divide(const std::vector<Port>& ports, std::span<float* const> channels,
-                       std::array<clap_audio_buffer_t, 4>& buffers) {
-        std::size_t channel = 0;
-        for (std::size_t i = 0; i < ports.size() && i < buffers.size(); ++i) {
-            buffers[i].data32 = const_cast<float**>(channels.data() + channel);
-            buffers[i].channel_count = static_cast<std::uint32_t>(ports[i].channels);
-            channel += buffers[i].channel_count;
-        }
+        return InRealTime([&] { return m_plugin->process(m_plugin, &process); });
     }
     void RunCallback() {
         if (std::exchange(g_callbackWanted, false)) m_plugin->on_main_thread(m_plugin);

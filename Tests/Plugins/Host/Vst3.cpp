@@ -14,9 +14,8 @@
 #include <set>
 #include <stdexcept>
 
-#include "Checks.h"
+#include "Formats.h"
 #include "Module.h"
-#include "Support/AudioThreadRules.h"
 
 namespace PluginHost {
 namespace {
@@ -73,47 +72,25 @@ HandlerTable g_handler({[](void*, v3_param_id) -> v3_result { return ExpectMainT
 HandlerTable* g_handlerObject = &g_handler;
 
 using StreamTable = Table<v3_bstream, v3_bstream_iid>;
-struct Stream {
+struct HostStream {
     StreamTable* table;
-    Bytes bytes;
-    std::size_t most, position = 0;
+    Stream stream;
 
-    static Stream& Of(void* self) { return *static_cast<Stream*>(self); }
-    static v3_result V3_API Read(void* self, void* buffer, std::int32_t size, std::int32_t* done) {
-        Stream& s = Of(self);
-        const std::size_t count =
-            std::min({static_cast<std::size_t>(std::max(size, 0)), s.most, s.bytes.size() - s.position});
-        if (count) std::memcpy(buffer, s.bytes.data() + s.position, count);
-        s.position += count;
-        if (done) *done = static_cast<std::int32_t>(count);
-        return V3_OK;
-    }
-    static v3_result V3_API Write(void* self, void* buffer, std::int32_t size, std::int32_t* done) {
-        Stream& s = Of(self);
-        const std::size_t count = std::min(static_cast<std::size_t>(std::max(size, 0)), s.most);
-        const char* bytes = static_cast<const char*>(buffer);
-        s.bytes.resize(std::max(s.bytes.size(), s.position + count));
-        std::copy_n(bytes, count, s.bytes.begin() + static_cast<std::ptrdiff_t>(s.position));
-        s.position += count;
-        if (done) *done = static_cast<std::int32_t>(count);
-        return V3_OK;
-    }
-    static v3_result V3_API Seek(void* self, std::int64_t to, std::int32_t mode, std::int64_t* result) {
-        Stream& s = Of(self);
-        const std::int64_t size = static_cast<std::int64_t>(s.bytes.size());
-        const std::int64_t from = mode == V3_SEEK_SET   ? 0
-                                  : mode == V3_SEEK_CUR ? static_cast<std::int64_t>(s.position)
-                                                        : size;
-        s.position = static_cast<std::size_t>(std::clamp<std::int64_t>(from + to, 0, size));
-        if (result) *result = static_cast<std::int64_t>(s.position);
-        return V3_OK;
-    }
-    static v3_result V3_API Tell(void* self, std::int64_t* position) {
-        *position = static_cast<std::int64_t>(Of(self).position);
-        return V3_OK;
-    }
+    static Stream& Of(void* self) { return static_cast<HostStream*>(self)->stream; }
 };
-StreamTable g_stream({Stream::Read, Stream::Write, Stream::Seek, Stream::Tell});
+StreamTable g_stream({[](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
+                          *done = static_cast<std::int32_t>(HostStream::Of(self).Read(buffer, size));
+                          return V3_OK;
+                      },
+                      [](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
+                          *done = static_cast<std::int32_t>(HostStream::Of(self).Write(buffer, size));
+                          return V3_OK;
+                      },
+                      // Ours read and write from one end to the other.
+                      [](void*, std::int64_t, std::int32_t, std::int64_t*) -> v3_result {
+                          return V3_NOT_IMPLEMENTED;
+                      },
+                      [](void*, std::int64_t*) -> v3_result { return V3_NOT_IMPLEMENTED; }});
 
 // The changes of one block: a queue per parameter, all made beforehand.
 using QueueTable = Table<v3_param_value_queue, v3_param_value_queue_iid>;
@@ -273,15 +250,14 @@ public:
     }
 
     std::optional<Bytes> Save(std::size_t most) override {
-        Stream stream{&g_stream, {}, most};
-        if (m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&stream)) != V3_OK)
+        HostStream to{&g_stream, {{}, most}};
+        if (m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&to)) != V3_OK)
             return {};
-        return stream.bytes;
+        return to.stream.bytes;
     }
     bool Load(const Bytes& bytes, std::size_t most) override {
-        Stream stream{&g_stream, bytes, most};
-        const auto state = reinterpret_cast<v3_bstream**>(&stream);
-        return m_component->set_state(m_component.Get(), state) == V3_OK;
+        HostStream from{&g_stream, {bytes, most}};
+        return m_component->set_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&from)) == V3_OK;
     }
 
     bool Activate(double rate, std::uint32_t maxFrames) override {
@@ -319,8 +295,9 @@ public:
         m_in.Set(block.changes);
         std::array<v3_audio_bus_buffers, 4> in{}, out{};
         const bool audio = !block.outputs.empty();
-        Divide(inputs, block.inputs, in);
-        Divide(outputs, block.outputs, out);
+        using Buffer = v3_audio_bus_buffers;
+        Divide(inputs, block.inputs, in, &Buffer::channel_buffers_32, &Buffer::num_channels);
+        Divide(outputs, block.outputs, out, &Buffer::channel_buffers_32, &Buffer::num_channels);
         v3_process_context context{};
         context.state = V3_PROCESS_CTX_PLAYING | V3_PROCESS_CTX_TEMPO_VALID;
         context.sample_rate = m_rate;
@@ -334,15 +311,7 @@ public:
         data.input_params = reinterpret_cast<v3_param_changes**>(&m_in);
         data.output_params = reinterpret_cast<v3_param_changes**>(&m_out);
         data.ctx = &context;
-        std::string broken;
-        v3_result result;
-        {
-            TestSupport::AudioThreadRules rules;
-            result = m_processor->process(m_processor.Get(), &data);
-            broken = rules.Broken();
-        }
-        ExpectRealTime(broken);
-        return result == V3_OK;
+        return InRealTime([&] { return m_processor->process(m_processor.Get(), &data); }) == V3_OK;
     }
     void Reset() override {
         m_processor->set_processing(m_processor.Get(), false);
@@ -481,16 +450,6 @@ private:
                    "describes one bus more than it counts");
         }
     }
-    static void Divide(const std::vector<Port>& ports, std::span<float* const> channels,
-                       std::array<v3_audio_bus_buffers, 4>& buffers) {
-        std::size_t channel = 0;
-        for (std::size_t i = 0; i < ports.size() && i < buffers.size() && !channels.empty(); ++i) {
-            buffers[i].num_channels = ports[i].channels;
-            buffers[i].channel_buffers_32 = const_cast<float**>(channels.data() + channel);
-            channel += static_cast<std::size_t>(ports[i].channels);
-        }
-    }
-
     Held<v3_component> m_component;
     Held<v3_audio_processor> m_processor;
     Held<v3_edit_controller> m_controller;
