@@ -44,13 +44,11 @@ private:
 };
 
 Adapter::Adapter(const PluginRow& row, int channels, Start start)
-    : m_row(row),
-      m_channels(channels),
+    : Core(row, channels, LayoutOf(row, channels)),
       m_start(start),
-      m_layout(LayoutOf(row, channels)),
       m_effect(row.Make()),
       m_planar(m_effect->SupportsNoninterleaved()),
-      m_controls(m_layout.ports.size()) {
+      m_controls(Ports().size()) {
     m_effect->SetHostCallback(this);
     SetChannels(channels);
     ReadBack();
@@ -60,7 +58,7 @@ Adapter::~Adapter() = default;
 
 void Adapter::SetChannels(int channels) {
     m_longest = 0;
-    m_channels = channels;
+    Core::SetChannels(channels);
     if (m_effect->GetNumSidechainBusses() == 0) return;
     m_sideChannels = std::min(channels, m_effect->GetSidechainBusNumChannelsMax(0));
     m_effect->SetSidechainBusNumChannels(0, m_sideChannels);
@@ -86,17 +84,17 @@ void Adapter::Prepare(double rate, int frames) {
     TakeEdits(false);
     m_longest = std::clamp(frames, kStep, kLongestPiece);
     m_format = {};
-    m_format.nChannels = static_cast<std::uint16_t>(m_channels);
+    m_format.nChannels = static_cast<std::uint16_t>(Channels());
     m_format.nSamplesPerSec = static_cast<std::uint32_t>(std::lround(std::clamp(rate, 1000.0, 768000.0)));
     m_format.wBitsPerSample = 32;
     const auto piece = static_cast<std::size_t>(m_longest);
     const auto ring = std::bit_ceil(piece + static_cast<std::size_t>(kLongestLag * rate));
-    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+    for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c) {
         m_wet[c].assign(piece, 0.0f);
         m_side[c].assign(m_sideChannels > 0 ? piece : 0, 0.0f);
         m_dry[c].assign(ring, 0.0f);
     }
-    m_interleaved.assign(m_planar || m_channels == 1 ? 0 : 2 * piece, 0.0f);
+    m_interleaved.assign(m_planar || Channels() == 1 ? 0 : 2 * piece, 0.0f);
     m_glideSteps = std::max(1, static_cast<int>(kGlide * rate / kStep));
     m_mixStep = static_cast<float>(1.0 / (kBypass * rate));
     Restart();
@@ -112,7 +110,7 @@ void Adapter::Reset() {
 void Adapter::Restart() {
     m_effect->Cleanup();
     m_effect->InitProcessing(m_longest, &m_format);
-    m_mix = m_goal = m_bypass ? 0.0f : 1.0f;
+    m_mix = m_goal = Bypassed() ? 0.0f : 1.0f;
     m_sideHeard = false;
     m_fresh = true;
     UpdateLatency();
@@ -232,14 +230,14 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
     if (m_longest == 0) return;
     const Gate gate(m_busy, Gate::If::Free);
     if (gate) TakeEdits(!m_fresh);
-    m_goal = m_bypass ? 0.0f : 1.0f;
+    m_goal = Bypassed() ? 0.0f : 1.0f;
     for (int done = 0; done < frames;) {
         const bool gliding = gate && m_gliding > 0;
         if (gliding) StepGlides();
-        const int piece = std::min(frames - done, gliding || m_row.shortPieces ? kStep : m_longest);
+        const int piece = std::min(frames - done, gliding || Row().shortPieces ? kStep : m_longest);
         std::array<const float*, 2> from{}, beside{};
         std::array<float*, 2> to{};
-        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c) {
             from[c] = in[c] + done;
             to[c] = out[c] + done;
             if (side && c < static_cast<std::size_t>(m_sideChannels) && side[c]) beside[c] = side[c] + done;
@@ -261,7 +259,7 @@ void Adapter::ProcessPiece(const float* const* in, float* const* out, const floa
 void Adapter::TakeInput(const float* const* in, int frames) {
     const auto count = static_cast<std::size_t>(frames);
     if (m_interleaved.empty())
-        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c)
             for (std::size_t i = 0; i < count; ++i) m_wet[c][i] = Finite(in[c][i]);
     else
         for (std::size_t i = 0; i < count; ++i) {
@@ -271,7 +269,7 @@ void Adapter::TakeInput(const float* const* in, int frames) {
     // The ring is needed only where something may be mixed with it.
     const std::size_t mask = m_dry[0].size() - 1;
     if (m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f)
-        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c)
             for (std::size_t i = 0; i < count; ++i) m_dry[c][(m_dryAt + i) & mask] = Finite(in[c][i]);
     m_dryAt = (m_dryAt + count) & mask;
 }
@@ -316,7 +314,7 @@ void Adapter::Give(float* const* out, int frames) {
             right[i] = Finite(m_interleaved[2 * i + 1]);
         }
     } else if (wetOnly) {
-        for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c)
+        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c)
             for (std::size_t i = 0; i < count; ++i) out[c][i] = Finite(m_wet[c][i]);
     }
     if (wetOnly) return;
@@ -324,7 +322,7 @@ void Adapter::Give(float* const* out, int frames) {
     const std::size_t from = m_dryAt - count - static_cast<std::size_t>(m_latency.load());
     const float step = goal > m_mix ? m_mixStep : -m_mixStep;
     float mix = m_mix;
-    for (std::size_t c = 0; c < static_cast<std::size_t>(m_channels); ++c) {
+    for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c) {
         mix = m_mix;
         for (std::size_t i = 0; i < count; ++i) {
             if (mix != goal) mix = std::clamp(mix + step, 0.0f, 1.0f);
@@ -338,7 +336,7 @@ void Adapter::Give(float* const* out, int frames) {
 std::unique_ptr<DSP::CorvoEffectBase> Adapter::Copy() {
     std::vector<std::uint8_t> chunk;
     m_effect->GetSettingsChunk(chunk);
-    auto copy = m_row.Make();
+    auto copy = Row().Make();
     copy->SetSettingsChunk(chunk);
     copy->SetHostCallback(this);
     return copy;
@@ -366,7 +364,7 @@ std::vector<std::uint8_t> Adapter::State() {
 bool Adapter::TakeState(const std::vector<std::uint8_t>& bytes) {
     // An effect leaves everything as it was, without a word, when it does not take a chunk: one that is read
     // makes two different instances the same.
-    const auto other = m_row.Make(), another = m_row.Make();
+    const auto other = Row().Make(), another = Row().Make();
     std::vector<std::uint8_t> before, after;
     for (int i = 0; i < other->GetParamCount(); ++i) other->SetParam(i, 0.0f, false);
     for (int i = 0; i < another->GetParamCount(); ++i) another->SetParam(i, 1.0f, false);
@@ -376,7 +374,7 @@ bool Adapter::TakeState(const std::vector<std::uint8_t>& bytes) {
     another->GetSettingsChunk(after);
     if (before != after) return false;
     // Nor are settings taken that no control gives: such a file is damaged.
-    const DSP::EffectKind* const kind = DSP::FindEffectKind(m_row.name);
+    const DSP::EffectKind* const kind = DSP::FindEffectKind(Row().name);
     if (kind && !DSP::ParameterOutOfRange(*kind, *other).empty()) return false;
     const Gate gate(m_busy, Gate::If::Waiting);
     m_effect->SetSettingsChunk(bytes);

@@ -16,9 +16,10 @@
 #include <string>
 #include <vector>
 
+#include "ClapWindow.h"
 #include "SavedState.h"
 
-// Every plug-in as CLAP. Parameter 0 is the bypass; port i of the adapter is the parameter i + 1.
+// Every plug-in as CLAP. Parameter 0 is the bypass; port i of the core is the parameter i + 1.
 namespace {
 
 using namespace Corvo::Plugins;
@@ -78,7 +79,9 @@ public:
                  Extension,
                  OnMainThread},
           m_host(host),
-          m_adapter(*entry.row, entry.channels) {}
+          m_core(MakeCore(*entry.row, entry.channels)),
+          m_window(*m_core, host),
+          m_sent(m_core->Ports().size()) {}
 
     const clap_plugin_t plugin;
 
@@ -97,19 +100,19 @@ private:
     static bool Activate(const clap_plugin_t* plugin, double rate, std::uint32_t, std::uint32_t most) {
         ClapPlugin& self = Of(plugin);
         try {
-            self.m_adapter.Prepare(rate, static_cast<int>(std::min(most, 1u << 20)));
+            self.m_core->Prepare(rate, static_cast<int>(std::min(most, 1u << 20)));
         } catch (const std::exception&) {
             return false;
         }
         self.TellLatency();
         return true;
     }
-    static void DoReset(const clap_plugin_t* plugin) { Of(plugin).m_adapter.Reset(); }
+    static void DoReset(const clap_plugin_t* plugin) { Of(plugin).m_core->Reset(); }
 
     // A host takes a new latency only while it activates.
     void TellLatency() {
-        if (m_told == m_adapter.Latency()) return;
-        m_told = m_adapter.Latency();
+        if (m_told == m_core->Latency()) return;
+        m_told = m_core->Latency();
         const auto* const latency = HostExtension<clap_host_latency_t>(CLAP_EXT_LATENCY);
         if (latency) latency->changed(m_host);
     }
@@ -118,7 +121,7 @@ private:
     static void OnMainThread(const clap_plugin_t* plugin) {
         ClapPlugin& self = Of(plugin);
         if (self.m_latencyMoved.exchange(false)) self.m_host->request_restart(self.m_host);
-        if (self.m_adapter.TakeOtherValues()) self.TellValues();
+        if (self.m_core->TakeOtherValues()) self.TellValues();
     }
     void TellValues() {
         const auto* const params = HostExtension<clap_host_params_t>(CLAP_EXT_PARAMS);
@@ -133,22 +136,22 @@ private:
         if (event.type != CLAP_EVENT_PARAM_VALUE) return;
         const auto& change = reinterpret_cast<const clap_event_param_value_t&>(event);
         if (change.param_id == kBypass)
-            m_adapter.Bypass(change.value > 0.5);
-        else if (change.param_id <= m_adapter.Ports().size())
-            m_adapter.Set(static_cast<int>(change.param_id) - 1, static_cast<float>(change.value));
+            m_core->Bypass(change.value > 0.5);
+        else if (change.param_id <= m_core->Ports().size())
+            m_core->Set(static_cast<int>(change.param_id) - 1, static_cast<float>(change.value));
     }
     void TakeTransport(const clap_event_transport_t& transport) {
         const bool hasMeter = (transport.flags & CLAP_TRANSPORT_HAS_TIME_SIGNATURE) != 0;
         if ((transport.flags & CLAP_TRANSPORT_HAS_TEMPO) != 0)
-            m_adapter.Tempo(transport.tempo, hasMeter ? transport.tsig_num : 4,
-                            hasMeter ? transport.tsig_denom : 4);
+            m_core->Tempo(transport.tempo, hasMeter ? transport.tsig_num : 4,
+                          hasMeter ? transport.tsig_denom : 4);
     }
 
     static clap_process_status DoProcess(const clap_plugin_t* plugin, const clap_process_t* block) {
         return Of(plugin).Process(*block);
     }
     clap_process_status Process(const clap_process_t& block) {
-        const auto channels = static_cast<std::uint32_t>(m_adapter.Channels());
+        const auto channels = static_cast<std::uint32_t>(m_core->Channels());
         if (block.audio_inputs_count < 1 || block.audio_outputs_count < 1 ||
             block.audio_inputs[0].channel_count < channels ||
             block.audio_outputs[0].channel_count < channels || !block.audio_inputs[0].data32 ||
@@ -170,37 +173,54 @@ private:
             RunPiece(block, done, until - done);
             done = until;
         }
-        if (m_adapter.Latency() != m_told && !m_latencyMoved.exchange(true)) m_host->request_callback(m_host);
+        if (m_core->Latency() != m_told && !m_latencyMoved.exchange(true)) m_host->request_callback(m_host);
         block.audio_outputs[0].constant_mask = 0;
+        SendOutputs(block.out_events);
         return CLAP_PROCESS_CONTINUE;
+    }
+    void SendOutputs(const clap_output_events_t* events) {
+        for (std::size_t i = 0; events && i < m_sent.size(); ++i) {
+            const float value = m_core->Value(static_cast<int>(i));
+            if (!m_core->Ports()[i].isOutput || value == m_sent[i]) continue;
+            const clap_event_param_value_t event{
+                {sizeof event, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_PARAM_VALUE, 0},
+                static_cast<clap_id>(i + 1),
+                nullptr,
+                -1,
+                -1,
+                -1,
+                -1,
+                static_cast<double>(value)};
+            if (events->try_push(events, &event.header)) m_sent[i] = value;
+        }
     }
     void RunPiece(const clap_process_t& block, std::uint32_t from, std::uint32_t frames) {
         const float *in[2]{}, *side[2]{};
         float* out[2]{};
-        for (int c = 0; c < m_adapter.Channels(); ++c) {
+        for (int c = 0; c < m_core->Channels(); ++c) {
             in[c] = block.audio_inputs[0].data32[c] + from;
             out[c] = block.audio_outputs[0].data32[c] + from;
         }
-        if (m_adapter.SideChannels() > 0 && block.audio_inputs_count > 1 && block.audio_inputs[1].data32)
+        if (m_core->SideChannels() > 0 && block.audio_inputs_count > 1 && block.audio_inputs[1].data32)
             for (std::uint32_t c = 0; c < block.audio_inputs[1].channel_count && c < 2; ++c)
                 side[c] = block.audio_inputs[1].data32[c] + from;
-        m_adapter.Run(in, out, side, static_cast<int>(frames));
+        m_core->Run(in, out, side, static_cast<int>(frames));
     }
 
     // Audio ports.
     static std::uint32_t PortCount(const clap_plugin_t* plugin, bool isInput) {
-        return isInput && Of(plugin).m_adapter.SideChannels() > 0 ? 2 : 1;
+        return isInput && Of(plugin).m_core->SideChannels() > 0 ? 2 : 1;
     }
     static bool PortInfo(const clap_plugin_t* plugin, std::uint32_t index, bool isInput,
                          clap_audio_port_info_t* info) {
         if (index >= PortCount(plugin, isInput)) return false;
-        const Adapter& adapter = Of(plugin).m_adapter;
+        const Core& core = *Of(plugin).m_core;
         const bool main = index == 0;
         *info = {};
         info->id = (isInput ? 0u : 16u) + index;
         CopyText(info->name, sizeof info->name, !main ? "Side-chain" : isInput ? "In" : "Out");
         info->flags = main ? static_cast<std::uint32_t>(CLAP_AUDIO_PORT_IS_MAIN) : 0u;
-        info->channel_count = static_cast<std::uint32_t>(main ? adapter.Channels() : adapter.SideChannels());
+        info->channel_count = static_cast<std::uint32_t>(main ? core.Channels() : core.SideChannels());
         info->port_type = info->channel_count == 1 ? CLAP_PORT_MONO : CLAP_PORT_STEREO;
         info->in_place_pair = !main ? CLAP_INVALID_ID : isInput ? 16u : 0u;
         return true;
@@ -209,7 +229,7 @@ private:
 
     // Parameters.
     static std::uint32_t Count(const clap_plugin_t* plugin) {
-        return static_cast<std::uint32_t>(Of(plugin).m_adapter.Ports().size()) + 1;
+        return static_cast<std::uint32_t>(Of(plugin).m_core->Ports().size()) + 1;
     }
     static bool Info(const clap_plugin_t* plugin, std::uint32_t index, clap_param_info_t* info) {
         if (index >= Count(plugin)) return false;
@@ -222,9 +242,12 @@ private:
             return true;
         }
         const ClapPlugin& self = Of(plugin);
-        const Port& port = self.m_adapter.Ports()[index - 1];
-        const auto& groups = LayoutOf(self.m_adapter.Row(), self.m_adapter.Channels()).groups;
-        info->flags = port.momentary ? 0u : static_cast<std::uint32_t>(CLAP_PARAM_IS_AUTOMATABLE);
+        const Port& port = self.m_core->Ports()[index - 1];
+        const auto& groups = self.m_core->Groups();
+        if (port.isOutput)
+            info->flags = CLAP_PARAM_IS_READONLY;
+        else if (!port.momentary)
+            info->flags = CLAP_PARAM_IS_AUTOMATABLE;
         if (port.whole) info->flags |= CLAP_PARAM_IS_STEPPED;
         CopyText(info->name, sizeof info->name, port.name);
         if (port.group >= 0)
@@ -236,9 +259,8 @@ private:
     }
     static bool Value(const clap_plugin_t* plugin, clap_id id, double* value) {
         if (id >= Count(plugin)) return false;
-        const Adapter& adapter = Of(plugin).m_adapter;
-        *value =
-            id == kBypass ? adapter.Bypassed() : static_cast<double>(adapter.Value(static_cast<int>(id) - 1));
+        const Core& core = *Of(plugin).m_core;
+        *value = id == kBypass ? core.Bypassed() : static_cast<double>(core.Value(static_cast<int>(id) - 1));
         return true;
     }
     static bool ValueToText(const clap_plugin_t* plugin, clap_id id, double value, char* text,
@@ -247,7 +269,7 @@ private:
         CopyText(text, size,
                  id == kBypass
                      ? (value > 0.5 ? "On" : "Off")
-                     : Of(plugin).m_adapter.Text(static_cast<int>(id) - 1, static_cast<float>(value)));
+                     : Of(plugin).m_core->Text(static_cast<int>(id) - 1, static_cast<float>(value)));
         return true;
     } catch (const std::exception&) {
         return false;
@@ -261,7 +283,7 @@ private:
             *value = shown == "On" ? 1.0 : 0.0;
             return true;
         }
-        if (!Of(plugin).m_adapter.FromText(static_cast<int>(id) - 1, shown, number)) return false;
+        if (!Of(plugin).m_core->FromText(static_cast<int>(id) - 1, shown, number)) return false;
         *value = static_cast<double>(number);
         return true;
     } catch (const std::exception&) {
@@ -274,33 +296,25 @@ private:
     static constexpr clap_plugin_params_t kParams{Count, Info, Value, ValueToText, TextToValue, Flush};
 
     static std::uint32_t LatencyNow(const clap_plugin_t* plugin) {
-        return static_cast<std::uint32_t>(Of(plugin).m_adapter.Latency());
+        return static_cast<std::uint32_t>(Of(plugin).m_core->Latency());
     }
     static constexpr clap_plugin_latency_t kLatency{LatencyNow};
 
     // State.
     static bool Save(const clap_plugin_t* plugin, const clap_ostream_t* stream) try {
-        const auto bytes = SaveState(Of(plugin).m_adapter);
-        for (std::size_t done = 0; done < bytes.size();) {
-            const auto written = stream->write(stream, bytes.data() + done, bytes.size() - done);
-            if (written <= 0) return false;
-            done += static_cast<std::size_t>(written);
-        }
-        return true;
+        return WriteAll(SaveState(*Of(plugin).m_core), [stream](const void* bytes, std::size_t count) {
+            return stream->write(stream, bytes, count);
+        });
     } catch (const std::exception&) {
         return false;
     }
     static bool Load(const clap_plugin_t* plugin, const clap_istream_t* stream) try {
         std::vector<std::uint8_t> bytes;
-        std::uint8_t buffer[4096];
-        for (;;) {
-            const auto count = stream->read(stream, buffer, sizeof buffer);
-            if (count < 0) return false;
-            if (count == 0) break;
-            bytes.insert(bytes.end(), buffer, buffer + count);
-        }
+        const auto read = [stream](void* buffer, std::size_t count) {
+            return stream->read(stream, buffer, count);
+        };
         ClapPlugin& self = Of(plugin);
-        if (!LoadState(self.m_adapter, bytes)) return false;
+        if (!ReadAll(bytes, read) || !LoadState(*self.m_core, bytes)) return false;
         self.TellValues();
         return true;
     } catch (const std::exception&) {
@@ -308,16 +322,20 @@ private:
     }
     static constexpr clap_plugin_state_t kState{Save, Load};
 
-    static const void* Extension(const clap_plugin_t*, const char* id) {
+    static ClapWindow& WindowOf(const clap_plugin_t* plugin) { return Of(plugin).m_window; }
+
+    static const void* Extension(const clap_plugin_t* plugin, const char* id) {
         if (std::strcmp(id, CLAP_EXT_AUDIO_PORTS) == 0) return &kAudioPorts;
         if (std::strcmp(id, CLAP_EXT_PARAMS) == 0) return &kParams;
         if (std::strcmp(id, CLAP_EXT_LATENCY) == 0) return &kLatency;
         if (std::strcmp(id, CLAP_EXT_STATE) == 0) return &kState;
-        return nullptr;
+        return Of(plugin).m_core->HasWindow() ? ClapWindow::Extension<WindowOf>(id) : nullptr;
     }
 
     const clap_host_t* const m_host;
-    Adapter m_adapter;
+    const std::unique_ptr<Core> m_core;
+    ClapWindow m_window;
+    std::vector<float> m_sent;   // of the outputs
     std::atomic<int> m_told{0};  // the latency that the host knows
     std::atomic<bool> m_latencyMoved{false};
 };

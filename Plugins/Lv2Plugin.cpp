@@ -1,7 +1,6 @@
 #include <src/lv2/atom-util.h>
 #include <src/lv2/atom.h>
 #include <src/lv2/buf-size.h>
-#include <src/lv2/lv2.h>
 #include <src/lv2/options.h>
 #include <src/lv2/state.h>
 #include <src/lv2/time.h>
@@ -10,11 +9,10 @@
 #include <cmath>
 #include <cstring>
 #include <exception>
-#include <memory>
 #include <string>
 #include <vector>
 
-#include "Adapter.h"
+#include "Lv2Instance.h"
 #include "Lv2Ports.h"
 
 // Every plug-in as LV2. No feature is required: without the map of identifiers there is neither stored state
@@ -47,23 +45,18 @@ struct Identifiers {
     LV2_URID position = 0, bpm = 0, beatsPerBar = 0, beatUnit = 0, longest = 0;
 };
 
-const void* Feature(const LV2_Feature* const* features, const char* uri) {
-    for (; features && *features; ++features)
-        if (std::strcmp((*features)->URI, uri) == 0) return (*features)->data;
-    return nullptr;
-}
-
-class Lv2Plugin {
+class Lv2Plugin final : public Lv2Instance {
 public:
     Lv2Plugin(const PluginRow& row, int channels, double rate, const LV2_Feature* const* features)
-        : m_ids(static_cast<const LV2_URID_Map*>(Feature(features, LV2_URID__map))),
-          m_adapter(row, channels, Adapter::Start::WithFirstValues),
-          m_order{channels, m_adapter.SideChannels(), row.tempo},
+        : Lv2Instance(MakeCore(row, channels, Start::WithFirstValues)),
+          m_ids(static_cast<const LV2_URID_Map*>(Lv2Feature(features, LV2_URID__map))),
+          m_order{channels, core->SideChannels(), row.tempo},
           m_rate(rate),
-          m_ports(static_cast<std::size_t>(m_order.FirstControl()) + m_adapter.Ports().size()),
-          m_seen(m_adapter.Ports().size()) {
-        for (std::size_t i = 0; i < m_seen.size(); ++i) m_seen[i] = m_adapter.Ports()[i].start;
-        const auto* option = static_cast<const LV2_Options_Option*>(Feature(features, LV2_OPTIONS__options));
+          m_ports(static_cast<std::size_t>(m_order.FirstControl()) + core->Ports().size()),
+          m_seen(core->Ports().size()) {
+        for (std::size_t i = 0; i < m_seen.size(); ++i) m_seen[i] = core->Ports()[i].start;
+        const auto* option =
+            static_cast<const LV2_Options_Option*>(Lv2Feature(features, LV2_OPTIONS__options));
         for (; option && option->key != 0; ++option)
             if (option->key == m_ids.longest && option->type == m_ids.integer)
                 m_longest = *static_cast<const std::int32_t*>(option->value);
@@ -72,16 +65,16 @@ public:
     void Connect(std::uint32_t port, void* data) {
         if (port < m_ports.size()) m_ports[port] = data;
     }
-    void Activate() { m_adapter.Prepare(m_rate, m_longest); }
+    void Activate() { core->Prepare(m_rate, m_longest); }
 
     void Run(std::uint32_t frames) {
         if (const auto* const events = Port<const LV2_Atom_Sequence>(m_order.Time())) ReadTime(*events);
         if (const auto* const enabled = Port<const float>(m_order.Enabled()))
-            m_adapter.Bypass(!(*enabled > 0.5f));
+            core->Bypass(!(*enabled > 0.5f));
         for (std::size_t i = 0; i < m_seen.size(); ++i) {
             const auto* const value = Port<const float>(m_order.FirstControl() + static_cast<int>(i));
-            if (!value || *value == m_seen[i] || std::isnan(*value)) continue;
-            m_adapter.Set(static_cast<int>(i), m_seen[i] = *value);
+            if (!value || core->Ports()[i].isOutput || *value == m_seen[i] || std::isnan(*value)) continue;
+            core->Set(static_cast<int>(i), m_seen[i] = *value);
         }
         const float *in[2]{}, *side[2]{};
         float* out[2]{};
@@ -92,14 +85,18 @@ public:
             whole = whole && in[c] && out[c];
         }
         for (int c = 0; c < m_order.sideChannels; ++c) side[c] = Port<const float>(m_order.FirstSide() + c);
-        m_adapter.Run(in, out, side, whole ? static_cast<int>(frames) : 0);
+        core->Run(in, out, side, whole ? static_cast<int>(frames) : 0);
         if (auto* const latency = Port<float>(m_order.Latency()))
-            *latency = static_cast<float>(m_adapter.Latency());
+            *latency = static_cast<float>(core->Latency());
+        for (std::size_t i = 0; i < m_seen.size(); ++i)
+            if (auto* const value = Port<float>(m_order.FirstControl() + static_cast<int>(i));
+                value && core->Ports()[i].isOutput)
+                *value = core->Value(static_cast<int>(i));
     }
 
     LV2_State_Status Save(LV2_State_Store_Function store, LV2_State_Handle handle) {
         if (m_ids.settings == 0) return LV2_STATE_ERR_NO_FEATURE;
-        const auto bytes = m_adapter.State();
+        const auto bytes = core->State();
         return store(handle, m_ids.settings, bytes.data(), bytes.size(), m_ids.chunk,
                      LV2_STATE_IS_POD | LV2_STATE_IS_PORTABLE);
     }
@@ -111,7 +108,7 @@ public:
         if (!data) return LV2_STATE_ERR_NO_PROPERTY;
         if (type != m_ids.chunk) return LV2_STATE_ERR_BAD_TYPE;
         const auto* const bytes = static_cast<const std::uint8_t*>(data);
-        return m_adapter.TakeState({bytes, bytes + size}) ? LV2_STATE_SUCCESS : LV2_STATE_ERR_UNKNOWN;
+        return core->TakeState({bytes, bytes + size}) ? LV2_STATE_SUCCESS : LV2_STATE_ERR_UNKNOWN;
     }
 
 private:
@@ -142,12 +139,11 @@ private:
             if (bpm) m_bpm = NumberOf(bpm);
             if (beats) m_numerator = static_cast<int>(NumberOf(beats));
             if (unit) m_denominator = static_cast<int>(NumberOf(unit));
-            m_adapter.Tempo(m_bpm, m_numerator, m_denominator);
+            core->Tempo(m_bpm, m_numerator, m_denominator);
         }
     }
 
     const Identifiers m_ids;
-    Adapter m_adapter;
     const Lv2Ports m_order;
     const double m_rate;
     int m_longest = 4096;
@@ -156,6 +152,8 @@ private:
     double m_bpm = 120.0;
     int m_numerator = 4, m_denominator = 4;
 };
+
+Lv2Plugin& Of(LV2_Handle plugin) { return static_cast<Lv2Plugin&>(*static_cast<Lv2Instance*>(plugin)); }
 
 // Two descriptors for each row: of two channels, and of one.
 struct Entry {
@@ -179,13 +177,11 @@ const std::vector<Entry>& Entries() {
             entry.descriptor = {
                 entry.uri.c_str(),
                 Instantiate,
-                [](LV2_Handle plugin, std::uint32_t port, void* data) {
-                    static_cast<Lv2Plugin*>(plugin)->Connect(port, data);
-                },
-                [](LV2_Handle plugin) { static_cast<Lv2Plugin*>(plugin)->Activate(); },
-                [](LV2_Handle plugin, std::uint32_t frames) { static_cast<Lv2Plugin*>(plugin)->Run(frames); },
+                [](LV2_Handle plugin, std::uint32_t port, void* data) { Of(plugin).Connect(port, data); },
+                [](LV2_Handle plugin) { Of(plugin).Activate(); },
+                [](LV2_Handle plugin, std::uint32_t frames) { Of(plugin).Run(frames); },
                 nullptr,
-                [](LV2_Handle plugin) { delete static_cast<Lv2Plugin*>(plugin); },
+                [](LV2_Handle plugin) { delete static_cast<Lv2Instance*>(plugin); },
                 [](const char* uri) -> const void* {
                     return std::strcmp(uri, LV2_STATE__interface) == 0 ? &kState : nullptr;
                 }};
@@ -198,7 +194,7 @@ LV2_Handle Instantiate(const LV2_Descriptor* descriptor, double rate, const char
                        const LV2_Feature* const* features) {
     for (const Entry& entry : Entries())
         if (&entry.descriptor == descriptor) try {
-                return new Lv2Plugin(*entry.row, entry.channels, rate, features);
+                return static_cast<Lv2Instance*>(new Lv2Plugin(*entry.row, entry.channels, rate, features));
             } catch (const std::exception&) {
                 return nullptr;  // no memory
             }
@@ -207,9 +203,9 @@ LV2_Handle Instantiate(const LV2_Descriptor* descriptor, double rate, const char
 
 const LV2_State_Interface kState{
     [](LV2_Handle plugin, LV2_State_Store_Function store, LV2_State_Handle handle, std::uint32_t,
-       const LV2_Feature* const*) { return static_cast<Lv2Plugin*>(plugin)->Save(store, handle); },
+       const LV2_Feature* const*) { return Of(plugin).Save(store, handle); },
     [](LV2_Handle plugin, LV2_State_Retrieve_Function retrieve, LV2_State_Handle handle, std::uint32_t,
-       const LV2_Feature* const*) { return static_cast<Lv2Plugin*>(plugin)->Restore(retrieve, handle); }};
+       const LV2_Feature* const*) { return Of(plugin).Restore(retrieve, handle); }};
 
 }  // namespace
 

@@ -20,5 +20,7 @@ struct Lv2Ports {
 
 // What the settings are stored under.
 inline constexpr char kLv2SettingsKey[] = "urn:dspdll:settings";
+// The window of all plug-ins of a file that have one.
+inline constexpr char kLv2WindowUri[] = "urn:dspdll:window";
 
 }  // namespace Corvo::Plugins

@@ -8,7 +8,7 @@
 #include <string>
 #include <string_view>
 
-#include "Adapter.h"
+#include "Core.h"
 #include "Lv2Ports.h"
 
 // Writes what LV2 hosts read about the plug-ins and their presets: dsp_lv2_turtle FOLDER BINARY
@@ -28,6 +28,7 @@ constexpr char kPrefixes[] = R"(@prefix atom: <http://lv2plug.in/ns/ext/atom#> .
 @prefix rdfs: <http://www.w3.org/2000/01/rdf-schema#> .
 @prefix rsz: <http://lv2plug.in/ns/ext/resize-port#> .
 @prefix state: <http://lv2plug.in/ns/ext/state#> .
+@prefix ui: <http://lv2plug.in/ns/extensions/ui#> .
 @prefix units: <http://lv2plug.in/ns/extensions/units#> .
 @prefix xsd: <http://www.w3.org/2001/XMLSchema#> .
 )";
@@ -92,21 +93,21 @@ class PluginTurtle {
 public:
     PluginTurtle(const PluginRow& row, int channels)
         : m_row(row),
-          m_adapter(row, channels),
-          m_order{channels, m_adapter.SideChannels(), row.tempo},
+          m_core(MakeCore(row, channels)),
+          m_order{channels, m_core->SideChannels(), row.tempo},
           m_uri(PluginUri(row, channels)) {}
 
     void WriteManifest(File& file, const std::string& binary) {
         file << "\n<" << m_uri << ">\n    a lv2:Plugin ;\n    lv2:binary <" << binary << "> ;\n"
              << "    rdfs:seeAlso <" << m_row.id << ".ttl> .\n";
-        for (int preset = 0; preset < m_adapter.Presets(); ++preset)
+        for (int preset = 0; preset < m_core->Presets(); ++preset)
             file << "\n<" << PresetUri(preset) << ">\n    a pset:Preset ;\n    lv2:appliesTo <" << m_uri
-                 << "> ;\n    rdfs:label " << Quoted(m_adapter.PresetName(preset)) << " ;\n"
+                 << "> ;\n    rdfs:label " << Quoted(m_core->PresetName(preset)) << " ;\n"
                  << "    rdfs:seeAlso <" << m_row.id << "-presets.ttl> .\n";
     }
 
     void WritePlugin(File& file) {
-        const auto& groups = LayoutOf(m_row, m_order.channels).groups;
+        const auto& groups = m_core->Groups();
         for (std::size_t i = 0; i < groups.size(); ++i)
             file << "\n<" << GroupUri(i) << ">\n    a pg:InputGroup ;\n    lv2:name " << Quoted(groups[i])
                  << " ;\n    lv2:symbol " << Quoted(SymbolOf(groups[i])) << " .\n";
@@ -122,24 +123,25 @@ public:
                 "<http://lv2plug.in/ns/ext/options#options>, "
                 "<http://lv2plug.in/ns/ext/buf-size#boundedBlockLength>"
              << (m_row.realTime ? ", lv2:hardRTCapable" : "") << " ;\n"
+             << (m_core->HasWindow() ? std::string("    ui:ui <") + kLv2WindowUri + "> ;\n" : "")
              << "    <http://lv2plug.in/ns/ext/options#supportedOption> "
                 "<http://lv2plug.in/ns/ext/buf-size#maxBlockLength> ;\n    lv2:port";
         WriteAudio(file);
         WriteFixed(file);
-        for (std::size_t i = 0; i < m_adapter.Ports().size(); ++i) WriteControl(file, i);
+        for (std::size_t i = 0; i < m_core->Ports().size(); ++i) WriteControl(file, i);
         file << " .\n";
     }
 
     void WritePresets(File& file) {
-        for (int preset = 0; preset < m_adapter.Presets(); ++preset) {
-            m_adapter.TakePreset(preset);
+        for (int preset = 0; preset < m_core->Presets(); ++preset) {
+            m_core->TakePreset(preset);
             file << "\n<" << PresetUri(preset) << ">\n    a pset:Preset ;\n    lv2:appliesTo <" << m_uri
-                 << "> ;\n    rdfs:label " << Quoted(m_adapter.PresetName(preset)) << " ;\n"
-                 << "    state:state [ <" << kLv2SettingsKey << "> \"" << Base64(m_adapter.State())
+                 << "> ;\n    rdfs:label " << Quoted(m_core->PresetName(preset)) << " ;\n"
+                 << "    state:state [ <" << kLv2SettingsKey << "> \"" << Base64(m_core->State())
                  << "\"^^xsd:base64Binary ] ;\n    lv2:port";
-            for (std::size_t i = 0; i < m_adapter.Ports().size(); ++i)
-                file << (i > 0 ? "," : "") << "\n        [ lv2:symbol " << Quoted(m_adapter.Ports()[i].symbol)
-                     << " ; pset:value " << Number(m_adapter.Value(static_cast<int>(i))) << " ]";
+            for (std::size_t i = 0; i < m_core->Ports().size(); ++i)
+                file << (i > 0 ? "," : "") << "\n        [ lv2:symbol " << Quoted(m_core->Ports()[i].symbol)
+                     << " ; pset:value " << Number(m_core->Value(static_cast<int>(i))) << " ]";
             file << " .\n";
         }
     }
@@ -196,13 +198,14 @@ private:
     }
 
     void WriteControl(File& file, std::size_t index) {
-        const Port& port = m_adapter.Ports()[index];
+        const Port& port = m_core->Ports()[index];
         const bool toggled = port.type == Corvo::EffectParameterType::Switch;
-        Begin(file, m_order.FirstControl() + static_cast<int>(index), "lv2:InputPort, lv2:ControlPort",
+        Begin(file, m_order.FirstControl() + static_cast<int>(index),
+              port.isOutput ? "lv2:OutputPort, lv2:ControlPort" : "lv2:InputPort, lv2:ControlPort",
               port.symbol, port.name);
-        file << "        lv2:default " << Number(port.start) << " ;\n        lv2:minimum "
-             << Number(port.least) << " ;\n        lv2:maximum " << Number(port.most)
-             << " ;\n        rdfs:comment " << Quoted(port.comment) << " ;\n";
+        if (!port.isOutput) file << "        lv2:default " << Number(port.start) << " ;\n";
+        file << "        lv2:minimum " << Number(port.least) << " ;\n        lv2:maximum "
+             << Number(port.most) << " ;\n        rdfs:comment " << Quoted(port.comment) << " ;\n";
         // Short enough for a narrow strip.
         if (port.name.size() > 16)
             file << "        lv2:shortName " << Quoted(port.name.substr(0, 16)) << " ;\n";
@@ -222,7 +225,7 @@ private:
     }
 
     const PluginRow& m_row;
-    Adapter m_adapter;
+    const std::unique_ptr<Core> m_core;
     const Lv2Ports m_order;
     const std::string m_uri;
 };
@@ -245,6 +248,13 @@ void WriteAll(const std::string& folder, const std::string& binary) {
         plugin.Close();
         presets.Close();
     }
+    if (MakeCore(PluginRows()[0], 2)->HasWindow())
+        manifest << "\n<" << kLv2WindowUri << ">\n    a ui:X11UI ;\n    lv2:binary <" << binary << "> ;\n"
+                 << "    lv2:requiredFeature ui:idleInterface, "
+                    "<http://lv2plug.in/ns/ext/instance-access> ;\n"
+                    "    lv2:optionalFeature ui:parent, ui:resize, <http://lv2plug.in/ns/ext/urid#map>, "
+                    "<http://lv2plug.in/ns/ext/options#options> ;\n"
+                    "    lv2:extensionData ui:idleInterface .\n";
     manifest.Close();
 }
 

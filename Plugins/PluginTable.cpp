@@ -1,8 +1,6 @@
 #include "PluginTable.h"
 
-#include <algorithm>
-#include <iterator>
-
+#include "Adapter.h"
 #include "DSP/Effects/EffectKinds.h"
 #include "EqualiserEffect.h"
 
@@ -37,18 +35,8 @@ std::unique_ptr<DSP::CorvoEffectBase> PluginRow::Make() const {
 
 std::span<const PluginRow> PluginRows() { return kRows; }
 
-const PluginRow* FindPluginRow(std::string_view id) {
-    const auto* const found =
-        std::ranges::find_if(kRows, [id](const PluginRow& row) { return row.id == id; });
-    return found == std::end(kRows) ? nullptr : found;
-}
-
-std::string PluginUri(const PluginRow& row, int channels) {
-    return std::string("urn:dspdll:") + row.id + (channels == 1 ? "-mono" : "");
-}
-
-std::string PluginName(const PluginRow& row, int channels) {
-    return std::string(row.name) + (channels == 1 ? " (mono)" : "");
+std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start start) {
+    return std::make_unique<Adapter>(row, channels, start);
 }
 
 }  // namespace Corvo::Plugins

@@ -11,7 +11,7 @@ namespace Corvo::Plugins {
 
 // What distinguishes one plug-in from another. Everything else comes from its effect.
 struct PluginRow {
-    const char* name;          // what GetName() of the effect says
+    const char* name;          // what GetName() of an effect says
     const char* id;            // part of the identifiers and file names; never changes
     const char* code;          // four letters, its identity as VST3; never changes
     int minorVersion;          // odd while it grows; raised when ports are added
@@ -25,15 +25,18 @@ struct PluginRow {
     bool smooth;               // the effect itself moves smoothly to what it is set to, or is too slow to
     const char* about;
 
-    std::unique_ptr<DSP::CorvoEffectBase> Make() const;  // throws std::bad_alloc
+    std::unique_ptr<DSP::CorvoEffectBase> Make() const;  // of an effect; throws std::bad_alloc
 };
 
-// Every plug-in, in the order in which hosts list them. Any thread.
+// Every plug-in of the file, in the order in which hosts list them. Any thread.
 std::span<const PluginRow> PluginRows();
 const PluginRow* FindPluginRow(std::string_view id);  // null where there is none
 
 // A plug-in comes for one channel and for two.
 std::string PluginUri(const PluginRow& row, int channels);
 std::string PluginName(const PluginRow& row, int channels);
+
+// A name as an identifier: letters, digits and "_".
+std::string SymbolOf(const std::string& name);
 
 }  // namespace Corvo::Plugins

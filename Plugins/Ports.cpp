@@ -157,17 +157,4 @@ const Layout& LayoutOf(const PluginRow& row, int channels) {
     return found->second;
 }
 
-std::string SymbolOf(const std::string& name) {
-    std::string symbol;
-    for (const char c : name) {
-        if (c == '#')
-            symbol += "_sharp";
-        else if (c >= 'A' && c <= 'Z')
-            symbol += static_cast<char>(c - 'A' + 'a');
-        else
-            symbol += (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') ? c : '_';
-    }
-    return symbol;
-}
-
 }  // namespace Corvo::Plugins

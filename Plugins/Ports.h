@@ -15,7 +15,7 @@ struct Port {
         float value;
     };
 
-    int parameter = 0;    // external index of the effect
+    int parameter = 0;    // external index of an effect
     std::string symbol;   // unique within the plug-in; never changes
     std::string name;     // " L" and " R" where the effect has sides
     std::string unit;     // empty where numbers have none
@@ -26,6 +26,7 @@ struct Port {
     float start = 0.0f;         // what a new instance has
     bool whole = false;         // a few whole numbers only
     bool glides = false;        // moves to its values in small steps
+    bool isOutput = false;      // tells the host a value, and is none of its own
     bool momentary = false;     // a switch that does something, and is no setting: off after loading
     bool isNumber = false;      // the effect shows numbers
     double resolution = 1.0;    // of the values that are told
@@ -50,8 +51,5 @@ struct Layout {
 
 // The ports of a plug-in. Made once each, on the first call; any thread, not the audio thread.
 const Layout& LayoutOf(const PluginRow& row, int channels);
-
-// A name as an identifier: letters, digits and "_".
-std::string SymbolOf(const std::string& name);
 
 }  // namespace Corvo::Plugins

@@ -1,8 +1,11 @@
 #include <algorithm>
 #include <cmath>
+#include <cstring>
+#include <utility>
 
 #include "Vst3Plugin.h"
 #include "Vst3Text.h"
+#include "Vst3View.h"
 
 // What a VST3 host shows of a plug-in: parameters, units and programs.
 namespace Corvo::Plugins {
@@ -15,7 +18,13 @@ constexpr std::int32_t kRoot = 0, kProgramList = 1, kNone = -1;
 // The component is this object and has it already.
 v3_result Vst3Plugin::TakeComponentState(v3_bstream**) { return V3_OK; }
 v3_result Vst3Plugin::NoState(v3_bstream**) { return V3_NOT_IMPLEMENTED; }
-v3_plugin_view** Vst3Plugin::CreateView(const char*) { return nullptr; }
+
+v3_plugin_view** Vst3Plugin::CreateView(const char* name) {
+    if (std::strcmp(name, "editor") != 0 || !m_core->HasWindow()) return nullptr;
+    auto window = m_core->MakeWindow();
+    if (!window) return nullptr;
+    return (new Vst3View(std::move(window), reinterpret_cast<v3_funknown**>(&m_component)))->Face();
+}
 
 std::int32_t Vst3Plugin::ParameterCount() { return static_cast<std::int32_t>(m_parameters.Count()); }
 
@@ -40,7 +49,7 @@ double Vst3Plugin::ToPlain(v3_param_id id, double normalised) { return m_paramet
 double Vst3Plugin::ToNormalised(v3_param_id id, double plain) { return m_parameters.Normalised(id, plain); }
 
 double Vst3Plugin::Value(v3_param_id id) {
-    if (id == Vst3Parameters::kLatency) return m_parameters.Normalised(id, m_adapter.Latency());
+    if (id == Vst3Parameters::kLatency) return m_parameters.Normalised(id, m_core->Latency());
     const auto index = m_parameters.Find(id);
     return index ? m_values[*index].load() : 0.0;
 }
@@ -54,7 +63,7 @@ v3_result Vst3Plugin::SetValue(v3_param_id id, double normalised) {
     const int before = ProgramNow();
     if (id != Vst3Parameters::kLatency) m_values[*index] = normalised;
     if (const int program = ProgramNow(); program != before) {
-        m_adapter.TakePreset(program);
+        m_core->TakePreset(program);
         ShowValues();
         m_sendAll = true;
     }
@@ -69,10 +78,10 @@ int Vst3Plugin::ProgramNow() const {
 
 // After the effect's settings changed as a whole.
 void Vst3Plugin::ShowValues() {
-    m_values[Vst3Parameters::kBypass] = m_adapter.Bypassed() ? 1.0 : 0.0;
-    for (std::size_t i = 0; i < m_adapter.Ports().size(); ++i)
+    m_values[Vst3Parameters::kBypass] = m_core->Bypassed() ? 1.0 : 0.0;
+    for (std::size_t i = 0; i < m_core->Ports().size(); ++i)
         m_values[i + 1] = m_parameters.Normalised(static_cast<v3_param_id>(i + 1),
-                                                  static_cast<double>(m_adapter.Value(static_cast<int>(i))));
+                                                  static_cast<double>(m_core->Value(static_cast<int>(i))));
 }
 
 v3_result Vst3Plugin::SetHandler(v3_component_handler** handler) {
@@ -87,11 +96,11 @@ void Vst3Plugin::Restart(std::int32_t flags) {
 }
 
 void Vst3Plugin::TellLatency() {
-    const int latency = m_adapter.Latency();
+    const int latency = m_core->Latency();
     if (m_toldLatency.exchange(latency) != latency) Restart(V3_RESTART_LATENCY_CHANGED);
 }
 
-const std::vector<std::string>& Vst3Plugin::Groups() const { return LayoutOf(m_row, 2).groups; }
+const std::vector<std::string>& Vst3Plugin::Groups() const { return m_core->Groups(); }
 
 std::int32_t Vst3Plugin::UnitCount() { return static_cast<std::int32_t>(Groups().size()) + 1; }
 

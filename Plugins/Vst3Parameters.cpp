@@ -13,24 +13,23 @@ constexpr double kMostFrames = 1 << 20;
 const std::string kSwitchTexts[]{"Off", "On"};
 
 // The unit that the texts of a port end with; empty where they do not all, or show no number.
-std::string UnitOf(Adapter& adapter, int index) {
-    const Port& port = adapter.Ports()[static_cast<std::size_t>(index)];
+std::string UnitOf(Core& core, int index) {
+    const Port& port = core.Ports()[static_cast<std::size_t>(index)];
     const std::string ending = " " + port.unit;
     if (port.unit.empty() || !port.isNumber) return {};
     for (int i = 1; i < 8; ++i)
-        if (!adapter.Text(index, port.curve.Number(static_cast<float>(i) / 8.0f)).ends_with(ending))
-            return {};
+        if (!core.Text(index, port.curve.Number(static_cast<float>(i) / 8.0f)).ends_with(ending)) return {};
     return port.unit;
 }
 
 }  // namespace
 
-Vst3Parameters::Vst3Parameters(Adapter& adapter) : m_adapter(adapter), m_ids{kBypass} {
-    for (std::size_t i = 0; i < adapter.Ports().size(); ++i) {
+Vst3Parameters::Vst3Parameters(Core& core) : m_core(core), m_ids{kBypass} {
+    for (std::size_t i = 0; i < core.Ports().size(); ++i) {
         m_ids.push_back(static_cast<v3_param_id>(i + 1));
-        m_units.push_back(UnitOf(adapter, static_cast<int>(i)));
+        m_units.push_back(UnitOf(core, static_cast<int>(i)));
     }
-    for (int i = 0; i < adapter.Presets(); ++i) m_programs.push_back(adapter.PresetName(i));
+    for (int i = 0; i < core.Presets(); ++i) m_programs.push_back(core.PresetName(i));
     if (!m_programs.empty()) m_ids.push_back(kProgram);
     m_ids.push_back(kLatency);
 }
@@ -42,7 +41,7 @@ std::optional<std::size_t> Vst3Parameters::Find(v3_param_id id) const {
 }
 
 const Port* Vst3Parameters::PortOf(v3_param_id id) const {
-    return id > 0 && id <= m_adapter.Ports().size() ? &m_adapter.Ports()[id - 1] : nullptr;
+    return id > 0 && id <= m_core.Ports().size() ? &m_core.Ports()[id - 1] : nullptr;
 }
 
 int Vst3Parameters::Steps(v3_param_id id) const {
@@ -71,14 +70,15 @@ bool Vst3Parameters::Info(std::size_t index, v3_param_info& info) const {
     if (!port) return true;
     CopyText(info.units, m_units[id - 1]);
     info.unit_id = port->group + 1;
-    if (!port->momentary) info.flags |= V3_PARAM_CAN_AUTOMATE;
+    if (!port->momentary && !port->isOutput) info.flags |= V3_PARAM_CAN_AUTOMATE;
+    if (port->isOutput) info.flags |= V3_PARAM_READ_ONLY;
     if (port->type == EffectParameterType::List) info.flags |= V3_PARAM_IS_LIST;
     return true;
 }
 
 double Vst3Parameters::Start(v3_param_id id) const {
     if (const Port* const port = PortOf(id)) return Normalised(id, static_cast<double>(port->start));
-    return id == kProgram ? Normalised(id, m_adapter.StartPreset()) : 0.0;
+    return id == kProgram ? Normalised(id, m_core.StartPreset()) : 0.0;
 }
 
 double Vst3Parameters::Plain(v3_param_id id, double normalised) const {
@@ -109,7 +109,7 @@ std::string Vst3Parameters::Text(v3_param_id id, double normalised) const {
     if (id == kBypass) return kSwitchTexts[number];
     if (id == kProgram) return Program(number);
     if (id == kLatency) return std::to_string(number);
-    std::string text = m_adapter.Text(static_cast<int>(id) - 1, static_cast<float>(plain));
+    std::string text = m_core.Text(static_cast<int>(id) - 1, static_cast<float>(plain));
     const std::string& unit = m_units[id - 1];
     if (!unit.empty() && text.ends_with(" " + unit)) text.resize(text.size() - unit.size() - 1);
     return text;
@@ -130,7 +130,7 @@ std::optional<double> Vst3Parameters::FromText(v3_param_id id, const std::string
     const std::string& unit = m_units[id - 1];
     const bool complete = unit.empty() || text.ends_with(unit) || std::ranges::any_of(port->points, isText);
     float value = 0.0f;
-    if (!m_adapter.FromText(index, complete ? text : text + " " + unit, value)) return {};
+    if (!m_core.FromText(index, complete ? text : text + " " + unit, value)) return {};
     return Normalised(id, static_cast<double>(value));
 }
 

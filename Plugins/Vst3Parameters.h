@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "Adapter.h"
+#include "Core.h"
 
 namespace Corvo::Plugins {
 
@@ -20,7 +20,7 @@ public:
     // tell that the latency is another.
     static constexpr v3_param_id kLatency = 0x1001;
 
-    explicit Vst3Parameters(Adapter& adapter);
+    explicit Vst3Parameters(Core& core);
 
     std::size_t Count() const { return m_ids.size(); }
     v3_param_id Id(std::size_t index) const { return m_ids[index]; }
@@ -42,7 +42,7 @@ public:
 private:
     int Steps(v3_param_id id) const;
 
-    Adapter& m_adapter;
+    Core& m_core;
     std::vector<v3_param_id> m_ids;
     std::vector<std::string> m_programs, m_units;  // m_units: of the ports
 };

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "SavedState.h"
 #include "Vst3Text.h"
@@ -58,9 +59,9 @@ Vst3Plugin::Vst3Plugin(const PluginRow& row)
       m_controller{&Tables::kController, this},
       m_units{&Tables::kUnits, this},
       m_requirements{&Tables::kRequirements, this},
-      m_row(row),
-      m_adapter(row, 2),
-      m_parameters(m_adapter),
+      m_core(MakeCore(row, 2)),
+      m_parameters(*m_core),
+      m_hasOutputs(std::ranges::count(m_core->Ports(), true, &Port::isOutput) > 0),
       m_values(m_parameters.Count()) {
     m_queues.reserve(m_parameters.Count());
     for (std::size_t i = 0; i < m_values.size(); ++i) m_values[i] = m_parameters.Start(m_parameters.Id(i));
@@ -105,7 +106,7 @@ v3_result Vst3Plugin::Routing(v3_routing_info*, v3_routing_info*) { return V3_NO
 
 std::int32_t Vst3Plugin::BusCount(std::int32_t media, std::int32_t direction) {
     if (media != V3_AUDIO) return 0;
-    return direction == V3_INPUT && m_adapter.SideChannels() > 0 ? 2 : 1;
+    return direction == V3_INPUT && m_core->SideChannels() > 0 ? 2 : 1;
 }
 
 bool Vst3Plugin::HasBus(std::int32_t media, std::int32_t direction, std::int32_t bus) {
@@ -119,7 +120,7 @@ v3_result Vst3Plugin::BusInfo(std::int32_t media, std::int32_t direction, std::i
     *info = {};
     info->media_type = media;
     info->direction = direction;
-    info->channel_count = main ? m_adapter.Channels() : m_sideIsMono ? 1 : m_adapter.SideChannels();
+    info->channel_count = main ? m_core->Channels() : m_sideIsMono ? 1 : m_core->SideChannels();
     CopyText(info->bus_name, !main ? "Side-chain" : direction == V3_INPUT ? "In" : "Out");
     info->bus_type = main ? V3_MAIN : V3_AUX;
     info->flags = main ? V3_DEFAULT_ACTIVE : 0;
@@ -138,7 +139,7 @@ v3_result Vst3Plugin::SetArrangements(v3_speaker_arrangement* in, std::int32_t i
     if (m_active || ins < 1 || ins > BusCount(V3_AUDIO, V3_INPUT) || outs != 1) return V3_FALSE;
     if (in[0] != out[0] || (in[0] != kMono && in[0] != kStereo)) return V3_FALSE;
     if (ins == 2 && in[1] != in[0] && in[1] != kMono) return V3_FALSE;
-    m_adapter.SetChannels(in[0] == kMono ? 1 : 2);
+    m_core->SetChannels(in[0] == kMono ? 1 : 2);
     m_sideIsMono = ins == 2 && in[1] == kMono;
     return V3_OK;
 }
@@ -154,19 +155,17 @@ v3_result Vst3Plugin::Arrangement(std::int32_t direction, std::int32_t bus,
 v3_result Vst3Plugin::SetState(v3_bstream** stream) {
     if (!stream) return V3_INVALID_ARG;
     std::vector<std::uint8_t> bytes;
-    std::uint8_t buffer[4096];
-    for (;;) {
+    ReadAll(bytes, [stream](void* buffer, std::size_t size) {
         std::int32_t count = 0;
-        const auto result = v3_cpp_obj(stream)->read(stream, buffer, sizeof buffer, &count);
+        const auto wanted = static_cast<std::int32_t>(size);
         // Some streams fail at their end.
-        if (result != V3_OK || count <= 0) break;
-        bytes.insert(bytes.end(), buffer, buffer + std::min<std::int32_t>(count, sizeof buffer));
-    }
+        return v3_cpp_obj(stream)->read(stream, buffer, wanted, &count) == V3_OK ? count : 0;
+    });
     if (bytes.size() < kProgramBytes) return V3_FALSE;
     std::uint32_t program = 0;
     for (std::size_t i = kProgramBytes; i-- > 0;) program = program << 8 | bytes[i];
     if (program > 0 && program >= static_cast<std::uint32_t>(m_parameters.Programs())) return V3_FALSE;
-    if (!LoadState(m_adapter, {bytes.begin() + kProgramBytes, bytes.end()})) return V3_FALSE;
+    if (!LoadState(*m_core, {bytes.begin() + kProgramBytes, bytes.end()})) return V3_FALSE;
     ShowValues();
     if (const auto index = m_parameters.Find(Vst3Parameters::kProgram))
         m_values[*index] = m_parameters.Normalised(Vst3Parameters::kProgram, program);
@@ -179,16 +178,14 @@ v3_result Vst3Plugin::GetState(v3_bstream** stream) {
     std::vector<std::uint8_t> bytes;
     for (std::size_t i = 0; i < kProgramBytes; ++i)
         bytes.push_back(static_cast<std::uint8_t>(ProgramNow() >> 8 * i));
-    const auto state = SaveState(m_adapter);
+    const auto state = SaveState(*m_core);
     bytes.insert(bytes.end(), state.begin(), state.end());
-    for (std::size_t done = 0; done < bytes.size();) {
-        std::int32_t written = 0;
-        const auto left = static_cast<std::int32_t>(bytes.size() - done);
-        if (v3_cpp_obj(stream)->write(stream, bytes.data() + done, left, &written) != V3_OK || written <= 0)
-            return V3_FALSE;
-        done += static_cast<std::size_t>(written);
-    }
-    return V3_OK;
+    const bool isWritten = WriteAll(std::move(bytes), [stream](void* from, std::size_t size) {
+        std::int32_t count = 0;
+        const auto left = static_cast<std::int32_t>(size);
+        return v3_cpp_obj(stream)->write(stream, from, left, &count) == V3_OK ? count : 0;
+    });
+    return isWritten ? V3_OK : V3_FALSE;
 }
 
 }  // namespace Corvo::Plugins

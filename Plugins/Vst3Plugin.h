@@ -113,9 +113,9 @@ private:
 
     Face m_component, m_processor, m_controller, m_units, m_requirements;
     std::atomic<std::uint32_t> m_references{1};
-    const PluginRow& m_row;
-    Adapter m_adapter;
+    const std::unique_ptr<Core> m_core;
     const Vst3Parameters m_parameters;
+    const bool m_hasOutputs;
     std::vector<std::atomic<double>> m_values;  // what the host knows, normalised, in the parameters' order
     v3_component_handler** m_handler = nullptr;
     std::vector<Queue> m_queues;  // of the block at hand; never grows while processing

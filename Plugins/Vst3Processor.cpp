@@ -29,27 +29,27 @@ v3_result Vst3Plugin::Setup(v3_process_setup* setup) {
 
 v3_result Vst3Plugin::SetActive(v3_bool on) {
     m_active = on != 0;
-    if (m_active) m_adapter.Prepare(m_rate, m_longest);
+    if (m_active) m_core->Prepare(m_rate, m_longest);
     m_ran = false;
     return V3_OK;
 }
 
 v3_result Vst3Plugin::SetProcessing(v3_bool on) {
-    if (on && m_active && std::exchange(m_ran, false)) m_adapter.Reset();
+    if (on && m_active && std::exchange(m_ran, false)) m_core->Reset();
     return V3_OK;
 }
 
 std::uint32_t Vst3Plugin::Latency() {
-    m_toldLatency = m_adapter.Latency();
+    m_toldLatency = m_core->Latency();
     return static_cast<std::uint32_t>(m_toldLatency.load());
 }
 
 std::uint32_t Vst3Plugin::Tail() {
-    return m_row.rings ? kEndlessTail : static_cast<std::uint32_t>(m_adapter.Latency());
+    return m_core->Row().rings ? kEndlessTail : static_cast<std::uint32_t>(m_core->Latency());
 }
 
 std::uint32_t Vst3Plugin::Requirements() {
-    return m_row.tempo ? V3_PROCESS_CTX_NEED_TEMPO | V3_PROCESS_CTX_NEED_TIME_SIG : 0;
+    return m_core->Row().tempo ? V3_PROCESS_CTX_NEED_TEMPO | V3_PROCESS_CTX_NEED_TIME_SIG : 0;
 }
 
 v3_result Vst3Plugin::Process(v3_process_data* block) {
@@ -68,8 +68,8 @@ v3_result Vst3Plugin::Process(v3_process_data* block) {
             for (auto& pointer : pointers) pointer += pointer ? done : 0;
             return pointers;
         };
-        m_adapter.Run(piece(channels.in).data(), piece(channels.out).data(), piece(channels.side).data(),
-                      until - done);
+        m_core->Run(piece(channels.in).data(), piece(channels.out).data(), piece(channels.side).data(),
+                    until - done);
         done = until;
         if (done >= frames) break;
     }
@@ -83,8 +83,8 @@ v3_result Vst3Plugin::Process(v3_process_data* block) {
 void Vst3Plugin::TakeTempo(const v3_process_context* context) {
     if (!context || (context->state & V3_PROCESS_CTX_TEMPO_VALID) == 0) return;
     const bool hasMeter = (context->state & V3_PROCESS_CTX_TIME_SIG_VALID) != 0;
-    m_adapter.Tempo(context->bpm, hasMeter ? context->time_sig_numerator : 4,
-                    hasMeter ? context->time_sig_denom : 4);
+    m_core->Tempo(context->bpm, hasMeter ? context->time_sig_numerator : 4,
+                  hasMeter ? context->time_sig_denom : 4);
 }
 
 // The channels of the block; those that come without an input get silence. False without outputs.
@@ -94,13 +94,13 @@ bool Vst3Plugin::FindChannels(const v3_process_data& block, Channels& channels) 
             return nullptr;
         return buses[bus].channel_buffers_32[channel];
     };
-    for (int c = 0; c < m_adapter.Channels(); ++c) {
+    for (int c = 0; c < m_core->Channels(); ++c) {
         channels.in[c] = buffer(block.inputs, block.num_input_buses, 0, c);
         channels.out[c] = buffer(block.outputs, block.num_output_buses, 0, c);
         if (!channels.out[c]) return false;
         if (m_sideIsOn) channels.side[c] = buffer(block.inputs, block.num_input_buses, 1, c);
     }
-    for (int c = 0; c < m_adapter.Channels(); ++c)
+    for (int c = 0; c < m_core->Channels(); ++c)
         if (!channels.in[c]) {
             std::fill_n(channels.out[c], block.nframes, 0.0f);
             channels.in[c] = channels.out[c];
@@ -120,7 +120,8 @@ void Vst3Plugin::FindQueues(v3_param_changes** changes) {
         auto** const queue = v3_cpp_obj(changes)->get_param_data(changes, i);
         if (!queue) continue;
         const auto id = v3_cpp_obj(queue)->get_param_id(queue);
-        if (id != Vst3Parameters::kBypass && !m_parameters.PortOf(id)) continue;
+        const Port* const port = m_parameters.PortOf(id);
+        if (id != Vst3Parameters::kBypass && (!port || port->isOutput)) continue;
         m_queues.push_back({queue, id, 0, v3_cpp_obj(queue)->get_point_count(queue), kNever, 0.0});
         m_queues.back().Advance();
     }
@@ -141,25 +142,25 @@ void Vst3Plugin::TakeChange(v3_param_id id, double normalised) {
     normalised = std::clamp(normalised, 0.0, 1.0);
     const double plain = m_parameters.Plain(id, normalised);
     if (id == Vst3Parameters::kBypass)
-        m_adapter.Bypass(plain > 0.5);
+        m_core->Bypass(plain > 0.5);
     else
-        m_adapter.Set(static_cast<int>(id) - 1, static_cast<float>(plain));
+        m_core->Set(static_cast<int>(id) - 1, static_cast<float>(plain));
     m_values[id] = normalised;
 }
 
 // What became different by itself. The host hands it to the controller on its own thread.
 void Vst3Plugin::Send(v3_param_changes** changes) {
     const bool all = m_sendAll.exchange(false);
-    if (m_adapter.TakeOtherValues() || all)
-        for (std::size_t i = 0; i < m_adapter.Ports().size(); ++i) {
+    if (m_core->TakeOtherValues() || all || m_hasOutputs)
+        for (std::size_t i = 0; i < m_core->Ports().size(); ++i) {
             const auto id = static_cast<v3_param_id>(i + 1);
-            const auto plain = static_cast<double>(m_adapter.Value(static_cast<int>(i)));
+            const auto plain = static_cast<double>(m_core->Value(static_cast<int>(i)));
             const double value = m_parameters.Normalised(id, plain);
             if (!all && std::abs(value - m_values[id]) < 1e-5) continue;
             m_values[id] = value;
             SendValue(changes, id, value);
         }
-    const int latency = m_adapter.Latency();
+    const int latency = m_core->Latency();
     if (latency != m_toldLatency && latency != m_sentLatency)
         SendValue(changes, Vst3Parameters::kLatency,
                   m_parameters.Normalised(Vst3Parameters::kLatency, latency));

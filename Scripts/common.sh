@@ -27,7 +27,7 @@ BUILD_PACKAGES=(g++ cmake ninja-build ccache pkg-config libxsimd-dev libsndfile1
     nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev libsdl2-dev fonts-dejavu-core)
 TEST_PACKAGES=(libgtest-dev binutils abigail-tools)
 CLANG_PACKAGES=(clang libclang-rt-dev)
-PLUGIN_PACKAGES=(dpf-source libx11-dev libxcursor-dev libxext-dev libxrandr-dev libgl-dev)
+PLUGIN_PACKAGES=(dpf-source libxcb1-dev)
 
 # What installs them by hand.
 install_command() { echo "apt-get install --no-install-recommends ${BUILD_PACKAGES[*]} ${TEST_PACKAGES[*]}"; }

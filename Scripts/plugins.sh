@@ -22,18 +22,14 @@ times=("$(printf '%4d s  building' $((SECONDS - begin)))")
 build=$PWD/build/plugins
 work=$build/hosts
 dsphost=$PWD/build/release/bin/dsphost
-lv2=$build/lv2/dspdll.lv2 clap=$build/clap/dspdll.clap
-# One file with all of them, or one for each.
-vst3_in() {
-    if [ -e "$1/dspdll.vst3" ]; then echo "$1/dspdll.vst3"; else ls -d "$1"/*.vst3 | grep -v analyser; fi
-}
-mapfile -t vst3 < <(vst3_in "$build/vst3")
+lv2=$build/lv2/dspdll.lv2 clap=$build/clap/dspdll.clap vst3=$build/vst3/dspdll.vst3
+analyser=dspdll-analyser-plugin
 rm -rf "$work"
 mkdir -p "$work"/{lv2,home/.vst3,home/.clap}
 
 # The hosts see these plug-ins and no others, and write nothing outside of the build folder.
 ln -s $(dpkg -L lv2-dev | grep -E '^/usr/lib/lv2/[^/]+\.lv2$') "$lv2" "$work/lv2"
-ln -s "${vst3[@]}" "$work/home/.vst3"
+ln -s "$vst3" "$work/home/.vst3"
 ln -s "$clap" "$work/home/.clap"
 real_home=$HOME real_cache=${XDG_CACHE_HOME:-}
 export HOME=$work/home LV2_PATH=$work/lv2 LADSPA_PATH=$work CLAP_PATH=$work/home/.clap
@@ -149,6 +145,13 @@ render_with_lv2apply() {
     log=$(timeout 60 lv2apply -i "$(input_of "$1")" -o "$out" "${values[@]}" "$1" 2>&1) ||
         { echo "$1: lv2apply ends with $?: $log"; return 1; }
     expect_or_sounds "$1" "$out"
+}
+
+pass_through_analyser() {
+    local out=$work/analyser.wav log
+    log=$(LV2_PATH=$build/lv2 timeout 60 lv2apply -i "$work/in2.wav" -o "$out" urn:dspdll:analyser 2>&1) ||
+        { echo "lv2apply ends with $?: $log"; return 1; }
+    "$python" "$hosts/compare.py" "$work/in2.wav" "$out" 0
 }
 
 render_with_ffmpeg() {
@@ -269,7 +272,7 @@ check_windows() {
     cmake --build $windows_build --target dsp_plugins plugin_host
     rm -rf $stage
     mkdir $stage
-    cp -r $windows_build/bin/plugin_host.exe $windows_build/clap/dspdll.clap $(vst3_in $windows_build/vst3) $stage
+    cp -r $windows_build/bin/plugin_host.exe $windows_build/clap/dspdll.clap $windows_build/vst3/dspdll.vst3 $stage
     # One file is one plug-in: it needs no DLL but the system's.
     for file in $stage/*.clap $stage/*.vst3/Contents/*/*.vst3; do
         ! x86_64-w64-mingw32-objdump -p "$file" | grep 'DLL Name: lib' || { echo "${file##*/} needs it"; return 1; }
@@ -279,13 +282,14 @@ check_windows() {
 }
 
 part adapter "$build/bin/dsp_adapter_tests" --gtest_brief=1
-part validate validate "$lv2"
+part validate each validate "$lv2" "$build/lv2/$analyser.lv2"
 part lv2apply each render_with_lv2apply $(uris)
+part analyser pass_through_analyser
 part ffmpeg each render_with_ffmpeg $(uris)
 part jalv play_with_jalv
 part ardour try_ardour
 part qtractor scan_with_qtractor "$clap"
-part plugin_host each check_with_our_host "$clap" "${vst3[@]}"
+part plugin_host each check_with_our_host "$clap" "$vst3" "$build/clap/$analyser.clap" "$build/vst3/$analyser.vst3"
 part win64 check_windows
 
 printf '\nplugins: times\n'

@@ -15,9 +15,10 @@ public:
     }
     bool IsOn() const { return m_on.load(std::memory_order_relaxed); }
 
-    // To every channel of `frames` interleaved frames. What was there stays to the bit while the tone is off.
-    void AddTo(float* samples, int frames, int channels, double rate) {
-        const float target = IsOn() ? kLevel : 0.0f;
+    // To every channel of `frames` interleaved frames. What was there stays to the bit while the tone is off
+    // or not wanted.
+    void AddTo(float* samples, int frames, int channels, double rate, bool wanted = true) {
+        const float target = IsOn() && wanted ? kLevel : 0.0f;
         if (m_level == target && target == 0.0f) return;
         const double step = m_hz.load(std::memory_order_relaxed) / rate;
         const auto fade = static_cast<float>(kLevel / (kFadeSeconds * rate));

@@ -2,7 +2,7 @@
 # window.sh [SECONDS]
 # The live analyser in a real window, on a display and with sound devices of its own: ./check analyser. Its pictures
 # are compared with dsphost's of the same moment, keys and clicks are sent to it, its window changes size a hundred
-# times, its memory is watched for SECONDS (20), and the plug-in's window opens and closes 20 times in a host.
+# times, its memory is watched for SECONDS (20), and the plug-in's window opens and closes 20 times in hosts.
 set -euo pipefail
 cd "$(dirname "$0")/../.."
 source Scripts/common.sh
@@ -10,7 +10,7 @@ source Scripts/common.sh
 need_packages "${BUILD_PACKAGES[@]}" "${PLUGIN_PACKAGES[@]}" xvfb xdotool imagemagick sox jalv jackd2 sonic-pi-samples
 say "building"
 build_preset release dspdll-analyser dsphost
-build_preset plugins dspdll-analyser-plugin
+build_preset plugins analyser_plugin plugin_host
 
 seconds=${1:-20}
 work=$(mktemp -d)
@@ -156,6 +156,10 @@ done
 echo "KiB with a window: ${memory[*]}"
 sorted=($(printf '%s\n' "${memory[@]}" | sort -n))
 [ "${sorted[-1]}" -lt $((sorted[0] * 11 / 10)) ] || fail "the host's memory differs from time to time"
+
+say "its windows in CLAP and VST3, 20 times each"
+plugins=build/plugins file=dspdll-analyser-plugin
+$plugins/bin/plugin_host --windows $plugins/clap/$file.clap $plugins/vst3/$file.vst3 || fail "see above"
 
 [ $failed = 0 ] && echo "the live analyser: everything passed"
 exit $failed

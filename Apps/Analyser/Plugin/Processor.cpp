@@ -10,7 +10,7 @@
 namespace analyser {
 namespace {
 
-constexpr unsigned kBlock = 256;
+constexpr int kBlock = 256;
 constexpr float kSilence = -120.0f, kLoudest = 24.0f, kFallPerSecond = 20.0f;
 
 }  // namespace
@@ -32,29 +32,31 @@ void Processor::Refresh() {
     auto next = Clock::now();
     std::unique_lock lock(m_mutex);
     while (!m_ended) {
-        if (m_view.Refresh()) m_changed = true;
+        if (m_view.Refresh()) ++m_changes;
         next = std::max(next + kPeriod, Clock::now());
         m_end.wait_until(lock, next, [this] { return m_ended; });
     }
 }
 
-void Processor::Process(const float* const inputs[2], float* const outputs[2], unsigned frames, double rate) {
-    std::array<float, std::size_t{2} * kBlock> block;
-    for (unsigned from = 0; from < frames; from += kBlock) {
-        const unsigned count = std::min(kBlock, frames - from);
+void Processor::Process(const float* const* inputs, float* const* outputs, int channels, int frames,
+                        bool bypassed) {
+    std::array<float, 2 * kBlock> block;
+    const auto width = static_cast<std::size_t>(channels);
+    const double rate = m_rate;
+    for (int from = 0; from < frames; from += kBlock) {
+        const int count = std::min(kBlock, frames - from);
+        const auto samples = static_cast<std::size_t>(count) * width;
         float peak = 0.0f;
-        for (unsigned i = 0; i < count; ++i)
-            for (unsigned channel = 0; channel < 2; ++channel) {
-                const float sample = inputs[channel][from + i];
-                block[2 * i + channel] = sample;
-                peak = std::max(peak, std::abs(sample));
-            }
-        m_view.Feed(block.data(), static_cast<int>(count), 2);
-        m_tone.AddTo(block.data(), static_cast<int>(count), 2, rate);
-        for (unsigned i = 0; i < count; ++i)
-            for (unsigned channel = 0; channel < 2; ++channel)
-                outputs[channel][from + i] = block[2 * i + channel];
-        const float now = peak > 1e-6f ? std::min(20.0f * std::log10(peak), kLoudest) : kSilence;
+        for (std::size_t i = 0; i < samples; ++i) {
+            const float sample = inputs[i % width][static_cast<std::size_t>(from) + i / width];
+            block[i] = std::isfinite(sample) ? sample : 0.0f;
+            peak = std::max(peak, std::abs(block[i]));
+        }
+        if (!bypassed) m_view.Feed(block.data(), count, channels);
+        m_tone.AddTo(block.data(), count, channels, rate, !bypassed);
+        for (std::size_t i = 0; i < samples; ++i)
+            outputs[i % width][static_cast<std::size_t>(from) + i / width] = block[i];
+        const float now = peak > 1e-6f && !bypassed ? std::min(20.0f * std::log10(peak), kLoudest) : kSilence;
         const float fallen = GetLevel() - kFallPerSecond * static_cast<float>(count / rate);
         m_level.store(std::max(now, std::max(fallen, kSilence)), std::memory_order_relaxed);
     }

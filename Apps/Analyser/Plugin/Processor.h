@@ -23,9 +23,10 @@ public:
     Processor(const Processor&) = delete;
     Processor& operator=(const Processor&) = delete;
 
-    // Audio thread. `outputs` get the inputs' samples to the bit unless the reference tone is asked for; they
-    // may be the inputs.
-    void Process(const float* const inputs[2], float* const outputs[2], unsigned frames, double rate);
+    // Audio thread; one channel or two. `outputs` get the inputs' samples to the bit unless the reference
+    // tone is asked for, and 0 for what is not finite; they may be the inputs. Nothing is heard while
+    // bypassed.
+    void Process(const float* const* inputs, float* const* outputs, int channels, int frames, bool bypassed);
     // What the tuner shows; 0 frequency and note -1 without one. Any thread.
     const Tuner& GetTuner() const { return *m_view.GetAnalyser().GetTuner(); }
     bool IsTunerOn() const { return m_view.GetAnalyser().GetTunerOn(); }
@@ -43,8 +44,8 @@ public:
         View& m_view;
     };
     void SetRate(double rate);
-    // Whether the picture has changed since the last call.
-    bool TakeChanged() { return m_changed.exchange(false); }
+    // Counts up when the picture changes by itself.
+    unsigned Changes() const { return m_changes; }
     // The window's clipboard while there is a window; null takes it away, and the reference tone with it.
     void SetClipboard(std::function<bool(const std::string&)> copy);
 
@@ -59,7 +60,7 @@ private:
     Tone m_tone;
     std::function<bool(const std::string&)> m_copy;
     std::atomic<float> m_level{-120.0f};
-    std::atomic<bool> m_changed{true};
+    std::atomic<unsigned> m_changes{0};
     std::atomic<double> m_rate{48000.0};
     View m_view;
     std::mutex m_mutex;

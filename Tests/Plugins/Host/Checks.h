@@ -12,6 +12,7 @@ void CheckParameters(PluginFile&, std::size_t);
 void CheckState(PluginFile&, std::size_t);
 void CheckSound(PluginFile&, std::size_t);
 void CheckTiming(PluginFile&, std::size_t);
+void CheckWindow(PluginFile&, std::size_t);  // needs a display
 
 using Signal = std::vector<std::vector<float>>;  // by channel
 

@@ -1,10 +1,12 @@
 // CLAP over the C headers.
 #include <clap/entry.h>
 #include <clap/ext/audio-ports.h>
+#include <clap/ext/gui.h>
 #include <clap/ext/latency.h>
 #include <clap/ext/params.h>
 #include <clap/ext/state.h>
 #include <clap/ext/thread-check.h>
+#include <clap/ext/timer-support.h>
 #include <clap/plugin-factory.h>
 #include <clap/plugin-features.h>
 
@@ -16,9 +18,8 @@
 #include <stdexcept>
 #include <utility>
 
-#include "Instance.h"
+#include "Formats.h"
 #include "Module.h"
-#include "Support/AudioThreadRules.h"
 
 namespace PluginHost {
 namespace {
@@ -42,12 +43,24 @@ const clap_host_thread_check_t kHostThreads{
     [](const clap_host_t*) { return CurrentThread() == Thread::Main; },
     [](const clap_host_t*) { return CurrentThread() == Thread::Audio; }};
 
+std::set<clap_id> g_timers;
+const clap_host_timer_support_t kHostTimers{[](const clap_host_t*, std::uint32_t, clap_id* timer) {
+                                                *timer = g_timers.empty() ? 1 : *g_timers.rbegin() + 1;
+                                                return g_timers.insert(*timer).second;
+                                            },
+                                            [](const clap_host_t*, clap_id timer) {
+                                                Expect(g_timers.erase(timer) == 1,
+                                                       "takes away a timer that is not there");
+                                                return true;
+                                            }};
+
 const void* HostExtension(const clap_host_t*, const char* id) {
     const std::string name = id;
     if (name == CLAP_EXT_PARAMS) return &kHostParams;
     if (name == CLAP_EXT_LATENCY) return &kHostLatency;
     if (name == CLAP_EXT_STATE) return &kHostState;
     if (name == CLAP_EXT_THREAD_CHECK) return &kHostThreads;
+    if (name == CLAP_EXT_TIMER_SUPPORT) return &kHostTimers;
     return nullptr;
 }
 
@@ -95,29 +108,9 @@ struct Events {
         return &static_cast<Events*>(list->ctx)->events[index].header;
     }
     static bool Push(const clap_output_events_t*, const clap_event_header_t* event) {
-        Expect(event && event->size >= sizeof(clap_event_header_t), "sends the host a malformed event");
+        // A text would count as an allocation of the plug-in.
+        if (!event || event->size < sizeof(clap_event_header_t)) Finding("sends the host a malformed event");
         return true;
-    }
-};
-
-struct Stream {
-    Bytes bytes;
-    std::size_t most, position = 0;
-
-    static std::int64_t Read(const clap_istream_t* stream, void* buffer, std::uint64_t size) {
-        auto& self = *static_cast<Stream*>(stream->ctx);
-        const std::size_t count =
-            std::min({static_cast<std::size_t>(size), self.most, self.bytes.size() - self.position});
-        if (count) std::memcpy(buffer, self.bytes.data() + self.position, count);
-        self.position += count;
-        return static_cast<std::int64_t>(count);
-    }
-    static std::int64_t Write(const clap_ostream_t* stream, const void* buffer, std::uint64_t size) {
-        auto& self = *static_cast<Stream*>(stream->ctx);
-        const std::size_t count = std::min(static_cast<std::size_t>(size), self.most);
-        const char* bytes = static_cast<const char*>(buffer);
-        self.bytes.insert(self.bytes.end(), bytes, bytes + count);
-        return static_cast<std::int64_t>(count);
     }
 };
 
@@ -160,13 +153,19 @@ public:
 
     std::optional<Bytes> Save(std::size_t most) override {
         Stream stream{{}, most};
-        const clap_ostream_t out{&stream, Stream::Write};
+        const clap_ostream_t out{
+            &stream, [](const clap_ostream_t* to, const void* bytes, std::uint64_t size) {
+                return static_cast<Stream*>(to->ctx)->Write(bytes, static_cast<std::int64_t>(size));
+            }};
         if (!m_state->save(m_plugin, &out)) return {};
         return stream.bytes;
     }
     bool Load(const Bytes& bytes, std::size_t most) override {
         Stream stream{bytes, most};
-        const clap_istream_t in{&stream, Stream::Read};
+        const clap_istream_t in{&stream, [](const clap_istream_t* from, void* buffer, std::uint64_t size) {
+                                    return static_cast<Stream*>(from->ctx)->Read(
+                                        buffer, static_cast<std::int64_t>(size));
+                                }};
         return m_state->load(m_plugin, &in);
     }
 
@@ -195,6 +194,34 @@ public:
         return Run(block) != CLAP_PROCESS_ERROR;
     }
     void Reset() override { m_plugin->reset(m_plugin); }
+
+    bool OpenWindow(std::uintptr_t parent) override {
+        m_gui = Extension<clap_plugin_gui_t>(CLAP_EXT_GUI);
+        if (!m_gui) return false;
+        Expect(!m_gui->is_api_supported(m_plugin, "no.such.api", false) &&
+                   !m_gui->create(m_plugin, "no.such.api", false),
+               "has windows of an unknown kind");
+        std::uint32_t width = 0, height = 0;
+        clap_window_t window{CLAP_WINDOW_API_X11, {}};
+        window.x11 = static_cast<clap_xwnd>(parent);
+        return m_gui->is_api_supported(m_plugin, window.api, false) &&
+               m_gui->create(m_plugin, window.api, false) && m_gui->get_size(m_plugin, &width, &height) &&
+               width > 0 && height > 0 && m_gui->set_parent(m_plugin, &window) && m_gui->show(m_plugin);
+    }
+    bool ResizeWindow(int width, int height) override {
+        auto fitWidth = static_cast<std::uint32_t>(width), fitHeight = static_cast<std::uint32_t>(height);
+        return m_gui->can_resize(m_plugin) && m_gui->adjust_size(m_plugin, &fitWidth, &fitHeight) &&
+               m_gui->set_size(m_plugin, fitWidth, fitHeight);
+    }
+    void Tick() override {
+        const auto* timer = Extension<clap_plugin_timer_support_t>(CLAP_EXT_TIMER_SUPPORT);
+        for (const clap_id id : g_timers) timer->on_timer(m_plugin, id);
+    }
+    void CloseWindow() override {
+        m_gui->hide(m_plugin);
+        m_gui->destroy(m_plugin);
+        Expect(g_timers.empty(), "leaves its timer behind");
+    }
 
     bool SetChannels(int channels) override {
         return std::all_of(outputs.begin(), outputs.end(),
@@ -263,8 +290,9 @@ private:
 
     clap_process_status Run(const Block& block) {
         std::array<clap_audio_buffer_t, 4> in{}, out{};
-        Divide(inputs, block.inputs, in);
-        Divide(outputs, block.outputs, out);
+        using Buffer = clap_audio_buffer_t;
+        Divide(inputs, block.inputs, in, &Buffer::data32, &Buffer::channel_count);
+        Divide(outputs, block.outputs, out, &Buffer::data32, &Buffer::channel_count);
         clap_event_transport_t transport{};
         transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
         transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
@@ -279,24 +307,7 @@ private:
                                      &m_events.in,
                                      &m_events.out};
         m_time += block.frames;
-        std::string broken;
-        clap_process_status status;
-        {
-            TestSupport::AudioThreadRules rules;
-            status = m_plugin->process(m_plugin, &process);
-            broken = rules.Broken();
-        }
-        ExpectRealTime(broken);
-        return status;
-    }
-    static void Divide(const std::vector<Port>& ports, std::span<float* const> channels,
-                       std::array<clap_audio_buffer_t, 4>& buffers) {
-        std::size_t channel = 0;
-        for (std::size_t i = 0; i < ports.size() && i < buffers.size(); ++i) {
-            buffers[i].data32 = const_cast<float**>(channels.data() + channel);
-            buffers[i].channel_count = static_cast<std::uint32_t>(ports[i].channels);
-            channel += buffers[i].channel_count;
-        }
+        return InRealTime([&] { return m_plugin->process(m_plugin, &process); });
     }
     void RunCallback() {
         if (std::exchange(g_callbackWanted, false)) m_plugin->on_main_thread(m_plugin);
@@ -306,6 +317,7 @@ private:
     const clap_plugin_params_t* m_params;
     const clap_plugin_state_t* m_state;
     const clap_plugin_latency_t* m_latency;
+    const clap_plugin_gui_t* m_gui = nullptr;
     Events m_events;
     std::int64_t m_time = 0;
     bool m_active = false, m_started = false;

@@ -85,6 +85,13 @@ public:
 
     // One channel everywhere, or two; false when the plug-in has no such layout. While inactive.
     virtual bool SetChannels(int channels) = 0;
+    // Its window inside of the X11 window `parent`; false where it has none. Ticks come from the host's
+    // timers.
+    virtual bool OpenWindow(std::uintptr_t parent) = 0;
+    virtual bool ResizeWindow(int width, int height) = 0;
+    virtual void Tick() = 0;
+    virtual void CloseWindow() = 0;
+
     // The plug-in's own rules for this format, such as what events it must leave alone.
     virtual void CheckFormat() = 0;
 };

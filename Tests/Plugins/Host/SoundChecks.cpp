@@ -62,7 +62,11 @@ void CheckBadSamples(PluginFile& file, std::size_t index) {
     constexpr float kInfinity = std::numeric_limits<float>::infinity();
     for (const float bad : {std::numeric_limits<float>::quiet_NaN(), kInfinity, -kInfinity, 1e-42f})
         for (auto& channel : input) channel[at++] = bad;
-    const Signal output = RenderAt(*plugin, 48000, input);
+    std::vector<Change> changes;
+    for (const Parameter& p : plugin->parameters)
+        if (!p.readOnly && !p.hidden)
+            changes.push_back({p.id, std::numeric_limits<double>::quiet_NaN(), 3000});
+    const Signal output = RenderAt(*plugin, 48000, input, {.changes = changes});
     Expect(IsFinite(output), "is not finite when its input is not");
     const auto fresh = file.Create(index);
     const double now = Energy(output, 18000),

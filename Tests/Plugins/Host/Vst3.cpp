@@ -4,8 +4,8 @@
 #include <travesty/edit_controller.h>
 #include <travesty/factory.h>
 #include <travesty/host.h>
-#include <travesty/message.h>
 #include <travesty/unit.h>
+#include <travesty/view.h>
 
 #include <algorithm>
 #include <array>
@@ -14,26 +14,15 @@
 #include <set>
 #include <stdexcept>
 
-#include "Checks.h"
+#include "Formats.h"
 #include "Module.h"
-#include "Support/AudioThreadRules.h"
 
 namespace PluginHost {
 namespace {
 
 std::string Narrow(const std::int16_t* text) {
     std::string narrow;
-    for (; *text; ++text) {  // the basic plane is all that plug-ins use
-        const unsigned c = static_cast<std::uint16_t>(*text);
-        const auto add = [&](unsigned byte) { narrow += static_cast<char>(byte); };
-        if (c < 0x80) {
-            add(c);
-        } else if (c < 0x800) {
-            add(0xc0 | c >> 6), add(0x80 | (c & 0x3f));
-        } else {
-            add(0xe0 | c >> 12), add(0x80 | (c >> 6 & 0x3f)), add(0x80 | (c & 0x3f));
-        }
-    }
+    for (; *text; ++text) narrow += static_cast<char>(*text);  // ours are ASCII
     return narrow;
 }
 
@@ -83,47 +72,25 @@ HandlerTable g_handler({[](void*, v3_param_id) -> v3_result { return ExpectMainT
 HandlerTable* g_handlerObject = &g_handler;
 
 using StreamTable = Table<v3_bstream, v3_bstream_iid>;
-struct Stream {
+struct HostStream {
     StreamTable* table;
-    Bytes bytes;
-    std::size_t most, position = 0;
+    Stream stream;
 
-    static Stream& Of(void* self) { return *static_cast<Stream*>(self); }
-    static v3_result V3_API Read(void* self, void* buffer, std::int32_t size, std::int32_t* done) {
-        Stream& s = Of(self);
-        const std::size_t count =
-            std::min({static_cast<std::size_t>(std::max(size, 0)), s.most, s.bytes.size() - s.position});
-        if (count) std::memcpy(buffer, s.bytes.data() + s.position, count);
-        s.position += count;
-        if (done) *done = static_cast<std::int32_t>(count);
-        return V3_OK;
-    }
-    static v3_result V3_API Write(void* self, void* buffer, std::int32_t size, std::int32_t* done) {
-        Stream& s = Of(self);
-        const std::size_t count = std::min(static_cast<std::size_t>(std::max(size, 0)), s.most);
-        const char* bytes = static_cast<const char*>(buffer);
-        s.bytes.resize(std::max(s.bytes.size(), s.position + count));
-        std::copy_n(bytes, count, s.bytes.begin() + static_cast<std::ptrdiff_t>(s.position));
-        s.position += count;
-        if (done) *done = static_cast<std::int32_t>(count);
-        return V3_OK;
-    }
-    static v3_result V3_API Seek(void* self, std::int64_t to, std::int32_t mode, std::int64_t* result) {
-        Stream& s = Of(self);
-        const std::int64_t size = static_cast<std::int64_t>(s.bytes.size());
-        const std::int64_t from = mode == V3_SEEK_SET   ? 0
-                                  : mode == V3_SEEK_CUR ? static_cast<std::int64_t>(s.position)
-                                                        : size;
-        s.position = static_cast<std::size_t>(std::clamp<std::int64_t>(from + to, 0, size));
-        if (result) *result = static_cast<std::int64_t>(s.position);
-        return V3_OK;
-    }
-    static v3_result V3_API Tell(void* self, std::int64_t* position) {
-        *position = static_cast<std::int64_t>(Of(self).position);
-        return V3_OK;
-    }
+    static Stream& Of(void* self) { return static_cast<HostStream*>(self)->stream; }
 };
-StreamTable g_stream({Stream::Read, Stream::Write, Stream::Seek, Stream::Tell});
+StreamTable g_stream({[](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
+                          *done = static_cast<std::int32_t>(HostStream::Of(self).Read(buffer, size));
+                          return V3_OK;
+                      },
+                      [](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
+                          *done = static_cast<std::int32_t>(HostStream::Of(self).Write(buffer, size));
+                          return V3_OK;
+                      },
+                      // Ours read and write from one end to the other.
+                      [](void*, std::int64_t, std::int32_t, std::int64_t*) -> v3_result {
+                          return V3_NOT_IMPLEMENTED;
+                      },
+                      [](void*, std::int64_t*) -> v3_result { return V3_NOT_IMPLEMENTED; }});
 
 // The changes of one block: a queue per parameter, all made beforehand.
 using QueueTable = Table<v3_param_value_queue, v3_param_value_queue_iid>;
@@ -187,6 +154,32 @@ ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Change
                             return QueueAt(self, *index);
                         }});
 
+// A window's frame, which leads to the host's timers.
+std::set<v3_timer_handler**> g_timers;
+using LoopTable = Table<v3_run_loop, v3_run_loop_iid>;
+LoopTable g_loop({[](void*, v3_event_handler**, int) -> v3_result { return V3_OK; },
+                  [](void*, v3_event_handler**) -> v3_result { return V3_OK; },
+                  [](void*, v3_timer_handler** timer, std::uint64_t) -> v3_result {
+                      return g_timers.insert(timer).second ? V3_OK : V3_INVALID_ARG;
+                  },
+                  [](void*, v3_timer_handler** timer) -> v3_result {
+                      Expect(g_timers.erase(timer) == 1, "takes away a timer that is not there");
+                      return V3_OK;
+                  }});
+LoopTable* g_loopObject = &g_loop;
+struct FrameTable : v3_plugin_frame_cpp {
+    FrameTable() {
+        query_interface = [](void* self, const v3_tuid iid, void** object) -> v3_result {
+            if (!v3_tuid_match(iid, v3_run_loop_iid)) return Query<v3_plugin_frame_iid>(self, iid, object);
+            *object = &g_loopObject;
+            return V3_OK;
+        };
+        ref = unref = [](void*) { return 1u; };
+        frame.resize_view = [](void*, v3_plugin_view**, v3_view_rect*) -> v3_result { return V3_OK; };
+    }
+} g_frame;
+FrameTable* g_frameObject = &g_frame;
+
 // A plug-in's interface, counted.
 template <typename Interface>
 class Held {
@@ -221,7 +214,10 @@ public:
         v3_cpp_obj_query_interface(m_component.Get(), v3_audio_processor_iid,
                                    reinterpret_cast<v3_audio_processor***>(m_processor.Slot()));
         if (!m_processor) throw std::runtime_error("has no audio processor");
-        FindController(factory, context);
+        // Ours are one object.
+        v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid,
+                                   reinterpret_cast<v3_edit_controller***>(m_controller.Slot()));
+        if (!m_controller) throw std::runtime_error("has no controller");
         m_controller->set_component_handler(m_controller.Get(),
                                             reinterpret_cast<v3_component_handler**>(&g_handlerObject));
         for (Changes* changes : {&m_in, &m_out}) {
@@ -231,15 +227,7 @@ public:
         ReadParameters();
         ReadPorts();
     }
-    ~Vst3Instance() override {
-        if (m_controllerIsOther) {
-            Connect(false);
-            v3_cpp_obj_terminate(m_controller.Get());
-        }
-        m_controller.Release();
-        m_processor.Release();
-        v3_cpp_obj_terminate(m_component.Get());
-    }
+    ~Vst3Instance() override { v3_cpp_obj_terminate(m_component.Get()); }
 
     std::optional<std::string> Text(const Parameter& parameter, double value) override {
         v3_str_128 text{};
@@ -262,17 +250,14 @@ public:
     }
 
     std::optional<Bytes> Save(std::size_t most) override {
-        Stream stream{&g_stream, {}, most};
-        if (m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&stream)) != V3_OK)
+        HostStream to{&g_stream, {{}, most}};
+        if (m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&to)) != V3_OK)
             return {};
-        return stream.bytes;
+        return to.stream.bytes;
     }
     bool Load(const Bytes& bytes, std::size_t most) override {
-        Stream stream{&g_stream, bytes, most};
-        const auto state = reinterpret_cast<v3_bstream**>(&stream);
-        if (m_component->set_state(m_component.Get(), state) != V3_OK) return false;
-        stream.position = 0;
-        return !m_controllerIsOther || m_controller->set_component_state(m_controller.Get(), state) == V3_OK;
+        HostStream from{&g_stream, {bytes, most}};
+        return m_component->set_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&from)) == V3_OK;
     }
 
     bool Activate(double rate, std::uint32_t maxFrames) override {
@@ -310,8 +295,9 @@ public:
         m_in.Set(block.changes);
         std::array<v3_audio_bus_buffers, 4> in{}, out{};
         const bool audio = !block.outputs.empty();
-        Divide(inputs, block.inputs, in);
-        Divide(outputs, block.outputs, out);
+        using Buffer = v3_audio_bus_buffers;
+        Divide(inputs, block.inputs, in, &Buffer::channel_buffers_32, &Buffer::num_channels);
+        Divide(outputs, block.outputs, out, &Buffer::channel_buffers_32, &Buffer::num_channels);
         v3_process_context context{};
         context.state = V3_PROCESS_CTX_PLAYING | V3_PROCESS_CTX_TEMPO_VALID;
         context.sample_rate = m_rate;
@@ -325,19 +311,39 @@ public:
         data.input_params = reinterpret_cast<v3_param_changes**>(&m_in);
         data.output_params = reinterpret_cast<v3_param_changes**>(&m_out);
         data.ctx = &context;
-        std::string broken;
-        v3_result result;
-        {
-            TestSupport::AudioThreadRules rules;
-            result = m_processor->process(m_processor.Get(), &data);
-            broken = rules.Broken();
-        }
-        ExpectRealTime(broken);
-        return result == V3_OK;
+        return InRealTime([&] { return m_processor->process(m_processor.Get(), &data); }) == V3_OK;
     }
     void Reset() override {
         m_processor->set_processing(m_processor.Get(), false);
         m_processor->set_processing(m_processor.Get(), true);
+    }
+
+    bool OpenWindow(std::uintptr_t parent) override {
+        *m_view.Slot() = m_controller->create_view(m_controller.Get(), "editor");
+        v3_view_rect size{};
+        const auto own = reinterpret_cast<void*>(parent);
+        if (!m_view) return false;
+        m_view->set_frame(m_view.Get(), reinterpret_cast<v3_plugin_frame**>(&g_frameObject));
+        Expect(m_view->is_platform_type_supported(m_view.Get(), "NoSuchType") != V3_OK &&
+                   m_view->attached(m_view.Get(), own, "NoSuchType") != V3_OK,
+               "has windows of an unknown kind");
+        return m_view->get_size(m_view.Get(), &size) == V3_OK && size.right > 0 && size.bottom > 0 &&
+               m_view->attached(m_view.Get(), own, V3_VIEW_PLATFORM_TYPE_NATIVE) == V3_OK;
+    }
+    bool ResizeWindow(int width, int height) override {
+        v3_view_rect size{0, 0, width, height};
+        return m_view->can_resize(m_view.Get()) == V3_OK &&
+               m_view->check_size_constraint(m_view.Get(), &size) == V3_OK &&
+               m_view->on_size(m_view.Get(), &size) == V3_OK;
+    }
+    void Tick() override {
+        for (v3_timer_handler** timer : g_timers) v3_cpp_obj(timer)->on_timer(timer);
+    }
+    void CloseWindow() override {
+        Expect(m_view->removed(m_view.Get()) == V3_OK, "cannot remove its window");
+        Expect(g_timers.empty(), "leaves its timer behind");
+        m_view->set_frame(m_view.Get(), nullptr);
+        m_view.Release();
     }
 
     bool SetChannels(int channels) override {
@@ -415,35 +421,6 @@ private:
         }
     }
 
-    void FindController(v3_plugin_factory** factory, v3_funknown** context) {
-        const auto slot = reinterpret_cast<v3_edit_controller***>(m_controller.Slot());
-        if (v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid, slot) == V3_OK) {
-            return;
-        }
-        v3_tuid id{};
-        m_component->get_controller_class_id(m_component.Get(), id);
-        if (v3_cpp_obj(factory)->create_instance(factory, id, v3_edit_controller_iid, m_controller.Slot()) !=
-            V3_OK)
-            throw std::runtime_error("has no controller");
-        v3_cpp_obj_initialize(m_controller.Get(), context);
-        m_controllerIsOther = true;
-        Connect(true);
-    }
-    // The two halves may talk to each other.
-    void Connect(bool on) {
-        Held<v3_connection_point> ours, theirs;
-        v3_cpp_obj_query_interface(m_component.Get(), v3_connection_point_iid,
-                                   reinterpret_cast<v3_connection_point***>(ours.Slot()));
-        v3_cpp_obj_query_interface(m_controller.Get(), v3_connection_point_iid,
-                                   reinterpret_cast<v3_connection_point***>(theirs.Slot()));
-        if (!ours || !theirs) return;
-        const auto join = [on](auto& a, auto& b) {
-            on ? a->connect(a.Get(), b.Get()) : a->disconnect(a.Get(), b.Get());
-        };
-        join(ours, theirs);
-        join(theirs, ours);
-    }
-
     void ReadParameters() {
         for (std::int32_t i = 0; i < m_controller->get_parameter_count(m_controller.Get()); ++i) {
             v3_param_info info{};
@@ -473,20 +450,10 @@ private:
                    "describes one bus more than it counts");
         }
     }
-    static void Divide(const std::vector<Port>& ports, std::span<float* const> channels,
-                       std::array<v3_audio_bus_buffers, 4>& buffers) {
-        std::size_t channel = 0;
-        for (std::size_t i = 0; i < ports.size() && i < buffers.size() && !channels.empty(); ++i) {
-            buffers[i].num_channels = ports[i].channels;
-            buffers[i].channel_buffers_32 = const_cast<float**>(channels.data() + channel);
-            channel += static_cast<std::size_t>(ports[i].channels);
-        }
-    }
-
     Held<v3_component> m_component;
     Held<v3_audio_processor> m_processor;
     Held<v3_edit_controller> m_controller;
-    bool m_controllerIsOther = false;
+    Held<v3_plugin_view> m_view;
     Changes m_in{&g_changes, {}}, m_out{&g_changes, {}};
     std::vector<std::int16_t> m_lastText;
     double m_rate = 48000;

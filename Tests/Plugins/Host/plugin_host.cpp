@@ -1,6 +1,6 @@
-// plugin_host FILE...
-// Does to CLAP and VST3 plug-ins what a strict host may do, and prints what it finds. Exits 0 when it found
-// nothing, 1 otherwise.
+// plugin_host [--windows] FILE...
+// Does to CLAP and VST3 plug-ins what a strict host may do, or on a display to their windows, and prints what
+// it finds. Exits 0 when it found nothing, 1 otherwise.
 #include <cctype>
 #include <chrono>
 #include <cstdio>
@@ -17,7 +17,15 @@ std::mutex g_mutex;
 std::set<std::string> g_findings;
 std::string g_subject;
 
-void CheckFile(const std::filesystem::path& path) {
+using Check = void (*)(PluginFile&, std::size_t);
+const std::vector<Check> kChecks{CheckLife, CheckParameters, CheckState, CheckSound, CheckTiming};
+#ifdef _WIN32
+const std::vector<Check> kWindowChecks;
+#else
+const std::vector<Check> kWindowChecks{CheckWindow};
+#endif
+
+void CheckFile(const std::filesystem::path& path, const std::vector<Check>& checks) {
     g_subject = path.filename().string();
     const auto begin = std::chrono::steady_clock::now();
     const bool clap = path.extension() == ".clap";
@@ -28,8 +36,7 @@ void CheckFile(const std::filesystem::path& path) {
     for (std::size_t i = 0; i < file->Count(); ++i) {
         g_subject = path.filename().string() + ", " + file->Name(i) + " (" + (clap ? "CLAP" : "VST3") + ")";
         const auto before = g_findings.size();
-        for (const auto check : {CheckLife, CheckParameters, CheckState, CheckSound, CheckTiming})
-            check(*file, i);
+        for (const auto check : checks) check(*file, i);
         const std::chrono::duration<double> time = std::chrono::steady_clock::now() - begin;
         std::printf("%s: %zu findings, %.1f s\n", g_subject.c_str(), g_findings.size() - before,
                     time.count());
@@ -58,12 +65,13 @@ void ExpectRealTime(const std::string& broken) {
 
 int main(int count, char** arguments) {
     using namespace PluginHost;
-    for (int i = 1; i < count; ++i) try {
-            CheckFile(arguments[i]);
+    const bool windows = count > 1 && std::string(arguments[1]) == "--windows";
+    for (int i = windows ? 2 : 1; i < count; ++i) try {
+            CheckFile(arguments[i], windows ? kWindowChecks : kChecks);
         } catch (const std::exception& error) {
             Finding(error.what());
         }
-    if (count < 2) std::fprintf(stderr, "usage: plugin_host FILE.clap|FILE.vst3...\n");
-    std::printf("%d files, %zu findings\n", count - 1, g_findings.size());
+    if (count < 2) std::fprintf(stderr, "usage: plugin_host [--windows] FILE.clap|FILE.vst3...\n");
+    std::printf("%d files, %zu findings\n", count - 1 - windows, g_findings.size());
     return count < 2 || !g_findings.empty();
 }
