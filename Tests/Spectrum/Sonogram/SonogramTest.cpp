@@ -31,7 +31,7 @@ int Difference(std::uint32_t a, std::uint32_t b) {
 }
 
 // A sonogram and the drawer it is fed from, which hands spectra on as they are.
-class SonogramTest : public AnalyserTest {
+class SonogramTest : public AnalyserFixture {
 protected:
     SonogramTest() {
         m_record.fft_length = m_record.window_length = 2 * kBins;
