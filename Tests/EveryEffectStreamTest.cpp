@@ -161,6 +161,6 @@ TEST_P(EveryEffect, StaysFiniteAtEverySetting) {
 TEST_P(EveryEffect, KeepsSilenceSilent) {
     const auto effect = Make();
     const auto format = Format<double>();
-    const auto output = Render(*effect, std::vector<double>(2 * 20000), format, {512});
-    for (const double sample : output) ASSERT_LT(std::abs(sample), 1e-9);
+    for (const double sample : Render(*effect, std::vector<double>(2 * 20000), format, {512}))
+        ASSERT_LT(std::abs(sample), 1e-9);
 }

@@ -18,10 +18,10 @@ struct HookedPoster : MessagePoster {
 };
 
 // What analysers, tuners and sonograms share starts every test at its defaults.
-class AnalyserTest : public testing::Test {
+class AnalyserFixture : public testing::Test {
 protected:
-    AnalyserTest() { Reset(); }
-    ~AnalyserTest() override { Reset(); }
+    AnalyserFixture() { Reset(); }
+    ~AnalyserFixture() override { Reset(); }
 
     static kivspectrum::spectrum_settings& Settings() { return kivspectrum::settings; }
 

@@ -13,7 +13,7 @@ namespace {
 
 using Record = kivspectrum::spectrum_settings;
 
-class MenuTest : public AnalyserTest {
+class MenuTest : public AnalyserFixture {
 protected:
     kivspectrum m_analyser;
 };

@@ -8,7 +8,7 @@
 
 namespace {
 
-class Pacing : public AnalyserTest {};
+class Pacing : public AnalyserFixture {};
 
 // Catches an equaliser whose spectrum stands still for as long as a knob is moved: edits come more often than
 // windows end.

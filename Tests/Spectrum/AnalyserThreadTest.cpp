@@ -9,7 +9,7 @@
 namespace {
 
 using TestSupport::WhileAnotherThread;
-class AnalyserThreads : public AnalyserTest {};
+class AnalyserThreads : public AnalyserFixture {};
 
 // One thread feeds two analysers, one prepares and draws their frames, two choose from their menus. Caught by
 // the thread sanitizer: a race; by the test never ending: locks taken in two orders.

@@ -16,7 +16,7 @@ Values Ramp(std::size_t count) {
     return ramp;
 }
 
-using Capture = AnalyserTest;
+using Capture = AnalyserFixture;
 
 // Oldest first, however the stream is cut and however often the staging ring goes round; zeros behind the
 // window where the transform is longer.

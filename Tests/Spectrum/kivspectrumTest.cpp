@@ -12,7 +12,7 @@ namespace {
 
 using Complex = std::complex<double>;
 
-class kivspectrumTest : public AnalyserTest {};
+class kivspectrumTest : public AnalyserFixture {};
 
 double Window(int type, double turn) {
     constexpr double kTerms[5][3] = {{1, 0, 0}, {}, {0.5, 0.5, 0}, {0.54, 0.46, 0}, {0.42, 0.5, 0.08}};

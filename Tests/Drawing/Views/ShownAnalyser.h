@@ -2,7 +2,7 @@
 
 #include "Spectrum/AnalyserFixture.h"
 
-using ViewTest = AnalyserTest;
+using ViewTest = AnalyserFixture;
 
 // An analyser that heard `seconds` of a signal, refreshed 30 times a second.
 class ShownAnalyser {

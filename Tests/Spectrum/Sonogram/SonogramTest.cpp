@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <cstdlib>
 #include <limits>
 #include <tuple>
 
@@ -22,16 +21,12 @@ const float kNan = std::nanf("");
 
 RectF Size(float width, float height) { return {0.0f, 0.0f, width, height}; }
 
-// The largest difference between two colours' red, green or blue.
-int Difference(std::uint32_t a, std::uint32_t b) {
-    const auto part = [&](int shift) {
-        return std::abs(static_cast<int>(a >> shift & 0xFF) - static_cast<int>(b >> shift & 0xFF));
-    };
-    return std::max({part(0), part(8), part(16)});
+void ExpectColour(std::uint32_t colour, std::uint32_t expected) {
+    for (const int shift : {0, 8, 16}) EXPECT_NEAR(colour >> shift & 0xFF, expected >> shift & 0xFF, 1.0);
 }
 
 // A sonogram and the drawer it is fed from, which hands spectra on as they are.
-class SonogramTest : public AnalyserTest {
+class SonogramTest : public AnalyserFixture {
 protected:
     SonogramTest() {
         m_record.fft_length = m_record.window_length = 2 * kBins;
@@ -163,9 +158,7 @@ TEST_F(SonogramTest, RecoloursThePast) {
     Corvo::Sonogram::SetColourScheme(6);
     m_sonogram.CheckPixelBufferSize(Size(40, 30), 0);
     EXPECT_NE(m_sonogram.GetBitmap().version, version);
-    EXPECT_LE(
-        Difference(m_sonogram.GetBitmap().Row(3)[39], m_sonogram.ColorFromAmplitude(LevelAt(0, 3), false)),
-        1);
+    ExpectColour(m_sonogram.GetBitmap().Row(3)[39], m_sonogram.ColorFromAmplitude(LevelAt(0, 3), false));
     Choose(&kivspectrum::spectrum_settings::view_option_d, 2);
     m_sonogram.Step(m_drawer, false, 0.0f);
     for (const int back : {0, 1}) EXPECT_NEAR(LevelAt(back, 3), -50.0, 0.5);
@@ -219,7 +212,7 @@ TEST_F(SonogramTest, DrawsItsIntensityScaleOnce) {
     m_sonogram.PrepareIntensityScale(3, 91);
     EXPECT_EQ(bar.version, version);
     for (int y = 0; y < 91; ++y)
-        EXPECT_LE(Difference(bar.Row(y)[2], m_sonogram.ColorFromAmplitude(static_cast<float>(-y), false)), 1);
+        ExpectColour(bar.Row(y)[2], m_sonogram.ColorFromAmplitude(static_cast<float>(-y), false));
     Corvo::Sonogram::SetColourScheme(4);
     EXPECT_NE(m_sonogram.PrepareIntensityScale(3, 91).version, version);
 }

@@ -11,7 +11,7 @@ using TunerSounds::Kind;
 constexpr int kRate = 48000;
 
 // An analyser whose tuner is on.
-class TunerAnalyserTest : public AnalyserTest {
+class TunerAnalyserTest : public AnalyserFixture {
 protected:
     TunerAnalyserTest() {
         m_analyser.ToggleTuner();

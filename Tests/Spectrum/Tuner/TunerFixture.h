@@ -8,7 +8,7 @@
 #include "Spectrum/AnalyserFixture.h"
 #include "Spectrum/Tuner/TunerSounds.h"
 
-class TunerTest : public AnalyserTest {};
+class TunerTest : public AnalyserFixture {};
 
 constexpr int kTunerRate = 44100;
 inline std::vector<float> TunerSine(double hz, double amplitude = 0.5, std::size_t frames = 8192) {
