@@ -226,11 +226,13 @@ bool DrawingCairo::DrawTarget::DrawCurve(const PointF* points, int count, float 
         if (!IsUsable(points[i])) return false;
     if (!CurveMask::IsCurve(points, count) || !ReachablePixels(m_context, reach)) return false;
     CurveMask& curve = m_drawing.m_resources->curve;
-    if (!curve.Draw(points, count, width, reach)) return true;
-    cairo_surface_t* const mask = cairo_image_surface_create_for_data(
-        curve.Pixels(), CAIRO_FORMAT_A8, curve.Width(), curve.Height(), curve.Stride());
-    cairo_mask_surface(m_context, mask, curve.Left(), curve.Top());
-    cairo_surface_destroy(mask);
+    curve.Outline(points, count, width, reach);
+    for (CurveMask::Strip strip; curve.Next(strip);) {
+        cairo_surface_t* const mask = cairo_image_surface_create_for_data(
+            strip.pixels, CAIRO_FORMAT_A8, strip.width, strip.height, strip.stride);
+        cairo_mask_surface(m_context, mask, strip.left, strip.top);
+        cairo_surface_destroy(mask);
+    }
     return true;
 }
 
