@@ -72,25 +72,33 @@ void CurveMask::AddSegment(PointF from, PointF to, float radius) {
     for (std::size_t i = upper.first; i < upper.end; ++i) m_tops[i] = std::min(m_tops[i], heightAt(i) - half);
 }
 
-void CurveMask::Outline(const PointF* points, int count, float width, const RectF& within) {
-    const float radius = width / 2.0f;
-    m_left = static_cast<int>(std::max(std::floor(points[0].x - radius), within.x));
+bool CurveMask::Reach(float left, float right, const RectF& within) {
+    m_left = static_cast<int>(std::max(std::floor(left), within.x));
     m_top = static_cast<int>(within.y);
-    m_width =
-        static_cast<int>(std::min(std::ceil(points[count - 1].x + radius), within.x + within.width)) - m_left;
+    m_width = static_cast<int>(std::min(std::ceil(right), within.x + within.width)) - m_left;
     m_height = static_cast<int>(within.height);
     m_next = 0;
-    if (m_width < 1 || m_height < 1) {
-        m_width = 0;
-        return;
-    }
+    if (m_width < 1 || m_height < 1) m_width = 0;
     m_tops.assign(static_cast<std::size_t>(m_width * kCuts), kNone);
     m_bottoms.assign(m_tops.size(), -kNone);
+    return m_width > 0;
+}
+
+void CurveMask::Line(const PointF* points, int count, float width, const RectF& within) {
+    const float radius = width / 2.0f;
+    if (!Reach(points[0].x - radius, points[count - 1].x + radius, within)) return;
     m_halves.clear();
     for (int i = 0; i < count; ++i) {
         AddDisc(points[i], radius);
         if (i > 0) AddSegment(points[i - 1], points[i], radius);
     }
+}
+
+void CurveMask::Area(const PointF* points, int count, float ground, const RectF& within) {
+    if (!Reach(points[0].x, points[count - 1].x, within)) return;
+    for (int i = 1; i < count; ++i) AddSegment(points[i - 1], points[i], 0.0f);
+    for (std::size_t cut = 0; cut < m_tops.size(); ++cut)
+        if (m_tops[cut] < ground) m_bottoms[cut] = ground;
 }
 
 // Adds what a column's pixels have more than those above them, so that few are touched however steep the line
@@ -127,14 +135,17 @@ bool CurveMask::Next(Strip& strip) {
         m_next += width;
         const auto from = static_cast<std::ptrdiff_t>(left) * kCuts;
         const auto to = from + static_cast<std::ptrdiff_t>(width) * kCuts;
-        const float highest = *std::min_element(m_tops.begin() + from, m_tops.begin() + to);
-        const float lowest = *std::max_element(m_bottoms.begin() + from, m_bottoms.begin() + to);
+        const auto tops = std::minmax_element(m_tops.begin() + from, m_tops.begin() + to);
+        const auto bottoms = std::minmax_element(m_bottoms.begin() + from, m_bottoms.begin() + to);
         const auto edge = [this](float y) {
             return static_cast<int>(
                 std::clamp(y, static_cast<float>(m_top), static_cast<float>(m_top + m_height)));
         };
-        const int top = edge(std::floor(highest)), height = edge(std::ceil(lowest)) - top;
-        if (height < 1) continue;
+        const int top = edge(std::floor(*tops.first)), bottom = edge(std::ceil(*bottoms.second));
+        if (bottom <= top) continue;
+        const bool level = edge(*bottoms.first) == bottom;
+        const int solidFrom = level ? std::min(edge(std::ceil(*tops.second)), bottom) : bottom;
+        const int height = solidFrom - top;
         constexpr auto kStride = static_cast<std::size_t>(kStrip);
         m_pixels.assign(kStride * (static_cast<std::size_t>(height) + 1), 0);
         for (int column = 0; column < width; ++column)
@@ -143,7 +154,7 @@ bool CurveMask::Next(Strip& strip) {
         for (int y = 1; y < height; ++y, row += kStride)
             for (std::size_t x = 0; x < kStride; ++x)
                 row[kStride + x] = static_cast<std::uint8_t>(row[kStride + x] + row[x]);
-        strip = {m_left + left, top, width, height, kStrip, m_pixels.data()};
+        strip = {m_left + left, top, width, height, kStrip, bottom - solidFrom, m_pixels.data()};
         return true;
     }
     return false;
