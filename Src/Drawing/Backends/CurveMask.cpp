@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <cstddef>
 #include <limits>
 
 namespace Corvo {
@@ -10,19 +9,10 @@ namespace {
 
 constexpr int kCuts = 8;  // of a pixel's width
 constexpr int kShares[kCuts] = {32, 32, 32, 32, 32, 32, 32, 31};
+constexpr int kStrip = 64;  // columns; the pixels of a strip stay in the first cache
 constexpr float kNone = std::numeric_limits<float>::max();
 
-struct Range {
-    int first, end;
-};
-
-// The cuts within `radius` of a stretch of the x axis.
-Range CutsWithin(float from, float to, float radius, int left, std::size_t cuts) {
-    const auto cut = [&](float x) { return (x - static_cast<float>(left)) * kCuts - 0.5f; };
-    const float most = static_cast<float>(cuts);
-    return {static_cast<int>(std::clamp(std::ceil(cut(from - radius)), 0.0f, most)),
-            static_cast<int>(std::clamp(std::floor(cut(to + radius)) + 1.0f, 0.0f, most))};
-}
+float MiddleOf(std::size_t cut) { return (static_cast<float>(cut) + 0.5f) / kCuts; }
 
 }  // namespace
 
@@ -32,15 +22,38 @@ bool CurveMask::IsCurve(const PointF* points, int count) {
     return count >= 2;
 }
 
+// Those whose middles lie there.
+CurveMask::Range CurveMask::CutsBetween(float from, float to) const {
+    const float most = static_cast<float>(m_tops.size());
+    const auto cut = [&](float x) {
+        return std::clamp((x - static_cast<float>(m_left)) * kCuts - 0.5f, -1.0f, most);
+    };
+    const float first = std::max(cut(from), 0.0f), last = cut(to);
+    const auto whole = static_cast<std::size_t>(first);
+    return {whole + (static_cast<float>(whole) < first ? 1 : 0),
+            std::min(static_cast<std::size_t>(last + 1.0f), m_tops.size())};
+}
+
 void CurveMask::AddDisc(PointF centre, float radius) {
-    const Range cuts = CutsWithin(centre.x, centre.x, radius, m_left, m_stretches.size());
-    for (int i = cuts.first; i < cuts.end; ++i) {
-        const float away = static_cast<float>(m_left) + (static_cast<float>(i) + 0.5f) / kCuts - centre.x;
-        const float half = std::sqrt(std::max(radius * radius - away * away, 0.0f));
-        Stretch& stretch = m_stretches[static_cast<std::size_t>(i)];
-        stretch.top = std::min(stretch.top, centre.y - half);
-        stretch.bottom = std::max(stretch.bottom, centre.y + half);
+    const Range cuts = CutsBetween(centre.x - radius, centre.x + radius);
+    if (cuts.first >= cuts.end) return;
+    const std::size_t count = cuts.end - cuts.first;
+    const float x = centre.x - static_cast<float>(m_left);
+    const float from = MiddleOf(cuts.first) - x;
+    // Points in the middles of pixels, as most are, have the same disc.
+    if (m_halves.size() < count || from != m_halvesFrom) {
+        m_halvesFrom = from;
+        m_halves.resize(count);
+        for (std::size_t i = 0; i < count; ++i) {
+            const float away = MiddleOf(cuts.first + i) - x;
+            m_halves[i] = std::sqrt(std::max(radius * radius - away * away, 0.0f));
+        }
     }
+    float* const tops = m_tops.data() + cuts.first;
+    float* const bottoms = m_bottoms.data() + cuts.first;
+    const float* const halves = m_halves.data();
+    for (std::size_t i = 0; i < count; ++i) tops[i] = std::min(tops[i], centre.y - halves[i]);
+    for (std::size_t i = 0; i < count; ++i) bottoms[i] = std::max(bottoms[i], centre.y + halves[i]);
 }
 
 // A disc's edge touches the lines parallel to the segment beside its middle: there its two sides are, as far
@@ -50,62 +63,101 @@ void CurveMask::AddSegment(PointF from, PointF to, float radius) {
     if (run <= 0.0f) return;
     const float slope = (to.y - from.y) / run, root = std::sqrt(1.0f + slope * slope);
     const float shift = radius * slope / root, half = radius * root;
-    const Range cuts = CutsWithin(from.x, to.x, std::abs(shift), m_left, m_stretches.size());
-    for (int i = cuts.first; i < cuts.end; ++i) {
-        const float x = static_cast<float>(m_left) + (static_cast<float>(i) + 0.5f) / kCuts;
-        const float y = from.y + slope * (x - from.x);
-        Stretch& stretch = m_stretches[static_cast<std::size_t>(i)];
-        if (x + shift >= from.x && x + shift <= to.x) stretch.bottom = std::max(stretch.bottom, y + half);
-        if (x - shift >= from.x && x - shift <= to.x) stretch.top = std::min(stretch.top, y - half);
-    }
+    const float x = from.x - static_cast<float>(m_left);
+    const auto heightAt = [&](std::size_t cut) { return from.y + slope * (MiddleOf(cut) - x); };
+    const Range lower = CutsBetween(from.x - shift, to.x - shift);
+    for (std::size_t i = lower.first; i < lower.end; ++i)
+        m_bottoms[i] = std::max(m_bottoms[i], heightAt(i) + half);
+    const Range upper = CutsBetween(from.x + shift, to.x + shift);
+    for (std::size_t i = upper.first; i < upper.end; ++i) m_tops[i] = std::min(m_tops[i], heightAt(i) - half);
 }
 
-void CurveMask::FillColumn(int column) {
-    for (int cut = 0; cut < kCuts; ++cut) {
-        const Stretch& stretch = m_stretches[static_cast<std::size_t>(column * kCuts + cut)];
-        const float first = std::max(stretch.top - static_cast<float>(m_top), 0.0f);
-        const float end = std::min(stretch.bottom - static_cast<float>(m_top), static_cast<float>(m_height));
-        if (!(first < end)) continue;
-        const auto add = [&](int row, float part) {
-            std::uint8_t& pixel = m_pixels[static_cast<std::size_t>(row * m_stride + column)];
-            pixel = static_cast<std::uint8_t>(
-                pixel + static_cast<int>(part * static_cast<float>(kShares[cut]) + 0.5f));
-        };
-        const int top = static_cast<int>(first), bottom = std::min(static_cast<int>(end), m_height - 1);
-        if (top == bottom) {
-            add(top, end - first);
-            continue;
-        }
-        add(top, static_cast<float>(top + 1) - first);
-        std::uint8_t* pixel = m_pixels.data() + static_cast<std::ptrdiff_t>((top + 1) * m_stride + column);
-        for (int row = top + 1; row < bottom; ++row, pixel += m_stride)
-            *pixel = static_cast<std::uint8_t>(*pixel + kShares[cut]);
-        add(bottom, end - static_cast<float>(bottom));
-    }
+bool CurveMask::Reach(float left, float right, const RectF& within) {
+    m_left = static_cast<int>(std::max(std::floor(left), within.x));
+    m_top = static_cast<int>(within.y);
+    m_width = static_cast<int>(std::min(std::ceil(right), within.x + within.width)) - m_left;
+    m_height = static_cast<int>(within.height);
+    m_next = 0;
+    if (m_width < 1 || m_height < 1) m_width = 0;
+    m_tops.assign(static_cast<std::size_t>(m_width * kCuts), kNone);
+    m_bottoms.assign(m_tops.size(), -kNone);
+    return m_width > 0;
 }
 
-bool CurveMask::Draw(const PointF* points, int count, float width, const RectF& within) {
+void CurveMask::Line(const PointF* points, int count, float width, const RectF& within) {
     const float radius = width / 2.0f;
-    float lowest = -kNone, highest = kNone;
-    for (int i = 0; i < count; ++i) {
-        highest = std::min(highest, points[i].y);
-        lowest = std::max(lowest, points[i].y);
-    }
-    m_left = static_cast<int>(std::max(std::floor(points[0].x - radius), within.x));
-    m_top = static_cast<int>(std::max(std::floor(highest - radius), within.y));
-    m_width =
-        static_cast<int>(std::min(std::ceil(points[count - 1].x + radius), within.x + within.width)) - m_left;
-    m_height = static_cast<int>(std::min(std::ceil(lowest + radius), within.y + within.height)) - m_top;
-    if (m_width < 1 || m_height < 1) return false;
-    m_stride = (m_width + 3) / 4 * 4;
-    m_stretches.assign(static_cast<std::size_t>(m_width * kCuts), {kNone, -kNone});
-    m_pixels.assign(static_cast<std::size_t>(m_stride) * static_cast<std::size_t>(m_height), 0);
+    if (!Reach(points[0].x - radius, points[count - 1].x + radius, within)) return;
+    m_halves.clear();
     for (int i = 0; i < count; ++i) {
         AddDisc(points[i], radius);
         if (i > 0) AddSegment(points[i - 1], points[i], radius);
     }
-    for (int column = 0; column < m_width; ++column) FillColumn(column);
-    return true;
+}
+
+void CurveMask::Area(const PointF* points, int count, float ground, const RectF& within) {
+    if (!Reach(points[0].x, points[count - 1].x, within)) return;
+    for (int i = 1; i < count; ++i) AddSegment(points[i - 1], points[i], 0.0f);
+    for (std::size_t cut = 0; cut < m_tops.size(); ++cut)
+        if (m_tops[cut] < ground) m_bottoms[cut] = ground;
+}
+
+// Adds what a column's pixels have more than those above them, so that few are touched however steep the line
+// is.
+void CurveMask::AddColumn(std::size_t column, int top, int height, std::uint8_t* pixel) const {
+    const auto limit = static_cast<float>(height), above = static_cast<float>(top);
+    const auto add = [pixel](int row, int level) {
+        std::uint8_t& changed = pixel[row * kStrip];
+        changed = static_cast<std::uint8_t>(changed + level);
+    };
+    for (std::size_t cut = 0; cut < kCuts; ++cut) {
+        const float first = std::max(m_tops[column * kCuts + cut] - above, 0.0f);
+        const float end = std::min(m_bottoms[column * kCuts + cut] - above, limit);
+        if (!(first < end)) continue;
+        const int share = kShares[cut];
+        const auto part = [share](float covered) {
+            return static_cast<int>(covered * static_cast<float>(share) + 0.5f);
+        };
+        const int firstRow = static_cast<int>(first), lastRow = std::min(static_cast<int>(end), height - 1);
+        const bool within = firstRow == lastRow;
+        const int begins = part((within ? end : static_cast<float>(firstRow + 1)) - first);
+        const int ends = within ? begins : part(end - static_cast<float>(lastRow));
+        const int full = within ? begins : share;
+        add(firstRow, begins);
+        add(firstRow + 1, full - begins);
+        add(lastRow, ends - full);
+        add(lastRow + 1, -ends);
+    }
+}
+
+bool CurveMask::Next(Strip& strip) {
+    while (m_next < m_width) {
+        const int left = m_next, width = std::min(m_width - left, kStrip);
+        m_next += width;
+        const auto from = static_cast<std::ptrdiff_t>(left) * kCuts;
+        const auto to = from + static_cast<std::ptrdiff_t>(width) * kCuts;
+        const auto tops = std::minmax_element(m_tops.begin() + from, m_tops.begin() + to);
+        const auto bottoms = std::minmax_element(m_bottoms.begin() + from, m_bottoms.begin() + to);
+        const auto edge = [this](float y) {
+            return static_cast<int>(
+                std::clamp(y, static_cast<float>(m_top), static_cast<float>(m_top + m_height)));
+        };
+        const int top = edge(std::floor(*tops.first)), bottom = edge(std::ceil(*bottoms.second));
+        if (bottom <= top) continue;
+        const bool level = edge(*bottoms.first) == bottom;
+        const int solidFrom = level ? std::min(edge(std::ceil(*tops.second)), bottom) : bottom;
+        const int height = solidFrom - top;
+        constexpr auto kStride = static_cast<std::size_t>(kStrip);
+        m_pixels.assign(kStride * (static_cast<std::size_t>(height) + 1), 0);
+        for (int column = 0; column < width; ++column)
+            AddColumn(static_cast<std::size_t>(left + column), top, height, m_pixels.data() + column);
+        std::uint8_t* row = m_pixels.data();
+        for (int y = 1; y < height; ++y, row += kStride)
+            for (std::size_t x = 0; x < kStride; ++x)
+                row[kStride + x] = static_cast<std::uint8_t>(row[kStride + x] + row[x]);
+        strip = {m_left + left, top, width, height, kStrip, bottom - solidFrom, m_pixels.data()};
+        return true;
+    }
+    return false;
 }
 
 }  // namespace Corvo

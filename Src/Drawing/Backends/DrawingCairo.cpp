@@ -70,6 +70,18 @@ bool AddPath(cairo_t* context, const PointF* points, int count) {
     return added >= 2;
 }
 
+// Whether they are a curve with about a point in every pixel, all of which can be drawn.
+bool HasManyPoints(const PointF* points, int count) {
+    constexpr int kFewPoints = 64;
+    constexpr float kSparse = 3.0f;  // pixels between points
+    if (count < kFewPoints || !IsUsable(points[0]) || !IsUsable(points[count - 1]) ||
+        points[count - 1].x - points[0].x > kSparse * static_cast<float>(count))
+        return false;
+    for (int i = 0; i < count; ++i)
+        if (!IsUsable(points[i])) return false;
+    return CurveMask::IsCurve(points, count);
+}
+
 // The part of a surface of pixels that drawing can reach, in the context's coordinates; nothing where these
 // are no pixels, or the surface has none.
 bool ReachablePixels(cairo_t* context, RectF& reach) {
@@ -216,27 +228,46 @@ void DrawingCairo::DrawTarget::Polyline(const PointF* points, int count, const S
 
 // A curve with many points, on pixels; false for everything else.
 bool DrawingCairo::DrawTarget::DrawCurve(const PointF* points, int count, float width) {
-    constexpr int kFewPoints = 64;
-    constexpr float kSparse = 3.0f;  // pixels between points
     RectF reach;
-    if (count < kFewPoints || !IsUsable(points[0]) || !IsUsable(points[count - 1]) ||
-        points[count - 1].x - points[0].x > kSparse * static_cast<float>(count))
-        return false;
-    for (int i = 0; i < count; ++i)
-        if (!IsUsable(points[i])) return false;
-    if (!CurveMask::IsCurve(points, count) || !ReachablePixels(m_context, reach)) return false;
-    CurveMask& curve = m_drawing.m_resources->curve;
-    if (!curve.Draw(points, count, width, reach)) return true;
-    cairo_surface_t* const mask = cairo_image_surface_create_for_data(
-        curve.Pixels(), CAIRO_FORMAT_A8, curve.Width(), curve.Height(), curve.Stride());
-    cairo_mask_surface(m_context, mask, curve.Left(), curve.Top());
-    cairo_surface_destroy(mask);
+    if (!HasManyPoints(points, count) || !ReachablePixels(m_context, reach)) return false;
+    m_drawing.m_resources->curve.Line(points, count, width, reach);
+    Compose();
     return true;
+}
+
+// What such a curve and a level line below it enclose.
+bool DrawingCairo::DrawTarget::FillUnderCurve(const PointF* points, int count) {
+    RectF reach;
+    const int last = count - 3;
+    if (!HasManyPoints(points, last + 1)) return false;
+    const PointF right = points[count - 2], left = points[count - 1];
+    if (right.x != points[last].x || left.x != points[0].x || left.y != right.y || !IsUsable(left))
+        return false;
+    for (int i = 0; i <= last; ++i)
+        if (points[i].y > left.y) return false;
+    if (!ReachablePixels(m_context, reach)) return false;
+    m_drawing.m_resources->curve.Area(points, last + 1, left.y, reach);
+    Compose();
+    return true;
+}
+
+// What the mask holds, in the present colour.
+void DrawingCairo::DrawTarget::Compose() {
+    for (CurveMask::Strip strip; m_drawing.m_resources->curve.Next(strip);) {
+        if (strip.solid > 0)
+            cairo_rectangle(m_context, strip.left, strip.top + strip.height, strip.width, strip.solid);
+        if (strip.height < 1) continue;
+        cairo_surface_t* const mask = cairo_image_surface_create_for_data(
+            strip.pixels, CAIRO_FORMAT_A8, strip.width, strip.height, strip.stride);
+        cairo_mask_surface(m_context, mask, strip.left, strip.top);
+        cairo_surface_destroy(mask);
+    }
+    cairo_fill(m_context);
 }
 
 void DrawingCairo::DrawTarget::FillPolygon(const PointF* points, int count, Ink ink) {
     Use(ink);
-    if (!AddPath(m_context, points, count)) return;
+    if (FillUnderCurve(points, count) || !AddPath(m_context, points, count)) return;
     cairo_close_path(m_context);
     cairo_fill(m_context);
 }

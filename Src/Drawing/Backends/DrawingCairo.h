@@ -59,6 +59,8 @@ private:
     void Use(Ink ink);
     bool Use(const Stroke& stroke);
     bool DrawCurve(const PointF* points, int count, float width);
+    bool FillUnderCurve(const PointF* points, int count);
+    void Compose();
 
     DrawingCairo& m_drawing;
     cairo_t* m_context;

@@ -37,7 +37,7 @@ class CairoBackend : public ViewTest {};
 // Catches curves that are drawn column by column otherwise than as outlines: elsewhere, thicker or torn.
 TEST_F(CairoBackend, CurvesAreAsOutlined) {
     constexpr int kSide = 200;
-    for (const float width : {1.0f, 1.5f, 3.0f, 8.0f}) {
+    for (const float width : {0.0f, 1.0f, 1.5f, 3.0f, 8.0f}) {  // 0: the area under it
         std::vector<PointF> points;
         const auto noise = TestSupport::Noise<float>(kSide);
         for (int i = 0; i < kSide - 20; ++i) {
@@ -46,6 +46,9 @@ TEST_F(CairoBackend, CurvesAreAsOutlined) {
                             (i > 90 ? 30.0f * noise[static_cast<std::size_t>(i)] : 0.0f);
             points.push_back({x + 10.25f, y});
         }
+        if (width == 0.0f)
+            for (const float x : {points.back().x, points.front().x}) points.push_back({x, 210.0f});
+        const auto count = static_cast<int>(points.size());
         const auto picture = [&](bool outlined) {
             cairo_surface_t* const image = cairo_image_surface_create(CAIRO_FORMAT_RGB24, kSide, kSide);
             cairo_t* const context = cairo_create(image);
@@ -55,11 +58,14 @@ TEST_F(CairoBackend, CurvesAreAsOutlined) {
                 cairo_set_line_join(context, CAIRO_LINE_JOIN_ROUND);
                 cairo_set_line_cap(context, CAIRO_LINE_CAP_ROUND);
                 for (const PointF& p : points) cairo_line_to(context, p.x, p.y);
-                cairo_stroke(context);
+                width > 0.0f ? cairo_stroke(context) : cairo_fill(context);
             } else {
                 DrawingCairo drawing;
                 DrawingCairo::DrawTarget target(drawing, context, 96.0f);
-                target.Polyline(points.data(), static_cast<int>(points.size()), {{0xFFFFFF}, width});
+                if (width > 0.0f)
+                    target.Polyline(points.data(), count, {{0xFFFFFF}, width});
+                else
+                    target.FillPolygon(points.data(), count, {0xFFFFFF});
             }
             cairo_surface_flush(image);
             const unsigned char* const bytes = cairo_image_surface_get_data(image);
