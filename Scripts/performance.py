@@ -13,7 +13,7 @@ import subprocess
 import sys
 import time
 
-ROUNDS, SECONDS, SHELL_ROUNDS = 9, 0.02, 7
+ROUNDS, SECONDS, SHELL_ROUNDS = 9, 0.02, 5
 SHELL = "From a shell"
 EXPLAINED = {
     "Effects": "Stereo floats at 48 kHz, interleaved, blocks of 512; a frame each.",

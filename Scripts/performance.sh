@@ -24,7 +24,7 @@ done
 say "measuring" >&2
 tables=$recordings/tables.md
 {
-    printf 'Measured on %s on one %s (%s processors, %s of them busy with something else), with %s, by\n' \
+    printf 'Measured on %s on one %s (%s processors, a load of %s from others), with %s, by\n' \
         "$(date -u +%F)" "$(sed -n 's/^model name[^:]*: //p' /proc/cpuinfo | head -1)" "$(nproc)" \
         "$(cut -d' ' -f1 /proc/loadavg)" "$(c++ --version | head -1)"
     printf '`Scripts/performance.sh`, beside these Debian packages:\n'

@@ -10,6 +10,8 @@
 namespace dsphost {
 namespace {
 
+constexpr int kBlocksBetweenSyncs = 64;  // some megabytes
+
 // Two ways to make a value an integer: which values lead into the range, and to which number within it.
 
 struct Nearest {  // ties to even
@@ -117,6 +119,7 @@ bool AudioWriter::StoreBlock() {
     const Block* const block = m_behind->ToTake();
     if (!block) return false;
     Store(block->samples.data(), block->frames);
+    if (++m_stored % kBlocksBetweenSyncs == 0) m_output.Bytes().BeginSync();
     m_behind->Return();
     return true;
 }

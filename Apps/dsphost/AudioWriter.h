@@ -70,6 +70,7 @@ private:
     std::int64_t m_clipped = 0, m_frames = 0;
     Block* m_block = nullptr;  // being filled
     bool m_truncates = false, m_ownThread = false;
+    int m_stored = 0;                 // blocks
     std::unique_ptr<Relay> m_behind;  // last: its thread uses the others
 };
 

@@ -252,6 +252,12 @@ bool File::BecomeLike(const fs::path& other) {
 #endif
 }
 
+void File::BeginSync() {
+#if defined(__linux__)
+    sync_file_range(fileno(m_stream), 0, 0, SYNC_FILE_RANGE_WRITE);
+#endif
+}
+
 void File::Sync() {
     errno = 0;
     const bool done = std::fflush(m_stream) == 0 && SyncStream(m_stream) == 0;

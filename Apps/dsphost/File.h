@@ -59,6 +59,8 @@ public:
     void ThrowIfFailed() const;
     // Takes the owner, the group and the permissions of another file. False where the owner cannot be kept.
     bool BecomeLike(const std::filesystem::path& other);
+    // Lets the system begin to store what it was given, where it can, so that Sync waits for less.
+    void BeginSync();
     // Waits until everything is on the disk. Errors are kept for Close.
     void Sync();
     // Hands everything over to the system; throws IoError if it does not take it. The standard streams
