@@ -50,20 +50,41 @@ void Analyse(const Analysis& a, std::size_t bins) {
     }
 }
 
-void Synthesise(const Synthesis& s, std::size_t bins) {
-    const double binWidth = s.binWidth, expected = s.expectedPhase, oversampling = s.oversampling,
-                 scale = s.scale;
+// A quotient whose divisor is a power of two is a product to the last bit, and much sooner there.
+struct AnyDivisor {
+    double value;
+    double Under(double x) const { return x / value; }
+};
+struct PowerOfTwo {
+    double inverse;
+    explicit PowerOfTwo(double value) : inverse(1.0 / value) {}
+    double Under(double x) const { return x * inverse; }
+};
+
+template <typename Divisor>
+void SynthesiseWith(const Synthesis& s, std::size_t bins) {
+    const double binWidth = s.binWidth, expected = s.expectedPhase;
+    const Divisor oversampling{s.oversampling}, scale{s.scale};
     const auto count = static_cast<std::int32_t>(bins);
     for (std::int32_t k = 0; k < count; ++k) {
         const auto bin = static_cast<double>(k);
         const double off = (static_cast<double>(s.frequency[k]) - bin * binWidth) / binWidth;
-        const double sum = s.phase[k] + (off * (2.0 * kPi) / oversampling + bin * expected);
+        const double sum = s.phase[k] + (oversampling.Under(off * (2.0 * kPi)) + bin * expected);
         const double phase = sum - 2.0 * kPi * Nearest(sum * (0.5 / kPi));
         s.phase[k] = phase;
         const auto value = static_cast<float>(static_cast<double>(s.magnitude[k]) * Cosine(phase));
         s.accumulator[k] = static_cast<float>(static_cast<double>(s.accumulator[k]) +
-                                              2.0 * s.window[k] * static_cast<double>(value) / scale);
+                                              scale.Under(2.0 * s.window[k] * static_cast<double>(value)));
     }
+}
+
+// The frame's size is a power of two, so that both divisors are one or neither.
+void Synthesise(const Synthesis& s, std::size_t bins) {
+    const auto oversampling = static_cast<std::uint32_t>(s.oversampling);
+    if ((oversampling & (oversampling - 1)) == 0)
+        SynthesiseWith<PowerOfTwo>(s, bins);
+    else
+        SynthesiseWith<AnyDivisor>(s, bins);
 }
 
 constexpr Kernels kKernels{Analyse, Synthesise};

@@ -16,7 +16,7 @@ TEST(ClassicKernel, GivesTheSameBitsInRegistersOfEveryWidth) {
     constexpr std::size_t kBins = 133;
     const auto table = TestSupport::Noise<float>(4 * kBins, 20000.0);
     const auto window = TestSupport::Noise<double>(kBins);
-    const auto run = [&](const Kernels& kernels) {
+    const auto run = [&](const Kernels& kernels, double over) {
         std::vector<std::int32_t> last(kBins), target(kBins);
         std::vector<float> strength(kBins), frequency(kBins), sum(kBins);
         std::vector<double> phase(kBins);
@@ -28,11 +28,11 @@ TEST(ClassicKernel, GivesTheSameBitsInRegistersOfEveryWidth) {
                 {input.data(), window.data(), table.data(), table.data() + kBins, table.data() + 2 * kBins,
                  pitch, last.data(), strength.data(), frequency.data(), target.data()},
                 kBins);
-            kernels.synthesise({strength.data(), frequency.data(), window.data(), 187.5, 0.7, 3.0, 384.0,
-                                phase.data(), sum.data()},
+            kernels.synthesise({strength.data(), frequency.data(), window.data(), 187.5, 0.7, over,
+                                128 * over, phase.data(), sum.data()},
                                kBins);
         }
         return std::tuple(last, target, strength, frequency, sum, phase);
     };
-    EXPECT_EQ(run(BaselineKernels()), run(Avx2Kernels()));
+    for (const double over : {3.0, 4.0}) EXPECT_EQ(run(BaselineKernels(), over), run(Avx2Kernels(), over));
 }
