@@ -23,8 +23,8 @@
 #include "Support/Signals.h"
 
 // What does a frame of a track cost in a session of many, whose memory no cache holds? A track is a gain, an
-// equaliser of four bands, a compressor, an echo and a reverb, each with settings of its own, on two seconds
-// of sound of its own that all of its memory has seen. The arguments are tracks and frames of a block.
+// equaliser of four bands, a compressor, an echo and a reverb, each with settings and sound of its own, after
+// two seconds in which all of its memory has been touched. The arguments are tracks and frames of a block.
 namespace {
 
 constexpr int kRate = 48000, kMostFrames = 512, kChannels = 2, kBands = 4;

@@ -159,11 +159,23 @@ private:
             count = std::min(frames - done, m_shortest);
             RunCombs<Channels>({reflected[0] + done, reflected[1] + done}, {sum[0].data(), sum[1].data()},
                                count);
-            for (std::size_t c = 0; c < Channels; ++c) {
+            for (std::size_t c = 0; c < Channels; ++c)
                 Output(m_data[c], from[c] + done, reflected[c] + done, sum[c].data(), count);
-                T* const out = samples[c] + done * stride;
-                for (int i = 0; i < count; ++i) out[i * stride] = sum[c][static_cast<std::size_t>(i)];
+            if (Channels == 2 && stride == 2 && samples[1] == samples[0] + 1) {
+                Interleave(sum[0].data(), sum[1].data(), samples[0] + done * stride, count);
+                continue;
             }
+            for (std::size_t c = 0; c < Channels; ++c)
+                for (int i = 0; i < count; ++i)
+                    samples[c][(done + i) * stride] = sum[c][static_cast<std::size_t>(i)];
+        }
+    }
+
+    static void Interleave(const T* __restrict left, const T* __restrict right, T* __restrict out,
+                           int count) {
+        for (int i = 0; i < count; ++i) {
+            out[2 * i] = left[i];
+            out[2 * i + 1] = right[i];
         }
     }
 

@@ -16,7 +16,7 @@ template <typename T>
 struct CombBank {
     static constexpr std::size_t kMost = 2 * ReverbDesign::kCombs, kPadded = kMost + 4;
     // What a comb's damping remembers, and its gains; what pads a register is 0.
-    alignas(64) std::array<T, kPadded> memory{}, damping{}, feedback{};
+    std::array<T, kPadded> memory{}, damping{}, feedback{};
 };
 
 // The gains of a channel's sound.
