@@ -1,6 +1,5 @@
 #pragma once
 
-#include <cstddef>
 #include <cstdint>
 #include <vector>
 
@@ -31,14 +30,14 @@ public:
 
 private:
     struct Range {
-        std::size_t first, end;
+        int first, end;
     };
 
     bool Reach(float left, float right, const RectF& within);
     Range CutsBetween(float from, float to) const;
     void AddDisc(PointF centre, float radius);
     void AddSegment(PointF from, PointF to, float radius);
-    void AddColumn(std::size_t column, int top, int height, std::uint8_t* pixel) const;
+    void AddColumn(int column, int top, int height, std::uint8_t* pixel) const;
 
     int m_left = 0, m_top = 0, m_width = 0, m_height = 0;
     int m_next = 0;  // the first column that no strip had

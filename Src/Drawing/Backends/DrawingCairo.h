@@ -10,6 +10,7 @@
 #include "Platform/Export.h"
 
 using cairo_t = struct _cairo;
+using cairo_surface_t = struct _cairo_surface;
 
 namespace Corvo {
 
@@ -61,6 +62,7 @@ private:
     bool DrawCurve(const PointF* points, int count, float width);
     bool FillUnderCurve(const PointF* points, int count);
     void Compose();
+    cairo_surface_t* Stretched(const DrawingBitmap& bitmap, const RectF& r);
 
     DrawingCairo& m_drawing;
     cairo_t* m_context;
