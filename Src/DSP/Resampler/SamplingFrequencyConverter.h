@@ -34,8 +34,10 @@ struct DSP_API SamplingFrequencyConverter {
     // Each step of the raised rate takes 176 bytes of tables, which must fit a 32-bit address space.
     static constexpr int kMaxFactor = 0x7FFFFFFF / 256;
 
+    // Not set up: blocks return 0.
     SamplingFrequencyConverter();
     ~SamplingFrequencyConverter();
+    // Both then point to the same rings; see above.
     SamplingFrequencyConverter(const SamplingFrequencyConverter& other);
     SamplingFrequencyConverter& operator=(const SamplingFrequencyConverter& other);
 

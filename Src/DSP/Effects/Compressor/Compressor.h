@@ -90,6 +90,7 @@ public:
 
     // User-interface thread: stores one parameter and, with `submit`, hands the settings to the audio side.
     void SetParamFromUi(int index, float normalised, bool submit);
+    // Hands over what was stored without `submit`.
     void SubmitUiSettingsChange();
     // User-interface thread: takes over curves that automation changed. Every call that reads or edits
     // settings does so first.
@@ -106,6 +107,8 @@ public:
     // The settings of a preset, of the nearest one for a number out of range.
     static Settings GetPresetData(int preset);
 
+    // Which channel's curve the host's editor edits: kept for it, and nothing here depends on it. Any thread
+    // but the audio thread.
     CompressorPrivate::EditChannelMode GetEditChannelMode() const;
     void SetEditChannelMode(CompressorPrivate::EditChannelMode mode);
     // Whether a side-chain was handed over for the last block; any thread.
