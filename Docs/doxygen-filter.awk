@@ -76,6 +76,7 @@ function speaks_for(line,    at) {
     ended = /[;}]( *\/\/.*)?$/
 }
 /^(public|protected|private):|^};/ { close_group() }
+/^}.* \/\/ namespace/ { sub(/ +\/\/.*/, "") }
 /[;,{})] +\/\/ / {
     at = match($0, / +\/\/ /)
     print substr($0, 1, at - 1) "  ///< " escaped(substr($0, at + RLENGTH))
