@@ -10,7 +10,8 @@ struct PolePairLowPass;
 
 // Converts interleaved audio to another sample rate by the factor L / M: L - 1 zeros after each sample, a
 // Butterworth low-pass of order 10 at 0.455 of the lower rate, every M-th sample kept. Sample formats are
-// converted on the way, with dither where it is asked for.
+// converted on the way, with dither where it is asked for. Cf. R. E. Crochiere and L. R. Rabiner, "Multirate
+// Digital Signal Processing" (1983).
 //
 // Life: InitConversion or InitConversionByFactors, then Init, then any number of blocks, which continue
 // each other: a stream cut into blocks gives the same bits as in one. FreeRings at the end.
