@@ -1,4 +1,5 @@
 # Makes the headers' plain comments readable for Doxygen, and puts each header's contents into the group of its folder.
+# A comment speaks for all declarations below it up to an empty line or the next comment.
 function escaped(text) {
     gsub(/\\/, "\\\\", text)
     gsub(/@/, "\\@", text)
@@ -8,6 +9,12 @@ function escaped(text) {
     gsub(/%/, "\\%", text)
     gsub(/"/, "\\\"", text)
     sub(/ \.\.$/, " to", text)  # a full stop in the line's last place would end a list
+    return code(text)
+}
+# What stands between backticks is code.
+function code(text) {
+    while (match(text, /`[^`]+`/))
+        text = substr(text, 1, RSTART - 1) "<tt>" substr(text, RSTART + 1, RLENGTH - 2) "</tt>" substr(text, RSTART + RLENGTH)
     return text
 }
 BEGIN {
@@ -30,7 +37,10 @@ function close_group() {
     open = 0
 }
 function about(next_line,    end) {
-    if (comment == "") return
+    if (comment == "") {
+        if (speaks_for(next_line)) print said
+        return
+    }
     if (indent == "" && next_line ~ /^(namespace .*)?$/) comment = "\\file\n" comment
     else if (next_line == "") {
         close_group()
@@ -41,9 +51,19 @@ function about(next_line,    end) {
     }
     gsub(/\n/, "\n" indent "/// ", comment)
     print indent "/// " comment
+    said = next_line == "" ? "" : indent "/// " comment
     comment = ""
 }
+# Whether the comment said last speaks for this line: a declaration of its own, beside the one before it.
+function speaks_for(line,    at) {
+    if (line == "") said = ""
+    if (said == "" || !ended) return 0
+    at = line
+    sub(/[^ \t].*/, "", at)
+    return at == indent && line !~ /^ *[}#]|^(public|protected|private):|~| override|= delete|friend |static_assert|[;,{})] +\/\/ /
+}
 /^[ \t]*\/\/ clang-format/ { next }
+/^template <class D> void / { next }  # bodies of what their classes declare
 /^[ \t]*\/\/( |$)/ {
     indent = text = $0
     sub(/\/\/.*/, "", indent)
@@ -51,8 +71,12 @@ function about(next_line,    end) {
     keep(escaped(text))
     next
 }
-{ about($0) }
+{
+    about($0)
+    ended = /[;}]( *\/\/.*)?$/
+}
 /^(public|protected|private):|^};/ { close_group() }
+/^}.* \/\/ namespace/ { sub(/ +\/\/.*/, "") }
 /[;,{})] +\/\/ / {
     at = match($0, / +\/\/ /)
     print substr($0, 1, at - 1) "  ///< " escaped(substr($0, at + RLENGTH))
@@ -75,7 +99,17 @@ heading && /\*\// {
     heading = 0
     next
 }
+/^\/\* / { said_in_c = "" }
 /^[ \t]*\/\* / { sub(/\/\* /, "/** ") }
 /[;,{}] +\/\* / { sub(/\/\* /, "/**< ") }
-{ print }
+/^\/\*\* /, /\*\// {
+    said_in_c = said_in_c code($0) "\n"
+    spoken = 0
+}
+/^$/ { said_in_c = "" }
+/^DSP_C_API/ {
+    if (spoken) printf "%s", said_in_c
+    spoken = 1
+}
+{ print code($0) }
 END { print "/** @} */" }

@@ -23,7 +23,7 @@ PYTHONPATH=$PWD/build/python $python examples/08-python.py
 recordings=build/python/recordings
 mkdir -p $recordings
 cp "$(dpkg -L sonic-pi-samples | grep -m1 '/guit_em9\.')" $recordings/in.flac
-PYTHONPATH=$PWD/build/python $python Scripts/doc-blocks.py build/python $recordings --python README.md
+PYTHONPATH=$PWD/build/python $python Scripts/doc-blocks.py build/python $recordings --python README.md Docs/python.md
 
 say "installing (python)"
 prefix=build/python/installed

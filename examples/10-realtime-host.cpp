@@ -1,4 +1,4 @@
-// A small real-time host: 10-realtime-host EFFECT, then lines such as "Mix=40 %", until the end of input.
+// A small real-time host for JACK: 10-realtime-host EFFECT, then lines such as "Mix=40 %", until the end.
 #include <jack/jack.h>
 
 #include <algorithm>

@@ -51,7 +51,7 @@ void SetOut(Way& main, const std::vector<Way>& beside) {
     double left = kMargin;
     for (std::size_t i = 0; i < main.size(); ++i) {
         for (const Way& way : beside) {
-            const auto ends = std::minmax(PlaceOf(main, way.front().text), PlaceOf(main, way.back().text));
+            const auto ends = std::minmax({PlaceOf(main, way.front().text), PlaceOf(main, way.back().text)});
             if (ends.second == i)
                 left = std::max(left, main[ends.first].Middle() + WidthInside(way) - main[i].width / 2);
         }

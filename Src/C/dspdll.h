@@ -46,6 +46,7 @@ extern "C" {
 
 /* ---- Status, version, handles ---- */
 
+/* What every function that can fail returns. */
 typedef int32_t dsp_status;
 enum {
     DSP_OK = 0,
@@ -63,6 +64,7 @@ enum {
     DSP_FAILED = 12      /* anything else; the dsp_error says what */
 };
 
+/* Where a function may write what went wrong. */
 typedef struct dsp_error {
     uint32_t size;  /* 0 gets no text */
     char text[508]; /* a sentence */
@@ -99,10 +101,12 @@ typedef struct dsp_format {
 
 typedef struct dsp_effect dsp_effect;
 
+/* How many kinds there are, and their names, from 0. Constant; any thread. */
 DSP_C_API int32_t DSP_CALL dsp_effect_kinds(void);
 DSP_C_API dsp_status DSP_CALL dsp_effect_kind_name(int32_t kind, char* buffer, size_t size, size_t* needed);
 /* By name, in letters of either case, with the default preset. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_create(const char* name, dsp_effect** effect, dsp_error* error);
+/* The name of its kind. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_name(dsp_effect* effect, char* buffer, size_t size, size_t* needed);
 
 /* Makes all memory and starts the stream at position 0. A format that cannot be changes nothing; after
@@ -161,8 +165,10 @@ typedef struct dsp_tempo {
     double bpm;
 } dsp_tempo;
 typedef void(DSP_CALL* dsp_tempo_callback)(void* user, dsp_tempo* tempo);
+/* `user` is handed to the callback as it is. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_tempo_callback(dsp_effect* effect, dsp_tempo_callback callback,
                                                         void* user);
+/* The next block asks for the tempo again. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_tempo_changed(dsp_effect* effect);
 
 /* Parameters are numbered from 0. Their values are normalised, 0 to 1; one may stand for a left/right pair.
@@ -180,6 +186,7 @@ typedef struct dsp_parameter {
     int32_t choices; /* of a switch or list */
     float neutral;   /* where a control rests */
 } dsp_parameter;
+/* How many there are; what one is; its texts, of which `which` is a DSP_TEXT_... */
 DSP_C_API dsp_status DSP_CALL dsp_effect_parameters(dsp_effect* effect, int32_t* count);
 DSP_C_API dsp_status DSP_CALL dsp_effect_parameter(dsp_effect* effect, int32_t parameter,
                                                    dsp_parameter* record);
@@ -192,6 +199,7 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_find_parameter(dsp_effect* effect, cons
  * may mean the same choice. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_choice(dsp_effect* effect, int32_t parameter, int32_t choice,
                                                 float* value, char* buffer, size_t size, size_t* needed);
+/* Its value, 0 to 1. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_get(dsp_effect* effect, int32_t parameter, float* value);
 /* Takes effect with the next block. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_set(dsp_effect* effect, int32_t parameter, float value);
@@ -203,17 +211,19 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_value_to_text(dsp_effect* effect, int32
 DSP_C_API dsp_status DSP_CALL dsp_effect_text_to_value(dsp_effect* effect, int32_t parameter,
                                                        const char* text, float* value, dsp_error* error);
 
-/* From `frame` of the stream on the parameter has this value, before its first point that of the first.
- * Points are in ascending order and are met to the frame; no points end the automation. DSP_UNSUPPORTED where
- * the effect plays none. */
+/* From `frame` of the stream on the parameter has this value, before its first point that of the first. */
 typedef struct dsp_point {
     int64_t frame;
     float value;
     float reserved;
 } dsp_point;
+/* Replaces the automation of one parameter by `count` points, which are copied. They are in ascending order
+ * and are met to the frame; 0 points end the automation. DSP_UNSUPPORTED where the effect plays none. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_automate(dsp_effect* effect, int32_t parameter,
                                                   const dsp_point* points, size_t count);
 
+/* How many there are, from 0; the name of one; and all settings of one at once. DSP_OUT_OF_RANGE for a preset
+ * that there is not. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_presets(dsp_effect* effect, int32_t* count);
 DSP_C_API dsp_status DSP_CALL dsp_effect_preset_name(dsp_effect* effect, int32_t preset, char* buffer,
                                                      size_t size, size_t* needed);
@@ -227,7 +237,9 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_state(dsp_effect* effect, void* bytes, 
 DSP_C_API dsp_status DSP_CALL dsp_effect_set_state(dsp_effect* effect, const void* bytes, size_t size,
                                                    dsp_error* error);
 
-/* ---- Equaliser: up to 20 bands. One thread. ---- */
+/* ---- Equaliser ----
+ *
+ * Up to 20 bands. One thread. */
 
 typedef struct dsp_equaliser dsp_equaliser;
 enum {
@@ -241,20 +253,23 @@ enum {
 };
 typedef struct dsp_band {
     uint32_t size;
-    int32_t type;
+    int32_t type;      /* DSP_HIGHPASS to DSP_LOWSHELF */
     int32_t frequency; /* Hz, 1 to 1000000; limited to below half the rate where it is not a peak's */
     int32_t q; /* 1 to 100000; a peak is q/133 octaves wide, shelves slope and passes resonate with q/50 */
-    int32_t bypass;
+    int32_t bypass; /* other than 0: the band is left out */
     int32_t reserved;
     double gain; /* dB in tenths, -100 to 100 */
 } dsp_band;
+/* Without bands, not prepared. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_create(dsp_equaliser** equaliser, dsp_error* error);
+/* How many bands were set. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_bands(dsp_equaliser* equaliser, int32_t* count);
 /* All bands at once. While it is prepared, each place in the array glides to its new shape within some 3200
  * frames. A band that is new, removed, bypassed or flat (0 dB, no pass) is so from the next frame on, as the
  * equaliser leaves it out: take a peak or shelf to 0.1 dB first and let it arrive, where that would click. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_set_bands(dsp_equaliser* equaliser, const dsp_band* bands,
                                                       int32_t count, dsp_error* error);
+/* One of them as it was set. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_band(dsp_equaliser* equaliser, int32_t band, dsp_band* record);
 /* Inverted polarity. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_invert(dsp_equaliser* equaliser, int32_t invert);
@@ -262,6 +277,8 @@ DSP_C_API dsp_status DSP_CALL dsp_equaliser_is_inverted(dsp_equaliser* equaliser
 /* `max_frames` is not used: nothing is cut. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_prepare(dsp_equaliser* equaliser, const dsp_format* format,
                                                     dsp_error* error);
+/* Any number of interleaved frames in place, of the samples it was prepared for, else DSP_UNPREPARED. Neither
+ * allocates nor waits. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_process_f32(dsp_equaliser* equaliser, float* samples,
                                                         int32_t frames);
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_process_f64(dsp_equaliser* equaliser, double* samples,
@@ -271,8 +288,10 @@ DSP_C_API dsp_status DSP_CALL dsp_equaliser_process_f64(dsp_equaliser* equaliser
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_response(dsp_equaliser* equaliser, const double* frequencies,
                                                      double* real, double* imaginary, size_t count);
 
-/* ---- Converter: sample rate and sample format; frame n of the output stands where n * in_rate / out_rate of
- * the input stood. One thread. ---- */
+/* ---- Converter ----
+ *
+ * Sample rate and sample format; frame n of the output stands where n * in_rate / out_rate of the input
+ * stood. One thread. */
 
 typedef struct dsp_converter dsp_converter;
 enum { DSP_DITHER_NONE = 0, DSP_DITHER_FLAT = 1, DSP_DITHER_GENTLE = 2, DSP_DITHER_STRONG = 3 };
@@ -284,6 +303,7 @@ typedef struct dsp_conversion {
     int32_t dither;  /* for DSP_S16 and DSP_S24 */
     int32_t nearest; /* 1: small factors, quicker, refused where they miss the rate by over 20 cents */
 } dsp_conversion;
+/* Ready for the first block. DSP_OUT_OF_RANGE, with a sentence, for what it cannot convert. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_create(const dsp_conversion* conversion,
                                                    dsp_converter** converter, dsp_error* error);
 /* Frames that a recording of so many becomes, and the most that one block of so many gives. */
@@ -299,8 +319,9 @@ DSP_C_API dsp_status DSP_CALL dsp_converter_process(dsp_converter* converter, co
 DSP_C_API dsp_status DSP_CALL dsp_converter_finish(dsp_converter* converter, void* out, int32_t capacity,
                                                    int32_t* written);
 
-/* ---- Pitch shift of whole recordings: aligned and, but for the speed, as long as they were. One thread.
- * ---- */
+/* ---- Pitch shift of whole recordings ----
+ *
+ * Aligned and, but for the speed, as long as they were. One thread; it allocates as it goes. */
 
 typedef struct dsp_pitch_shift dsp_pitch_shift;
 enum { DSP_ENGINE_CLASSIC = 0, DSP_ENGINE_NEW = 1 };
@@ -314,8 +335,10 @@ typedef struct dsp_shift {
     double semitones; /* -36 to 36 */
     double speed;     /* 0.1 to 10, 1 for DSP_ENGINE_CLASSIC; 0 counts as 1 */
 } dsp_shift;
+/* Ready for the recording. DSP_OUT_OF_RANGE, with a sentence, for what it cannot do. */
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_create(const dsp_shift* shift, dsp_pitch_shift** pitch_shift,
                                                      dsp_error* error);
+/* The next frames, which are copied. DSP_UNPREPARED after finish. */
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_feed(dsp_pitch_shift* pitch_shift, const float* samples,
                                                    int32_t frames);
 /* The recording has ended; nothing is fed after that. */
@@ -324,15 +347,19 @@ DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_finish(dsp_pitch_shift* pitch_shif
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_take(dsp_pitch_shift* pitch_shift, float* samples,
                                                    int32_t capacity, int32_t* written);
 
-/* ---- Transform: in place, of one length, a power of two from 2 to 524288. One thread. ----
+/* ---- Transform ----
+ *
+ * In place, of one length, a power of two from 2 to 524288. One thread.
  *
  * Real: `length` values become the packed spectrum: the real parts of bin 0 and of bin length/2, then real
  * and imaginary part of bins 1, 2, ... Complex: `length` points, real and imaginary parts in turn. Forward is
  * unscaled, inverse scaled by 1/length. */
 
 typedef struct dsp_transform dsp_transform;
+/* Of `length` real values or, where `complex_points` is not 0, as many points. All memory is made here. */
 DSP_C_API dsp_status DSP_CALL dsp_transform_create(int32_t length, int32_t complex_points,
                                                    dsp_transform** transform, dsp_error* error);
+/* `inverse`: 0 forward, else back. Takes `length` values, or twice as many where they are points. */
 DSP_C_API dsp_status DSP_CALL dsp_transform_f32(dsp_transform* transform, float* values, int32_t inverse);
 DSP_C_API dsp_status DSP_CALL dsp_transform_f64(dsp_transform* transform, double* values, int32_t inverse);
 
@@ -342,10 +369,12 @@ DSP_C_API dsp_status DSP_CALL dsp_transform_f64(dsp_transform* transform, double
  * process: give it on the display thread, or while none is refreshed, read or drawn. */
 
 typedef struct dsp_analyser dsp_analyser;
+/* For sound of `rate` Hz, above 0; on, its tuner off. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, dsp_error* error);
 /* Switches: the analyser (on at first), its tuner, its frozen state, and what a drawing of it shows beside
  * the spectrum. */
 enum { DSP_ANALYSER_ON = 0, DSP_TUNER_ON = 1, DSP_FROZEN = 2, DSP_SHOW_SONOGRAM = 3, DSP_SHOW_INFO = 4 };
+/* Turns one of them on, or off with 0, and says whether it is on. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_switch(dsp_analyser* analyser, int32_t which, int32_t on);
 DSP_C_API dsp_status DSP_CALL dsp_analyser_is_on(dsp_analyser* analyser, int32_t which, int32_t* on);
 /* Interleaved; the mean of the channels, 1 to 64, is analysed. */
@@ -358,13 +387,16 @@ DSP_C_API dsp_status DSP_CALL dsp_analyser_refresh(dsp_analyser* analyser, int32
 /* Levels of the bins from 0 Hz up, dB below a full-scale sine, and their frequencies, Hz. Bin 0 also holds
  * what stands at half the rate. */
 enum { DSP_SPECTRUM_NOW = 0, DSP_SPECTRUM_SMOOTHED = 1, DSP_SPECTRUM_PEAKS = 2 };
+/* `which` is a DSP_SPECTRUM_... */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_spectrum(dsp_analyser* analyser, int32_t which, float* decibels,
                                                     size_t count, size_t* needed);
+/* As many as levels. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_frequencies(dsp_analyser* analyser, float* hz, size_t count,
                                                        size_t* needed);
 /* The highest peak from `lowest` Hz up, between bins; 0 Hz and -300 dB where there is none. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_highest_peak(dsp_analyser* analyser, double lowest, double* hz,
                                                         double* decibels);
+/* The peaks begin anew. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_forget_peaks(dsp_analyser* analyser);
 
 /* The menu: entries from 0, each with its command, its group's title and its text. A command that the menu
@@ -387,7 +419,9 @@ typedef struct dsp_tuner_reading {
     double cents;      /* positive when sharp */
     double prominence; /* dB */
 } dsp_tuner_reading;
+/* What the tuner shows now. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_tuner(dsp_analyser* analyser, dsp_tuner_reading* reading);
+/* The name of note 0 to 11 in the naming that the menu chose, without its octave. */
 DSP_C_API dsp_status DSP_CALL dsp_note_name(int32_t note, char* buffer, size_t size, size_t* needed);
 
 /* The sonogram's picture: as wide and high as asked for, each side 1 to 16384 and at most 2^26 pixels, until

@@ -33,7 +33,9 @@ typedef struct dsp_picture {
 /* What is kept between pictures: brushes, texts, the typeface. One thread draws, the analysers' display
  * thread. */
 typedef struct dsp_drawing dsp_drawing;
+/* With the typeface of now. */
 DSP_C_API dsp_status DSP_CALL dsp_drawing_create(dsp_drawing** drawing, dsp_error* error);
+/* Fills `picture` with a DSP_VIEW_... of the analyser. */
 DSP_C_API dsp_status DSP_CALL dsp_draw(dsp_drawing* drawing, dsp_analyser* analyser, int32_t view,
                                        const dsp_picture* picture, dsp_error* error);
 /* The file of the typeface of drawings made from now on; null or empty for the installed one. A file that

@@ -57,11 +57,13 @@ public:
     virtual void Polyline(const PointF* points, int count, const Stroke& stroke) = 0;
     // Closed, filled by the even-odd rule.
     virtual void FillPolygon(const PointF* points, int count, Ink ink) = 0;
+    // Filled, in pixels.
     virtual void FillRectangle(const RectF& rectangle, Ink ink) = 0;
     // The line lies within the rectangle.
     virtual void OutlineRectangle(const RectF& rectangle, const Stroke& stroke) = 0;
     // The radius is limited to half the shorter side.
     virtual void FillRoundedRectangle(const RectF& rectangle, float radius, Ink ink) = 0;
+    // What Text would take; 0 for an empty text.
     virtual TextMetrics MeasureText(std::string_view text, float size) = 0;
     // From, around or up to `baseline`.
     virtual void Text(std::string_view text, PointF baseline, TextAlign align, float size, Ink ink) = 0;

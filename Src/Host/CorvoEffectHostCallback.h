@@ -8,5 +8,6 @@ public:
     virtual ~CorvoEffectHostCallback() = default;
     // Beats per minute. 0 or below, or NaN, counts as 120.
     virtual double GetTempo() = 0;
+    // Such as 3 and 4. What is 0 or below counts as 4.
     virtual void GetTimeSignature(int& numerator, int& denominator) = 0;
 };

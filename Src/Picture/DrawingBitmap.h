@@ -35,6 +35,7 @@ struct DrawingBitmap {
         Changed();
     }
 
+    // What Size makes of a wish.
     static constexpr int LimitedWidth(int width) { return std::clamp(width, 0, kLargestSide); }
     static constexpr int LimitedHeight(int width, int height) {
         return std::clamp(height, 0, std::min(kLargestSide, kMostPixels / std::max(LimitedWidth(width), 1)));
@@ -46,10 +47,13 @@ struct DrawingBitmap {
         version = latest.fetch_add(1, std::memory_order_relaxed) + 1;
     }
 
+    // Whether there is no pixel.
     bool IsEmpty() const { return pixels.empty(); }
+    // The first pixel of row `y`, 0..height - 1; not checked.
     std::uint32_t* Row(int y) {
         return pixels.data() + static_cast<std::ptrdiff_t>(y) * static_cast<std::ptrdiff_t>(width);
     }
+    // The same.
     const std::uint32_t* Row(int y) const {
         return pixels.data() + static_cast<std::ptrdiff_t>(y) * static_cast<std::ptrdiff_t>(width);
     }

@@ -79,6 +79,7 @@ public:
     static void SetupMinimizedTunerBitmaps(int height);
     static void SetupErrorBitmaps(int side);
 
+    // What all analysers share; the library's.
     static SpectrumStaticInfo& GetStaticInfo();
     // A copy that no menu command changes half way. Any thread.
     static spectrum_settings GetSettings();
@@ -154,11 +155,14 @@ public:
     const std::vector<float>& GetPower() const;
     // The window that the newest samples are multiplied by.
     const std::vector<float>& GetWindow() const;
+    // Its parts, which live as long as it does. Never null.
     SpectrumDrawer* GetSpectrumDrawer() const;
     Tuner* GetTuner() const;
     Corvo::Sonogram* GetSonogram() const;
+    // Forgets the peaks of its curve.
     void peak_reset();
 
+    // Switched off, it analyses nothing and prepares no frames. Any thread.
     void SetOn(bool on);
     bool GetOn() const;
     // Switched on, the tuner has forgotten what it heard.
@@ -177,9 +181,12 @@ public:
     void ToggleDisplayMode();
     // Shows or hides the sonogram.
     void ToggleDisplayMode2();
+    // What DoDraw draws; any thread.
     _display_mode GetDisplayMode() const;
+    // Adds the sonogram to the spectrum, or leaves the spectrum alone.
     void ShowSonogram(bool show);
     bool IsShowSonogram() const;
+    // The box that tells what is at the pointer.
     void ToggleShowInfoBoxes();
     void SetShowInfoBox(bool show);
     bool IsShowInfoBox() const;

@@ -14,9 +14,11 @@ struct EffectKind {
     const char* name;                            // what GetName() of its instances says
     std::unique_ptr<CorvoEffectBase> (*make)();  // throws std::bad_alloc
 
-    // A new instance that starts as a host shows it: from its default preset, where it has presets.
+    // A new instance that starts as a host shows it: from its default preset, where it has presets. The
+    // caller owns it. Not on the audio thread; throws std::bad_alloc.
     DSP_API std::unique_ptr<CorvoEffectBase> MakeReady() const;
-    // Another instance with the settings and the host of `effect`, which is of this kind.
+    // Another instance with the settings and the host of `effect`, which is of this kind; not
+    // prepared. User-interface thread of `effect`; throws std::bad_alloc.
     DSP_API std::unique_ptr<CorvoEffectBase> Copy(CorvoEffectBase& effect) const;
 };
 

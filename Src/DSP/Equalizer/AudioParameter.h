@@ -86,10 +86,12 @@ struct AudioParameterManaged {
         if (!moving) ++*counter;
         moving = true;
     }
+    // Arrives at once.
     void Jump() {
         value = target;
         if (moving) Arrive();
     }
+    // One sample's progress.
     void Advance() {
         if (moving && !Progress::Step(value, start, target)) Arrive();
     }

@@ -21,6 +21,11 @@ using ManagedCoefficient = AudioParameterManaged<double, AudioParameterProgressA
 // `gain` is linear, `freq` and `sampleRate` in Hz. Q: a peak is Q/133 octaves wide; the shelves slope with
 // Q/50, 1 being the steepest without a bump and 3 the limit; high- and low-pass resonate with Q/50, 1 being
 // the flattest; the Butterworth shelves take no Q. `gain` scales the whole pass band of a high- or low-pass.
+// Formulae: R. Bristow-Johnson, "Cookbook formulae for audio equalizer biquad filter coefficients", for peak
+// and shelves; the passes by the bilinear transform; the Butterworth shelves designed at a quarter of the
+// rate and moved by an all-pass (A. G. Constantinides, "Spectral transformations for digital filters",
+// Proceedings of the IEE 117, 1970).
+//
 // Nothing is checked: a frequency at or above half the rate, or a Q of 0 or less, gives whatever the
 // formulas give, which may be unstable or not a number. No memory, no locks.
 template <typename Parameter>

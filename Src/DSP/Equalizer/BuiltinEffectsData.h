@@ -23,7 +23,9 @@ struct DSP_API _eq_data {
     // The band's bypass flag, and the channel's.
     bool bypass() const { return (type & kBypassBand) != 0; }
     bool bypass_track() const { return (type & kBypassTrack) != 0; }
+    // Sets the band's flag and leaves the rest of the word.
     void set_bypass(bool on);
+    // The type without the flags.
     EQFilterType filter_type() const { return static_cast<EQFilterType>(type & kTypeMask); }
     // Clears the boost. `which` 0, 1 and 2 also set type (flags cleared), frequency and Q to those of a low
     // shelf at 100 Hz, a peak at 2500 Hz and a high shelf at 6000 Hz; any other leaves them as they are.
@@ -43,6 +45,7 @@ public:
 
     // No listeners; otherwise as defaults() leaves it, with every further band a flat peak.
     builtin_effects_data();
+    // All fields, and a clone of every listener.
     builtin_effects_data(const builtin_effects_data& other);
     builtin_effects_data& operator=(const builtin_effects_data& other);
     ~builtin_effects_data();
@@ -72,13 +75,13 @@ public:
     // Tenths of a decibel. Tells boost_changed when the value differs.
     void SetEqBoost(int i, int b);
     int GetEqBoost(int i) const;
-    // Tells Q_changed when the value differs.
+    // As it is. Tells Q_changed when the value differs.
     void SetEqQ(int i, int q);
     int GetEqQ(int i) const;
     // The Q that suits the band's type: 200 for a peak, 50 for any other.
     void SetDefaultQ(int i);
 
-    // Tell bypass_changed every time.
+    // Of one band, and of the whole channel. The setters tell bypass_changed every time.
     void SetBypass(int i, bool on);
     bool GetBypass(int i) const;
     void SetBypassChannel(bool on);

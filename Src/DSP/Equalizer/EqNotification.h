@@ -16,6 +16,7 @@ public:
     virtual ~EqListener() = default;
     // A copy of this listener, in no chain.
     virtual std::unique_ptr<EqListener> Clone() const = 0;
+    // The change, on the thread of the setter that made it.
     virtual void Invoke(Args... args) = 0;
 
 private:
@@ -32,6 +33,7 @@ public:
     using Listener = EqListener<Args...>;
 
     EqNotificationChain() = default;
+    // A clone of every listener, in the same order.
     EqNotificationChain(const EqNotificationChain& other) {
         auto* end = &m_head;
         for (const Listener* listener = other.m_head.get(); listener; listener = listener->m_next.get()) {
@@ -41,6 +43,7 @@ public:
             }
         }
     }
+    // As copying; the listeners there were are destroyed.
     EqNotificationChain& operator=(const EqNotificationChain& other) {
         if (this != &other) {
             EqNotificationChain copy(other);
@@ -63,6 +66,7 @@ public:
     void Invoke(Args... args) const {
         if (m_head) InvokeFrom(*m_head, args...);
     }
+    // Whether nobody listens.
     bool IsEmpty() const { return m_head == nullptr; }
 
 private:

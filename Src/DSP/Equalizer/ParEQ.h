@@ -34,6 +34,7 @@ public:
 
     // Sets the channel count and makes the channels that are missing; none is freed. Below 0 counts as 0.
     void Resize(int n);
+    // As last set by Resize or Cook.
     int GetNumSubChannels() const { return m_channel_count; }
 
     // Designs the bands of every channel from one record, for `sampleRate` in Hz. With `smooth`, bands that

@@ -33,6 +33,7 @@ public:
     OfflinePitchShift(const OfflinePitchShift&) = delete;
     OfflinePitchShift& operator=(const OfflinePitchShift&) = delete;
 
+    // Takes the next `frames` frames, copied; none for 0 or below. Throws std::bad_alloc.
     void Feed(const float* samples, int frames);
     // The recording has ended; after that nothing is fed.
     void Finish();

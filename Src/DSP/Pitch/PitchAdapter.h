@@ -15,8 +15,9 @@ public:
     static PitchAdapterInfo* const OldCorvo;    // "Classic"
     static PitchAdapterInfo* const SoundTouch;  // "New"
 
-    explicit PitchAdapterInfo(const std::string& name);
+    explicit PitchAdapterInfo(const std::string& name);  // no choice of sizes or qualities
 
+    // As users see it.
     std::string GetName() const;
     // The values that PitchAdapter::SetFFTSize and SetQuality index; empty where there is no choice.
     virtual std::vector<int> GetFFTSizes() const;
@@ -53,6 +54,7 @@ public:
     static PitchAdapter* CreateAdapter(int index);
 
     PitchAdapter();
+    // Copies take over the number of channels only.
     PitchAdapter(const PitchAdapter&);
     PitchAdapter& operator=(const PitchAdapter&);
 

@@ -49,6 +49,7 @@ struct VoicePitchCandidate {
 // counts as 0. A second of 48 kHz takes about 4 ms of one core.
 class DSP_API VoicePitchDetector {
 public:
+    // Settings out of range are limited. Throws std::bad_alloc.
     explicit VoicePitchDetector(const VoicePitchSettings& settings);
     ~VoicePitchDetector();
     VoicePitchDetector(const VoicePitchDetector&) = delete;
@@ -66,6 +67,7 @@ public:
     // Frames are made when the samples given are a multiple of this.
     int StepSamples() const;
 
+    // The next samples of one channel, full scale 1; copied.
     void Push(const float* samples, int count);
     void Push(const double* samples, int count);
     // The oldest frame that was not taken; false when there is none. The newest 64 are kept.

@@ -26,9 +26,15 @@ struct CDither {
 
 enum class DitherCurve {
     None,
-    Flat,    // triangular noise of two steps, white
-    Gentle,  // the same, shaped out of the ear's most sensitive band: 5 taps
-    Strong,  // deeper around 4 kHz and 12 kHz for more noise above 15 kHz: 9 taps
+    // Triangular noise of two steps, white: S. P. Lipshitz, R. A. Wannamaker and J. Vanderkooy, "Quantization
+    // and Dither: A Theoretical Survey", J. Audio Eng. Soc. 40 (1992).
+    Flat,
+    // The same, shaped out of the ear's most sensitive band, 5 taps: S. P. Lipshitz, J. Vanderkooy and R. A.
+    // Wannamaker, "Minimally Audible Noise Shaping", J. Audio Eng. Soc. 39 (1991).
+    Gentle,
+    // Deeper around 4 kHz and 12 kHz for more noise above 15 kHz, 9 taps: R. A. Wannamaker,
+    // "Psychoacoustically Optimal Noise Shaping", J. Audio Eng. Soc. 40 (1992).
+    Strong,
 };
 
 // Dither for samples of 16 or 24 bits; disabled for any other width and for DitherCurve::None. The shaped

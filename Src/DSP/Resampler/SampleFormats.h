@@ -17,6 +17,7 @@ struct IntegerSample {
     static constexpr int kBytes = Bits / 8;
     static constexpr double kScale = static_cast<double>(1 << (Bits - 1));
 
+    // One sample at any address.
     static double Read(const char* sample) {
         std::uint32_t word = 0;
         for (int i = 0; i < kBytes; ++i)
@@ -24,6 +25,7 @@ struct IntegerSample {
         // Sits at the top of the word, so that its sign is the word's.
         return static_cast<std::int32_t>(word) * (1.0 / 2147483648.0);
     }
+    // To any address.
     static void Write(double value, char* sample) {
         const double scaled = std::isnan(value) ? 0.0 : std::clamp(value * kScale, -kScale, kScale - 1.0);
         const auto word = static_cast<std::uint32_t>(static_cast<std::int32_t>(scaled));
@@ -31,16 +33,19 @@ struct IntegerSample {
     }
 };
 
+// Full scale is -1..1; nothing is clipped.
 template <typename Float>
 struct FloatSample {
     using Value = Float;
     static constexpr int kBytes = sizeof(Float);
 
+    // One sample at any address.
     static double Read(const char* sample) {
         Float value;
         std::memcpy(&value, sample, sizeof(value));
         return value;
     }
+    // To any address, rounded to the nearest.
     static void Write(double value, char* sample) {
         const auto rounded = static_cast<Float>(value);
         std::memcpy(sample, &rounded, sizeof(rounded));

@@ -10,7 +10,8 @@ struct PolePairLowPass;
 
 // Converts interleaved audio to another sample rate by the factor L / M: L - 1 zeros after each sample, a
 // Butterworth low-pass of order 10 at 0.455 of the lower rate, every M-th sample kept. Sample formats are
-// converted on the way, with dither where it is asked for.
+// converted on the way, with dither where it is asked for. Cf. R. E. Crochiere and L. R. Rabiner, "Multirate
+// Digital Signal Processing" (1983).
 //
 // Life: InitConversion or InitConversionByFactors, then Init, then any number of blocks, which continue
 // each other: a stream cut into blocks gives the same bits as in one. FreeRings at the end.
@@ -34,8 +35,10 @@ struct DSP_API SamplingFrequencyConverter {
     // Each step of the raised rate takes 176 bytes of tables, which must fit a 32-bit address space.
     static constexpr int kMaxFactor = 0x7FFFFFFF / 256;
 
+    // Not set up: blocks return 0.
     SamplingFrequencyConverter();
     ~SamplingFrequencyConverter();
+    // Both then point to the same rings; see above.
     SamplingFrequencyConverter(const SamplingFrequencyConverter& other);
     SamplingFrequencyConverter& operator=(const SamplingFrequencyConverter& other);
 

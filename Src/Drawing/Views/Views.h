@@ -9,12 +9,15 @@
 // file: it makes the drawing templates of both classes, which say what each of them draws.
 namespace Corvo {
 
+// Into `rectangle`, pixels of the target, of any size. On the thread that draws; throws std::bad_alloc. The
+// members of kivspectrum that are made of them below say what each draws.
 DSP_API void DrawWhole(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawSpectrum(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawSonogramAndSpectrum(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawSonogram(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawIntensityScale(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 
+// The same, of the tuner.
 DSP_API void DrawTuner(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawNote(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawNoteAndRipples(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
@@ -22,6 +25,7 @@ DSP_API void DrawNeedleAndInfo(kivspectrum& analyser, DrawTarget& target, const 
 DSP_API void DrawNeedle(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawNeedleInfo(kivspectrum& analyser, DrawTarget& target, const RectF& rectangle);
 
+// The same, of a sonogram; the members of Sonogram say what each draws.
 DSP_API void DrawPicture(const Sonogram& sonogram, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawIntensityScale(Sonogram& sonogram, DrawTarget& target, const RectF& rectangle);
 DSP_API void DrawFrequencyScale(const Sonogram& sonogram, DrawTarget& target, const RectF& rectangle,

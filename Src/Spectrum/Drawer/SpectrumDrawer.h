@@ -22,9 +22,11 @@ struct SpectrumPeak {
 // memory of their peaks. Used on the display side of its analyser, which lends its lock.
 class DSP_API SpectrumDrawer {
 public:
+    // Without buffers until Allocate.
     explicit SpectrumDrawer(Corvo::SpectrumSettings settings);
     ~SpectrumDrawer();
 
+    // Stored; buffers follow with Allocate.
     void UpdateSettings(Corvo::SpectrumSettings settings);
     const Corvo::SpectrumSettings& GetSettings() const;
 
@@ -42,6 +44,7 @@ public:
     // analyses come once a second per sample of hop: 0.15 is brisk, 0.035 calm. Always true.
     bool SmoothFftSpectrum(const std::vector<float>& power, float coefficient,
                            VectorInterpolationFilterFloat& filter);
+    // |bin|^2 from 0 Hz up, smoothed; the drawer's, valid until the next call that changes it.
     const std::vector<float>& GetPowerSmoothed() const;
 
     // Milliseconds between display refreshes; kivspectrum's function of that name has what follows from it.
@@ -54,7 +57,9 @@ public:
     // One drawn frame older: peaks that the spectrum reaches are new, those whose frames ran out sink by
     // 1 dB a frame until they meet it.
     void AgePeaks();
+    // Forgets all peaks.
     void peak_reset();
+    // The highest power that each bin remembers; the drawer's.
     const std::vector<float>& GetPeaks() const;
 
     // Works out the curve in `rectangle` and copies as many of its points as `capacity` allows to `points`
@@ -74,6 +79,7 @@ public:
     // Hz and -300 dB when there is none.
     Corvo::SpectrumPeak HighestPeak(double lowestHz = 0.0) const;
 
+    // Its analyser's switch.
     void SetOn(bool on);
     bool GetOn() const;
 

@@ -14,6 +14,7 @@ public:
 
     // Room for `spectra` spectra of `bins` values, all zero; 0 or less empties the filter.
     void Resize(int spectra, int bins);
+    // How many spectra it averages.
     int GetSpectra() const;
 
     // Stores `newest` as the current spectrum, writes the weighted sum of all into `average` and moves on.

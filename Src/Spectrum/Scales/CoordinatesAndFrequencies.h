@@ -14,6 +14,7 @@ public:
     CoordinatesAndFrequencies(const Corvo::RectF& rectangle, double lowest, double highest,
                               Corvo::FrequencyScale frequencies, Corvo::LevelScale levels, float range);
 
+    // What the map was made for; Hz.
     const Corvo::RectF& GetRectangle() const;
     double GetLowest() const;
     double GetHighest() const;
@@ -23,6 +24,8 @@ public:
     // The level at the bottom.
     double GetFloor() const;
 
+    // Beyond the edges, too. The mel scale is ln(1 + f / 700 Hz): D. O'Shaughnessy, "Speech
+    // Communication: Human and Machine" (1987).
     float FrequencyToX(double frequency) const;
     double XToFrequency(double x) const;
     // Levels outside the scale are drawn at its edge.

@@ -15,7 +15,7 @@ enum class LevelScale { Decibels, Power, Amplitude };
 // view_option_e.
 enum class CurveStyle { Line = 1, Filled, Bars };
 
-// Values outside are taken as the default.
+// What a field of the settings says; values outside are taken as the default.
 DSP_API FrequencyScale FrequencyScaleOf(const SpectrumSettings& settings);
 DSP_API LevelScale LevelScaleOf(const SpectrumSettings& settings);
 DSP_API CurveStyle CurveStyleOf(const SpectrumSettings& settings);

@@ -6,7 +6,8 @@
 namespace Corvo {
 
 // What an analyser does and how it is shown: 24 fields of 32 bits. Hosts store and restore the record as it
-// is. Lengths are in samples.
+// is. Lengths are in samples. The windows are those of F. J. Harris, "On the Use of Windows for Harmonic
+// Analysis with the Discrete Fourier Transform", Proceedings of the IEEE 66 (1978).
 struct SpectrumSettings {
     std::int32_t fft_length = 4096;
     std::int32_t fft_length_auto = 1;  // 1: the transform is as long as the window

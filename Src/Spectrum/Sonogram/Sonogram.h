@@ -71,6 +71,7 @@ public:
     void ComputeColumn(const std::vector<float>& spectrum, int height);
     // The newest column's levels in dB, -range..0, top row first.
     const float* GetColumn() const;
+    // How many levels that are.
     int GetColumnHeight() const;
 
     // The whole picture, the columns and the pitches at silence.

@@ -23,6 +23,7 @@ struct NearestNote;
 class DSP_API TuningListener {
 public:
     virtual ~TuningListener();
+    // CookNotesFrequencies does so.
     virtual void NotesMustBeRecomputed() = 0;
 };
 
@@ -30,6 +31,7 @@ public:
 class DSP_API TunerDisplayListener {
 public:
     virtual ~TunerDisplayListener();
+    // `present`: there is a note.
     virtual void NoteChanged(bool present) = 0;
 };
 
@@ -59,7 +61,9 @@ public:
     // 0 denoised harmonic product: the candidate whose partials, in decibels above the noise floor, explain
     // most of what is heard, less for partials that are missing. 1 harmonic product, of five spectra. 2
     // pseudo harmonic product: the largest sum of the first partials' levels. 3 legacy: the strongest partial
-    // or what it is an overtone of. 4 two-way mismatch. Kept as given; any other value works as 3.
+    // or what it is an overtone of. 4 two-way mismatch (R. C. Maher and J. W. Beauchamp, "Fundamental
+    // frequency estimation of musical signals using a two-way mismatch procedure", J. Acoust. Soc. Am. 95,
+    // 1994). Kept as given; any other value works as 3.
     static void SetDetectionMethod(int method);
     static int GetDetectionMethod();
 
@@ -73,9 +77,11 @@ public:
     // and stored as 0.
     static void SetTemperament(int temperament);
     static int GetTemperament();
+    // Until the notes have followed.
     static bool IsTemperamentChanged();
     // Empty outside 0..10.
     static const char* GetTemperamentName(int temperament);
+    // Of the temperament in use.
     static const char* GetCurrentTemperamentName();
     // Null for none.
     static void SetTuningListener(TuningListener* listener);
@@ -226,8 +232,11 @@ DSP_API bool TunerCalibrateNow(const Tuner& tuner);
 // So that the A which the orchestra tunes to, two octaves above the base, has this frequency; false, with
 // nothing changed, outside 220..880 Hz.
 DSP_API bool TunerCalibrateTo(double concertPitchHz);
+// Back to 440 Hz. Tells the tuning listener.
 DSP_API void TunerCalibrateReset();
+// Whether the base is another than 110 Hz.
 DSP_API bool TunerIsNonstandardCalibration();
+// Whether that is so, or the temperament is not the equal one.
 DSP_API bool TunerCalibrationNotStandardOrNotUseEqualTemperament();
 // Lines of text that belong below a shown note: error and frequency, and a third for calibration and
 // temperament when they are not the usual ones.

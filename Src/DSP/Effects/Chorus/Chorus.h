@@ -28,9 +28,11 @@ struct Side;
 
 // Chorus and flanger: per side a delay that a sine sweeps, mixed with the dry signal. No feedback.
 //
-// The sweep covers `depth` of the delay, rounded down to a whole even number of frames, upwards from the
-// shortest read position delay * (1 - depth). At full depth it starts at the position that is written next,
-// so that the delay runs from the whole ring down to nothing.
+// The delay heard is delay * (1 - depth) when the sine is at its lowest and delay * (1 - 2 depth) when it is
+// at its highest; the way between is rounded down to a whole even number of frames. The ring is as long as
+// the delay, so that beyond half depth, where that falls below 0, the delay goes on from its longest; at full
+// depth it runs from the whole ring down to nothing. Cf. J. Dattorro, "Effect Design, Part 2: Delay-Line
+// Modulation and Chorus", J. Audio Eng. Soc. 45 (1997).
 //
 // Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for float.
 // The delay lines hold floats, of what is beyond them the largest. Channels after the second pass unchanged,

@@ -40,8 +40,12 @@ struct CoreState;
 //
 // Blocks are interleaved, mono or stereo, 32- or 64-bit float; anything else passes unchanged. No latency.
 // With "Stereo Link" both channels of a stereo block follow one envelope, with the left attack and release;
-// otherwise each has its own. The release acts ten times as long as it says. Edits of the curve and of the
-// out gain glide in; InitProcessing starts from silence without a glide, Cleanup does nothing.
+// otherwise each has its own. In n + 1 frames the envelope covers nine tenths of its way: each frame it moves
+// by 1 - 10^(-1 / (n + 1)) of what is left. n is the attack time or ten times the release time: the release
+// acts ten times as long as it says. A feed-forward design with a peak detector; cf. D. Giannoulis, M.
+// Massberg and J. D. Reiss, "Digital Dynamic Range Compressor Design", J. Audio Eng. Soc. 60 (2012). Edits of
+// the curve and of the out gain glide in; InitProcessing starts from silence without a glide, Cleanup does
+// nothing.
 //
 // Parameters, left and right each: attack, release, out gain, threshold, ratio, and as pairs that share one
 // switch "Stereo Link", "Auto Make-up Gain" (full scale comes out at full scale, +40 dB at most) and "Monitor
@@ -90,6 +94,7 @@ public:
 
     // User-interface thread: stores one parameter and, with `submit`, hands the settings to the audio side.
     void SetParamFromUi(int index, float normalised, bool submit);
+    // Hands over what was stored without `submit`.
     void SubmitUiSettingsChange();
     // User-interface thread: takes over curves that automation changed. Every call that reads or edits
     // settings does so first.
@@ -106,6 +111,8 @@ public:
     // The settings of a preset, of the nearest one for a number out of range.
     static Settings GetPresetData(int preset);
 
+    // Which channel's curve the host's editor edits: kept for it, and nothing here depends on it. Any thread
+    // but the audio thread.
     CompressorPrivate::EditChannelMode GetEditChannelMode() const;
     void SetEditChannelMode(CompressorPrivate::EditChannelMode mode);
     // Whether a side-chain was handed over for the last block; any thread.

@@ -37,6 +37,7 @@ struct DSP_API TransferCurve {
     std::array<CurvePoint, kMaxPoints> points{};
     std::int32_t count = 0;
 
+    // The points in use.
     const CurvePoint* begin() const;
     const CurvePoint* end() const;
 
@@ -49,6 +50,7 @@ struct DSP_API TransferCurve {
     void Repair();
 
     const CurvePoint* Threshold() const;  // end() for an empty curve only
+    // Its level in tenths of a decibel, truncated.
     std::int32_t ThresholdTenths() const;
     // Decibels out per decibel in, above the threshold; the ratio is its reciprocal.
     double SlopeAboveThreshold() const;
@@ -59,6 +61,7 @@ struct DSP_API TransferCurve {
     // Turns the part above the knee. A curve without a threshold gets one at its highest setting.
     void SetRatioStep(std::int32_t step);
 
+    // Whether all points in use are the same.
     bool operator==(const TransferCurve& other) const;
 
 private:

@@ -45,6 +45,14 @@ struct State;
 // stays. Blocks with more channels pass unchanged. Interleaved and planar blocks, 32- and 64-bit; other
 // widths pass unchanged. Samples that are not finite count as 0, and those above +120 dB as that much.
 //
+// The gain of a bin is (s / (1 + s))^p * floor^(1 - p): s is the signal-to-noise ratio, estimated from the
+// bin's power over the profile, p the probability that there is signal, and the floor what "Reduction"
+// leaves. p is a likelihood ratio at the fixed signal-to-noise ratio "Detail", after T. Gerkmann, C.
+// Breithaupt and R. Martin, "Improved A Posteriori Speech Presence Probability Estimation Based on a
+// Likelihood Ratio With Fixed Priors", IEEE Trans. Audio, Speech, and Language Processing 16 (2008); the
+// weighting after I. Cohen and B. Berdugo, "Speech enhancement for non-stationary noise environments", Signal
+// Processing 81 (2001).
+//
 // Latency: by "FFT size" 9216, 5120, 2048 or 1024 samples at 44.1 and 48 kHz. At other rates it is that times
 // a power of two, so that the windows last about as long in seconds. It changes with that parameter; sound
 // then passes as it is until the new windows have filled and know the noise, up to 0.4 s. A host that changes

@@ -38,7 +38,9 @@ struct Delay;
 // Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for
 // float. Channels after the second pass unchanged, and so does everything when there was no memory for
 // the ring. No latency. A delay is at least 10 samples, counted over both channels: a stereo stream is
-// delayed by half the time, in frames rounded up on the left and down on the right.
+// delayed by HALF the time that the control shows, in frames rounded up on the left and down on the right.
+// A recursive comb filter: M. R. Schroeder, "Natural Sounding Artificial Reverberation", J. Audio Eng. Soc.
+// 10 (1962).
 //
 // Memory: InitProcessing makes the ring for the largest time, 10 s, without touching it: a page of it is
 // touched by the block whose sound first gets there. Only a tempo so slow that a note is longer grows it, up

@@ -109,6 +109,7 @@ public:
 
     // Makes `chunk` exactly that long and writes it.
     virtual void GetSettingsChunk(std::vector<std::uint8_t>& chunk);
+    // Its length in bytes with the settings of now.
     virtual int GetSettingsChunkSize();
     // Takes a chunk as a whole, or leaves everything as it was when it is too short for any layout the effect
     // had. Bytes after the layout are not read. What the values mean is limited where they are used.
@@ -127,12 +128,14 @@ public:
     // What a control shows at a normalised value, unit included. Empty for an index the effect does not have.
     virtual std::wstring GetParameterFormattedText(int index, double value);  // external index
     // What the host calls it; a side, " L" or " R", is left out.
-    virtual std::wstring GetParamName(int index);       // external index
+    virtual std::wstring GetParamName(int index);  // external index
+    // Empty where there is none.
     virtual std::wstring GetParamUnitsText(int index);  // external index
     // 0..1; setting it again changes nothing. 0 for an index the effect does not have.
     virtual float GetParam(int index) = 0;  // external index
     // The stored value, not normalised; 0 for an index the effect does not have.
     virtual float GetParamPlain(int index) const;  // real index
+    // How many parameters the effect itself has.
     virtual int GetParamCountReal() = 0;
     // As the host shows it; different for every effect.
     virtual std::string GetName() = 0;
@@ -141,7 +144,9 @@ public:
     // Stores the normalised value of an external parameter, both sides of it where it is a pair. Automation
     // calls it on the audio thread, with real indices.
     virtual void SetParam(int index, float normalised, bool fromAutomation);
+    // How many the host shows: a pair that is controlled as one counts once.
     virtual int GetParamCount();
+    // How the host automates a parameter.
     virtual EffectParameterType GetParameterTypeAutomatable(int index);  // external index
 
     // Presentation and side-chain, on the user-interface thread.
@@ -154,6 +159,7 @@ public:
     virtual bool IsMono() const;
     // The file name of the picture that the host shows for the effect; empty: none.
     virtual std::string GetImage();
+    // How many side-chains the effect can listen to, and to how many channels of one that it has.
     virtual int GetNumSidechainBusses();
     virtual int GetSidechainBusNumChannelsMax(int bus);
     // The buffers of the next block on side-chain `bus`: planar, one per channel announced, in the
@@ -179,6 +185,7 @@ public:
     virtual std::vector<std::string> GetParamUiSections();
     // The icon's path within the host's resources; empty: none.
     virtual std::string GetPluginIconPath();
+    // The colours of the host's generic editor.
     virtual PluginGenericUILookAndFeel GetLookAndFeel();
     // Between blocks, when the host starts to play from another place: effects with a delay line clear it,
     // all others do nothing. `reset` is the host's word for whether the stream begins anew; no effect needs
@@ -224,9 +231,12 @@ public:
     void RequestTailRestart();
 
     void SetHostCallback(CorvoEffectHostCallback* callback);  // not owned; null for none
+    // Null for none.
     CorvoEffectHostCallback* GetHostCallback() const { return m_host_callback; }
     // The host calls this when tempo or time signature changed: the next block derives afresh.
     void NotifyTempoChanged();
+    // Raised when an edit changed more than its own parameter, so that the host shows all of them anew; the
+    // host lowers it. User-interface thread.
     void SetWantRefreshAllParams(bool want);
     bool WantRefreshAllParams();
     // True after the set of visible controls changed; any thread.
@@ -259,6 +269,7 @@ public:
     std::vector<int> GetAllSupportedParameterIds();  // 0 .. real count - 1
     // One normalised value per parameter, in external order; -1 without preset data.
     std::vector<float> GetPresetValues(int preset);
+    // A pad for InitializeXyEditingData, made of its four fields.
     static PluginParamXYGroupInfo MakeGroup(const std::string& name, int index, const std::vector<int>& xAxis,
                                             const std::vector<int>& yAxis);
 
@@ -273,7 +284,9 @@ protected:
     const ParameterRow* RealRow(int real) const;
     const ParameterRow* WordRow(
         int real) const;  // null where the parameter is not a word of the settings, too
+    // The real index of an external parameter, of the left one where it is a pair.
     int RealIndex(int external);
+    // The table as records that live as long as the library; null without a table.
     const MP_PARAMINFO* TableRecords() const;
 
     // Settings as a whole: stores those of a preset, or of a chunk in today's layout or the oldest one
@@ -283,6 +296,7 @@ protected:
     bool TakeChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& leading, bool wide = false);
     void WriteChunk(std::vector<std::uint8_t>& chunk, std::int32_t leading) const;
 
+    // The next block derives afresh. Any thread.
     void MarkStale() { m_cook.store(true, std::memory_order_release); }
     // Lowers the flag and takes note of the format. `due`: derived state is stale, because the flag was up,
     // the number of channels or the rate is not that of `seen`, or the host forces it. `afresh`: for either

@@ -12,11 +12,13 @@ namespace Corvo {
 // appended before it is thrown: throw CorvoException("Error reading data") << ": profile " << number;
 class DSP_API CorvoException : public std::exception {
 public:
+    // Copies the message.
     explicit CorvoException(const std::string& message);
     CorvoException(const CorvoException& other);
     CorvoException& operator=(const CorvoException& other);
     ~CorvoException() override;
 
+    // Appends a text or number to the message. Throws std::bad_alloc.
     template <typename T>
     CorvoException& operator<<(const T& text) {
         m_stream << text;

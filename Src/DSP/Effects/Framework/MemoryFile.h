@@ -24,9 +24,12 @@ public:
     // Returns the new position.
     virtual std::int64_t Seek(std::int64_t offset, int origin) = 0;
     virtual ~CFileBase();
+    // In bytes from the start.
     virtual std::int64_t GetPosition();
+    // Cuts the file off at the position.
     virtual void Truncate() = 0;
     virtual std::int64_t GetLength();  // the position stays where it was
+    // True unless a stream says otherwise.
     virtual bool IsReadable();
     virtual bool IsWritable();
 };
@@ -52,6 +55,7 @@ public:
     std::int64_t Seek(std::int64_t offset, int origin) override;
     void Truncate() override;  // throws CorvoException("Not implemented")
 
+    // The bytes, which the file keeps until it grows or is destroyed, and how many it has room for.
     const std::uint8_t* Data() const { return m_data; }
     std::int32_t Capacity() const { return m_capacity; }
     // Unbounded: reads are limited by the buffer instead of the valid size, FromEnd is disabled.

@@ -12,6 +12,10 @@ namespace Corvo::DSP::GainEfx {
 // all parameters; with any other channel count only the first channel is scaled, by the left gain, the
 // pan's share included. No latency, no state between blocks, no presets, no automation of its own.
 //
+// Left becomes ((L + R) * mid + (L - R) * side) / 2 * gain * sqrt 2 * cos((pan + 1) * pi / 4), right the same
+// with -side and the sine; mid and side are 2 - width and width up to a width of 1, then 1 and 2 * width.
+// Derived here.
+//
 // Parameters (plain range): 0 "Gain" 0.0001..10, unity at the middle of the knob; 1 "Stereo width" 0..2;
 // 2 "Pan" -1..1; 3 and 4 "Flip phase" left and right.
 //

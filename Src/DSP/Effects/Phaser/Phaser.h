@@ -23,7 +23,9 @@ struct PhaserSettings {
 static_assert(sizeof(PhaserSettings) == 28);
 
 // Phaser: a chain of equal first-order all-passes per channel, swept by a sine, with feedback around the
-// chain and a mix with the dry signal.
+// chain and a mix with the dry signal. The all-pass is (z^-1 - a) / (1 - a z^-1) with a = (1 - w) / (1 + w),
+// w the frequency as a share of half the rate; cf. P. A. Regalia, S. K. Mitra and P. P. Vaidyanathan, "The
+// Digital All-Pass Filter: A Versatile Signal Processing Building Block", Proceedings of the IEEE 76 (1988).
 //
 // Parameters: 0 "Rate", 1 "Feedback", 2 "Wet", 3 "Minimum frequency", 4 "Maximum frequency", 5 "Stereo
 // width", 6 "Stages" (1..30). Presets come without stages: until some are set, only the feedback acts. Values

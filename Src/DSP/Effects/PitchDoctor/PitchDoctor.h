@@ -38,6 +38,9 @@ static_assert(sizeof(PitchDoctorSettings) == 4 * 32);
 // Pitch correction for one voice or monophonic instrument: hears the pitch, decides which note of a scale is
 // meant, and moves the voice there, formants staying where they are.
 //
+// The voice's cycles are laid at another distance: E. Moulines and F. Charpentier, "Pitch-synchronous
+// waveform processing techniques for text-to-speech synthesis using diphones", Speech Communication 9 (1990).
+//
 // The notes allowed are those of the scale whose switch is on; without any nothing is corrected. The
 // correction follows with the retune speed, leaves a mean error within the tolerance alone and keeps as much
 // of the vibrato as is asked for. Transposition and offset come on top. What is not voiced passes unchanged.

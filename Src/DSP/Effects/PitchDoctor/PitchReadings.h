@@ -18,6 +18,7 @@ struct PitchReading {
     std::int32_t note = -1;        // the MIDI number of the note that is meant; -1 while none is decided
     float noteHz = 0.0f;           // where that note stands; 0 without one
 
+    // Whether a pitch was heard.
     bool IsVoiced() const { return heardHz > 0.0f; }
 };
 

@@ -29,7 +29,8 @@ static_assert(sizeof(_transform_props) == 72);
 }  // namespace ReverbPrivate
 
 // Reverberator: per channel a high-pass at 10 Hz, 19 early reflections, six damped combs fed by them and
-// an all-pass.
+// an all-pass, after M. R. Schroeder, "Natural Sounding Artificial Reverberation", J. Audio Eng. Soc. 10
+// (1962), and J. A. Moorer, "About This Reverberation Business", Computer Music Journal 3 (1979).
 //
 // Blocks are interleaved or planar, mono or stereo, 32- or 64-bit float; any other width passes unchanged,
 // and so do channels after the second, and everything when there was no memory. 32-bit blocks are computed

@@ -21,8 +21,11 @@ public:
     // Cooks parameter `changed` of `values`. kAllParameters cooks all and clears the pre-filter's memories.
     virtual void SetParameter(const Values& values, int changed);
 
-    // The shaping functions on one sample. "Martens" takes its shape factor, the others the drive, 0..1;
-    // "Doidic A." does not look at it.
+    // The shaping functions on one sample, in -1..1. "Martens" takes its shape factor, the others the drive,
+    // 0..1; "Doidic A." does not look at it. "Doidic" and "Araya" are curves of two patents, collected in
+    // J. Pakarinen and D. T. Yeh, "A Review of Digital Techniques for Modeling Vacuum-Tube Guitar
+    // Amplifiers", Computer Music Journal 33 (2009); "Martens" is (k + 1) x / (1 + k |x|), which meets 0 and
+    // +-1.
     virtual double Martens(double sample, double shape) const;
     virtual double DoidicS(double sample, double shape) const;
     virtual double DoidicA(double sample, double shape) const;
@@ -35,6 +38,7 @@ public:
     template <typename Sample>
     void Shape(Sample* samples, int frames, int channels) const;
 
+    // The pre-filter starts from silence.
     void ClearMemories();
 
     static int OversamplingFactor(float normalised);  // 1, 2, 4, 8, 12 or 16
