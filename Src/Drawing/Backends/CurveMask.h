@@ -1,6 +1,5 @@
 #pragma once
 
-#include <cstddef>
 #include <cstdint>
 #include <vector>
 
@@ -8,35 +7,37 @@
 
 namespace Corvo {
 
-// How much of each pixel a line with round joins and ends covers, for a line that runs to the right all the
-// way, as a curve over frequencies does: then every column's part of it is one stretch. Much faster than the
-// drawing system's own outlines for lines with a point in every pixel.
+// How much of each pixel a line with round joins and ends covers, or the area under it, for a line that runs
+// to the right all the way, as a curve over frequencies does: then every column's part of it is one stretch.
+// Much faster than the drawing system's own outlines for lines with a point in every pixel.
 class CurveMask {
 public:
-    // A strip of the line, as high as the line is there: rows of `stride` bytes, 255 where a pixel is
-    // covered.
+    // As high as what is drawn is there: rows of `stride` bytes, 255 where a pixel is covered. Below them all
+    // pixels of `solid` rows are.
     struct Strip {
-        int left, top, width, height, stride;
+        int left, top, width, height, stride, solid;
         std::uint8_t* pixels;
     };
 
     // Whether the points run to the right, or straight up and down at the ends of a step.
     static bool IsCurve(const PointF* points, int count);
 
-    // Takes the line's part within left, top, right, bottom (whole pixels).
-    void Outline(const PointF* points, int count, float width, const RectF& within);
+    // Take the part within whole pixels of a line or of the area from it down to `ground`.
+    void Line(const PointF* points, int count, float width, const RectF& within);
+    void Area(const PointF* points, int count, float ground, const RectF& within);
     // The next strip of it, from the left; valid until the next call. False when there is none left.
     bool Next(Strip& strip);
 
 private:
     struct Range {
-        std::size_t first, end;
+        int first, end;
     };
 
+    bool Reach(float left, float right, const RectF& within);
     Range CutsBetween(float from, float to) const;
     void AddDisc(PointF centre, float radius);
     void AddSegment(PointF from, PointF to, float radius);
-    void AddColumn(std::size_t column, int top, int height, std::uint8_t* pixel) const;
+    void AddColumn(int column, int top, int height, std::uint8_t* pixel) const;
 
     int m_left = 0, m_top = 0, m_width = 0, m_height = 0;
     int m_next = 0;  // the first column that no strip had

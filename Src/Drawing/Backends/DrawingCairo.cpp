@@ -70,6 +70,18 @@ bool AddPath(cairo_t* context, const PointF* points, int count) {
     return added >= 2;
 }
 
+// Whether they are a curve with about a point in every pixel, all of which can be drawn.
+bool HasManyPoints(const PointF* points, int count) {
+    constexpr int kFewPoints = 64;
+    constexpr float kSparse = 3.0f;  // pixels between points
+    if (count < kFewPoints || !IsUsable(points[0]) || !IsUsable(points[count - 1]) ||
+        points[count - 1].x - points[0].x > kSparse * static_cast<float>(count))
+        return false;
+    for (int i = 0; i < count; ++i)
+        if (!IsUsable(points[i])) return false;
+    return CurveMask::IsCurve(points, count);
+}
+
 // The part of a surface of pixels that drawing can reach, in the context's coordinates; nothing where these
 // are no pixels, or the surface has none.
 bool ReachablePixels(cairo_t* context, RectF& reach) {
@@ -104,15 +116,47 @@ bool CoversPixels(cairo_t* context, const RectF& r, int width, int height) {
     return leads(r.width, 0.0, width, 0) && leads(0.0, r.height, 0, height);
 }
 
+// The caller destroys it.
+cairo_surface_t* SurfaceOf(const DrawingBitmap& bitmap) {
+    // Only read from, whatever the signature says.
+    auto* const pixels =
+        const_cast<unsigned char*>(reinterpret_cast<const unsigned char*>(bitmap.pixels.data()));
+    return cairo_image_surface_create_for_data(
+        pixels, bitmap.opaque ? CAIRO_FORMAT_RGB24 : CAIRO_FORMAT_ARGB32, bitmap.width, bitmap.height,
+        bitmap.width * static_cast<int>(sizeof(std::uint32_t)));
+}
+
+// A surface of pixels, stretched over the rectangle.
+void Paint(cairo_t* context, cairo_surface_t* surface, const RectF& r, cairo_filter_t filter,
+           std::uint8_t opacity) {
+    const int width = cairo_image_surface_get_width(surface);
+    const int height = cairo_image_surface_get_height(surface);
+    cairo_save(context);
+    cairo_translate(context, r.x, r.y);
+    cairo_scale(context, static_cast<double>(r.width) / width, static_cast<double>(r.height) / height);
+    cairo_set_source_surface(context, surface, 0.0, 0.0);
+    cairo_pattern_set_filter(cairo_get_source(context), filter);
+    cairo_pattern_set_extend(cairo_get_source(context), CAIRO_EXTEND_PAD);
+    cairo_rectangle(context, 0.0, 0.0, width, height);
+    cairo_clip(context);
+    cairo_paint_with_alpha(context, opacity / 255.0);
+    cairo_restore(context);
+}
+
 }  // namespace
 
 struct DrawingCairo::Resources {
     SlotCache<InkKey, DrawingBrush, kKeptInks> brushes;
     SlotCache<StrokeKey, DrawingPen*, kKeptStrokes> pens;
     SlotCache<TextKey, LaidOutText, kKeptTexts> texts;
+    SlotCache<StretchedKey, cairo_surface_t*, kKeptStretched> stretched;
     CurveMask curve;
     PangoContext* textContext = MakeTextContext();
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
+
+    bool FillUnderCurve(cairo_t* context, const PointF* points, int count);
+    void Compose(cairo_t* context);
+    cairo_surface_t* Stretched(cairo_t* target, const DrawingBitmap& bitmap, const RectF& r);
 
     const LaidOutText& LaidOut(std::string_view text, float size) {
         const TextKey key(text, size);
@@ -141,6 +185,7 @@ DrawingCairo::~DrawingCairo() {
     m_resources->brushes.Clear([this](DrawingBrush brush) { ReleaseBrush(brush); });
     m_resources->pens.Clear([this](DrawingPen* pen) { ReleasePen(pen); });
     m_resources->texts.Clear([](LaidOutText& text) { g_object_unref(text.layout); });
+    m_resources->stretched.Clear(cairo_surface_destroy);
     pango_font_description_free(m_resources->font);
     g_object_unref(m_resources->textContext);
 }
@@ -216,29 +261,47 @@ void DrawingCairo::DrawTarget::Polyline(const PointF* points, int count, const S
 
 // A curve with many points, on pixels; false for everything else.
 bool DrawingCairo::DrawTarget::DrawCurve(const PointF* points, int count, float width) {
-    constexpr int kFewPoints = 64;
-    constexpr float kSparse = 3.0f;  // pixels between points
     RectF reach;
-    if (count < kFewPoints || !IsUsable(points[0]) || !IsUsable(points[count - 1]) ||
-        points[count - 1].x - points[0].x > kSparse * static_cast<float>(count))
+    if (!HasManyPoints(points, count) || !ReachablePixels(m_context, reach)) return false;
+    m_drawing.m_resources->curve.Line(points, count, width, reach);
+    m_drawing.m_resources->Compose(m_context);
+    return true;
+}
+
+// What such a curve and a level line below it enclose.
+inline bool DrawingCairo::Resources::FillUnderCurve(cairo_t* context, const PointF* points, int count) {
+    RectF reach;
+    const int last = count - 3;
+    if (!HasManyPoints(points, last + 1)) return false;
+    const PointF right = points[count - 2], left = points[count - 1];
+    if (right.x != points[last].x || left.x != points[0].x || left.y != right.y || !IsUsable(left))
         return false;
-    for (int i = 0; i < count; ++i)
-        if (!IsUsable(points[i])) return false;
-    if (!CurveMask::IsCurve(points, count) || !ReachablePixels(m_context, reach)) return false;
-    CurveMask& curve = m_drawing.m_resources->curve;
-    curve.Outline(points, count, width, reach);
+    for (int i = 0; i <= last; ++i)
+        if (points[i].y > left.y) return false;
+    if (!ReachablePixels(context, reach)) return false;
+    curve.Area(points, last + 1, left.y, reach);
+    Compose(context);
+    return true;
+}
+
+// What the mask holds, in the present colour.
+inline void DrawingCairo::Resources::Compose(cairo_t* context) {
     for (CurveMask::Strip strip; curve.Next(strip);) {
+        if (strip.solid > 0)
+            cairo_rectangle(context, strip.left, strip.top + strip.height, strip.width, strip.solid);
+        if (strip.height < 1) continue;
         cairo_surface_t* const mask = cairo_image_surface_create_for_data(
             strip.pixels, CAIRO_FORMAT_A8, strip.width, strip.height, strip.stride);
-        cairo_mask_surface(m_context, mask, strip.left, strip.top);
+        cairo_mask_surface(context, mask, strip.left, strip.top);
         cairo_surface_destroy(mask);
     }
-    return true;
+    cairo_fill(context);
 }
 
 void DrawingCairo::DrawTarget::FillPolygon(const PointF* points, int count, Ink ink) {
     Use(ink);
-    if (!AddPath(m_context, points, count)) return;
+    if (m_drawing.m_resources->FillUnderCurve(m_context, points, count) || !AddPath(m_context, points, count))
+        return;
     cairo_close_path(m_context);
     cairo_fill(m_context);
 }
@@ -292,26 +355,46 @@ void DrawingCairo::DrawTarget::Text(std::string_view text, PointF baseline, Text
 
 void DrawingCairo::DrawTarget::Bitmap(const DrawingBitmap& bitmap, const RectF& r, std::uint8_t opacity) {
     if (!IsUsable(bitmap) || !IsUsable(r)) return;
-    // Only read from, whatever the signature says.
-    auto* const pixels =
-        const_cast<unsigned char*>(reinterpret_cast<const unsigned char*>(bitmap.pixels.data()));
-    cairo_surface_t* const surface = cairo_image_surface_create_for_data(
-        pixels, bitmap.opaque ? CAIRO_FORMAT_RGB24 : CAIRO_FORMAT_ARGB32, bitmap.width, bitmap.height,
-        bitmap.width * static_cast<int>(sizeof(std::uint32_t)));
-    const double xScale = static_cast<double>(r.width) / bitmap.width;
-    const double yScale = static_cast<double>(r.height) / bitmap.height;
-    const bool ownSize = CoversPixels(m_context, r, bitmap.width, bitmap.height);
-    cairo_save(m_context);
-    cairo_translate(m_context, r.x, r.y);
-    cairo_scale(m_context, xScale, yScale);
-    cairo_set_source_surface(m_context, surface, 0.0, 0.0);
-    cairo_pattern_set_filter(cairo_get_source(m_context), ownSize ? CAIRO_FILTER_NEAREST : CAIRO_FILTER_GOOD);
-    cairo_pattern_set_extend(cairo_get_source(m_context), CAIRO_EXTEND_PAD);
-    cairo_rectangle(m_context, 0.0, 0.0, bitmap.width, bitmap.height);
-    cairo_clip(m_context);
-    cairo_paint_with_alpha(m_context, opacity / 255.0);
-    cairo_restore(m_context);
+    if (CoversPixels(m_context, r, bitmap.width, bitmap.height)) {
+        cairo_surface_t* const surface = SurfaceOf(bitmap);
+        Paint(m_context, surface, r, CAIRO_FILTER_NEAREST, opacity);
+        cairo_surface_destroy(surface);
+        return;
+    }
+    if (cairo_surface_t* const kept = m_drawing.m_resources->Stretched(m_context, bitmap, r))
+        return Paint(m_context, kept, r, CAIRO_FILTER_NEAREST, opacity);
+    cairo_surface_t* const surface = SurfaceOf(bitmap);
+    Paint(m_context, surface, r, CAIRO_FILTER_GOOD, opacity);
     cairo_surface_destroy(surface);
+}
+
+// A copy of the bitmap that has the rectangle's size, made when one state of it is drawn a second time; null
+// the first time, and where it would not be the same on the surface.
+inline cairo_surface_t* DrawingCairo::Resources::Stretched(cairo_t* target, const DrawingBitmap& bitmap,
+                                                           const RectF& r) {
+    constexpr float kMostPixels = 1 << 20;
+    RectF reach;
+    const auto whole = [](float value) { return value == std::floor(value); };
+    if (bitmap.version == 0 || !whole(r.x) || !whole(r.y) || !whole(r.width) || !whole(r.height) ||
+        r.width * r.height > kMostPixels || !ReachablePixels(target, reach))
+        return nullptr;
+    bool seen = true;
+    const int width = static_cast<int>(r.width), height = static_cast<int>(r.height);
+    cairo_surface_t*& kept = stretched.Find(
+        {bitmap.version, width, height},
+        [&]() -> cairo_surface_t* {
+            seen = false;
+            return nullptr;
+        },
+        cairo_surface_destroy);
+    if (!seen || kept) return kept;
+    cairo_surface_t* const surface = SurfaceOf(bitmap);
+    kept = cairo_image_surface_create(cairo_image_surface_get_format(surface), width, height);
+    cairo_t* const context = cairo_create(kept);
+    Paint(context, surface, {0.0f, 0.0f, r.width, r.height}, CAIRO_FILTER_GOOD, 255);
+    cairo_destroy(context);
+    cairo_surface_destroy(surface);
+    return kept;
 }
 
 void DrawingCairo::DrawTarget::PushClip(const RectF& r) {

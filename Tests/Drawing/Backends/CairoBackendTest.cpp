@@ -37,7 +37,7 @@ class CairoBackend : public ViewTest {};
 // Catches curves that are drawn column by column otherwise than as outlines: elsewhere, thicker or torn.
 TEST_F(CairoBackend, CurvesAreAsOutlined) {
     constexpr int kSide = 200;
-    for (const float width : {1.0f, 1.5f, 3.0f, 8.0f}) {
+    for (const float width : {0.0f, 1.0f, 1.5f, 3.0f, 8.0f}) {  // 0: the area under it
         std::vector<PointF> points;
         const auto noise = TestSupport::Noise<float>(kSide);
         for (int i = 0; i < kSide - 20; ++i) {
@@ -46,6 +46,9 @@ TEST_F(CairoBackend, CurvesAreAsOutlined) {
                             (i > 90 ? 30.0f * noise[static_cast<std::size_t>(i)] : 0.0f);
             points.push_back({x + 10.25f, y});
         }
+        if (width == 0.0f)
+            for (const float x : {points.back().x, points.front().x}) points.push_back({x, 210.0f});
+        const auto count = static_cast<int>(points.size());
         const auto picture = [&](bool outlined) {
             cairo_surface_t* const image = cairo_image_surface_create(CAIRO_FORMAT_RGB24, kSide, kSide);
             cairo_t* const context = cairo_create(image);
@@ -55,11 +58,14 @@ TEST_F(CairoBackend, CurvesAreAsOutlined) {
                 cairo_set_line_join(context, CAIRO_LINE_JOIN_ROUND);
                 cairo_set_line_cap(context, CAIRO_LINE_CAP_ROUND);
                 for (const PointF& p : points) cairo_line_to(context, p.x, p.y);
-                cairo_stroke(context);
+                width > 0.0f ? cairo_stroke(context) : cairo_fill(context);
             } else {
                 DrawingCairo drawing;
                 DrawingCairo::DrawTarget target(drawing, context, 96.0f);
-                target.Polyline(points.data(), static_cast<int>(points.size()), {{0xFFFFFF}, width});
+                if (width > 0.0f)
+                    target.Polyline(points.data(), count, {{0xFFFFFF}, width});
+                else
+                    target.FillPolygon(points.data(), count, {0xFFFFFF});
             }
             cairo_surface_flush(image);
             const unsigned char* const bytes = cairo_image_surface_get_data(image);
@@ -157,6 +163,29 @@ TEST_F(CairoBackend, CopiesBitmapsPixelByPixel) {
             between += (row[x] & 0xFF) > 0x08 && (row[x] & 0xFF) < 0xF8 ? 1 : 0;
         EXPECT_EQ(between == 0, c.copied) << c.deviceScale << ", " << c.contextScale << ", " << c.width;
         cairo_surface_destroy(surface);
+    }
+}
+
+// Catches a kept copy that differs from what it was made of, and one that outlives a change.
+TEST_F(CairoBackend, StretchesBitmapsTheSameEveryTime) {
+    DrawingBitmap bitmap;
+    bitmap.Size(4, 1);
+    const auto row = [&](DrawingSurface<DrawingCairo>& surface) {
+        std::vector<std::uint32_t> pixels;
+        surface.Paint(96.0f, [&](DrawTarget& target) {
+            target.Clear(0x304050);
+            target.Bitmap(bitmap, {2, 1, 11, 3}, 200);
+        });
+        for (int x = 0; x < 16; ++x) pixels.push_back(surface.Pixel(x, 2));
+        return pixels;
+    };
+    DrawingSurface<DrawingCairo> keeps(16, 5);
+    for (const std::uint32_t last : {0xFFFFFFFFu, 0x80004000u}) {
+        bitmap.pixels = {0xFF102030, 0, 0x80800000, last};
+        bitmap.Changed();
+        DrawingSurface<DrawingCairo> first(16, 5);
+        const auto expected = row(first);
+        for (int time = 1; time <= 3; ++time) EXPECT_EQ(row(keeps), expected) << time;
     }
 }
 
