@@ -9,6 +9,19 @@
 
 namespace Corvo {
 
+void DrawGround(DrawTarget& target, const RectF& rectangle, const RectF& plot) {
+    const Ink ink{Look::kGround};
+    if (!IsSnapped(rectangle)) return target.FillRectangle(rectangle, ink);
+    // Under each other and the plot, so that no seam shows where a pixel is not one of the surface.
+    constexpr float kUnder = 1.0f;
+    const float left = plot.x + kUnder - rectangle.x, right = Right(rectangle) - Right(plot) + kUnder;
+    const float top = plot.y + kUnder - rectangle.y, bottom = Bottom(rectangle) - Bottom(plot) + kUnder;
+    target.FillRectangle({rectangle.x, rectangle.y, rectangle.width, top}, ink);
+    target.FillRectangle({rectangle.x, Bottom(plot) - kUnder, rectangle.width, bottom}, ink);
+    target.FillRectangle({rectangle.x, rectangle.y, left, rectangle.height}, ink);
+    target.FillRectangle({Right(plot) - kUnder, rectangle.y, right, rectangle.height}, ink);
+}
+
 void DrawGrid(DrawTarget& target, const RectF& plot, const AxisTicks& ticks, bool upright) {
     const float width = std::max(std::round(Look::kHairline * target.Scale()), 1.0f);
     for (const AxisTick& tick : ticks.All()) {

@@ -8,6 +8,8 @@
 // Grid lines and labels of scales whose ticks have their places.
 namespace Corvo {
 
+// The ground around a plot that is going to be covered, so that no pixel is filled twice.
+void DrawGround(DrawTarget& target, const RectF& rectangle, const RectF& plot);
 void DrawGrid(DrawTarget& target, const RectF& plot, const AxisTicks& ticks, bool upright);
 // Labels under a plot, centred on their places, their baseline at y; all within left..right.
 void DrawLabelRow(DrawTarget& target, const AxisTicks& ticks, float left, float right, float y);

@@ -24,6 +24,11 @@ inline RectF Snapped(const RectF& r) {
     return {x, y, std::round(Right(r)) - x, std::round(Bottom(r)) - y};
 }
 
+inline bool IsSnapped(const RectF& r) {
+    const RectF snapped = Snapped(r);
+    return r.x == snapped.x && r.y == snapped.y && r.width == snapped.width && r.height == snapped.height;
+}
+
 // False for what a view draws nothing on: less than a pixel, not a number, or beyond any surface.
 inline bool IsDrawable(const RectF& r) { return IsUsable(r) && r.width >= 1.0f && r.height >= 1.0f; }
 

@@ -115,11 +115,15 @@ void DrawPicture(const Sonogram& sonogram, DrawTarget& target, const RectF& rect
     if (!IsDrawable(rectangle)) return;
     const RectF plot = Snapped(rectangle);
     const DrawingBitmap& bitmap = sonogram.GetBitmap();
-    target.Bitmap(bitmap, plot, 255);
     // What was never heard is no silence.
     const float perColumn = plot.width / static_cast<float>(std::max(bitmap.width, 1));
-    const float empty = perColumn * static_cast<float>(bitmap.width - sonogram.GetHeardColumns());
-    target.FillRectangle({plot.x, plot.y, std::round(empty), plot.height}, {Look::kPlot});
+    const float unheard = static_cast<float>(bitmap.width - sonogram.GetHeardColumns());
+    const float empty = std::round(perColumn * unheard);
+    const float under = std::max(empty - 1.0f, 0.0f);  // no seam
+    target.PushClip(Shrunk(plot, under, 0.0f, 0.0f, 0.0f));
+    target.Bitmap(bitmap, plot, 255);
+    target.PopClip();
+    target.FillRectangle({plot.x, plot.y, empty, plot.height}, {Look::kPlot});
 }
 
 // Labels and marks stand beside the rectangle's right edge; half of the outermost may stand beyond its ends.
@@ -217,7 +221,7 @@ void DrawSonogramAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     ViewAccess::Shown(analyser).sonogramAxis = axis;
     sonogram.CheckPixelBufferSize(layout.plot, RowsOf(axis));
     target.PushClip(rectangle);
-    target.FillRectangle(rectangle, {Look::kGround});
+    DrawGround(target, rectangle, layout.plot);
     target.PushClip(layout.plot);
     DrawPicture(sonogram, target, axis);
     if (analyser.GetTunerOn()) DrawPitchTrace(sonogram, target, axis);

@@ -178,7 +178,7 @@ void DrawSpectrumAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     ViewAccess::Shown(analyser).spectrum = plot;
     ViewAccess::Shown(analyser).map = map;
     target.PushClip(rectangle);
-    target.FillRectangle(rectangle, {Look::kGround});
+    DrawGround(target, rectangle, plot);
     target.FillRectangle(plot, {Look::kPlot});
     DrawSpectrumScales(target, rectangle, layout, map, view);
     target.PushClip(plot);

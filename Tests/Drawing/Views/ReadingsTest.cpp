@@ -56,9 +56,13 @@ protected:
         (analyser.*draw)(target, rectangle);
         return target;
     }
+    static RectF PlotOf(const Drawn& drawn) {
+        return std::ranges::find_if(drawn.rectangles, [](const auto& r) { return r.colour == Look::kPlot; })
+            ->box;
+    }
     Drawn ShowSpectrum() {
         const Drawn drawn = Show(&kivspectrum::DoDrawSpectrum<Recording>);
-        m_plot = drawn.rectangles.at(1).box;
+        m_plot = PlotOf(drawn);
         return drawn;
     }
     Drawn ShowSonogram() {
@@ -136,7 +140,7 @@ TEST_F(Readings, SonogramLabelsStandAtTheirPlaces) {
     ExpectLabels(
         drawn, false, [&](const RectF& b) { return !beside(b); },
         [&](double seconds) { return SonogramX(seconds); });
-    const RectF& empty = drawn.rectangles.at(1).box;
+    const RectF empty = PlotOf(drawn);
     EXPECT_NEAR(Right(empty), SonogramX(-1.0), 3.0f);
 }
 
