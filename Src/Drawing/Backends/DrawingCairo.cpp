@@ -154,6 +154,10 @@ struct DrawingCairo::Resources {
     PangoContext* textContext = MakeTextContext();
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
 
+    bool FillUnderCurve(cairo_t* context, const PointF* points, int count);
+    void Compose(cairo_t* context);
+    cairo_surface_t* Stretched(cairo_t* target, const DrawingBitmap& bitmap, const RectF& r);
+
     const LaidOutText& LaidOut(std::string_view text, float size) {
         const TextKey key(text, size);
         return texts.Find(
@@ -260,12 +264,12 @@ bool DrawingCairo::DrawTarget::DrawCurve(const PointF* points, int count, float 
     RectF reach;
     if (!HasManyPoints(points, count) || !ReachablePixels(m_context, reach)) return false;
     m_drawing.m_resources->curve.Line(points, count, width, reach);
-    Compose();
+    m_drawing.m_resources->Compose(m_context);
     return true;
 }
 
 // What such a curve and a level line below it enclose.
-bool DrawingCairo::DrawTarget::FillUnderCurve(const PointF* points, int count) {
+inline bool DrawingCairo::Resources::FillUnderCurve(cairo_t* context, const PointF* points, int count) {
     RectF reach;
     const int last = count - 3;
     if (!HasManyPoints(points, last + 1)) return false;
@@ -274,29 +278,30 @@ bool DrawingCairo::DrawTarget::FillUnderCurve(const PointF* points, int count) {
         return false;
     for (int i = 0; i <= last; ++i)
         if (points[i].y > left.y) return false;
-    if (!ReachablePixels(m_context, reach)) return false;
-    m_drawing.m_resources->curve.Area(points, last + 1, left.y, reach);
-    Compose();
+    if (!ReachablePixels(context, reach)) return false;
+    curve.Area(points, last + 1, left.y, reach);
+    Compose(context);
     return true;
 }
 
 // What the mask holds, in the present colour.
-void DrawingCairo::DrawTarget::Compose() {
-    for (CurveMask::Strip strip; m_drawing.m_resources->curve.Next(strip);) {
+inline void DrawingCairo::Resources::Compose(cairo_t* context) {
+    for (CurveMask::Strip strip; curve.Next(strip);) {
         if (strip.solid > 0)
-            cairo_rectangle(m_context, strip.left, strip.top + strip.height, strip.width, strip.solid);
+            cairo_rectangle(context, strip.left, strip.top + strip.height, strip.width, strip.solid);
         if (strip.height < 1) continue;
         cairo_surface_t* const mask = cairo_image_surface_create_for_data(
             strip.pixels, CAIRO_FORMAT_A8, strip.width, strip.height, strip.stride);
-        cairo_mask_surface(m_context, mask, strip.left, strip.top);
+        cairo_mask_surface(context, mask, strip.left, strip.top);
         cairo_surface_destroy(mask);
     }
-    cairo_fill(m_context);
+    cairo_fill(context);
 }
 
 void DrawingCairo::DrawTarget::FillPolygon(const PointF* points, int count, Ink ink) {
     Use(ink);
-    if (FillUnderCurve(points, count) || !AddPath(m_context, points, count)) return;
+    if (m_drawing.m_resources->FillUnderCurve(m_context, points, count) || !AddPath(m_context, points, count))
+        return;
     cairo_close_path(m_context);
     cairo_fill(m_context);
 }
@@ -356,7 +361,7 @@ void DrawingCairo::DrawTarget::Bitmap(const DrawingBitmap& bitmap, const RectF& 
         cairo_surface_destroy(surface);
         return;
     }
-    if (cairo_surface_t* const kept = Stretched(bitmap, r))
+    if (cairo_surface_t* const kept = m_drawing.m_resources->Stretched(m_context, bitmap, r))
         return Paint(m_context, kept, r, CAIRO_FILTER_NEAREST, opacity);
     cairo_surface_t* const surface = SurfaceOf(bitmap);
     Paint(m_context, surface, r, CAIRO_FILTER_GOOD, opacity);
@@ -365,16 +370,17 @@ void DrawingCairo::DrawTarget::Bitmap(const DrawingBitmap& bitmap, const RectF& 
 
 // A copy of the bitmap that has the rectangle's size, made when one state of it is drawn a second time; null
 // the first time, and where it would not be the same on the surface.
-cairo_surface_t* DrawingCairo::DrawTarget::Stretched(const DrawingBitmap& bitmap, const RectF& r) {
+inline cairo_surface_t* DrawingCairo::Resources::Stretched(cairo_t* target, const DrawingBitmap& bitmap,
+                                                           const RectF& r) {
     constexpr float kMostPixels = 1 << 20;
     RectF reach;
     const auto whole = [](float value) { return value == std::floor(value); };
     if (bitmap.version == 0 || !whole(r.x) || !whole(r.y) || !whole(r.width) || !whole(r.height) ||
-        r.width * r.height > kMostPixels || !ReachablePixels(m_context, reach))
+        r.width * r.height > kMostPixels || !ReachablePixels(target, reach))
         return nullptr;
     bool seen = true;
     const int width = static_cast<int>(r.width), height = static_cast<int>(r.height);
-    cairo_surface_t*& kept = m_drawing.m_resources->stretched.Find(
+    cairo_surface_t*& kept = stretched.Find(
         {bitmap.version, width, height},
         [&]() -> cairo_surface_t* {
             seen = false;

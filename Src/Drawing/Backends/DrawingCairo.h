@@ -10,7 +10,6 @@
 #include "Platform/Export.h"
 
 using cairo_t = struct _cairo;
-using cairo_surface_t = struct _cairo_surface;
 
 namespace Corvo {
 
@@ -41,7 +40,6 @@ private:
 // context keeps its state; its transformation applies.
 class DSP_API DrawingCairo::DrawTarget final : public Corvo::DrawTarget {
 public:
-    // `dpi`: dots per inch, 96 is 100 %.
     DrawTarget(DrawingCairo& drawing, cairo_t* context, float dpi);
     ~DrawTarget() override;
 
@@ -61,9 +59,6 @@ private:
     void Use(Ink ink);
     bool Use(const Stroke& stroke);
     bool DrawCurve(const PointF* points, int count, float width);
-    bool FillUnderCurve(const PointF* points, int count);
-    void Compose();
-    cairo_surface_t* Stretched(const DrawingBitmap& bitmap, const RectF& r);
 
     DrawingCairo& m_drawing;
     cairo_t* m_context;
