@@ -211,7 +211,8 @@ TEST(CInterface, ProcessesLikeTheClasses) {
             ASSERT_EQ(dsp_effect_automate(effect, 0, points, 2), automates ? DSP_OK : DSP_UNSUPPORTED);
             ASSERT_EQ(dsp_effect_prepare(effect, &format, nullptr), DSP_OK);
             auto got = noise;
-            for (const auto& [at, count] : {std::pair{0, 1000}, std::pair{1000, kFrames - 1000}}) {
+            for (const int at : {0, 1000}) {
+                const int count = at ? kFrames - at : 1000;
                 double* const block = &got[2 * static_cast<std::size_t>(at)];
                 if (!planar) {
                     ASSERT_EQ(dsp_effect_process_f64(effect, block, count), DSP_OK);
