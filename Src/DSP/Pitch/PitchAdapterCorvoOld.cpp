@@ -77,7 +77,8 @@ void PitchAdapterCorvoOld::CookFactors() {
     m_step = m_size / m_oversampling;
     m_latency = m_size - m_step;
     m_expectedPhase = m_step * 2.0 * kPi / m_size;
-    m_binWidth = static_cast<double>(m_rate) / m_size;
+    // The rate cancels out of the sound; without one there would be nothing to cancel.
+    m_binWidth = static_cast<double>(std::max(m_rate, 1)) / m_size;
 
     for (Channel& channel : *m_state) {
         channel = {};

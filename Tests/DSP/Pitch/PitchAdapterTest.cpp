@@ -188,3 +188,15 @@ TEST(PitchAdapterClassic, LeavesWhatItDoesNotShift) {
     for (const float wild : {-1.0f, 1e30f, std::nanf("")})
         Make(kClassic, 2, wild)->ProcessInPlace(four.data(), 5000);
 }
+
+TEST(PitchAdapterClassic, SoundsTheSameWithoutARate) {
+    const auto input = Noise<float>(2 * 5000);
+    auto known = input, unknown = input;
+    for (auto [rate, samples] : {std::pair{48000, &known}, std::pair{0, &unknown}}) {
+        const auto adapter = Make(kClassic, 2, 1.5f);
+        adapter->SetSampleRate(rate);
+        adapter->CookFactors();
+        adapter->ProcessInPlace(samples->data(), 5000);
+    }
+    for (std::size_t i = 0; i < known.size(); ++i) ASSERT_NEAR(unknown[i], known[i], 1e-6f) << i;
+}
