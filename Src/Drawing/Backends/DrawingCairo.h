@@ -40,6 +40,7 @@ private:
 // context keeps its state; its transformation applies.
 class DSP_API DrawingCairo::DrawTarget final : public Corvo::DrawTarget {
 public:
+    // `dpi`: dots per inch, 96 is 100 %.
     DrawTarget(DrawingCairo& drawing, cairo_t* context, float dpi);
     ~DrawTarget() override;
 

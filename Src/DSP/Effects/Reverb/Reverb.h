@@ -38,9 +38,9 @@ static_assert(sizeof(_transform_props) == 72);
 //
 // Parameters come in pairs, left and right; external indices run backwards: external 0 is real 15.
 //
-// Memory: InitProcessing makes the largest buffers for its format, without touching them: a page is touched by
-// the block whose sound first gets there. A format that was not announced makes its own in the first block that
-// has it. An edit that changes the length of a buffer clears it.
+// Memory: InitProcessing makes the largest buffers for its format, without touching them: a page is touched
+// by the block whose sound first gets there. A format that was not announced makes its own in the first block
+// that has it. An edit that changes the length of a buffer clears it.
 //
 // Settings chunk: 76 bytes, the chunk tag and the settings, 18 words; the oldest layout has 148 bytes.
 class DSP_API Reverb : public CorvoEffect {
