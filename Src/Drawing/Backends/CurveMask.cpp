@@ -73,6 +73,7 @@ void CurveMask::AddSegment(PointF from, PointF to, float radius) {
     const float run = to.x - from.x;
     if (run <= 0.0f) return;
     const float slope = (to.y - from.y) / run, root = std::sqrt(1.0f + slope * slope);
+    if (!std::isfinite(root)) return;  // too steep to have a width
     const float shift = radius * slope / root, half = radius * root;
     const float x = from.x - static_cast<float>(m_left);
     const auto heightAt = [&](int cut) { return from.y + slope * (MiddleOf(cut) - x); };

@@ -2,9 +2,13 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
 #include <mutex>
 #include <numbers>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <fontconfig/fontconfig.h>
@@ -23,6 +27,27 @@ namespace {
 struct LaidOutText {
     PangoLayout* layout = nullptr;
     TextMetrics metrics{};
+};
+
+struct SurfaceDestroyer {
+    void operator()(cairo_surface_t* surface) const { cairo_surface_destroy(surface); }
+};
+
+// A state of a bitmap and a size that it is drawn in. The numbers of states are a module's own: two bitmaps
+// of different modules may have the same.
+struct StretchedBitmap {
+    const std::uint32_t* pixels;
+    std::uint32_t version;
+    int width, height;
+    std::unique_ptr<cairo_surface_t, SurfaceDestroyer> copy{};  // stretched; null until it is made
+
+    bool IsSame(const StretchedBitmap& other) const {
+        return pixels == other.pixels && version == other.version && width == other.width &&
+               height == other.height;
+    }
+    std::size_t Bytes() const {
+        return copy ? sizeof(std::uint32_t) * static_cast<std::size_t>(width * height) : 0;
+    }
 };
 
 // What a pen's handle stands for.
@@ -126,9 +151,11 @@ cairo_surface_t* SurfaceOf(const DrawingBitmap& bitmap) {
         bitmap.width * static_cast<int>(sizeof(std::uint32_t)));
 }
 
-// A surface of pixels, stretched over the rectangle.
-void Paint(cairo_t* context, cairo_surface_t* surface, const RectF& r, cairo_filter_t filter,
+// A surface of pixels, stretched over the rectangle. False when it failed; a failed surface would spoil the
+// context for good.
+bool Paint(cairo_t* context, cairo_surface_t* surface, const RectF& r, cairo_filter_t filter,
            std::uint8_t opacity) {
+    if (cairo_surface_status(surface) != CAIRO_STATUS_SUCCESS) return false;
     const int width = cairo_image_surface_get_width(surface);
     const int height = cairo_image_surface_get_height(surface);
     cairo_save(context);
@@ -141,6 +168,7 @@ void Paint(cairo_t* context, cairo_surface_t* surface, const RectF& r, cairo_fil
     cairo_clip(context);
     cairo_paint_with_alpha(context, opacity / 255.0);
     cairo_restore(context);
+    return cairo_status(context) == CAIRO_STATUS_SUCCESS;
 }
 
 }  // namespace
@@ -149,7 +177,7 @@ struct DrawingCairo::Resources {
     SlotCache<InkKey, DrawingBrush, kKeptInks> brushes;
     SlotCache<StrokeKey, DrawingPen*, kKeptStrokes> pens;
     SlotCache<TextKey, LaidOutText, kKeptTexts> texts;
-    SlotCache<StretchedKey, cairo_surface_t*, kKeptStretched> stretched;
+    std::vector<StretchedBitmap> stretched;  // the one used last is the last
     CurveMask curve;
     PangoContext* textContext = MakeTextContext();
     PangoFontDescription* font = pango_font_description_from_string("Montserrat, Sans");
@@ -157,6 +185,7 @@ struct DrawingCairo::Resources {
     bool FillUnderCurve(cairo_t* context, const PointF* points, int count);
     void Compose(cairo_t* context);
     cairo_surface_t* Stretched(cairo_t* target, const DrawingBitmap& bitmap, const RectF& r);
+    void KeepStretched(StretchedBitmap added);
 
     const LaidOutText& LaidOut(std::string_view text, float size) {
         const TextKey key(text, size);
@@ -185,7 +214,6 @@ DrawingCairo::~DrawingCairo() {
     m_resources->brushes.Clear([this](DrawingBrush brush) { ReleaseBrush(brush); });
     m_resources->pens.Clear([this](DrawingPen* pen) { ReleasePen(pen); });
     m_resources->texts.Clear([](LaidOutText& text) { g_object_unref(text.layout); });
-    m_resources->stretched.Clear(cairo_surface_destroy);
     pango_font_description_free(m_resources->font);
     g_object_unref(m_resources->textContext);
 }
@@ -361,15 +389,17 @@ void DrawingCairo::DrawTarget::Bitmap(const DrawingBitmap& bitmap, const RectF& 
         cairo_surface_destroy(surface);
         return;
     }
-    if (cairo_surface_t* const kept = m_drawing.m_resources->Stretched(m_context, bitmap, r))
-        return Paint(m_context, kept, r, CAIRO_FILTER_NEAREST, opacity);
+    if (cairo_surface_t* const kept = m_drawing.m_resources->Stretched(m_context, bitmap, r)) {
+        Paint(m_context, kept, r, CAIRO_FILTER_NEAREST, opacity);
+        return;
+    }
     cairo_surface_t* const surface = SurfaceOf(bitmap);
     Paint(m_context, surface, r, CAIRO_FILTER_GOOD, opacity);
     cairo_surface_destroy(surface);
 }
 
 // A copy of the bitmap that has the rectangle's size, made when one state of it is drawn a second time; null
-// the first time, and where it would not be the same on the surface.
+// the first time, where it would not be the same on the surface, and when there is no memory for it.
 inline cairo_surface_t* DrawingCairo::Resources::Stretched(cairo_t* target, const DrawingBitmap& bitmap,
                                                            const RectF& r) {
     constexpr float kMostPixels = 1 << 20;
@@ -378,23 +408,40 @@ inline cairo_surface_t* DrawingCairo::Resources::Stretched(cairo_t* target, cons
     if (bitmap.version == 0 || !whole(r.x) || !whole(r.y) || !whole(r.width) || !whole(r.height) ||
         r.width * r.height > kMostPixels || !ReachablePixels(target, reach))
         return nullptr;
-    bool seen = true;
-    const int width = static_cast<int>(r.width), height = static_cast<int>(r.height);
-    cairo_surface_t*& kept = stretched.Find(
-        {bitmap.version, width, height},
-        [&]() -> cairo_surface_t* {
-            seen = false;
-            return nullptr;
-        },
-        cairo_surface_destroy);
-    if (!seen || kept) return kept;
-    cairo_surface_t* const surface = SurfaceOf(bitmap);
-    kept = cairo_image_surface_create(cairo_image_surface_get_format(surface), width, height);
-    cairo_t* const context = cairo_create(kept);
-    Paint(context, surface, {0.0f, 0.0f, r.width, r.height}, CAIRO_FILTER_GOOD, 255);
-    cairo_destroy(context);
-    cairo_surface_destroy(surface);
-    return kept;
+    StretchedBitmap wanted{bitmap.pixels.data(), bitmap.version, static_cast<int>(r.width),
+                           static_cast<int>(r.height)};
+    const auto known =
+        std::ranges::find_if(stretched, [&](const StretchedBitmap& kept) { return kept.IsSame(wanted); });
+    if (known == stretched.end()) {
+        KeepStretched(std::move(wanted));
+        return nullptr;
+    }
+    wanted.copy = std::move(known->copy);
+    stretched.erase(known);
+    if (!wanted.copy) {
+        cairo_surface_t* const surface = SurfaceOf(bitmap);
+        wanted.copy.reset(
+            cairo_image_surface_create(cairo_image_surface_get_format(surface), wanted.width, wanted.height));
+        cairo_t* const context = cairo_create(wanted.copy.get());
+        if (!Paint(context, surface, {0.0f, 0.0f, r.width, r.height}, CAIRO_FILTER_GOOD, 255))
+            wanted.copy.reset();
+        cairo_destroy(context);
+        cairo_surface_destroy(surface);
+    }
+    KeepStretched(std::move(wanted));
+    return stretched.back().copy.get();
+}
+
+// Those used longest ago make room.
+void DrawingCairo::Resources::KeepStretched(StretchedBitmap added) {
+    constexpr std::size_t kMost = 64, kMostBytes = 16 << 20;  // a tuner has up to 18 images
+    stretched.push_back(std::move(added));
+    std::size_t bytes = 0;
+    for (const StretchedBitmap& kept : stretched) bytes += kept.Bytes();
+    while (stretched.size() > kMost || bytes > kMostBytes) {
+        bytes -= stretched.front().Bytes();
+        stretched.erase(stretched.begin());
+    }
 }
 
 void DrawingCairo::DrawTarget::PushClip(const RectF& r) {

@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
-#include <cstdint>
 #include <functional>
 #include <string_view>
 
@@ -44,16 +43,9 @@ struct TextKey {
     bool operator==(const TextKey&) const = default;
 };
 
-// A bitmap's pixels, and the size that they are stretched to.
-struct StretchedKey {
-    std::uint32_t version = 0;
-    int width = 0, height = 0;
-    bool operator==(const StretchedKey&) const = default;
-};
-
 // A picture needs a few colours and widths; up to 220 texts on a display of 3840x2160, and there is room for
-// two such pictures. A tuner has up to 18 images.
-constexpr std::size_t kKeptInks = 32, kKeptStrokes = 32, kKeptTexts = 512, kKeptStretched = 64;
+// two such pictures.
+constexpr std::size_t kKeptInks = 32, kKeptStrokes = 32, kKeptTexts = 512;
 
 inline std::size_t CombinedHash(std::size_t a, std::size_t b) { return a * 31 + b; }
 
@@ -70,15 +62,6 @@ template <>
 struct std::hash<Corvo::StrokeKey> {
     std::size_t operator()(const Corvo::StrokeKey& key) const {
         return Corvo::CombinedHash(std::hash<Corvo::InkKey>{}(key.ink), std::hash<float>{}(key.width));
-    }
-};
-
-template <>
-struct std::hash<Corvo::StretchedKey> {
-    std::size_t operator()(const Corvo::StretchedKey& key) const {
-        const auto size =
-            Corvo::CombinedHash(static_cast<std::size_t>(key.width), static_cast<std::size_t>(key.height));
-        return Corvo::CombinedHash(size, key.version);
     }
 };
 

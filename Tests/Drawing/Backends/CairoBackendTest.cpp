@@ -166,15 +166,16 @@ TEST_F(CairoBackend, CopiesBitmapsPixelByPixel) {
     }
 }
 
-// Catches a kept copy that differs from what it was made of, and one that outlives a change.
+// Catches a kept copy that differs from what it was made of, one that outlives a change, and one that is
+// drawn for another bitmap, whose module has counted as far.
 TEST_F(CairoBackend, StretchesBitmapsTheSameEveryTime) {
-    DrawingBitmap bitmap;
+    DrawingBitmap bitmap, other;
     bitmap.Size(4, 1);
-    const auto row = [&](DrawingSurface<DrawingCairo>& surface) {
+    const auto row = [](DrawingSurface<DrawingCairo>& surface, const DrawingBitmap& drawn) {
         std::vector<std::uint32_t> pixels;
         surface.Paint(96.0f, [&](DrawTarget& target) {
             target.Clear(0x304050);
-            target.Bitmap(bitmap, {2, 1, 11, 3}, 200);
+            target.Bitmap(drawn, {2, 1, 11, 3}, 200);
         });
         for (int x = 0; x < 16; ++x) pixels.push_back(surface.Pixel(x, 2));
         return pixels;
@@ -183,9 +184,13 @@ TEST_F(CairoBackend, StretchesBitmapsTheSameEveryTime) {
     for (const std::uint32_t last : {0xFFFFFFFFu, 0x80004000u}) {
         bitmap.pixels = {0xFF102030, 0, 0x80800000, last};
         bitmap.Changed();
-        DrawingSurface<DrawingCairo> first(16, 5);
-        const auto expected = row(first);
-        for (int time = 1; time <= 3; ++time) EXPECT_EQ(row(keeps), expected) << time;
+        other = bitmap;
+        other.pixels[0] = 0xFFFF0000;
+        for (const DrawingBitmap* drawn : {&bitmap, &other}) {
+            DrawingSurface<DrawingCairo> first(16, 5);
+            const auto expected = row(first, *drawn);
+            for (int time = 1; time <= 3; ++time) EXPECT_EQ(row(keeps, *drawn), expected) << time;
+        }
     }
 }
 
