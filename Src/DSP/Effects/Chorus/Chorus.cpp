@@ -17,7 +17,6 @@ namespace Corvo::DSP {
 namespace {
 
 using Props = ChorusPrivate::_transform_props;
-using Sides = std::array<ChorusPrivate::Side, 2>;
 using ChorusPresets::kPresets;
 
 constexpr std::int32_t kSilent = -960, kLoudest = 100;
@@ -61,10 +60,10 @@ constexpr double kLongestSeconds = 10.0;
 
 Chorus::Chorus()
     : CorvoEffect(Table(), &m_settings),
-      m_sides(std::make_unique<Sides>()),
+      m_delay(std::make_unique<ChorusPrivate::Delay>()),
       m_ring(std::make_unique_for_overwrite<float[]>(kFirstCapacity)),
       m_capacity(kFirstCapacity) {
-    for (int channel : {0, 1}) (*m_sides)[static_cast<std::size_t>(channel)].channel = channel;
+    for (int channel : {0, 1}) m_delay->sides[static_cast<std::size_t>(channel)].channel = channel;
     SetPreset(0);
 }
 Chorus::~Chorus() = default;
@@ -84,7 +83,7 @@ bool Chorus::MakeRing() {
     if (m_ring && wanted <= m_capacity) return true;
     std::unique_ptr<float[]> grown(new (std::nothrow) float[static_cast<std::size_t>(wanted)]);
     if (!grown) return m_ring != nullptr;
-    if (m_ring) std::copy_n(m_ring.get(), m_sides->front().touched, grown.get());
+    if (m_ring) std::copy_n(m_ring.get(), m_delay->written, grown.get());
     m_ring = std::move(grown);
     m_capacity = wanted;
     return true;
@@ -99,7 +98,7 @@ bool Chorus::InitState(const Props& settings, bool reset) {
     const std::int64_t longest = m_capacity / channels - 1;
     int frames = 1;
     for (std::size_t i = 0; i < 2; ++i) {
-        auto& side = (*m_sides)[i];
+        auto& side = m_delay->sides[i];
         side.oscillator.SetIncrement(kRadiansPerStep / static_cast<double>(hz) * settings.frequency[i]);
         side.wet = GainFromTenthsOfDb(settings.wet[i], kSilent, kLoudest);
         side.dry = GainFromTenthsOfDb(settings.dry[i], kSilent, kLoudest);
@@ -110,18 +109,13 @@ bool Chorus::InitState(const Props& settings, bool reset) {
         if (side.channel < channels) frames = std::max(frames, side.base + 2 * side.amplitude);
     }
     m_ring_length = frames * channels;
-    // What was never used is silent.
-    int& touched = m_sides->front().touched;
-    const int used = std::max(touched, m_ring_length + channels);
-    std::fill(m_ring.get() + touched, m_ring.get() + used, 0.0f);
-    touched = used;
     m_longest_gap = 0.0;
-    for (const auto& side : *m_sides)
+    for (const auto& side : m_delay->sides)
         if (side.channel < channels)
             m_longest_gap =
                 std::max(m_longest_gap, static_cast<double>(side.base / channels) / static_cast<double>(hz));
     for (std::size_t i = 0; i < 2; ++i) {
-        auto& side = (*m_sides)[i];
+        auto& side = m_delay->sides[i];
         if (reset) side.oscillator.SetPhase(0.0);
         side.write = reset ? side.channel : std::min(side.write, m_ring_length);
     }
@@ -129,12 +123,12 @@ bool Chorus::InitState(const Props& settings, bool reset) {
 }
 
 void Chorus::InitResetProcessingLight(bool) {
-    if (m_ring) std::fill_n(m_ring.get(), m_sides->front().touched, 0.0f);
+    if (m_ring) std::fill_n(m_ring.get(), m_delay->written, 0.0f);
 }
 
 void Chorus::Cleanup() {
     m_ring.reset();
-    m_capacity = m_ring_length = m_sides->front().touched = 0;
+    m_capacity = m_ring_length = m_delay->written = 0;
     MarkStale();
 }
 
@@ -146,17 +140,17 @@ void Chorus::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* fo
     // Until the tail begins, all of it is left to ring out.
     if (restart || !m_tail->TailMode()) m_tail_left = {};
     for (std::size_t i = 0; i < static_cast<std::size_t>(channels); ++i) {
-        auto& side = (*m_sides)[i];
+        auto& side = m_delay->sides[i];
         if (restart) side.write = side.channel;
         if (restart || !m_tail->TailMode()) m_tail_left[i] = side.base / channels;
     }
     const auto allowed = m_tail->Limit(frames, m_tail_left);
-    const ChorusPrivate::Ring ring{m_ring.get(), m_ring_length, channels};
+    const ChorusPrivate::Ring ring{m_ring.get(), m_ring_length, channels, m_delay->written};
     WithSamples(buffer, *format, OtherWidths::AreFloat, [&](auto* samples) {
         for (std::size_t i = 0; i < static_cast<std::size_t>(channels); ++i)
-            (*m_sides)[i].Run(samples + i, allowed[i], format->nChannels, ring);
+            m_delay->sides[i].Run(samples + i, allowed[i], format->nChannels, ring);
     });
-    for (auto& side : *m_sides) side.oscillator.ReducePhase();
+    for (auto& side : m_delay->sides) side.oscillator.ReducePhase();
 }
 
 }  // namespace Corvo::DSP

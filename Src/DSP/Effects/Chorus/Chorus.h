@@ -22,7 +22,7 @@ struct _transform_props {
 };
 static_assert(sizeof(_transform_props) == 88);
 
-struct Side;
+struct Delay;
 
 }  // namespace ChorusPrivate
 
@@ -38,10 +38,10 @@ struct Side;
 // The delay lines hold floats, of what is beyond them the largest. Channels after the second pass unchanged,
 // and so does everything when there was no memory for the ring. No latency.
 //
-// Memory: InitProcessing makes a ring for 10 s and touches what the settings use of it; the block after an
-// edit touches what that adds. Settings from a chunk beyond that, or beyond the ring when the format changed
-// without InitProcessing, are limited to what the ring holds. The ring keeps its contents through edits and
-// preparation.
+// Memory: InitProcessing makes a ring for 10 s and touches none of it; until the sound has been through what
+// the settings use, each block touches as much as it writes. Settings from a chunk beyond that, or beyond the
+// ring when the format changed without InitProcessing, are limited to what the ring holds. The ring keeps its
+// contents through edits and preparation.
 //
 // Settings chunk: 92 bytes, the chunk tag and the settings, 22 words; the oldest layout has 180 bytes.
 class DSP_API Chorus : public CorvoEffect {
@@ -65,7 +65,7 @@ private:
 
     ChorusPrivate::_transform_props m_settings{};  // shared between the threads
     tWAVEFORMATEX m_format{};
-    std::unique_ptr<std::array<ChorusPrivate::Side, 2>> m_sides;
+    std::unique_ptr<ChorusPrivate::Delay> m_delay;
     std::unique_ptr<float[]> m_ring;
     int m_capacity = 0;     // floats
     int m_ring_length = 0;  // samples, all channels counted

@@ -9,11 +9,30 @@
 
 namespace Corvo::DSP::ChorusPrivate {
 
-// The ring that the channels share, sample by sample in turn.
+// The ring that the channels share, sample by sample in turn. Its memory comes as it is: from `written` on it
+// counts as silent, and a page of it is touched when the sound gets there.
 struct Ring {
     float* samples;
     int length;  // in samples, a whole number of frames and at least one
     int channels;
+    int& written;  // samples of it, from the first one on
+
+    // Before one side writes: what the other side will write in between is silent.
+    void WriteUpTo(int end) const {
+        if (end <= written) return;
+        std::fill(samples + written, samples + end, 0.0f);
+        written = end;
+    }
+    // Calls back with what gives the sample at an index. Once the ring is full it need not look.
+    template <typename Call>
+    void WithCells(Call&& call) const {
+        const float* const cells = samples;
+        const int end = written;
+        if (end >= length)
+            call([cells](int at) { return cells[at]; });
+        else
+            call([cells, end](int at) { return at < end ? cells[at] : 0.0f; });
+    }
 };
 
 // One side's delay, in frames, and its levels.
@@ -24,8 +43,6 @@ struct Side {
     int base = 0;       // the read position trails the written one by `base` at the sweep's lower end
     int channel = 0;    // and index of its first sample in the ring
     int write = 0;      // index of the sample written next
-    // Samples of the ring, from its first one on, that hold something; kept by the first side.
-    int touched = 0;
 
     // One channel of a block.
     template <typename Sample>
@@ -43,8 +60,11 @@ struct Side {
             }
             for (int done = 0; done < taken;) {
                 const int run = std::min(taken - done, FramesToWrap(ring));
-                RunStraight(samples + done * stride, run, stride, ring, offsets.data() + done,
-                            fractions.data() + done);
+                ring.WriteUpTo(write + run * ring.channels);
+                ring.WithCells([&](auto cell) {
+                    RunStraight(samples + done * stride, run, stride, ring, offsets.data() + done,
+                                fractions.data() + done, cell);
+                });
                 done += run;
             }
         }
@@ -62,28 +82,33 @@ private:
         return std::max((ring.length - write + ring.channels - 1) / ring.channels, 1);
     }
 
-    template <typename Sample>
+    // `cell` gives the sample of the ring at an index.
+    template <typename Sample, typename Cell>
     void RunStraight(Sample* samples, int frames, std::ptrdiff_t stride, const Ring& ring, const int* offsets,
-                     const double* fractions) {
+                     const double* fractions, Cell cell) {
         const int length = ring.length, step = ring.channels;
-        float* const memory = ring.samples;
         // Reading, the end of the ring is its beginning.
         int read = write < length ? write : write - length;
-        float* written = memory + write;
+        float* written = ring.samples + write;
         for (int i = 0; i < frames; ++i, read += step, written += step, samples += stride) {
             int at = read + offsets[i];
             at += at < 0 ? length : 0;
             at -= at >= length ? length : 0;
             int next = at + step;
             next -= next >= length ? length : 0;
-            const double x = *samples, here = memory[at];
-            const double delayed = (memory[next] - here) * fractions[i] + here;
+            const double x = *samples, here = cell(at);
+            const double delayed = (cell(next) - here) * fractions[i] + here;
             *written = Kept(*samples);
             *samples = static_cast<Sample>(delayed * wet + x * dry);
         }
         write += frames * step;
         if (write >= length) write = channel;
     }
+};
+
+struct Delay {
+    std::array<Side, 2> sides;
+    int written = 0;  // of the ring
 };
 
 }  // namespace Corvo::DSP::ChorusPrivate
