@@ -37,7 +37,7 @@ def medians(build):
     return {name: statistics.median(found) for name, found in times.items()}
 
 native, baseline, target = medians("native"), medians("baseline"), medians("target")
-assert native.keys() == target.keys(), "the builds measured different kernels"
+assert native.keys() == baseline.keys() == target.keys(), "the builds measured different kernels"
 print(f"| Kernel | native, ns | SSE2 only, ns | {sys.argv[2]}, ns | to native | to SSE2 |\n|---|---|---|---|---|---|")
 for name, time in target.items():
     print(f"| {name} | {native[name]:.2f} | {baseline[name]:.2f} | {time:.2f} |"

@@ -32,7 +32,7 @@ struct DSP_API SamplingFrequencyConverter {
     static constexpr int kMaxChannels = 48;
     static constexpr int kMaxOrder = 40;
     static constexpr int kOrder = 10;
-    // Each step of the raised rate takes 176 bytes of tables, which must fit a 32-bit address space.
+    // Each step of the raised rate takes 192 bytes of tables, which must fit a 32-bit address space.
     static constexpr int kMaxFactor = 0x7FFFFFFF / 256;
 
     // Not set up: blocks return 0.
