@@ -165,7 +165,7 @@ render_with_ffmpeg() {
 
 # A second of a metronome through one after the other: all of them at once are too much for a busy machine.
 play_with_jalv() {
-    local uri name port i outputs files=() status=0
+    local uri name port i channels outputs files=() status=0
     running=() client=  # for the trap, which comes when this function has ended
     jackd -n "$JACK_DEFAULT_SERVER" --no-realtime --timeout 5000 -d dummy -r 48000 -p 2048 > "$work/jackd.log" 2>&1 &
     running+=($!)
@@ -182,11 +182,12 @@ play_with_jalv() {
         timeout -k 5 60 jalv -x -n "$name" "$uri" < "$work/commands" > "$work/jalv-$name.log" 2>&1 &
         client=$!
         outputs=()
-        for ((i = 0; i < 200 && ${#outputs[@]} == 0; ++i)); do
+        channels=$(channels_of "$uri")
+        for ((i = 0; i < 400 && ${#outputs[@]} != channels; ++i)); do
             sleep 0.05
             mapfile -t outputs < <(jack_lsp "$name:" 2> /dev/null | grep "^$name:out")
         done
-        if [ ${#outputs[@]} != "$(channels_of "$uri")" ]; then
+        if [ ${#outputs[@]} != "$channels" ]; then
             echo "$uri does not start in jalv: $(cat "$work/jalv-$name.log")"
             status=1
         else
