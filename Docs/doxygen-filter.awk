@@ -28,6 +28,7 @@ BEGIN {
         split(line, cells, / *\| */)
         if (cells[2] == "`Src/" room "`") title = room ": " cells[3]
     }
+    gsub(/`/, "", title)
     printf "/** \\defgroup %s %s */ /** \\addtogroup %s */ /** @{ */ ", group, title, group
 }
 # A comment is kept until the line after it tells what it is about.

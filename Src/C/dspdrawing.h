@@ -36,7 +36,7 @@ typedef struct dsp_picture {
 typedef struct dsp_drawing dsp_drawing;
 /* With the typeface of now. */
 DSP_C_API dsp_status DSP_CALL dsp_drawing_create(dsp_drawing** drawing, dsp_error* error);
-/* Fills `picture` with a DSP_VIEW_... of the analyser. */
+/* Fills `picture` with a DSP_VIEW_... of the analyser; may allocate. */
 DSP_C_API dsp_status DSP_CALL dsp_draw(dsp_drawing* drawing, dsp_analyser* analyser, int32_t view,
                                        const dsp_picture* picture, dsp_error* error);
 /* The file of the typeface of drawings made from now on; null or empty for the installed one. A file that

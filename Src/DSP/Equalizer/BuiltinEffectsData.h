@@ -36,7 +36,7 @@ static_assert(sizeof(_eq_data) == 16);
 // The setting of a whole equaliser, which the host owns, edits and hands to ParEQ.
 //
 // Band indices count from 0 and are trusted to be below kMaxBands. Listeners are told synchronously, inside
-// the setter. Copies clone the listeners. One thread at a time; no locks.
+// the setter. Copies clone the listeners, which allocates; nothing else does. One thread at a time; no locks.
 class DSP_API builtin_effects_data {
 public:
     static constexpr int kMaxBands = 20;         // that the record has room for

@@ -5,7 +5,7 @@
 #include "Platform/Export.h"
 
 // One channel's dither in front of a word-length reduction. The converter reads the set-up and keeps the
-// running state here; MakeDither fills one.
+// running state here; MakeDither fills one. One thread at a time; nothing here allocates.
 template <typename T>
 struct CDither {
     static constexpr int kMaxOrder = 16;  // coefficients of the noise shaping

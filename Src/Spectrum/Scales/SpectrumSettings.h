@@ -18,7 +18,7 @@ struct SpectrumSettings {
     std::int32_t view_option_b = 0;            // level scale, see LevelScale
     std::int32_t peak_decay_mode = 2;          // how long peaks stay: 0 for good, 1 long, 2 medium, 3 short
     std::int32_t view_option_c = 1;            // grid: 0 off, 1 on
-    std::int32_t view_option_d = 1;            // vertical range: 60, 90, 120 or 144 dB
+    std::int32_t view_option_d = 1;            // vertical range: 0 60 dB, 1 90, 2 120, 3 144
     float gain = 1.0f;                         // scales the drawn amplitude
     std::int32_t view_flag_a = 0;              // for the host: show the two channels' analysers apart
     std::int32_t peak_hold_mode = 1;           // 0 no peaks, 1 peaks fall, 2 they stay until reset
