@@ -19,6 +19,10 @@ double Up(const Axis& axis, double value) {
     return kHeight - kBottom - axis.Place(value) * (kHeight - kTop - kBottom);
 }
 
+std::string TickText(double tick) {
+    return std::abs(tick) < 1000 ? Number(tick, 3) : Number(tick / 1000, 3) + 'k';
+}
+
 }  // namespace
 
 double Axis::Place(double value) const {
@@ -31,11 +35,11 @@ std::string DrawChart(const Axis& across, const Axis& up, const std::vector<Curv
     Svg svg;
     for (const double tick : across.ticks) {
         svg.Line(Across(across, tick), kTop, Across(across, tick), kHeight - kBottom, "grid");
-        svg.Text(Across(across, tick), kHeight - kBottom + 17, Number(tick, 3), "middle", "tick");
+        svg.Text(Across(across, tick), kHeight - kBottom + 17, TickText(tick), "middle", "tick");
     }
     for (const double tick : up.ticks) {
         svg.Line(kLeft, Up(up, tick), kWidth - kRight, Up(up, tick), "grid");
-        svg.Text(kLeft - 6, Up(up, tick) + 4, Number(tick, 3), "end", "tick");
+        svg.Text(kLeft - 6, Up(up, tick) + 4, TickText(tick), "end", "tick");
     }
     svg.Text((kLeft + kWidth - kRight) / 2, kHeight - 8, across.title, "middle", "tick");
     svg.Text(4, 13, up.title, "start", "tick");
