@@ -28,6 +28,7 @@ BEGIN {
         split(line, cells, / *\| */)
         if (cells[2] == "`Src/" room "`") title = room ": " cells[3]
     }
+    gsub(/`/, "", title)
     printf "/** \\defgroup %s %s */ /** \\addtogroup %s */ /** @{ */ ", group, title, group
 }
 # A comment is kept until the line after it tells what it is about.
@@ -62,13 +63,66 @@ function speaks_for(line,    at) {
     sub(/[^ \t].*/, "", at)
     return at == indent && line !~ /^ *[}#]|^(public|protected|private):|~| override|= delete|friend |static_assert|[;,{})] +\/\/ /
 }
+# The declarations of a line such as "int width = 0, height = 0;  // pixels" in `piece`, each with the line's comment: Doxygen
+# would keep it for one of them. How many they are, 0 for every other line.
+function declarations(line,    body, comment, at, c, depth, start, count, type) {
+    if (line !~ /^ *[A-Za-z].*,.*;/ || line ~ /^ *(using|typedef|template|return|for) /) return 0
+    at = match(line, /; +(\/\/|\/\*) /)
+    comment = at ? substr(line, at + 1) : ""
+    body = at ? substr(line, 1, at) : line
+    if (body !~ /;$/) return 0
+    start = 1
+    for (at = 1; at <= length(body); at++) {
+        c = substr(body, at, 1)
+        if (type == "" && !depth) {
+            if (c == "(") return 0  # a function
+            if (c ~ /[=,;{]/) {
+                type = substr(body, 1, at - 1)
+                sub(/[&*]*[A-Za-z_][A-Za-z_0-9]*(\[[^\]]*\])* *$/, "", type)
+            }
+        }
+        if (c == ")" && !depth) return 0  # the end of one
+        if (c ~ /[({[]/ || c == "<" && substr(body, at - 1, 1) ~ /[a-z]/) depth++
+        if (c ~ /[)}\]]/ || c == ">" && depth) depth--
+        if (c !~ /[,;]/ || depth) continue
+        piece[++count] = substr(body, start, at - start) ";" comment
+        if (count > 1) sub(/^ */, type, piece[count])
+        start = at + 1
+    }
+    return count > 1 ? count : 0
+}
+# A line that declares something, with the comment behind it.
+function declare(line,    at) {
+    about(line)
+    ended = line ~ /[;}]( *\/\/.*)?$/
+    at = match(line, / +\/\/ /)
+    if (at) line = substr(line, 1, at - 1) "  ///< " escaped(substr(line, at + RLENGTH))
+    sub(/; +\/\* /, "; /**< ", line)
+    print code(line)
+}
 /^[ \t]*\/\/ clang-format/ { next }
+# A list that goes on in the next line.
+/^ +static [A-Za-z:]+ &.*,$/ {
+    list = list $0
+    next
+}
+list {
+    sub(/^ +/, " ")
+    $0 = list $0
+    list = ""
+}
 /^template <class D> void / { next }  # bodies of what their classes declare
+/^extern template /, /;$/ { next }
+/= delete;$/ { next }
 /^[ \t]*\/\/( |$)/ {
     indent = text = $0
     sub(/\/\/.*/, "", indent)
     sub(/^[ \t]*\/\/ ?/, "", text)
     keep(escaped(text))
+    next
+}
+(count = declarations($0)) {
+    for (i = 1; i <= count; i++) declare(piece[i])
     next
 }
 {
@@ -101,7 +155,7 @@ heading && /\*\// {
 }
 /^\/\* / { said_in_c = "" }
 /^[ \t]*\/\* / { sub(/\/\* /, "/** ") }
-/[;,{}] +\/\* / { sub(/\/\* /, "/**< ") }
+/[;,{}0-9] +\/\* / { sub(/\/\* /, "/**< ") }
 /^\/\*\* /, /\*\// {
     said_in_c = said_in_c code($0) "\n"
     spoken = 0

@@ -244,8 +244,9 @@ std::vector<ShellCommand> Described(const CLI::App& app) {
     std::vector<ShellCommand> commands;
     for (const auto* command : app.get_subcommands({})) {
         commands.push_back({command->get_name(), command->get_description(), {}});
-        for (const auto* option : command->get_options())
-            commands.back().options.push_back(Described(*option));
+        auto& options = commands.back().options;
+        for (const auto* option : command->get_options()) options.push_back(Described(*option));
+        std::ranges::stable_partition(options, &ShellOption::isPlace);
     }
     return commands;
 }

@@ -19,6 +19,10 @@ double Up(const Axis& axis, double value) {
     return kHeight - kBottom - axis.Place(value) * (kHeight - kTop - kBottom);
 }
 
+std::string TickText(double tick) {
+    return std::abs(tick) < 1000 ? Number(tick, 3) : Number(tick / 1000, 3) + 'k';
+}
+
 }  // namespace
 
 double Axis::Place(double value) const {
@@ -31,19 +35,19 @@ std::string DrawChart(const Axis& across, const Axis& up, const std::vector<Curv
     Svg svg;
     for (const double tick : across.ticks) {
         svg.Line(Across(across, tick), kTop, Across(across, tick), kHeight - kBottom, "grid");
-        svg.Text(Across(across, tick), kHeight - kBottom + 17, Number(tick, 3), "middle", "tick");
+        svg.Text(Across(across, tick), kHeight - kBottom + 17, TickText(tick), "middle", "tick");
     }
     for (const double tick : up.ticks) {
         svg.Line(kLeft, Up(up, tick), kWidth - kRight, Up(up, tick), "grid");
-        svg.Text(kLeft - 6, Up(up, tick) + 4, Number(tick, 3), "end", "tick");
+        svg.Text(kLeft - 6, Up(up, tick) + 4, TickText(tick), "end", "tick");
     }
     svg.Text((kLeft + kWidth - kRight) / 2, kHeight - 8, across.title, "middle", "tick");
     svg.Text(4, 13, up.title, "start", "tick");
 
-    double legend = kWidth - kRight;
+    std::string legend;  // below the picture, where it wraps
     for (std::size_t i = curves.size(); i-- > 0;) {
         const auto& curve = curves[i];
-        const std::string colour = "curve colour" + std::to_string(i);
+        const std::string colour = "colour" + std::to_string(i);
         std::string points;
         bool inside = false;
         for (const auto& [x, y] : curve.points) {
@@ -53,14 +57,12 @@ std::string DrawChart(const Axis& across, const Axis& up, const std::vector<Curv
                 Number(Across(across, x), 2) + ',' + Number(Up(up, std::clamp(y, up.from, up.to)), 2) + ' ';
         }
         if (!inside) throw std::invalid_argument("the curve \"" + curve.label + "\" is not in the picture");
-        svg.Path(points, colour);
-        if (curve.label.empty()) continue;
-        svg.Text(legend, 13, curve.label, "end", "tick");
-        legend -= static_cast<double>(Characters(curve.label)) * 7.2 + 8;
-        svg.Line(legend - 20, 9, legend, 9, colour);
-        legend -= 34;
+        svg.Path(points, "curve " + colour);
+        if (!curve.label.empty())
+            legend.insert(0, "<span class=\"" + colour + "\">" + Escaped(curve.label) + "</span>\n");
     }
-    return svg.Figure(kWidth, kHeight, "chart", up.title + " over " + across.title);
+    if (!legend.empty()) legend = "<p class=\"legend\">\n" + legend + "</p>\n";
+    return svg.Figure(kWidth, kHeight, "chart", up.title + " over " + across.title) + legend;
 }
 
 }  // namespace docs

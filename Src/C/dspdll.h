@@ -28,6 +28,7 @@
 
 #if !defined(_WIN32)
 #define DSP_C_API __attribute__((visibility("default")))
+/* How functions are called; it means something in 32-bit programs on Windows only. */
 #define DSP_CALL
 #else
 #define DSP_CALL __cdecl
@@ -48,8 +49,9 @@ extern "C" {
 
 /* What every function that can fail returns. */
 typedef int32_t dsp_status;
+/* Its values. */
 enum {
-    DSP_OK = 0,
+    DSP_OK = 0,             /* done */
     DSP_NULL = 1,           /* a pointer or handle that must not be null is */
     DSP_CLOSED = 2,         /* the handle was closed, or never was one */
     DSP_OTHER_KIND = 3,     /* the handle is of another kind */
@@ -59,9 +61,9 @@ enum {
     DSP_NOT_UNDERSTOOD = 7, /* the text or the bytes mean nothing here */
     DSP_UNPREPARED = 8,     /* the object is not prepared for this call */
     DSP_UNSUPPORTED = 9,    /* the object cannot do this at all */
-    DSP_NO_MEMORY = 10,
-    DSP_BAD_RECORD = 11, /* a record's size is none that it ever had */
-    DSP_FAILED = 12      /* anything else; the dsp_error says what */
+    DSP_NO_MEMORY = 10,     /* there was none; the call may be repeated */
+    DSP_BAD_RECORD = 11,    /* a record's size is none that it ever had */
+    DSP_FAILED = 12         /* anything else; the dsp_error says what */
 };
 
 /* Where a function may write what went wrong. */
@@ -83,7 +85,7 @@ enum { DSP_S16 = 0, DSP_S24 = 1, DSP_F32 = 2, DSP_F64 = 3 };
 
 /* What blocks look like. */
 typedef struct dsp_format {
-    uint32_t size;
+    uint32_t size;      /* of this record, in bytes */
     int32_t rate;       /* Hz, above 0 */
     int32_t channels;   /* 1 or 2 */
     int32_t sample;     /* DSP_F32 or DSP_F64 */
@@ -99,6 +101,7 @@ typedef struct dsp_format {
  * effect.
  */
 
+/* One effect. */
 typedef struct dsp_effect dsp_effect;
 
 /* How many kinds there are, and their names, from 0. Constant; any thread. */
@@ -159,11 +162,12 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_sidechain_f64(dsp_effect* effect, int32
  * must neither wait nor throw. Null takes it away. Call dsp_effect_tempo_changed when it would answer
  * something new. */
 typedef struct dsp_tempo {
-    uint32_t size;
-    int32_t numerator, denominator;
-    int32_t reserved;
-    double bpm;
+    uint32_t size;                  /* of this record, in bytes */
+    int32_t numerator, denominator; /* of the time signature, each above 0 */
+    int32_t reserved;               /* 0 */
+    double bpm;                     /* beats a minute, above 0 */
 } dsp_tempo;
+/* What the host fills in when it is asked. */
 typedef void(DSP_CALL* dsp_tempo_callback)(void* user, dsp_tempo* tempo);
 /* `user` is handed to the callback as it is. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_tempo_callback(dsp_effect* effect, dsp_tempo_callback callback,
@@ -172,7 +176,7 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_tempo_callback(dsp_effect* effect, dsp_
 DSP_C_API dsp_status DSP_CALL dsp_effect_tempo_changed(dsp_effect* effect);
 
 /* Parameters are numbered from 0. Their values are normalised, 0 to 1; one may stand for a left/right pair.
- */
+ * Of these kinds they are: */
 enum { DSP_CONTINUOUS = 0, DSP_SWITCH = 1, DSP_LIST = 2 };
 enum {
     DSP_TEXT_NAME = 0,  /* what a control is called; both of a left/right pair have the same */
@@ -180,8 +184,9 @@ enum {
     DSP_TEXT_UNIT = 2,  /* may be empty */
     DSP_TEXT_VALUE = 3  /* the present value, unit included */
 };
+/* What a parameter is. */
 typedef struct dsp_parameter {
-    uint32_t size;
+    uint32_t size;   /* of this record, in bytes */
     int32_t kind;    /* DSP_CONTINUOUS, DSP_SWITCH or DSP_LIST */
     int32_t choices; /* of a switch or list */
     float neutral;   /* where a control rests */
@@ -213,9 +218,9 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_text_to_value(dsp_effect* effect, int32
 
 /* From `frame` of the stream on the parameter has this value, before its first point that of the first. */
 typedef struct dsp_point {
-    int64_t frame;
-    float value;
-    float reserved;
+    int64_t frame;  /* stream position */
+    float value;    /* 0 to 1 */
+    float reserved; /* 0 */
 } dsp_point;
 /* Replaces the automation of one parameter by `count` points, which are copied. They are in ascending order
  * and are met to the frame; 0 points end the automation. DSP_UNSUPPORTED where the effect plays none. */
@@ -241,7 +246,9 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_set_state(dsp_effect* effect, const voi
  *
  * Up to 20 bands. One thread. */
 
+/* One equaliser. */
 typedef struct dsp_equaliser dsp_equaliser;
+/* Types of bands. */
 enum {
     DSP_HIGHPASS = 0,
     DSP_HIGHSHELF_BUTTERWORTH = 1,
@@ -251,14 +258,15 @@ enum {
     DSP_HIGHSHELF = 5,
     DSP_LOWSHELF = 6
 };
+/* One band. */
 typedef struct dsp_band {
-    uint32_t size;
+    uint32_t size;     /* of this record, in bytes */
     int32_t type;      /* DSP_HIGHPASS to DSP_LOWSHELF */
     int32_t frequency; /* Hz, 1 to 1000000; limited to below half the rate where it is not a peak's */
     int32_t q; /* 1 to 100000; a peak is q/133 octaves wide, shelves slope and passes resonate with q/50 */
-    int32_t bypass; /* other than 0: the band is left out */
-    int32_t reserved;
-    double gain; /* dB in tenths, -100 to 100 */
+    int32_t bypass;   /* other than 0: the band is left out */
+    int32_t reserved; /* 0 */
+    double gain;      /* dB in tenths, -100 to 100 */
 } dsp_band;
 /* Without bands, not prepared. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_create(dsp_equaliser** equaliser, dsp_error* error);
@@ -293,14 +301,18 @@ DSP_C_API dsp_status DSP_CALL dsp_equaliser_response(dsp_equaliser* equaliser, c
  * Sample rate and sample format; frame n of the output stands where n * in_rate / out_rate of the input
  * stood. One thread. */
 
+/* One conversion under way. */
 typedef struct dsp_converter dsp_converter;
+/* No dither, white noise, and noise moved to where the ear hears less of it, a little and as far as it goes.
+ */
 enum { DSP_DITHER_NONE = 0, DSP_DITHER_FLAT = 1, DSP_DITHER_GENTLE = 2, DSP_DITHER_STRONG = 3 };
+/* What is converted into what. */
 typedef struct dsp_conversion {
-    uint32_t size;
-    int32_t in_rate, out_rate; /* 1000 to 768000 Hz */
-    int32_t channels;          /* 1 to 48, interleaved */
-    int32_t in_sample, out_sample;
-    int32_t dither;  /* for DSP_S16 and DSP_S24 */
+    uint32_t size;                 /* of this record, in bytes */
+    int32_t in_rate, out_rate;     /* 1000 to 768000 Hz */
+    int32_t channels;              /* 1 to 48, interleaved */
+    int32_t in_sample, out_sample; /* DSP_S16 to DSP_F64 */
+    int32_t dither;                /* DSP_DITHER_..., for DSP_S16 and DSP_S24 */
     int32_t nearest; /* 1: small factors, quicker, refused where they miss the rate by over 20 cents */
 } dsp_conversion;
 /* Ready for the first block. DSP_OUT_OF_RANGE, with a sentence, for what it cannot convert. */
@@ -323,15 +335,18 @@ DSP_C_API dsp_status DSP_CALL dsp_converter_finish(dsp_converter* converter, voi
  *
  * Aligned and, but for the speed, as long as they were. One thread; it allocates as it goes. */
 
+/* One recording under way. */
 typedef struct dsp_pitch_shift dsp_pitch_shift;
+/* Classic works in frames of a fixed length; new lays pieces of the sound where they fit best. */
 enum { DSP_ENGINE_CLASSIC = 0, DSP_ENGINE_NEW = 1 };
+/* What is done to it. */
 typedef struct dsp_shift {
-    uint32_t size;
+    uint32_t size;    /* of this record, in bytes */
     int32_t rate;     /* 1000 to 768000 Hz */
     int32_t channels; /* 1 or 2, interleaved */
-    int32_t engine;
-    int32_t quality; /* from 0, fastest first */
-    int32_t reserved;
+    int32_t engine;   /* DSP_ENGINE_... */
+    int32_t quality;  /* from 0, fastest first */
+    int32_t reserved; /* 0 */
     double semitones; /* -36 to 36 */
     double speed;     /* 0.1 to 10, 1 for DSP_ENGINE_CLASSIC; 0 counts as 1 */
 } dsp_shift;
@@ -355,6 +370,7 @@ DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_take(dsp_pitch_shift* pitch_shift,
  * and imaginary part of bins 1, 2, ... Complex: `length` points, real and imaginary parts in turn. Forward is
  * unscaled, inverse scaled by 1/length. */
 
+/* Transforms of one length. */
 typedef struct dsp_transform dsp_transform;
 /* Of `length` real values or, where `complex_points` is not 0, as many points. All memory is made here. */
 DSP_C_API dsp_status DSP_CALL dsp_transform_create(int32_t length, int32_t complex_points,
@@ -368,6 +384,7 @@ DSP_C_API dsp_status DSP_CALL dsp_transform_f64(dsp_transform* transform, double
  * Feed belongs to the audio thread, all else to the display thread. A command reaches every analyser of the
  * process: give it on the display thread, or while none is refreshed, read or drawn. */
 
+/* One analyser, with its tuner and its sonogram. */
 typedef struct dsp_analyser dsp_analyser;
 /* For sound of `rate` Hz, above 0; on, its tuner off. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, dsp_error* error);
@@ -409,8 +426,9 @@ DSP_C_API dsp_status DSP_CALL dsp_analyser_command(dsp_analyser* analyser, int32
 DSP_C_API dsp_status DSP_CALL dsp_analyser_is_checked(dsp_analyser* analyser, int32_t command,
                                                       int32_t* checked);
 
+/* What a tuner shows. */
 typedef struct dsp_tuner_reading {
-    uint32_t size;
+    uint32_t size;     /* of this record, in bytes */
     int32_t note;      /* 0 A to 11 G#; -1 for none, and then the rest is 0 */
     int32_t octave;    /* changes at C: 440 Hz is the A of octave 4 */
     int32_t centred;   /* within the cents that count as tuned */

@@ -10,22 +10,24 @@
 
 namespace Corvo {
 
+// What something is drawn with.
 struct Ink {
-    ColourReference colour;
+    ColourReference colour;      // red in the low byte
     std::uint8_t opacity = 255;  // 0 clear .. 255
 };
 
 // A line of `width` pixels along a path; joins and ends are round.
 struct Stroke {
-    Ink ink;
-    float width;
+    Ink ink;      // of the line
+    float width;  // pixels, above 0
 };
 
+// Which part of a text stands at its place.
 enum class TextAlign { Left, Centre, Right };
 
 // Of one line of text, in pixels. Ascent and descent are the font's, above and below the baseline.
 struct TextMetrics {
-    float width, ascent, descent;
+    float width, ascent, descent;  // each 0 or above
 };
 
 // Height of capitals and digits as a share of the text's size; close enough for every plain sans-serif.
@@ -37,7 +39,8 @@ constexpr float kCapHeight = 0.7f;
 // Coordinates are device pixels, x to the right, y down; whole numbers are pixel edges. Edges are smoothed,
 // and what lies outside the clip is left alone. Text is UTF-8 without line breaks, cut after the last whole
 // character of 95 bytes; `size` is its em in pixels. A size, width or rectangle that is empty, not a number
-// or beyond 32767 draws nothing. Used on the thread that draws; nothing is kept of the arguments.
+// or beyond 32767 draws nothing. Used on the thread that draws, where drawing may allocate and throw
+// std::bad_alloc; nothing is kept of the arguments.
 class DSP_API DrawTarget {
 public:
     // `dpi` is the surface's dots per inch; what is not above 0 counts as 96.

@@ -7,12 +7,12 @@
 
 namespace Corvo {
 
-// A brush or pen of a back-end. The object is the back-end's own; null when it could not be made.
+// A brush or pen of a back-end.
 struct DrawingBrush {
-    void* object = nullptr;
+    void* object = nullptr;  // the back-end's own; null when it could not be made
 };
 struct DrawingPen {
-    void* object = nullptr;
+    void* object = nullptr;  // the same
 };
 
 // What every drawing back-end can do with its resources. Used on the thread that draws.

@@ -10,8 +10,8 @@ namespace Corvo {
 // either the system's plain sans-serif stands in.
 class DSP_API DrawingFont {
 public:
-    static constexpr const char* kFamily = "Montserrat";
-    static constexpr const char* kFace = "Montserrat-Regular";
+    static constexpr const char* kFamily = "Montserrat";        // as systems list it
+    static constexpr const char* kFace = "Montserrat-Regular";  // its one weight that is used
 
     // The typeface's file, a path in UTF-8, for back-ends made from now on; empty for the installed one. A
     // file that cannot be read is as none. Any thread.

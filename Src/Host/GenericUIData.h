@@ -5,7 +5,7 @@
 
 // One pad of the host's XY editor: the parameters that its two axes move.
 struct PluginParamXYGroupInfo {
-    std::string name;
+    std::string name;         // its title
     int index = 0;            // which of the effect's groups this is, from 0
     std::vector<int> x_axis;  // real parameter indices moved along x
     std::vector<int> y_axis;  // and along y
@@ -13,6 +13,6 @@ struct PluginParamXYGroupInfo {
 
 // The XY editor's data, filled by CorvoEffectBase::InitializeXyEditingData.
 struct GenericUIData {
-    std::vector<PluginParamXYGroupInfo> groups;
-    std::vector<std::string> entries;  // names under which presets are shown in the editor
+    std::vector<PluginParamXYGroupInfo> groups;  // the pads, in order
+    std::vector<std::string> entries;            // names under which presets are shown in the editor
 };

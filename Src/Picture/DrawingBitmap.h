@@ -17,10 +17,10 @@ struct DrawingBitmap {
     // 256 MiB, more than any screen: what a request beyond it is cut to.
     static constexpr int kLargestSide = 16384, kMostPixels = 1 << 26;
 
-    int width = 0, height = 0;
+    int width = 0, height = 0;          // pixels, as Size made them
     std::vector<std::uint32_t> pixels;  // width * height
     bool opaque = false;                // the top byte is no alpha and may hold anything
-    std::uint32_t version = 0;
+    std::uint32_t version = 0;          // another one after every Changed()
 
     // The pixels' values are then unspecified, unless the size is what it was. Memory grows where it must and
     // is kept when the picture shrinks. Negative sides count as 0; rows that the limits leave no room for are

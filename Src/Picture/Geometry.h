@@ -4,10 +4,10 @@ namespace Corvo {
 
 // In pixels, y downwards.
 struct PointF {
-    float x, y;
+    float x, y;  // whole numbers are edges of pixels
 };
 struct RectF {
-    float x, y, width, height;
+    float x, y, width, height;  // x and y of the upper left corner
 };
 
 // The left and upper edges belong to a rectangle.

@@ -15,7 +15,7 @@ namespace Corvo {
 struct AnalyserMenuEntry {
     int command;        // 1200..1402, each once
     const char* group;  // plain ASCII, English; entries of a group stand together
-    const char* text;
+    const char* text;   // the entry's, in the same English
 
     // How the library carries it out; not for hosts.
     struct Action;
@@ -23,6 +23,7 @@ struct AnalyserMenuEntry {
     int value;
 };
 
+// Every entry, in the order of the menu.
 DSP_API std::span<const AnalyserMenuEntry> AnalyserMenu();
 // Null when the command is none of the table's.
 DSP_API const AnalyserMenuEntry* FindAnalyserMenuEntry(int command);

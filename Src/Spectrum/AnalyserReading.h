@@ -4,14 +4,15 @@ namespace Corvo {
 
 // A stretch of the frequency axis, Hz.
 struct FrequencySpan {
-    double lowest = 0.0, highest = 0.0;
+    double lowest = 0.0, highest = 0.0;  // its ends
     bool operator==(const FrequencySpan&) const = default;
 };
 
 // What a place in an analyser's picture stands for.
 struct AnalyserReading {
+    // The picture that has the place; None between the pictures, where all else is 0.
     enum class Plot { None, Spectrum, Sonogram };
-    Plot plot = Plot::None;
+    Plot plot = Plot::None;  // where the place is
     double frequency = 0.0;  // Hz
     double level = 0.0;      // in the spectrum of its scale's unit, in the sonogram dB below full scale
     double seconds = 0.0;    // in the sonogram: what its timeline says there

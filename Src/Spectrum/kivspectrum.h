@@ -31,10 +31,13 @@ struct RectF;
 // buffers hold. Menu commands and switches may come from any thread; a class-wide lock in front of the
 // analysers' own keeps them apart, and nobody holds up the audio thread. Drawing on another thread than the
 // menu's: do not read the buffers while a command runs.
+//
+// Cost: Feed copies one value per frame. A refresh transforms and smooths when new samples came, in time
+// proportional to n log n of the transform's length n; it allocates after a change of the settings.
 class DSP_API kivspectrum : public Corvo::SpectrumDisplay {
 public:
-    using spectrum_settings = Corvo::SpectrumSettings;
-    static constexpr int window_types_num = Corvo::kWindowTypes;
+    using spectrum_settings = Corvo::SpectrumSettings;            // what a host stores
+    static constexpr int window_types_num = Corvo::kWindowTypes;  // shapes of windows to choose from
 
     // Four of the tuner panel's images, nearest the centre first.
     using BarItems = std::array<Corvo::DrawingBitmap*, 4>;
@@ -68,6 +71,7 @@ public:
     static Corvo::DrawingBitmap &tunerBarItem_Minimized_Base_00_R, &tunerBarItem_Minimized_Base_01_R,
                                 &tunerBarItem_Minimized_Base_02_R, &tunerBarItem_Minimized_Base_03_R;
     // clang-format on
+    // The images above, four and four.
     static const BarItems leftItems, rightItems, baseItems_L, baseItems_R;
     static const BarItems leftItemsMinimized, rightItemsMinimized, baseItemsMinimized_L, baseItemsMinimized_R;
     // Arrows that point to where the note has to go.

@@ -16,9 +16,10 @@ namespace Corvo::DSP {
 // sides of a pair. Empty when there is none.
 DSP_API std::vector<int> FindParameters(CorvoEffectBase& effect, std::string_view name);
 
+// What a text means.
 struct ParameterInput {
-    float normalised;
-    bool limited;  // the number was beyond the range
+    float normalised;  // 0..1
+    bool limited;      // the number was beyond the range
 };
 
 // The value that `text` means for an external parameter that the effect has: a choice of a list or switch, or

@@ -9,9 +9,9 @@ namespace Corvo::DSP {
 // How a gliding value approaches its target, one step per sample: 0.09 % of the way first, then a tenth of
 // that, growing to about 1.3 % a sample near the end, where the value snaps to the target.
 struct AudioParameterProgressAlternate {
-    static constexpr double kTiny = 1e-14f;  // of single precision: 9.9999998245167e-15
-    static constexpr double kFirstRate = 0.0009;
-    static constexpr double kArrived = 0.01;
+    static constexpr double kTiny = 1e-14f;       // of single precision: 9.9999998245167e-15
+    static constexpr double kFirstRate = 0.0009;  // the share of the way that the first step covers
+    static constexpr double kArrived = 0.01;      // with less than this share left the value snaps
 
     // The share of the remaining way that a step covers: 9e-5 * exp(5 * (1 - rel)), to 1.1e-11 relative for
     // `rel` in 0..1. The polynomial is the 64th root of that; squared six times it costs a fraction of a
@@ -46,10 +46,10 @@ struct AudioParameterProgressAlternate {
 // A value that glides to its target.
 template <typename T, typename Progress>
 struct AudioParameter {
-    T value{};   // in use now
-    T start{};   // where the glide began
-    T target{};  // where it leads
-    bool moving = false;
+    T value{};            // in use now
+    T start{};            // where the glide began
+    T target{};           // where it leads
+    bool moving = false;  // a glide is on its way
 
     // Begins a glide, even to where the value is already.
     void SetTarget(T newTarget) {
@@ -72,11 +72,11 @@ struct AudioParameter {
 // the counter before anything else; it must outlive the value. It never falls below 0.
 template <typename T, typename Progress>
 struct AudioParameterManaged {
-    T value{};
-    T start{};
-    T target{};
-    bool moving = false;
-    std::int32_t* counter = nullptr;
+    T value{};                        // in use now
+    T start{};                        // where the glide began
+    T target{};                       // where it leads
+    bool moving = false;              // a glide is on its way
+    std::int32_t* counter = nullptr;  // the processor's; not owned
 
     // Begins a glide if the target is news.
     void SetTarget(T newTarget) {

@@ -10,9 +10,10 @@ namespace Corvo::DSP {
 // w = x - a1*w1 - a2*w2, y = b0*w + b1*w1 + b2*w2.
 template <typename Parameter>
 struct coeff {
-    Parameter b0, b1, b2, a1, a2;
+    Parameter b0, b1, b2, a1, a2;  // what the line above multiplies by
 };
 
+// Coefficients that glide; those of an equaliser are counted while they do.
 using SmoothCoefficient = AudioParameter<double, AudioParameterProgressAlternate>;
 using ManagedCoefficient = AudioParameterManaged<double, AudioParameterProgressAlternate>;
 

@@ -36,12 +36,12 @@ static_assert(sizeof(_eq_data) == 16);
 // The setting of a whole equaliser, which the host owns, edits and hands to ParEQ.
 //
 // Band indices count from 0 and are trusted to be below kMaxBands. Listeners are told synchronously, inside
-// the setter. Copies clone the listeners. One thread at a time; no locks.
+// the setter. Copies clone the listeners, which allocates; nothing else does. One thread at a time; no locks.
 class DSP_API builtin_effects_data {
 public:
-    static constexpr int kMaxBands = 20;
+    static constexpr int kMaxBands = 20;         // that the record has room for
     using BandChain = EqNotificationChain<int>;  // told the band's index
-    using Chain = EqNotificationChain<>;
+    using Chain = EqNotificationChain<>;         // told that something changed
 
     // No listeners; otherwise as defaults() leaves it, with every further band a flat peak.
     builtin_effects_data();
@@ -90,11 +90,12 @@ public:
     void SetPhaseShift(bool on) { phaseShift = on ? 1 : 0; }
     bool GetPhaseShift() const { return phaseShift != 0; }
 
-    std::array<_eq_data, kMaxBands> bands;
-    std::int32_t numBands = 3;
-    std::array<std::int32_t, 4> reserved{};
-    std::uint8_t phaseShift = 0;
-    std::int32_t reserved_word = 0;  // copied with the record, used by nothing here
+    std::array<_eq_data, kMaxBands> bands;   // of which the first `numBands` count
+    std::int32_t numBands = 3;               // as SetNumBands had it
+    std::array<std::int32_t, 4> reserved{};  // copied with the record; defaults() clears it
+    std::uint8_t phaseShift = 0;             // 1: inverted polarity
+    std::int32_t reserved_word = 0;          // copied with the record, used by nothing here
+    // Who is told of what; the setters above say when.
     BandChain Q_changed;
     BandChain freq_changed;
     BandChain boost_changed;

@@ -30,7 +30,7 @@ private:
 template <typename... Args>
 class EqNotificationChain {
 public:
-    using Listener = EqListener<Args...>;
+    using Listener = EqListener<Args...>;  // who is told
 
     EqNotificationChain() = default;
     // A clone of every listener, in the same order.

@@ -18,8 +18,10 @@ struct EqChannel;
 // to new values after every edit.
 //
 // Construct, Cook, then process; Cook again whenever the settings or the rate change. No latency, and the
-// output does not depend on how the stream is cut into blocks. Processing never allocates or locks. Samples
-// that are not finite count as 0.
+// output does not depend on how the stream is cut into blocks. Processing never allocates or locks; it costs
+// about 1 ns per band and stereo frame, some 20 ns while the band glides. Samples that are not finite count
+// as 0.
+//
 // Threads: the host keeps Cook, Resize, GetSpectrum and processing of one object apart.
 class DSP_API ParEQ {
 public:

@@ -17,14 +17,16 @@ namespace Corvo::DSP {
 // Allocates as it goes: for offline use. One thread at a time.
 class DSP_API OfflinePitchShift {
 public:
-    enum class Engine { Classic, New };  // as in PitchAdapterInfo::GetPitchAdapters()
+    // As in PitchAdapterInfo::GetPitchAdapters().
+    enum class Engine { Classic, New };
+    // What is done to the recording.
     struct Settings {
-        int rate = 48000;        // Hz, 1000..768000; above 192000 it counts as that
-        int channels = 2;        // 1 or 2
-        double semitones = 0.0;  // -36..36
-        Engine engine = Engine::New;
-        int quality = 0;     // from 0, fastest first: PitchAdapterInfo::GetQualities
-        double speed = 1.0;  // 0.1..10, for New only: how fast it plays, pitch along with it
+        int rate = 48000;             // Hz, 1000..768000; above 192000 it counts as that
+        int channels = 2;             // 1 or 2
+        double semitones = 0.0;       // -36..36
+        Engine engine = Engine::New;  // which back-end does the work
+        int quality = 0;              // from 0, fastest first: PitchAdapterInfo::GetQualities
+        double speed = 1.0;           // 0.1..10, for New only: how fast it plays, pitch along with it
     };
 
     // Throws std::invalid_argument with a sentence for settings outside their ranges.

@@ -11,7 +11,7 @@ namespace Corvo::DSP {
 // Describes one pitch-shift back-end. The library's two are statics that live as long as it does.
 class DSP_API PitchAdapterInfo {
 public:
-    static constexpr int kCount = 2;
+    static constexpr int kCount = 2;            // of the library's own
     static PitchAdapterInfo* const OldCorvo;    // "Classic"
     static PitchAdapterInfo* const SoundTouch;  // "New"
 
@@ -96,7 +96,7 @@ public:
     void SetTranspose(float semitones);
 
 protected:
-    std::int32_t m_channels = 0;
+    std::int32_t m_channels = 0;  // as set; 0 before
 };
 
 // Library-wide length of the short fader; adapters made afterwards take it.

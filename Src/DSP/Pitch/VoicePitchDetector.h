@@ -10,6 +10,7 @@ namespace Corvo::DSP {
 
 class VoicePitchAnalysis;
 
+// What to listen for.
 struct VoicePitchSettings {
     double rate = 48000.0;      // Hz, limited to 1000..768000
     double lowestHz = 75.0;     // limited to 20..1000; the delay grows with its period
@@ -28,7 +29,7 @@ struct VoicePitchFrame {
 
 // A period that the frame could have.
 struct VoicePitchCandidate {
-    double hz;
+    double hz;  // one over the period
     // Up to about 1.7: the peak of the normalised autocorrelation, plus that of the autocorrelation of the
     // flattened spectrum less 0.3.
     double value;

@@ -13,13 +13,14 @@ enum class StoredSample : int { Int16, Int24, Float, Double };
 // the other.
 //
 // Construct, Convert block by block, then Finish until it returns 0. One thread at a time; Convert and
-// Finish neither allocate nor throw.
+// Finish neither allocate nor throw, and take some nanoseconds a frame.
 class DSP_API AlignedConverter {
 public:
+    // What is converted into what.
     struct Settings {
-        int inRate = 48000, outRate = 48000;  // Hz, 1000..768000
-        int channels = 2;                     // 1..48
-        StoredSample in = StoredSample::Double, out = StoredSample::Double;
+        int inRate = 48000, outRate = 48000;                                 // Hz, 1000..768000
+        int channels = 2;                                                    // 1..48
+        StoredSample in = StoredSample::Double, out = StoredSample::Double;  // in the buffers
         // Any ratio of whole numbers. Else the nearest with factors up to 49, which is quicker where the
         // exact ones are large, but may miss the rate: compare Up() / Down().
         bool exact = true;

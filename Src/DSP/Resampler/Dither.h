@@ -5,26 +5,28 @@
 #include "Platform/Export.h"
 
 // One channel's dither in front of a word-length reduction. The converter reads the set-up and keeps the
-// running state here; MakeDither fills one.
+// running state here; MakeDither fills one. One thread at a time; nothing here allocates.
 template <typename T>
 struct CDither {
-    static constexpr int kMaxOrder = 16;
+    static constexpr int kMaxOrder = 16;  // coefficients of the noise shaping
 
-    bool enabled = false;
-    bool noiseShaping = false;
-    T amplitude = 0;       // of one step of the random numbers' sum
-    int shapingOrder = 0;  // 0..kMaxOrder; more counts as kMaxOrder
+    bool enabled = false;       // else samples pass as they are
+    bool noiseShaping = false;  // the coefficients are used
+    T amplitude = 0;            // of one step of the random numbers' sum
+    int shapingOrder = 0;       // 0..kMaxOrder; more counts as kMaxOrder
     // The error made k + 1 samples ago is fed back with coefficients[k]: quantisation noise is shaped by
     // 1 + sum of coefficients[k] z^-(k+1).
     std::array<T, kMaxOrder> coefficients{};
     std::array<T, kMaxOrder> quantisedHistory{};  // newest first
     std::array<T, kMaxOrder> shapedHistory{};     // newest first
     int scale = 1;                                // quantisation steps per unit
-    T lastShaped = 0;
-    T lastQuantised = 0;
+    T lastShaped = 0;                             // in front of the dither
+    T lastQuantised = 0;                          // behind it: what was given out
 };
 
+// How a recording's words are shortened.
 enum class DitherCurve {
+    // Rounded towards zero, without noise.
     None,
     // Triangular noise of two steps, white: S. P. Lipshitz, R. A. Wannamaker and J. Vanderkooy, "Quantization
     // and Dither: A Theoretical Survey", J. Audio Eng. Soc. 40 (1992).

@@ -14,8 +14,8 @@
 // range; NaN is written as 0.
 template <int Bits>
 struct IntegerSample {
-    static constexpr int kBytes = Bits / 8;
-    static constexpr double kScale = static_cast<double>(1 << (Bits - 1));
+    static constexpr int kBytes = Bits / 8;                                 // of one sample
+    static constexpr double kScale = static_cast<double>(1 << (Bits - 1));  // steps from 0 to full scale
 
     // One sample at any address.
     static double Read(const char* sample) {
@@ -36,8 +36,8 @@ struct IntegerSample {
 // Full scale is -1..1; nothing is clipped.
 template <typename Float>
 struct FloatSample {
-    using Value = Float;
-    static constexpr int kBytes = sizeof(Float);
+    using Value = Float;                          // how a sample is stored
+    static constexpr int kBytes = sizeof(Float);  // of one sample
 
     // One sample at any address.
     static double Read(const char* sample) {
@@ -52,11 +52,13 @@ struct FloatSample {
     }
 };
 
+// What the converter reads ...
 struct DSP_API tipo_16bit : IntegerSample<16> {};
 struct DSP_API tipo_24bit : IntegerSample<24> {};
 struct DSP_API tipo_floatbit : FloatSample<float> {};
 struct DSP_API tipo_doublebit : FloatSample<double> {};
 
+// ... and what it writes.
 struct DSP_API tipo_16bit_outd : IntegerSample<16> {};
 struct DSP_API tipo_24bit_outd : IntegerSample<24> {};
 struct DSP_API tipo_floatbit_outd : FloatSample<float> {};

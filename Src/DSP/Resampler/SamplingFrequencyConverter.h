@@ -29,9 +29,9 @@ struct PolePairLowPass;
 //
 // Threads: an object belongs to one thread at a time. Initialisers and Init allocate, blocks never do.
 struct DSP_API SamplingFrequencyConverter {
-    static constexpr int kMaxChannels = 48;
-    static constexpr int kMaxOrder = 40;
-    static constexpr int kOrder = 10;
+    static constexpr int kMaxChannels = 48;  // of a stream
+    static constexpr int kMaxOrder = 40;     // that a history has room for
+    static constexpr int kOrder = 10;        // of the low-pass
     // Each step of the raised rate takes 192 bytes of tables, which must fit a 32-bit address space.
     static constexpr int kMaxFactor = 0x7FFFFFFF / 256;
 
@@ -83,13 +83,14 @@ struct DSP_API SamplingFrequencyConverter {
     int up = 0;    // L
     int down = 0;  // M
 
+    // The low-pass in direct form: how many coefficients count, and what its input is divided by.
     struct LowPass {
-        int poles = 0, zeros = 0;
-        double gain = 0.0;
+        int poles = 0, zeros = 0;  // at most kMaxOrder
+        double gain = 0.0;         // of the coefficients below at 0 Hz, divided by L
         // Of z^0, z^1, ...; the feedback ones are negated.
         double feedForward[kMaxOrder + 1]{};
         double feedback[kMaxOrder + 1]{};
-    } lowPass;
+    } lowPass;  // of the factors last taken
 
     // Inputs divided by the gain, and outputs, at the raised rate. The initialisers clear channels 0 and 1.
     double inputHistory[kMaxChannels][kMaxOrder + 1]{};

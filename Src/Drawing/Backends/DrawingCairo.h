@@ -9,6 +9,7 @@
 #include "Drawing/Views/Views.h"
 #include "Platform/Export.h"
 
+// As cairo.h has it, so that this header needs none.
 using cairo_t = struct _cairo;
 
 namespace Corvo {

@@ -13,13 +13,14 @@ namespace Corvo {
 
 // Between bins, and what a sine there would have: dB below full scale.
 struct SpectrumPeak {
-    double frequency, level;
+    double frequency, level;  // Hz; dB
 };
 
 }  // namespace Corvo
 
 // Turns the power spectra of one analyser into the curve that is drawn: smooths them over time and keeps a
-// memory of their peaks. Used on the display side of its analyser, which lends its lock.
+// memory of their peaks. Used on the display side of its analyser, which lends its lock. A curve costs a pass
+// over the bins; memory is made where the settings or a larger rectangle need it.
 class DSP_API SpectrumDrawer {
 public:
     // Without buffers until Allocate.

@@ -6,7 +6,8 @@
 #include "Platform/Export.h"
 
 // A moving average over the last few spectra: a ring of spectra and a weight for every age. The weights are a
-// raised cosine, the same forwards and backwards, and sum to 1.
+// raised cosine, the same forwards and backwards, and sum to 1. One thread at a time. Resize allocates;
+// Average passes over all spectra.
 class DSP_API VectorInterpolationFilterFloat {
 public:
     VectorInterpolationFilterFloat();

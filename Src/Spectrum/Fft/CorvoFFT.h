@@ -3,9 +3,10 @@
 #include "Platform/Export.h"
 
 namespace Corvo::Fft {
+// The tables of one length.
 template <typename T>
 struct Plan;
-}
+}  // namespace Corvo::Fft
 
 // Fast Fourier transforms of one length: forward and inverse, real and complex, float and double, in place
 // and out of place. Forward transforms are unscaled, inverse ones scaled by 1/N.
@@ -15,7 +16,8 @@ struct Plan;
 // values holds the real parts of bin 0 and of bin N/2 at positions 0 and 1, then bin k's real part at 2k and
 // its imaginary part at 2k + 1. The split form holds position 2k in re[k] and position 2k + 1 in im[k].
 //
-// All memory is obtained by Allocate and AllocateReal; no transform allocates. A transform that was not built
+// All memory is obtained by Allocate and AllocateReal; no transform allocates, and each takes time
+// proportional to N log N. A transform that was not built
 // does nothing. One thread uses an object at a time; two objects may run on two threads. The `int` arguments
 // without a name are not used.
 class DSP_API CorvoFFT {

@@ -5,7 +5,8 @@
 #include "Spectrum/Scales/SpectrumScales.h"
 
 // Maps frequencies (Hz) to x and levels to y within a rectangle, and back. A level is in the scale's own
-// unit: decibels below full scale, or power or amplitude as a fraction of it.
+// unit: decibels below full scale, or power or amplitude as a fraction of it. Never changes once made,
+// allocates nothing, and serves any thread.
 class DSP_API CoordinatesAndFrequencies {
 public:
     // `lowest` and `highest` are at the left and right edge. Scales other than linear and mel begin at 1 Hz

@@ -5,7 +5,7 @@
 
 namespace Corvo {
 
-// What the display fields of the settings record mean.
+// What the display fields of the settings record mean. Any thread, at no cost.
 
 // view_option_a. Automatic is logarithmic, and linear over less than two octaves. The bands collect the power
 // of their bins around the centres 1000 Hz * 2^n and 2^(n/3).

@@ -35,6 +35,7 @@ public:
     virtual void NoteChanged(bool present) = 0;
 };
 
+// A note with its octave.
 struct TunedNote {
     int note = -1;   // 0 A .. 11 G#; negative for none
     int octave = 0;  // changes at C: 440 Hz is the A of octave 4
@@ -50,6 +51,8 @@ struct TunedNote {
 // A pitch below some 6 bins of the window (6 sampling rate / window length: 32 Hz with 8192 samples at
 // 44.1 kHz, 70 Hz at 96 kHz) cannot be told apart from its overtones, whatever the sensitivity allows; lower
 // ones want a longer window.
+//
+// Cost: an analysis passes over the spectrum a few times. Everything else only reads or stores a value.
 class DSP_API Tuner {
 public:
     // Silent, with the sensitivity "Standard".

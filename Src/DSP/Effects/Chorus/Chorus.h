@@ -12,12 +12,14 @@ namespace ChorusPrivate {
 
 // The settings, the chunk after its first word, and a row of the preset table; pairs are left, right.
 struct _transform_props {
+    // Left, right.
     using Pair = std::array<std::int32_t, 2>;
     Pair frequency;  // of the sweep, 0..300 hundredths of a hertz
     Pair delay;      // the longest, 0..10000 tenths of a millisecond
     Pair wet;        // -960..100 tenths of dB, silent at -960
     Pair dry;        // -960..100 tenths of dB, silent at -960
     Pair depth;      // 0..1000 thousandths of the delay
+    // Kept.
     std::array<std::int32_t, 12> reserved;
 };
 static_assert(sizeof(_transform_props) == 88);

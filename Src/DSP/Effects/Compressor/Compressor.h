@@ -19,10 +19,11 @@ struct TRANSFORM_PARAMETERS {
     std::array<Word, 15> reserved{};          // kept
 };
 
+// All settings of a compressor.
 template <typename Word>
 struct TTRANSFORM_PROPS {
-    TRANSFORM_PARAMETERS<Word> parameters;
-    CompMapStereo map;
+    TRANSFORM_PARAMETERS<Word> parameters;  // everything but the curves
+    CompMapStereo map;                      // the curves
 };
 
 // Which channel's curve the host's editor edits.
@@ -64,6 +65,7 @@ struct CoreState;
 // frees. Automation edits the audio thread's copy, and changed curves travel back.
 class DSP_API Compressor : public CorvoEffect {
 public:
+    // The records in today's layout.
     using Parameters = CompressorPrivate::TRANSFORM_PARAMETERS<std::int32_t>;
     using Settings = CompressorPrivate::TTRANSFORM_PROPS<std::int32_t>;
     using CompMapStereo = CompressorPrivate::CompMapStereo;

@@ -12,12 +12,13 @@ namespace Corvo::DSP::CompressorPrivate {
 constexpr std::int32_t kNotSet = -9999;
 
 constexpr std::int32_t kLowestThreshold = -800, kHighestThreshold = -10;  // tenths of a decibel
+// From no compression to a limiter.
 constexpr std::int32_t kRatioSteps = 251;
 
 // Output level y that belongs to input level x, both linear amplitudes, and the slope of the straight
 // segment to the next point.
 struct CurvePoint {
-    float x, y, slope;
+    float x, y, slope;  // x and y in 0..1
 };
 
 // One channel's transfer curve: points in ascending x from (0, 0) to x = 1, joined by straight segments.
@@ -32,10 +33,10 @@ struct CurvePoint {
 //
 // Operations allocate nothing and run on either thread, on that thread's own curve.
 struct DSP_API TransferCurve {
-    static constexpr std::size_t kMaxPoints = 666;
+    static constexpr std::size_t kMaxPoints = 666;  // of a curve
 
-    std::array<CurvePoint, kMaxPoints> points{};
-    std::int32_t count = 0;
+    std::array<CurvePoint, kMaxPoints> points{};  // of which the first `count` are in use
+    std::int32_t count = 0;                       // 0..kMaxPoints
 
     // The points in use.
     const CurvePoint* begin() const;
@@ -77,15 +78,16 @@ double KneeRamp(double distance, double width);
 
 // The curves of both channels and the edits last made to them.
 struct CompMapStereo {
-    std::array<TransferCurve, 2> m_comp_map;
-    std::array<std::int32_t, 2> reserved{};  // kept for whoever wrote them
-    std::int32_t last_threshold = kNotSet;   // tenths of a decibel
-    std::int32_t last_ratio_step = kNotSet;
+    std::array<TransferCurve, 2> m_comp_map;  // left, right
+    std::array<std::int32_t, 2> reserved{};   // kept for whoever wrote them
+    std::int32_t last_threshold = kNotSet;    // tenths of a decibel
+    std::int32_t last_ratio_step = kNotSet;   // 0..kRatioSteps
 };
 
 // The largest level that reads as `tenths` of a decibel when its decibels are truncated.
 DSP_API float LevelFromTenths(std::int32_t tenths);
 
+// Decibels out per decibel in, above the threshold, at a step from 0 to kRatioSteps.
 constexpr double SlopeOfStep(std::int32_t step) {
     return 1.0 - static_cast<double>(step) / static_cast<double>(kRatioSteps);
 }

@@ -12,16 +12,17 @@ namespace EchoPrivate {
 
 // The settings, the chunk after its first word, and a row of the preset table; pairs are left, right.
 struct _transform_props {
+    // Left, right.
     using Pair = std::array<std::int32_t, 2>;
     Pair decay;      // feedback gain, -300..100 tenths of dB, silent at -300
     Pair mix;        // 0..2000; times 0.0005 the wet fraction
     Pair depth;      // 0..10000, the delay time as the mode reads it; milliseconds in a preset
     Pair delayGain;  // gain of the echoes, -300..100 tenths of dB, silent at -300
-    std::array<std::int32_t, 10> reserved;
-    Pair outGain;  // -960..200 tenths of dB, silent at -960
-    Pair reserved2;
-    std::int32_t mode;  // 0..4, see Echo
-    std::int32_t modeCopy;
+    std::array<std::int32_t, 10> reserved;  // kept
+    Pair outGain;                           // -960..200 tenths of dB, silent at -960
+    Pair reserved2;                         // kept
+    std::int32_t mode;                      // 0..4, see Echo
+    std::int32_t modeCopy;                  // the same, for the right side
 };
 static_assert(sizeof(_transform_props) == 96);
 

@@ -26,7 +26,9 @@ public:
     const MP_PARAMINFO& Record(int externalIndex);
 
 protected:
+    // For an effect that is described by a table.
     using CorvoEffectBase::CorvoEffectBase;
+    // For an effect that brings its records by itself.
     CorvoEffect();
 
     bool DoSetParam(int index, float normalised, bool fromAutomation) override;

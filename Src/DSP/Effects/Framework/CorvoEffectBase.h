@@ -46,13 +46,17 @@ struct TailRecord;
 // that does has stored nothing or all that it was given, and may be repeated. Processing and preparation
 // never throw.
 //
+// Cost: a block takes time in proportion to its frames, some nanoseconds each (README, "Effects"), and what
+// its effect derives anew after an edit. InitProcessing makes memory, up to some megabytes. Questions about
+// the effect and its values cost next to nothing; texts, lists and chunks allocate what they return.
+//
 // Most effects are described by a table: names, texts, choices, presets and the layout of the settings chunk.
 // The operations below answer from it; an effect without one has the answers given here.
 //
 // The order of the virtual operations is part of the contract.
 class DSP_API CorvoEffectBase {
 public:
-    static constexpr int MaxNumChannels = 2;
+    static constexpr int MaxNumChannels = 2;  // of the effects here; what they do with more, each says
 
     CorvoEffectBase(const CorvoEffectBase&) = delete;
     CorvoEffectBase& operator=(const CorvoEffectBase&) = delete;
@@ -302,7 +306,7 @@ protected:
     // the number of channels or the rate is not that of `seen`, or the host forces it. `afresh`: for either
     // of the last two.
     struct Cook {
-        bool due, afresh;
+        bool due, afresh;  // as above
     };
     Cook TakeCook(tWAVEFORMATEX& seen, const tWAVEFORMATEX& now, bool force);
 
@@ -315,24 +319,24 @@ protected:
 
     // Tempo and time signature of the host; 120 bpm and 4/4 where there is none.
     struct Tempo {
-        double bpm = 120.0;
-        int numerator = 4, denominator = 4;
+        double bpm = 120.0;                  // beats a minute, above 0
+        int numerator = 4, denominator = 4;  // each 1 or above
     };
     Tempo HostTempo() const;
 
-    BuiltinEditor* m_editor = nullptr;
-    bool m_want_refresh_all_params = false;
-    bool m_reverse_param_order = false;
-    std::vector<int> m_sidechain_bus_channels;
-    CorvoEffectHostCallback* m_host_callback = nullptr;
-    std::atomic<bool> m_update_ui_from_scratch{false};
-    std::vector<std::vector<MP_ENVELOPE_SEGMENT>> m_envelopes;
-    std::vector<int> m_envelope_positions;
-    std::int64_t m_envelope_time = 0;
+    BuiltinEditor* m_editor = nullptr;                          // the host's
+    bool m_want_refresh_all_params = false;                     // what WantRefreshAllParams says
+    bool m_reverse_param_order = false;                         // external index 0 is the last real one
+    std::vector<int> m_sidechain_bus_channels;                  // of each bus announced
+    CorvoEffectHostCallback* m_host_callback = nullptr;         // the host's
+    std::atomic<bool> m_update_ui_from_scratch{false};          // what WantsUpdateUiFromScratch says
+    std::vector<std::vector<MP_ENVELOPE_SEGMENT>> m_envelopes;  // one per real parameter
+    std::vector<int> m_envelope_positions;                      // of each, the segment that comes next
+    std::int64_t m_envelope_time = 0;                           // what GetEnvelopeTime says
     // Raised with release after an edit is stored, lowered with acquire before it is read.
     std::atomic<bool> m_cook{true};
-    std::unique_ptr<TailRecord> m_tail;
-    double m_longest_gap = 0.0;  // what LongestGap says; kept by cooks
+    std::unique_ptr<TailRecord> m_tail;  // null until the effect has memory for it
+    double m_longest_gap = 0.0;          // what LongestGap says; kept by cooks
 
 private:
     void Store(const std::vector<std::uint32_t>& settings);

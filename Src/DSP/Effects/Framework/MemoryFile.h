@@ -12,6 +12,7 @@ namespace KivFiles {
 // of the virtual operations is part of the contract.
 class DSP_API CFileBase {
 public:
+    // What Seek counts from.
     enum Origin : int { FromStart = 0, FromCurrent = 1, FromEnd = 2 };
 
     CFileBase();

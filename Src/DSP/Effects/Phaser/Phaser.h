@@ -12,13 +12,13 @@ struct PhaserImpl;
 
 // The settings, the chunk after its first word, and a row of the preset table.
 struct PhaserSettings {
-    float rate;      // 0..1; times 6 Hz
-    float feedback;  // 0..1, a factor
-    float wet;       // 0..1; at 0.5 both gains are 1
-    float maximum;   // Hz, 0..10000
-    float minimum;   // Hz, 0..10000; above the maximum the sweep just goes the other way
-    float width;     // 0..1, how far the right sweep is ahead, in cycles
-    std::int32_t stages;
+    float rate;           // 0..1; times 6 Hz
+    float feedback;       // 0..1, a factor
+    float wet;            // 0..1; at 0.5 both gains are 1
+    float maximum;        // Hz, 0..10000
+    float minimum;        // Hz, 0..10000; above the maximum the sweep just goes the other way
+    float width;          // 0..1, how far the right sweep is ahead, in cycles
+    std::int32_t stages;  // 0..30
 };
 static_assert(sizeof(PhaserSettings) == 28);
 

@@ -11,13 +11,13 @@ namespace PitchShiftPrivate {
 
 // The settings, and the body of the chunk.
 struct _transform_props {
-    std::array<std::int32_t, 2> pitch;  // frequency ratio * 3000 per side; 3000 leaves the pitch alone
-    std::array<std::int32_t, 2> carried2;
-    std::int32_t quality;  // PitchAdapter::SetQuality
-    std::int32_t carried5;
-    std::int32_t fftSize;  // PitchAdapter::SetFFTSize
-    std::array<std::int32_t, 14> carried7;
-    std::int32_t backEnd;  // PitchAdapter::CreateAdapter
+    std::array<std::int32_t, 2> pitch;      // frequency ratio * 3000 per side; 3000 leaves the pitch alone
+    std::array<std::int32_t, 2> carried2;   // kept
+    std::int32_t quality;                   // PitchAdapter::SetQuality
+    std::int32_t carried5;                  // kept
+    std::int32_t fftSize;                   // PitchAdapter::SetFFTSize
+    std::array<std::int32_t, 14> carried7;  // kept
+    std::int32_t backEnd;                   // PitchAdapter::CreateAdapter
 };
 static_assert(sizeof(_transform_props) == 88);
 

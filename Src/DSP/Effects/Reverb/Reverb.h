@@ -12,6 +12,7 @@ namespace ReverbPrivate {
 
 // The settings, the chunk after its first word, and a row of the preset table; pairs are left, right.
 struct _transform_props {
+    // Left, right.
     using Pair = std::array<std::int32_t, 2>;
     Pair preDelay;     // 0..2000, times 0.1 ms
     Pair mix;          // 0..2000; times 0.0005 the reflections' share of the wet sound
@@ -21,6 +22,7 @@ struct _transform_props {
     Pair damping;      // 0..2500; the left one serves both sides
     Pair reflections;  // 0..5000, times 0.001 the size of the pattern
     Pair room;         // 1..4000, times 0.001
+    // Kept.
     std::int32_t reserved;
     std::int32_t filterOff;  // other than 0: no filter against offsets; no parameter sets it
 };

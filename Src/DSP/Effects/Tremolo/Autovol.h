@@ -12,15 +12,16 @@ namespace AutovolPrivate {
 
 // The settings, the chunk after its first word, and a row of the preset table; pairs are left, right.
 struct _transform_props {
+    // Left, right.
     using Pair = std::array<std::int32_t, 2>;
     Pair depth;    // 0..1000 tenths of a percent
     Pair mix;      // 0..1000 tenths of a percent, ring modulation only
     Pair rate;     // 0..3000 hundredths of a hertz
     Pair ringMod;  // 1: the oscillator multiplies the signal; set by presets and chunks only
     Pair invert;   // 1: the other polarity
-    std::array<std::int32_t, 8> reserved;
-    Pair outGain;  // -960..200 tenths of dB, silent at -960
-    Pair reserved2;
+    std::array<std::int32_t, 8> reserved;  // kept
+    Pair outGain;                          // -960..200 tenths of dB, silent at -960
+    Pair reserved2;                        // kept
 };
 static_assert(sizeof(_transform_props) == 88);
 

@@ -13,6 +13,7 @@ namespace Corvo::DSP {
 // The order of the virtual operations is part of the contract.
 class DSP_API VirtualTubeAmp final {
 public:
+    // How many values there are, and what stands for all of them.
     static constexpr int kParameters = 10, kAllParameters = kParameters;
     using Values = std::array<float, kParameters>;  // normalised, left and right in turn
 
