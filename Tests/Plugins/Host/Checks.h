@@ -12,7 +12,8 @@ void CheckParameters(PluginFile&, std::size_t);
 void CheckState(PluginFile&, std::size_t);
 void CheckSound(PluginFile&, std::size_t);
 void CheckTiming(PluginFile&, std::size_t);
-void CheckWindow(PluginFile&, std::size_t);  // needs a display
+void PrintPresets(PluginFile&, std::size_t);  // in lines: plug-in, preset, its state in hexadecimal digits
+void CheckWindow(PluginFile&, std::size_t);   // needs a display
 
 using Signal = std::vector<std::vector<float>>;  // by channel
 

@@ -1,13 +1,13 @@
 // States: what a session keeps must come back, and what is no state must do no harm.
 #include <algorithm>
 #include <cmath>
+#include <cstdio>
+#include <set>
 
 #include "Checks.h"
 
 namespace PluginHost {
 namespace {
-
-constexpr std::size_t kAll = 1 << 30;
 
 void ExpectSameValues(Instance& plugin, Instance& other, const std::string& when) {
     int differing = 0;
@@ -32,13 +32,13 @@ void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
     for (const Parameter& p : plugin->parameters)
         if (p.bypass && seed % 3 == 0) changes.push_back({p.id, p.maximum, 0});
     plugin->Flush(changes);
-    const auto state = plugin->Save(kAll), inPieces = plugin->Save(17);
+    const auto state = plugin->Save(), inPieces = plugin->Save({.most = 17});
     if (!state || !inPieces) return Finding("its state cannot be saved");
     Expect(*state == *inPieces, "its state differs when the stream takes 17 bytes at a time");
-    Expect(restored->Load(*state, kAll), "refuses its own state");
+    Expect(restored->Load({.bytes = *state}), "refuses its own state");
     ExpectSameValues(*plugin, *restored, "after the state came back");
-    Expect(restored->Save(kAll) == state, "saves other bytes than it was given");
-    Expect(slow->Load(*state, 23), "refuses its own state that comes 23 bytes at a time");
+    Expect(restored->Save() == state, "saves other bytes than it was given");
+    Expect(slow->Load({.bytes = *state, .most = 23}), "refuses its own state that comes 23 bytes at a time");
     ExpectSameValues(*plugin, *slow, "after the state came 23 bytes at a time");
 
     // The same values with a block, and while it runs without audio.
@@ -51,7 +51,7 @@ void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
         OnAudioThread([&] { active->FlushActive(changes); });
     active->Deactivate();
     ExpectSameValues(*plugin, *active, seed % 2 ? "set with a block" : "set without audio");
-    Expect(active->Save(kAll) == state, "saves another state where its values came otherwise");
+    Expect(active->Save() == state, "saves another state where its values came otherwise");
 
     const Signal noise = Noise(Channels(plugin->inputs), 12000);
     const double difference =
@@ -62,9 +62,9 @@ void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
 
 void CheckHarm(PluginFile& file, std::size_t index) {
     const auto fresh = file.Create(index), plugin = file.Create(index);
-    const auto state = fresh->Save(kAll);
+    const auto state = fresh->Save();
     if (!state || state->empty()) return Finding("has no state to save");
-    Expect(!plugin->Load({}, kAll), "takes an empty stream for a state");
+    Expect(!plugin->Load({.bytes = {}}), "takes an empty stream for a state");
     ExpectSameValues(*fresh, *plugin, "after an empty state");
     std::mt19937 random(5);
     for (int i = 0; i < 40; ++i) {
@@ -72,7 +72,7 @@ void CheckHarm(PluginFile& file, std::size_t index) {
         if (i % 2) broken.resize(random() % state->size());
         for (int hits = i; hits > 0 && !broken.empty(); --hits)
             broken[random() % broken.size()] = static_cast<char>(random());
-        plugin->Load(broken, kAll);
+        plugin->Load({.bytes = broken});
         Expect(IsFinite(RenderAt(*plugin, 48000, Noise(Channels(plugin->inputs), 256))),
                "does not sound finite after a broken state");
         for (const Parameter& p : plugin->parameters) {
@@ -81,25 +81,42 @@ void CheckHarm(PluginFile& file, std::size_t index) {
                    p.name + " leaves its range after a broken state");
         }
     }
-    Expect(plugin->Load(*state, kAll), "refuses its own state after broken ones");
+    Expect(plugin->Load({.bytes = *state}), "refuses its own state after broken ones");
     ExpectSameValues(*fresh, *plugin, "after broken states and its own");
 }
 
 // What a host may ask for on its main thread while audio runs.
 void CheckBesideAudio(PluginFile& file, std::size_t index) {
     const auto plugin = file.Create(index);
-    const auto state = plugin->Save(kAll);
+    const auto state = plugin->Save();
     if (!state) return;
+    std::mt19937 random(6);
     plugin->Activate(48000, 256);
     const bool finite = FiniteWhile(*plugin, [&] {
         for (int i = 0; i < 40; ++i) {
-            plugin->Save(kAll);
-            plugin->Load(*state, kAll);
+            plugin->Save();
+            plugin->Load({.bytes = *state});
+            if (!plugin->presets.empty()) plugin->TakePreset(random() % plugin->presets.size());
             for (const Parameter& p : plugin->parameters) plugin->Text(p, plugin->Get(p));
         }
     });
     plugin->Deactivate();
     Expect(finite, "is not finite while the main thread saves and loads its state");
+}
+
+// Each has a name, and they are not all the same.
+void CheckPresets(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    std::set<std::vector<double>> all;
+    for (std::size_t preset = plugin->presets.size(); preset-- > 0;) {
+        Expect(!plugin->presets[preset].empty(), "has a preset without name");
+        Expect(plugin->TakePreset(preset), "does not take its preset " + plugin->presets[preset]);
+        std::vector<double> values;
+        for (const Parameter& p : plugin->parameters)
+            if (p.automatable) values.push_back(plugin->Get(p));
+        all.insert(values);
+    }
+    Expect(all.size() > 1 || plugin->presets.size() < 2, "its presets are all the same");
 }
 
 }  // namespace
@@ -108,6 +125,18 @@ void CheckState(PluginFile& file, std::size_t index) {
     for (unsigned seed = 1; seed <= 6; ++seed) CheckRestoring(file, index, seed);
     CheckHarm(file, index);
     CheckBesideAudio(file, index);
+    CheckPresets(file, index);
+}
+
+void PrintPresets(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    for (std::size_t preset = plugin->presets.size(); preset-- > 0;) {
+        plugin->TakePreset(preset);
+        std::printf("%s\t%s\t", file.Name(index).c_str(), plugin->presets[preset].c_str());
+        for (const char byte : plugin->Save().value_or(Bytes{}))
+            std::printf("%02x", static_cast<unsigned>(static_cast<unsigned char>(byte)));
+        std::printf("\n");
+    }
 }
 
 }  // namespace PluginHost
