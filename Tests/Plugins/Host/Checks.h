@@ -24,6 +24,7 @@ struct Way {
 };
 
 int Channels(const std::vector<Port>&);
+inline double Share(std::mt19937& random) { return static_cast<double>(random()) / 4294967295.0; }
 Signal Noise(int channels, std::size_t frames, float level = 0.25f, unsigned seed = 1);
 // The output of an active plug-in.
 Signal Render(Instance&, const Signal& input, const Way& = {});

@@ -31,7 +31,7 @@ auto InRealTime(Call call) {
         broken = rules.Broken();
         return made;
     }();
-    ExpectRealTime(broken);
+    if (!broken.empty() && IsRealTime()) Finding("does on the audio thread: " + broken);
     return result;
 }
 

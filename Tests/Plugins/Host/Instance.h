@@ -50,8 +50,9 @@ inline void Expect(bool condition, const std::string& otherwise) {
     if (!condition) Finding(otherwise);
 }
 
-// `broken` says what the audio thread did that it must not do; empty when nothing.
-void ExpectRealTime(const std::string& broken);
+// Whether the plug-in at hand neither allocates nor waits while it processes; where a format can say so, it
+// does.
+bool IsRealTime();
 
 enum class Thread { Main, Audio };
 Thread CurrentThread();

@@ -2,7 +2,6 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
-#include <set>
 
 #include "Checks.h"
 
@@ -27,8 +26,7 @@ void ExpectSameValues(Instance& plugin, Instance& other, const std::string& when
 void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
     std::mt19937 random(seed);
     const auto plugin = file.Create(index), restored = file.Create(index), slow = file.Create(index);
-    std::vector<Change> changes =
-        ForAll(*plugin, [&] { return static_cast<double>(random()) / 4294967295.0; });
+    std::vector<Change> changes = ForAll(*plugin, [&] { return Share(random); });
     for (const Parameter& p : plugin->parameters)
         if (p.bypass && seed % 3 == 0) changes.push_back({p.id, p.maximum, 0});
     plugin->Flush(changes);
@@ -104,28 +102,12 @@ void CheckBesideAudio(PluginFile& file, std::size_t index) {
     Expect(finite, "is not finite while the main thread saves and loads its state");
 }
 
-// Each has a name, and they are not all the same.
-void CheckPresets(PluginFile& file, std::size_t index) {
-    const auto plugin = file.Create(index);
-    std::set<std::vector<double>> all;
-    for (std::size_t preset = plugin->presets.size(); preset-- > 0;) {
-        Expect(!plugin->presets[preset].empty(), "has a preset without name");
-        Expect(plugin->TakePreset(preset), "does not take its preset " + plugin->presets[preset]);
-        std::vector<double> values;
-        for (const Parameter& p : plugin->parameters)
-            if (p.automatable) values.push_back(plugin->Get(p));
-        all.insert(values);
-    }
-    Expect(all.size() > 1 || plugin->presets.size() < 2, "its presets are all the same");
-}
-
 }  // namespace
 
 void CheckState(PluginFile& file, std::size_t index) {
     for (unsigned seed = 1; seed <= 6; ++seed) CheckRestoring(file, index, seed);
     CheckHarm(file, index);
     CheckBesideAudio(file, index);
-    CheckPresets(file, index);
 }
 
 void PrintPresets(PluginFile& file, std::size_t index) {
