@@ -16,6 +16,7 @@
 #include <string>
 #include <vector>
 
+#include "ClapPresets.h"
 #include "ClapWindow.h"
 #include "SavedState.h"
 
@@ -322,6 +323,32 @@ private:
     }
     static constexpr clap_plugin_state_t kState{Save, Load};
 
+    // Presets. A key that is none changes nothing.
+    const ClapHostPresetLoad* PresetHost() const {
+        for (const char* const id : kClapPresetLoad)
+            if (const auto* const host = HostExtension<ClapHostPresetLoad>(id)) return host;
+        return nullptr;
+    }
+    bool TakePreset(std::uint32_t kind, const char* key) try {
+        const int preset = kind == kClapPresetsInPlugin ? PresetOfClapKey(*m_core, key) : -1;
+        if (preset < 0) return false;
+        m_core->TakePreset(preset);
+        TellValues();
+        return true;
+    } catch (const std::exception&) {
+        return false;
+    }
+    static bool LoadPreset(const clap_plugin_t* plugin, std::uint32_t kind, const char* path,
+                           const char* key) {
+        ClapPlugin& self = Of(plugin);
+        const bool taken = self.TakePreset(kind, key);
+        const auto* const host = self.PresetHost();
+        if (host && taken) host->loaded(self.m_host, kind, path, key);
+        if (host && !taken) host->onError(self.m_host, kind, path, key, 0, "The plug-in has no such preset");
+        return taken;
+    }
+    static constexpr ClapPresetLoad kPresetLoad{LoadPreset};
+
     static ClapWindow& WindowOf(const clap_plugin_t* plugin) { return Of(plugin).m_window; }
 
     static const void* Extension(const clap_plugin_t* plugin, const char* id) {
@@ -329,6 +356,8 @@ private:
         if (std::strcmp(id, CLAP_EXT_PARAMS) == 0) return &kParams;
         if (std::strcmp(id, CLAP_EXT_LATENCY) == 0) return &kLatency;
         if (std::strcmp(id, CLAP_EXT_STATE) == 0) return &kState;
+        for (const char* const known : kClapPresetLoad)
+            if (std::strcmp(id, known) == 0) return Of(plugin).m_core->Presets() > 0 ? &kPresetLoad : nullptr;
         return Of(plugin).m_core->HasWindow() ? ClapWindow::Extension<WindowOf>(id) : nullptr;
     }
 
@@ -360,6 +389,6 @@ const clap_plugin_factory_t kFactory{
 
 const clap_plugin_entry_t clap_entry{CLAP_VERSION, [](const char*) { return true; }, [] {},
                                      [](const char* id) -> const void* {
-                                         return std::strcmp(id, CLAP_PLUGIN_FACTORY_ID) == 0 ? &kFactory
-                                                                                             : nullptr;
+                                         if (std::strcmp(id, CLAP_PLUGIN_FACTORY_ID) == 0) return &kFactory;
+                                         return FindClapPresetFactory(id);
                                      }};

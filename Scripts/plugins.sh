@@ -256,6 +256,8 @@ check_with_our_host() {
     timeout 300 "$build/bin/plugin_host" "$1" || { echo "${1##*/}: plugin_host ends with $?"; return 1; }
 }
 
+same_presets() { "$@" --presets "$clap" "$vst3" | "$python" "$hosts/presets.py" "$lv2"; }
+
 # The Windows files are checked by the same host, in one folder that Wine sees.
 windows_build=build/win64-plugins
 check_windows() {
@@ -280,6 +282,7 @@ check_windows() {
     done
     Scripts/windows-wine.sh win64 $stage/plugin_host.exe $(cd $stage && ls -d *.clap *.vst3) 2> "$work/wine.log" ||
         { tail -n 3 "$work/wine.log"; return 1; }
+    clap=dspdll.clap vst3=dspdll.vst3 same_presets Scripts/windows-wine.sh win64 $stage/plugin_host.exe
 }
 
 part adapter "$build/bin/dsp_adapter_tests" --gtest_brief=1
@@ -291,6 +294,7 @@ part jalv play_with_jalv
 part ardour try_ardour
 part qtractor scan_with_qtractor "$clap"
 part plugin_host each check_with_our_host "$clap" "$vst3" "$build/clap/$analyser.clap" "$build/vst3/$analyser.vst3"
+part presets same_presets "$build/bin/plugin_host"
 part win64 check_windows
 
 printf '\nplugins: times\n'

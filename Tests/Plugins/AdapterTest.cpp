@@ -7,14 +7,13 @@
 #include <complex>
 #include <fstream>
 #include <iterator>
-#include <limits>
 #include <numbers>
 #include <sstream>
 
 #include "Spectrum/Fft/CorvoFFT.h"
 
-// The adapter behind every plug-in, over all plug-ins of both widths. Bypass, samples that are no numbers and
-// the rules of the audio thread are plugin_host's.
+// The adapter behind every plug-in, over all plug-ins of both widths. Bypass, latency, blocks of any length,
+// samples that are no numbers and the rules of the audio thread are plugin_host's.
 namespace {
 
 using namespace Corvo::Plugins;
@@ -36,9 +35,9 @@ std::vector<Plugin> All() {
 
 class EveryPlugin : public testing::TestWithParam<Plugin> {
 protected:
-    std::unique_ptr<Adapter> Make(double rate = kRate) const {
+    std::unique_ptr<Adapter> Make() const {
         auto adapter = std::make_unique<Adapter>(*GetParam().row, GetParam().channels);
-        adapter->Prepare(rate, kLongest);
+        adapter->Prepare(kRate, kLongest);
         return adapter;
     }
 };
@@ -48,31 +47,25 @@ INSTANTIATE_TEST_SUITE_P(All, EveryPlugin, testing::ValuesIn(All()), [](const au
 
 using Sound = std::vector<float>;
 
-Sound Sine(double hz, std::size_t frames, double rate = kRate) {
+Sound Sine(double hz, std::size_t frames) {
     Sound sound(frames);
     for (std::size_t i = 0; i < frames; ++i)
         sound[i] =
-            static_cast<float>(0.25 * std::sin(2.0 * std::numbers::pi * hz * static_cast<double>(i) / rate));
+            static_cast<float>(0.25 * std::sin(2.0 * std::numbers::pi * hz * static_cast<double>(i) / kRate));
     return sound;
 }
 
-// Processes a sound, the same in every channel, in blocks of the lengths in turn; gives the first channel.
+// Processes a sound, the same in every channel, in blocks of 64 frames; gives the first channel.
 // before(frame) is called in front of every block.
 template <typename Before>
-Sound Processed(Adapter& adapter, const Sound& in, const std::vector<int>& lengths, Before before) {
+Sound Processed(Adapter& adapter, const Sound& in, Before before) {
     Sound left(in), right(in);
-    std::size_t done = 0;
-    for (std::size_t block = 0; done < in.size(); ++block) {
+    for (std::size_t done = 0; done < in.size(); done += 64) {
         before(done);
-        const int frames = std::min(lengths[block % lengths.size()], static_cast<int>(in.size() - done));
         float* const at[]{left.data() + done, right.data() + done};
-        adapter.Run(at, at, nullptr, frames);
-        done += static_cast<std::size_t>(frames);
+        adapter.Run(at, at, nullptr, static_cast<int>(std::min<std::size_t>(64, in.size() - done)));
     }
     return left;
-}
-Sound Processed(Adapter& adapter, const Sound& in, const std::vector<int>& lengths = {64}) {
-    return Processed(adapter, in, lengths, [](std::size_t) {});
 }
 
 // Saved sessions know ports by place and symbol: a line may be added below the others of its plug-in, and
@@ -93,31 +86,21 @@ TEST_P(EveryPlugin, ShowsTheNumberThatAPortIsSetTo) {
     const auto adapter = Make();
     for (std::size_t i = 0; i < adapter->Ports().size(); ++i) {
         const Port& port = adapter->Ports()[i];
-        for (int step = 0; step <= 20; ++step) {
-            const auto index = static_cast<int>(i);
+        for (int step = 0; step <= 20 && port.isNumber; ++step) {
             const float value = port.Value(static_cast<float>(step) / 20.0f);
-            float back = std::numeric_limits<float>::quiet_NaN();
-            const std::string text = adapter->Text(index, value);
-            ASSERT_TRUE(adapter->FromText(index, text, back)) << port.name << " " << text;
-            if (port.isNumber || port.type != EffectParameterType::Continuous) {
-                EXPECT_EQ(adapter->Text(index, back), text) << port.name;
-            }
-            if (port.type != EffectParameterType::Continuous || text.find('|') != text.npos) continue;
-            char* end = nullptr;
-            const float shown = std::strtof(text.c_str(), &end);
-            if (!port.isNumber || !std::isfinite(shown) || end == text.c_str()) continue;
+            const std::string text = adapter->Text(static_cast<int>(i), value);
+            float shown = 0.0f;
+            if (text.find('|') != text.npos || !ReadNumber(text, shown) || !std::isfinite(shown)) continue;
             // One unit of the last decimal: some are cut. A ratio has no more than so many steps.
-            const auto point = text.find('.');
-            const double unit = point < static_cast<std::size_t>(end - text.c_str())
-                                    ? std::pow(10.0, -(end - text.c_str() - static_cast<int>(point) - 1))
-                                    : 1.0;
+            const auto point = text.find('.'), end = text.find_last_of("0123456789");
+            const double unit = point < end ? std::pow(0.1, end - point) : 1.0;
             EXPECT_NEAR(shown, value, text.ends_with(":1") ? 0.06 * value : 1.01 * unit)
                 << port.name << " " << text;
         }
     }
 }
 
-TEST_P(EveryPlugin, StateIsExact) {
+TEST_P(EveryPlugin, StateOfEveryPresetIsExact) {
     const auto adapter = Make(), other = Make();
     for (int preset = -1; preset < adapter->Presets(); ++preset) {
         adapter->TakePreset(preset);
@@ -130,61 +113,8 @@ TEST_P(EveryPlugin, StateIsExact) {
             other->Set(port, other->Value(port) * (1.0f + 2e-7f));
             EXPECT_EQ(adapter->Value(port), other->Value(port));
         }
-        Processed(*other, Sound(kLongest));
+        Processed(*other, Sound(kLongest), [](std::size_t) {});
         EXPECT_EQ(other->State(), state);
-    }
-    // What is automated while it plays is in the state, arrived or on its way.
-    for (std::size_t i = 0; i < adapter->Ports().size(); ++i)
-        if (adapter->Ports()[i].type == EffectParameterType::Continuous)
-            adapter->Set(static_cast<int>(i), adapter->Ports()[i].Value(0.7f));
-    Processed(*adapter, Sound(64));
-    const auto early = adapter->State();
-    Processed(*adapter, Sound(static_cast<std::size_t>(kRate)));
-    EXPECT_EQ(adapter->State(), early);
-    ASSERT_TRUE(other->TakeState(early));
-    for (std::size_t i = 0; i < adapter->Ports().size(); ++i) {
-        const Port& port = adapter->Ports()[i];
-        EXPECT_NEAR(other->Value(static_cast<int>(i)), adapter->Value(static_cast<int>(i)),
-                    1.01 * port.resolution + 0.01 * (port.most - port.least))
-            << port.name;
-    }
-    EXPECT_FALSE(other->TakeState({1, 2, 3}));
-    EXPECT_EQ(other->State(), early);
-}
-
-TEST_P(EveryPlugin, TakesBlocksOfAnyLength) {
-    if (!GetParam().row->realTime) GTEST_SKIP() << "its engine cuts the stream in its own way";
-    const auto whole = Make(), cut = Make();
-    const Sound in = Sine(440.0, 12000);
-    const Sound expected = Processed(*whole, in, {kLongest});
-    const Sound heard = Processed(*cut, in, {1, 0, 77, 4 * kLongest + 3, 64});
-    for (std::size_t i = 0; i < in.size(); ++i) ASSERT_NEAR(heard[i], expected[i], 1e-5) << i;
-}
-
-TEST_P(EveryPlugin, TellsItsLatencyAtEveryRate) {
-    for (const double rate : {44100.0, 48000.0, 96000.0, 192000.0}) {
-        const auto adapter = Make(rate);
-        const int latency = adapter->Latency();
-        // Short tones with pauses: neither steady noise nor one pitch.
-        const auto frames = static_cast<std::size_t>(rate);
-        Sound in = Sine(220.0, frames, rate);
-        for (std::size_t i = 0; i < frames; ++i) in[i] *= i % (frames / 5) < frames / 12 ? 1.0f : 0.0f;
-        const Sound out = Processed(*adapter, in);
-        EXPECT_EQ(adapter->Latency(), latency);
-        if (latency == 0) continue;
-        double best = 0.0;
-        int lag = -1;
-        for (int candidate = std::max(0, latency - 2000); candidate < latency + 2000; ++candidate) {
-            double sum = 0.0;
-            for (std::size_t i = static_cast<std::size_t>(candidate); i < frames; i += 3)
-                sum += static_cast<double>(out[i] * in[i - static_cast<std::size_t>(candidate)]);
-            if (sum > best) {
-                best = sum;
-                lag = candidate;
-            }
-        }
-        // The engine that splices is exact on the whole, not to the frame.
-        EXPECT_NEAR(lag, latency, GetParam().row->realTime ? 1 : 0.02 * rate) << rate;
     }
 }
 
@@ -266,7 +196,7 @@ TEST_P(EveryPlugin, AutomationAtFiftyHertzMakesNoZipperNoise) {
         // Up and down by a twentieth of the knob, told every 64 frames, as hosts do.
         const auto zipper = [&](double depth) {
             const auto adapter = Make();
-            const Sound out = Processed(*adapter, in, {64}, [&](std::size_t at) {
+            const Sound out = Processed(*adapter, in, [&](std::size_t at) {
                 const double phase = 2.0 * std::numbers::pi * 50.0 * static_cast<double>(at) / kRate;
                 const auto position = static_cast<float>(0.6 + depth * std::sin(phase));
                 adapter->Set(static_cast<int>(i), port.curve.Number(position));

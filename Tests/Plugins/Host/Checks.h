@@ -12,7 +12,8 @@ void CheckParameters(PluginFile&, std::size_t);
 void CheckState(PluginFile&, std::size_t);
 void CheckSound(PluginFile&, std::size_t);
 void CheckTiming(PluginFile&, std::size_t);
-void CheckWindow(PluginFile&, std::size_t);  // needs a display
+void PrintPresets(PluginFile&, std::size_t);  // in lines: plug-in, preset, its state in hexadecimal digits
+void CheckWindow(PluginFile&, std::size_t);   // needs a display
 
 using Signal = std::vector<std::vector<float>>;  // by channel
 
@@ -23,6 +24,7 @@ struct Way {
 };
 
 int Channels(const std::vector<Port>&);
+inline double Share(std::mt19937& random) { return static_cast<double>(random()) / 4294967295.0; }
 Signal Noise(int channels, std::size_t frames, float level = 0.25f, unsigned seed = 1);
 // The output of an active plug-in.
 Signal Render(Instance&, const Signal& input, const Way& = {});

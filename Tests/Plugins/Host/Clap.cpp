@@ -1,12 +1,10 @@
 // CLAP over the C headers.
 #include <clap/entry.h>
 #include <clap/ext/audio-ports.h>
-#include <clap/ext/gui.h>
 #include <clap/ext/latency.h>
 #include <clap/ext/params.h>
 #include <clap/ext/state.h>
 #include <clap/ext/thread-check.h>
-#include <clap/ext/timer-support.h>
 #include <clap/plugin-factory.h>
 #include <clap/plugin-features.h>
 
@@ -14,12 +12,17 @@
 #include <array>
 #include <cmath>
 #include <cstring>
+#include <map>
 #include <set>
 #include <stdexcept>
 #include <utility>
 
+#include "ClapPresetRecords.h"
+#include "ClapWindow.h"
 #include "Formats.h"
 #include "Module.h"
+
+using namespace Corvo::Plugins;  // CLAP's records of presets
 
 namespace PluginHost {
 namespace {
@@ -28,9 +31,15 @@ void ExpectThread(Thread thread, const char* call) {
     Expect(CurrentThread() == thread, std::string("calls the host's ") + call + " from the wrong thread");
 }
 
-// The host that the plug-in sees.
+// The host that the plug-in sees, and what it was told of presets: the key that was loaded, and the one that
+// was not.
+bool g_rescanned = false;
+std::string g_loaded, g_refused;
 const clap_host_params_t kHostParams{
-    [](const clap_host_t*, clap_param_rescan_flags) { ExpectThread(Thread::Main, "params.rescan"); },
+    [](const clap_host_t*, clap_param_rescan_flags) {
+        ExpectThread(Thread::Main, "params.rescan");
+        g_rescanned = true;
+    },
     [](const clap_host_t*, clap_id, clap_param_clear_flags) { ExpectThread(Thread::Main, "params.clear"); },
     [](const clap_host_t*) {
         Expect(CurrentThread() != Thread::Audio, "calls params.request_flush on the audio thread");
@@ -43,16 +52,16 @@ const clap_host_thread_check_t kHostThreads{
     [](const clap_host_t*) { return CurrentThread() == Thread::Main; },
     [](const clap_host_t*) { return CurrentThread() == Thread::Audio; }};
 
-std::set<clap_id> g_timers;
-const clap_host_timer_support_t kHostTimers{[](const clap_host_t*, std::uint32_t, clap_id* timer) {
-                                                *timer = g_timers.empty() ? 1 : *g_timers.rbegin() + 1;
-                                                return g_timers.insert(*timer).second;
-                                            },
-                                            [](const clap_host_t*, clap_id timer) {
-                                                Expect(g_timers.erase(timer) == 1,
-                                                       "takes away a timer that is not there");
-                                                return true;
-                                            }};
+const ClapHostPresetLoad kHostPresets{
+    [](const clap_host_t*, std::uint32_t, const char*, const char* key, std::int32_t, const char* message) {
+        ExpectThread(Thread::Main, "preset_load.on_error");
+        Expect(message && *message, "does not say why a preset cannot be loaded");
+        g_refused = key;
+    },
+    [](const clap_host_t*, std::uint32_t, const char*, const char* key) {
+        ExpectThread(Thread::Main, "preset_load.loaded");
+        g_loaded = key;
+    }};
 
 const void* HostExtension(const clap_host_t*, const char* id) {
     const std::string name = id;
@@ -60,7 +69,8 @@ const void* HostExtension(const clap_host_t*, const char* id) {
     if (name == CLAP_EXT_LATENCY) return &kHostLatency;
     if (name == CLAP_EXT_STATE) return &kHostState;
     if (name == CLAP_EXT_THREAD_CHECK) return &kHostThreads;
-    if (name == CLAP_EXT_TIMER_SUPPORT) return &kHostTimers;
+    if (name == CLAP_EXT_TIMER_SUPPORT) return &kClapTimers;
+    if (name == kClapPresetLoad[0]) return &kHostPresets;
     return nullptr;
 }
 
@@ -114,15 +124,25 @@ struct Events {
     }
 };
 
+struct Preset {
+    std::string name, key;
+};
+
 class ClapInstance : public Instance {
 public:
-    explicit ClapInstance(const clap_plugin_t* plugin) : m_plugin(plugin) {
+    ClapInstance(const clap_plugin_t* plugin, const std::vector<Preset>& list)
+        : m_plugin(plugin), m_list(list) {
         if (!plugin->init(plugin)) throw std::runtime_error("init fails");
         m_params = Extension<clap_plugin_params_t>(CLAP_EXT_PARAMS);
         m_state = Extension<clap_plugin_state_t>(CLAP_EXT_STATE);
         m_latency = Extension<clap_plugin_latency_t>(CLAP_EXT_LATENCY);
         if (!m_params || !m_state) throw std::runtime_error("has no parameters or no state");
         Expect(!plugin->get_extension(plugin, "no.such.extension"), "has an extension that does not exist");
+        for (const Preset& preset : list) presets.push_back(preset.name);
+        for (const char* const id : kClapPresetLoad) {
+            m_presetLoad = Extension<ClapPresetLoad>(id);
+            Expect((m_presetLoad != nullptr) == !list.empty(), "loads presets, or lists them, not both");
+        }
         ReadParameters();
         ReadPorts(true, inputs);
         ReadPorts(false, outputs);
@@ -151,17 +171,23 @@ public:
         return value;
     }
 
-    std::optional<Bytes> Save(std::size_t most) override {
-        Stream stream{{}, most};
+    bool TakePreset(std::size_t preset) override {
+        g_rescanned = false;
+        g_loaded.clear();
+        const std::string& key = m_list[preset].key;
+        if (!m_presetLoad->load(m_plugin, kClapPresetsInPlugin, nullptr, key.c_str())) return false;
+        Expect(g_rescanned && g_loaded == key, "does not tell the host that a preset was loaded");
+        return true;
+    }
+
+    bool SaveTo(Stream& stream) override {
         const clap_ostream_t out{
             &stream, [](const clap_ostream_t* to, const void* bytes, std::uint64_t size) {
                 return static_cast<Stream*>(to->ctx)->Write(bytes, static_cast<std::int64_t>(size));
             }};
-        if (!m_state->save(m_plugin, &out)) return {};
-        return stream.bytes;
+        return m_state->save(m_plugin, &out);
     }
-    bool Load(const Bytes& bytes, std::size_t most) override {
-        Stream stream{bytes, most};
+    bool Load(Stream stream) override {
         const clap_istream_t in{&stream, [](const clap_istream_t* from, void* buffer, std::uint64_t size) {
                                     return static_cast<Stream*>(from->ctx)->Read(
                                         buffer, static_cast<std::int64_t>(size));
@@ -195,32 +221,8 @@ public:
     }
     void Reset() override { m_plugin->reset(m_plugin); }
 
-    bool OpenWindow(std::uintptr_t parent) override {
-        m_gui = Extension<clap_plugin_gui_t>(CLAP_EXT_GUI);
-        if (!m_gui) return false;
-        Expect(!m_gui->is_api_supported(m_plugin, "no.such.api", false) &&
-                   !m_gui->create(m_plugin, "no.such.api", false),
-               "has windows of an unknown kind");
-        std::uint32_t width = 0, height = 0;
-        clap_window_t window{CLAP_WINDOW_API_X11, {}};
-        window.x11 = static_cast<clap_xwnd>(parent);
-        return m_gui->is_api_supported(m_plugin, window.api, false) &&
-               m_gui->create(m_plugin, window.api, false) && m_gui->get_size(m_plugin, &width, &height) &&
-               width > 0 && height > 0 && m_gui->set_parent(m_plugin, &window) && m_gui->show(m_plugin);
-    }
-    bool ResizeWindow(int width, int height) override {
-        auto fitWidth = static_cast<std::uint32_t>(width), fitHeight = static_cast<std::uint32_t>(height);
-        return m_gui->can_resize(m_plugin) && m_gui->adjust_size(m_plugin, &fitWidth, &fitHeight) &&
-               m_gui->set_size(m_plugin, fitWidth, fitHeight);
-    }
-    void Tick() override {
-        const auto* timer = Extension<clap_plugin_timer_support_t>(CLAP_EXT_TIMER_SUPPORT);
-        for (const clap_id id : g_timers) timer->on_timer(m_plugin, id);
-    }
-    void CloseWindow() override {
-        m_gui->hide(m_plugin);
-        m_gui->destroy(m_plugin);
-        Expect(g_timers.empty(), "leaves its timer behind");
+    std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
+        return OpenClapWindow(m_plugin, parent);
     }
 
     bool SetChannels(int channels) override {
@@ -247,6 +249,13 @@ public:
                    p.name + " follows an event of another name space");
         const Change unknown{0x7fffffff, 0.5, 0};
         Flush({&unknown, 1});
+        const auto state = Save();
+        for (const char* key : {"", "no-such-preset", "compressor:preset-0", "compressor:preset-999"}) {
+            if (!m_presetLoad) break;
+            Expect(!m_presetLoad->load(m_plugin, kClapPresetsInPlugin, nullptr, key) && g_refused == key,
+                   std::string("loads the preset \"") + key + "\", or does not tell that it cannot");
+            Expect(Save() == state, "a preset that is none changes it");
+        }
     }
 
 private:
@@ -317,7 +326,8 @@ private:
     const clap_plugin_params_t* m_params;
     const clap_plugin_state_t* m_state;
     const clap_plugin_latency_t* m_latency;
-    const clap_plugin_gui_t* m_gui = nullptr;
+    const ClapPresetLoad* m_presetLoad = nullptr;
+    const std::vector<Preset>& m_list;
     Events m_events;
     std::int64_t m_time = 0;
     bool m_active = false, m_started = false;
@@ -336,6 +346,9 @@ public:
         Expect(!m_factory->get_plugin_descriptor(m_factory, m_factory->get_plugin_count(m_factory)),
                "describes one plug-in more than it has");
         for (std::size_t i = 0; i < Count(); ++i) CheckDescriptor(*Descriptor(i));
+        const auto* const presets = m_entry->get_factory(kClapPresetFactory[0]);
+        Expect(presets == m_entry->get_factory(kClapPresetFactory[1]), "has presets under one name only");
+        if (presets) ReadPresets(static_cast<const ClapPresetFactory*>(presets));
     }
     ~ClapFile() override { m_entry->deinit(); }
 
@@ -348,7 +361,7 @@ public:
         const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, descriptor->id);
         if (!plugin) throw std::runtime_error("cannot be created");
         Expect(std::strcmp(plugin->desc->id, descriptor->id) == 0, "its instance has another id");
-        return std::make_unique<ClapInstance>(plugin);
+        return std::make_unique<ClapInstance>(plugin, m_presets[descriptor->id]);
     }
 
 private:
@@ -369,6 +382,65 @@ private:
                "does not say that it is an audio effect");
     }
 
+    // As a host does before it makes a plug-in.
+    struct Listing {
+        std::map<std::string, std::vector<Preset>>& presets;
+        Preset at{};
+        bool located = false, failed = false;
+        static Listing& Of(const auto* record) { return *static_cast<Listing*>(record->data); }
+    };
+    void ReadPresets(const ClapPresetFactory* factory) {
+        Listing listing{m_presets};
+        using Indexer = ClapPresetIndexer;
+        using Receiver = ClapPresetReceiver;
+        const Indexer indexer{CLAP_VERSION,
+                              "plugin_host",
+                              "",
+                              "",
+                              "1.0",
+                              &listing,
+                              nullptr,
+                              [](const Indexer* own, const ClapPresetLocation* location) {
+                                  return Listing::Of(own).located =
+                                             location->kind == kClapPresetsInPlugin && !location->path;
+                              },
+                              nullptr,
+                              [](const Indexer*, const char*) -> const void* { return nullptr; }};
+        const Receiver::Text ignore = [](const Receiver*, const char*) {};
+        const Receiver receiver{
+            &listing,
+            [](const Receiver* own, std::int32_t, const char*) { Listing::Of(own).failed = true; },
+            [](const Receiver* own, const char* name, const char* key) {
+                Listing::Of(own).at = {name, key};
+                return true;
+            },
+            [](const Receiver* own, const Receiver::PluginId* id) {
+                Expect(std::strcmp(id->abi, "clap") == 0, "lists a preset of another format");
+                Listing::Of(own).presets[id->id].push_back(Listing::Of(own).at);
+            },
+            ignore,
+            [](const Receiver*, std::uint32_t) {},
+            ignore,
+            ignore,
+            [](const Receiver*, std::uint64_t, std::uint64_t) {},
+            ignore,
+            [](const Receiver*, const char*, const char*) {}};
+        const auto count = factory->count(factory);
+        Expect(
+            !factory->create(factory, &indexer, "no.such.provider") && !factory->descriptor(factory, count),
+            "has a provider of presets that does not exist");
+        for (std::uint32_t i = 0; i < count; ++i) {
+            const auto* const own = factory->create(factory, &indexer, factory->descriptor(factory, i)->id);
+            if (!own) throw std::runtime_error("has a provider of presets that cannot be created");
+            Expect(own->init(own) && listing.located, "does not say where its presets are");
+            Expect(own->list(own, kClapPresetsInPlugin, nullptr, &receiver) && !listing.failed,
+                   "does not list its presets");
+            Expect(!own->list(own, 0, "/nowhere", &receiver) && listing.failed,
+                   "lists the presets of a file");
+            own->destroy(own);
+        }
+    }
+
     void CheckCreation(const clap_plugin_descriptor_t& d) const {
         for (const std::string& id : {std::string(d.id) + "x", std::string("no.such.plugin")})
             if (const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, id.c_str())) {
@@ -382,6 +454,7 @@ private:
 
     Module m_module;
     std::set<std::size_t> m_created;
+    std::map<std::string, std::vector<Preset>> m_presets;  // by plug-in
     const clap_plugin_entry_t* m_entry;
     const clap_plugin_factory_t* m_factory;
 };

@@ -50,13 +50,32 @@ inline void Expect(bool condition, const std::string& otherwise) {
     if (!condition) Finding(otherwise);
 }
 
-// `broken` says what the audio thread did that it must not do; empty when nothing.
-void ExpectRealTime(const std::string& broken);
+// Whether the plug-in at hand neither allocates nor waits while it processes; where a format can say so, it
+// does.
+bool IsRealTime();
 
 enum class Thread { Main, Audio };
 Thread CurrentThread();
 // Runs the work on a thread of its own that counts as the audio thread, and waits for it.
 void OnAudioThread(const std::function<void()>& work);
+
+// A state on its way, so many bytes per call at most.
+struct Stream {
+    const void* table = nullptr;  // where a format's streams begin with one
+    Bytes bytes = {};
+    std::size_t most = 1 << 30, position = 0;
+
+    std::int64_t Read(void* buffer, std::int64_t size);
+    std::int64_t Write(const void* buffer, std::int64_t size);
+};
+
+// A plug-in's window. Deleting it closes it.
+class Window {
+public:
+    virtual ~Window() = default;
+    virtual bool Resize(int width, int height) = 0;
+    virtual void Tick() = 0;  // of the host's timers
+};
 
 // One plug-in in the host. All calls belong to the main thread, but for Process, Reset and FlushActive.
 class Instance {
@@ -65,14 +84,18 @@ public:
 
     std::vector<Parameter> parameters;
     std::vector<Port> inputs, outputs;
+    std::vector<std::string> presets;  // names
 
     virtual std::optional<std::string> Text(const Parameter&, double value) = 0;
     virtual std::optional<double> Value(const Parameter&, const std::string& text) = 0;
     virtual double Get(const Parameter&) = 0;
+    virtual bool TakePreset(std::size_t preset) = 0;
 
-    // The streams move at most so many bytes per call.
-    virtual std::optional<Bytes> Save(std::size_t most) = 0;
-    virtual bool Load(const Bytes&, std::size_t most) = 0;
+    std::optional<Bytes> Save(Stream stream = {}) {
+        return SaveTo(stream) ? std::optional(stream.bytes) : std::nullopt;
+    }
+    virtual bool SaveTo(Stream&) = 0;
+    virtual bool Load(Stream) = 0;
 
     virtual bool Activate(double rate, std::uint32_t maxFrames) = 0;
     virtual void Deactivate() = 0;
@@ -85,12 +108,8 @@ public:
 
     // One channel everywhere, or two; false when the plug-in has no such layout. While inactive.
     virtual bool SetChannels(int channels) = 0;
-    // Its window inside of the X11 window `parent`; false where it has none. Ticks come from the host's
-    // timers.
-    virtual bool OpenWindow(std::uintptr_t parent) = 0;
-    virtual bool ResizeWindow(int width, int height) = 0;
-    virtual void Tick() = 0;
-    virtual void CloseWindow() = 0;
+    // Inside of the X11 window `parent`; null where it has none.
+    virtual std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) = 0;
 
     // The plug-in's own rules for this format, such as what events it must leave alone.
     virtual void CheckFormat() = 0;

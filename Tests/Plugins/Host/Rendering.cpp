@@ -20,6 +20,20 @@ void OnAudioThread(const std::function<void()>& work) {
     }).join();
 }
 
+std::int64_t Stream::Read(void* buffer, std::int64_t size) {
+    const auto count = std::min({static_cast<std::size_t>(size), most, bytes.size() - position});
+    std::copy_n(bytes.data() + position, count, static_cast<char*>(buffer));
+    position += count;
+    return static_cast<std::int64_t>(count);
+}
+
+std::int64_t Stream::Write(const void* buffer, std::int64_t size) {
+    const auto count = std::min(static_cast<std::size_t>(size), most);
+    const char* const from = static_cast<const char*>(buffer);
+    bytes.insert(bytes.end(), from, from + count);
+    return static_cast<std::int64_t>(count);
+}
+
 double Parameter::At(double part) const {
     const double place = steps > 0 ? std::round(part * steps) / steps : part;
     return minimum + place * (maximum - minimum);

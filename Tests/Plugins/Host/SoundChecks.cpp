@@ -24,29 +24,36 @@ double Energy(const Signal& signal, std::size_t from) {
 }
 
 void CheckRatesAndBlocks(PluginFile& file, std::size_t index) {
-    const auto plugin = file.Create(index);
-    const int channels = Channels(plugin->inputs);
-    for (const double rate : {22050.0, 32000.0, 44100.0, 48000.0, 88200.0, 96000.0, 192000.0, 44099.5})
-        for (const std::uint32_t block : {1u, 2u, 17u, 64u, 480u, 1023u, 4096u}) {
-            const Signal input = Noise(channels, block < 64 ? 256 : 4096);
-            Expect(IsFinite(RenderAt(*plugin, rate, input, {.block = block})),
-                   "is not finite at " + std::to_string(rate) + " Hz in blocks of " + std::to_string(block));
-        }
-    Expect(IsFinite(RenderAt(*plugin, 48000, Noise(channels, 48000), {.block = 1024, .mixed = true})),
-           "is not finite in blocks of changing length");
+    bool any = false;
+    for (const int layout : {1, 2}) {
+        const auto plugin = file.Create(index);
+        if (!plugin->SetChannels(layout)) continue;
+        any = true;
+        const int channels = Channels(plugin->inputs);
+        for (const double rate : {22050.0, 32000.0, 44100.0, 48000.0, 88200.0, 96000.0, 192000.0, 44099.5})
+            for (const std::uint32_t block : {1u, 2u, 17u, 64u, 480u, 1023u, 4096u})
+                Expect(
+                    IsFinite(
+                        RenderAt(*plugin, rate, Noise(channels, block < 64 ? 256 : 4096), {.block = block})),
+                    "is not finite at " + std::to_string(rate) + " Hz in blocks of " + std::to_string(block));
+    }
+    Expect(any, "is neither mono nor stereo");
 }
 
 void CheckRepeats(PluginFile& file, std::size_t index) {
-    const auto fresh = file.Create(index), plugin = file.Create(index), inPlace = file.Create(index);
+    const auto fresh = file.Create(index), plugin = file.Create(index), other = file.Create(index);
     const Signal input = Noise(Channels(fresh->inputs), 24000);
     const Signal expected = RenderAt(*fresh, 48000, input);
     const auto expect = [&](const Signal& output, const std::string& text) {
         const double difference = LargestDifference(expected, output);
         Expect(difference < 1e-5, text + " (by " + std::to_string(difference) + ")");
     };
+    if (IsRealTime())  // others cut the stream in their own way
+        expect(RenderAt(*other, 48000, input, {.block = 1024, .mixed = true}),
+               "sounds otherwise in blocks of changing length");
     // Only the main ports share memory, and only when they are alike.
     if (plugin->inputs.front().channels == plugin->outputs.front().channels)
-        expect(RenderAt(*inPlace, 48000, input, {.inPlace = true}), "sounds otherwise in place");
+        expect(RenderAt(*other, 48000, input, {.inPlace = true}), "sounds otherwise in place");
     plugin->Activate(48000, 256);
     Render(*plugin, Noise(Channels(plugin->inputs), 30000, 0.9f, 3));
     OnAudioThread([&] { plugin->Reset(); });
@@ -102,24 +109,12 @@ void CheckExtremes(PluginFile& file, std::size_t index) {
         std::vector<Change> changes;
         for (std::uint32_t frame = 0; frame < 2400; frame += 300) {
             const auto more = ForAll(
-                *plugin, [&] { return static_cast<double>(random()) / 4294967295.0; }, frame);
+                *plugin, [&] { return Share(random); }, frame);
             changes.insert(changes.end(), more.begin(), more.end());
         }
         expect(changes, "under random changes, round " + std::to_string(round));
     }
     plugin->Deactivate();
-}
-
-void CheckLayouts(PluginFile& file, std::size_t index) {
-    int layouts = 0;
-    for (const int channels : {1, 2}) {
-        const auto plugin = file.Create(index);
-        if (!plugin->SetChannels(channels)) continue;
-        ++layouts;
-        const Signal output = RenderAt(*plugin, 48000, Noise(Channels(plugin->inputs), 4800));
-        Expect(static_cast<int>(output.size()) >= channels && IsFinite(output), "its layouts do not sound");
-    }
-    Expect(layouts > 0, "is neither mono nor stereo");
 }
 
 // A side-chain that is there has to be heard at some setting.
@@ -133,7 +128,7 @@ void CheckSideChain(PluginFile& file, std::size_t index) {
     std::mt19937 random(2);
     double difference = 0;
     for (int round = 0; round < 20 && difference < 1e-4; ++round) {
-        const auto changes = ForAll(*with, [&] { return static_cast<double>(random()) / 4294967295.0; });
+        const auto changes = ForAll(*with, [&] { return Share(random); });
         difference = LargestDifference(RenderAt(*with, 48000, loud, {.changes = changes}),
                                        RenderAt(*without, 48000, silent, {.changes = changes}));
     }
@@ -143,8 +138,8 @@ void CheckSideChain(PluginFile& file, std::size_t index) {
 }  // namespace
 
 void CheckSound(PluginFile& file, std::size_t index) {
-    for (const auto check : {CheckRatesAndBlocks, CheckRepeats, CheckBadSamples, CheckSilence, CheckExtremes,
-                             CheckLayouts, CheckSideChain})
+    for (const auto check :
+         {CheckRatesAndBlocks, CheckRepeats, CheckBadSamples, CheckSilence, CheckExtremes, CheckSideChain})
         check(file, index);
 }
 

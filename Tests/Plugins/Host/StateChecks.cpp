@@ -1,13 +1,12 @@
 // States: what a session keeps must come back, and what is no state must do no harm.
 #include <algorithm>
 #include <cmath>
+#include <cstdio>
 
 #include "Checks.h"
 
 namespace PluginHost {
 namespace {
-
-constexpr std::size_t kAll = 1 << 30;
 
 void ExpectSameValues(Instance& plugin, Instance& other, const std::string& when) {
     int differing = 0;
@@ -27,18 +26,17 @@ void ExpectSameValues(Instance& plugin, Instance& other, const std::string& when
 void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
     std::mt19937 random(seed);
     const auto plugin = file.Create(index), restored = file.Create(index), slow = file.Create(index);
-    std::vector<Change> changes =
-        ForAll(*plugin, [&] { return static_cast<double>(random()) / 4294967295.0; });
+    std::vector<Change> changes = ForAll(*plugin, [&] { return Share(random); });
     for (const Parameter& p : plugin->parameters)
         if (p.bypass && seed % 3 == 0) changes.push_back({p.id, p.maximum, 0});
     plugin->Flush(changes);
-    const auto state = plugin->Save(kAll), inPieces = plugin->Save(17);
+    const auto state = plugin->Save(), inPieces = plugin->Save({.most = 17});
     if (!state || !inPieces) return Finding("its state cannot be saved");
     Expect(*state == *inPieces, "its state differs when the stream takes 17 bytes at a time");
-    Expect(restored->Load(*state, kAll), "refuses its own state");
+    Expect(restored->Load({.bytes = *state}), "refuses its own state");
     ExpectSameValues(*plugin, *restored, "after the state came back");
-    Expect(restored->Save(kAll) == state, "saves other bytes than it was given");
-    Expect(slow->Load(*state, 23), "refuses its own state that comes 23 bytes at a time");
+    Expect(restored->Save() == state, "saves other bytes than it was given");
+    Expect(slow->Load({.bytes = *state, .most = 23}), "refuses its own state that comes 23 bytes at a time");
     ExpectSameValues(*plugin, *slow, "after the state came 23 bytes at a time");
 
     // The same values with a block, and while it runs without audio.
@@ -51,7 +49,7 @@ void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
         OnAudioThread([&] { active->FlushActive(changes); });
     active->Deactivate();
     ExpectSameValues(*plugin, *active, seed % 2 ? "set with a block" : "set without audio");
-    Expect(active->Save(kAll) == state, "saves another state where its values came otherwise");
+    Expect(active->Save() == state, "saves another state where its values came otherwise");
 
     const Signal noise = Noise(Channels(plugin->inputs), 12000);
     const double difference =
@@ -62,9 +60,9 @@ void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
 
 void CheckHarm(PluginFile& file, std::size_t index) {
     const auto fresh = file.Create(index), plugin = file.Create(index);
-    const auto state = fresh->Save(kAll);
+    const auto state = fresh->Save();
     if (!state || state->empty()) return Finding("has no state to save");
-    Expect(!plugin->Load({}, kAll), "takes an empty stream for a state");
+    Expect(!plugin->Load({.bytes = {}}), "takes an empty stream for a state");
     ExpectSameValues(*fresh, *plugin, "after an empty state");
     std::mt19937 random(5);
     for (int i = 0; i < 40; ++i) {
@@ -72,7 +70,7 @@ void CheckHarm(PluginFile& file, std::size_t index) {
         if (i % 2) broken.resize(random() % state->size());
         for (int hits = i; hits > 0 && !broken.empty(); --hits)
             broken[random() % broken.size()] = static_cast<char>(random());
-        plugin->Load(broken, kAll);
+        plugin->Load({.bytes = broken});
         Expect(IsFinite(RenderAt(*plugin, 48000, Noise(Channels(plugin->inputs), 256))),
                "does not sound finite after a broken state");
         for (const Parameter& p : plugin->parameters) {
@@ -81,20 +79,22 @@ void CheckHarm(PluginFile& file, std::size_t index) {
                    p.name + " leaves its range after a broken state");
         }
     }
-    Expect(plugin->Load(*state, kAll), "refuses its own state after broken ones");
+    Expect(plugin->Load({.bytes = *state}), "refuses its own state after broken ones");
     ExpectSameValues(*fresh, *plugin, "after broken states and its own");
 }
 
 // What a host may ask for on its main thread while audio runs.
 void CheckBesideAudio(PluginFile& file, std::size_t index) {
     const auto plugin = file.Create(index);
-    const auto state = plugin->Save(kAll);
+    const auto state = plugin->Save();
     if (!state) return;
+    std::mt19937 random(6);
     plugin->Activate(48000, 256);
     const bool finite = FiniteWhile(*plugin, [&] {
         for (int i = 0; i < 40; ++i) {
-            plugin->Save(kAll);
-            plugin->Load(*state, kAll);
+            plugin->Save();
+            plugin->Load({.bytes = *state});
+            if (!plugin->presets.empty()) plugin->TakePreset(random() % plugin->presets.size());
             for (const Parameter& p : plugin->parameters) plugin->Text(p, plugin->Get(p));
         }
     });
@@ -108,6 +108,17 @@ void CheckState(PluginFile& file, std::size_t index) {
     for (unsigned seed = 1; seed <= 6; ++seed) CheckRestoring(file, index, seed);
     CheckHarm(file, index);
     CheckBesideAudio(file, index);
+}
+
+void PrintPresets(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    for (std::size_t preset = plugin->presets.size(); preset-- > 0;) {
+        plugin->TakePreset(preset);
+        std::printf("%s\t%s\t", file.Name(index).c_str(), plugin->presets[preset].c_str());
+        for (const char byte : plugin->Save().value_or(Bytes{}))
+            std::printf("%02x", static_cast<unsigned>(static_cast<unsigned char>(byte)));
+        std::printf("\n");
+    }
 }
 
 }  // namespace PluginHost

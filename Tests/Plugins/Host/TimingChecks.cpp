@@ -15,64 +15,69 @@ const Parameter* Bypass(const Instance& plugin) {
     return nullptr;
 }
 
-struct Lag {
-    std::size_t frames = 0;
-    double likeness = 0;  // of the whole output to the input that much earlier, 0..1
-};
-
-double Energy(const std::vector<float>& signal, std::size_t count) {
-    return std::inner_product(signal.begin(), signal.begin() + static_cast<std::ptrdiff_t>(count),
-                              signal.begin(), 1e-12);
+std::vector<float> Tone(double cycles, std::size_t frames) {
+    std::vector<float> tone(frames);
+    for (std::size_t i = 0; i < frames; ++i)
+        tone[i] = static_cast<float>(0.25 * std::sin(2 * std::numbers::pi * cycles * static_cast<double>(i)));
+    return tone;
 }
 
-// What sounds before or behind the burst counts against it: reverbs and echoes have no lag to measure.
-Lag MeasuredLag(const std::vector<float>& input, const std::vector<float>& output, std::size_t burst) {
+struct Lag {
+    std::size_t frames = 0;
+    double likeness = 0;  // of the output to the input that much earlier, 0..1
+};
+
+// Near the one that the plug-in reports.
+Lag MeasuredLag(const std::vector<float>& input, const std::vector<float>& output, std::size_t reported) {
+    constexpr std::size_t kNear = 2000, kStep = 7;
     Lag best;
-    const double energy = std::sqrt(Energy(input, burst) * Energy(output, output.size()));
-    for (std::size_t lag = 0; lag + burst <= output.size(); ++lag) {
-        const double sum =
-            std::inner_product(input.begin(), input.begin() + static_cast<std::ptrdiff_t>(burst),
-                               output.begin() + static_cast<std::ptrdiff_t>(lag), 0.0);
-        if (const double likeness = std::abs(sum) / energy; likeness > best.likeness) best = {lag, likeness};
+    const auto energy = [](const std::vector<float>& s) {
+        return std::inner_product(s.begin(), s.end(), s.begin(), 1e-12) / kStep;
+    };
+    const double most = std::sqrt(energy(input) * energy(output));
+    for (std::size_t lag = reported - std::min(reported, kNear); lag < reported + kNear; ++lag) {
+        double sum = 0;
+        for (std::size_t i = lag; i < output.size(); i += kStep)
+            sum += static_cast<double>(output[i]) * input[i - lag];
+        if (sum / most > best.likeness) best = {lag, sum / most};
     }
     return best;
 }
 
+// Short tones with pauses: neither steady noise nor one pitch.
 void CheckLatency(PluginFile& file, std::size_t index) {
-    constexpr std::size_t kBurst = 512;
     for (const double rate : {44100.0, 48000.0, 96000.0, 192000.0})
         for (const bool bypassed : {true, false}) {
             const auto plugin = file.Create(index);
             const Parameter* bypass = Bypass(*plugin);
-            if (bypassed && !bypass) continue;
             if (bypassed) plugin->Flush(std::vector<Change>{{bypass->id, bypass->maximum, 0}});
+            const auto frames = static_cast<std::size_t>(rate);
+            std::vector<float> tones = Tone(220 / rate, frames);
+            for (std::size_t i = 0; i < frames; ++i)
+                if (i % (frames / 5) >= frames / 12) tones[i] = 0;
             plugin->Activate(rate, 256);
             const std::size_t latency = plugin->Latency();
-            // The burst comes after all fades; before and behind it there is silence.
-            const std::size_t start = static_cast<std::size_t>(rate / 10);
-            Signal input(static_cast<std::size_t>(Channels(plugin->inputs)),
-                         std::vector<float>(start + latency + 4096));
-            const Signal noise = Noise(static_cast<int>(input.size()), kBurst);
-            for (std::size_t c = 0; c < input.size(); ++c)
-                std::copy(noise[c].begin(), noise[c].end(),
-                          input[c].begin() + static_cast<std::ptrdiff_t>(start));
-            const Signal output = Render(*plugin, input);
+            const Signal output =
+                Render(*plugin, Signal(static_cast<std::size_t>(Channels(plugin->inputs)), tones));
+            Expect(plugin->Latency() == latency, "reports another latency after it sounded");
             plugin->Deactivate();
-            const std::vector<float> behind(output[0].begin() + static_cast<std::ptrdiff_t>(start),
-                                            output[0].end());
-            const Lag lag = MeasuredLag(noise[0], behind, kBurst);
-            const std::string where =
-                std::string(bypassed ? "bypassed" : "active") + " at " + std::to_string(rate) + " Hz";
-            if (bypassed)
-                Expect(lag.frames == latency && lag.likeness > 0.99999,
-                       where + " its output is not its input " + std::to_string(latency) +
-                           " frames later, but (" + std::to_string(lag.likeness) + " alike) " +
-                           std::to_string(lag.frames) + " later");
-            else if (lag.likeness >
-                     0.7)  // effects that change the sound more than that have no lag to measure
-                Expect(lag.frames <= latency + 1 && lag.frames + 1 >= latency,
-                       where + " it reports " + std::to_string(latency) + " frames of latency and takes " +
-                           std::to_string(lag.frames));
+            const std::string at = " at " + std::to_string(rate) + " Hz ";
+            if (bypassed) {
+                float wrong = 0;
+                for (std::size_t i = latency; i < frames; ++i)
+                    wrong = std::max(wrong, std::abs(output[0][i] - tones[i - latency]));
+                Expect(wrong < 1e-6f, "bypassed" + at + "its output is not its input " +
+                                          std::to_string(latency) + " frames later");
+                continue;
+            }
+            const Lag lag = MeasuredLag(tones, output[0], latency);
+            // What changes the sound more than that has no lag to measure.
+            if (latency == 0 && lag.likeness < 0.7) continue;
+            // A splicer is exact on the whole only, and effects without a lag may turn the phase.
+            const double tolerance = !IsRealTime() ? 0.02 * rate : latency == 0 ? 5e-5 * rate : 1;
+            Expect(std::abs(static_cast<double>(lag.frames) - static_cast<double>(latency)) <= tolerance,
+                   at + "it reports " + std::to_string(latency) + " frames of latency and takes " +
+                       std::to_string(lag.frames));
         }
 }
 
@@ -89,13 +94,8 @@ double SharpestBend(const std::vector<float>& signal, std::size_t from, std::siz
 void CheckBypass(PluginFile& file, std::size_t index) {
     const auto plugin = file.Create(index);
     const Parameter* bypass = Bypass(*plugin);
-    if (!bypass) return;
     constexpr std::size_t kOn = 24123, kOff = 48217, kEnd = 72000;
-    Signal input(static_cast<std::size_t>(Channels(plugin->inputs)), std::vector<float>(kEnd));
-    for (auto& channel : input)
-        for (std::size_t i = 0; i < kEnd; ++i)
-            channel[i] = static_cast<float>(
-                0.25 * std::sin(2 * std::numbers::pi * 200 / 48000 * static_cast<double>(i)));
+    const Signal input(static_cast<std::size_t>(Channels(plugin->inputs)), Tone(200.0 / 48000, kEnd));
     const std::vector<Change> changes{{bypass->id, bypass->maximum, kOn},
                                       {bypass->id, bypass->minimum, kOff}};
     const Signal output = RenderAt(*plugin, 48000, input, {.block = 64, .changes = changes});

@@ -5,7 +5,6 @@
 #include <travesty/factory.h>
 #include <travesty/host.h>
 #include <travesty/unit.h>
-#include <travesty/view.h>
 
 #include <algorithm>
 #include <array>
@@ -16,6 +15,8 @@
 
 #include "Formats.h"
 #include "Module.h"
+#include "Vst3Object.h"
+#include "Vst3Window.h"
 
 namespace PluginHost {
 namespace {
@@ -25,21 +26,6 @@ std::string Narrow(const std::int16_t* text) {
     for (; *text; ++text) narrow += static_cast<char>(*text);  // ours are ASCII
     return narrow;
 }
-
-// What the host hands to plug-ins: a table of functions behind a pointer. They live as long as the host, so
-// nobody counts who holds them.
-template <const v3_tuid& kId>
-v3_result V3_API Query(void* self, const v3_tuid iid, void** object) {
-    const bool known = v3_tuid_match(iid, kId) || v3_tuid_match(iid, v3_funknown_iid);
-    *object = known ? self : nullptr;
-    return known ? V3_OK : V3_NO_INTERFACE;
-}
-template <typename Functions, const v3_tuid& kId>
-struct Table : v3_funknown {
-    Functions functions;
-    explicit Table(const Functions& f)
-        : v3_funknown{Query<kId>, [](void*) { return 1u; }, [](void*) { return 1u; }}, functions(f) {}
-};
 
 using ApplicationTable = Table<v3_host_application, v3_host_application_iid>;
 ApplicationTable g_application({[](void*, v3_str_128 name) -> v3_result {
@@ -52,45 +38,35 @@ ApplicationTable g_application({[](void*, v3_str_128 name) -> v3_result {
                                 }});
 ApplicationTable* g_applicationObject = &g_application;
 
-void ExpectMainThread(const char* call) {
+v3_result OnMainThread(const char* call) {
     Expect(CurrentThread() == Thread::Main,
            std::string("calls the host's ") + call + " from the wrong thread");
+    return V3_OK;
 }
-bool g_choosing = false;  // a program
+bool g_choosing = false;  // a program; hosts deadlock on a restart then
 using HandlerTable = Table<v3_component_handler, v3_component_handler_iid>;
-HandlerTable g_handler({[](void*, v3_param_id) -> v3_result { return ExpectMainThread("begin_edit"), V3_OK; },
-                        [](void*, v3_param_id, double) -> v3_result {
-                            return ExpectMainThread("perform_edit"), V3_OK;
-                        },
-                        [](void*, v3_param_id) -> v3_result { return ExpectMainThread("end_edit"), V3_OK; },
-                        [](void*, std::int32_t) -> v3_result {
-                            ExpectMainThread("restart_component");
-                            // Hosts deadlock on it.
+HandlerTable g_handler({[](void*, v3_param_id) { return OnMainThread("begin_edit"); },
+                        [](void*, v3_param_id, double) { return OnMainThread("perform_edit"); },
+                        [](void*, v3_param_id) { return OnMainThread("end_edit"); },
+                        [](void*, std::int32_t) {
                             Expect(!g_choosing, "calls restart_component while a program is chosen");
-                            return V3_OK;
+                            return OnMainThread("restart_component");
                         }});
 HandlerTable* g_handlerObject = &g_handler;
 
-using StreamTable = Table<v3_bstream, v3_bstream_iid>;
-struct HostStream {
-    StreamTable* table;
-    Stream stream;
-
-    static Stream& Of(void* self) { return static_cast<HostStream*>(self)->stream; }
-};
-StreamTable g_stream({[](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
-                          *done = static_cast<std::int32_t>(HostStream::Of(self).Read(buffer, size));
-                          return V3_OK;
-                      },
-                      [](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
-                          *done = static_cast<std::int32_t>(HostStream::Of(self).Write(buffer, size));
-                          return V3_OK;
-                      },
-                      // Ours read and write from one end to the other.
-                      [](void*, std::int64_t, std::int32_t, std::int64_t*) -> v3_result {
-                          return V3_NOT_IMPLEMENTED;
-                      },
-                      [](void*, std::int64_t*) -> v3_result { return V3_NOT_IMPLEMENTED; }});
+// Ours read and write from one end to the other.
+Stream& StreamOf(void* self) { return *static_cast<Stream*>(self); }
+Table<v3_bstream, v3_bstream_iid> g_stream(
+    {[](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
+         *done = static_cast<std::int32_t>(StreamOf(self).Read(buffer, size));
+         return V3_OK;
+     },
+     [](void* self, void* buffer, std::int32_t size, std::int32_t* done) -> v3_result {
+         *done = static_cast<std::int32_t>(StreamOf(self).Write(buffer, size));
+         return V3_OK;
+     },
+     [](void*, std::int64_t, std::int32_t, std::int64_t*) -> v3_result { return V3_NOT_IMPLEMENTED; },
+     [](void*, std::int64_t*) -> v3_result { return V3_NOT_IMPLEMENTED; }});
 
 // The changes of one block: a queue per parameter, all made beforehand.
 using QueueTable = Table<v3_param_value_queue, v3_param_value_queue_iid>;
@@ -154,70 +130,16 @@ ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Change
                             return QueueAt(self, *index);
                         }});
 
-// A window's frame, which leads to the host's timers.
-std::set<v3_timer_handler**> g_timers;
-using LoopTable = Table<v3_run_loop, v3_run_loop_iid>;
-LoopTable g_loop({[](void*, v3_event_handler**, int) -> v3_result { return V3_OK; },
-                  [](void*, v3_event_handler**) -> v3_result { return V3_OK; },
-                  [](void*, v3_timer_handler** timer, std::uint64_t) -> v3_result {
-                      return g_timers.insert(timer).second ? V3_OK : V3_INVALID_ARG;
-                  },
-                  [](void*, v3_timer_handler** timer) -> v3_result {
-                      Expect(g_timers.erase(timer) == 1, "takes away a timer that is not there");
-                      return V3_OK;
-                  }});
-LoopTable* g_loopObject = &g_loop;
-struct FrameTable : v3_plugin_frame_cpp {
-    FrameTable() {
-        query_interface = [](void* self, const v3_tuid iid, void** object) -> v3_result {
-            if (!v3_tuid_match(iid, v3_run_loop_iid)) return Query<v3_plugin_frame_iid>(self, iid, object);
-            *object = &g_loopObject;
-            return V3_OK;
-        };
-        ref = unref = [](void*) { return 1u; };
-        frame.resize_view = [](void*, v3_plugin_view**, v3_view_rect*) -> v3_result { return V3_OK; };
-    }
-} g_frame;
-FrameTable* g_frameObject = &g_frame;
-
-// A plug-in's interface, counted.
-template <typename Interface>
-class Held {
-public:
-    Held() = default;
-    Held(const Held&) = delete;
-    ~Held() { Release(); }
-
-    void** Slot() { return reinterpret_cast<void**>(&m_object); }
-    Interface** Get() const { return m_object; }
-    Interface* operator->() const { return v3_cpp_obj(m_object); }
-    explicit operator bool() const { return m_object != nullptr; }
-    void Release() {
-        if (m_object) v3_cpp_obj_unref(m_object);
-        m_object = nullptr;
-    }
-
-private:
-    Interface** m_object = nullptr;
-};
-
 constexpr std::size_t kQueues = 512, kPoints = 64;
 
 class Vst3Instance : public Instance {
 public:
-    Vst3Instance(v3_plugin_factory** factory, const v3_tuid id) {
-        if (v3_cpp_obj(factory)->create_instance(factory, id, v3_component_iid, m_component.Slot()) != V3_OK)
-            throw std::runtime_error("cannot be created");
+    Vst3Instance(v3_plugin_factory** factory, const v3_tuid id) : m_component(Create(factory, id)) {
         const auto context = reinterpret_cast<v3_funknown**>(&g_applicationObject);
         if (v3_cpp_obj_initialize(m_component.Get(), context) != V3_OK)
             throw std::runtime_error("initialize fails");
-        v3_cpp_obj_query_interface(m_component.Get(), v3_audio_processor_iid,
-                                   reinterpret_cast<v3_audio_processor***>(m_processor.Slot()));
-        if (!m_processor) throw std::runtime_error("has no audio processor");
         // Ours are one object.
-        v3_cpp_obj_query_interface(m_component.Get(), v3_edit_controller_iid,
-                                   reinterpret_cast<v3_edit_controller***>(m_controller.Slot()));
-        if (!m_controller) throw std::runtime_error("has no controller");
+        if (!m_processor || !m_controller) throw std::runtime_error("has no processor or no controller");
         m_controller->set_component_handler(m_controller.Get(),
                                             reinterpret_cast<v3_component_handler**>(&g_handlerObject));
         for (Changes* changes : {&m_in, &m_out}) {
@@ -225,6 +147,7 @@ public:
             for (Queue& queue : changes->queues) queue.points.reserve(kPoints);
         }
         ReadParameters();
+        ReadPrograms();
         ReadPorts();
     }
     ~Vst3Instance() override { v3_cpp_obj_terminate(m_component.Get()); }
@@ -249,15 +172,22 @@ public:
         return m_controller->get_parameter_normalised(m_controller.Get(), parameter.id);
     }
 
-    std::optional<Bytes> Save(std::size_t most) override {
-        HostStream to{&g_stream, {{}, most}};
-        if (m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&to)) != V3_OK)
-            return {};
-        return to.stream.bytes;
+    bool TakePreset(std::size_t preset) override {
+        g_choosing = true;
+        const double place = static_cast<double>(preset) / std::max(m_program.step_count, 1);
+        const bool taken =
+            m_controller->set_parameter_normalised(m_controller.Get(), m_program.param_id, place) == V3_OK;
+        g_choosing = false;
+        return taken;
     }
-    bool Load(const Bytes& bytes, std::size_t most) override {
-        HostStream from{&g_stream, {bytes, most}};
-        return m_component->set_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&from)) == V3_OK;
+
+    bool SaveTo(Stream& stream) override {
+        stream.table = &g_stream;
+        return m_component->get_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&stream)) == V3_OK;
+    }
+    bool Load(Stream stream) override {
+        stream.table = &g_stream;
+        return m_component->set_state(m_component.Get(), reinterpret_cast<v3_bstream**>(&stream)) == V3_OK;
     }
 
     bool Activate(double rate, std::uint32_t maxFrames) override {
@@ -318,32 +248,8 @@ public:
         m_processor->set_processing(m_processor.Get(), true);
     }
 
-    bool OpenWindow(std::uintptr_t parent) override {
-        *m_view.Slot() = m_controller->create_view(m_controller.Get(), "editor");
-        v3_view_rect size{};
-        const auto own = reinterpret_cast<void*>(parent);
-        if (!m_view) return false;
-        m_view->set_frame(m_view.Get(), reinterpret_cast<v3_plugin_frame**>(&g_frameObject));
-        Expect(m_view->is_platform_type_supported(m_view.Get(), "NoSuchType") != V3_OK &&
-                   m_view->attached(m_view.Get(), own, "NoSuchType") != V3_OK,
-               "has windows of an unknown kind");
-        return m_view->get_size(m_view.Get(), &size) == V3_OK && size.right > 0 && size.bottom > 0 &&
-               m_view->attached(m_view.Get(), own, V3_VIEW_PLATFORM_TYPE_NATIVE) == V3_OK;
-    }
-    bool ResizeWindow(int width, int height) override {
-        v3_view_rect size{0, 0, width, height};
-        return m_view->can_resize(m_view.Get()) == V3_OK &&
-               m_view->check_size_constraint(m_view.Get(), &size) == V3_OK &&
-               m_view->on_size(m_view.Get(), &size) == V3_OK;
-    }
-    void Tick() override {
-        for (v3_timer_handler** timer : g_timers) v3_cpp_obj(timer)->on_timer(timer);
-    }
-    void CloseWindow() override {
-        Expect(m_view->removed(m_view.Get()) == V3_OK, "cannot remove its window");
-        Expect(g_timers.empty(), "leaves its timer behind");
-        m_view->set_frame(m_view.Get(), nullptr);
-        m_view.Release();
+    std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
+        return OpenVst3Window(m_controller, parent);
     }
 
     bool SetChannels(int channels) override {
@@ -384,41 +290,29 @@ public:
                        p.name + ": " + std::to_string(value) + " is " + std::to_string(back) +
                            " after the way through plain values");
             }
-        CheckPrograms();
         const Change unknown{0x7fffffff, 0.5, 0};
         Flush({&unknown, 1});
     }
 
 private:
-    // Each has a name, and choosing another one changes values.
-    void CheckPrograms() {
-        Held<v3_unit_information> units;
-        v3_cpp_obj_query_interface(m_controller.Get(), v3_unit_information_iid,
-                                   reinterpret_cast<v3_unit_information***>(units.Slot()));
-        v3_param_info info{};
+    static v3_component** Create(v3_plugin_factory** factory, const v3_tuid id) {
+        void* made = nullptr;
+        if (v3_cpp_obj(factory)->create_instance(factory, id, v3_component_iid, &made) != V3_OK)
+            throw std::runtime_error("cannot be created");
+        return static_cast<v3_component**>(made);
+    }
+    void ReadPrograms() {
+        const Held<v3_unit_information> units(m_controller, v3_unit_information_iid);
         v3_program_list_info list{};
-        for (std::int32_t i = 0; i < m_controller->get_parameter_count(m_controller.Get()); ++i) {
-            m_controller->get_parameter_info(m_controller.Get(), i, &info);
-            if (!(info.flags & V3_PARAM_PROGRAM_CHANGE)) continue;
-            if (!units || units->get_program_list_info(units.Get(), 0, &list) != V3_OK ||
-                list.programCount != info.step_count + 1)
-                return Finding("has other programs than its program parameter");
-            std::set<std::vector<double>> all;
-            for (std::int32_t program = list.programCount; program-- > 0;) {
-                v3_str_128 name{};
-                units->get_program_name(units.Get(), list.id, program, name);
-                const double value = static_cast<double>(program) / std::max(info.step_count, 1);
-                g_choosing = true;
-                m_controller->set_parameter_normalised(m_controller.Get(), info.param_id, value);
-                g_choosing = false;
-                Expect(name[0], "has a program without name");
-                std::vector<double> values;
-                for (const Parameter& p : parameters)
-                    if (p.automatable) values.push_back(Get(p));
-                all.insert(values);
-            }
-            Expect(all.size() > 1 || list.programCount == 1, "its programs are all the same");
+        if (units && units->get_program_list_info(units.Get(), 0, &list) != V3_OK) list = {};
+        for (std::int32_t program = 0; program < list.programCount; ++program) {
+            v3_str_128 name{};
+            units->get_program_name(units.Get(), list.id, program, name);
+            presets.push_back(Narrow(name));
         }
+        const bool chosen = (m_program.flags & V3_PARAM_PROGRAM_CHANGE) != 0;
+        Expect(list.programCount == (chosen ? m_program.step_count + 1 : 0),
+               "has other programs than its program parameter");
     }
 
     void ReadParameters() {
@@ -426,6 +320,7 @@ private:
             v3_param_info info{};
             Expect(m_controller->get_parameter_info(m_controller.Get(), i, &info) == V3_OK,
                    "get_parameter_info fails");
+            if ((info.flags & V3_PARAM_PROGRAM_CHANGE) != 0) m_program = info;
             const auto has = [&](int flag) { return (info.flags & flag) != 0; };
             parameters.push_back({info.param_id, Narrow(info.title), 0, 1, info.default_normalised_value,
                                   info.step_count, has(V3_PARAM_READ_ONLY), has(V3_PARAM_CAN_AUTOMATE),
@@ -450,10 +345,10 @@ private:
                    "describes one bus more than it counts");
         }
     }
-    Held<v3_component> m_component;
-    Held<v3_audio_processor> m_processor;
-    Held<v3_edit_controller> m_controller;
-    Held<v3_plugin_view> m_view;
+    const Held<v3_component> m_component;
+    const Held<v3_audio_processor> m_processor{m_component, v3_audio_processor_iid};
+    const Held<v3_edit_controller> m_controller{m_component, v3_edit_controller_iid};
+    v3_param_info m_program{};
     Changes m_in{&g_changes, {}}, m_out{&g_changes, {}};
     std::vector<std::int16_t> m_lastText;
     double m_rate = 48000;

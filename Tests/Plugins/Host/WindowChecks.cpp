@@ -85,27 +85,27 @@ long Used() {
     return static_cast<long>((memory.uordblks + memory.hblkhd) / 1024);
 }
 
-void Tick(Instance& plugin, int times) {
+void Tick(Window& window, int times) {
     for (int i = 0; i < times; ++i) {
         std::this_thread::sleep_for(std::chrono::milliseconds(33));
-        plugin.Tick();
+        window.Tick();
     }
 }
 
-void UseWindow(Instance& plugin, Parent& parent) {
+void UseWindow(Instance& plugin, Window& window, Parent& parent) {
     std::mt19937 random(3);
-    Tick(plugin, 6);
+    Tick(window, 6);
     Expect(parent.Child() != 0, "its window is not in the host's");
     Expect(parent.Colours() > 50, "its window is empty");
     std::set<Bytes> states;
     for (const unsigned key : {13u, 11u, 12u}) {  // "4", "2" and "3", each after Escape for what is open
         for (const unsigned each : {9u, 9u, 9u, key}) parent.Send(XCB_KEY_PRESS, each, 0, 0);
-        Tick(plugin, 2);
-        states.insert(plugin.Save(1 << 20).value_or(Bytes{}));
+        Tick(window, 2);
+        states.insert(plugin.Save().value_or(Bytes{}));
     }
     Expect(states.size() == 3, "does not do what is typed into its window");
     for (int i = 0; i < 20; ++i) {
-        Expect(plugin.ResizeWindow(static_cast<int>(random() % 2000), static_cast<int>(random() % 1200)),
+        Expect(window.Resize(static_cast<int>(random() % 2000), static_cast<int>(random() % 1200)),
                "its window has no other size");
         const int x = static_cast<int>(random() % 900), y = static_cast<int>(random() % 500);
         const auto button = static_cast<unsigned>(1 + random() % 5),
@@ -113,10 +113,10 @@ void UseWindow(Instance& plugin, Parent& parent) {
         for (const unsigned type : {XCB_BUTTON_PRESS, XCB_MOTION_NOTIFY, XCB_BUTTON_RELEASE})
             parent.Send(static_cast<std::uint8_t>(type), button, x, y);
         parent.Send(XCB_KEY_PRESS, key, x, y);
-        plugin.Tick();
+        window.Tick();
     }
-    Expect(plugin.ResizeWindow(800, 500), "its window has no other size");
-    Tick(plugin, 3);
+    Expect(window.Resize(800, 500), "its window has no other size");
+    Tick(window, 3);
     Expect(parent.Colours() > 20, "its window is empty after other sizes");
 }
 
@@ -132,11 +132,12 @@ void CheckWindow(PluginFile& file, std::size_t index) {
         Render(*plugin, Noise(Channels(plugin->inputs), 24000));
         for (const bool parentGoesFirst : {false, true}) {
             Parent parent;
-            if (!plugin->OpenWindow(parent.Handle())) return Finding("has no window");
-            UseWindow(*plugin, parent);
+            auto window = plugin->OpenWindow(parent.Handle());
+            if (!window) return Finding("has no window");
+            UseWindow(*plugin, *window, parent);
             if (parentGoesFirst) parent.Destroy();
-            Tick(*plugin, 1);
-            plugin->CloseWindow();
+            Tick(*window, 1);
+            window.reset();
             Expect(parent.Child() == 0, "leaves its window behind");
         }
         plugin->Deactivate();

@@ -1,0 +1,12 @@
+#pragma once
+
+#include <travesty/edit_controller.h>
+
+#include "Instance.h"
+#include "Vst3Object.h"
+
+namespace PluginHost {
+
+std::unique_ptr<Window> OpenVst3Window(const Held<v3_edit_controller>&, std::uintptr_t parent);
+
+}  // namespace PluginHost
