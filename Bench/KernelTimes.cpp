@@ -13,11 +13,12 @@
 #include "Support/Signals.h"
 
 // What the kernels cost on any target, without a benchmark library: one line for each, a name and the
-// nanoseconds a stereo frame takes (a transform: the whole). Scripts/compare-targets.sh runs the builds in
-// turn.
+// nanoseconds a stereo frame takes (a transform: the whole). An argument keeps to the names that begin with
+// it. Scripts/compare-targets.sh runs the builds in turn.
 namespace {
 
 constexpr int kFrames = 512, kRate = 48000;
+std::string wanted;
 
 void Check(dsp_status status, const char* what) {
     if (status == DSP_OK) return;
@@ -28,6 +29,7 @@ void Check(dsp_status status, const char* what) {
 // The fastest of many rounds of equal length: what else the machine does only makes a round slower. A round
 // is long enough to hold many calls, as some kernels save their work up for one of several.
 void Report(const std::string& name, double units, const std::function<void()>& once) {
+    if (!name.starts_with(wanted)) return;
     using Clock = std::chrono::steady_clock;
     using Seconds = std::chrono::duration<double>;
     const auto round = [&](int calls) {
@@ -204,7 +206,8 @@ void Analyser(const char* name, std::vector<int> switches) {
 
 }  // namespace
 
-int main() {
+int main(int count, char** arguments) {
+    if (count > 1) wanted = arguments[1];
     const auto noise = TestSupport::Noise<float>(2 * kFrames);
     Effects(noise);
     for (const int bands : {3, 8, 20}) Equaliser(noise, bands, false);

@@ -7,12 +7,11 @@
 namespace Corvo::DSP {
 namespace {
 
-bool wideKernels = HasAvx2();
+bool wideKernels = true;
 
 template <typename Sample>
 const EqKernels<Sample>& Kernels() {
-    if (wideKernels) return EqAvx2Kernels<Sample>();
-    return EqBaselineKernels<Sample>();
+    return HasAvx2() && wideKernels ? EqAvx2Kernels<Sample>() : EqBaselineKernels<Sample>();
 }
 
 template <typename Sample>
@@ -23,7 +22,7 @@ bool Moves(const EqCascade<Sample>& cascade, int band) {
 
 }  // namespace
 
-bool& UsesWideEqKernels() { return wideKernels; }
+bool& MayUseWideEqKernels() { return wideKernels; }
 
 bool MayRunTogether(const EqBands& first, const EqBands& second, int numBands, std::int32_t counter) {
     int movingFirst = 0, movingSecond = 0;

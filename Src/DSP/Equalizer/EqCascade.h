@@ -37,8 +37,8 @@ const EqKernels<Sample>& EqBaselineKernels();
 template <typename Sample>
 const EqKernels<Sample>& EqAvx2Kernels();  // for processors that have it
 
-// Which of them RunCascade takes. A test may turn the wide ones off.
-bool& UsesWideEqKernels();
+// Whether RunCascade takes the wide ones where it can. A test may turn them off.
+bool& MayUseWideEqKernels();
 
 // Runs the first `numBands` bands, as far as they are active, of one channel or of two neighbouring ones.
 // `counter` counts the coefficients on the move; while it is 0 nothing moves.

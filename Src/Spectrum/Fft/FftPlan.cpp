@@ -126,8 +126,7 @@ const Plan<T>* BuildPlan(void* memory, int order, Kind kind) {
 
 template <typename T>
 const Kernels<T>& BestKernels() {
-    if (HasAvx2()) return Avx2Kernels<T>();
-    return BaselineKernels<T>();
+    return HasAvx2() ? Avx2Kernels<T>() : BaselineKernels<T>();
 }
 
 template std::size_t PlanBytes<float>(int, Kind);

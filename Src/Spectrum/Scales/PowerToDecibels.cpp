@@ -10,7 +10,7 @@ void PowerToDecibelsBaseline(const float* power, float* decibels, std::size_t co
 }
 
 void PowerToDecibels(const float* power, float* decibels, std::size_t count, float offset) {
-    static const auto run = HasAvx2() ? PowerToDecibelsAvx2 : PowerToDecibelsBaseline;
+    const auto run = HasAvx2() ? PowerToDecibelsAvx2 : PowerToDecibelsBaseline;
     run(power, decibels, count, offset);
 }
 

@@ -21,8 +21,7 @@ double ShapeOne(double sample, double shape) {
 
 template <typename Sample>
 TubeKernel<Sample> BestTubeKernel() {
-    if (HasAvx2()) return Avx2TubeKernel<Sample>();
-    return BaselineTubeKernel<Sample>();
+    return HasAvx2() ? Avx2TubeKernel<Sample>() : BaselineTubeKernel<Sample>();
 }
 
 }  // namespace
