@@ -44,8 +44,10 @@ public:
     void PointerLeft();
     void Press(const PointerPress& press);
     void Release(float x, float y);
-    // Positive steps zoom in. With control they change the sonogram's speed.
+    // Positive steps zoom in: the frequencies or, with control, the sonogram's time.
     void Wheel(float x, float y, float steps, bool control);
+    // Positive steps lead the sonogram to what is older.
+    void ScrollBack(float steps);
     // False when the key means nothing here.
     bool KeyDown(const KeyPress& press);
     // A command of the menu; false for one that there is not.
@@ -80,6 +82,9 @@ private:
     void FollowFirst();
     void Zoom(double aroundHz, double factor);
     void Pan(double fromHz, double toHz);
+    void DragTime(float x);
+    bool LookBack(double seconds);
+    double SecondsBack() const;
     void SetSpan(double low, double high);
     int Rate() const;
     Corvo::AnalyserReading ReadingAt(float x, float y) const;
@@ -116,7 +121,7 @@ private:
     struct Drag {
         Corvo::AnalyserReading start;
         float x, y;
-        bool moved = false, seeks = false;
+        bool moved = false, seeks = false, inFrequency = false, inTime = false;
     };
     std::optional<Drag> m_drag;
     Corvo::PointF m_pointer{-1.0f, -1.0f};

@@ -328,9 +328,15 @@ void AnalyserWindow::HandleKey(const xcb_key_press_event_t& event) {
 }
 
 void AnalyserWindow::HandleButton(const xcb_button_press_event_t& event) {
-    enum { kLeft = 1, kRight = 3, kUp = 4, kDown = 5 };
+    enum { kLeft = 1, kRight = 3, kUp = 4, kDown = 5, kWheelLeft = 6, kWheelRight = 7 };
     const float x = event.event_x, y = event.event_y;
     m_dirty = true;
+    const bool shift = (event.state & XCB_MOD_MASK_SHIFT) != 0;
+    const bool back = event.detail == kWheelLeft || (shift && event.detail == kUp);
+    if (back || event.detail == kWheelRight || (shift && event.detail == kDown)) {
+        Hold(m_processor)->ScrollBack(back ? 1.0f : -1.0f);
+        return;
+    }
     if (event.detail == kUp || event.detail == kDown) {
         const bool control = (event.state & XCB_MOD_MASK_CONTROL) != 0;
         Hold(m_processor)->Wheel(x, y, event.detail == kUp ? 1.0f : -1.0f, control);
