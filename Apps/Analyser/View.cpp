@@ -24,15 +24,22 @@ Corvo::RectF Unit() { return {0.0f, 0.0f, 1.0f, 1.0f}; }
 
 }  // namespace
 
+std::atomic<int> View::s_views{0}, View::s_sensitivity{0};
+
 View::View(Shell& shell) : m_shell(shell) {
     kivspectrum& first = GetAnalyser();
     first.SetOn(true);
     first.SetTunerOn(true);
-    Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
-    Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
+    // What is shared stays as it was chosen in another.
+    if (s_views++ == 0) {
+        Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
+        Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
+    }
     Do(kShowBoth);
     m_choices = 0;
 }
+
+View::~View() { --s_views; }
 
 void View::Feed(const float* samples, int frames, int channels) {
     if (!samples || frames < 1 || channels < 1) return;
@@ -69,6 +76,8 @@ void View::SetTime(double seconds) {
 }
 
 bool View::Refresh() {
+    // Chosen in another, perhaps.
+    if (m_apart != (kivspectrum::GetSettings().view_flag_a != 0)) FollowFirst();
     // A file that rests leaves its last picture as it is.
     const auto playback = m_shell.GetPlayback();
     if (!playback || playback->playing)

@@ -23,6 +23,9 @@ class View {
 public:
     // Shows spectrum and sonogram with the tuner above. The shell outlives it.
     explicit View(Shell& shell);
+    ~View();
+    View(const View&) = delete;
+    View& operator=(const View&) = delete;
 
     // Audio thread; never waits. Interleaved frames.
     void Feed(const float* samples, int frames, int channels);
@@ -113,7 +116,7 @@ private:
     int m_width = 0, m_height = 0;
     float m_dpi = 96.0f;
     bool m_dirty = true, m_keysShown = false;
-    int m_sensitivity = 0;  // the analyser cannot tell all of them apart
+    static std::atomic<int> s_views, s_sensitivity;  // the analyser cannot tell all of those apart
     unsigned m_choices = 0;
     std::string m_trouble, m_said, m_folder;
     int m_saidFor = 0;  // refreshes that it stays

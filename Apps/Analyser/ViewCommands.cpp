@@ -68,7 +68,7 @@ bool View::IsChosen(int command) const {
     if (IsWithin(command, kFirstReference, kManyReferences))
         return std::abs(Reference() - kReferences[command - kFirstReference]) < 0.05;
     if (command >= kFirstSensitivity && command <= kLastSensitivity)
-        return command - kFirstSensitivity == m_sensitivity;
+        return command - kFirstSensitivity == s_sensitivity;
     if (command >= kFirstOfAnalyser) return first.popupmenu_checked(command);
     if (command >= kFirstInput) return m_shell.CurrentInput() == command - kFirstInput;
     switch (command) {
@@ -111,7 +111,7 @@ bool View::Do(int command) {
     if (command >= kFirstOfAnalyser) {
         if (!first.popupmenu_process(command)) return false;
         if (command >= kFirstSensitivity && command <= kLastSensitivity)
-            m_sensitivity = command - kFirstSensitivity;
+            s_sensitivity = command - kFirstSensitivity;
         FollowFirst();
         return true;
     }

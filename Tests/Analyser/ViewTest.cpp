@@ -263,9 +263,14 @@ TEST_F(LiveView, TheTimelineSeeks) {
     EXPECT_FALSE(m_shell.playback->playing);
 }
 
-// Catches channels that are mixed although they are to be shown apart.
+// Catches channels that are mixed although they are to be shown apart, choices that do not reach another
+// view, and one that resets them when it comes.
 TEST_F(LiveView, ShowsTheChannelsApart) {
-    m_view.Do(1282);
+    for (const int command : {kFirstSpeed + 1, 1266, 1348}) m_view.Do(command);
+    View other(m_shell);
+    for (const int command : {kFirstSpeed + 1, 1266, 1348}) EXPECT_TRUE(other.IsChosen(command)) << command;
+    other.Do(1282);
+    m_view.Refresh();
     m_view.SetSamplingRate(48000);
     const auto left = TestSupport::Sine<float>(48000, 1000.0, 48000, 0.5);
     std::vector<float> stereo(2 * left.size());
