@@ -26,6 +26,7 @@ enum Command : int {
     kPlay,
     kBack,
     kForward,
+    kNow,
     kLowerReference,
     kHigherReference,
     kCalibrate,

@@ -17,21 +17,29 @@ using Plot = Corvo::AnalyserReading::Plot;
 constexpr float kHeard = 0.001f;       // -60 dB
 constexpr float kDragDistance = 4.0f;  // in 1/96 inch
 constexpr double kZoomStep = 0.8, kNarrowest = 1.0 / 16.0;
-constexpr int kSaidFor = 120;  // refreshes
+constexpr double kScrolled = 40.0;  // in 1/96 inch
+constexpr int kSaidFor = 120;       // refreshes
 
 Corvo::RectF Unit() { return {0.0f, 0.0f, 1.0f, 1.0f}; }
 
 }  // namespace
 
+std::atomic<int> View::s_views{0}, View::s_sensitivity{0};
+
 View::View(Shell& shell) : m_shell(shell) {
     kivspectrum& first = GetAnalyser();
     first.SetOn(true);
     first.SetTunerOn(true);
-    Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
-    Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
+    // What is shared stays as it was chosen in another.
+    if (s_views++ == 0) {
+        Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
+        Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
+    }
     Do(kShowBoth);
     m_choices = 0;
 }
+
+View::~View() { --s_views; }
 
 void View::Feed(const float* samples, int frames, int channels) {
     if (!samples || frames < 1 || channels < 1) return;
@@ -68,6 +76,8 @@ void View::SetTime(double seconds) {
 }
 
 bool View::Refresh() {
+    // Chosen in another, perhaps.
+    if (m_apart != (kivspectrum::GetSettings().view_flag_a != 0)) FollowFirst();
     // A file that rests leaves its last picture as it is.
     const auto playback = m_shell.GetPlayback();
     if (!playback || playback->playing)
@@ -143,6 +153,28 @@ void View::Pan(double fromHz, double toHz) {
     SetSpan(from, from + width);
 }
 
+// The sonogram ends so long ago, or as long as it can. False when there is no sonogram.
+bool View::LookBack(double seconds) {
+    kivspectrum& first = GetAnalyser();
+    first.GetSonogram()->LookBack(seconds);
+    m_analysers[1].GetSonogram()->LookBack(first.GetSonogram()->GetSecondsBack());
+    m_dirty = true;
+    return first.IsShowSonogram();
+}
+
+double View::SecondsBack() const {
+    const kivspectrum& first = GetAnalyser();
+    return first.IsShowSonogram() ? first.GetSonogram()->GetSecondsBack() : 0.0;
+}
+
+// What stood where the drag began to move in time stands at `x` then.
+void View::DragTime(float x) {
+    const double since = ReadingAt(m_drag->x, m_drag->y).since;
+    if (!std::exchange(m_drag->inTime, true)) m_drag->start.since = since;
+    const double moved = static_cast<double>(x - m_drag->x) / Corvo::Sonogram::GetColumnsPerSecond();
+    LookBack(SecondsBack() + since - m_drag->start.since + moved);
+}
+
 void View::PointTo(float x, float y) {
     m_pointer = {x, y};
     m_dirty = true;
@@ -156,6 +188,11 @@ void View::PointTo(float x, float y) {
     if (std::hypot(x - m_drag->x, y - m_drag->y) > distance) m_drag->moved = true;
     if (!m_drag->moved) return;
     if (m_drag->seeks) return SeekTo(x);
+    if (m_drag->start.plot == Plot::Sonogram) {
+        if (m_drag->inTime || std::abs(x - m_drag->x) > distance) DragTime(x);
+        m_drag->inFrequency = m_drag->inFrequency || std::abs(y - m_drag->y) > distance;
+        if (!m_drag->inFrequency) return;
+    }
     const auto now = ReadingAt(x, y);
     if (now.plot != m_drag->start.plot || now.plot == Plot::None) return;
     Pan(m_drag->start.frequency, now.frequency);
@@ -183,6 +220,7 @@ void View::Press(const PointerPress& press) {
     if (press.clicks == 2 && reading.plot != Plot::None) {
         m_drag.reset();
         Pin({});
+        LookBack(0.0);
         Do(kWholeRange);
         return;
     }
@@ -210,14 +248,25 @@ void View::SeekTo(float x) {
 
 void View::Wheel(float x, float y, float steps, bool control) {
     if (m_menu.IsOpen() || !std::isfinite(steps)) return;
+    const auto reading = ReadingAt(x, y);
     if (control) {
         Do(steps > 0.0f ? kFaster : kSlower);
+        const auto playback = m_shell.GetPlayback();
+        const bool rests = GetAnalyser().GetFrozen() || (playback && !playback->playing);
+        // What goes on keeps its end at now; else what is pointed at stays.
+        if (reading.plot == Plot::Sonogram && (rests || SecondsBack() > 0.0))
+            LookBack(SecondsBack() + ReadingAt(x, y).since - reading.since);
         return;
     }
-    const auto reading = ReadingAt(x, y);
     if (reading.plot == Plot::None) return;
     Zoom(reading.frequency, std::pow(kZoomStep, std::clamp(static_cast<double>(steps), -8.0, 8.0)));
     m_dirty = true;
+}
+
+void View::ScrollBack(float steps) {
+    if (m_menu.IsOpen() || !std::isfinite(steps)) return;
+    const double columns = kScrolled * static_cast<double>(steps * m_dpi / 96.0f);
+    LookBack(SecondsBack() + columns / Corvo::Sonogram::GetColumnsPerSecond());
 }
 
 bool View::KeyDown(const KeyPress& press) {

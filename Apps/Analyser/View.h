@@ -23,6 +23,9 @@ class View {
 public:
     // Shows spectrum and sonogram with the tuner above. The shell outlives it.
     explicit View(Shell& shell);
+    ~View();
+    View(const View&) = delete;
+    View& operator=(const View&) = delete;
 
     // Audio thread; never waits. Interleaved frames.
     void Feed(const float* samples, int frames, int channels);
@@ -44,8 +47,10 @@ public:
     void PointerLeft();
     void Press(const PointerPress& press);
     void Release(float x, float y);
-    // Positive steps zoom in. With control they change the sonogram's speed.
+    // Positive steps zoom in: the frequencies or, with control, the sonogram's time.
     void Wheel(float x, float y, float steps, bool control);
+    // Positive steps lead the sonogram to what is older.
+    void ScrollBack(float steps);
     // False when the key means nothing here.
     bool KeyDown(const KeyPress& press);
     // A command of the menu; false for one that there is not.
@@ -80,6 +85,9 @@ private:
     void FollowFirst();
     void Zoom(double aroundHz, double factor);
     void Pan(double fromHz, double toHz);
+    void DragTime(float x);
+    bool LookBack(double seconds);
+    double SecondsBack() const;
     void SetSpan(double low, double high);
     int Rate() const;
     Corvo::AnalyserReading ReadingAt(float x, float y) const;
@@ -108,7 +116,7 @@ private:
     int m_width = 0, m_height = 0;
     float m_dpi = 96.0f;
     bool m_dirty = true, m_keysShown = false;
-    int m_sensitivity = 0;  // the analyser cannot tell all of them apart
+    static std::atomic<int> s_views, s_sensitivity;  // the analyser cannot tell all of those apart
     unsigned m_choices = 0;
     std::string m_trouble, m_said, m_folder;
     int m_saidFor = 0;  // refreshes that it stays
@@ -116,7 +124,7 @@ private:
     struct Drag {
         Corvo::AnalyserReading start;
         float x, y;
-        bool moved = false, seeks = false;
+        bool moved = false, seeks = false, inFrequency = false, inTime = false;
     };
     std::optional<Drag> m_drag;
     Corvo::PointF m_pointer{-1.0f, -1.0f};

@@ -41,7 +41,7 @@ std::vector<MenuGroup> View::MakeMenu() const {
     const auto inputs = m_shell.Inputs();
     for (const CommandRow& row : Commands()) {
         const std::string_view name = row.group;
-        if (name.empty() || (name == "File" && !plays)) continue;
+        if (name.empty() || (row.command == kPlay && !plays)) continue;
         if (row.command == kFullScreen && !m_shell.CanFillScreen()) continue;
         if (row.command == kLowerReference) {
             for (std::size_t i = 0; i < inputs.size(); ++i)
@@ -68,7 +68,7 @@ bool View::IsChosen(int command) const {
     if (IsWithin(command, kFirstReference, kManyReferences))
         return std::abs(Reference() - kReferences[command - kFirstReference]) < 0.05;
     if (command >= kFirstSensitivity && command <= kLastSensitivity)
-        return command - kFirstSensitivity == m_sensitivity;
+        return command - kFirstSensitivity == s_sensitivity;
     if (command >= kFirstOfAnalyser) return first.popupmenu_checked(command);
     if (command >= kFirstInput) return m_shell.CurrentInput() == command - kFirstInput;
     switch (command) {
@@ -111,7 +111,7 @@ bool View::Do(int command) {
     if (command >= kFirstOfAnalyser) {
         if (!first.popupmenu_process(command)) return false;
         if (command >= kFirstSensitivity && command <= kLastSensitivity)
-            m_sensitivity = command - kFirstSensitivity;
+            s_sensitivity = command - kFirstSensitivity;
         FollowFirst();
         return true;
     }
@@ -133,8 +133,9 @@ bool View::Do(int command) {
     }
     const auto skip = [&](double seconds) {
         const auto playback = m_shell.GetPlayback();
-        if (playback) m_shell.Seek(std::clamp(playback->position + seconds, 0.0, playback->length));
-        return playback.has_value();
+        if (!playback) return LookBack(SecondsBack() - seconds);
+        m_shell.Seek(std::clamp(playback->position + seconds, 0.0, playback->length));
+        return true;
     };
     switch (command) {
         case kShowSpectrum:
@@ -157,6 +158,7 @@ bool View::Do(int command) {
             break;
         case kFreeze:
             first.SetFrozen(!first.GetFrozen());
+            if (!first.GetFrozen()) LookBack(0.0);
             break;
         case kZoomIn:
         case kZoomOut: {
@@ -192,6 +194,8 @@ bool View::Do(int command) {
             return skip(-kSkipSeconds);
         case kForward:
             return skip(kSkipSeconds);
+        case kNow:
+            return LookBack(0.0);
         case kLowerReference:
             SetReference(std::ceil(Reference() - 1.001));
             break;

@@ -6,6 +6,7 @@
 
 #include "Commands.h"
 #include "Drawing/Views/Look.h"
+#include "Spectrum/Sonogram/Sonogram.h"
 #include "View.h"
 
 // What stands in the window: the analyser's own picture, and over it what helps to use it.
@@ -63,13 +64,20 @@ void View::DrawBar(DrawTarget& target, const RectF& bar) {
     const std::string right = "M  menu     H  keys";
     const float rightWidth = target.MeasureText(right, size).width;
     const bool frozen = GetAnalyser().GetFrozen();
+    const double back = SecondsBack();
     std::string source = m_shell.Source();
+    if (back > 0.0) {
+        char text[64];
+        std::snprintf(text, sizeof text, "Sonogram %.1f s back (End: now)     ", back);
+        source = text + source;
+    }
     if (frozen) source = "Frozen (Space goes on)     " + source;
     const auto playback = m_shell.GetPlayback();
     const float room = playback ? bar.width * 0.35f : bar.width - rightWidth - 4.0f * pad;
     float x = bar.x + pad;
     target.PushClip({bar.x, bar.y, std::max(room + pad, 1.0f), bar.height});
-    target.Text(source, {x, baseline}, TextAlign::Left, size, {frozen ? Look::kPeaks : Look::kLabel});
+    target.Text(source, {x, baseline}, TextAlign::Left, size,
+                {frozen || back > 0.0 ? Look::kPeaks : Look::kLabel});
     target.PopClip();
     x += std::min(target.MeasureText(source, size).width, room) + 2.0f * pad;
     const float end = bar.x + bar.width - pad;
@@ -122,10 +130,13 @@ void View::DrawHints(DrawTarget& target, const RectF& rectangle) const {
 // Two columns: keys and what they do.
 void View::DrawKeys(DrawTarget& target, const RectF& rectangle) const {
     const auto commands = Commands();
-    constexpr std::string_view kPointer[][2] = {
-        {"Wheel", "Zoom around the pointer"},           {"Ctrl+Wheel", "Sonogram's speed"},
-        {"Click", "Marker; differences are from it"},   {"Drag", "Move along the frequencies"},
-        {"Double click", "All frequencies, no marker"}, {"Right button", "Menu"}};
+    constexpr std::string_view kPointer[][2] = {{"Wheel", "Zoom around the pointer"},
+                                                {"Ctrl+Wheel", "Zoom in time: sonogram's speed"},
+                                                {"Shift+Wheel", "Sonogram back in time"},
+                                                {"Click", "Marker; differences are from it"},
+                                                {"Drag", "Move in frequency and time"},
+                                                {"Double click", "All frequencies, now, no marker"},
+                                                {"Right button", "Menu"}};
     const float count = static_cast<float>(commands.size() + std::size(kPointer));
     const float rows = std::ceil(count / 2.0f), scale = target.Scale();
     const float pitch = std::min(22.0f * scale, (rectangle.height - 40.0f * scale) / rows);
@@ -172,6 +183,10 @@ void View::Draw(cairo_t* context, int width, int height, float dpi) {
         picture.height -= bar;
         m_bar.whole = {0.0f, picture.height, whole.width, bar};
     }
+    // A sonogram hears from the beginning, whichever view is shown.
+    for (kivspectrum& each : m_analysers)
+        if (each.GetOn() && each.GetSonogram()->GetBitmap().IsEmpty())
+            each.GetSonogram()->CheckPixelBufferSize({0.0f, 0.0f, picture.width, picture.height / 2.0f}, 0);
     DrawAnalysers(target, picture);
     if (m_bar.whole.height > 0.0f) DrawBar(target, m_bar.whole);
     if (!m_heard && !m_menu.IsOpen() && !m_keysShown) DrawHints(target, picture);

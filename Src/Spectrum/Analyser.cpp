@@ -14,6 +14,7 @@
 #include "Spectrum/Drawer/VectorInterpolationFilterFloat.h"
 #include "Spectrum/Scales/SpectrumLimits.h"
 #include "Spectrum/Sonogram/Sonogram.h"
+#include "Spectrum/Sonogram/SonogramHistory.h"
 #include "Spectrum/Tuner/Tuner.h"
 
 namespace Corvo {
@@ -284,11 +285,15 @@ bool Analyser::AnnounceNote() {
 bool Analyser::AdvanceSonogram() {
     // The smoothed spectrum is rebuilt under this lock.
     const Lock lock(m_lock);
-    if (!state.showSonogram || !state.on || state.frozen || m_drawer->GetSamplingFrequency() <= 0)
-        return false;
-    ++m_sonogramRefreshes;
+    if (!state.on || state.frozen || m_drawer->GetSamplingFrequency() <= 0) return false;
+    m_sonogram->m_hidden = !state.showSonogram;
     const double pitch = state.tunerOn ? m_tuner->GetHeardFrequency() : 0.0;
-    return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch));
+    return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch)) &&
+           !m_sonogram->m_hidden;
+}
+
+double Analyser::SonogramSeconds() const {
+    return static_cast<double>(m_sonogram->m_rightEdge) / SonogramHistory::kTicksPerSecond;
 }
 
 AnalyserReading Analyser::ReadingAt(PointF place) const {

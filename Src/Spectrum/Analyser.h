@@ -110,15 +110,14 @@ public:
     bool LetTunerWait();
     bool AnnounceNote();
 
-    // The sonogram's part of a display refresh. True when its picture has new columns.
+    // The sonogram's part of a display refresh; hidden, it hears all the same once it had a size. True when
+    // its picture has new columns.
     bool AdvanceSonogram();
-    // Of the sonogram's picture since its beginning.
-    double SonogramSeconds() const { return m_sonogramRefreshes / kRefreshesPerSecond; }
+    // Of the right edge of the sonogram's picture, since its beginning.
+    double SonogramSeconds() const;
     AnalyserReading ReadingAt(PointF place) const;
 
 private:
-    static constexpr double kRefreshesPerSecond = 30.0;
-
     void BuildAgain();
     void Build(const SpectrumSettings& settings, bool reset);
     void BuildTransform();
@@ -134,7 +133,6 @@ private:
     bool m_powerIsFrame = false;      // m_power was made since the buffers were built
     bool m_frameForSonogram = false;  // processed since its last step
     std::atomic<bool> m_transforming{false};
-    double m_sonogramRefreshes = 0.0;
 
     CaptureBuffer m_capture;
     std::vector<float> m_samples;    // the copy that an analysis works on

@@ -33,19 +33,28 @@ protected:
 TEST_F(ProcessorTest, PassesTheSoundThroughUnlessToneIsAskedFor) {
     auto left = TestSupport::Noise<float>(1000), right = TestSupport::Noise<float>(1000);
     right[9] = -0.0f;
+    const int windows[2] = {};
     std::vector<float> outLeft(1000), outRight(1000);
     const auto same = [&] {
         Process(left, right, outLeft, outRight);
         return std::memcmp(left.data(), outLeft.data(), 4000) == 0 &&
                std::memcmp(right.data(), outRight.data(), 4000) == 0;
     };
-    m_processor.SetClipboard([](const std::string&) { return true; });
+    std::string copied;
+    for (const int* window = windows; window != windows + 2; ++window)
+        m_processor.AddWindow(window, [&copied](const std::string& text) {
+            copied = text;
+            return true;
+        });
+    m_processor.RemoveWindow(windows + 1);
+    Hold(m_processor)->Do(kCopyReading);
+    EXPECT_FALSE(copied.empty()) << "the other window is still there";
     EXPECT_TRUE(same());
     Hold(m_processor)->Do(kTone);
     EXPECT_FALSE(same());
     for (const bool bypassed : {true, false}) {
         m_bypassed = bypassed;
-        if (!bypassed) m_processor.SetClipboard({});
+        if (!bypassed) m_processor.RemoveWindow(windows);
         for (int i = 0; i < 3; ++i) same();  // fades out
         EXPECT_TRUE(same());
     }

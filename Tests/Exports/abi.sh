@@ -51,7 +51,7 @@ update() {
     installed=$(mktemp -d)
     trap 'rm -rf "$installed"' EXIT
     cmake --preset release > /dev/null
-    cmake --build --preset release --target DSPDll DSPDrawing dsphost
+    cmake --build --preset release --target DSPDll DSPDrawing dsphost dsphost_shell_files dspdll-analyser
     cmake --install build/release --prefix "$installed" > /dev/null
     local library
     for library in $(libraries "$installed"); do describe "$installed" "$library" > "$(baseline_of "$library")"; done

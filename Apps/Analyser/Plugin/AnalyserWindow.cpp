@@ -114,6 +114,11 @@ private:
     bool Copy(const std::string& text);
     bool IsSeen() const;
     void Draw();
+    // The view with this window's places.
+    Hold Placed() {
+        if (!m_processor.IsDrawnFor(this)) Draw();
+        return Hold(m_processor);
+    }
 
     Processor& m_processor;
     xcb_connection_t* const m_connection;
@@ -193,7 +198,7 @@ bool AnalyserWindow::Open(std::uintptr_t parent) try {
     if (const auto error = Own(xcb_request_check(m_connection, made))) return false;
     m_window = window;
     m_surface.reset(cairo_xcb_surface_create(m_connection, window, visual, m_size.width, m_size.height));
-    m_processor.SetClipboard([this](const std::string& text) { return Copy(text); });
+    m_processor.AddWindow(this, [this](const std::string& text) { return Copy(text); });
     m_dirty = true;
     Show(true);
     return true;
@@ -203,7 +208,7 @@ bool AnalyserWindow::Open(std::uintptr_t parent) try {
 
 void AnalyserWindow::Close() {
     if (m_window == 0) return;
-    m_processor.SetClipboard({});
+    m_processor.RemoveWindow(this);
     Hold(m_processor)->PointerLeft();
     // Cairo knows connections by their address, which the next one may have again.
     cairo_device_t* const device = cairo_device_reference(cairo_surface_get_device(m_surface.get()));
@@ -247,6 +252,7 @@ void AnalyserWindow::Draw() {
         m_image.reset(cairo_image_surface_create(CAIRO_FORMAT_RGB24, width, height));
     cairo_t* context = cairo_create(m_image.get());
     Hold(m_processor)->Draw(context, width, height, static_cast<float>(96.0 * m_scale));
+    m_processor.SetDrawn(this);
     cairo_destroy(context);
     context = cairo_create(m_surface.get());
     cairo_set_source_surface(context, m_image.get(), 0.0, 0.0);
@@ -279,13 +285,13 @@ void AnalyserWindow::Handle(const xcb_generic_event_t& event) {
             break;
         case XCB_BUTTON_RELEASE: {
             const auto& press = reinterpret_cast<const xcb_button_release_event_t&>(event);
-            if (press.detail == XCB_BUTTON_INDEX_1) Hold(m_processor)->Release(press.event_x, press.event_y);
+            if (press.detail == XCB_BUTTON_INDEX_1) Placed()->Release(press.event_x, press.event_y);
             m_dirty = true;
             break;
         }
         case XCB_MOTION_NOTIFY: {
             const auto& motion = reinterpret_cast<const xcb_motion_notify_event_t&>(event);
-            Hold(m_processor)->PointTo(motion.event_x, motion.event_y);
+            Placed()->PointTo(motion.event_x, motion.event_y);
             break;
         }
         case XCB_LEAVE_NOTIFY: {
@@ -328,12 +334,18 @@ void AnalyserWindow::HandleKey(const xcb_key_press_event_t& event) {
 }
 
 void AnalyserWindow::HandleButton(const xcb_button_press_event_t& event) {
-    enum { kLeft = 1, kRight = 3, kUp = 4, kDown = 5 };
+    enum { kLeft = 1, kRight = 3, kUp = 4, kDown = 5, kWheelLeft = 6, kWheelRight = 7 };
     const float x = event.event_x, y = event.event_y;
     m_dirty = true;
+    const bool shift = (event.state & XCB_MOD_MASK_SHIFT) != 0;
+    const bool back = event.detail == kWheelLeft || (shift && event.detail == kUp);
+    if (back || event.detail == kWheelRight || (shift && event.detail == kDown)) {
+        Hold(m_processor)->ScrollBack(back ? 1.0f : -1.0f);
+        return;
+    }
     if (event.detail == kUp || event.detail == kDown) {
         const bool control = (event.state & XCB_MOD_MASK_CONTROL) != 0;
-        Hold(m_processor)->Wheel(x, y, event.detail == kUp ? 1.0f : -1.0f, control);
+        Placed()->Wheel(x, y, event.detail == kUp ? 1.0f : -1.0f, control);
         return;
     }
     if (event.detail != kLeft && event.detail != kRight) return;
@@ -344,7 +356,7 @@ void AnalyserWindow::HandleButton(const xcb_button_press_event_t& event) {
     m_pressed = again ? Clock::time_point{} : now;
     m_x = x;
     m_y = y;
-    Hold(m_processor)->Press({event.detail == kLeft ? Button::Left : Button::Right, x, y, again ? 2 : 1});
+    Placed()->Press({event.detail == kLeft ? Button::Left : Button::Right, x, y, again ? 2 : 1});
 }
 
 bool AnalyserWindow::Copy(const std::string& text) {

@@ -67,10 +67,15 @@ void Processor::SetRate(double rate) {
     Hold(*this)->SetSamplingRate(static_cast<int>(rate));
 }
 
-void Processor::SetClipboard(std::function<bool(const std::string&)> copy) {
+void Processor::AddWindow(const void* window, Clipboard copy) {
     const std::lock_guard lock(m_mutex);
-    m_copy = std::move(copy);
-    if (!m_copy) m_tone.Set(false, 440.0);
+    m_windows.emplace_back(window, std::move(copy));
+}
+
+void Processor::RemoveWindow(const void* window) {
+    const std::lock_guard lock(m_mutex);
+    std::erase_if(m_windows, [&](const auto& each) { return each.first == window; });
+    if (m_windows.empty()) m_tone.Set(false, 440.0);
 }
 
 std::string Processor::Source() const {

@@ -6,6 +6,8 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <utility>
+#include <vector>
 
 #include "Shell.h"
 #include "Tone.h"
@@ -46,11 +48,19 @@ public:
     void SetRate(double rate);
     // Counts up when the picture changes by itself.
     unsigned Changes() const { return m_changes; }
-    // The window's clipboard while there is a window; null takes it away, and the reference tone with it.
-    void SetClipboard(std::function<bool(const std::string&)> copy);
+    // Windows come with their clipboards, of which the latest serves all. The reference tone goes with the
+    // last window.
+    using Clipboard = std::function<bool(const std::string&)>;
+    void AddWindow(const void* window, Clipboard copy);
+    void RemoveWindow(const void* window);
+    // Which of them the view was drawn for last: places are places of that picture. The windows' thread.
+    void SetDrawn(const void* window) { m_drawnFor = window; }
+    bool IsDrawnFor(const void* window) const { return m_drawnFor == window; }
 
     std::string Source() const override;
-    bool Copy(const std::string& text) override { return m_copy && m_copy(text); }
+    bool Copy(const std::string& text) override {
+        return !m_windows.empty() && m_windows.back().second(text);
+    }
     bool IsToneOn() const override { return m_tone.IsOn(); }
     void SetTone(bool on) override;
 
@@ -58,7 +68,8 @@ private:
     void Refresh();
 
     Tone m_tone;
-    std::function<bool(const std::string&)> m_copy;
+    std::vector<std::pair<const void*, Clipboard>> m_windows;
+    const void* m_drawnFor = nullptr;
     std::atomic<float> m_level{-120.0f};
     std::atomic<unsigned> m_changes{0};
     std::atomic<double> m_rate{48000.0};

@@ -146,7 +146,12 @@ void Program::Handle(const SDL_Event& event) {
         case SDL_MOUSEWHEEL: {
             int mouseX = 0, mouseY = 0;
             SDL_GetMouseState(&mouseX, &mouseY);
-            m_view->Wheel(x(mouseX), x(mouseY), event.wheel.preciseY, (SDL_GetModState() & KMOD_CTRL) != 0);
+            const bool shift = (SDL_GetModState() & KMOD_SHIFT) != 0;
+            if (event.wheel.preciseX != 0.0f || shift)
+                m_view->ScrollBack(shift ? event.wheel.preciseY : -event.wheel.preciseX);
+            else
+                m_view->Wheel(x(mouseX), x(mouseY), event.wheel.preciseY,
+                              (SDL_GetModState() & KMOD_CTRL) != 0);
             break;
         }
         case SDL_KEYDOWN:

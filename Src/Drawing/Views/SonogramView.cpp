@@ -42,6 +42,12 @@ void DrawSonogramMarker(kivspectrum& analyser, DrawTarget& target, const RectF& 
     DrawMarker(target, plot, {static_cast<float>(std::max(x, plot.x - 1.0)), y}, false);
 }
 
+// At the edge that is not now.
+void DrawPastEdge(DrawTarget& target, const RectF& plot) {
+    const float width = std::max(std::round(2.0f * target.Scale()), 1.0f);
+    target.FillRectangle({Right(plot) - width, plot.y, width, plot.height}, {Look::kPeaks});
+}
+
 // The map of what is shown of the frequency axis, upright: x counts pixels from the lower edge.
 CoordinatesAndFrequencies UprightMap(float height, const SpectrumSettings& settings, int samplingRate,
                                      const FrequencySpan& span) {
@@ -225,6 +231,7 @@ void DrawSonogramAs(kivspectrum& analyser, DrawTarget& target, const RectF& rect
     target.PushClip(layout.plot);
     DrawPicture(sonogram, target, axis);
     if (analyser.GetTunerOn()) DrawPitchTrace(sonogram, target, axis);
+    if (sonogram.GetSecondsBack() > 0.0) DrawPastEdge(target, layout.plot);
     target.PopClip();
     DrawSonogramMarker(analyser, target, layout.plot,
                        Bottom(layout.plot) - shown.FrequencyToX(ViewAccess::Marker(analyser).frequency));

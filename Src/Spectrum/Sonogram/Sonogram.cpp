@@ -13,6 +13,7 @@
 #include "Spectrum/Scales/PowerToDecibels.h"
 #include "Spectrum/Scales/SpectrumScales.h"
 #include "Spectrum/Sonogram/SonogramColumn.h"
+#include "Spectrum/Sonogram/SonogramHistory.h"
 #include "Spectrum/Sonogram/SonogramPalette.h"
 #include "Spectrum/Sonogram/SonogramRows.h"
 
@@ -25,6 +26,7 @@ constexpr int kFastest = static_cast<int>(std::size(kColumnsPerSecond)) - 1;
 constexpr int kUsualRate = 44100;
 constexpr float kSilent = 0.0f;  // no pitch
 constexpr std::uint32_t kFullLevel = 255;
+constexpr int kTicksPerSecond = SonogramHistory::kTicksPerSecond;
 
 std::atomic<int> g_speedIndex{3};
 std::atomic<int> g_colourScheme{0};
@@ -89,7 +91,8 @@ Sonogram::Sonogram()
       m_rows(std::make_unique<SonogramRows>()),
       m_newest(std::make_unique<SonogramColumn>()),
       m_previous(std::make_unique<SonogramColumn>()),
-      m_map(SonogramAxis{0, m_samplingRate, m_frequencies}.Map()) {
+      m_map(SonogramAxis{0, m_samplingRate, m_frequencies}.Map()),
+      m_history(std::make_unique<SonogramHistory>()) {
     m_bitmap.opaque = true;
     m_intensityScale.opaque = true;
     CookSettings();
@@ -105,78 +108,115 @@ void Sonogram::FollowColours() {
     const SonogramPalette* const palette = g_palette;
     if (palette == m_palette) return;
     m_palette = palette;
-    for (int shade = 0; shade < kShades; ++shade) {
-        const float share = static_cast<float>(shade) / (kShades - 1);
-        const auto level = static_cast<std::uint32_t>(share * kFullLevel + 0.5f);
-        m_pixels[static_cast<std::size_t>(shade)] = level << 24 | ColourAt(*palette, share);
-    }
-    Recolour(m_range);
+    for (std::uint32_t level = 0; level <= kFullLevel; ++level)
+        m_pixels[level] = level << 24 | ColourAt(*palette, static_cast<float>(level) / kFullLevel);
+    for (std::uint32_t& pixel : m_bitmap.pixels) pixel = m_pixels[pixel >> 24];
+    m_bitmap.Changed();
 }
 
 void Sonogram::FollowScales(const SpectrumDrawer& drawer) {
     const SpectrumSettings& settings = drawer.GetSettings();
     m_offset = LevelOffset(settings);
-    if (const float range = VerticalRangeOf(settings); range != m_range) {
-        const float oldRange = std::exchange(m_range, range);
-        Recolour(oldRange);
-        m_columnsStale = true;
-    }
     SonogramAxis axis = Axis();
     axis.scale = FrequencyScaleOf(settings);
     if (drawer.GetSamplingFrequency() > 0) axis.samplingRate = drawer.GetSamplingFrequency();
-    if (axis != Axis()) Reshape(m_bitmap.width, axis);
+    const float range = VerticalRangeOf(settings);
+    if (range == m_range && axis == Axis()) return;
+    m_range = range;
+    m_samplingRate = axis.samplingRate;
+    m_frequencies = axis.scale;
+    m_map = axis.Map();
+    m_columnsStale = m_pictureStale = true;
 }
 
-// Silence stays silence: a wider range must not bring out a floor that was never measured.
-void Sonogram::Recolour(float oldRange) {
-    std::array<std::uint32_t, kFullLevel + 1> pixels;
-    pixels[0] = m_pixels[0];
-    for (std::size_t level = 1; level <= kFullLevel; ++level) {
-        const float share = static_cast<float>(level) / static_cast<float>(kFullLevel);
-        pixels[level] = m_pixels[static_cast<std::size_t>(ShadeOf((share - 1.0f) * oldRange))];
-    }
-    for (std::uint32_t& pixel : m_bitmap.pixels) pixel = pixels[pixel >> 24];
-    m_bitmap.Changed();
+void Sonogram::FollowSpeed() {
+    if (m_columnsPerSecond != g_columnsPerSecond) InitDrawCounter();
 }
 
 void Sonogram::CheckPixelBufferSize(const RectF& rectangle, int rows) {
     FollowColours();
+    FollowSpeed();
     const int width = Pixels(rectangle.width);
-    const int height = rows >= 1 ? rows : Pixels(rectangle.height);
-    SonogramAxis axis = Axis();
-    axis.height = DrawingBitmap::LimitedHeight(width, height);
-    if (width != m_bitmap.width || axis != Axis()) Reshape(width, axis);
+    const int height = DrawingBitmap::LimitedHeight(width, rows >= 1 ? rows : Pixels(rectangle.height));
+    const bool resized = width != m_bitmap.width || height != m_bitmap.height;
+    if (!resized && !m_pictureStale) return;
+    m_history->Keep(static_cast<std::size_t>(width) * static_cast<std::size_t>(height));
+    DrawingBitmap picture;
+    picture.opaque = true;
+    picture.Size(width, height);
+    std::vector<float> pitches(static_cast<std::size_t>(width));
+    PlaceRightEdge(width);
+    Paint(picture, pitches, 0);
+    picture.Changed();
+    m_bitmap = std::move(picture);
+    m_pitches = std::move(pitches);
+    m_map = Axis().Map();
+    m_columnsStale = m_columnsStale || resized;
+    m_pictureStale = false;
 }
 
-// Of several rows that become one the loudest stays; it is the largest pixel too.
-void Sonogram::Reshape(int width, const SonogramAxis& axis) {
-    DrawingBitmap reshaped;
-    reshaped.opaque = true;
-    reshaped.Size(width, axis.height);
-    const int kept = std::min(width, m_bitmap.width), added = width - kept;
-    const std::vector<RowRange> rows = RowsWithin(Axis(), axis);
-    for (int y = 0; y < axis.height; ++y) {
-        const RowRange sources = rows[static_cast<std::size_t>(y)];
-        std::uint32_t* const row = reshaped.Row(y);
-        std::fill_n(row, width, m_pixels[0]);
-        for (int source = sources.first; source < sources.end; ++source) {
-            const std::uint32_t* const pixels = m_bitmap.Row(source) + (m_bitmap.width - kept);
-            for (int x = 0; x < kept; ++x) row[added + x] = std::max(row[added + x], pixels[x]);
-        }
+// Where the picture is to end, and how much of it was heard.
+void Sonogram::PlaceRightEdge(int width) {
+    const std::int64_t now = m_history->Now(), ticks = kTicksPerSecond / m_columnsPerSecond;
+    const std::int64_t earliest = std::min(m_history->Oldest() + width * ticks, now);
+    if (m_looksBack && m_rightEdge < earliest) {
+        m_rightEdge = earliest;
+        m_pictureStale = true;
     }
-    std::vector<float> pitches(static_cast<std::size_t>(width), kSilent);
-    for (int x = 0; x < kept; ++x)
-        pitches[static_cast<std::size_t>(added + x)] = GetPitch(m_bitmap.width - kept + x);
+    if (!m_looksBack) m_rightEdge = now;
+    m_looksBack = m_rightEdge < now;
+    m_heardColumns = static_cast<int>(
+        std::clamp<std::int64_t>((m_rightEdge - m_history->Oldest() + ticks - 1) / ticks, 0, width));
+}
 
-    reshaped.Changed();
-    m_bitmap = std::move(reshaped);
-    m_pitches = std::move(pitches);
-    m_oldestPitch = 0;
-    m_heardColumns = std::min(m_heardColumns, kept);
-    m_samplingRate = axis.samplingRate;
-    m_frequencies = axis.scale;
-    m_map = axis.Map();
-    m_columnsStale = true;
+// The columns from `from` on. Of several rows or columns that become one the loudest stays, and silence stays
+// silence: a wider range must not bring out a floor that was never measured.
+void Sonogram::Paint(DrawingBitmap& picture, std::vector<float>& pitches, int from) const {
+    const int width = picture.width;
+    for (int y = 0; y < picture.height; ++y) std::fill_n(picture.Row(y) + from, width - from, m_pixels[0]);
+    std::fill(pitches.begin() + from, pitches.end(), kSilent);
+    const SonogramAxis axis{picture.height, m_samplingRate, m_frequencies};
+    const std::int64_t ticks = kTicksPerSecond / m_columnsPerSecond;
+    const std::int64_t left = m_rightEdge - (width - from) * ticks;
+    const auto columnAt = [&](std::int64_t tick) {
+        return static_cast<int>(std::clamp<std::int64_t>((tick - left) / ticks + from, from, width));
+    };
+    std::vector<RowRange> rows;
+    const SonogramAxis* rowsOf = nullptr;
+    const auto& stretches = m_history->Stretches();
+    for (auto past = stretches.rbegin(); past != stretches.rend() && past->End() > left; ++past) {
+        if (past->begin >= m_rightEdge) continue;
+        const SonogramScale& scale = past->scale;
+        const bool sameRows = scale.axis == axis;
+        if (!sameRows && (!rowsOf || scale.axis != *rowsOf)) rows = RowsWithin(scale.axis, axis);
+        rowsOf = sameRows ? rowsOf : &scale.axis;
+        std::array<std::uint32_t, kLevels> shown{m_pixels[0]};
+        for (std::uint32_t level = 1; level <= kFullLevel; ++level) {
+            const float share = static_cast<float>(level) / kFullLevel;
+            shown[level] = m_pixels[static_cast<std::size_t>(LevelOf((share - 1.0f) * scale.range))];
+        }
+        const int begin = columnAt(past->begin);
+        const int end = columnAt(std::min(past->End(), m_rightEdge) + ticks - 1);
+        // In bands of rows: each row of the picture is a page of memory of its own.
+        constexpr int kBand = 64;
+        for (int top = 0; top < picture.height; top += kBand)
+            for (int x = begin; x < end; ++x) {
+                const std::int64_t since = left + (x - from) * ticks;
+                const ColumnRange columns = past->Within(since, since + ticks);
+                for (int column = columns.first; column < columns.end; ++column) {
+                    const std::uint8_t* const levels = past->Column(column);
+                    std::uint32_t* pixel = picture.Row(top) + x;
+                    for (int y = top; y < std::min(top + kBand, picture.height); ++y, pixel += width) {
+                        const RowRange range =
+                            sameRows ? RowRange{y, y + 1} : rows[static_cast<std::size_t>(y)];
+                        for (int row = range.first; row < range.end; ++row)
+                            *pixel = std::max(*pixel, shown[levels[row]]);
+                    }
+                    const float pitch = past->pitches[static_cast<std::size_t>(column)];
+                    if (pitch > 0.0f) pitches[static_cast<std::size_t>(x)] = pitch;
+                }
+            }
+    }
 }
 
 bool Sonogram::Step(const SpectrumDrawer& drawer, bool newFrame, float pitchHz) {
@@ -187,10 +227,37 @@ bool Sonogram::Step(const SpectrumDrawer& drawer, bool newFrame, float pitchHz) 
     if (columns == 0 || m_bitmap.IsEmpty()) return false;
     const bool stale = m_columnsStale || m_newest->Height() != m_bitmap.height;
     if (stale || m_frameWaits) ComputeColumn(drawer.GetPowerSmoothed(), m_bitmap.height);
-    WriteColumns(m_frameWaits && !stale ? *m_previous : *m_newest, columns);
-    RememberPitch(pitchHz, columns);
+    Remember(m_frameWaits && !stale ? *m_previous : *m_newest, columns, pitchHz);
     m_frameWaits = m_columnsStale = false;
+    m_pictureStale = m_pictureStale || m_hidden;
+    if (m_hidden) return true;
+    PlaceRightEdge(m_bitmap.width);
+    if (m_looksBack && !m_pictureStale) return true;
+    const int first = m_pictureStale ? 0 : std::max(m_bitmap.width - columns, 0);
+    if (first > 0) {
+        ScrollPixels(columns);
+        std::shift_left(m_pitches.begin(), m_pitches.end(), columns);
+    }
+    Paint(m_bitmap, m_pitches, first);
+    m_bitmap.Changed();
+    m_pictureStale = false;
     return true;
+}
+
+void Sonogram::LookBack(double seconds) {
+    FollowSpeed();
+    const std::int64_t now = m_history->Now(), ticks = kTicksPerSecond / m_columnsPerSecond;
+    const double most = static_cast<double>(now - m_history->Oldest()) / kTicksPerSecond;
+    const auto columns =
+        seconds > 0.0 ? std::llround(std::min(seconds, most) * static_cast<double>(m_columnsPerSecond)) : 0;
+    m_rightEdge = now - columns * ticks;
+    m_looksBack = true;
+    m_pictureStale = true;
+    PlaceRightEdge(m_bitmap.width);
+}
+
+double Sonogram::GetSecondsBack() const {
+    return m_looksBack ? static_cast<double>(m_history->Now() - m_rightEdge) / kTicksPerSecond : 0.0;
 }
 
 void Sonogram::InitDrawCounter() {
@@ -198,11 +265,12 @@ void Sonogram::InitDrawCounter() {
     m_drawCounter = m_columnsPerSecond <= kRefreshesPerSecond ? kRefreshesPerSecond / m_columnsPerSecond
                                                               : 1 - m_columnsPerSecond / kRefreshesPerSecond;
     m_refreshes = 0;
+    m_pictureStale = true;
 }
 int Sonogram::GetDrawCounter() const { return m_drawCounter; }
 
 int Sonogram::ColumnsDue() {
-    if (m_columnsPerSecond != g_columnsPerSecond) InitDrawCounter();
+    FollowSpeed();
     if (m_drawCounter <= 0) return 1 - m_drawCounter;
     if (++m_refreshes < m_drawCounter) return 0;
     m_refreshes = 0;
@@ -218,18 +286,16 @@ void Sonogram::ScrollPixels(int columns) {
 }
 
 // Counted from the last column, which is the newest spectrum exactly.
-void Sonogram::WriteColumns(const SonogramColumn& from, int columns) {
-    const int written = std::min(columns, m_bitmap.width);
-    ScrollPixels(written);
-    m_heardColumns = std::min(m_heardColumns + written, m_bitmap.width);
+void Sonogram::Remember(const SonogramColumn& from, int columns, float pitchHz) {
+    const float pitch = pitchHz > 0.0f && std::isfinite(pitchHz) ? pitchHz : kSilent;
+    const SonogramScale scale{Axis(), m_range, kTicksPerSecond / m_columnsPerSecond};
     const float* const newest = m_newest->Levels();
     const float* const old = from.Levels();
-    for (int y = 0; y < m_bitmap.height; ++y) {
-        const float step = (newest[y] - old[y]) / static_cast<float>(columns);
-        std::uint32_t* const end = m_bitmap.Row(y) + m_bitmap.width;
-        for (int back = written; back > 0; --back)
-            end[-back] =
-                m_pixels[static_cast<std::size_t>(ShadeOf(newest[y] - step * static_cast<float>(back - 1)))];
+    for (int back = columns - 1; back >= 0; --back) {
+        const float share = static_cast<float>(back) / static_cast<float>(columns);
+        std::uint8_t* const levels = m_history->Add(scale, pitch);
+        for (int y = 0; y < scale.axis.height; ++y)
+            levels[y] = static_cast<std::uint8_t>(LevelOf(newest[y] - (newest[y] - old[y]) * share));
     }
 }
 
@@ -253,7 +319,9 @@ int Sonogram::GetColumnHeight() const { return m_newest->Height(); }
 void Sonogram::Clear() {
     std::fill(m_bitmap.pixels.begin(), m_bitmap.pixels.end(), m_pixels[0]);
     std::fill(m_pitches.begin(), m_pitches.end(), kSilent);
-    m_heardColumns = 0;
+    m_history->Clear();
+    m_looksBack = false;
+    PlaceRightEdge(m_bitmap.width);
     m_bitmap.Changed();
     ClearColumn();
 }
@@ -263,9 +331,9 @@ void Sonogram::ClearColumn() {
     m_columnsStale = m_frameWaits = false;
 }
 
-int Sonogram::ShadeOf(float decibels) const {
+int Sonogram::LevelOf(float decibels) const {
     const float share = decibels / m_range + 1.0f;
-    return share > 0.0f ? static_cast<int>(std::min(share, 1.0f) * (kShades - 1) + 0.5f) : 0;
+    return share > 0.0f ? static_cast<int>(std::min(share, 1.0f) * (kLevels - 1) + 0.5f) : 0;
 }
 
 std::uint32_t Sonogram::ColorFromAmplitude(float decibels, bool asColourReference) const {
@@ -301,17 +369,8 @@ float Sonogram::GetPointAmplitude(float x, float y, const RectF& rectangle) cons
 float Sonogram::GetRange() const { return m_range; }
 const CoordinatesAndFrequencies& Sonogram::GetFrequencyMap() const { return m_map; }
 
-void Sonogram::RememberPitch(float pitchHz, int columns) {
-    const float pitch = pitchHz > 0.0f && std::isfinite(pitchHz) ? pitchHz : kSilent;
-    for (int i = std::min(columns, m_bitmap.width); i > 0; --i) {
-        m_pitches[static_cast<std::size_t>(m_oldestPitch)] = pitch;
-        m_oldestPitch = (m_oldestPitch + 1) % m_bitmap.width;
-    }
-}
-
 float Sonogram::GetPitch(int column) const {
-    if (column < 0 || column >= m_bitmap.width || m_pitches.empty()) return kSilent;
-    return m_pitches[static_cast<std::size_t>((m_oldestPitch + column) % m_bitmap.width)];
+    return column >= 0 && column < m_bitmap.width ? m_pitches[static_cast<std::size_t>(column)] : kSilent;
 }
 
 int Sonogram::GetHeardColumns() const { return m_heardColumns; }
@@ -319,6 +378,6 @@ int Sonogram::GetHeardColumns() const { return m_heardColumns; }
 void Sonogram::SetTimeAtRightEdge(double seconds) {
     m_timeAtRightEdge = std::isfinite(seconds) ? seconds : 0.0;
 }
-double Sonogram::GetTimeAtRightEdge() const { return m_timeAtRightEdge; }
+double Sonogram::GetTimeAtRightEdge() const { return m_timeAtRightEdge - GetSecondsBack(); }
 
 }  // namespace Corvo

@@ -15,13 +15,16 @@ namespace Corvo {
 
 struct ViewAccess;
 
+class Analyser;
 class SonogramColumn;
+class SonogramHistory;
 class SonogramRows;
 struct SonogramAxis;
 struct SonogramPalette;
 
 // The scrolling picture of an analyser's spectra: time to the right, the newest column at the right edge,
-// high frequencies at the top.
+// high frequencies at the top. What has left it is kept, 16 MiB of it and at least what the picture shows,
+// and can be looked back at.
 //
 // Threads: speed and colour scheme are shared by all sonograms and may be read and set from any thread.
 // Everything else belongs to the display thread of its analyser and takes no lock. A step works on every row
@@ -48,17 +51,24 @@ public:
     Sonogram& operator=(const Sonogram&) = delete;
 
     // Makes the picture as wide as the rectangle is in pixels, and `rows` high or, with less than 1, as high
-    // as the rectangle; both within what DrawingBitmap allows, what is not a number being 0. What fits of
-    // the past is kept: the newest columns, every frequency at its new place. When the size changes this and
+    // as the rectangle; both within what DrawingBitmap allows, what is not a number being 0. The past fills
+    // it as far as it is kept, every frequency and moment at its new place. When the size changes this and
     // the next step allocate; without memory they throw std::bad_alloc, and the picture stays as it was.
     void CheckPixelBufferSize(const RectF& rectangle, int rows);
 
     // One refresh of the display, of which there are 30 a second: adds as many columns as the speed wants,
     // and says whether there were any. They lead in equal steps of dB from the previous spectrum to the
     // drawer's smoothed one, or repeat the last when no frame came since the last columns. A change of the
-    // drawer's sampling frequency, frequency scale or range moves the past to where it belongs now. `pitchHz`
-    // is what the tuner hears, 0 for nothing.
+    // drawer's sampling frequency, frequency scale or range, or of the speed, moves the past to where it
+    // belongs now. `pitchHz` is what the tuner hears, 0 for nothing. Once in a while it allocates.
     bool Step(const SpectrumDrawer& drawer, bool newFrame, float pitchHz);
+
+    // The picture ends so many seconds before now, in whole columns, and stays at that moment while new
+    // columns come: at most as long ago as the past fills it. 0, less, or what is not a number: it ends now,
+    // and goes on. The picture follows with the next check of its size.
+    void LookBack(double seconds);
+    // How long before now the picture ends; 0 while it goes on.
+    double GetSecondsBack() const;
 
     // Starts counting refreshes for the current speed. The counter is how many of them a column takes or, at
     // 0 and below, one less how many columns each brings.
@@ -100,8 +110,9 @@ public:
     float GetPitch(int column) const;
     // How many columns at the right were ever written.
     int GetHeardColumns() const;
-    // What the timeline calls the right edge: 0, so that it counts back from now, unless a player tells its
-    // place. Seconds; what is not a number counts as 0.
+    // What the timeline calls the newest column: 0, so that it counts back from now, unless a player tells
+    // its place. Seconds; what is not a number counts as 0. The right edge's is earlier by what the picture
+    // looks back.
     void SetTimeAtRightEdge(double seconds);
     double GetTimeAtRightEdge() const;
 
@@ -121,24 +132,28 @@ public:
 
 private:
     friend struct ViewAccess;  // what the drawing routines keep inside
+    friend class Analyser;
 
-    static constexpr int kShades = 1024;
+    static constexpr int kLevels = 256;
 
     SonogramAxis Axis() const;
     void FollowColours();
     void FollowScales(const SpectrumDrawer& drawer);
-    void Reshape(int width, const SonogramAxis& axis);
-    void Recolour(float oldRange);
+    void FollowSpeed();
     int ColumnsDue();
-    void WriteColumns(const SonogramColumn& from, int columns);
-    void RememberPitch(float pitchHz, int columns);
-    int ShadeOf(float decibels) const;
+    void Remember(const SonogramColumn& from, int columns, float pitchHz);
+    void PlaceRightEdge(int width);
+    void Paint(DrawingBitmap& picture, std::vector<float>& pitches, int from) const;
+    int LevelOf(float decibels) const;
 
     int m_columnsPerSecond = 0;
     int m_drawCounter = 0;
     int m_refreshes = 0;  // since the last column
     bool m_frameWaits = false;
     bool m_columnsStale = true;  // of another axis or range than the picture
+    bool m_pictureStale = true;  // not as the history and the scales say
+    bool m_looksBack = false;
+    bool m_hidden = false;  // the history alone goes on
 
     // What the drawer's settings say.
     int m_samplingRate;
@@ -152,13 +167,14 @@ private:
     std::vector<float> m_decibels;  // of the bins
 
     const SonogramPalette* m_palette = nullptr;     // of the pixels
-    std::array<std::uint32_t, kShades> m_pixels{};  // from silence to full scale
+    std::array<std::uint32_t, kLevels> m_pixels{};  // from silence to full scale
     DrawingBitmap m_bitmap;
     const SonogramPalette* m_barPalette = nullptr;  // of the intensity scale
     DrawingBitmap m_intensityScale;
 
-    std::vector<float> m_pitches;  // a ring, one per column of the picture
-    int m_oldestPitch = 0;
+    std::unique_ptr<SonogramHistory> m_history;
+    std::int64_t m_rightEdge = 0;  // of the picture in the history's ticks
+    std::vector<float> m_pitches;  // one per column of the picture
     int m_heardColumns = 0;
     double m_timeAtRightEdge = 0.0;
     std::vector<PointF> m_trace;  // one stretch of them as drawn

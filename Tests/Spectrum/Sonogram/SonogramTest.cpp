@@ -124,6 +124,7 @@ TEST_F(SonogramTest, LosesNoBin) {
         }
 }
 
+// What passes while another view is shown is heard, too.
 TEST_F(SonogramTest, AdvancesWhileShownAndNotFrozen) {
     kivspectrum analyser;
     analyser.SetOn(true);
@@ -135,6 +136,47 @@ TEST_F(SonogramTest, AdvancesWhileShownAndNotFrozen) {
         analyser.SetFrozen(frozen);
         EXPECT_EQ(analyser.AdvanceSonogram(), shown && !frozen);
     }
+    EXPECT_EQ(analyser.GetSonogram()->GetHeardColumns(), 3) << "Refresh, hidden, shown";
+}
+
+// Catches a past that moves or loses a pixel when it is left and returned to in any way, and one without end.
+TEST_F(SonogramTest, LooksBackToThePixel) {
+    const auto pixels = [&] { return m_sonogram.GetBitmap().pixels; };
+    const auto size = [&](float width, float height) {
+        m_sonogram.CheckPixelBufferSize(Size(width, height), 0);
+        return pixels();
+    };
+    const auto step = [&](int i) { Step(-1.3 * (i * 7 % 60)); };
+    for (int i = 0; i < 160; ++i) step(i);
+    const auto past = pixels();
+    for (int i = 160; i < 200; ++i) step(i);
+    const auto present = pixels();
+    m_sonogram.SetTimeAtRightEdge(5.0);
+    m_sonogram.LookBack(40.0 / 30.0);
+    EXPECT_EQ(size(40, 30), past);
+    EXPECT_NEAR(m_sonogram.GetTimeAtRightEdge(), 5.0 - 40.0 / 30.0, 1e-9);
+    m_sonogram.LookBack(0.0);
+    EXPECT_EQ(size(40, 30), present);
+    m_sonogram.LookBack(1.32);
+    step(200);
+    EXPECT_NEAR(m_sonogram.GetSecondsBack(), 41.0 / 30.0, 1e-9) << "it stays while time goes on";
+    for (const auto& [width, height, speed] :
+         {std::tuple{50, 30, 3}, {17, 9, 3}, {40, 211, 3}, {40, 30, 7}, {40, 30, 1}}) {
+        Corvo::Sonogram::SetSpeedIndex(speed);
+        const auto other = size(static_cast<float>(width), static_cast<float>(height));
+        EXPECT_EQ(other[static_cast<std::size_t>(width) - 1] >> 24 > past[39] >> 24, speed == 1)
+            << "three columns in one";
+        Corvo::Sonogram::SetSpeedIndex(3);
+        EXPECT_EQ(size(40, 30), past) << width << " " << height << " " << speed;
+    }
+    m_sonogram.LookBack(1e300);
+    EXPECT_NEAR(m_sonogram.GetSecondsBack(), 161.0 / 30.0, 1e-9);
+    EXPECT_EQ(m_sonogram.GetHeardColumns(), 40);
+    m_sonogram.LookBack(kNan);
+    size(1, 16384);
+    for (int i = 0; i < 1100; ++i) m_sonogram.Step(m_drawer, false, 0.0f);
+    m_sonogram.LookBack(1e300);
+    EXPECT_NEAR(m_sonogram.GetSecondsBack(), 1023.0 / 30.0, 1e-9) << "16 MiB";
 }
 
 // A frame that comes between two columns waits for the next one.
