@@ -93,7 +93,8 @@ double PitchControl::Target(double transition) {
 double PitchControl::MeanSinceNote(const PitchTrack& track, std::int64_t now) const {
     double sum = 0.0;
     int count = 0;
-    for (std::int64_t i = std::max(m_noteStart, now - Frames(kVibratoMean) + 1); i <= now; ++i)
+    const auto reach = std::max<std::int64_t>(Frames(kVibratoMean), 1);  // one may be longer than the mean
+    for (std::int64_t i = std::max(m_noteStart, now - reach + 1); i <= now; ++i)
         if (track.At(i).hz > 0.0) {
             sum += track.At(i).steady;
             ++count;
