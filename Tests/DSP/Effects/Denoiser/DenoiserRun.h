@@ -16,15 +16,23 @@ inline void SetText(DenoiserProcessor& denoiser, int index, const std::string& t
     denoiser.SetParam(index, denoiser.GetParamValueNormalizedFromText(index, text), false);
 }
 
-// Learns from `noise`, interleaved; further passages add up.
+// Begins to learn, from `noise`, interleaved, and does not end.
 template <typename Sample>
-void Learn(DenoiserProcessor& denoiser, std::vector<Sample> noise, const tWAVEFORMATEX& format) {
-    const int frames = static_cast<int>(noise.size() / format.nChannels);
-    denoiser.InitProcessing(frames, &format);
+void Open(DenoiserProcessor& denoiser, std::vector<Sample> noise, const tWAVEFORMATEX& format) {
     denoiser.SetParam(kLearn, 1.0f, false);
-    ProcessBlock(denoiser, noise.data(), frames, format);
+    ProcessBlock(denoiser, noise.data(), static_cast<int>(noise.size() / format.nChannels), format);
+}
+template <typename Sample = float>
+void Close(DenoiserProcessor& denoiser, const tWAVEFORMATEX& format) {
     denoiser.SetParam(kLearn, 0.0f, false);
     ProcessBlock(denoiser, std::vector<Sample>(format.nChannels).data(), 1, format);
+}
+// Further passages add up.
+template <typename Sample>
+void Learn(DenoiserProcessor& denoiser, const std::vector<Sample>& noise, const tWAVEFORMATEX& format) {
+    denoiser.InitProcessing(static_cast<int>(noise.size() / format.nChannels), &format);
+    Open(denoiser, noise, format);
+    Close<Sample>(denoiser, format);
 }
 
 // What becomes of the samples, the latency taken out.

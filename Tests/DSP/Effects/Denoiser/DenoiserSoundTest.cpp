@@ -142,18 +142,14 @@ TEST(DenoiserSound, StereoHasAProfilePerSideAndOneGain) {
     }
     DenoiserProcessor one, two;
     const auto single = Clean(one, left, mono), both = Clean(two, same, stereo);
-    const auto side = [](const std::vector<double>& stereoSound, std::size_t first) {
-        std::vector<double> samples;
-        for (std::size_t i = first; i < stereoSound.size(); i += 2) samples.push_back(stereoSound[i]);
-        return samples;
-    };
-    EXPECT_EQ(side(both, 0), side(both, 1));
-    EXPECT_LT(Level(Sum(single, side(both, 0), -1.0), 0, 2), Level(single, 0, 2) - 100.0);
+    EXPECT_EQ(Channel(both, 0), Channel(both, 1));
+    EXPECT_LT(Level(Sum(single, Channel(both, 0), -1.0), 0, 2), Level(single, 0, 2) - 100.0);
     Learn(two, different, stereo);
     two.SetParam(kProfile, kLearned, false);
     const auto cleaned = Clean(two, different, stereo);
     for (const std::size_t i : {0u, 1u})
-        EXPECT_NEAR(Level(side(different, i), 0.5, 1.5) - Level(side(cleaned, i), 0.5, 1.5), 25.0, 2.0) << i;
+        EXPECT_NEAR(Level(Channel(different, i), 0.5, 1.5) - Level(Channel(cleaned, i), 0.5, 1.5), 25.0, 2.0)
+            << i;
 }
 
 // Catches drop-outs and clicks where the windows change while sound runs, or learning begins and ends.
