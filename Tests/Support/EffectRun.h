@@ -112,6 +112,11 @@ inline std::string Text(CorvoEffectBase& effect, int index) {
     return Text(effect, index, effect.GetParam(index));
 }
 
+// A parameter of the left side and, right behind it, that of the right one.
+inline void SetBoth(CorvoEffectBase& effect, int index, float value) {
+    for (const int side : {0, 1}) effect.SetParam(index + side, value, false);
+}
+
 inline std::vector<float> AllParams(CorvoEffectBase& effect) {
     std::vector<float> values;
     for (int i = 0; i < effect.GetParamCount(); ++i) values.push_back(effect.GetParam(i));

@@ -69,6 +69,22 @@ std::vector<Sample> Sine(std::size_t frames, double hz, int rate = 48000, double
     return sine;
 }
 
+// The mean power from one second to another, in decibels.
+template <typename Sample>
+double Level(const std::vector<Sample>& mono, double from, double to, int rate = 48000) {
+    double sum = 0.0;
+    const auto first = static_cast<std::size_t>(from * rate), last = static_cast<std::size_t>(to * rate);
+    for (std::size_t i = first; i < last; ++i)
+        sum += static_cast<double>(mono.at(i)) * static_cast<double>(mono[i]);
+    return 10.0 * std::log10(sum / static_cast<double>(last - first) + 1e-30);
+}
+
+template <typename Sample>
+std::vector<Sample> Mixed(std::vector<Sample> a, const std::vector<Sample>& b, double gain = 1.0) {
+    for (std::size_t i = 0; i < a.size(); ++i) a[i] += static_cast<Sample>(gain) * b.at(i);
+    return a;
+}
+
 // One of the channels of an interleaved block.
 template <typename Sample>
 std::vector<Sample> Channel(const std::vector<Sample>& interleaved, std::size_t channel,

@@ -8,6 +8,22 @@
 
 using Corvo::DSP::LatestValue;
 
+TEST(LatestValue, GivesTheNewestOnce) {
+    LatestValue<int> slot;
+    EXPECT_EQ(slot.Take(), nullptr);
+    for (const int value : {1, 2, 3}) {
+        slot.Draft() = value;
+        slot.Publish();
+    }
+    ASSERT_NE(slot.Take(), nullptr);
+    EXPECT_EQ(slot.Take(), nullptr);
+    slot.Draft() = 4;
+    slot.Publish();
+    slot.Draft() = 5;
+    EXPECT_EQ(slot.Taken(), 3) << "what was taken stays while the writer goes on";
+    EXPECT_EQ(*slot.Take(), 4);
+}
+
 // Catches a slot that both threads have at once: a value half written, an old one after a new one, one that
 // is freed on the reader's thread or never.
 TEST(LatestValue, KeepsTheThreadsApart) {

@@ -47,20 +47,4 @@ std::vector<Sample> Clean(DenoiserProcessor& denoiser, const std::vector<Sample>
     return {padded.begin() + late, padded.end()};
 }
 
-// The mean power from one second to another, in decibels.
-template <typename Sample>
-double Level(const std::vector<Sample>& mono, double from, double to, int rate = 48000) {
-    double sum = 0.0;
-    const auto first = static_cast<std::size_t>(from * rate), last = static_cast<std::size_t>(to * rate);
-    for (std::size_t i = first; i < last; ++i)
-        sum += static_cast<double>(mono.at(i)) * static_cast<double>(mono[i]);
-    return 10.0 * std::log10(sum / static_cast<double>(last - first) + 1e-30);
-}
-
-template <typename Sample>
-std::vector<Sample> Sum(std::vector<Sample> a, const std::vector<Sample>& b, double gain = 1.0) {
-    for (std::size_t i = 0; i < a.size(); ++i) a[i] += static_cast<Sample>(gain) * b.at(i);
-    return a;
-}
-
 }  // namespace TestSupport

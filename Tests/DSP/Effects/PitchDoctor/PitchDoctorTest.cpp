@@ -67,7 +67,7 @@ void ExpectDelayed(const std::vector<double>& input, const std::vector<double>& 
 }
 
 // Of the last half.
-double Level(const std::vector<double>& samples, double hz) {
+double LevelAt(const std::vector<double>& samples, double hz) {
     return std::abs(TransformAt(std::span(samples).last(samples.size() / 2), hz / kRate));
 }
 
@@ -120,7 +120,7 @@ TEST(PitchDoctor, KeepsFormants) {
     const auto tilt = [&](const Settings& settings) {
         const auto output = Correct(voice, Exactly(settings));
         const double hz = 175.0 * std::exp2(7.0 / 12.0);  // harmonics 3 and 6 at 787 and 1574 Hz
-        return 20.0 * std::log10(Level(output, 3 * hz) / Level(output, 6 * hz));
+        return 20.0 * std::log10(LevelAt(output, 3 * hz) / LevelAt(output, 6 * hz));
     };
     const Settings up{{"Transpose", "7"}, {"Correction ratio", "0"}};
     auto moved = up;

@@ -14,11 +14,6 @@ namespace {
 
 enum Control { kBoost = 0, kDrive = 2, kTone = 4, kFunction = 6, kOversampling = 8 };
 
-void SetBoth(TubeDistorsion& tube, Control control, float value) {
-    tube.SetParam(control, value, false);
-    tube.SetParam(control + 1, value, false);
-}
-
 // Stereo noise that reaches every branch of the functions.
 const auto kNoise = Noise<double>(2 * 1500, 1.2);
 
