@@ -114,7 +114,7 @@ TEST(CompressorCurve, KneesMoveAlong) {
         for (const int word : edits) {
             if (word < 0) {
                 threshold = word / 10.0;
-                for (int i = 0; i < 50; ++i) SetBoth(effect, kThreshold, static_cast<float>(i) / 50.0f);
+                for (int i = 0; i < 1000; ++i) SetBoth(effect, kThreshold, static_cast<float>(i) / 1e3f);
                 SetBoth(effect, kThreshold, ThresholdPosition(word));
             } else {
                 slope = 1.0 - word / 251.0;
