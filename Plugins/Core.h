@@ -89,5 +89,7 @@ enum class Start { AsPrepared, WithFirstValues };
 
 // A plug-in of the file's table, for 1 or 2 channels. Throws std::bad_alloc.
 std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start start = Start::AsPrepared);
+// The names of the factory presets, in less time than a plug-in takes to make. Throws std::bad_alloc.
+std::vector<std::string> PresetNamesOf(const PluginRow& row);
 
 }  // namespace Corvo::Plugins

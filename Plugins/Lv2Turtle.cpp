@@ -139,7 +139,7 @@ public:
                  << "> ;\n    rdfs:label " << Quoted(m_core->PresetName(preset)) << " ;\n"
                  << "    state:state [ <" << kLv2SettingsKey << "> \"" << Base64(m_core->State())
                  << "\"^^xsd:base64Binary ] ;\n    lv2:port";
-            for (std::size_t i = 0; i < m_core->Ports().size(); ++i)
+            for (std::size_t i = 0; i < m_core->Ports().size() && !m_core->Ports()[i].isOutput; ++i)
                 file << (i > 0 ? "," : "") << "\n        [ lv2:symbol " << Quoted(m_core->Ports()[i].symbol)
                      << " ; pset:value " << Number(m_core->Value(static_cast<int>(i))) << " ]";
             file << " .\n";

@@ -3,6 +3,7 @@
 #include "Adapter.h"
 #include "DSP/Effects/EffectKinds.h"
 #include "EqualiserEffect.h"
+#include "PitchResults.h"
 
 namespace Corvo::Plugins {
 namespace {
@@ -19,7 +20,7 @@ constexpr PluginRow kRows[]{
     {"Chorus",      "chorus",      "DCho", 2, "ChorusPlugin",     "chorus",           "Modulation",   true,  false, false, true,  false, "Chorus and flanger"},
     {"Phaser",      "phaser",      "DPha", 2, "PhaserPlugin",     "phaser",           "Modulation",   true,  false, false, true,  false, "1 to 30 all-pass stages with feedback"},
     {"Reverb",      "reverb",      "DRev", 2, "ReverbPlugin",     "reverb",           "Reverb",       true,  false, false, true,  false, "Early reflections and damped combs"},
-    {"Cantrix",     "cantrix",     "DCan", 2, "PitchPlugin",      "pitch-correction", "Pitch Shift",  true,  false, false, false, true,  "Pitch correction of a voice to a scale; formants stay"},
+    {"Cantrix",     "cantrix",     "DCan", 4, "PitchPlugin",      "pitch-correction", "Pitch Shift",  true,  false, false, false, true,  "Pitch correction of a voice to a scale; formants stay", &kPitchResults},
     {"Pitch Shift", "pitch-shift", "DPit", 2, "PitchPlugin",      "pitch-shifter",    "Pitch Shift",  false, true,  false, false, true,  "Transposes by up to an octave up"},
     {"Denoiser",    "denoiser",    "DDen", 2, "SpectralPlugin",   "restoration",      "Restoration",  true,  false, false, false, true,  "Takes steady noise out of recordings, learned or found while it plays"},
 };
@@ -34,6 +35,13 @@ std::unique_ptr<DSP::CorvoEffectBase> PluginRow::Make() const {
 }
 
 std::span<const PluginRow> PluginRows() { return kRows; }
+
+std::vector<std::string> PresetNamesOf(const PluginRow& row) {
+    const auto effect = row.Make();
+    std::vector<std::string> names;
+    for (int i = 0; i < effect->NumPresets(); ++i) names.push_back(effect->GetPresetName(i));
+    return names;
+}
 
 std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start start) {
     return std::make_unique<Adapter>(row, channels, start);
