@@ -5,7 +5,9 @@
 namespace Corvo::Fft {
 template <typename T>
 struct Plan;
-}
+template <typename T>
+struct SharedPlan;
+}  // namespace Corvo::Fft
 
 // Fast Fourier transforms of one length: forward and inverse, real and complex, float and double, in place
 // and out of place. Forward transforms are unscaled, inverse ones scaled by 1/N.
@@ -15,9 +17,10 @@ struct Plan;
 // values holds the real parts of bin 0 and of bin N/2 at positions 0 and 1, then bin k's real part at 2k and
 // its imaginary part at 2k + 1. The split form holds position 2k in re[k] and position 2k + 1 in im[k].
 //
-// All memory is obtained by Allocate and AllocateReal; no transform allocates. A transform that was not built
-// does nothing. One thread uses an object at a time; two objects may run on two threads. The `int` arguments
-// without a name are not used.
+// All memory is obtained by Allocate and AllocateReal; no transform allocates. The tables belong to all
+// objects of a length together, and the last one frees them: building and releasing may wait for other
+// threads. A transform that was not built does nothing. One thread uses an object at a time; two objects may
+// run on two threads. The `int` arguments without a name are not used.
 class DSP_API CorvoFFT {
 public:
     CorvoFFT();
@@ -59,11 +62,10 @@ public:
     void DoIFFT(double* data, int, int);
 
 private:
-    // The plan lies in `memory`.
     template <typename T>
     struct SetUp {
         const Corvo::Fft::Plan<T>* plan = nullptr;
-        void* memory = nullptr;
+        Corvo::Fft::SharedPlan<T>* shared = nullptr;  // which the plan is of
         T* work = nullptr;
     };
 
