@@ -42,7 +42,7 @@ TEST(PieceRing, DelaysOnWhateverMemoryItFinds) {
             pushed.Push(samples.data(), count);
             const int delay = count + random.Below(length - count + 1);
             const float* const read = pushed.Before(delay, count);
-            float* const oldest = taken.Here(count);
+            float* const oldest = taken.MakeReady(count);
             for (int i = 0; i < count; ++i) {
                 const auto at = static_cast<std::size_t>(i);
                 ASSERT_EQ(read[i], ago(all.size() + at, delay)) << length << ", piece " << piece;
