@@ -33,11 +33,12 @@ public:
         m_full = false;
     }
 
-    // The `count` oldest samples; writing them and advancing makes them the newest.
-    T* Here(int count) {
-        T* const here = m_cells + m_position;
-        if (!m_full) std::fill_n(here, std::min(count, m_length - m_position), T(0));
-        return here;
+    // The `count` oldest samples, made 0 where there were none yet; writing them and advancing makes them the
+    // newest.
+    T* MakeReady(int count) {
+        T* const oldest = m_cells + m_position;
+        if (!m_full) std::fill_n(oldest, std::min(count, m_length - m_position), T(0));
+        return oldest;
     }
     void Advance(int count) {
         const int end = m_position + count;
@@ -60,12 +61,8 @@ public:
     const T* Before(int delay, int count) const {
         static constexpr std::array<T, kPiece> kNothing{};
         if (!m_full && delay - count >= m_position) return kNothing.data();
-        return At(-delay);
-    }
-    // The place of a sample `offset` after the oldest one, in either direction and less than a length away.
-    const T* At(int offset) const {
-        const int at = m_position + offset;
-        return m_cells + (at < 0 ? at + m_length : at >= m_length ? at - m_length : at);
+        const int at = m_position - delay;
+        return m_cells + (at < 0 ? at + m_length : at);
     }
 
 private:

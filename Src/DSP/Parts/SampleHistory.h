@@ -4,7 +4,8 @@
 #include <bit>
 #include <cstddef>
 #include <cstdint>
-#include <vector>
+
+#include "Platform/UntouchedZeros.h"
 
 namespace Corvo::DSP {
 
@@ -16,11 +17,11 @@ public:
     // Keeps at least so many samples, rounded up to a power of two; cleared.
     void Allocate(std::int64_t samples) {
         m_length = static_cast<std::int64_t>(std::bit_ceil(static_cast<std::uint64_t>(samples)));
-        m_samples.assign(static_cast<std::size_t>(2 * m_length), T(0));
+        m_samples = UntouchedZeros<T>(static_cast<std::size_t>(2 * m_length));
         m_end = 0;
     }
     void Clear() {
-        std::ranges::fill(m_samples, T(0));
+        if (m_end > 0) std::ranges::fill(m_samples, T(0));
         m_end = 0;
     }
     void Push(T sample) {
@@ -32,11 +33,11 @@ public:
     std::int64_t Length() const { return m_length; }
     // The sample at `place` and those behind it. `place` is among the kept ones.
     const T* At(std::int64_t place) const { return m_samples.data() + (place & (m_length - 1)); }
-    // Counts places from a later start; `samples` is a multiple of the length.
+    // Counts places from a later start; `samples` is a multiple of the length, and below End().
     void Rebase(std::int64_t samples) { m_end -= samples; }
 
 private:
-    std::vector<T> m_samples;
+    UntouchedZeros<T> m_samples;
     std::int64_t m_length = 1, m_end = 0;
 };
 

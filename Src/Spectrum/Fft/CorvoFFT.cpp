@@ -6,6 +6,7 @@
 
 #include "Platform/AlignedMemory.h"
 #include "Spectrum/Fft/FftPlan.h"
+#include "Spectrum/Fft/SharedPlan.h"
 
 using Corvo::AlignedAllocate;
 using Corvo::AlignedFree;
@@ -30,10 +31,12 @@ int RealLength(const SetUp& setUp) {
     return std::max(static_cast<int>(2 * setUp.plan->points), 1);
 }
 
+// What no transform of this length writes is zero.
 template <typename T>
-T* AllocateZeros(int count) {
-    auto* const values = static_cast<T*>(AlignedAllocate(static_cast<std::size_t>(count) * sizeof(T)));
-    if (values) std::fill_n(values, count, T(0));
+T* AllocateScratch(int length) {
+    auto* const values = static_cast<T*>(AlignedAllocate(static_cast<std::size_t>(length) * sizeof(T)));
+    const int written = length > 1 ? static_cast<int>(std::bit_floor(static_cast<unsigned>(length))) : 0;
+    if (values) std::fill(values + written, values + length, T(0));
     return values;
 }
 
@@ -46,7 +49,7 @@ CorvoFFT& CorvoFFT::operator=(const CorvoFFT&) = default;
 
 template <typename T>
 void CorvoFFT::Release(SetUp<T>& setUp) {
-    AlignedFree(setUp.memory);
+    Corvo::Fft::GiveBack(setUp.shared);
     AlignedFree(setUp.work);
     setUp = {};
 }
@@ -55,9 +58,9 @@ template <typename T>
 void CorvoFFT::Build(SetUp<T>& setUp, int length, bool real) {
     const Kind kind = real ? Kind::Real : Kind::Complex;
     const auto order = static_cast<int>(std::bit_width(static_cast<unsigned>(length))) - 1;
-    setUp.memory = AlignedAllocate(Corvo::Fft::PlanBytes<T>(order, kind));
-    if (!setUp.memory) return;
-    const auto* const plan = Corvo::Fft::BuildPlan<T>(setUp.memory, order, kind);
+    setUp.shared = Corvo::Fft::TakePlan<T>(order, kind);
+    if (!setUp.shared) return;
+    const auto* const plan = setUp.shared->plan;
     setUp.work = static_cast<T*>(AlignedAllocate(Corvo::Fft::WorkValues(plan->points) * sizeof(T)));
     if (setUp.work) setUp.plan = plan;
 }
@@ -101,8 +104,8 @@ void CorvoFFT::AllocateReal(int length, int withInverse) {
     if (length < 1 || length > kMaxLength) return;
     Build(m_realForward32, length, true);
     Build(m_realForward64, length, true);
-    m_scratch32 = AllocateZeros<float>(length);
-    m_scratch64 = AllocateZeros<double>(length);
+    m_scratch32 = AllocateScratch<float>(length);
+    m_scratch64 = AllocateScratch<double>(length);
     m_scratchLength = m_scratch32 && m_scratch64 ? length : 0;
     if (withInverse <= 0) return;
     Build(m_realInverse32, length, true);

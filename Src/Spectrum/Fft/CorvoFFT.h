@@ -6,6 +6,9 @@ namespace Corvo::Fft {
 // The tables of one length.
 template <typename T>
 struct Plan;
+// Shared by all objects of that length.
+template <typename T>
+struct SharedPlan;
 }  // namespace Corvo::Fft
 
 // Fast Fourier transforms of one length: forward and inverse, real and complex, float and double, in place
@@ -17,9 +20,10 @@ struct Plan;
 // its imaginary part at 2k + 1. The split form holds position 2k in re[k] and position 2k + 1 in im[k].
 //
 // All memory is obtained by Allocate and AllocateReal; no transform allocates, and each takes time
-// proportional to N log N. A transform that was not built
-// does nothing. One thread uses an object at a time; two objects may run on two threads. The `int` arguments
-// without a name are not used.
+// proportional to N log N. The tables belong to all objects of a length together, and the last one frees
+// them: building and releasing may wait for other threads. A transform that was not built does nothing. One
+// thread uses an object at a time; two objects may run on two threads. The `int` arguments without a name are
+// not used.
 class DSP_API CorvoFFT {
 public:
     CorvoFFT();
@@ -61,11 +65,10 @@ public:
     void DoIFFT(double* data, int, int);
 
 private:
-    // The plan lies in `memory`.
     template <typename T>
     struct SetUp {
         const Corvo::Fft::Plan<T>* plan = nullptr;
-        void* memory = nullptr;
+        Corvo::Fft::SharedPlan<T>* shared = nullptr;  // which the plan is of
         T* work = nullptr;
     };
 

@@ -143,6 +143,21 @@ TYPED_TEST(CorvoFFTOf, EveryInstructionSetGivesTheSameBits) {
         }
 }
 
+// Catches tables that go while another object of the length still has them.
+TEST(CorvoFFTSetUp, OutlivesOthersOfItsLength) {
+    CorvoFFT kept;
+    auto first = Noise<float>(64), second = first;
+    {
+        CorvoFFT other;
+        for (auto* fft : {&other, &kept}) fft->AllocateReal(64, 0);
+        other.DoFFTReal(first.data(), 0, 0);
+    }
+    CorvoFFT another;  // into the memory that may have become free
+    another.AllocateReal(32, 0);
+    kept.DoFFTReal(second.data(), 0, 0);
+    EXPECT_EQ(first, second);
+}
+
 // Catches an inverse that goes, or changes its length, with a forward transform that is built anew; and one
 // that stays when all is released.
 TEST(CorvoFFTSetUp, ReplacesOnlyWhatItBuilds) {

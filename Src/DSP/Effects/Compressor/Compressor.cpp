@@ -173,8 +173,8 @@ Compressor::Compressor()
       m_ui(std::make_unique<UserInterfaceSide>()),
       m_audio(std::make_unique_for_overwrite<AudioSide>()),
       m_hand_over(std::make_unique_for_overwrite<HandOver>()) {
-    m_audio->current.settings = GetPresetData(kDefaultPreset);
-    SetPreset(kDefaultPreset);
+    m_ui->preset = kDefaultPreset;
+    m_ui->edited.settings = m_audio->current.settings = GetPresetData(kDefaultPreset);
 }
 
 Compressor::~Compressor() = default;

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "Platform/AlignedMemory.h"
+#include "Platform/UntouchedZeros.h"
 
 namespace Corvo::DSP::Denoising {
 
@@ -16,7 +17,10 @@ using Floats = std::vector<float, AlignedAllocator<float>>;
 // own it only counts, so that the same code says how much is needed.
 class Arena {
 public:
-    void Reserve(std::size_t count) { m_memory.assign(count, 0.0f); }
+    void Reserve(std::size_t count) {
+        m_memory = UntouchedZeros<float>(count);
+        m_taken = 0;
+    }
     void Reset() {
         std::fill_n(m_memory.begin(), std::min(m_taken, m_memory.size()), 0.0f);
         m_taken = 0;
@@ -33,9 +37,17 @@ public:
 private:
     static constexpr std::size_t kLine = 16;
 
-    Floats m_memory;
+    UntouchedZeros<float> m_memory;
     std::size_t m_taken = 0;
 };
+
+// Memory for all that `lay` takes out of an arena; called twice.
+void ReserveFor(Arena& arena, const auto& lay) {
+    Arena counting;
+    lay(counting);
+    arena.Reserve(counting.Taken());
+    lay(arena);
+}
 
 // The newest frames of a spectrum. A frame before the first is the first one.
 class FrameRing {

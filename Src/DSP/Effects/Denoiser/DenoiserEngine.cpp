@@ -10,10 +10,7 @@ namespace {
 constexpr float kPerDb = 0.23025851f;  // natural logarithm of a power
 constexpr int kGlide = 512;
 constexpr int kTrackerSettles = 8192;
-constexpr double kLowestBandHz = 62.5;
 constexpr double kMostRate = std::numeric_limits<int>::max();
-constexpr std::size_t kBlendIndex = 1, kTrackIndex = 3;
-static_assert(kLearnedLengths[kBlendIndex] == kBlendLength && kLearnedLengths[kTrackIndex] == kTrackLength);
 
 // The value at a place between the bands.
 float AtPlace(const std::array<float, kGainBands>& bands, float place) {
@@ -45,39 +42,58 @@ std::size_t DenoiserEngine::LengthIndex(std::size_t size) const {
 
 void DenoiserEngine::Prepare(double rate, std::size_t channels) {
     const Scale scale = Scale::Of(rate);
-    if (!(scale == m_scale) || m_dry.empty()) {
+    const bool afresh = !(scale == m_scale) || m_dry.empty();
+    if (afresh) {
         m_dry.clear();
         m_scale = scale;
         m_tick = std::min(kUnit, scale(kUnit));
         for (std::size_t i = 0; i < kLengths; ++i) m_windows[i].Prepare(scale(kLearnedLengths[i]));
-        m_trackerTables.Prepare(m_windows[kTrackIndex]);
+        ReserveFor(m_tableMemory, [&](Arena& arena) { LayoutTables(arena); });
         for (std::size_t i = 0; i < kLengths; ++i) {
             if (i != kTrackIndex) m_conversions[i].Prepare(m_windows[kTrackIndex], m_windows[i]);
-            const std::size_t values = m_windows[i].Values();
-            auto& curves = m_curves[i];
-            for (auto* each : {&curves.offset, &curves.floor, &curves.logFloor, &curves.band})
-                each->assign(values, 0.0f);
-            for (auto& channel : m_learned) channel[i].assign(values, 1.0f);
+            for (auto& channel : m_learned) channel[i].assign(m_windows[i].Values(), 1.0f);
         }
-        for (auto& passage : m_passage) passage.assign(m_windows.back().Values(), 0.0f);
-        m_order.assign(m_windows[kTrackIndex].Values(), 0.0f);
+        m_order = UntouchedZeros<float>(m_windows[kTrackIndex].Values());
         m_learner.Prepare(m_windows);
-        std::size_t most = 0;
-        m_channels = kMostChannels;
-        m_rate = rate;
-        for (const auto& set : kSizeSets) {
-            m_set = &set;
-            Arena counting;
-            Layout(counting);
-            most = std::max(most, counting.Taken());
-        }
-        m_arena.Reserve(most);
-        m_dry.assign(kMostChannels * static_cast<std::size_t>(scale(kLongestRing)), 0.0);
     }
+    m_tables = TablesFor(rate);
+    for (std::size_t i = 0; i < kLengths; ++i) {
+        m_windows[i].Use(*m_tables, i);
+        m_conversions[i].Use(m_tables->responses[i]);
+    }
+    if (afresh) ReserveMemory(rate);
     m_learner.Cancel();
     m_learnedSeconds = 0.0;
     m_preparedRate = rate;
     SetFormat(rate, channels);
+}
+
+// What stays as it is through every change of settings.
+void DenoiserEngine::LayoutTables(Arena& arena) {
+    for (std::size_t i = 0; i < kLengths; ++i) {
+        m_windows[i].PrepareRates(arena);
+        for (auto* each : {&m_curves[i].offset, &m_curves[i].floor, &m_curves[i].logFloor})
+            *each = arena.Take(m_windows[i].Values());
+    }
+    for (auto& passage : m_passage)
+        passage = {arena.Take(m_windows.back().Values()), m_windows.back().Values()};
+}
+
+// For any settings.
+void DenoiserEngine::ReserveMemory(double rate) {
+    std::size_t most = 0;
+    m_channels = kMostChannels;
+    m_rate = rate;
+    for (const auto& set : kSizeSets) {
+        m_set = &set;
+        Arena counting;
+        Layout(counting);
+        most = std::max(most, counting.Taken());
+    }
+    m_set = &kSizeSets[0];
+    m_arena.Reserve(most);
+    m_dry = UntouchedZeros<double>(kMostChannels * static_cast<std::size_t>(m_scale(kLongestRing)));
+    m_dryTime = 0;
 }
 
 void DenoiserEngine::SetFormat(double rate, std::size_t channels) {
@@ -85,17 +101,9 @@ void DenoiserEngine::SetFormat(double rate, std::size_t channels) {
     m_rate = rate;
     m_channels = channels;
     m_fresh = true;
-    std::ranges::fill(m_dry, 0.0);
+    if (m_dryTime > 0) std::ranges::fill(m_dry, 0.0);
     m_dryTime = 0;
-    for (std::size_t i = 0; i < kLengths; ++i) {
-        auto& windows = m_windows[i];
-        windows.SetRate(rate, m_windows[kBlendIndex].length);
-        for (std::size_t bin = 0; bin < windows.Values(); ++bin) {
-            const double hz = static_cast<double>(bin) * rate / windows.length;
-            m_curves[i].band[bin] = static_cast<float>(
-                std::clamp(std::log2(std::max(hz, 1.0) / kLowestBandHz), 0.0, kGainBands - 1.0));
-        }
-    }
+    for (auto& windows : m_windows) windows.SetRate(rate, m_windows[kBlendIndex].length);
     Start(false);
 }
 
@@ -110,7 +118,7 @@ void DenoiserEngine::Layout(Arena& arena) {
         m_input[c].Take(arena, ring);
         for (std::size_t i = 0; i < count; ++i) m_sized[i][c].Take(arena, ring);
         if (count > 1) m_blended[c].Take(arena, ring);
-        m_trackers[c].Prepare(arena, m_windows[kTrackIndex], m_trackerTables,
+        m_trackers[c].Prepare(arena, m_windows[kTrackIndex], m_tables->tracker,
                               std::span(conversions).first(count), m_rate);
     }
     for (std::size_t i = 0; i < count; ++i)
@@ -187,16 +195,17 @@ void DenoiserEngine::CookCurves() {
     const auto& kernels = BestSpectrumKernels();
     for (std::size_t i = 0; i < static_cast<std::size_t>(m_set->count); ++i) {
         auto& curves = m_curves[LengthIndex(i)];
-        const std::size_t values = curves.band.size();
+        const float* const places = m_windows[LengthIndex(i)].bins->gainPlace;
+        const std::size_t values = m_windows[LengthIndex(i)].Values();
         for (std::size_t bin = 0; bin < values; ++bin) {
-            const float place = curves.band[bin];
+            const float place = places[bin];
             curves.floor[bin] = kPerDb * (m_settings.sensitivityDb + AtPlace(m_settings.gainDb, place));
             curves.logFloor[bin] =
                 -0.5f * kPerDb * std::min(m_settings.reductionDb, AtPlace(m_settings.rangeDb, place));
         }
-        kernels.exponential(curves.floor.data(), curves.offset.data(), values);
-        kernels.exponential(curves.logFloor.data(), curves.floor.data(), values);
-        m_reducers[i].SetCurves(curves.offset.data(), curves.floor.data(), curves.logFloor.data());
+        kernels.exponential(curves.floor, curves.offset, values);
+        kernels.exponential(curves.logFloor, curves.floor, values);
+        m_reducers[i].SetCurves(curves.offset, curves.floor, curves.logFloor);
     }
 }
 

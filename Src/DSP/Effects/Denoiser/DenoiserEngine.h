@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstdint>
+#include <memory>
 #include <type_traits>
 #include <utility>
 #include <vector>
@@ -12,8 +13,6 @@
 #include "DSP/Effects/Denoiser/SizeBlend.h"
 
 namespace Corvo::DSP::Denoising {
-
-constexpr std::size_t kGainBands = 8;  // octaves from 63 Hz to 8 kHz
 
 enum class ProfileMode { Learned, Following, Adaptive };
 
@@ -64,9 +63,9 @@ public:
     const Format_t& Format() const { return m_format; }
 
 private:
+    // The profile's offset as a factor, the floor and its logarithm.
     struct Curves {
-        Floats offset, floor, logFloor;  // the profile's offset as a factor, the floor and its logarithm
-        Floats band;                     // per bin the place between the gain bands
+        float *offset = nullptr, *floor = nullptr, *logFloor = nullptr;
     };
     struct Glide {
         double value = 0.0, target = 0.0, step = 0.0;
@@ -79,6 +78,8 @@ private:
     };
 
     void Start(bool afterSound);
+    void LayoutTables(Arena& arena);
+    void ReserveMemory(double rate);
     void Layout(Arena& arena);
     void PlacePaces();
     void CookCurves();
@@ -107,21 +108,21 @@ private:
     ProfileMode m_mode = ProfileMode::Adaptive;  // in use: "Learned" needs a profile
     bool m_fresh = true;                         // no settings yet
 
+    std::shared_ptr<const ReducerTables> m_tables;  // for the prepared rate
     std::array<WindowTables, kLengths> m_windows;
     std::array<SpectrumConversion, kLengths> m_conversions;
-    TrackerTables m_trackerTables;
     std::array<Curves, kLengths> m_curves;
     NoiseLearner m_learner;
     std::array<std::array<Floats, kLengths>, kMostChannels> m_learned;
     std::array<float, kMostChannels> m_learnedReference{};
-    std::array<Floats, 2> m_passage;
-    Floats m_order;
+    std::array<std::span<float>, 2> m_passage;
+    UntouchedZeros<float> m_order;
     double m_learnedSeconds = 0.0;
     std::size_t m_learnedChannels = 0;
     bool m_newlyLearned = false;
 
-    Arena m_arena;
-    std::vector<double> m_dry;  // rings, one after the other
+    Arena m_tableMemory, m_arena;
+    UntouchedZeros<double> m_dry;  // rings, one after the other
     std::array<SampleRing, kMostChannels> m_input, m_blended;
     std::array<std::array<SampleRing, kMostChannels>, 3> m_sized;
     std::array<NoiseTracker, kMostChannels> m_trackers;

@@ -15,9 +15,9 @@ double Bark(double hz) {
 
 }  // namespace
 
-void MaskingLimit::Prepare(std::size_t bins) {
-    m_band.assign(bins, 0);
-    m_share.assign(bins, 0.0f);
+void MaskingLimit::Prepare(Arena& arena, std::size_t bins) {
+    m_band = {reinterpret_cast<std::uint16_t*>(arena.Take((bins + 1) / 2)), bins};
+    m_share = arena.Take(bins);
 }
 
 void MaskingLimit::SetRate(double rate) {
@@ -34,7 +34,7 @@ void MaskingLimit::SetRate(double rate) {
 }
 
 void MaskingLimit::Apply(float* gain, const float* ratio, const float* noise, const float* curve,
-                         float offsetDb) {
+                         float offsetDb) const {
     std::array<float, kBands> signal{}, threshold{};
     for (std::size_t bin = 0; bin < m_band.size(); ++bin) {
         const float power = gain[bin] * gain[bin] * ratio[bin] * noise[bin] * curve[bin];

@@ -3,7 +3,9 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <vector>
+#include <span>
+
+#include "DSP/Effects/Denoiser/Arena.h"
 
 namespace Corvo::DSP::Denoising {
 
@@ -12,19 +14,19 @@ namespace Corvo::DSP::Denoising {
 // downwards; what lies an offset below that is masked.
 class MaskingLimit {
 public:
-    // Allocates for spectra of `bins` bins; SetRate does not.
-    void Prepare(std::size_t bins);
+    // For spectra of `bins` bins.
+    void Prepare(Arena& arena, std::size_t bins);
     void SetRate(double rate);
 
     // Raises each gain to what leaves the noise at the masking threshold, at most 1. `noise` times `curve` is
     // the noise's power, `ratio` the power over that.
-    void Apply(float* gain, const float* ratio, const float* noise, const float* curve, float offsetDb);
+    void Apply(float* gain, const float* ratio, const float* noise, const float* curve, float offsetDb) const;
 
 private:
     static constexpr std::size_t kBands = 64;
 
-    std::vector<std::uint16_t> m_band;  // per bin the lower of its two bands, and the share of the upper one
-    std::vector<float> m_share;
+    std::span<std::uint16_t> m_band;  // per bin the lower of its two bands, and the share of the upper one
+    float* m_share = nullptr;
     std::array<float, kBands> m_count{};
     std::size_t m_bands = 0;
 };

@@ -14,11 +14,16 @@ constexpr std::size_t kShortLengths = 2;
 void NoiseLearner::Prepare(std::span<WindowTables, kLengths> windows) {
     m_windows = windows.data();
     m_active = false;
+    std::size_t bins = 0;
+    for (const auto& window : windows) bins += window.Bins();
+    m_sumMemory = UntouchedZeros<double>(kMostChannels * bins);
+    double* sums = m_sumMemory.data();
     for (auto& channel : m_sums)
-        for (std::size_t i = 0; i < kLengths; ++i) channel[i].resize(windows[i].Bins());
-    m_re.resize(windows.back().Half());
-    m_im.resize(windows.back().Half());
-    m_power.resize(windows.back().Values());
+        for (std::size_t i = 0; i < kLengths; sums += windows[i++].Bins())
+            channel[i] = {sums, windows[i].Bins()};
+    m_re = UntouchedZeros<float>(windows.back().Half());
+    m_im = UntouchedZeros<float>(windows.back().Half());
+    m_power = UntouchedZeros<float>(windows.back().Values());
 }
 
 void NoiseLearner::Begin(std::int64_t place, std::size_t channels) {
@@ -58,7 +63,7 @@ bool NoiseLearner::TakeWindow(std::size_t which, std::int64_t place, std::span<c
                                 std::copy_n(samples, count, tables.scratch.data() + done);
                             });
         const auto& kernels = BestSpectrumKernels();
-        kernels.multiply(tables.scratch.data(), tables.scratch.data(), tables.analysis.data(),
+        kernels.multiply(tables.scratch.data(), tables.scratch.data(), tables.shape->analysis.data(),
                          static_cast<std::size_t>(tables.length));
         tables.fft.DoFFTReal(tables.scratch.data(), m_re.data(), m_im.data(), tables.length, 0);
         kernels.power(m_re.data(), m_im.data(), m_power.data(), tables.Half());

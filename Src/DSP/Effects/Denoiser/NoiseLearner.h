@@ -11,8 +11,6 @@
 
 namespace Corvo::DSP::Denoising {
 
-constexpr std::size_t kLengths = kLearnedLengths.size();
-
 // Learns the noise of a passage: the mean power spectrum of all windows that lie inside it, every quarter of
 // a window, for every length at once.
 class NoiseLearner {
@@ -40,8 +38,9 @@ private:
     std::int64_t m_begin = 0, m_end = 0;
     std::size_t m_channels = 0;
     std::array<std::int64_t, kLengths> m_count{};
-    std::array<std::array<std::vector<double>, kLengths>, kMostChannels> m_sums;
-    Floats m_re, m_im, m_power;
+    UntouchedZeros<double> m_sumMemory;
+    std::array<std::array<std::span<double>, kLengths>, kMostChannels> m_sums;
+    UntouchedZeros<float> m_re, m_im, m_power;
 };
 
 }  // namespace Corvo::DSP::Denoising

@@ -221,19 +221,19 @@ void SizeReducer::Gains(std::size_t piece, std::int64_t newest) {
 
 void SizeReducer::Mask(std::int64_t frame) {
     if (m_settings.keepMasked)
-        m_tables->masking.Apply(m_gain, m_ratio[frame], m_meanNoise, m_curve, m_settings.maskingOffsetDb);
+        m_tables->bins->masking.Apply(m_gain, m_ratio[frame], m_meanNoise, m_curve,
+                                      m_settings.maskingOffsetDb);
 }
 
 // Summed up over the bands of the blend.
 void SizeReducer::Risks(std::size_t piece, std::int64_t frame) {
     m_kernels->risk(m_ratio[frame], m_gain, m_risk, From(piece), To(piece));
     for (std::size_t band = 0; band < kRiskBands; ++band) {
-        const auto [first, last] = m_tables->riskRanges[band];
+        const auto [first, last] = m_tables->bins->riskRanges[band];
         const std::size_t from = std::max(first, From(piece)), to = std::min(last, To(piece));
         float& sum = m_risks[frame][band];
         if (piece == 0) sum = 0.0f;
-        if (from < to)
-            sum += m_kernels->dot(m_risk + from, m_tables->riskBands[band].data() + from, to - from);
+        if (from < to) sum += m_kernels->dot(m_risk + from, m_tables->bins->RiskBand(band) + from, to - from);
     }
 }
 

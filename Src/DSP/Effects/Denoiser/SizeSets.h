@@ -64,6 +64,11 @@ inline constexpr std::array kSizeSets{
 };
 // clang-format on
 
+// Values that a spectrum of a window of `length` takes in memory, per frame.
+constexpr std::size_t SpectrumValues(int length) {
+    return (static_cast<std::size_t>(length) / 2 + 1 + 15) / 16 * 16;
+}
+
 // The set that a stored word chooses; words out of range act like the nearest.
 const SizeSet& SizeSetAt(std::int32_t word);
 

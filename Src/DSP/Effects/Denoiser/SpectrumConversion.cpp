@@ -4,11 +4,6 @@
 #include <cmath>
 
 namespace Corvo::DSP::Denoising {
-namespace {
-
-constexpr std::size_t kResponseBins = 3;  // of the shorter window, to either side
-
-}  // namespace
 
 void Resample(const float* from, std::size_t fromCount, double step, float* to, std::size_t count) {
     for (std::size_t i = 0; i < count; ++i) {
@@ -20,28 +15,16 @@ void Resample(const float* from, std::size_t fromCount, double step, float* to, 
     }
 }
 
-void SpectrumConversion::Prepare(WindowTables& from, const WindowTables& to) {
+void SpectrumConversion::Prepare(const WindowTables& from, const WindowTables& to) {
     m_fromBins = from.Bins();
     m_toBins = to.Bins();
     m_scale = static_cast<float>(to.length) / static_cast<float>(from.length);
     m_shorter = to.length < from.length;
     m_ratio = static_cast<std::size_t>(std::max(to.length, from.length) / std::min(to.length, from.length));
-    m_response.clear();
     if (!m_shorter) return;
-
-    const auto length = static_cast<std::size_t>(from.length);
-    Floats window(length), re(length / 2), im(length / 2);
-    std::ranges::copy(to.analysis, window.begin());
-    from.fft.DoFFTReal(window.data(), re.data(), im.data(), from.length, 0);
-    im[0] = 0.0f;  // the highest bin's place
     const std::size_t half = kResponseBins * m_ratio;
-    // By Parseval: the sum over all bins is length * sum(window^2).
-    const double total = 0.5 * static_cast<double>(to.length) * from.length;
-    m_response.resize(half + 1);
-    for (std::size_t i = 0; i <= half; ++i)
-        m_response[i] = m_scale * (re[i] * re[i] + im[i] * im[i]) / static_cast<float>(total);
-    m_mirrored.resize(from.Values() + 2 * half);
-    m_seen.resize(from.Values());
+    m_mirrored = UntouchedZeros<float>(from.Values() + 2 * half);
+    m_seen = UntouchedZeros<float>(from.Values());
 }
 
 void SpectrumConversion::Run(const float* from, float* to) {
@@ -54,13 +37,13 @@ void SpectrumConversion::Run(const float* from, float* to) {
         to[m_toBins - 1] = m_scale * from[m_fromBins - 1];
         return;
     }
-    const std::size_t half = m_response.size() - 1;
+    const std::size_t half = m_response->size() - 1;
     std::copy_n(from, m_fromBins, m_mirrored.data() + half);
     for (std::size_t i = 1; i <= half; ++i) {
         m_mirrored[half - i] = from[i];
         m_mirrored[half + m_fromBins - 1 + i] = from[m_fromBins - 1 - i];
     }
-    BestSpectrumKernels().smoothBins(m_mirrored.data() + half, m_seen.data(), m_response.data(),
+    BestSpectrumKernels().smoothBins(m_mirrored.data() + half, m_seen.data(), m_response->data(),
                                      static_cast<int>(half), 0, m_seen.size());
     for (std::size_t i = 0; i < m_toBins; ++i) to[i] = m_seen[i * m_ratio];
 }

@@ -14,18 +14,18 @@ namespace Corvo::DSP::Denoising {
 class SpectrumConversion {
 public:
     // Allocates.
-    void Prepare(WindowTables& from, const WindowTables& to);
+    void Prepare(const WindowTables& from, const WindowTables& to);
+    // The frequency response of `to`, if it is the shorter; lives as long as it is in use.
+    void Use(const Floats& response) { m_response = &response; }
     void Run(const float* from, float* to);
     std::size_t Bins() const { return m_toBins; }
 
 private:
     std::size_t m_fromBins = 0, m_toBins = 0, m_ratio = 1;
     bool m_shorter = false;
-    float m_scale = 1.0f;  // of the windows' energies
-    // The shorter window's frequency response, from its middle upwards. It is given at the longer window's
-    // bins, m_ratio of which make one bin of the shorter window.
-    Floats m_response;
-    Floats m_mirrored, m_seen;
+    float m_scale = 1.0f;                // of the windows' energies
+    const Floats* m_response = nullptr;  // at the longer window's bins, m_ratio to one of the shorter's
+    UntouchedZeros<float> m_mirrored, m_seen;
 };
 
 // `count` values at places step * i of `from`, linear between them; beyond the end its last value.

@@ -1,39 +1,41 @@
 #pragma once
 
-#include <array>
 #include <cstddef>
-#include <utility>
 
 #include "DSP/Effects/Denoiser/Arena.h"
-#include "DSP/Effects/Denoiser/MaskingLimit.h"
+#include "DSP/Effects/Denoiser/ReducerTables.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
+#include "Platform/UntouchedZeros.h"
 #include "Spectrum/Fft/CorvoFFT.h"
 
 namespace Corvo::DSP::Denoising {
 
-constexpr std::size_t kRiskBands = 8;  // at most
-
-// What the parts of the reducer share for windows of one length; made before processing.
+// What the parts of a reducer share for windows of one length; made before processing.
 struct WindowTables {
     // Allocates for windows of `samples`; throws std::bad_alloc.
     void Prepare(int samples);
-    // How much each bin counts in each of the bands in which the blend compares sizes: triangles two octaves
-    // apart from 100 Hz. They belong to the grid of a spectrum of `blendLength`; a longer window's bins are
-    // gathered by a Hann window, a shorter one's interpolated.
+    // For what bins stand for at another rate than the shared tables'.
+    void PrepareRates(Arena& arena) { m_otherRate.Prepare(arena, length); }
+    // Takes length `which` of the tables that all reducers share, which live as long as they are in use.
+    void Use(const ReducerTables& tables, std::size_t which);
+    // What the bins stand for: from the shared tables, or at another rate than theirs worked out here.
     void SetRate(double rate, int blendLength);
 
     int length = 0;
-    Floats analysis, synthesis;  // square roots of a Hann window; the second sums to one over the overlap
+    const WindowShape* shape = nullptr;
+    const BinTables* bins = nullptr;
     CorvoFFT fft;
-    Floats scratch;
-    MaskingLimit masking;
-    std::array<Floats, kRiskBands> riskBands;  // how much each bin counts in each band of the blend
-    std::array<std::pair<std::size_t, std::size_t>, kRiskBands> riskRanges{};
+    UntouchedZeros<float> scratch;
 
     std::size_t Half() const { return static_cast<std::size_t>(length) / 2; }
     std::size_t Bins() const { return Half() + 1; }
     // Values per frame in memory.
-    std::size_t Values() const { return (Bins() + 15) / 16 * 16; }
+    std::size_t Values() const { return SpectrumValues(length); }
+
+private:
+    const BinTables* m_preparedBins = nullptr;
+    double m_preparedRate = 0.0;
+    BinTables m_otherRate;
 };
 
 // The split spectrum of the windowed samples from `start` on.
@@ -42,9 +44,5 @@ void Transform(const SpectrumKernels& kernels, WindowTables& tables, const Sampl
 // Adds tables.scratch, windowed, to the samples from `start` on; the last hop of them is begun anew.
 void OverlapAdd(const SpectrumKernels& kernels, const WindowTables& tables, const SampleRing& output,
                 std::int64_t start);
-
-// A risk band's weight at a frequency, band 0 the lowest; and how many bands there are.
-double RiskBandWeight(std::size_t band, double hz);
-std::size_t RiskBandCount(double rate);
 
 }  // namespace Corvo::DSP::Denoising

@@ -232,7 +232,7 @@ void Echo::Run(Sample* samples, std::array<int, 2> frames) {
     for (const int both = channels == 2 ? std::min(frames[0], frames[1]) : 0; done < both;) {
         const int run = std::min({both - done, left.UntilWrap(), right.UntilWrap()});
         Sample* const block = samples + 2 * done;
-        float *const atLeft = left.Here(run), *const atRight = right.Here(run);
+        float *const atLeft = left.MakeReady(run), *const atRight = right.MakeReady(run);
         if (RunEchoPair(m_delay->sides, block, run, atLeft, atRight))
             finite &= all(atLeft, run) && all(atRight, run) && all(block, 2 * run);
         left.Advance(run);
@@ -246,7 +246,7 @@ void Echo::Run(Sample* samples, std::array<int, 2> frames) {
             const int run = std::min(frames[i] - at, line.UntilWrap());
             finite &=
                 !RunEchoSide(m_delay->sides[i], samples + static_cast<std::ptrdiff_t>(at) * channels + side,
-                             channels, run, line.Here(run));
+                             channels, run, line.MakeReady(run));
             line.Advance(run);
             at += run;
         }

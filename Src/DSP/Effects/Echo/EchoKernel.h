@@ -24,8 +24,8 @@ struct Line {
     float* ring = nullptr;
     int length = 0, position = 0, written = 0;
 
-    // What stands in the next samples of the line.
-    float* Here(int frames) {
+    // The next samples of the line, made 0 where nothing was written yet.
+    float* MakeReady(int frames) {
         if (position + frames > written) Write(position + frames);
         return ring + position;
     }

@@ -215,7 +215,7 @@ private:
     void RunCombs(const std::array<const T*, 2>& early, const Pointers& sum, int count) {
         std::array<T*, CombBank<T>::kMost> cells;
         for (std::size_t k = 0; k < Channels * kCombs; ++k)
-            cells[k] = m_data[k / kCombs].combs[k % kCombs].Here(count);
+            cells[k] = m_data[k / kCombs].combs[k % kCombs].MakeReady(count);
         m_kernels.combs(m_combs, cells.data(), early, sum, Channels, count);
         for (std::size_t c = 0; c < Channels; ++c)
             for (auto& comb : m_data[c].combs) comb.Advance(count);
@@ -223,7 +223,7 @@ private:
 
     // From the combs' sum to the finished samples, in place.
     void Output(ReverbData<T>& data, const T* in, T* early, T* sum, int count) {
-        m_allPassOverflowed |= !m_kernels.allPass(data.allPass.Here(count), sum, count);
+        m_allPassOverflowed |= !m_kernels.allPass(data.allPass.MakeReady(count), sum, count);
         data.allPass.Advance(count);
         if (data.offset != 0) {
             T* const waits = data.offset > 0 ? sum : early;

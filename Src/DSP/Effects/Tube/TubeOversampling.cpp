@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <limits>
+#include <memory>
 #include <new>
 #include <type_traits>
 
@@ -20,11 +21,6 @@ struct Designs {
         }
     }
 };
-
-bool HasRings(const SamplingFrequencyConverter& converter) {
-    return std::all_of(converter.rings, converter.rings + TubeBuffer::kMaxChannels,
-                       [](const double* ring) { return ring != nullptr; });
-}
 
 const Designs& AllDesigns() {
     static const Designs designs;
@@ -54,28 +50,40 @@ void TubeBuffer::Free() {
     m_capacity = 0;
 }
 
-TubeOversampling::TubeOversampling() {
-    // Designs that live on, so that Clear never drops the last reference to one while audio runs.
-    m_up = AllDesigns().up[TubeBuffer::kLargestFactor];
-    m_up.Init(TubeBuffer::kMaxChannels);
-    m_down = AllDesigns().down[TubeBuffer::kLargestFactor];
-    m_down.Init(TubeBuffer::kMaxChannels);
-    if (HasRings(m_up) && HasRings(m_down)) return;
-    m_up.FreeRings();
-    m_down.FreeRings();
-    throw std::bad_alloc();
+struct TubeOversampling::Filters {
+    static constexpr int kRing = 10 * TubeBuffer::kLargestFactor;
+
+    SamplingFrequencyConverter up, down;
+    std::array<double, 2 * TubeBuffer::kMaxChannels * kRing> rings{};
+
+    Filters() {
+        double* ring = rings.data();
+        for (auto* converter : {&up, &down}) {
+            converter->ringCapacity = kRing;
+            for (int channel = 0; channel < TubeBuffer::kMaxChannels; ++channel, ring += kRing)
+                converter->rings[channel] = ring;
+        }
+    }
+};
+
+struct TubeOversampling::Memory {
+    alignas(Filters) std::byte bytes[sizeof(Filters)];
+};
+
+TubeOversampling::TubeOversampling() : m_memory(std::make_unique_for_overwrite<Memory>()) {
+    AllDesigns();  // which live on, so that Clear never drops the last reference to one while audio runs
 }
 
 TubeOversampling::~TubeOversampling() {
-    m_up.FreeRings();
-    m_down.FreeRings();
+    if (m_filters) std::destroy_at(m_filters);
 }
 
 void TubeOversampling::Clear(int factor) {
     const auto index = static_cast<std::size_t>(factor);
+    if (factor > 1 && !m_filters) m_filters = new (m_memory->bytes) Filters;
     // Both filters or none: at two factors they would not give back as many frames as they took.
-    const bool raised =
-        factor > 1 && m_up.Restart(AllDesigns().up[index]) && m_down.Restart(AllDesigns().down[index]);
+    const bool raised = factor > 1 && m_filters->up.Restart(AllDesigns().up[index]) &&
+                        m_filters->down.Restart(AllDesigns().down[index]);
     m_factor = raised ? factor : 1;
 }
 
@@ -93,9 +101,10 @@ void TubeOversampling::Process(const VirtualTubeAmp& amp, TubeBuffer& buffer, Sa
     double* const raised = buffer.Samples();
     while (frames > 0) {
         const int piece = std::min(frames, buffer.Frames());
-        const int raisedFrames = Convert<In, tipo_doublebit_outd>(m_up, piece, samples, raised, channels);
+        const int raisedFrames =
+            Convert<In, tipo_doublebit_outd>(m_filters->up, piece, samples, raised, channels);
         amp.Shape(raised, raisedFrames, channels);
-        Convert<tipo_doublebit, Out>(m_down, raisedFrames, raised, samples, channels);
+        Convert<tipo_doublebit, Out>(m_filters->down, raisedFrames, raised, samples, channels);
         samples += static_cast<std::ptrdiff_t>(piece) * channels;
         frames -= piece;
     }

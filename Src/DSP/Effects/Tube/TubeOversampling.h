@@ -31,7 +31,8 @@ private:
 };
 
 // The filters that take the stream up to a multiple of its rate and back. Their memory, for every factor, is
-// made by the constructor, which throws std::bad_alloc; nothing else allocates.
+// made by the constructor, which throws std::bad_alloc; nothing else allocates. It is not touched before a
+// factor above 1 is.
 class TubeOversampling {
 public:
     TubeOversampling();
@@ -51,8 +52,12 @@ public:
     static double Delay(int factor);
 
 private:
+    struct Filters;
+    struct Memory;
+
     int m_factor = 1;
-    SamplingFrequencyConverter m_up, m_down;
+    std::unique_ptr<Memory> m_memory;
+    Filters* m_filters = nullptr;  // in it, once they were needed
 };
 
 }  // namespace Corvo::DSP

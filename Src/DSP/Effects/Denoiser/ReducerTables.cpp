@@ -1,0 +1,76 @@
+#include "DSP/Effects/Denoiser/ReducerTables.h"
+
+#include <algorithm>
+#include <cmath>
+#include <mutex>
+#include <new>
+#include <numbers>
+#include <vector>
+
+#include "Spectrum/Fft/CorvoFFT.h"
+
+namespace Corvo::DSP::Denoising {
+namespace {
+
+// The frequency response of a window that is shorter than the tracker's, at that one's bins, from its middle
+// upwards, squared and scaled so that it turns the noise's power in the one's bins into that in the other's.
+Floats Response(const WindowShape& track, const WindowShape& shorter) {
+    CorvoFFT fft;
+    fft.AllocateReal(track.length, 0);
+    const auto length = static_cast<std::size_t>(track.length);
+    Floats window(length), re(length / 2), im(length / 2);
+    std::ranges::copy(shorter.analysis, window.begin());
+    fft.DoFFTReal(window.data(), re.data(), im.data(), track.length, 0);
+    const bool transformed = re[0] != 0.0f;
+    if (!transformed) throw std::bad_alloc();
+    im[0] = 0.0f;  // the highest bin's place
+    const auto ratio = static_cast<std::size_t>(track.length / shorter.length);
+    const float scale = static_cast<float>(shorter.length) / static_cast<float>(track.length);
+    // By Parseval: the sum over all bins is length * sum(window^2).
+    const double total = 0.5 * static_cast<double>(shorter.length) * track.length;
+    Floats response(kResponseBins * ratio + 1);
+    for (std::size_t i = 0; i < response.size(); ++i)
+        response[i] = scale * (re[i] * re[i] + im[i] * im[i]) / static_cast<float>(total);
+    return response;
+}
+
+}  // namespace
+
+void WindowShape::Prepare(int samples) {
+    length = samples;
+    const auto count = static_cast<std::size_t>(samples);
+    analysis.resize(count);
+    synthesis.resize(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        const double turn = 2.0 * std::numbers::pi * static_cast<double>(i) / static_cast<double>(count);
+        const double window = std::sqrt(0.5 - 0.5 * std::cos(turn));
+        analysis[i] = static_cast<float>(window);
+        synthesis[i] = static_cast<float>(0.5 * window);  // four squared windows add up to 2
+    }
+}
+
+ReducerTables::ReducerTables(double forRate) : rate(forRate), scale(Scale::Of(forRate)) {
+    ReserveFor(m_memory, [&](Arena& arena) {
+        for (std::size_t i = 0; i < kLengths; ++i) bins[i].Prepare(arena, scale(kLearnedLengths[i]));
+    });
+    for (std::size_t i = 0; i < kLengths; ++i) {
+        shapes[i].Prepare(bins[i].length);
+        bins[i].SetRate(rate, scale(kBlendLength));
+    }
+    for (std::size_t i = 0; i < kTrackIndex; ++i) responses[i] = Response(shapes[kTrackIndex], shapes[i]);
+    tracker.Prepare(static_cast<std::size_t>(shapes[kTrackIndex].length) / 2 + 1);
+}
+
+std::shared_ptr<const ReducerTables> TablesFor(double rate) {
+    static std::mutex mutex;
+    static std::vector<std::weak_ptr<const ReducerTables>> all;
+    const std::lock_guard lock(mutex);
+    std::erase_if(all, [](const auto& tables) { return tables.expired(); });
+    for (const auto& tables : all)
+        if (auto found = tables.lock(); found && found->rate == rate) return found;
+    auto made = std::make_shared<const ReducerTables>(rate);
+    all.push_back(made);
+    return made;
+}
+
+}  // namespace Corvo::DSP::Denoising
