@@ -3,6 +3,7 @@
 #include <cstdio>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "Commands.h"
 #include "Drawing/Views/Look.h"
@@ -31,18 +32,44 @@ std::string Minutes(double seconds) {
     return text;
 }
 
-void DrawCentredBox(DrawTarget& target, const RectF& bounds, float top, std::string_view text,
+// The beginning of a text that fits, up to a blank if there is one. Longer pieces would be cut off.
+std::string_view FittingPiece(DrawTarget& target, std::string_view text, float size, float room) {
+    constexpr std::size_t kMost = 80;
+    std::size_t end = std::min(text.size(), kMost + 1);
+    const auto shorten = [&] {
+        const auto blank = text.rfind(' ', end - 1);
+        const bool found = blank != text.npos && blank > 0;
+        for (end = found ? blank : end - 1; (text[end] & 0xC0) == 0x80; --end) {
+        }  // not within a character
+    };
+    while (end > 1 && (end > kMost || target.MeasureText(text.substr(0, end), size).width > room)) shorten();
+    return text.substr(0, end);
+}
+
+// In as many lines as it takes, downwards from `edge` or upwards to it.
+void DrawCentredBox(DrawTarget& target, const RectF& bounds, float edge, bool upwards, std::string_view text,
                     Corvo::ColourReference colour) {
-    const float scale = target.Scale(), pad = 2.0f * Look::kGap * scale;
-    const float size = FittingSize(target, text, Look::kInfoSize * scale, bounds.width - 4.0f * pad);
-    if (size < 4.0f) return;
-    const auto metrics = target.MeasureText(text, size);
-    const RectF box{std::round(bounds.x + (bounds.width - metrics.width) / 2.0f - pad), std::round(top),
-                    std::round(metrics.width + 2.0f * pad),
-                    std::round(metrics.ascent + metrics.descent + pad)};
+    const float scale = target.Scale(), pad = 2.0f * Look::kGap * scale, room = bounds.width - 4.0f * pad;
+    const float size = Look::kInfoSize * scale;
+    std::vector<std::string_view> lines;
+    float widest = 0.0f;
+    while (!text.empty() && room > 0.0f) {
+        lines.push_back(FittingPiece(target, text, size, room));
+        widest = std::max(widest, target.MeasureText(lines.back(), size).width);
+        text.remove_prefix(lines.back().size());
+        if (text.starts_with(' ')) text.remove_prefix(1);
+    }
+    const auto metrics = target.MeasureText("Ag", size);
+    const float pitch = std::round(1.2f * (metrics.ascent + metrics.descent));
+    const float height = std::round(pitch * static_cast<float>(lines.size()) + pad);
+    const RectF box{std::round(bounds.x + (bounds.width - widest) / 2.0f - pad),
+                    std::round(upwards ? edge - height : edge), std::round(widest + 2.0f * pad), height};
     target.FillRoundedRectangle(box, pad / 2.0f, {Look::kBox, 240});
-    target.Text(text, {bounds.x + bounds.width / 2.0f, box.y + pad / 2.0f + metrics.ascent},
-                TextAlign::Centre, size, {colour});
+    float baseline = box.y + pad / 2.0f + (pitch + Corvo::kCapHeight * size) / 2.0f;
+    for (const std::string_view line : lines) {
+        target.Text(line, {bounds.x + bounds.width / 2.0f, baseline}, TextAlign::Centre, size, {colour});
+        baseline += pitch;
+    }
 }
 
 }  // namespace
@@ -163,9 +190,9 @@ void View::DrawKeys(DrawTarget& target, const RectF& rectangle) const {
 void View::DrawSentences(DrawTarget& target, const RectF& rectangle) const {
     const float scale = target.Scale();
     if (!m_trouble.empty())
-        DrawCentredBox(target, rectangle, rectangle.y + 12.0f * scale, m_trouble, Look::kPeaks);
+        DrawCentredBox(target, rectangle, rectangle.y + 12.0f * scale, false, m_trouble, Look::kPeaks);
     if (!m_said.empty())
-        DrawCentredBox(target, rectangle, rectangle.y + rectangle.height - 44.0f * scale, m_said,
+        DrawCentredBox(target, rectangle, rectangle.y + rectangle.height - 20.0f * scale, true, m_said,
                        Look::kText);
 }
 
