@@ -84,6 +84,24 @@ void View::DrawAnalysers(Corvo::DrawingCairo::DrawTarget& target, const RectF& r
         target, {rectangle.x, rectangle.y + half, rectangle.width, rectangle.height - half});
 }
 
+// Whether anything is heard at all, and whether it is too much. Gives where the next thing may stand.
+float View::DrawLevel(DrawTarget& target, const RectF& bar, float x) const {
+    constexpr float kLowest = -60.0f;
+    const float scale = target.Scale(), size = Look::kLabelSize * scale, thick = std::round(6.0f * scale);
+    const bool loud = m_tooLoudFor > 0;
+    const RectF whole{x, std::round(bar.y + (bar.height - thick) / 2.0f), std::round(72.0f * scale), thick};
+    const float share = std::clamp(1.0f - m_level / kLowest, 0.0f, 1.0f);
+    const auto colour = loud ? Look::kPeaks : Look::kInTune;
+    target.FillRectangle(whole, {Look::kGrid});
+    target.FillRectangle({whole.x, whole.y, std::round(whole.width * share), thick}, {colour});
+    x += whole.width + 2.0f * Look::kGap * scale;
+    if (!loud) return x;
+    constexpr std::string_view kText = "Too loud";
+    target.Text(kText, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
+                {colour});
+    return x + target.MeasureText(kText, size).width + 2.0f * Look::kGap * scale;
+}
+
 void View::DrawBar(DrawTarget& target, const RectF& bar) {
     const float scale = target.Scale(), size = Look::kLabelSize * scale, pad = 2.0f * Look::kGap * scale;
     target.FillRectangle(bar, {Look::kBox});
@@ -102,11 +120,12 @@ void View::DrawBar(DrawTarget& target, const RectF& bar) {
     const auto playback = m_shell.GetPlayback();
     const float room = playback ? bar.width * 0.35f : bar.width - rightWidth - 4.0f * pad;
     float x = bar.x + pad;
-    target.PushClip({bar.x, bar.y, std::max(room + pad, 1.0f), bar.height});
+    if (bar.width > 480.0f * scale) x = DrawLevel(target, bar, x);
+    target.PushClip({x, bar.y, std::max(room + pad - x, 1.0f), bar.height});
     target.Text(source, {x, baseline}, TextAlign::Left, size,
                 {frozen || back > 0.0 ? Look::kPeaks : Look::kLabel});
     target.PopClip();
-    x += std::min(target.MeasureText(source, size).width, room) + 2.0f * pad;
+    x += std::min(target.MeasureText(source, size).width, room - x) + 2.0f * pad;
     const float end = bar.x + bar.width - pad;
     const bool keys = end - rightWidth > x + 60.0f * scale;
     if (keys) target.Text(right, {end, baseline}, TextAlign::Right, size, {Look::kLabel});

@@ -133,7 +133,7 @@ stop
 say "inputs that come and go"
 sox -n -r 48000 -c 2 "$work/330.wav" synth 60 sine 330 vol 0.25
 sound() {  # a sound server with a loudspeaker that a microphone may hear
-    pulseaudio -n --exit-idle-time=-1 -L module-native-protocol-unix -L "module-null-sink sink_name=air" > "$work/pulse" 2>&1 &
+    pulseaudio -n --exit-idle-time=-1 -L module-native-protocol-unix -L "module-null-sink sink_name=air" > "$work/pulse.log" 2>&1 &
     server=$!
     jobs+=($server)
     for ((i = 0; i < 100; ++i)); do pactl info > /dev/null 2>&1 && break; sleep 0.1; done
