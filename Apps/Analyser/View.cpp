@@ -83,11 +83,23 @@ bool View::Refresh() {
     if (!playback || playback->playing)
         for (kivspectrum& each : m_analysers)
             if (each.Refresh()) m_dirty = true;
+    FollowLevel();
     if (m_saidFor > 0 && --m_saidFor == 0) {
         m_said.clear();
         m_dirty = true;
     }
     return std::exchange(m_dirty, false);
+}
+
+void View::FollowLevel() {
+    constexpr float kSilence = -120.0f, kFall = 20.0f / 30.0f, kFull = 0.999f;
+    const float peak = m_peak.exchange(0.0f, std::memory_order_relaxed);
+    const float now = peak > 1e-6f ? 20.0f * std::log10(peak) : kSilence;
+    const float level = std::max(now, std::max(m_level - kFall, kSilence));
+    const bool wasTooLoud = m_tooLoudFor > 0;
+    m_tooLoudFor = peak >= kFull ? kSaidFor : std::max(m_tooLoudFor - 1, 0);
+    m_dirty = m_dirty || std::round(level) != std::round(m_level) || wasTooLoud != (m_tooLoudFor > 0);
+    m_level = level;
 }
 
 // The channels apart: the second shows as the first does, but has no tuner of its own.

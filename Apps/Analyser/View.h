@@ -29,8 +29,6 @@ public:
 
     // Audio thread; never waits. Interleaved frames.
     void Feed(const float* samples, int frames, int channels);
-    // The highest sample's magnitude since the last call. One thread.
-    float TakePeak() { return m_peak.exchange(0.0f, std::memory_order_relaxed); }
 
     // Display thread from here on.
     void SetSamplingRate(int rate);
@@ -97,9 +95,11 @@ private:
     std::string Numbers() const;
     std::string DescribeHeard() const;
     void SeekTo(float x);
+    void FollowLevel();
 
     void DrawAnalysers(Corvo::DrawingCairo::DrawTarget& target, const Corvo::RectF& rectangle);
     void DrawBar(Corvo::DrawTarget& target, const Corvo::RectF& bar);
+    float DrawLevel(Corvo::DrawTarget& target, const Corvo::RectF& bar, float x) const;
     void DrawHints(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
     void DrawKeys(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
     void DrawSentences(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
@@ -108,7 +108,9 @@ private:
     std::unique_ptr<Corvo::DrawingCairo> m_drawing;  // made with the first picture
     std::array<kivspectrum, 2> m_analysers;  // the second is the right channel's, where they are apart
     std::atomic<bool> m_apart{false}, m_heard{false};
-    std::atomic<float> m_peak{0.0f};
+    std::atomic<float> m_peak{0.0f};  // since the last refresh
+    float m_level = -120.0f;          // dB, falling
+    int m_tooLoudFor = 0;             // refreshes that it is still said
     int m_rate = 48000;
 
     Menu m_menu;

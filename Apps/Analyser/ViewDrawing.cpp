@@ -3,6 +3,7 @@
 #include <cstdio>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "Commands.h"
 #include "Drawing/Views/Look.h"
@@ -31,18 +32,44 @@ std::string Minutes(double seconds) {
     return text;
 }
 
-void DrawCentredBox(DrawTarget& target, const RectF& bounds, float top, std::string_view text,
+// The beginning of a text that fits, up to a blank if there is one. Longer pieces would be cut off.
+std::string_view FittingPiece(DrawTarget& target, std::string_view text, float size, float room) {
+    constexpr std::size_t kMost = 80;
+    std::size_t end = std::min(text.size(), kMost + 1);
+    const auto shorten = [&] {
+        const auto blank = text.rfind(' ', end - 1);
+        const bool found = blank != text.npos && blank > 0;
+        for (end = found ? blank : end - 1; (text[end] & 0xC0) == 0x80; --end) {
+        }  // not within a character
+    };
+    while (end > 1 && (end > kMost || target.MeasureText(text.substr(0, end), size).width > room)) shorten();
+    return text.substr(0, end);
+}
+
+// In as many lines as it takes, downwards from `edge` or upwards to it.
+void DrawCentredBox(DrawTarget& target, const RectF& bounds, float edge, bool upwards, std::string_view text,
                     Corvo::ColourReference colour) {
-    const float scale = target.Scale(), pad = 2.0f * Look::kGap * scale;
-    const float size = FittingSize(target, text, Look::kInfoSize * scale, bounds.width - 4.0f * pad);
-    if (size < 4.0f) return;
-    const auto metrics = target.MeasureText(text, size);
-    const RectF box{std::round(bounds.x + (bounds.width - metrics.width) / 2.0f - pad), std::round(top),
-                    std::round(metrics.width + 2.0f * pad),
-                    std::round(metrics.ascent + metrics.descent + pad)};
+    const float scale = target.Scale(), pad = 2.0f * Look::kGap * scale, room = bounds.width - 4.0f * pad;
+    const float size = Look::kInfoSize * scale;
+    std::vector<std::string_view> lines;
+    float widest = 0.0f;
+    while (!text.empty() && room > 0.0f) {
+        lines.push_back(FittingPiece(target, text, size, room));
+        widest = std::max(widest, target.MeasureText(lines.back(), size).width);
+        text.remove_prefix(lines.back().size());
+        if (text.starts_with(' ')) text.remove_prefix(1);
+    }
+    const auto metrics = target.MeasureText("Ag", size);
+    const float pitch = std::round(1.2f * (metrics.ascent + metrics.descent));
+    const float height = std::round(pitch * static_cast<float>(lines.size()) + pad);
+    const RectF box{std::round(bounds.x + (bounds.width - widest) / 2.0f - pad),
+                    std::round(upwards ? edge - height : edge), std::round(widest + 2.0f * pad), height};
     target.FillRoundedRectangle(box, pad / 2.0f, {Look::kBox, 240});
-    target.Text(text, {bounds.x + bounds.width / 2.0f, box.y + pad / 2.0f + metrics.ascent},
-                TextAlign::Centre, size, {colour});
+    float baseline = box.y + pad / 2.0f + (pitch + Corvo::kCapHeight * size) / 2.0f;
+    for (const std::string_view line : lines) {
+        target.Text(line, {bounds.x + bounds.width / 2.0f, baseline}, TextAlign::Centre, size, {colour});
+        baseline += pitch;
+    }
 }
 
 }  // namespace
@@ -55,6 +82,24 @@ void View::DrawAnalysers(Corvo::DrawingCairo::DrawTarget& target, const RectF& r
     first.DoDraw<Corvo::DrawingCairo>(target, {rectangle.x, rectangle.y, rectangle.width, half});
     m_analysers[1].DoDraw<Corvo::DrawingCairo>(
         target, {rectangle.x, rectangle.y + half, rectangle.width, rectangle.height - half});
+}
+
+// Whether anything is heard at all, and whether it is too much. Gives where the next thing may stand.
+float View::DrawLevel(DrawTarget& target, const RectF& bar, float x) const {
+    constexpr float kLowest = -60.0f;
+    const float scale = target.Scale(), size = Look::kLabelSize * scale, thick = std::round(6.0f * scale);
+    const bool loud = m_tooLoudFor > 0;
+    const RectF whole{x, std::round(bar.y + (bar.height - thick) / 2.0f), std::round(72.0f * scale), thick};
+    const float share = std::clamp(1.0f - m_level / kLowest, 0.0f, 1.0f);
+    const auto colour = loud ? Look::kPeaks : Look::kInTune;
+    target.FillRectangle(whole, {Look::kGrid});
+    target.FillRectangle({whole.x, whole.y, std::round(whole.width * share), thick}, {colour});
+    x += whole.width + 2.0f * Look::kGap * scale;
+    if (!loud) return x;
+    constexpr std::string_view kText = "Too loud";
+    target.Text(kText, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
+                {colour});
+    return x + target.MeasureText(kText, size).width + 2.0f * Look::kGap * scale;
 }
 
 void View::DrawBar(DrawTarget& target, const RectF& bar) {
@@ -75,11 +120,12 @@ void View::DrawBar(DrawTarget& target, const RectF& bar) {
     const auto playback = m_shell.GetPlayback();
     const float room = playback ? bar.width * 0.35f : bar.width - rightWidth - 4.0f * pad;
     float x = bar.x + pad;
-    target.PushClip({bar.x, bar.y, std::max(room + pad, 1.0f), bar.height});
+    if (bar.width > 480.0f * scale) x = DrawLevel(target, bar, x);
+    target.PushClip({x, bar.y, std::max(room + pad - x, 1.0f), bar.height});
     target.Text(source, {x, baseline}, TextAlign::Left, size,
                 {frozen || back > 0.0 ? Look::kPeaks : Look::kLabel});
     target.PopClip();
-    x += std::min(target.MeasureText(source, size).width, room) + 2.0f * pad;
+    x += std::min(target.MeasureText(source, size).width, room - x) + 2.0f * pad;
     const float end = bar.x + bar.width - pad;
     const bool keys = end - rightWidth > x + 60.0f * scale;
     if (keys) target.Text(right, {end, baseline}, TextAlign::Right, size, {Look::kLabel});
@@ -163,9 +209,9 @@ void View::DrawKeys(DrawTarget& target, const RectF& rectangle) const {
 void View::DrawSentences(DrawTarget& target, const RectF& rectangle) const {
     const float scale = target.Scale();
     if (!m_trouble.empty())
-        DrawCentredBox(target, rectangle, rectangle.y + 12.0f * scale, m_trouble, Look::kPeaks);
+        DrawCentredBox(target, rectangle, rectangle.y + 12.0f * scale, false, m_trouble, Look::kPeaks);
     if (!m_said.empty())
-        DrawCentredBox(target, rectangle, rectangle.y + rectangle.height - 44.0f * scale, m_said,
+        DrawCentredBox(target, rectangle, rectangle.y + rectangle.height - 20.0f * scale, true, m_said,
                        Look::kText);
 }
 

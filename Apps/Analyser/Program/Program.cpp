@@ -18,7 +18,7 @@ namespace {
 
 constexpr int kRefreshes = 30;
 constexpr int kRetryEvery = 30, kKeepEvery = 60;  // refreshes
-constexpr const char* kDefaultInput = "The system's choice";
+constexpr int kFailures = 3;                      // until the sound system is asked anew
 constexpr const char* kInputLine = "Input = ";
 
 struct KeyPair {
@@ -48,7 +48,7 @@ Program::Program(const Options& options) : m_options(options) {
     m_input = std::make_unique<Input>(*m_view);
     LoadSettings();
     if (!options.input.empty()) m_chosenInput = options.input;
-    m_hasAudio = !options.noAudio && SDL_InitSubSystem(SDL_INIT_AUDIO) == 0;
+    if (!options.noAudio) StartAudio();
     if (!options.file.empty()) OpenFile(options.file);
     if (!m_player.IsOpen()) Listen(m_chosenInput);
 }
@@ -82,7 +82,10 @@ void Program::Run() {
 
 void Program::Step() {
     ++m_refreshes;
-    m_player.Step(*m_view);
+    if (m_player.IsOpen())
+        m_player.Step(*m_view);
+    else
+        m_input->KeepTime();
     if (m_refreshes % kRetryEvery == 0) LookAfterInput();
     if (m_refreshes % kKeepEvery == 0) KeepSettings();
     m_stale = m_view->Refresh() || m_stale;
@@ -221,14 +224,13 @@ std::string Program::Source() const {
     if (m_player.IsOpen()) return m_player.Name() + (m_player.IsHeard() ? "" : " (silent)");
     if (m_options.noAudio) return "No sound (--no-audio)";
     if (!m_input->IsOpen()) return "No input";
-    const std::string& name = m_input->Wanted();
-    return "Input: " + (name.empty() ? kDefaultInput : name) + ", " + std::to_string(m_input->Rate()) + " Hz";
+    return "Input: " + m_input->Describe();
 }
 
 std::vector<std::string> Program::Inputs() const {
     if (!m_hasAudio) return {};
     std::vector<std::string> inputs = Input::Names();
-    inputs.insert(inputs.begin(), kDefaultInput);
+    inputs.insert(inputs.begin(), Input::kSystems);
     return inputs;
 }
 
@@ -259,12 +261,31 @@ void Program::LookAfterInput() {
     if (m_player.IsOpen()) return m_view->SetTrouble({});
     if (m_options.noAudio)
         return m_view->SetTrouble("Nothing is listened to (--no-audio): drop an audio file here.");
-    if (!m_hasAudio) m_hasAudio = SDL_InitSubSystem(SDL_INIT_AUDIO) == 0;
-    if (!m_hasAudio)
+    if (!m_hasAudio && !StartAudio())
         return m_view->SetTrouble(
             "There is no sound system here; an audio file can be dropped on the window.");
-    m_input->Retry();
+    m_failures = m_input->Retry() || !m_input->IsThere() ? 0 : m_failures + 1;
     m_view->SetTrouble(m_input->Trouble());
+    if (m_failures >= kFailures) RestartAudio();
+}
+
+// The same system as before: another would not have the input that was chosen.
+bool Program::StartAudio() {
+    if (!m_audioDriver.empty()) SDL_SetHint(SDL_HINT_AUDIODRIVER, m_audioDriver.c_str());
+    m_hasAudio = SDL_InitSubSystem(SDL_INIT_AUDIO) == 0;
+    if (m_hasAudio) m_audioDriver = SDL_GetCurrentAudioDriver();
+    return m_hasAudio;
+}
+
+// A sound server that was started again is a new one.
+void Program::RestartAudio() {
+    m_failures = 0;
+    m_input->Close();
+    SetTone(false);
+    if (m_toneDevice) SDL_CloseAudioDevice(m_toneDevice);
+    m_toneDevice = 0;
+    SDL_QuitSubSystem(SDL_INIT_AUDIO);
+    StartAudio();
 }
 
 void Program::OpenFile(const std::string& path) {

@@ -56,6 +56,8 @@ private:
     void OpenFile(const std::string& path);
     void Listen(const std::string& name);
     void LookAfterInput();
+    bool StartAudio();
+    void RestartAudio();
     void LoadSettings();
     void KeepSettings();
     float Dpi() const;
@@ -69,7 +71,8 @@ private:
     Tone m_tone;
     SDL_AudioDeviceID m_toneDevice = 0;
     double m_toneRate = 48000.0;
-    std::string m_chosenInput;
+    std::string m_chosenInput, m_audioDriver;
+    int m_failures = 0;  // to open an input that is there
     unsigned m_keptChoices = 0;
     int m_refreshes = 0;
 };

@@ -30,6 +30,9 @@ int main(int argc, char** argv) {
     if (!size.empty()) std::sscanf(size.c_str(), "%dx%d", &options.width, &options.height);
 
     SDL_SetHint(SDL_HINT_VIDEO_ALLOW_SCREENSAVER, "1");
+#ifdef SDL_HINT_AUDIO_INCLUDE_MONITORS
+    SDL_SetHint(SDL_HINT_AUDIO_INCLUDE_MONITORS, "1");  // what the computer plays is an input, too
+#endif
     if (SDL_Init(SDL_INIT_VIDEO) != 0) {
         std::fprintf(stderr, "dspdll-analyser: no window can be opened: %s\n", SDL_GetError());
         return 1;
