@@ -9,7 +9,6 @@
 #include <gtest/gtest.h>
 
 #include "Support/DrawingSurface.h"
-#include "Support/VirtualSlot.h"
 
 using namespace Corvo;
 using TestSupport::DrawingSurface;
@@ -196,13 +195,6 @@ TYPED_TEST(Primitives, CopyEveryVersionOfABitmap) {
         for (int x = 0; x < bitmap.width; ++x)
             EXPECT_EQ(surface.Pixel(1 + x, 1), bitmap.Row(0)[x] & 0xFFFFFF) << x;
     }
-}
-
-// Catches a slot inserted or exchanged. The destructor takes two places in this ABI.
-TEST(DrawingApi, KeepsItsSlots) {
-    EXPECT_EQ(TestSupport::Slot(&DrawingApi::CreateSolidBrush), 2);
-    EXPECT_EQ(TestSupport::Slot(&DrawingApi::ReleaseBrush), 3);
-    EXPECT_EQ(TestSupport::Slot(&DrawingApi::ReleasePen), 4);
 }
 
 // Catches arguments that reach the system unchecked; what is not a number, empty or beyond any surface draws

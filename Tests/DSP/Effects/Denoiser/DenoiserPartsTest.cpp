@@ -68,25 +68,6 @@ TEST(SpectrumKernelsTest, WideRegistersGiveTheSameBits) {
     EXPECT_EQ(std::memcmp(baseline.data(), wide.data(), baseline.size() * sizeof(float)), 0);
 }
 
-// Catches a threshold that is one value off, at any length, and equal values that are lost.
-TEST(SpectrumKernelsTest, TheQuietHalfIsTheOneThatSortingFinds) {
-    for (std::size_t count = 2; count < 70; ++count)
-        for (const bool equal : {false, true}) {
-            auto values = Positive(count, count);
-            if (equal) std::fill(values.begin(), values.end(), 1e-20f);
-            auto sorted = values;
-            std::ranges::sort(sorted);
-            const std::size_t rank = count / 2, expected = equal ? count : rank;
-            double sum = 0.0;
-            for (std::size_t i = 0; i < expected; ++i) sum += static_cast<double>(sorted[i]);
-            values.resize(count + 7);
-            const auto quiet = BestSpectrumKernels().quiet(values.data(), values.data(), count, rank);
-            EXPECT_EQ(quiet.count, static_cast<float>(expected));
-            EXPECT_NEAR(quiet.sum, sum, 1e-5 * sum);
-            EXPECT_EQ(quiet.logSum, quiet.sum) << "the logs are the values here";
-        }
-}
-
 // Catches a step that is left out, done twice, out of its order or after the last tick, and an uneven spread.
 TEST(PaceTest, DoesEveryStepOnceAndEvenly) {
     Pace pace;

@@ -7,11 +7,8 @@
 
 #include "DSP/Effects/Framework/CorvoEffect.h"
 #include "Support/Signals.h"
-#include "Support/VirtualSlot.h"
 
 using namespace Corvo::DSP;
-using TestSupport::PlacesAround;
-using TestSupport::Slots;
 
 namespace {
 
@@ -59,27 +56,6 @@ private:
 using Edits = std::vector<Probe::Record>;
 
 }  // namespace
-
-// Catches a virtual operation that was moved, inserted or dropped: hosts call by number.
-TEST(CorvoEffectBase, KeepsEveryOperationInItsSlot) {
-    using B = CorvoEffectBase;
-    EXPECT_EQ(
-        Slots(&Probe::DoSetParam, &Probe::ProcessInternal, &Probe::ProcessInternalNoninterleaved,
-              &B::HasSeparateLeftRightSettings, &B::GetLatency, &B::IsCollapsingToMono, &B::HasNativeEditor,
-              &B::SetEditor, &B::SupportsNoninterleaved, &B::SetMaximumFramesPerBuffer,
-              &B::CheckCookProperties, &B::GetSettingsChunk, &B::GetSettingsChunkSize, &B::SetSettingsChunk,
-              &B::Cleanup, &B::NumPresets, &B::GetPresetName, &B::SetPreset, &B::GetParameterFormattedText,
-              &B::GetParamName, &B::GetParamUnitsText, &B::GetParam, &B::GetParamPlain, &B::GetParamCountReal,
-              &B::GetName, &B::IsCantrix, &B::SetParam, &B::GetParamCount, &B::GetParameterTypeAutomatable,
-              &B::GetDefaultPreset, &B::WantsXySerialization, &B::IsMono, &B::GetImage,
-              &B::GetNumSidechainBusses, &B::GetSidechainBusNumChannelsMax, &B::SetSidechainBuffer,
-              &B::GetParameterAvailableValues, &B::SeparateLeftRightControls,
-              &B::AllowChangeParamFromInputBox, &B::GetParamValueNormalizedFromText,
-              &B::GetPreferredNumColumnsForTab, &B::GetParamSectionInfo, &B::GetParamUiSections,
-              &B::GetPluginIconPath, &B::GetLookAndFeel, &B::InitResetProcessingLight,
-              &B::InitializeXyEditingData, &B::GetParamFromProp, &CorvoEffect::GetParametersInfo),
-        PlacesAround(10, 49));
-}
 
 // Catches pairs and reversed orders that reach the wrong parameter or lose the automation flag.
 TEST(CorvoEffectBase, RoutesExternalParametersToRealOnes) {

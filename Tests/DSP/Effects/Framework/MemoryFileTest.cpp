@@ -4,18 +4,8 @@
 
 #include <limits>
 
-#include "Support/VirtualSlot.h"
-
 using Corvo::CorvoException;
 using KivFiles::CMemoryFile;
-
-// Catches a virtual operation that was moved: hosts call by number.
-TEST(MemoryFile, KeepsEveryOperationInItsSlot) {
-    using F = KivFiles::CFileBase;
-    EXPECT_EQ(TestSupport::Slots(&F::Write, &F::Read, &F::Seek, &F::GetPosition, &F::Truncate, &F::GetLength,
-                                 &F::IsReadable, &F::IsWritable),
-              TestSupport::PlacesAround(3, 8));
-}
 
 // Catches positions and counts that reach outside the buffer.
 TEST(MemoryFile, ReadsOnlyWhatIsThere) {
