@@ -43,10 +43,14 @@ File Spool(File& from, const std::vector<unsigned char>& start, std::int64_t lim
         to.Write(buffer.data(), count);
         to.ThrowIfFailed();
         if (std::exchange(recognised, true)) continue;
-        if (!SoundFile::MayBeSound(to)) throw UserError(NoAudio(from.Name()));
+        const bool sound = SoundFile::MayBeSound(to);
+        to.ThrowIfFailed();
+        if (!sound) throw UserError(NoAudio(from.Name()));
         to.Seek(0, SEEK_END);
     }
     from.ThrowIfFailed();
+    to.Seek(0);
+    to.ThrowIfFailed();
     return to;
 }
 

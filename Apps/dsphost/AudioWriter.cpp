@@ -158,7 +158,7 @@ void AudioWriter::CompleteWav() {
     const std::int64_t size = m_frames * m_wav->channels * WavSampleBytes(m_wav->subtype);
     // Standard output may well be a file that can be gone back in; one that was appended to is left alone.
     const auto start = static_cast<std::int64_t>(MakeWavHeader(*m_wav, {}).size());
-    if (bytes.Position() != start + size || !bytes.Seek(0)) return;
+    if (bytes.Position() != start + size || bytes.Appends() || !bytes.Seek(0)) return;
     WriteHeader(size);
     bytes.Seek(0, SEEK_END);
     if (size % 2 != 0) bytes.Write("", 1);

@@ -221,8 +221,23 @@ std::size_t File::Write(const void* bytes, std::size_t count) {
     return done;
 }
 
-bool File::Seek(std::int64_t offset, int origin) { return SeekStream(m_stream, offset, origin) == 0; }
+bool File::Seek(std::int64_t offset, int origin) {
+    errno = 0;
+    if (SeekStream(m_stream, offset, origin) == 0) return true;
+    // Before it goes elsewhere it writes what is pending, and drops what the disk does not take.
+    if (std::ferror(m_stream) && m_error == 0) m_error = Reason();
+    return false;
+}
 std::int64_t File::Position() { return TellStream(m_stream); }
+
+bool File::Appends() const {
+#if defined(_WIN32)
+    return false;  // whoever opens a file to append to it only begins at its end
+#else
+    const int flags = fcntl(fileno(m_stream), F_GETFL);
+    return flags >= 0 && (flags & O_APPEND) != 0;
+#endif
+}
 
 std::int64_t File::Length() {
     const std::int64_t position = Position();
@@ -269,7 +284,7 @@ void File::Sync() {
 void File::Close() {
     if (!m_stream) return;
     errno = 0;
-    const bool flushed = std::fflush(m_stream) == 0;
+    const bool flushed = std::fflush(m_stream) == 0 && !std::ferror(m_stream);
     if (!flushed && m_error == 0) m_error = Reason();
     const bool closed = !m_owned || std::fclose(m_stream) == 0;
     if (!closed && m_error == 0) m_error = Reason();

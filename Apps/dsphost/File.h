@@ -52,6 +52,7 @@ public:
     bool Seek(std::int64_t offset, int origin = SEEK_SET);
     std::int64_t Position();  // -1 where the file has none
     std::int64_t Length();    // -1 where the file has none
+    bool Appends() const;     // all that is written goes to the end, wherever it was sought
 
     const std::string& Name() const { return m_name; }
     std::FILE* Stream() const { return m_stream; }

@@ -18,6 +18,7 @@
 
 #include <shellapi.h>
 #else
+#include <fcntl.h>
 #include <unistd.h>
 #endif
 
@@ -27,7 +28,7 @@ namespace {
 // Messages repeat arguments, which may be of any length. What would be accepted stands at the end.
 constexpr std::size_t kLongestMessage = 400;
 
-constexpr int kInterrupted = 130;
+constexpr int kFailed = 1, kInterrupted = 130;
 constexpr std::string_view kInterruptedMessage = "dsphost: interrupted\n";
 
 // Whoever changes the list of unfinished files, or reads it to end the program, has the lock. A signal that
@@ -81,9 +82,23 @@ bool WriteToConsole(std::FILE* stream, const std::string& text) {
 bool WriteToConsole(std::FILE*, const std::string&) { return false; }
 #endif
 
+#if !defined(_WIN32)
+// A file opened later would take the place of a closed stream, and get what is meant for that. What stands in
+// for it cannot be used; only messages vanish.
+void FillClosedStreams() {
+    for (const int stream : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO}) {
+        if (fcntl(stream, F_GETFD) >= 0) continue;
+        if (open("/dev/null", stream == STDOUT_FILENO ? O_RDONLY : O_WRONLY) != stream) _exit(kFailed);
+    }
+}
+#endif
+
 }  // namespace
 
 void PrepareProcess() {
+#if !defined(_WIN32)
+    FillClosedStreams();
+#endif
     g_onTerminal = IsTerminal(stderr);
 #if defined(_WIN32)
     _setmode(_fileno(stdin), _O_BINARY);

@@ -1,6 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <string>
+#include <utility>
 
 #include "Apps/Program.h"
 
@@ -150,15 +152,33 @@ TEST_F(CommandLine, RefusesBadInput) {
 }
 
 #if !defined(_WIN32)
-// A full disk: nothing stays, and the file that was to be replaced is still there.
+// A full disk, met by any of the writes: nothing stays, and the file that was to be replaced is still there.
 TEST_F(CommandLine, ReportsAFullDisk) {
-    Save("long.wav", NoiseSound(100000));
-    ExpectRefused(Shell("DSPHOST render long.wav /dev/full"), "/dev/full|No space left", 1);
-    for (const std::string name : {"out.wav", "out.flac", "out.aiff", "taken.wav"})
-        ExpectRefused(Shell("ulimit -f 100; DSPHOST render -y long.wav " + name), name + "|too large", 1);
+    for (const std::size_t thousands : {1, 10, 100}) {
+        Save("long.wav", NoiseSound(1000 * thousands));
+        Save("long.flac", NoiseSound(1000 * thousands, 2, SF_FORMAT_FLAC | SF_FORMAT_PCM_16));
+        for (const std::string name : {"/dev/full", "- > /dev/full"})
+            ExpectRefused(Shell("DSPHOST render long.wav " + name), "No space left", 1);
+        const std::string limit = "ulimit -f " + std::to_string(thousands) + "; ";
+        for (const std::string name : {"out.wav", "out.flac", "out.aiff", "taken.wav"})
+            ExpectRefused(Shell(limit + "DSPHOST render -y long.wav " + name), name + "|too large", 1);
+        ExpectRefused(Shell(limit + "cat long.flac | DSPHOST render - o.wav"), "temporary file|too large", 1);
+    }
     EXPECT_EQ(Bytes("taken.wav"), "something dear");
     for (const std::string arguments : {"effects", "--help", "render --help", "tuner in.wav o.png --json"})
         ExpectRefused(Shell("DSPHOST " + arguments + " > /dev/full"), "standard output|No space left", 1);
+}
+
+// No file comes to stand where a stream was closed.
+TEST_F(CommandLine, KeepsClosedStreamsApart) {
+    for (const auto& [line, words] : {std::pair{"DSPHOST render in.wav - >&-", "standard output|Bad file"},
+                                      {"DSPHOST render in.wav - --fx Gain --save-chunk c <&- >&-", "output"},
+                                      {"DSPHOST render - o.wav <&-", "standard input|Bad file"}})
+        ExpectRefused(Shell(line), words, 1);
+    Save("loud.wav", {1, 48000, kDouble, {0.5, HUGE_VAL}});  // warned of while the output is open
+    ASSERT_EQ(Shell("DSPHOST render loud.wav told.wav; cat loud.wav | DSPHOST render - o.wav 2>&-").status,
+              0);
+    EXPECT_EQ(Bytes("o.wav"), Bytes("told.wav"));
 }
 
 // Whatever ends the program and whatever it waits for, nothing is left, in its folder or among the temporary

@@ -166,6 +166,9 @@ TEST_F(Pipes, WritesSizesThatSayUntilTheEnd) {
     // Standard output that is a file can be completed.
     ASSERT_EQ(Shell("DSPHOST render in.wav - > file.wav").status, 0);
     EXPECT_EQ(Bytes("file.wav"), Bytes("in.wav"));
+    // Unless all goes to its end.
+    ASSERT_EQ(Shell("DSPHOST render in.wav - >> log.wav").status, 0);
+    EXPECT_EQ(Bytes("log.wav"), Bytes("stream"));
 }
 
 // Ten minutes of stereo at 96 kHz, made up while it is read: memory must not grow with length.
