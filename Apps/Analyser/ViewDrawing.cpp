@@ -96,10 +96,10 @@ float View::DrawLevel(DrawTarget& target, const RectF& bar, float x) const {
     target.FillRectangle({whole.x, whole.y, std::round(whole.width * share), thick}, {colour});
     x += whole.width + 2.0f * Look::kGap * scale;
     if (!loud) return x;
-    constexpr std::string_view kText = "Too loud";
-    target.Text(kText, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
+    const std::string_view text = m_shell.GetPlayback() ? "Full scale" : "Too loud";
+    target.Text(text, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
                 {colour});
-    return x + target.MeasureText(kText, size).width + 2.0f * Look::kGap * scale;
+    return x + target.MeasureText(text, size).width + 2.0f * Look::kGap * scale;
 }
 
 void View::DrawBar(DrawTarget& target, const RectF& bar) {
