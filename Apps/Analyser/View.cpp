@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <utility>
+#include <vector>
 
 #include "Commands.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
@@ -63,7 +64,10 @@ int View::Rate() const {
 }
 
 void View::StartOver() {
+    const std::vector<float> silence(
+        static_cast<std::size_t>(std::max(kivspectrum::GetSettings().window_length, 1)));
     for (kivspectrum& each : m_analysers) {
+        each.Feed(silence.data(), static_cast<int>(silence.size()), 1, 1);
         each.GetSonogram()->Clear();
         each.GetTuner()->Forget();
         each.peak_reset();
@@ -168,10 +172,11 @@ void View::Pan(double fromHz, double toHz) {
 // The sonogram ends so long ago, or as long as it can. False when there is no sonogram.
 bool View::LookBack(double seconds) {
     kivspectrum& first = GetAnalyser();
+    if (!first.IsShowSonogram() && seconds > 0.0) return false;
     first.GetSonogram()->LookBack(seconds);
     m_analysers[1].GetSonogram()->LookBack(first.GetSonogram()->GetSecondsBack());
     m_dirty = true;
-    return first.IsShowSonogram();
+    return true;
 }
 
 double View::SecondsBack() const {

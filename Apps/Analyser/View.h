@@ -36,7 +36,7 @@ public:
     bool Refresh();
     // The whole picture. `dpi` is what it is to be looked at with: 96 on a plain screen.
     void Draw(cairo_t* context, int width, int height, float dpi);
-    // Nothing of what was heard is shown any more: another input or place in a file.
+    // Nothing of what was heard is shown any more: another input or place in a file. Nothing feeds meanwhile.
     void StartOver();
     // What the sonogram's right edge is called, seconds; 0 for what is live.
     void SetTime(double seconds);

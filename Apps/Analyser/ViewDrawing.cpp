@@ -96,10 +96,10 @@ float View::DrawLevel(DrawTarget& target, const RectF& bar, float x) const {
     target.FillRectangle({whole.x, whole.y, std::round(whole.width * share), thick}, {colour});
     x += whole.width + 2.0f * Look::kGap * scale;
     if (!loud) return x;
-    constexpr std::string_view kText = "Too loud";
-    target.Text(kText, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
+    const std::string_view text = m_shell.GetPlayback() ? "Full scale" : "Too loud";
+    target.Text(text, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
                 {colour});
-    return x + target.MeasureText(kText, size).width + 2.0f * Look::kGap * scale;
+    return x + target.MeasureText(text, size).width + 2.0f * Look::kGap * scale;
 }
 
 void View::DrawBar(DrawTarget& target, const RectF& bar) {
@@ -188,7 +188,7 @@ void View::DrawKeys(DrawTarget& target, const RectF& rectangle) const {
     const float pitch = std::min(22.0f * scale, (rectangle.height - 40.0f * scale) / rows);
     const float size = std::min(0.6f * pitch, Look::kInfoSize * scale);
     if (size < 4.0f) return;
-    const float column = std::min(26.0f * size, rectangle.width / 2.0f - size), pad = size;
+    const float column = std::min(27.5f * size, rectangle.width / 2.0f - size), pad = size;
     const RectF box{std::round(rectangle.x + rectangle.width / 2.0f - column - pad / 2.0f),
                     std::round(rectangle.y + (rectangle.height - rows * pitch) / 2.0f - pad),
                     std::round(2.0f * column + pad), std::round(rows * pitch + 2.0f * pad)};
@@ -199,7 +199,7 @@ void View::DrawKeys(DrawTarget& target, const RectF& rectangle) const {
         const float x = box.x + pad + (number >= static_cast<int>(rows) ? column : 0.0f);
         const float y = box.y + pad + (at + 0.7f) * pitch;
         target.Text(key, {x, y}, TextAlign::Left, size, {Look::kCurve});
-        target.Text(text, {x + 7.0f * size, y}, TextAlign::Left, size, {Look::kText});
+        target.Text(text, {x + 8.0f * size, y}, TextAlign::Left, size, {Look::kText});
         ++number;
     };
     for (const CommandRow& row : commands) line(row.shortcut, row.text);

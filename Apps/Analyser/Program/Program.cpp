@@ -250,6 +250,7 @@ void Program::ChooseInput(int index) {
 
 void Program::Listen(const std::string& name) {
     m_player.Close();
+    m_input->Close();
     m_chosenInput = name;
     m_view->StartOver();
     m_view->SetTime(0.0);
