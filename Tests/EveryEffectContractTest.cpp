@@ -20,14 +20,11 @@ constexpr std::string_view kPromised =
 #include "contract.inc"
     ;
 
-std::string Number(float value) {
+std::string Number(auto value, auto... base) {
     char text[32];
-    return {text, std::to_chars(text, text + sizeof text, value).ptr};
+    return {text, std::to_chars(text, text + sizeof text, value, base...).ptr};
 }
-std::string Hex(std::uint64_t value) {
-    char text[32];
-    return {text, std::to_chars(text, text + sizeof text, value, 16).ptr};
-}
+std::string Hex(std::uint64_t value) { return Number(value, 16); }
 std::string Narrow(const std::wstring& wide) { return {wide.begin(), wide.end()}; }
 
 // FNV-1a.

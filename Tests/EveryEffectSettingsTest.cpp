@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <stdexcept>
 
 #include "Support/EveryEffect.h"
@@ -22,6 +21,17 @@ void ExpectHarmless(CorvoEffectBase& effect, const Bytes& chunk, const std::stri
         const float value = effect.GetParam(i);
         ASSERT_TRUE(value >= 0.0f && value <= 1.0f) << what << ", parameter " << i << " at " << value;
         effect.GetParameterFormattedText(i, value);
+    }
+}
+
+// What an effect makes of a text: -1 also where it says by throwing that the text holds no number.
+float Parsed(CorvoEffectBase& effect, int index, const std::string& text) {
+    try {
+        return effect.GetParamValueNormalizedFromText(index, text);
+    } catch (const std::invalid_argument&) {
+        return -1.0f;
+    } catch (const std::out_of_range&) {
+        return -1.0f;
     }
 }
 
@@ -106,8 +116,7 @@ TEST_P(EveryEffectSettings, SurvivesAnyChunk) {
     effect->SetSettingsChunk(good);
     EXPECT_EQ(Chunk(*effect), good) << "a good chunk is taken after all that";
     effect->Cleanup();
-    const auto output = Render(*effect, Noise<float>(2 * 4800), format, {512});
-    EXPECT_TRUE(std::ranges::all_of(output, [](float sample) { return std::isfinite(sample); }));
+    EXPECT_TRUE(AllFinite(Render(*effect, Noise<float>(2 * 4800), format, {512})));
 }
 
 // Catches a number from outside that is believed.
@@ -119,12 +128,15 @@ TEST_P(EveryEffectSettings, IgnoresPresetNumbersAndIndicesItDoesNotHave) {
     EXPECT_EQ(Chunk(*effect), before);
 }
 
-// Catches texts that the effect shows but does not understand, or reads as another value.
+// Catches texts that the effect shows but does not understand, or reads as another value, and nonsense that
+// it takes for a value.
 TEST_P(EveryEffectSettings, UnderstandsTheTextsItShows) {
     const auto effect = Make();
     for (int index = 0; index < effect->GetParamCount(); ++index) {
         // The host matches the texts of switches and lists itself.
         if (effect->GetParameterTypeAutomatable(index) != Corvo::EffectParameterType::Continuous) continue;
+        for (const char* text : {"", "  ", "loud", ".", "+-1", "1e400"})
+            EXPECT_EQ(Parsed(*effect, index, text), -1.0f) << "parameter " << index << ", " << text;
         for (int step = 0; step <= 100; ++step) {
             effect->SetParam(index, static_cast<float>(step) / 100.0f, false);
             const auto shown = Text(*effect, index);

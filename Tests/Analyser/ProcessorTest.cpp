@@ -1,7 +1,6 @@
 #include "Processor.h"
 
 #include <chrono>
-#include <cmath>
 #include <cstring>
 #include <thread>
 #include <vector>

@@ -2,10 +2,9 @@
 
 #include <gtest/gtest.h>
 
-#include <cairo.h>
-
 #include "Commands.h"
 #include "Drawing/Views/ShownAnalyser.h"
+#include "Support/DrawingSurface.h"
 #include "View.h"
 
 namespace AnalyserTest {
@@ -38,23 +37,13 @@ struct TestShell : analyser::Shell {
 // Draws on a surface of its own, 960 x 600.
 class Canvas {
 public:
-    static constexpr int kWidth = 960, kHeight = 600;
-
-    Canvas()
-        : m_surface(cairo_image_surface_create(CAIRO_FORMAT_RGB24, kWidth, kHeight)),
-          m_context(cairo_create(m_surface)) {}
-    ~Canvas() {
-        cairo_destroy(m_context);
-        cairo_surface_destroy(m_surface);
+    void Draw(analyser::View& view) {
+        m_surface.PaintPlainly([&](cairo_t* context) { view.Draw(context, kWidth, kHeight, 96.0f); });
     }
-    Canvas(const Canvas&) = delete;
-    Canvas& operator=(const Canvas&) = delete;
-
-    void Draw(analyser::View& view) { view.Draw(m_context, kWidth, kHeight, 96.0f); }
 
 private:
-    cairo_surface_t* m_surface;
-    cairo_t* m_context;
+    static constexpr int kWidth = 960, kHeight = 600;
+    TestSupport::DrawingSurface<Corvo::DrawingCairo> m_surface{kWidth, kHeight};
 };
 
 }  // namespace AnalyserTest

@@ -3,6 +3,7 @@
 #include <cmath>
 
 #include "Apps/Program.h"
+#include "Support/Signals.h"
 
 namespace AppTest {
 namespace {
@@ -21,12 +22,7 @@ Sound Recording(int rate, int channels = 1) {
 }
 
 double Power(const Sound& sound, double from, double to) {
-    double sum = 0.0;
-    const auto at = [&](double t) {
-        return static_cast<std::size_t>(t * sound.rate) * static_cast<std::size_t>(sound.channels);
-    };
-    for (std::size_t i = at(from); i < at(to); ++i) sum += sound.samples.at(i) * sound.samples[i];
-    return 10.0 * std::log10(sum / static_cast<double>(at(to) - at(from)));
+    return TestSupport::Level(sound.samples, from, to, sound.rate * sound.channels);
 }
 
 // Catches output that is late or short, a residue that is not what is missing, passages that are not heeded,

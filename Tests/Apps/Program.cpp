@@ -1,7 +1,6 @@
 #include "Apps/Program.h"
 
 #include <algorithm>
-#include <atomic>
 #include <cmath>
 #include <cstdlib>
 #include <fstream>

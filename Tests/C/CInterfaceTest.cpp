@@ -6,7 +6,6 @@
 #include <string>
 #include <tuple>
 #include <type_traits>
-#include <utility>
 #include <vector>
 
 #include <gtest/gtest.h>
@@ -218,14 +217,11 @@ TEST(CInterface, ProcessesLikeTheClasses) {
                     ASSERT_EQ(dsp_effect_process_f64(effect, block, count), DSP_OK);
                     continue;
                 }
-                std::vector<double> planes(2 * static_cast<std::size_t>(count));
-                const auto plane = [&](int i) -> double& {
-                    return planes[static_cast<std::size_t>(i % 2 * count + i / 2)];
-                };
-                for (int i = 0; i < 2 * count; ++i) plane(i) = block[i];
-                double* const channels[]{planes.data(), planes.data() + count};
+                const std::vector<double> both(block, block + 2 * count);
+                auto left = TestSupport::Channel(both, 0), right = TestSupport::Channel(both, 1);
+                double* const channels[]{left.data(), right.data()};
                 ASSERT_EQ(dsp_effect_process_planar_f64(effect, channels, count), DSP_OK);
-                for (int i = 0; i < 2 * count; ++i) block[i] = plane(i);
+                for (int i = 0; i < 2 * count; ++i) block[i] = channels[i % 2][i / 2];
             }
             EXPECT_EQ(dsp_close(effect), DSP_OK);
             EXPECT_EQ(std::memcmp(got.data(), expected.data(), sizeof(double) * got.size()), 0)
@@ -238,47 +234,45 @@ TEST(CInterface, ProcessesLikeTheClasses) {
 // sanitizer), and statuses that depend on what the other thread does.
 TEST(CInterface, IsEditedAndAskedWhileItProcesses) {
     const dsp_format format{sizeof(dsp_format), 8000, 2, DSP_F32, 64};
+    const auto ok = [](dsp_status status) { EXPECT_EQ(status, DSP_OK); };
     for (const auto& kind : Corvo::DSP::EffectKinds()) {
         SCOPED_TRACE(kind.name);
         dsp_effect* effect = nullptr;
         dsp_analyser* analyser = nullptr;
-        ASSERT_EQ(dsp_effect_create(kind.name, &effect, nullptr), DSP_OK);
-        ASSERT_EQ(dsp_analyser_create(8000, &analyser, nullptr), DSP_OK);
-        ASSERT_EQ(dsp_effect_prepare(effect, &format, nullptr), DSP_OK);
+        ok(dsp_effect_create(kind.name, &effect, nullptr));
+        ok(dsp_analyser_create(8000, &analyser, nullptr));
+        ok(dsp_effect_prepare(effect, &format, nullptr));
         const auto audio = [&](int block) {
             auto samples = TestSupport::Noise<float>(2 * 100);
-            EXPECT_EQ(dsp_effect_process_f32(effect, samples.data(), 100), DSP_OK);
-            EXPECT_EQ(dsp_analyser_feed_f32(analyser, samples.data(), 100, 2), DSP_OK);
-            EXPECT_EQ(block % 7 == 0 ? dsp_effect_rewind(effect, 0) : DSP_OK, DSP_OK);
+            ok(dsp_effect_process_f32(effect, samples.data(), 100));
+            ok(dsp_analyser_feed_f32(analyser, samples.data(), 100, 2));
+            ok(block % 7 == 0 ? dsp_effect_rewind(effect, 0) : DSP_OK);
         };
         const auto edit = [&] {
             std::vector<std::byte> state(1 << 20);
             int32_t parameters = 0, presets = 0, latency = 0;
             std::size_t needed = 0;
             char text[200];
-            EXPECT_EQ(dsp_effect_parameters(effect, &parameters), DSP_OK);
-            EXPECT_EQ(dsp_effect_presets(effect, &presets), DSP_OK);
+            ok(dsp_effect_parameters(effect, &parameters));
+            ok(dsp_effect_presets(effect, &presets));
             for (int round = 0; round < 10; ++round) {
                 dsp_effect* other = nullptr;
-                EXPECT_EQ(dsp_effect_create("Gain", &other, nullptr), DSP_OK);
+                ok(dsp_effect_create("Gain", &other, nullptr));
                 for (int32_t p = 0; p < parameters; ++p) {
-                    EXPECT_EQ(dsp_effect_set(effect, p, static_cast<float>((p + round) % 11) / 10.0f),
-                              DSP_OK);
-                    EXPECT_EQ(
-                        dsp_effect_parameter_text(effect, p, DSP_TEXT_VALUE, text, sizeof text, nullptr),
-                        DSP_OK);
+                    ok(dsp_effect_set(effect, p, static_cast<float>((p + round) % 11) / 10.0f));
+                    ok(dsp_effect_parameter_text(effect, p, DSP_TEXT_VALUE, text, sizeof text, nullptr));
                 }
-                EXPECT_EQ(dsp_effect_latency(effect, &latency), DSP_OK);
-                EXPECT_EQ(dsp_effect_state(effect, state.data(), state.size(), &needed), DSP_OK);
-                EXPECT_EQ(dsp_effect_set_state(effect, state.data(), needed, nullptr), DSP_OK);
-                EXPECT_EQ(presets > 0 ? dsp_effect_set_preset(effect, round % presets) : DSP_OK, DSP_OK);
-                EXPECT_EQ(dsp_analyser_refresh(analyser, nullptr), DSP_OK);
-                EXPECT_EQ(dsp_close(other), DSP_OK);
+                ok(dsp_effect_latency(effect, &latency));
+                ok(dsp_effect_state(effect, state.data(), state.size(), &needed));
+                ok(dsp_effect_set_state(effect, state.data(), needed, nullptr));
+                ok(presets > 0 ? dsp_effect_set_preset(effect, round % presets) : DSP_OK);
+                ok(dsp_analyser_refresh(analyser, nullptr));
+                ok(dsp_close(other));
             }
         };
         TestSupport::WhileAnotherThread(audio, edit);
-        EXPECT_EQ(dsp_close(analyser), DSP_OK);
-        EXPECT_EQ(dsp_close(effect), DSP_OK);
+        ok(dsp_close(analyser));
+        ok(dsp_close(effect));
     }
 }
 

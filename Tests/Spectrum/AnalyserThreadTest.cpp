@@ -1,5 +1,4 @@
 #include <chrono>
-#include <vector>
 
 #include "Drawing/Views/Views.h"
 #include "Spectrum/AnalyserFixture.h"

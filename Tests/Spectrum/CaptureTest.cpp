@@ -1,10 +1,8 @@
 #include <algorithm>
 #include <numeric>
-#include <string>
 #include <vector>
 
 #include "Spectrum/AnalyserFixture.h"
-#include "Support/AudioThreadRules.h"
 
 namespace {
 
@@ -65,20 +63,6 @@ TEST_F(Capture, KeepsTheNewestSamplesThroughARebuild) {
         if (length == 8) Feed(analyser, Ramp(10));
     }
     EXPECT_EQ(analyser.GetBufferInputPoints(), (Values{7, 8, 9, 10}));
-}
-
-TEST_F(Capture, NeitherAllocatesNorWaits) {
-    if (!TestSupport::AudioThreadRules::CanCount()) GTEST_SKIP();
-    kivspectrum analyser;
-    analyser.SetOn(true);
-    const auto block = Ramp(8192);
-    Feed(analyser, block);
-    Prepare(analyser);
-    const TestSupport::AudioThreadRules rules;
-    for (int i = 0; i < 100; ++i) analyser.Feed(block.data(), 512, 1, 1);
-    EXPECT_EQ(rules.Broken(), "");
-    Prepare(analyser);
-    EXPECT_EQ(rules.Broken().find("alloc"), std::string::npos) << rules.Broken();
 }
 
 }  // namespace

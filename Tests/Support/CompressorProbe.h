@@ -22,11 +22,6 @@ enum CompressorParameter : int {
     kMonitor = 14
 };
 
-inline void SetBoth(Compressor& effect, int index, float value) {
-    effect.SetParam(index, value, false);
-    effect.SetParam(index + 1, value, false);
-}
-
 inline float ThresholdPosition(int tenths) { return (static_cast<float>(tenths) + 799.5f) / 790.0f; }
 inline float RatioPosition(int step) { return (static_cast<float>(step) + 0.5f) / 251.0f; }
 inline float TimePosition(int hundredths) { return (static_cast<float>(hundredths) - 0.5f) / 99999.0f; }

@@ -43,6 +43,18 @@ void ProcessBlock(CorvoEffectBase& effect, Sample* block, int frames, const tWAV
     effect.Process(reinterpret_cast<double*>(block), frames, &format, flags);
 }
 
+// The same for a block whose channels the effect is given one by one.
+template <typename Sample>
+void ProcessPlanes(CorvoEffectBase& effect, std::vector<Sample>& block, const tWAVEFORMATEX& format) {
+    std::vector<std::vector<Sample>> planes(format.nChannels);
+    std::vector<double*> channels;
+    for (std::size_t i = 0; i < block.size(); ++i) planes[i % planes.size()].push_back(block[i]);
+    for (auto& plane : planes) channels.push_back(reinterpret_cast<double*>(plane.data()));
+    Corvo::DSP::ProcessFlags flags;
+    effect.ProcessNoninterleaved(channels.data(), static_cast<int>(planes[0].size()), &format, flags);
+    for (std::size_t i = 0; i < block.size(); ++i) block[i] = planes[i % planes.size()][i / planes.size()];
+}
+
 // Runs interleaved `samples` through the effect in blocks whose sizes are taken from `cuts` in turn. Blocks
 // also end where an edit (sorted by place) is due, so that every way of cutting makes the edits at the same
 // frame.
@@ -98,6 +110,11 @@ inline std::string Text(CorvoEffectBase& effect, int index, double value) {
 }
 inline std::string Text(CorvoEffectBase& effect, int index) {
     return Text(effect, index, effect.GetParam(index));
+}
+
+// A parameter of the left side and, right behind it, that of the right one.
+inline void SetBoth(CorvoEffectBase& effect, int index, float value) {
+    for (const int side : {0, 1}) effect.SetParam(index + side, value, false);
 }
 
 inline std::vector<float> AllParams(CorvoEffectBase& effect) {

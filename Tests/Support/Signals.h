@@ -1,6 +1,8 @@
 #pragma once
 
+#include <algorithm>
 #include <cmath>
+#include <complex>
 #include <cstddef>
 #include <cstdint>
 #include <numbers>
@@ -41,6 +43,10 @@ private:
     std::uint64_t m_state;
 };
 
+inline bool AllFinite(const auto& samples) {
+    return std::ranges::all_of(samples, [](auto sample) { return std::isfinite(sample); });
+}
+
 // `count` samples in -amplitude..amplitude.
 template <typename Sample>
 std::vector<Sample> Noise(std::size_t count, double amplitude = 0.25, std::uint64_t seed = 1) {
@@ -61,6 +67,39 @@ std::vector<Sample> Sine(std::size_t frames, double hz, int rate = 48000, double
                     static_cast<Sample>(
                         amplitude * std::sin(2.0 * std::numbers::pi * hz * static_cast<double>(i) / rate)));
     return sine;
+}
+
+// The mean power from one second to another, in decibels.
+template <typename Sample>
+double Level(const std::vector<Sample>& mono, double from, double to, int rate = 48000) {
+    double sum = 0.0;
+    const auto first = static_cast<std::size_t>(from * rate), last = static_cast<std::size_t>(to * rate);
+    for (std::size_t i = first; i < last; ++i)
+        sum += static_cast<double>(mono.at(i)) * static_cast<double>(mono[i]);
+    return 10.0 * std::log10(sum / static_cast<double>(last - first) + 1e-30);
+}
+
+template <typename Sample>
+std::vector<Sample> Mixed(std::vector<Sample> a, const std::vector<Sample>& b, double gain = 1.0) {
+    for (std::size_t i = 0; i < a.size(); ++i) a[i] += static_cast<Sample>(gain) * b.at(i);
+    return a;
+}
+
+// One of the channels of an interleaved block.
+template <typename Sample>
+std::vector<Sample> Channel(const std::vector<Sample>& interleaved, std::size_t channel,
+                            std::size_t count = 2) {
+    std::vector<Sample> samples;
+    for (std::size_t i = channel; i < interleaved.size(); i += count) samples.push_back(interleaved[i]);
+    return samples;
+}
+
+// What samples have of one frequency, given in turns a sample, by the transform's definition.
+std::complex<double> TransformAt(const auto& samples, double turns) {
+    const auto step = std::polar(1.0, -2.0 * std::numbers::pi * turns);
+    std::complex<double> sum = 0.0;
+    for (std::size_t i = samples.size(); i-- > 0;) sum = sum * step + static_cast<double>(samples[i]);
+    return sum;
 }
 
 }  // namespace TestSupport

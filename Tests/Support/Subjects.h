@@ -57,17 +57,8 @@ struct EffectSubject : Subject<Sample> {
         effect->AddEnvelope(0, 0, nullptr);
     }
     void Run(std::vector<Sample>& block) override {
-        EXPECT_NO_THROW(planar ? RunPlanes(block)
+        EXPECT_NO_THROW(planar ? ProcessPlanes(*effect, block, format)
                                : ProcessBlock(*effect, block.data(), kSubjectFrames, format));
-    }
-    void RunPlanes(std::vector<Sample>& block) {
-        std::array<std::array<Sample, kSubjectFrames>, 2> planes;
-        for (std::size_t i = 0; i < block.size(); ++i) planes[i % 2][i / 2] = block[i];
-        double* const channels[] = {reinterpret_cast<double*>(planes[0].data()),
-                                    reinterpret_cast<double*>(planes[1].data())};
-        Corvo::DSP::ProcessFlags flags;
-        effect->ProcessNoninterleaved(channels, kSubjectFrames, &format, flags);
-        for (std::size_t i = 0; i < block.size(); ++i) block[i] = planes[i % 2][i / 2];
     }
     std::unique_ptr<CorvoEffectBase> effect;
     bool planar;

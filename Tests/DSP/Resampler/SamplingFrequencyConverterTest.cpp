@@ -4,7 +4,6 @@
 
 #include <limits>
 #include <numeric>
-#include <string>
 
 #include "Plain/ButterworthReference.h"
 #include "Support/Signals.h"

@@ -49,40 +49,28 @@ TEST_F(CairoBackend, CurvesAreAsOutlined) {
         if (width == 0.0f)
             for (const float x : {points.back().x, points.front().x}) points.push_back({x, 210.0f});
         const auto count = static_cast<int>(points.size());
-        const auto picture = [&](bool outlined) {
-            cairo_surface_t* const image = cairo_image_surface_create(CAIRO_FORMAT_RGB24, kSide, kSide);
-            cairo_t* const context = cairo_create(image);
-            if (outlined) {
-                cairo_set_source_rgb(context, 1.0, 1.0, 1.0);
-                cairo_set_line_width(context, width);
-                cairo_set_line_join(context, CAIRO_LINE_JOIN_ROUND);
-                cairo_set_line_cap(context, CAIRO_LINE_CAP_ROUND);
-                for (const PointF& p : points) cairo_line_to(context, p.x, p.y);
-                width > 0.0f ? cairo_stroke(context) : cairo_fill(context);
-            } else {
-                DrawingCairo drawing;
-                DrawingCairo::DrawTarget target(drawing, context, 96.0f);
-                if (width > 0.0f)
-                    target.Polyline(points.data(), count, {{0xFFFFFF}, width});
-                else
-                    target.FillPolygon(points.data(), count, {0xFFFFFF});
-            }
-            cairo_surface_flush(image);
-            const unsigned char* const bytes = cairo_image_surface_get_data(image);
-            std::vector<int> levels;
-            for (int y = 0; y < kSide; ++y)
-                for (int x = 0; x < kSide; ++x)
-                    levels.push_back(bytes[y * cairo_image_surface_get_stride(image) + 4 * x]);
-            cairo_destroy(context);
-            cairo_surface_destroy(image);
-            return levels;
-        };
-        const auto fast = picture(false), plain = picture(true);
+        DrawingSurface<DrawingCairo> fast(kSide, kSide), plain(kSide, kSide);
+        plain.PaintPlainly([&](cairo_t* context) {
+            cairo_set_source_rgb(context, 1.0, 1.0, 1.0);
+            cairo_set_line_width(context, width);
+            cairo_set_line_join(context, CAIRO_LINE_JOIN_ROUND);
+            cairo_set_line_cap(context, CAIRO_LINE_CAP_ROUND);
+            for (const PointF& p : points) cairo_line_to(context, p.x, p.y);
+            width > 0.0f ? cairo_stroke(context) : cairo_fill(context);
+        });
+        fast.Paint(96.0f, [&](DrawTarget& target) {
+            if (width > 0.0f)
+                target.Polyline(points.data(), count, {{0xFFFFFF}, width});
+            else
+                target.FillPolygon(points.data(), count, {0xFFFFFF});
+        });
         double off = 0.0, covered = 0.0;
-        for (std::size_t i = 0; i < fast.size(); ++i) {
-            EXPECT_NEAR(fast[i], plain[i], 32) << width << " at " << i;
-            off += std::abs(fast[i] - plain[i]);
-            covered += plain[i];
+        for (int i = 0; i < kSide * kSide; ++i) {
+            const double level = fast.Pixel(i % kSide, i / kSide) & 0xFF;
+            const double expected = plain.Pixel(i % kSide, i / kSide) & 0xFF;
+            EXPECT_NEAR(level, expected, 32.0) << width << " at " << i;
+            off += std::abs(level - expected);
+            covered += expected;
         }
         EXPECT_LT(off, 0.03 * covered) << width;
     }
@@ -144,25 +132,13 @@ TEST_F(CairoBackend, CopiesBitmapsPixelByPixel) {
                  {2.0, 1.0, 4.0f, false}, {1.0, 2.0, 2.0f, true},  {1.0, 2.0, 4.0f, false},
                  {2.0, 0.5, 4.0f, true}};
     for (const auto& c : cases) {
-        cairo_surface_t* const surface = cairo_image_surface_create(CAIRO_FORMAT_RGB24, 16, 16);
-        cairo_surface_set_device_scale(surface, c.deviceScale, c.deviceScale);
-        cairo_t* const context = cairo_create(surface);
-        cairo_scale(context, c.contextScale, c.contextScale);
-        {
-            DrawingCairo drawing;
-            DrawingCairo::DrawTarget target(drawing, context, 96.0f);
-            const auto at = static_cast<float>(2.3 / (c.deviceScale * c.contextScale));
-            target.Bitmap(bitmap, {at, at, c.width, c.width}, 255);
-        }
-        cairo_destroy(context);
-        cairo_surface_flush(surface);
-        const auto* const row = reinterpret_cast<const std::uint32_t*>(
-            cairo_image_surface_get_data(surface) + 4 * cairo_image_surface_get_stride(surface));
+        DrawingSurface<DrawingCairo> surface(16, 16, c.deviceScale, c.contextScale);
+        const auto at = static_cast<float>(2.3 / (c.deviceScale * c.contextScale));
+        surface.Paint(96.0f, [&](DrawTarget& t) { t.Bitmap(bitmap, {at, at, c.width, c.width}, 255); });
         int between = 0;
         for (int x = 3; x < (c.copied ? 6 : 9); ++x)
-            between += (row[x] & 0xFF) > 0x08 && (row[x] & 0xFF) < 0xF8 ? 1 : 0;
+            between += (surface.Pixel(x, 4) & 0xFF) > 0x08 && (surface.Pixel(x, 4) & 0xFF) < 0xF8 ? 1 : 0;
         EXPECT_EQ(between == 0, c.copied) << c.deviceScale << ", " << c.contextScale << ", " << c.width;
-        cairo_surface_destroy(surface);
     }
 }
 

@@ -52,15 +52,6 @@ TEST(Axis, ScalesAreMarkedAtRoundValues) {
         EXPECT_LE(FrequencyTicks(Map(scale, 0, 1e9, 1e6f), {1e6f, 1, 1}, false).All().size(), 192u);
 }
 
-TEST(Axis, RoomIsGivenOnce) {
-    LabelRoom room(0, 100, 5);
-    EXPECT_TRUE(room.Take(10, 20));
-    EXPECT_FALSE(room.Take(22, 30)) << "closer than the gap";
-    EXPECT_TRUE(room.Take(25, 30));
-    EXPECT_FALSE(room.Take(5, 40)) << "around both";
-    EXPECT_FALSE(room.Take(96, 101));
-}
-
 // The names' expected values are those of equal temperament: A4 = 440 Hz, a cent a factor of 2^(1/1200).
 TEST(ShortText, ReadsLikeAScale) {
     EXPECT_EQ(ShortText().AddFrequency(55.0).View(), "55.00 Hz");

@@ -1,8 +1,6 @@
 #pragma once
 
-#include <cmath>
 #include <cstddef>
-#include <tuple>
 #include <vector>
 
 #include "Spectrum/AnalyserFixture.h"

@@ -49,10 +49,7 @@ inline std::vector<float> Sound(Kind kind, double f0, int rate, std::size_t fram
     return sound;
 }
 
-inline std::vector<float> Mixed(std::vector<float> sound, const std::vector<float>& other, float share = 1) {
-    for (std::size_t i = 0; i < sound.size(); ++i) sound[i] += share * other[i];
-    return sound;
-}
+using TestSupport::Mixed;
 
 // Partials of the same amplitude; one that is named twice sounds twice as loud.
 inline std::vector<float> Partials(const std::vector<int>& numbers, double hz, int rate, std::size_t frames) {

@@ -1,9 +1,7 @@
 #include "Spectrum/Tuner/Tuner.h"
 
-#include <algorithm>
 #include <array>
 #include <cmath>
-#include <tuple>
 
 #include "Spectrum/Tuner/TunerFixture.h"
 #include "Support/AudioThreadRules.h"

@@ -45,8 +45,6 @@ Bytes FullChunk(Compressor& effect, Random& random) {
     return chunk;
 }
 
-int StepOf(float position) { return static_cast<int>(position * 251.0f); }
-
 }  // namespace
 
 // Catches a preset that does not do what its row says, and rows that contradict their names.
@@ -116,7 +114,7 @@ TEST(CompressorCurve, KneesMoveAlong) {
         for (const int word : edits) {
             if (word < 0) {
                 threshold = word / 10.0;
-                for (int i = 0; i < 50; ++i) SetBoth(effect, kThreshold, static_cast<float>(i) / 50.0f);
+                for (int i = 0; i < 1000; ++i) SetBoth(effect, kThreshold, static_cast<float>(i) / 1e3f);
                 SetBoth(effect, kThreshold, ThresholdPosition(word));
             } else {
                 slope = 1.0 - word / 251.0;
@@ -148,12 +146,6 @@ TEST(CompressorCurve, WritingBackChangesNothing) {
                 effect.SetParam(index, effect.GetParam(index), fromAutomation);
             EXPECT_EQ(state(), before) << preset;
         }
-    Compressor effect;
-    effect.SetPreset(1);
-    for (int step = 251; step >= 0; --step) {
-        effect.SetParam(kRatio, RatioPosition(step), false);
-        ASSERT_EQ(StepOf(effect.GetParam(kRatio)), step);
-    }
 }
 
 // Catches edits that are heard as a step, where a glide sets out, before or after the last one has ended, or

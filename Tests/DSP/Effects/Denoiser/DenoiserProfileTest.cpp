@@ -34,18 +34,6 @@ Bytes ProfileOf(DenoiserProcessor& denoiser) {
     return {chunk.begin() + kSecondsAt, chunk.end()};
 }
 
-// Learns on without an end.
-void Open(DenoiserProcessor& denoiser, std::vector<float> noise, const tWAVEFORMATEX& format) {
-    denoiser.SetParam(kLearn, 1.0f, false);
-    ProcessBlock(denoiser, noise.data(), static_cast<int>(noise.size()), format);
-}
-
-void Close(DenoiserProcessor& denoiser, const tWAVEFORMATEX& format) {
-    float sample = 0.0f;
-    denoiser.SetParam(kLearn, 0.0f, false);
-    ProcessBlock(denoiser, &sample, 1, format);
-}
-
 // Catches passages that replace each other or count by number instead of length, a clear that leaves
 // something, a profile that does not survive what it should.
 TEST(DenoiserProfile, AddsPassagesUpUntilCleared) {

@@ -16,15 +16,23 @@ inline void SetText(DenoiserProcessor& denoiser, int index, const std::string& t
     denoiser.SetParam(index, denoiser.GetParamValueNormalizedFromText(index, text), false);
 }
 
-// Learns from `noise`, interleaved; further passages add up.
+// Begins to learn, from `noise`, interleaved, and does not end.
 template <typename Sample>
-void Learn(DenoiserProcessor& denoiser, std::vector<Sample> noise, const tWAVEFORMATEX& format) {
-    const int frames = static_cast<int>(noise.size() / format.nChannels);
-    denoiser.InitProcessing(frames, &format);
+void Open(DenoiserProcessor& denoiser, std::vector<Sample> noise, const tWAVEFORMATEX& format) {
     denoiser.SetParam(kLearn, 1.0f, false);
-    ProcessBlock(denoiser, noise.data(), frames, format);
+    ProcessBlock(denoiser, noise.data(), static_cast<int>(noise.size() / format.nChannels), format);
+}
+template <typename Sample = float>
+void Close(DenoiserProcessor& denoiser, const tWAVEFORMATEX& format) {
     denoiser.SetParam(kLearn, 0.0f, false);
     ProcessBlock(denoiser, std::vector<Sample>(format.nChannels).data(), 1, format);
+}
+// Further passages add up.
+template <typename Sample>
+void Learn(DenoiserProcessor& denoiser, const std::vector<Sample>& noise, const tWAVEFORMATEX& format) {
+    denoiser.InitProcessing(static_cast<int>(noise.size() / format.nChannels), &format);
+    Open(denoiser, noise, format);
+    Close<Sample>(denoiser, format);
 }
 
 // What becomes of the samples, the latency taken out.
@@ -37,22 +45,6 @@ std::vector<Sample> Clean(DenoiserProcessor& denoiser, const std::vector<Sample>
     for (std::ptrdiff_t i = 0; i < late; ++i) padded.push_back(0);
     padded = Render(denoiser, padded, format, {512});
     return {padded.begin() + late, padded.end()};
-}
-
-// The mean power from one second to another, in decibels.
-template <typename Sample>
-double Level(const std::vector<Sample>& mono, double from, double to, int rate = 48000) {
-    double sum = 0.0;
-    const auto first = static_cast<std::size_t>(from * rate), last = static_cast<std::size_t>(to * rate);
-    for (std::size_t i = first; i < last; ++i)
-        sum += static_cast<double>(mono.at(i)) * static_cast<double>(mono[i]);
-    return 10.0 * std::log10(sum / static_cast<double>(last - first) + 1e-30);
-}
-
-template <typename Sample>
-std::vector<Sample> Sum(std::vector<Sample> a, const std::vector<Sample>& b, double gain = 1.0) {
-    for (std::size_t i = 0; i < a.size(); ++i) a[i] += static_cast<Sample>(gain) * b.at(i);
-    return a;
 }
 
 }  // namespace TestSupport

@@ -28,12 +28,12 @@ TEST(DenoiserSound, WithoutReductionIsTheDelayedInputAtEveryRateAndSize) {
             const auto cleaned = Clean(denoiser, input, format);
             EXPECT_EQ(denoiser.GetLatency(), kLatencies[size] * numerator / denominator);
             EXPECT_EQ(denoiser.Format().latency, denoiser.GetLatency());
-            const auto whole = Sum(cleaned, Clean(residue, input, format));
+            const auto whole = Mixed(cleaned, Clean(residue, input, format));
             EXPECT_LT(Level(cleaned, 0.6, 1.0, rate), Level(input, 0.6, 1.0, rate) - 10.0)
                 << "it does reduce";
-            EXPECT_LT(Level(Sum(whole, input, -1.0), 0, 1, rate), Level(input, 0, 1, rate) - 110.0);
+            EXPECT_LT(Level(Mixed(whole, input, -1.0), 0, 1, rate), Level(input, 0, 1, rate) - 110.0);
             SetText(denoiser, kReduction, "0 dB");
-            EXPECT_LT(Level(Sum(Clean(denoiser, input, format), input, -1.0), 0, 1, rate),
+            EXPECT_LT(Level(Mixed(Clean(denoiser, input, format), input, -1.0), 0, 1, rate),
                       Level(input, 0, 1, rate) - 110.0);
         }
 }
@@ -68,7 +68,7 @@ TEST(DenoiserSound, ComesNearerToTheCleanSound) {
         const auto noise = Noise<float>(clean.size(), 1.0);
         const double gain =
             std::pow(10.0, (Level(clean, 2, 7, c.rate) - 10.0 - Level(noise, 2, 7, c.rate)) / 20.0);
-        const auto noisy = Sum(clean, noise, gain);
+        const auto noisy = Mixed(clean, noise, gain);
         DenoiserProcessor denoiser;
         Learn(denoiser,
               std::vector<float>(noisy.begin(), noisy.begin() + static_cast<std::ptrdiff_t>(2 * rate)),
@@ -77,8 +77,8 @@ TEST(DenoiserSound, ComesNearerToTheCleanSound) {
         SetText(denoiser, kSize, c.size);
         if (c.profile == kAdaptive) denoiser.SetParam(kClear, 1.0f, false);
         const auto cleaned = Clean(denoiser, noisy, format);
-        const double before = Level(Sum(noisy, clean, -1.0), 2, 7, c.rate),
-                     after = Level(Sum(cleaned, clean, -1.0), 2, 7, c.rate);
+        const double before = Level(Mixed(noisy, clean, -1.0), 2, 7, c.rate),
+                     after = Level(Mixed(cleaned, clean, -1.0), 2, 7, c.rate);
         EXPECT_GT(before - after, c.least) << c.size << ", " << c.what;
         EXPECT_NEAR(Level(noisy, 1, 1.9, c.rate) - Level(cleaned, 1, 1.9, c.rate), 25.0, 3.0)
             << c.size << ", " << c.what << ": attenuation of the noise alone";
@@ -95,7 +95,7 @@ TEST(DenoiserSound, FollowsWhatChanges) {
     auto louder = noise;
     for (std::size_t i = 4 * kRate; i < louder.size(); ++i) louder[i] *= 3.16f;
     auto hum = noise;
-    for (const double hz : {50.0, 150.0, 250.0, 350.0}) hum = Sum(hum, Sine<float>(hum.size(), hz), 0.05);
+    for (const double hz : {50.0, 150.0, 250.0, 350.0}) hum = Mixed(hum, Sine<float>(hum.size(), hz), 0.05);
     using Texts = std::vector<std::pair<int, const char*>>;
     const auto all = [](int first, const char* text) {
         Texts texts;
@@ -142,18 +142,14 @@ TEST(DenoiserSound, StereoHasAProfilePerSideAndOneGain) {
     }
     DenoiserProcessor one, two;
     const auto single = Clean(one, left, mono), both = Clean(two, same, stereo);
-    const auto side = [](const std::vector<double>& stereoSound, std::size_t first) {
-        std::vector<double> samples;
-        for (std::size_t i = first; i < stereoSound.size(); i += 2) samples.push_back(stereoSound[i]);
-        return samples;
-    };
-    EXPECT_EQ(side(both, 0), side(both, 1));
-    EXPECT_LT(Level(Sum(single, side(both, 0), -1.0), 0, 2), Level(single, 0, 2) - 100.0);
+    EXPECT_EQ(Channel(both, 0), Channel(both, 1));
+    EXPECT_LT(Level(Mixed(single, Channel(both, 0), -1.0), 0, 2), Level(single, 0, 2) - 100.0);
     Learn(two, different, stereo);
     two.SetParam(kProfile, kLearned, false);
     const auto cleaned = Clean(two, different, stereo);
     for (const std::size_t i : {0u, 1u})
-        EXPECT_NEAR(Level(side(different, i), 0.5, 1.5) - Level(side(cleaned, i), 0.5, 1.5), 25.0, 2.0) << i;
+        EXPECT_NEAR(Level(Channel(different, i), 0.5, 1.5) - Level(Channel(cleaned, i), 0.5, 1.5), 25.0, 2.0)
+            << i;
 }
 
 // Catches drop-outs and clicks where the windows change while sound runs, or learning begins and ends.

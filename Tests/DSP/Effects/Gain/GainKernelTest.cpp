@@ -2,8 +2,6 @@
 
 #include <gtest/gtest.h>
 
-#include <vector>
-
 #include "Platform/Processor.h"
 #include "Support/Signals.h"
 
@@ -17,19 +15,13 @@ TEST(GainKernel, GivesTheSameBitsInEveryRegisterAndLayout) {
         for (int frames = 0; frames < 40; ++frames) {
             const auto size = static_cast<std::size_t>(frames);
             auto baseline = TestSupport::Noise<Sample>(2 * size), wide = baseline;
-            std::vector<Sample> left(size), right(size);
-            for (std::size_t i = 0; i < size; ++i) {
-                left[i] = wide[2 * i];
-                right[i] = wide[2 * i + 1];
-            }
+            auto left = TestSupport::Channel(wide, 0), right = TestSupport::Channel(wide, 1);
             BaselineKernels<Sample>().interleaved(baseline.data(), frames, c);
             Avx2Kernels<Sample>().interleaved(wide.data(), frames, c);
             Avx2Kernels<Sample>().planar(left.data(), right.data(), frames, c);
             ASSERT_EQ(baseline, wide);
-            for (std::size_t i = 0; i < size; ++i) {
-                ASSERT_EQ(left[i], wide[2 * i]);
-                ASSERT_EQ(right[i], wide[2 * i + 1]);
-            }
+            ASSERT_EQ(left, TestSupport::Channel(wide, 0));
+            ASSERT_EQ(right, TestSupport::Channel(wide, 1));
         }
     };
     check(0.0f);

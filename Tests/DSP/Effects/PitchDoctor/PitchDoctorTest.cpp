@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <map>
+#include <span>
 
 #include "DSP/Pitch/VoicePitchDetector.h"
 #include "Spectrum/Tuner/Tuner.h"
@@ -65,14 +66,9 @@ void ExpectDelayed(const std::vector<double>& input, const std::vector<double>& 
         ASSERT_NEAR(output[i + static_cast<std::size_t>(latency)], input[i], 1e-12) << "frame " << i;
 }
 
-double Level(const std::vector<double>& samples, double hz) {
-    double re = 0.0, im = 0.0;
-    for (std::size_t i = samples.size() / 2; i < samples.size(); ++i) {
-        const double turn = 2.0 * std::numbers::pi * hz * static_cast<double>(i) / kRate;
-        re += samples[i] * std::cos(turn);
-        im += samples[i] * std::sin(turn);
-    }
-    return std::hypot(re, im);
+// Of the last half.
+double LevelAt(const std::vector<double>& samples, double hz) {
+    return std::abs(TransformAt(std::span(samples).last(samples.size() / 2), hz / kRate));
 }
 
 }  // namespace
@@ -124,7 +120,7 @@ TEST(PitchDoctor, KeepsFormants) {
     const auto tilt = [&](const Settings& settings) {
         const auto output = Correct(voice, Exactly(settings));
         const double hz = 175.0 * std::exp2(7.0 / 12.0);  // harmonics 3 and 6 at 787 and 1574 Hz
-        return 20.0 * std::log10(Level(output, 3 * hz) / Level(output, 6 * hz));
+        return 20.0 * std::log10(LevelAt(output, 3 * hz) / LevelAt(output, 6 * hz));
     };
     const Settings up{{"Transpose", "7"}, {"Correction ratio", "0"}};
     auto moved = up;
@@ -266,12 +262,6 @@ TEST(PitchDoctor, TellsAnEditorWhatItHears) {
     EXPECT_EQ(last.note, 62);
     EXPECT_NEAR(Cents(static_cast<double>(last.noteHz), 440.0), -700.0, 0.01);
     EXPECT_NEAR(static_cast<double>(last.correctionCents), -Cents(300.0, 293.6648), 0.3);
-    const auto notes = NotesOf(readings, 1440, 2880);
-    ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].note, 57);
-    EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(225.0, 220.0), 10.0);
-    EXPECT_NEAR(static_cast<double>(notes[1].start), 24000.0, 2000.0);
-    EXPECT_TRUE(NotesOf(readings, 1440, 48000).empty()) << "shorter than asked for";
     // Another latency begins no other stream.
     EXPECT_GE(readings.front().position, 0);
     readings.clear();
@@ -297,6 +287,7 @@ TEST(PitchDoctor, ListsNotesWithoutWhatIsShort) {
     EXPECT_EQ(notes[0].end, 5900);
     EXPECT_NEAR(static_cast<double>(notes[0].heardCents), Cents(221.0, 220.0), 0.01);
     EXPECT_EQ(NotesOf(readings, 300, 100).size(), 3u);
+    EXPECT_TRUE(NotesOf(readings, 300, 48000).empty()) << "shorter than asked for";
 }
 
 TEST(PitchDoctor, AnnouncesAnotherLatency) {

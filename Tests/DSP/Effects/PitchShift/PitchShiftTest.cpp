@@ -58,37 +58,25 @@ TEST_F(PitchShiftTest, DrivesTheBackEndItsRecordNames) {
     }
 }
 
-// Catches a back-end that is configured, made or freed by the block that takes it. "New" locks.
-TEST_F(PitchShiftTest, ChangesBackEndsWithoutAllocatingWhileItProcesses) {
-    if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
-    for (int i = 0; i < 20; ++i) {
-        Load(3300 + i, 2500, i % 2);
-        m_effect.SetParam(0, 0.4f, false);
-        const auto broken = BrokenBy([&] { Process(); });
-        const bool locksOnly = broken.ends_with("locks") && broken.find(',') == broken.npos;
-        EXPECT_TRUE(i % 2 == 1 ? locksOnly : broken.empty()) << broken << ", round " << i;
-    }
-}
-
-// Catches an engine that grows its buffers, or is configured, while it processes: edits between blocks do
-// that.
-TEST(PitchShift, NewOnlyLocksWhileItProcesses) {
+// Catches a back-end that is configured, made or freed, and an engine that grows its buffers, by the block
+// that takes an edit. "New", which all presets name, locks.
+TEST_F(PitchShiftTest, OnlyNewLocksWhileItProcesses) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
     for (const int rate : {8000, 48000}) {
         const auto format = Format<float>(2, rate);
-        PitchShift effect;
-        effect.SetPreset(0);
-        effect.InitProcessing(4096, &format);
-        auto block = Noise<float>(2 * 4096);
+        m_effect.SetPreset(0);
+        m_effect.InitProcessing(4096, &format);
+        m_block.resize(2 * 4096);
         Random random(3);
+        int backEnd = 1;
         for (int i = 0; i < 1000; ++i) {
-            if (i % 100 == 10) effect.SetPreset(random.Below(effect.NumPresets()));
-            if (i % 100 == 60) effect.SetParam(0, static_cast<float>(random.Unit()), false);
-            Corvo::DSP::ProcessFlags flags;
+            if (i % 100 == 10) m_effect.SetPreset(random.Below(m_effect.NumPresets())), backEnd = 1;
+            if (i % 100 == 60) m_effect.SetParam(0, static_cast<float>(random.Unit()), false);
+            if (i % 20 == 19) Load(2000 + i, 2500, backEnd = 1 - backEnd);
             const int frames = i % 2 ? 64 : 1 + random.Below(4096);
-            const auto broken = BrokenBy([&] { effect.Process(block.data(), frames, &format, flags); });
-            ASSERT_TRUE(broken.ends_with("locks") && broken.find(',') == broken.npos)
-                << broken << ", block " << i;
+            const auto broken = BrokenBy([&] { ProcessBlock(m_effect, m_block.data(), frames, format); });
+            const bool locksOnly = broken.ends_with("locks") && broken.find(',') == broken.npos;
+            ASSERT_TRUE(backEnd == 1 ? locksOnly : broken.empty()) << broken << ", block " << i;
         }
     }
 }

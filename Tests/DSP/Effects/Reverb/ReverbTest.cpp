@@ -92,10 +92,7 @@ void ExpectTheResponse(const Words& settings, int channels, int rate, const char
     samples = Render(reverb, samples, Format<Sample>(channels, rate), {512, 3, 61});
     for (std::size_t side = 0; side < width; ++side)
         for (const double hz : {1.0, 9.0, 107.3, 1234.5, 3600.0}) {
-            const auto turn = std::polar(1.0, -2.0 * std::numbers::pi * hz / rate);
-            Complex heard = 0.0;
-            for (std::size_t i = frames; i-- > 0;)
-                heard = heard * turn + static_cast<double>(samples[i * width + side]);
+            const auto heard = TransformAt(Channel(samples, side, width), hz / rate);
             const double tolerance = std::is_same_v<Sample, float> ? 2e-4 : 1e-6;
             EXPECT_LT(std::abs(heard - Response(settings, side, rate, hz)), tolerance)
                 << what << ", side " << side << " of " << channels << " at " << rate << ", " << hz << " Hz";

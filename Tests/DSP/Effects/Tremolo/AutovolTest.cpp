@@ -32,10 +32,8 @@ TEST(Autovol, MultipliesEachSideByItsOwnSine) {
     const auto check = []<typename Sample>(Sample, const Case& c, int channels, double tolerance) {
         Autovol tremolo;
         tremolo.SetPreset(c.preset);
-        for (const int side : {0, 1}) {
-            tremolo.SetParam(kDepth + side, c.depth, false);
-            tremolo.SetParam(kMix + side, c.mix, false);
-        }
+        SetBoth(tremolo, kDepth, c.depth);
+        SetBoth(tremolo, kMix, c.mix);
         tremolo.SetParam(kInvert, c.invert, false);
         tremolo.SetParam(kRate + 1, 0.77f, false);
         tremolo.SetParam(kOutGain, 0.95f, false);
