@@ -114,16 +114,16 @@ int ContainerFor(const std::string& path, bool stream) {
 
 void RequireShape(const std::string& path, int container, int channels, int rate) {
     const auto& row = *std::ranges::find(kContainers, container, &ContainerRow::major);
-    const bool fine = rate <= row.anyRateTo || rate % row.step == 0;
-    if (channels <= row.mostChannels && rate <= row.highestRate && fine) return;
+    const bool inSteps = rate <= row.anyRateTo || rate % row.step == 0;
+    if (channels <= row.mostChannels && rate <= row.highestRate && inSteps) return;
     const auto text = [](int someChannels, int someRate) {
         return std::to_string(someChannels) + " channels at " + std::to_string(someRate) + " Hz";
     };
-    throw UserError(
-        path + ": this kind of file holds up to " + text(row.mostChannels, row.highestRate) +
-        (fine ? ""
-              : ", above " + std::to_string(row.anyRateTo) + " Hz in steps of " + std::to_string(row.step)) +
-        "; the sound has " + text(channels, rate));
+    std::string limits = text(row.mostChannels, row.highestRate);
+    if (!inSteps)
+        limits += ", above " + std::to_string(row.anyRateTo) + " Hz in steps of " + std::to_string(row.step);
+    throw UserError(path + ": this kind of file holds up to " + limits + "; the sound has " +
+                    text(channels, rate));
 }
 
 std::optional<int> SubtypeIn(int container, SampleFormat format) {
