@@ -62,6 +62,9 @@ void ExpectToSurvive(const std::string& name, const MakeSubject<float>& make) {
                 }
                 reached = failing.Reached();
             }
+            // An effect that is not ready lets sound through.
+            const bool effect = dynamic_cast<EffectSubject<float>*>(subject.get());
+            ASSERT_TRUE(!effect || Sound(*subject) > 0.0);
             if (!subject) subject = make();
             subject->Restore();
             subject->Prepare();

@@ -13,7 +13,7 @@
 namespace dsphost {
 
 // What each command is asked for, with its defaults, and the function that does it. CommandLine.cpp fills the
-// records. A command throws UserError, IoError or Interrupted.
+// records. A command throws UserError or IoError.
 
 // What every command that writes takes.
 struct WritingOptions {

@@ -1,8 +1,10 @@
 #include "AudioReader.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstdio>
+#include <iterator>
 #include <limits>
 #include <string_view>
 #include <utility>
@@ -58,6 +60,35 @@ std::int64_t FrameBytes(const WavStreamHeader& header) {
     return std::int64_t{WavSampleBytes(header.subtype)} * header.channels;
 }
 
+// Nothing where a number of frames cannot be meant; to reckon with it would overflow.
+std::optional<std::int64_t> Meant(std::int64_t frames) {
+    constexpr std::int64_t kMost = std::int64_t{1} << 40;
+    return frames <= kMost ? std::optional(frames) : std::nullopt;
+}
+
+// Whether a file says in front that it is longer than it is, of kinds of which libsndfile does not tell.
+using Front = std::array<unsigned char, 24>;
+bool PromisesMore(const Front& front, int kind, std::int64_t length) {
+    struct {
+        int kind;
+        std::size_t at, size;     // of the number in front
+        std::int64_t besides;     // bytes that it does not count
+        std::uint64_t mostMeant;  // a writer that cannot go back puts something larger
+    } constexpr kKinds[]{
+        {SF_FORMAT_AIFF, 4, 4, 8, 0x7F000000},
+        {SF_FORMAT_AU, 8, 4, 24, 0x7F000000},
+        {SF_FORMAT_W64, 16, 8, 0, std::uint64_t{1} << 45},
+    };
+    const auto* const row = std::ranges::find(kKinds, kind, [](const auto& each) { return each.kind; });
+    if (row == std::end(kKinds)) return false;
+    const bool bigEndian = front[0] == 'F' || front[0] == '.';
+    std::uint64_t number = 0;
+    for (std::size_t i = 0; i < row->size; ++i)
+        number = number << 8 | front[row->at + (bigEndian ? i : row->size - 1 - i)];
+    // One more may pad it.
+    return number<row->mostMeant&& static_cast<std::int64_t>(number) + row->besides> length + 1;
+}
+
 ByteSource SourceOf(File& file) {
     return [&file](void* bytes, std::size_t count) { return file.Read(bytes, count); };
 }
@@ -94,17 +125,28 @@ void AudioReader::OpenFile(File file) {
     const std::int64_t length = m_file->Length();
     if (length == 0) throw UserError(m_name + ": is empty");
     // libsndfile says nothing of samples that a WAV file promises and does not hold.
+    Front front{};
     std::vector<unsigned char> start;
+    m_file->Seek(0);
+    m_file->Read(front.data(), front.size());
     m_file->Seek(0);
     const auto header = ReadWavStreamHeader(SourceOf(*m_file), start);
     m_file->Seek(0);
     OpenSound(header);
+    const std::int64_t sampleBytes = length - static_cast<std::int64_t>(start.size());
+    if (m_info.frames == 0 && header && !header->sampleBytes) {  // its writer died, or there are none
+        m_file->Seek(length - sampleBytes);
+        if (!StartsChunk(m_file->Peek(kChunkStart), 0)) OpenSamples(*header);
+        m_info.frames = m_streams ? sampleBytes / FrameBytes(*header) : 0;
+    }
     if (m_info.frames <= 0) throw UserError(m_name + ": is empty: it holds no samples");
-    m_cutOff = m_info.frames == std::numeric_limits<sf_count_t>::max();  // as libsndfile says of Ogg
-    if (!m_cutOff) m_frames = m_info.frames;
-    if (header && header->sampleBytes &&
-        *header->sampleBytes > length - static_cast<std::int64_t>(start.size()))
-        m_frames = *header->sampleBytes / FrameBytes(*header);
+    m_frames = Meant(m_info.frames);
+    if (header && header->sampleBytes && *header->sampleBytes > sampleBytes)
+        m_frames = Meant(*header->sampleBytes / FrameBytes(*header));
+    const int kind = m_info.format & SF_FORMAT_TYPEMASK;
+    // As libsndfile says of Ogg that lacks its end, but also of a FLAC stream that never knew its length.
+    m_cutOff = (kind == SF_FORMAT_OGG && m_info.frames == std::numeric_limits<sf_count_t>::max()) ||
+               PromisesMore(front, kind, length);
 }
 
 void AudioReader::OpenStream(File stream) {
@@ -115,13 +157,19 @@ void AudioReader::OpenStream(File stream) {
     if (start.size() >= kLongestWavHeader)
         throw UserError(m_name + ": is a WAV stream without samples in its first MiB");
     if (!header) return OpenFile(Spool(stream, start, m_spoolLimit));
-    m_info.channels = header->channels;
-    m_info.samplerate = header->rate;
-    m_info.format = SF_FORMAT_RAW | header->subtype | SF_ENDIAN_LITTLE;
-    if (header->sampleBytes) m_frames = *header->sampleBytes / FrameBytes(*header);
+    if (header->sampleBytes) m_frames = Meant(*header->sampleBytes / FrameBytes(*header));
     if (header->doubtfulBytes) m_doubtfulFrames = *header->doubtfulBytes / FrameBytes(*header);
-    m_streams = true;
     m_file = std::make_unique<File>(std::move(stream));
+    OpenSamples(*header);
+}
+
+// From where the file stands, without looking back.
+void AudioReader::OpenSamples(const WavStreamHeader& header) {
+    m_info = {};
+    m_info.channels = header.channels;
+    m_info.samplerate = header.rate;
+    m_info.format = SF_FORMAT_RAW | header.subtype | SF_ENDIAN_LITTLE;
+    m_streams = true;
     OpenSound(header);
 }
 
@@ -210,7 +258,10 @@ int AudioReader::ReadSome(double* samples, int frames) {
     CountNotFinite(std::span(samples, static_cast<std::size_t>(got * Channels())));
     m_position += got;
     m_file->ThrowIfFailed();
-    if (sf_error(m_sound->Get()) != SF_ERR_NO_ERROR)
+    if (sf_error(m_sound->Get()) == SF_ERR_NO_ERROR) return static_cast<int>(got);
+    // What is left of the last piece of a file that was cut off cannot be decoded.
+    m_cutOff = m_position > 0 && m_file->Position() == m_file->Length();
+    if (!m_cutOff)
         throw UserError(m_name + ": is damaged after " + std::to_string(m_position) +
                         " frames: " + m_sound->Error());
     return static_cast<int>(got);

@@ -47,6 +47,7 @@ public:
 private:
     void OpenStream(File stream);
     void OpenFile(File file);
+    void OpenSamples(const WavStreamHeader& header);
     void OpenSound(const std::optional<WavStreamHeader>& header);
     int ReadSome(double* samples, int frames);
     int ReadAhead(double* samples, int frames);

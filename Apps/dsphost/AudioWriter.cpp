@@ -59,7 +59,9 @@ AudioWriter::AudioWriter(const std::string& path, const OutputRules& rules, cons
     m_info.channels = options.channels;
     m_info.samplerate = options.rate;
     m_info.format = container | *SubtypeIn(container, m_format);
-    if (container == SF_FORMAT_WAV || container == SF_FORMAT_RF64) OpenWav(container, options.framesAtMost);
+    RequireShape(path, container, m_info.channels, m_info.samplerate);
+    RequireRoom(options.frames.value_or(0));
+    if (container == SF_FORMAT_WAV || container == SF_FORMAT_RF64) OpenWav(container, options);
     m_sound = std::make_unique<SoundFile>(m_output.Bytes(), SFM_WRITE, m_info);
     // The peak chunk carries the time of day, and the same input would give other bytes.
     sf_command(m_sound->Get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
@@ -68,14 +70,25 @@ AudioWriter::AudioWriter(const std::string& path, const OutputRules& rules, cons
 AudioWriter::~AudioWriter() = default;
 
 // WAV headers are our own, in files as in pipes; libsndfile lays the samples behind them.
-void AudioWriter::OpenWav(int container, const std::optional<std::int64_t>& framesAtMost) {
+void AudioWriter::OpenWav(int container, const AudioWriterOptions& options) {
     const int subtype = m_info.format & SF_FORMAT_SUBMASK;
     m_wav = WavShape{m_info.channels, m_info.samplerate, subtype};
     m_wav->rf64 = container == SF_FORMAT_RF64;
     const std::int64_t frameBytes = std::int64_t{m_info.channels} * WavSampleBytes(subtype);
-    m_wav->room = !m_output.IsStream() && !(framesAtMost && *framesAtMost <= kLargestWavBytes / frameBytes);
+    const std::int64_t largest = kLargestWavBytes / frameBytes - options.moreAtMost;
+    m_wav->room = !m_output.IsStream() && !(options.frames && *options.frames <= largest);
     WriteHeader({});
     m_info.format = SF_FORMAT_RAW | subtype | SF_ENDIAN_LITTLE;
+}
+
+// The sizes in an AIFF file have 32 bits, and nothing stands for more.
+void AudioWriter::RequireRoom(std::int64_t frames) const {
+    if ((m_info.format & SF_FORMAT_TYPEMASK) != SF_FORMAT_AIFF) return;
+    const int bits = IntegerBits(m_format), bytes = bits > 0                        ? bits / 8
+                                                    : m_format == SampleFormat::F64 ? 8
+                                                                                    : 4;
+    if (frames > kLargestWavBytes / (bytes * m_info.channels))
+        throw UserError(Name() + ": would be larger than an AIFF file can be; use .wav, .w64 or .caf");
 }
 
 void AudioWriter::WriteHeader(std::optional<std::int64_t> sampleBytes) {
@@ -85,6 +98,7 @@ void AudioWriter::WriteHeader(std::optional<std::int64_t> sampleBytes) {
 
 void AudioWriter::Write(const double* samples, std::int64_t frames) {
     if (frames <= 0) return;
+    RequireRoom(m_frames + frames);
     if (m_output.IsStream())
         Store(samples, frames);
     else

@@ -16,15 +16,16 @@ namespace dsphost {
 
 struct AudioWriterOptions {
     int channels = 2, rate = 48000;
-    std::optional<SampleFormat> asked;         // --format
-    std::optional<SampleFormat> inputFormat;   // kept when nothing is asked for
-    std::optional<std::int64_t> framesAtMost;  // decides whether a plain WAV is large enough
+    std::optional<SampleFormat> asked;        // --format
+    std::optional<SampleFormat> inputFormat;  // kept when nothing is asked for
+    std::optional<std::int64_t> frames;       // to come; nothing: not known
+    std::int64_t moreAtMost = 0;              // frames; decides whether a plain WAV is large enough
 };
 
 // Writes audio a block at a time; the file appears at Commit, whole, or not at all. The kind of file follows
 // from the name's ending; streams ("-", devices, pipes) get WAV with sizes that say "until the end". A WAV
-// that would pass 4 GiB becomes an RF64. The same samples always give the same bytes (Ogg excepted, whose
-// streams carry a random number).
+// that would pass 4 GiB becomes an RF64; an AIFF is refused. The same samples always give the same bytes (Ogg
+// excepted, whose streams carry a random number).
 //
 // Files are encoded and written on a thread of the writer's own, which is one block behind: a failure shows
 // in one of the next calls.
@@ -52,7 +53,8 @@ public:
     const std::string& Name() const { return m_output.Name(); }
 
 private:
-    void OpenWav(int container, const std::optional<std::int64_t>& framesAtMost);
+    void OpenWav(int container, const AudioWriterOptions& options);
+    void RequireRoom(std::int64_t frames) const;
     void WriteHeader(std::optional<std::int64_t> sampleBytes);
     void CompleteWav();
     void WriteBehind(const double* samples, std::int64_t frames);

@@ -79,7 +79,7 @@ void RunConvert(ConvertArguments arguments) {
     std::optional<AlignedConverter> converter(std::in_place, settings);
     CheckPitch(input.Rate(), arguments.rate, *converter);
     AudioWriterOptions writing{input.Channels(), arguments.rate, asked, input.Format(), {}};
-    if (input.Frames()) writing.framesAtMost = converter->FramesOut(*input.Frames());
+    if (input.Frames()) writing.frames = converter->FramesOut(*input.Frames());
     AudioWriter output(arguments.output, rules, writing);
 
     const int bits = IntegerBits(output.Format());

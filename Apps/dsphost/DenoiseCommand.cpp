@@ -1,5 +1,6 @@
 #include <algorithm>
 #include <charconv>
+#include <filesystem>
 #include <memory>
 #include <optional>
 #include <string>
@@ -176,8 +177,12 @@ void Clean(AudioReader& input, DenoiserProcessor& denoiser, const tWAVEFORMATEX&
 void RunDenoise(DenoiseArguments arguments) {
     const bool learns = !arguments.learn.empty(), learned = learns || !arguments.profile.empty();
     ParsePassages(arguments.learn);
-    if (learns && arguments.input == "-")
-        throw UserError("--learn reads the recording twice, which standard input cannot; accepted: a file");
+    const bool standardInput = arguments.input == "-";
+    std::error_code error;
+    if (learns && (standardInput || std::filesystem::is_other(PathOf(arguments.input), error)))
+        throw UserError("--learn reads the recording twice, which " +
+                        (standardInput ? "standard input" : arguments.input) +
+                        " does not allow; accepted: a file");
     if (!arguments.saveProfile.empty() && !learned)
         throw UserError("--save-profile has nothing to save without --learn or --profile");
     std::optional<SampleFormat> asked;

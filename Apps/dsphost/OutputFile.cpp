@@ -64,9 +64,9 @@ fs::path UnusedName(const fs::path& target) {
     }
 }
 
-bool MayBeWritten(const fs::path& path, fs::perms permissions) {
+bool MayBeWritten(const fs::path& path, const fs::file_status& status) {
     constexpr auto kWrite = fs::perms::owner_write | fs::perms::group_write | fs::perms::others_write;
-    if ((permissions & kWrite) == fs::perms::none) return false;
+    if ((status.permissions() & kWrite) == fs::perms::none) return false;
 #if defined(_WIN32)
     return _waccess(path.c_str(), 2) == 0;
 #else
@@ -135,6 +135,7 @@ OutputFile::OutputFile(const std::string& path, const OutputRules& rules)
     m_target = Target(path);
     std::error_code error;
     const auto status = fs::status(m_target, error);
+    if (!fs::status_known(status)) throw UserError(path + ": " + error.message());
     if (fs::is_directory(status)) throw UserError(path + ": is a directory; name a file");
     m_existed = fs::exists(status);
     if (!m_existed && fs::is_symlink(m_target, error))
@@ -144,22 +145,26 @@ OutputFile::OutputFile(const std::string& path, const OutputRules& rules)
         return;
     }
     if (m_existed && !m_overwrite) throw UserError(path + ": exists already; -y overwrites it");
-    if (m_existed && !MayBeWritten(m_target, status.permissions()))
+    if (m_existed && !MayBeWritten(m_target, status))
         throw UserError(path + ": is write-protected and stays as it is; write elsewhere");
     if (!m_target.has_parent_path()) m_target = "." / m_target;
     if (!fs::is_directory(m_target.parent_path(), error))
         throw UserError(path + ": there is no directory " + NameOf(m_target.parent_path()));
+    OpenPartial();
+    if (m_existed && !m_file->BecomeLike(m_target))
+        PrintMessage("warning: " + path + ": its owner cannot be kept; the new file is yours");
+}
+
+void OutputFile::OpenPartial() {
     SignalsWait wait;
     m_partial = UnusedName(m_target);
     try {
-        m_file.emplace(m_partial, File::Mode::New, path);
+        m_file.emplace(m_partial, File::Mode::New, m_name);
     } catch (const UserError&) {
         m_partial.clear();
         throw;
     }
     wait.BeginFile(m_partial);
-    if (m_existed && !m_file->BecomeLike(m_target))
-        PrintMessage("warning: " + path + ": its owner cannot be kept; the new file is yours");
 }
 
 OutputFile::~OutputFile() {
@@ -183,10 +188,15 @@ void OutputFile::Complete() {
 void OutputFile::Place(SignalsWait& wait, bool keepOld) {
     if (IsStream()) return;
     std::error_code error;
-    if (m_existed && keepOld) {
+    const auto status = fs::status(m_target, error);  // it may have come or changed meanwhile
+    m_existed = fs::exists(status);
+    if (m_existed && m_overwrite && !MayBeWritten(m_target, status))
+        throw IoError(m_name + ": is write-protected by now and stays as it is");
+    if (fs::is_regular_file(status) && m_overwrite && keepOld) {
         m_old = UnusedName(m_target);
         fs::create_hard_link(m_target, m_old, error);
-        if (error) m_old.clear();  // without it nothing can be taken back
+        if (error) fs::rename(m_target, m_old, error);  // some file systems have no links
+        if (error) m_old.clear();                       // without it nothing can be taken back
         if (!m_old.empty()) wait.BeginFile(m_old);
     }
     error = m_overwrite ? Replace(m_partial, m_target) : MoveToFreePlace(m_partial, m_target);
@@ -198,13 +208,15 @@ void OutputFile::Place(SignalsWait& wait, bool keepOld) {
     m_placed = true;
 }
 
-void OutputFile::TakeBack() {
-    if (!m_placed) return;
+void OutputFile::TakeBack(SignalsWait& wait) {
     std::error_code error;
-    if (!m_existed)
-        fs::remove(m_target, error);
-    else if (!m_old.empty() && !Replace(m_old, m_target))
-        m_old.clear();
+    if (!m_placed && (m_old.empty() || fs::exists(m_target, error))) return;
+    if (!m_existed) fs::remove(m_target, error);
+    if (m_old.empty()) return;
+    if (Replace(m_old, m_target))
+        PrintMessage("warning: " + m_name + ": what it was before is left in " + NameOf(m_old));
+    wait.EndFile(m_old);
+    m_old.clear();
 }
 
 void CommitTogether(std::span<OutputFile* const> files) {
@@ -213,7 +225,7 @@ void CommitTogether(std::span<OutputFile* const> files) {
     try {
         for (auto* const file : files) file->Place(wait, files.size() > 1);
     } catch (const IoError&) {
-        for (auto* const file : files) file->TakeBack();
+        for (auto* const file : files) file->TakeBack(wait);
         throw;
     }
 }

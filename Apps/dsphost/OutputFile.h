@@ -36,9 +36,10 @@ public:
 
 private:
     friend void CommitTogether(std::span<OutputFile* const> files);
+    void OpenPartial();
     void Complete();
     void Place(SignalsWait& wait, bool keepOld);
-    void TakeBack();
+    void TakeBack(SignalsWait& wait);
 
     std::string m_name;
     std::filesystem::path m_target, m_partial, m_old;

@@ -67,8 +67,9 @@ std::vector<std::string> ViewNames() {
 std::unique_ptr<Picture> PictureOptions::Make(int narrower) const {
     const auto [width, height] = size.empty() ? std::pair{kUsualWidth - narrower, kUsualHeight} : Sides(size);
     if (!(dpi >= kLowestDpi && dpi <= kHighestDpi))
-        throw UserError("--dpi cannot be " + std::to_string(dpi) + "; accepted: 24 to 960");
-    if (!font.empty() && !std::filesystem::is_regular_file(PathOf(font)))
+        throw UserError("--dpi cannot be " + ToText(dpi) + "; accepted: 24 to 960");
+    std::error_code error;
+    if (!font.empty() && !std::filesystem::is_regular_file(PathOf(font), error))
         throw UserError("--font: there is no file \"" + font + "\"");
     if (!font.empty() && !IsTypeface(font))
         throw UserError("--font: \"" + font + "\" is not a TrueType or OpenType font");

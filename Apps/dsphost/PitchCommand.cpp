@@ -81,9 +81,11 @@ void RunPitch(PitchArguments arguments) {
          IsNew(arguments) ? OfflinePitchShift::Engine::New : OfflinePitchShift::Engine::Classic,
          arguments.quality, arguments.speed});
     AudioWriterOptions writing{input.Channels(), input.Rate(), asked, input.Format(), input.Frames()};
-    if (writing.framesAtMost)
-        writing.framesAtMost =
-            static_cast<std::int64_t>(static_cast<double>(*writing.framesAtMost) / kLowestSpeed);
+    if (writing.frames) {
+        const auto frames = static_cast<double>(*writing.frames);
+        writing.frames = static_cast<std::int64_t>(frames / arguments.speed);
+        writing.moreAtMost = static_cast<std::int64_t>(frames / kLowestSpeed) - *writing.frames;
+    }
     AudioWriter output(arguments.output, arguments.writing.rules, writing);
     Shift(input, shift, output, arguments.writing.quiet);
     output.Commit();

@@ -19,6 +19,7 @@
 #include <shellapi.h>
 #else
 #include <fcntl.h>
+#include <poll.h>
 #include <unistd.h>
 #endif
 
@@ -37,6 +38,7 @@ std::atomic_flag g_lock;
 std::atomic<bool> g_signalled{false};
 std::vector<std::filesystem::path> g_unfinished;
 bool g_onTerminal = false;
+std::size_t g_progressWidth = 0;
 
 // Nothing in here allocates or waits: it runs at any moment.
 [[noreturn]] void EndProgram() {
@@ -48,6 +50,9 @@ bool g_onTerminal = false;
     for (;;) Sleep(INFINITE);
 #else
     for (const auto& path : g_unfinished) unlink(path.c_str());
+    // Whoever shows it may have stopped to.
+    pollfd shown{STDERR_FILENO, POLLOUT, 0};
+    if (poll(&shown, 1, 0) != 1) _exit(kInterrupted);
     // The first line may hold the progress.
     if (g_onTerminal && write(STDERR_FILENO, "\n", 1) < 0) _exit(kInterrupted);
     if (write(STDERR_FILENO, message.data(), message.size()) < 0) _exit(kInterrupted);
@@ -107,7 +112,7 @@ void PrepareProcess() {
 #else
     std::signal(SIGPIPE, SIG_IGN);
     std::signal(SIGXFSZ, SIG_IGN);
-    for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
+    for (const int signal : {SIGHUP, SIGINT, SIGQUIT, SIGTERM, SIGXCPU}) {
         struct sigaction action {};
         sigaction(signal, nullptr, &action);
         if (action.sa_handler == SIG_IGN) continue;  // nohup, and what a shell runs in the background
@@ -161,7 +166,19 @@ void Print(const std::string& text) {
         throw IoError(std::string("standard output: ") + std::strerror(errno));
 }
 
+void ShowProgress(const std::string& line) {
+    std::fprintf(stderr, "\r%-*s", static_cast<int>(g_progressWidth), line.c_str());
+    std::fflush(stderr);
+    g_progressWidth = std::max(g_progressWidth, line.size());
+}
+
+void ClearProgress() {
+    if (g_progressWidth > 0) std::fprintf(stderr, "\r%*s\r", static_cast<int>(g_progressWidth), "");
+    g_progressWidth = 0;
+}
+
 void PrintMessage(const std::string& text) {
+    ClearProgress();
     const std::string line = "dsphost: " + ShortenedInside(Escaped(text), kLongestMessage) + "\n";
     if (!WriteToConsole(stderr, line)) std::fputs(line.c_str(), stderr);
 }

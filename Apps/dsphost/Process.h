@@ -32,6 +32,9 @@ public:
 bool IsTerminal(std::FILE* stream);
 // Writes to standard output; throws IoError.
 void Print(const std::string& text);
+// Renews the last line of standard error; messages clear it first.
+void ShowProgress(const std::string& line);
+void ClearProgress();
 // One line on standard error, headed by the program's name. What cannot be printed, a file's name may hold
 // it, is escaped.
 void PrintMessage(const std::string& text);

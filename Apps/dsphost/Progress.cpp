@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <cstdio>
 
-#include "File.h"
+#include "Process.h"
 
 namespace dsphost {
 namespace {
@@ -25,9 +25,7 @@ std::string Clocked(double seconds) {
 Progress::Progress(std::string what, int rate, std::optional<std::int64_t> totalFrames, bool quiet)
     : m_what(std::move(what)), m_rate(rate), m_total(totalFrames), m_visible(!quiet && IsTerminal(stderr)) {}
 
-Progress::~Progress() {
-    if (m_width > 0) std::fprintf(stderr, "\r%*s\r", static_cast<int>(m_width), "");
-}
+Progress::~Progress() { ClearProgress(); }
 
 void Progress::Update(std::int64_t frames) {
     if (!m_visible) return;
@@ -48,9 +46,7 @@ void Progress::Update(std::int64_t frames) {
         std::snprintf(speed, sizeof speed, ", %.0fx real time", done / m_rate / elapsed);
         line += speed;
     }
-    std::fprintf(stderr, "\r%-*s", static_cast<int>(m_width), line.c_str());
-    std::fflush(stderr);
-    m_width = std::max(m_width, line.size());
+    ShowProgress(line);
 }
 
 }  // namespace dsphost

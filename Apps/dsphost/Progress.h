@@ -24,7 +24,6 @@ private:
     int m_rate;
     std::optional<std::int64_t> m_total;
     bool m_visible;
-    std::size_t m_width = 0;
     Clock::time_point m_start = Clock::now(), m_next = m_start;
 };
 

@@ -78,11 +78,9 @@ void RunRender(RenderArguments arguments) {
     if (!interleavedOnly.empty())
         PrintMessage("note: --planar: interleaved only: " + Joined(interleavedOnly, ", "));
 
-    AudioWriterOptions writing{input.Channels(), input.Rate(), asked, input.Format(), input.Frames()};
-    if (writing.framesAtMost)
-        *writing.framesAtMost +=
-            static_cast<std::int64_t>(options.tail.value_or(kLongestAutoTail) * input.Rate() + 1.0);
-    AudioWriter output(arguments.output, rules, writing);
+    const auto tail = static_cast<std::int64_t>(options.tail.value_or(kLongestAutoTail) * input.Rate() + 1.0);
+    AudioWriter output(arguments.output, rules,
+                       {input.Channels(), input.Rate(), asked, input.Format(), input.Frames(), tail});
     {
         Progress progress("render", input.Rate(), input.Frames(), arguments.writing.quiet);
         Render(input, chain, output, options, [&](std::int64_t frames) { progress.Update(frames); });

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <limits>
 #include <vector>
 
 #include "Errors.h"
@@ -19,6 +20,8 @@ struct FormatRow {
 struct ContainerRow {
     const char* ending;
     int major;
+    int mostChannels = 1024, highestRate = std::numeric_limits<int>::max();
+    int anyRateTo = highestRate, step = 1;  // Hz; multiples of it above
 };
 
 // clang-format off
@@ -32,11 +35,16 @@ constexpr std::array kFormats{
     FormatRow{SampleFormat::Vorbis, "Vorbis", 0,  SF_FORMAT_VORBIS, false},
 };
 constexpr std::array kContainers{
-    ContainerRow{".wav",  SF_FORMAT_WAV},  ContainerRow{".flac", SF_FORMAT_FLAC},
-    ContainerRow{".aiff", SF_FORMAT_AIFF}, ContainerRow{".aif",  SF_FORMAT_AIFF},
-    ContainerRow{".ogg",  SF_FORMAT_OGG},  ContainerRow{".oga",  SF_FORMAT_OGG},
-    ContainerRow{".w64",  SF_FORMAT_W64},  ContainerRow{".rf64", SF_FORMAT_RF64},
-    ContainerRow{".caf",  SF_FORMAT_CAF},  ContainerRow{".au",   SF_FORMAT_AU},
+    ContainerRow{".wav",  SF_FORMAT_WAV},
+    ContainerRow{".flac", SF_FORMAT_FLAC, 8, 655350, 65535, 10},
+    ContainerRow{".aiff", SF_FORMAT_AIFF},
+    ContainerRow{".aif",  SF_FORMAT_AIFF},
+    ContainerRow{".ogg",  SF_FORMAT_OGG,  255, 200000},
+    ContainerRow{".oga",  SF_FORMAT_OGG,  255, 200000},
+    ContainerRow{".w64",  SF_FORMAT_W64},
+    ContainerRow{".rf64", SF_FORMAT_RF64},
+    ContainerRow{".caf",  SF_FORMAT_CAF},
+    ContainerRow{".au",   SF_FORMAT_AU},
 };
 constexpr std::array kSixteenBitCodecs{
     SF_FORMAT_ULAW, SF_FORMAT_ALAW, SF_FORMAT_IMA_ADPCM, SF_FORMAT_MS_ADPCM, SF_FORMAT_GSM610,
@@ -102,6 +110,20 @@ int ContainerFor(const std::string& path, bool stream) {
     if (row == kContainers.end())
         throw UserError(path + ": the ending must name an audio format: " + Endings());
     return row->major;
+}
+
+void RequireShape(const std::string& path, int container, int channels, int rate) {
+    const auto& row = *std::ranges::find(kContainers, container, &ContainerRow::major);
+    const bool inSteps = rate <= row.anyRateTo || rate % row.step == 0;
+    if (channels <= row.mostChannels && rate <= row.highestRate && inSteps) return;
+    const auto text = [](int someChannels, int someRate) {
+        return std::to_string(someChannels) + " channels at " + std::to_string(someRate) + " Hz";
+    };
+    std::string limits = text(row.mostChannels, row.highestRate);
+    if (!inSteps)
+        limits += ", above " + std::to_string(row.anyRateTo) + " Hz in steps of " + std::to_string(row.step);
+    throw UserError(path + ": this kind of file holds up to " + limits + "; the sound has " +
+                    text(channels, rate));
 }
 
 std::optional<int> SubtypeIn(int container, SampleFormat format) {

@@ -30,5 +30,7 @@ std::optional<int> SubtypeIn(int container, SampleFormat format);
 // floats do not go. Throws UserError when the container cannot hold it.
 SampleFormat ChooseSampleFormat(const std::string& path, int container, std::optional<SampleFormat> input,
                                 std::optional<SampleFormat> asked);
+// Throws UserError unless files of this kind hold so many channels at such a rate.
+void RequireShape(const std::string& path, int container, int channels, int rate);
 
 }  // namespace dsphost

@@ -1,6 +1,5 @@
 #include "SoundFile.h"
 
-#include <array>
 #include <limits>
 #include <string_view>
 #include <utility>
@@ -8,13 +7,22 @@
 #include "Errors.h"
 
 namespace dsphost {
+namespace {
+
+bool StartsWith(File& file, std::string_view tag) {
+    std::string found(tag.size(), '\0');
+    return file.Seek(0) && file.Read(found.data(), found.size()) == tag.size() && found == tag;
+}
+
+}  // namespace
 
 SF_VIRTUAL_IO SoundFile::Callbacks() {
     SF_VIRTUAL_IO io{};
     io.get_filelen = [](void* user) -> sf_count_t {
         auto& stream = *static_cast<Stream*>(user);
         // A stream ends when it ends; until then it is longer than any file.
-        return stream.seekable ? stream.file.Length() : std::numeric_limits<sf_count_t>::max() / 2;
+        return stream.seekable && !stream.endless ? stream.file.Length()
+                                                  : std::numeric_limits<sf_count_t>::max() / 2;
     };
     io.seek = [](sf_count_t offset, int whence, void* user) -> sf_count_t {
         auto& stream = *static_cast<Stream*>(user);
@@ -44,6 +52,13 @@ SoundFile::SoundFile(File& file, int mode, SF_INFO& info)
     : m_stream{file, (info.format & SF_FORMAT_TYPEMASK) != SF_FORMAT_RAW} {
     auto io = Callbacks();
     m_handle = sf_open_virtual(&io, mode, &info, &m_stream);
+    if (!m_handle && mode == SFM_READ && m_stream.seekable && StartsWith(file, "caff")) {
+        // Refused when its samples are cut off, unless the rest seems to be there.
+        m_stream.endless = true;
+        info = {};
+        file.Seek(0);
+        m_handle = sf_open_virtual(&io, mode, &info, &m_stream);
+    }
     if (m_handle) return;
     file.ThrowIfFailed();
     throw UserError(file.Name() + ": " + sf_strerror(nullptr));
@@ -59,11 +74,7 @@ bool SoundFile::MayBeSound(File& file) {
         return true;
     }
     // A tag may be longer than all that there is.
-    std::array<char, 3> tag{};
-    file.Seek(0);
-    file.Read(tag.data(), tag.size());
-    return sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT ||
-           std::string_view(tag.data(), tag.size()) == "ID3";
+    return sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT || StartsWith(file, "ID3");
 }
 
 SoundFile::~SoundFile() {

@@ -34,7 +34,7 @@ public:
 private:
     struct Stream {
         File& file;
-        bool seekable;
+        bool seekable, endless = false;
         std::int64_t position = 0;  // of a stream that cannot seek
     };
     static SF_VIRTUAL_IO Callbacks();

@@ -168,6 +168,11 @@ std::optional<double> ToNumber(std::string_view text) {
     return value;
 }
 
+std::string ToText(double number) {
+    char text[32];
+    return {text, std::to_chars(text, text + sizeof text, number).ptr};
+}
+
 std::string Suggestion(std::string_view text, std::span<const std::string> names) {
     if (names.empty()) return "there are none";
     std::vector<std::string> nearest(names.begin(), names.end());

@@ -30,6 +30,8 @@ std::string Joined(std::span<const std::string> texts, std::string_view separato
 std::size_t NumberLength(std::string_view text);
 // The whole of `text` as a finite number; blanks around it are allowed. The point is a point in every locale.
 std::optional<double> ToNumber(std::string_view text);
+// In as few digits as tell it from every other number.
+std::string ToText(double number);
 
 // "accepted: a, b, c" for a short list, else the names most like `text`: "did you mean a, b or c?".
 std::string Suggestion(std::string_view text, std::span<const std::string> names);

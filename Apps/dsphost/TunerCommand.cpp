@@ -126,7 +126,7 @@ void RunTuner(TunerArguments arguments) {
     Tuner::SetTemperament(static_cast<int>(FindName(arguments.temperament, temperaments, "temperament")));
     const auto sensitivity = static_cast<int>(FindName(arguments.sensitivity, sensitivities, "sensitivity"));
     if (arguments.at && !(*arguments.at >= 0.0))
-        throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; accepted: 0 seconds or more");
+        throw UserError("--at cannot be " + ToText(*arguments.at) + "; accepted: 0 seconds or more");
     if (arguments.json && arguments.output == "-")
         throw UserError("picture and notes cannot both go to standard output");
     const auto picture = arguments.drawing.Make();
@@ -147,7 +147,7 @@ void RunTuner(TunerArguments arguments) {
         if (moment.IsNow(all.back())) draw();
     });
     if (!drawn && arguments.at)
-        throw UserError("--at cannot be " + std::to_string(*arguments.at) + "; the file ends before");
+        throw UserError("--at cannot be " + ToText(*arguments.at) + "; the file ends before");
     if (!drawn) draw();
     Write(*picture, *output);
     // First, so that there is no picture when it fails.

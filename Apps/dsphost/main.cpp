@@ -1,4 +1,5 @@
 #include <exception>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -20,6 +21,9 @@ int Run(std::vector<std::string> arguments) {
     } catch (const UserError& error) {
         PrintMessage(error.what());
         return kUserFailure;
+    } catch (const std::bad_alloc&) {
+        PrintMessage("out of memory");
+        return kIoFailure;
     } catch (const std::exception& error) {
         PrintMessage(error.what());
         return kIoFailure;

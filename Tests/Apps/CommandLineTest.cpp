@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "Apps/Program.h"
+#include "WavHeader.h"
 
 namespace AppTest {
 namespace {
@@ -16,9 +17,12 @@ protected:
         Save("float.wav", NoiseSound(100, 2, SF_FORMAT_WAV | SF_FORMAT_FLOAT));
         Save("six.wav", NoiseSound(100, 6));
         Save("wide.wav", NoiseSound(10, 49));
+        Save("nine.wav", NoiseSound(10, 9));
         Save("none.wav", NoiseSound(0));
         Save("second.wav", NoiseSound(48000, 1));
         Save("cd.wav", {2, 44100, kPcm16, NoiseSound(100).samples});
+        const auto huge = dsphost::MakeWavHeader({2, 48000, SF_FORMAT_PCM_16, true, true}, 1ll << 33);
+        SaveBytes("huge.rf64", std::string(huge.begin(), huge.end()) + "1234");
         SaveBytes("empty.wav", "");
         SaveBytes("face.ttf", "true");
         std::filesystem::create_directory("folder");
@@ -43,6 +47,10 @@ const Refusal kLines[] = {
     {"render none.wav o.wav", "none.wav|no samples"},
     {"render six.wav o.wav", "six.wav|6 channels|mono and stereo"},
     {"render in.wav o.mp4", "o.mp4|.wav|.flac"},
+    {"render huge.rf64 o.aiff", "o.aiff|AIFF|.w64"},
+    {"convert nine.wav o.flac --rate 96000", "9 channels|8 channels"},
+    {"convert in.wav o.flac --rate 100001 --exact", "100001 Hz|steps of 10"},
+    {"convert in.wav o.ogg --rate 655350 --exact", "655350 Hz|200000 Hz"},
     {"render in.wav nowhere/o.wav", "no directory|nowhere"},
     {"render in.wav taken.wav", "taken.wav|-y"},
     {"render in.wav ./in.wav -y", "in.wav|input"},
@@ -65,8 +73,9 @@ const Refusal kLines[] = {
     {"tuner in.wav o.jpg", "o.jpg|.png"},
     {"spectrum in.wav o.png --size 0x10", "--size|0x10"},
     {"tuner in.wav o.png --view wavy", "wavy|view"},
-    {"tuner in.wav o.png --at 99", "--at|ends"},
+    {"tuner in.wav o.png --at 1e308", "--at cannot be 1e+308; the file ends"},
     {"tuner in.wav o.png --font in.wav", "--font|in.wav"},
+    {"tuner in.wav o.png --font " + std::string(5000, 'x'), "--font|no file"},
     {"tuner in.wav face.ttf -y --font face.ttf", "face.ttf|input"},
     {"denoise in.wav o.wav --learn 1", "--learn|accepted: FROM:TO"},
     {"denoise in.wav o.wav --learn 2:1", "2:1|accepted"},
@@ -187,18 +196,31 @@ TEST_F(CommandLine, LeavesNothingWhenInterrupted) {
     SaveBytes("samples", Bytes("in.wav").replace(40, 4, "\xFF\xFF\xFF\xFF"));
     SaveBytes("header", "RIFF....WAVE");
     SaveBytes("flac", "fLaC" + std::string(50000, '.'));
-    for (const std::string start : {"samples", "header", "flac"})
-        for (const std::string signal : {"HUP", "INT", "TERM"}) {
-            SCOPED_TRACE(start + " " + signal);
-            // What runs in the background would ignore an interrupt. It is ready when it catches all three.
-            const auto result =
-                Shell("mkdir tmp; mkfifo fifo; exec 3<>fifo; cat " + start +
-                      " >&3; TMPDIR=tmp env --default-signal=INT DSPHOST render fifo out.flac & "
-                      "while kill -0 $! && ! grep -q 'SigCgt:.*4..3$' /proc/$!/status; do sleep 0.02; done; "
-                      "sleep 0.1; kill -" +
-                      signal + " $!; wait $!; status=$?; rm fifo; rmdir tmp; exit $status");
-            ExpectRefused(result, "interrupted", 130);
-        }
+    Save("long.wav", NoiseSound(100000));  // in several blocks
+    const struct {
+        std::string start, input, signal;
+    } cases[] = {
+        {"samples", "fifo", "HUP"},
+        {"samples", "fifo", "XCPU"},
+        {"header", "fifo", "INT"},
+        {"header", "fifo", "TERM"},
+        {"flac", "fifo", "QUIT"},
+        {"flac", "fifo", "TERM"},
+        {"samples", "--fx Reverb --tail 3600 long.wav", "INT"},
+        {"samples", "--fx Reverb --tail 3600 long.wav", "TERM"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.input + " " + c.signal);
+        // What runs in the background would ignore an interrupt. It is ready when it catches them.
+        const auto result =
+            Shell("mkdir tmp; mkfifo fifo; exec 3<>fifo; cat " + c.start +
+                  " >&3; TMPDIR=tmp env --default-signal=INT,QUIT DSPHOST render " + c.input +
+                  " out.flac & "
+                  "while kill -0 $! && ! grep -q 'SigCgt:.*4..7$' /proc/$!/status; do sleep 0.02; done; "
+                  "sleep 0.1; kill -" +
+                  c.signal + " $!; wait $!; status=$?; rm fifo; rmdir tmp; exit $status");
+        ExpectRefused(result, "interrupted", 130);
+    }
 }
 #endif
 

@@ -97,6 +97,12 @@ TEST_F(Outputs, KeepOwnerAndPermissionsAndWhatIsProtected) {
     EXPECT_EQ(after.st_gid, before.st_gid);
     EXPECT_EQ(after.st_mode, before.st_mode);
     ExpectRefused(Run("render -y in.wav kept.wav"), "kept.wav|write-protected");
+    const auto late = Open("late.wav", true);
+    SaveBytes("late.wav", "theirs");
+    ASSERT_EQ(chmod("late.wav", 0444), 0);
+    EXPECT_THROW(late->Commit(), dsphost::IoError);
+    EXPECT_EQ(Bytes("late.wav"), "theirs");
+    EXPECT_THROW(Open(std::string(252, 'n') + ".wav", false), dsphost::UserError);  // before all the work
     ExpectRefused(Shell("DSPHOST render -y - in.wav < in.wav"), "in.wav|input");
     ExpectRefused(Shell("DSPHOST render in.wav - >> in.wav"), "standard output|input");
     // What is printed of a name stays on its line.

@@ -26,8 +26,9 @@ protected:
     }
 };
 
-// Every kind of file may come through standard input, and a WAV whose writer did not know its length, where
-// 0, the largest size or half of it stand. A stated size ends the samples; what follows them is not sound.
+// Every kind of file may come, through standard input too, and a WAV whose writer did not know its length
+// or died, where 0, the largest size or half of it stand. A stated size ends the samples; what follows them
+// is not sound.
 TEST_F(Pipes, ReadsAnythingFromStandardInput) {
     const struct {
         int format;
@@ -46,7 +47,10 @@ TEST_F(Pipes, ReadsAnythingFromStandardInput) {
         SCOPED_TRACE(testing::Message() << c.format << " " << testing::PrintToString(c.size));
         const auto sound = NoiseSound(3000, 1, c.format);
         Save("in", sound);
-        EXPECT_EQ(Piped(Bytes("in").replace(40, c.size.size(), c.size) + c.behind), sound.samples);
+        SaveBytes("in", Bytes("in").replace(40, c.size.size(), c.size) + c.behind);
+        EXPECT_EQ(Piped(Bytes("in")), sound.samples);
+        Succeed("render in out.wav -y");
+        EXPECT_EQ(Load("out.wav").samples, sound.samples);
     }
 }
 
@@ -73,23 +77,48 @@ TEST_F(Pipes, EndsAtAChunkBehindADoubtfulSize) {
 
 // A producer that died is no reason to lose what came, but it must not pass unnoticed.
 TEST_F(Pipes, WarnsOfInputThatEndsEarly) {
-    Save("in.wav", NoiseSound(3000));
-    const std::string cut = Bytes("in.wav").substr(0, 44 + 4 * 2000);
-    SaveBytes("cut.wav", cut);
-    Save("in.rf64", NoiseSound(3000, 2, SF_FORMAT_RF64 | SF_FORMAT_PCM_16));
-    SaveBytes("cut.rf64", Bytes("in.rf64").substr(0, Bytes("in.rf64").size() - 4 * 1000));
-    Save("in.ogg", NoiseSound(200000, 1, SF_FORMAT_OGG | SF_FORMAT_VORBIS));
-    SaveBytes("cut.ogg", Bytes("in.ogg").substr(0, Bytes("in.ogg").size() / 2));
-    for (const auto& [arguments, warning] :
-         {std::pair{"- out.wav", "standard input: ended after 2000 of 3000 frames\n"},
-          {"cut.wav out.wav", "cut.wav: ended after 2000 of 3000 frames\n"},
-          {"cut.rf64 out.wav", "cut.rf64: ended after 2000 of 3000 frames\n"},
-          {"cut.ogg out.wav", "cut.ogg: was cut off, after "}}) {
-        const auto result = Run(std::string("render -y ") + arguments, cut);
-        EXPECT_EQ(result.status, 0);
-        EXPECT_EQ(result.err.find(std::string("dsphost: warning: ") + warning), 0u) << result.err;
-        EXPECT_LT(result.err.size(), 80u) << result.err;
+    constexpr std::size_t kFrames = 100000, kCut = 400000;  // the second half
+    const struct {
+        int kind;
+        std::string warning;
+    } cases[] = {
+        {SF_FORMAT_WAV, "ended after 100000 of 200000 frames\n"},
+        {SF_FORMAT_RF64, "ended after 100000 of 200000 frames\n"},
+        {SF_FORMAT_CAF, "ended after 100000 of 200000 frames\n"},
+        {SF_FORMAT_AIFF, "was cut off, after 100000 frames\n"},
+        {SF_FORMAT_AU, "was cut off, after 100000 frames\n"},
+        {SF_FORMAT_W64, "was cut off, after 100000 frames\n"},
+        {SF_FORMAT_FLAC, "ended after "},
+        {SF_FORMAT_OGG, "was cut off, after "},
+    };
+    for (const auto& c : cases) {
+        const bool vorbis = c.kind == SF_FORMAT_OGG;
+        Save("in", NoiseSound(2 * kFrames, 2, c.kind | (vorbis ? SF_FORMAT_VORBIS : SF_FORMAT_PCM_16)));
+        Succeed("render in out.wav -y");
+        std::string bytes = Bytes("in");
+        bytes.resize(vorbis ? bytes.size() / 2 : bytes.size() - kCut);
+        SaveBytes("cut", bytes);
+        for (const auto& [input, name] : {std::pair{"cut", "cut"}, {"-", "standard input"}}) {
+            const auto result = Run("render -y " + std::string(input) + " out.wav", bytes);
+            EXPECT_EQ(result.status, 0);
+            EXPECT_EQ(result.err.find("dsphost: warning: " + (name + (": " + c.warning))), 0u) << result.err;
+            EXPECT_LT(result.err.size(), 80u) << result.err;
+        }
     }
+}
+
+// Neither is cut off: a stream whose length was never known, and a length that nobody can mean.
+TEST_F(Pipes, DoesWithoutALength) {
+    Save("in.flac", NoiseSound(200000, 1, SF_FORMAT_FLAC | SF_FORMAT_PCM_16));
+    std::string flac = Bytes("in.flac");
+    flac[21] = static_cast<char>(flac[21] & 0xF0);
+    Succeed("render - out.wav", flac.replace(22, 4, 4, '\0'));
+    EXPECT_EQ(Load("out.wav").samples, Load("in.flac").samples);
+    const auto lie = dsphost::MakeWavHeader({1, 48000, SF_FORMAT_PCM_16, true, true}, std::int64_t{1} << 61);
+    Succeed("convert - out.wav -y --rate 44100 --exact", std::string(lie.begin(), lie.end()) + "1234");
+    // Damaged it must not be.
+    ExpectRefused(Run("render - o.wav", flac.replace(flac.size() / 2, 4000, 4000, '\xFF')),
+                  "is damaged after");
 }
 
 // Only the sizes that programs write when they do not know it stand for "unknown"; others are meant, 2 GiB
@@ -153,6 +182,7 @@ TEST_F(Pipes, BoundsWhatItKeepsOfAStream) {
     for (const auto& [line, words] :
          {std::pair{"DSPHOST render /dev/zero out.wav", "/dev/zero|not an audio file"},
           {"{ printf 'RIFF....WAVE'; yes LIST | tr '\\n' '\\0'; } | DSPHOST render - out.wav", "first MiB"},
+          {"DSPHOST denoise /dev/zero out.wav --learn 0:1", "--learn|/dev/zero"},
           {"DSPHOST render - out.wav --spool-limit 64K < in.flac", "65536 bytes|--spool-limit"}})
         ExpectRefused(Shell(line), words);
     EXPECT_EQ(Shell("DSPHOST render - out.wav --spool-limit 1M < in.flac").status, 0);
