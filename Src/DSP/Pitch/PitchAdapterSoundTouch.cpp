@@ -191,6 +191,7 @@ void PitchAdapterSoundTouch::Fill() {
     for (const float pitch : {kLowestPitch, 1.0f, kOctave}) {
         auto other = wanted;
         other.pitch = pitch;
+        other.quickSeek = 1;  // as much output of silence, sooner
         Configure(other);
         m_engine->clear();
         // The lowest pitch asks for the most input, but for no more output than the others.
