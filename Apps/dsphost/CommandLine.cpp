@@ -246,7 +246,8 @@ std::vector<ShellCommand> Described(const CLI::App& app) {
         commands.push_back({command->get_name(), command->get_description(), {}});
         auto& options = commands.back().options;
         for (const auto* option : command->get_options()) options.push_back(Described(*option));
-        std::ranges::stable_partition(options, &ShellOption::isPlace);
+        std::stable_partition(options.begin(), options.end(),
+                              [](const ShellOption& each) { return each.isPlace; });
     }
     return commands;
 }
