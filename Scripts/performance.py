@@ -22,7 +22,8 @@ EXPLAINED = {
     "in others; why, nobody has looked.",
     "Session": "Tracks of gain, equaliser (4 bands), compressor, echo and reverb, each with settings of its own, on one "
     "thread; a frame of a track each. Two threads take half of the tracks each, side by side; their time is the slower "
-    "one's, on the processor, without waiting. Opening: making an effect, restoring its settings and preparing it.",
+    "one's, on the processor, without waiting. Opening: making an effect, restoring its settings and preparing it, while "
+    "others of its kind are open.",
     SHELL: "Ten minutes of stereo, 16 bits, from file to file; whole processes in turn, wall time: what other programs "
     "take of the processor is in it.",
 }
