@@ -66,8 +66,9 @@ std::optional<std::int64_t> Meant(std::int64_t frames) {
     return frames <= kMost ? std::optional(frames) : std::nullopt;
 }
 
-// Whether a file says in front that it is longer than it is, of kinds of which libsndfile does not tell.
 using Front = std::array<unsigned char, 24>;
+
+// Whether a file says in front that it is longer than it is, of kinds of which libsndfile does not tell.
 bool PromisesMore(const Front& front, int kind, std::int64_t length) {
     struct {
         int kind;
@@ -85,8 +86,8 @@ bool PromisesMore(const Front& front, int kind, std::int64_t length) {
     std::uint64_t number = 0;
     for (std::size_t i = 0; i < row->size; ++i)
         number = number << 8 | front[row->at + (bigEndian ? i : row->size - 1 - i)];
-    // One more may pad it.
-    return number<row->mostMeant&& static_cast<std::int64_t>(number) + row->besides> length + 1;
+    if (number >= row->mostMeant) return false;
+    return static_cast<std::int64_t>(number) + row->besides > length + 1;  // one more may pad it
 }
 
 ByteSource SourceOf(File& file) {
@@ -260,7 +261,7 @@ int AudioReader::ReadSome(double* samples, int frames) {
     m_file->ThrowIfFailed();
     if (sf_error(m_sound->Get()) == SF_ERR_NO_ERROR) return static_cast<int>(got);
     // What is left of the last piece of a file that was cut off cannot be decoded.
-    m_cutOff = m_position > 0 && m_file->Position() == m_file->Length();
+    m_cutOff = !m_streams && m_position > 0 && m_file->Position() == m_file->Length();
     if (!m_cutOff)
         throw UserError(m_name + ": is damaged after " + std::to_string(m_position) +
                         " frames: " + m_sound->Error());

@@ -84,10 +84,9 @@ void AudioWriter::OpenWav(int container, const AudioWriterOptions& options) {
 // The sizes in an AIFF file have 32 bits, and nothing stands for more.
 void AudioWriter::RequireRoom(std::int64_t frames) const {
     if ((m_info.format & SF_FORMAT_TYPEMASK) != SF_FORMAT_AIFF) return;
-    const int bits = IntegerBits(m_format), bytes = bits > 0                        ? bits / 8
-                                                    : m_format == SampleFormat::F64 ? 8
-                                                                                    : 4;
-    if (frames > kLargestWavBytes / (bytes * m_info.channels))
+    const int floatBits = m_format == SampleFormat::F64 ? 64 : 32;
+    const int bits = IntegerBits(m_format) > 0 ? IntegerBits(m_format) : floatBits;
+    if (frames > kLargestWavBytes / (bits / 8 * m_info.channels))
         throw UserError(Name() + ": would be larger than an AIFF file can be; use .wav, .w64 or .caf");
 }
 

@@ -163,7 +163,7 @@ TEST_F(CommandLine, RefusesBadInput) {
 #if !defined(_WIN32)
 // A full disk, met by any of the writes: nothing stays, and the file that was to be replaced is still there.
 TEST_F(CommandLine, ReportsAFullDisk) {
-    for (const std::size_t thousands : {1, 10, 100}) {
+    for (const std::size_t thousands : {1u, 10u, 100u}) {
         Save("long.wav", NoiseSound(1000 * thousands));
         Save("long.flac", NoiseSound(1000 * thousands, 2, SF_FORMAT_FLAC | SF_FORMAT_PCM_16));
         for (const std::string name : {"/dev/full", "- > /dev/full"})
