@@ -79,7 +79,8 @@ void Chorus::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
 // Makes room for the longest delay of this format, and keeps what the ring holds.
 bool Chorus::MakeRing() {
     const double hz = std::min(static_cast<double>(m_format.nSamplesPerSec), kFastestHz);
-    const int wanted = Channels() * (static_cast<int>(hz * kLongestSeconds) + 1);
+    // Two frames even at a rate of 0: the ring is one at least, and InitState wants another.
+    const int wanted = Channels() * std::max(static_cast<int>(hz * kLongestSeconds) + 1, 2);
     if (m_ring && wanted <= m_capacity) return true;
     std::unique_ptr<float[]> grown(new (std::nothrow) float[static_cast<std::size_t>(wanted)]);
     if (!grown) return m_ring != nullptr;
