@@ -3,12 +3,13 @@
 #include <algorithm>
 #include <bit>
 #include <cmath>
-#include <limits>
+#include <span>
 #include <stdexcept>
 #include <thread>
 
 #include "DSP/Effects/EffectKinds.h"
 #include "DSP/Effects/SettingsInput.h"
+#include "SampleCopies.h"
 
 namespace Corvo::Plugins {
 namespace {
@@ -18,8 +19,6 @@ constexpr double kGlide = 0.010;  // seconds
 constexpr double kBypass = 0.020;
 constexpr double kLongestLag = 0.5;  // seconds of latency that the bypass can follow
 constexpr int kLongestPiece = 4096;
-
-float Finite(float sample) { return std::abs(sample) <= std::numeric_limits<float>::max() ? sample : 0.0f; }
 
 }  // namespace
 
@@ -118,7 +117,8 @@ void Adapter::Restart() {
 
 void Adapter::UpdateLatency() {
     const auto most = static_cast<int>(m_dry[0].size()) - m_longest;
-    m_latency = std::clamp(m_effect->GetLatency(), 0, std::max(most, 0));
+    const int latency = std::clamp(m_effect->GetLatency(), 0, std::max(most, 0));
+    if (latency != m_latency) m_latency = latency;
 }
 
 // The values that the effect has, after it changed as a whole.
@@ -208,7 +208,7 @@ void Adapter::ReadBackOthers() {
 }
 
 void Adapter::TakeEdits(bool glide) {
-    if (!m_edits.exchange(false)) return;
+    if (!m_edits.load() || !m_edits.exchange(false)) return;  // exchanging takes longer
     // Lists first: one may move other parameters with it, those that the host leaves alone.
     if (TakeEditsOf(true, false)) ReadBackOthers();
     TakeEditsOf(false, glide);
@@ -232,9 +232,7 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
     if (gate) TakeEdits(!m_fresh);
     m_goal = Bypassed() ? 0.0f : 1.0f;
     for (int done = 0; done < frames;) {
-        const bool gliding = gate && m_gliding > 0;
-        if (gliding) StepGlides();
-        const int piece = std::min(frames - done, gliding || Row().shortPieces ? kStep : m_longest);
+        const int piece = std::min(frames - done, m_longest);
         std::array<const float*, 2> from{}, beside{};
         std::array<float*, 2> to{};
         for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c) {
@@ -242,93 +240,100 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
             to[c] = out[c] + done;
             if (side && c < static_cast<std::size_t>(m_sideChannels) && side[c]) beside[c] = side[c] + done;
         }
-        ProcessPiece(from.data(), to.data(), beside.data(), piece);
+        TakeSide(beside, piece);
+        TakeInput(from, to, piece);
+        for (int at = 0; at < piece;) {
+            const bool gliding = gate && m_gliding > 0;
+            if (gliding) StepGlides();
+            const int count = gliding || Row().shortPieces ? std::min(piece - at, kStep) : piece - at;
+            ProcessEffect(at, count);
+            at += count;
+        }
+        Give(to, piece);
         done += piece;
         m_fresh = false;
     }
     UpdateLatency();
 }
 
-void Adapter::ProcessPiece(const float* const* in, float* const* out, const float* const* side, int frames) {
-    TakeSide(side, frames);
-    TakeInput(in, frames);
-    ProcessEffect(frames);
-    Give(out, frames);
+// Calls work(place, done, count) for each unbroken part of a ring: `count` frames from `place`, after `done`
+// ones.
+template <typename Work>
+void AlongRing(std::size_t size, std::size_t from, std::size_t frames, Work work) {
+    const std::size_t place = from & (size - 1), first = std::min(frames, size - place);
+    work(place, std::size_t{0}, first);
+    if (first < frames) work(std::size_t{0}, first, frames - first);
 }
 
-void Adapter::TakeInput(const float* const* in, int frames) {
-    const auto count = static_cast<std::size_t>(frames);
+void Adapter::TakeInput(const std::array<const float*, 2>& in, const std::array<float*, 2>& out, int frames) {
+    const auto count = static_cast<std::size_t>(frames), channels = static_cast<std::size_t>(Channels());
+    // The host's own output is the place to work in, unless it is another channel's input.
+    const bool apart = channels == 1 || (out[0] != out[1] && out[0] != in[1] && out[1] != in[0]);
+    for (std::size_t c = 0; c < channels; ++c) m_work[c] = apart ? out[c] : m_wet[c].data();
     if (m_interleaved.empty())
-        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c)
-            for (std::size_t i = 0; i < count; ++i) m_wet[c][i] = Finite(in[c][i]);
+        for (std::size_t c = 0; c < channels; ++c) CopyFinite(in[c], m_work[c], count);
     else
-        for (std::size_t i = 0; i < count; ++i) {
-            m_interleaved[2 * i] = Finite(in[0][i]);
-            m_interleaved[2 * i + 1] = Finite(in[1][i]);
-        }
+        Interleave(in[0], in[1], m_interleaved.data(), count);
     // The ring is needed only where something may be mixed with it.
-    const std::size_t mask = m_dry[0].size() - 1;
     if (m_latency > 0 || m_goal < 1.0f || m_mix < 1.0f)
-        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c)
-            for (std::size_t i = 0; i < count; ++i) m_dry[c][(m_dryAt + i) & mask] = Finite(in[c][i]);
-    m_dryAt = (m_dryAt + count) & mask;
+        for (std::size_t c = 0; c < channels; ++c)
+            AlongRing(m_dry[c].size(), m_dryAt, count,
+                      [&](std::size_t place, std::size_t done, std::size_t part) {
+                          CopyFinite(in[c] + done, &m_dry[c][place], part);
+                      });
+    m_dryAt += count;
 }
 
-void Adapter::TakeSide(const float* const* side, int frames) {
+void Adapter::TakeSide(const std::array<const float*, 2>& side, int frames) {
+    m_sideIsThere = false;
     if (m_sideChannels == 0 || !side[0]) return;
-    double* channels[2]{};
     for (std::size_t c = 0; c < static_cast<std::size_t>(m_sideChannels); ++c) {
-        const float* const from = side[c] ? side[c] : side[0];
-        float loudest = 0.0f;
-        for (std::size_t i = 0; i < static_cast<std::size_t>(frames); ++i) {
-            m_side[c][i] = Finite(from[i]);
-            loudest = std::max(loudest, std::abs(m_side[c][i]));
-        }
-        m_sideHeard = m_sideHeard || loudest > 0.0f;
-        channels[c] = reinterpret_cast<double*>(m_side[c].data());
+        const auto sound = std::span(m_side[c]).first(static_cast<std::size_t>(frames));
+        CopyFinite(side[c] ? side[c] : side[0], sound.data(), sound.size());
+        m_sideHeard = m_sideHeard || std::ranges::any_of(sound, [](float sample) { return sample != 0.0f; });
     }
-    if (m_sideHeard) m_effect->SetSidechainBuffer(0, channels);
+    m_sideIsThere = m_sideHeard;
 }
 
-void Adapter::ProcessEffect(int frames) {
+void Adapter::ProcessEffect(int at, int frames) {
+    const auto channels = [at](float* left, float* right) {
+        return std::array{reinterpret_cast<double*>(left + at),
+                          right ? reinterpret_cast<double*>(right + at) : nullptr};
+    };
+    if (m_sideIsThere)
+        m_effect->SetSidechainBuffer(
+            0, channels(m_side[0].data(), m_sideChannels > 1 ? m_side[1].data() : nullptr).data());
     DSP::ProcessFlags flags;
-    if (m_planar) {
-        double* channels[2]{reinterpret_cast<double*>(m_wet[0].data()),
-                            reinterpret_cast<double*>(m_wet[1].data())};
-        m_effect->ProcessNoninterleaved(channels, frames, &m_format, flags);
+    if (m_planar)
+        m_effect->ProcessNoninterleaved(channels(m_work[0], m_work[1]).data(), frames, &m_format, flags);
+    else
+        m_effect->Process(m_interleaved.empty() ? m_work[0] + at : m_interleaved.data() + 2 * at, frames,
+                          &m_format, flags);
+}
+
+void Adapter::Give(const std::array<float*, 2>& out, int frames) {
+    const auto count = static_cast<std::size_t>(frames), channels = static_cast<std::size_t>(Channels());
+    if (!m_interleaved.empty()) Separate(m_interleaved.data(), m_work[0], m_work[1], count);
+    if (m_mix == 1.0f && m_goal == 1.0f) {
+        for (std::size_t c = 0; c < channels; ++c)
+            if (m_interleaved.empty() || out[c] != m_work[c]) CopyFinite(m_work[c], out[c], count);
         return;
     }
-    m_effect->Process(m_interleaved.empty() ? m_wet[0].data() : m_interleaved.data(), frames, &m_format,
-                      flags);
-}
-
-void Adapter::Give(float* const* out, int frames) {
-    const auto count = static_cast<std::size_t>(frames);
-    const float goal = m_goal;
-    const bool wetOnly = m_mix == 1.0f && goal == 1.0f;
-    if (!m_interleaved.empty()) {
-        float* const left = wetOnly ? out[0] : m_wet[0].data();
-        float* const right = wetOnly ? out[1] : m_wet[1].data();
-        for (std::size_t i = 0; i < count; ++i) {
-            left[i] = Finite(m_interleaved[2 * i]);
-            right[i] = Finite(m_interleaved[2 * i + 1]);
-        }
-    } else if (wetOnly) {
-        for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c)
-            for (std::size_t i = 0; i < count; ++i) out[c][i] = Finite(m_wet[c][i]);
-    }
-    if (wetOnly) return;
-    const std::size_t mask = m_dry[0].size() - 1;
     const std::size_t from = m_dryAt - count - static_cast<std::size_t>(m_latency.load());
-    const float step = goal > m_mix ? m_mixStep : -m_mixStep;
+    const float goal = m_goal, step = goal > m_mix ? m_mixStep : -m_mixStep;
     float mix = m_mix;
-    for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c) {
+    for (std::size_t c = 0; c < channels; ++c) {
         mix = m_mix;
-        for (std::size_t i = 0; i < count; ++i) {
-            if (mix != goal) mix = std::clamp(mix + step, 0.0f, 1.0f);
-            const float dry = m_dry[c][(from + i) & mask];
-            out[c][i] = mix == 0.0f ? dry : Finite(dry + mix * (m_wet[c][i] - dry));
-        }
+        AlongRing(m_dry[c].size(), from, count, [&](std::size_t place, std::size_t done, std::size_t part) {
+            const float *const dry = &m_dry[c][place], *const wet = m_work[c] + done;
+            float* const to = out[c] + done;
+            for (std::size_t i = 0; i < part; ++i) {
+                if (mix != goal) mix = std::clamp(mix + step, 0.0f, 1.0f);
+                // Neither end rounds.
+                to[i] = mix == 0.0f ? dry[i] : mix == 1.0f ? wet[i] : dry[i] + mix * (wet[i] - dry[i]);
+            }
+            CopyFinite(to, to, part);
+        });
     }
     m_mix = mix;
 }

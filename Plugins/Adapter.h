@@ -4,6 +4,7 @@
 #include <atomic>
 #include <cstdint>
 #include <memory>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -62,11 +63,10 @@ private:
     void ReadBackOthers();
     void StepGlides();
     void Restart();
-    void ProcessPiece(const float* const* in, float* const* out, const float* const* side, int frames);
-    void TakeInput(const float* const* in, int frames);
-    void TakeSide(const float* const* side, int frames);
-    void ProcessEffect(int frames);
-    void Give(float* const* out, int frames);
+    void TakeInput(const std::array<const float*, 2>& in, const std::array<float*, 2>& out, int frames);
+    void TakeSide(const std::array<const float*, 2>& side, int frames);
+    void ProcessEffect(int at, int frames);
+    void Give(const std::array<float*, 2>& out, int frames);
     void UpdateLatency();
 
     const Start m_start;
@@ -82,10 +82,11 @@ private:
     int m_longest = 0;  // frames of a piece
     int m_glideSteps = 1;
     std::array<std::vector<float>, 2> m_wet, m_side;
+    std::array<float*, 2> m_work{};           // where the effect processes the piece at hand
     std::vector<float> m_interleaved;         // for an effect that takes stereo so; else empty
     std::array<std::vector<float>, 2> m_dry;  // rings of the input
     std::size_t m_dryAt = 0;                  // where the next frame is written
-    bool m_sideHeard = false;
+    bool m_sideHeard = false, m_sideIsThere = false;
     std::atomic<int> m_latency{0};
 
     float m_mix = 1.0f, m_goal = 1.0f, m_mixStep = 0.0f;  // share of the effect
