@@ -35,8 +35,8 @@ std::unique_ptr<DSP::CorvoEffectBase> PluginRow::Make() const {
 
 std::span<const PluginRow> PluginRows() { return kRows; }
 
-std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start start) {
-    return std::make_unique<Adapter>(row, channels, start);
+std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values values) {
+    return std::make_unique<Adapter>(row, channels, values);
 }
 
 }  // namespace Corvo::Plugins

@@ -105,7 +105,7 @@ namespace Corvo::Plugins {
 
 std::span<const PluginRow> PluginRows() { return {&analyser::kRow, 1}; }
 
-std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start) {
+std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values) {
     return std::make_unique<analyser::AnalyserCore>(row, channels);
 }
 
