@@ -211,7 +211,7 @@ public:
 
     void Flush(std::span<const Change> changes) override {
         m_events.Set(changes);
-        m_params->flush(m_plugin, &m_events.in, &m_events.out);
+        InRealTime([&] { m_params->flush(m_plugin, &m_events.in, &m_events.out); });
     }
     void FlushActive(std::span<const Change> changes) override { Flush(changes); }
 
@@ -219,7 +219,9 @@ public:
         m_events.Set(block.changes);
         return Run(block) != CLAP_PROCESS_ERROR;
     }
-    void Reset() override { m_plugin->reset(m_plugin); }
+    void Reset() override {
+        InRealTime([&] { m_plugin->reset(m_plugin); });
+    }
 
     std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
         return OpenClapWindow(m_plugin, parent);
@@ -316,7 +318,9 @@ private:
                                      &m_events.in,
                                      &m_events.out};
         m_time += block.frames;
-        return InRealTime([&] { return m_plugin->process(m_plugin, &process); });
+        clap_process_status status = CLAP_PROCESS_ERROR;
+        InRealTime([&] { status = m_plugin->process(m_plugin, &process); });
+        return status;
     }
     void RunCallback() {
         if (std::exchange(g_callbackWanted, false)) m_plugin->on_main_thread(m_plugin);

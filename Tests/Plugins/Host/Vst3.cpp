@@ -241,11 +241,15 @@ public:
         data.input_params = reinterpret_cast<v3_param_changes**>(&m_in);
         data.output_params = reinterpret_cast<v3_param_changes**>(&m_out);
         data.ctx = &context;
-        return InRealTime([&] { return m_processor->process(m_processor.Get(), &data); }) == V3_OK;
+        v3_result result = V3_FALSE;
+        InRealTime([&] { result = m_processor->process(m_processor.Get(), &data); });
+        return result == V3_OK;
     }
     void Reset() override {
-        m_processor->set_processing(m_processor.Get(), false);
-        m_processor->set_processing(m_processor.Get(), true);
+        InRealTime([&] {
+            m_processor->set_processing(m_processor.Get(), false);
+            m_processor->set_processing(m_processor.Get(), true);
+        });
     }
 
     std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
