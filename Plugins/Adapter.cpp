@@ -47,10 +47,14 @@ Adapter::Adapter(const PluginRow& row, int channels, Values values)
       m_values(values),
       m_effect(row.Make()),
       m_planar(m_effect->SupportsNoninterleaved()),
-      m_controls(Ports().size()) {
+      m_results(row.results ? row.results->make(*m_effect) : nullptr),
+      m_controls(static_cast<std::size_t>(std::ranges::count(Ports(), false, &Port::isOutput))),
+      m_newest(Ports().size() - m_controls.size()),
+      m_told(m_newest.size()) {
     m_effect->SetHostCallback(this);
     SetChannels(channels);
     ReadBack();
+    SilenceResults();
 }
 
 Adapter::~Adapter() = default;
@@ -118,6 +122,21 @@ void Adapter::Start() {
     m_sideHeard = false;
     m_fresh = true;
     UpdateLatency();
+    TellResults();  // what came before is over
+    SilenceResults();
+}
+
+void Adapter::SilenceResults() {
+    for (std::size_t i = 0; i < m_newest.size(); ++i)
+        m_told[i] = m_newest[i] = Ports()[m_controls.size() + i].start;
+}
+
+void Adapter::TellResults() {
+    if (m_results) m_results->Read(m_newest);
+    for (std::size_t i = 0; i < m_newest.size(); ++i) {
+        const Port& port = Ports()[m_controls.size() + i];
+        m_told[i] = std::clamp(m_newest[i], port.least, port.most);
+    }
 }
 
 void Adapter::UpdateLatency() {
@@ -141,6 +160,7 @@ void Adapter::ReadBack() {
 }
 
 void Adapter::Set(int index, float value) {
+    if (static_cast<std::size_t>(index) >= m_controls.size()) return;
     const Port& port = Ports()[static_cast<std::size_t>(index)];
     Control& control = m_controls[static_cast<std::size_t>(index)];
     if (!std::isfinite(value)) return;
@@ -166,7 +186,10 @@ void Adapter::Recall(const std::vector<float>& values) {
     }
 }
 
-float Adapter::Value(int port) const { return m_controls[static_cast<std::size_t>(port)].wanted; }
+float Adapter::Value(int port) const {
+    const auto index = static_cast<std::size_t>(port);
+    return index < m_controls.size() ? m_controls[index].wanted : m_told[index - m_controls.size()];
+}
 
 // A list is set as by a user: some effects make things ready then. Nothing else happens at the same time.
 void Adapter::Apply(std::size_t index, float position) {
@@ -270,6 +293,7 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
         m_fresh = false;
     }
     UpdateLatency();
+    TellResults();
 }
 
 // Calls work(place, done, count) for each unbroken part of a ring: `count` frames from `place`, after `done`
@@ -414,6 +438,7 @@ void Adapter::TakePreset(int preset) {
 
 std::string Adapter::Text(int index, float value) {
     const Port& port = Ports()[static_cast<std::size_t>(index)];
+    if (port.isOutput) return Core::Text(index, value);
     if (port.type != EffectParameterType::Continuous)
         return port.points[static_cast<std::size_t>(std::lround(std::clamp(value, port.least, port.most)))]
             .text;
@@ -422,6 +447,7 @@ std::string Adapter::Text(int index, float value) {
 
 bool Adapter::FromText(int index, const std::string& text, float& value) {
     const Port& port = Ports()[static_cast<std::size_t>(index)];
+    if (port.isOutput) return Core::FromText(index, text, value);
     for (const auto& point : port.points)
         if (point.text == text) {
             value = point.value;

@@ -65,6 +65,8 @@ private:
     void KeepOthers();
     void StepGlides();
     void Start();
+    void SilenceResults();
+    void TellResults();
     void TakeInput(const std::array<const float*, 2>& in, const std::array<float*, 2>& out, int frames);
     void TakeSide(const std::array<const float*, 2>& side, int frames);
     void ProcessEffect(int at, int frames);
@@ -75,7 +77,10 @@ private:
     const std::unique_ptr<DSP::CorvoEffectBase> m_effect;
     const bool m_planar;
     int m_sideChannels = 0;
-    std::vector<Control> m_controls;
+    const std::unique_ptr<Results> m_results;  // null without any
+    std::vector<Control> m_controls;           // of the ports before the outputs
+    std::vector<float> m_newest;               // of the outputs
+    std::vector<std::atomic<float>> m_told;
     std::atomic<bool> m_edits{false}, m_otherValues{false};
     std::atomic_flag m_busy = ATOMIC_FLAG_INIT;  // someone sets parameters
     int m_gliding = 0;                           // ports

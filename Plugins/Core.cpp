@@ -6,6 +6,24 @@
 
 namespace Corvo::Plugins {
 
+Port OutputPort(const ResultPort& result) {
+    Port port;
+    port.name = result.name;
+    port.symbol = SymbolOf(port.name);
+    port.unit = result.unit;
+    port.comment = result.comment;
+    port.least = result.least;
+    port.most = result.most;
+    port.start = result.silent;
+    port.whole = result.whole;
+    port.isNumber = port.isOutput = true;
+    port.curve = Curve(static_cast<double>(port.least), static_cast<double>(port.most), 0.0);
+    if (!result.texts.empty()) port.type = EffectParameterType::List;
+    for (const char* const text : result.texts)
+        port.points.push_back({text, port.least + static_cast<float>(port.points.size())});
+    return port;
+}
+
 std::string Core::Text(int index, float value) {
     const Port& port = Ports()[static_cast<std::size_t>(index)];
     value = std::clamp(value, port.least, port.most);

@@ -3,6 +3,7 @@
 #include "Adapter.h"
 #include "DSP/Effects/EffectKinds.h"
 #include "EqualiserEffect.h"
+#include "PitchResults.h"
 
 namespace Corvo::Plugins {
 namespace {
@@ -19,7 +20,7 @@ constexpr PluginRow kRows[]{
     {"Chorus",      "chorus",      "DCho", 2, "ChorusPlugin",     "chorus",           "Modulation",   true,  false, false, true,  false, "Chorus and flanger"},
     {"Phaser",      "phaser",      "DPha", 2, "PhaserPlugin",     "phaser",           "Modulation",   true,  false, false, true,  false, "1 to 30 all-pass stages with feedback"},
     {"Reverb",      "reverb",      "DRev", 2, "ReverbPlugin",     "reverb",           "Reverb",       true,  false, false, true,  false, "Early reflections and damped combs"},
-    {"Cantrix",     "cantrix",     "DCan", 2, "PitchPlugin",      "pitch-correction", "Pitch Shift",  true,  false, false, false, true,  "Pitch correction of a voice to a scale; formants stay"},
+    {"Cantrix",     "cantrix",     "DCan", 4, "PitchPlugin",      "pitch-correction", "Pitch Shift",  true,  false, false, false, true,  "Pitch correction of a voice to a scale; formants stay", &kPitchResults},
     {"Pitch Shift", "pitch-shift", "DPit", 2, "PitchPlugin",      "pitch-shifter",    "Pitch Shift",  false, true,  false, false, true,  "Transposes by up to an octave up"},
     {"Denoiser",    "denoiser",    "DDen", 2, "SpectralPlugin",   "restoration",      "Restoration",  true,  false, false, false, true,  "Takes steady noise out of recordings, learned or found while it plays"},
 };

@@ -6,6 +6,7 @@
 #include <string_view>
 
 #include "DSP/Effects/Framework/CorvoEffectBase.h"
+#include "Results.h"
 
 namespace Corvo::Plugins {
 
@@ -24,6 +25,7 @@ struct PluginRow {
     bool rings;                // sounds on when its input has ended
     bool smooth;               // the effect itself moves smoothly to what it is set to, or is too slow to
     const char* about;
+    const ResultKind* results = nullptr;  // null: it tells hosts nothing
 
     std::unique_ptr<DSP::CorvoEffectBase> Make() const;  // of an effect; throws std::bad_alloc
 };

@@ -124,6 +124,8 @@ struct LayoutMaker {
             port.start = port.ValueOf(*fresh);
             layout.ports.push_back(std::move(port));
         }
+        if (row.results)
+            for (const ResultPort& result : row.results->ports) layout.ports.push_back(OutputPort(result));
         return std::move(layout);
     }
 };

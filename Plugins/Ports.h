@@ -52,7 +52,10 @@ struct Layout {
     std::vector<std::string> groups;
 };
 
-// The ports of a plug-in. Made once each, on the first call; any thread, not the audio thread.
+// A port that hosts only read.
+Port OutputPort(const ResultPort& result);
+
+// The ports of a plug-in, outputs last. Made once each, on the first call; any thread, not the audio thread.
 const Layout& LayoutOf(const PluginRow& row, int channels);
 
 }  // namespace Corvo::Plugins

@@ -29,8 +29,20 @@ DSP_IN_PLACE void CopyLoop(const float* __restrict from, float* __restrict to, s
 }
 
 DSP_IN_PLACE void CleanLoop(float* samples, std::size_t count) {
-    std::uint32_t all = 0;
-    for (std::size_t i = 0; i < count; ++i) all |= Bits(samples[i]);
+    using Words = std::uint32_t __attribute__((vector_size(32), aligned(4), may_alias));
+    constexpr std::size_t kStep = 4 * sizeof(Words) / sizeof(float);
+    Words a{}, b{}, c{}, d{};  // which do not wait for each other
+    std::size_t done = 0;
+    for (; done + kStep <= count; done += kStep) {
+        const auto* const words = reinterpret_cast<const Words*>(samples + done);
+        a |= words[0];
+        b |= words[1];
+        c |= words[2];
+        d |= words[3];
+    }
+    a |= b | c | d;
+    std::uint32_t all = a[0] | a[1] | a[2] | a[3] | a[4] | a[5] | a[6] | a[7];
+    for (; done < count; ++done) all |= Bits(samples[done]);
     for (std::size_t i = 0; i < count && MayBeInfinite(all); ++i) samples[i] = Finite(samples[i]);
 }
 

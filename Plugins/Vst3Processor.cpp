@@ -151,8 +151,10 @@ void Vst3Plugin::TakeChange(v3_param_id id, double normalised) {
 // What became different by itself. The host hands it to the controller on its own thread.
 void Vst3Plugin::Send(v3_param_changes** changes) {
     const bool all = m_sendAll.exchange(false);
-    if (m_core->TakeOtherValues() || all || m_hasOutputs)
+    const bool others = m_core->TakeOtherValues() || all;
+    if (others || m_hasOutputs)
         for (std::size_t i = 0; i < m_core->Ports().size(); ++i) {
+            if (!others && !m_core->Ports()[i].isOutput) continue;
             const auto id = static_cast<v3_param_id>(i + 1);
             const auto plain = static_cast<double>(m_core->Value(static_cast<int>(i)));
             const double value = m_parameters.Normalised(id, plain);

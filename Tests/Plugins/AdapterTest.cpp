@@ -86,7 +86,7 @@ TEST_P(EveryPlugin, ShowsTheNumberThatAPortIsSetTo) {
     const auto adapter = Make();
     for (std::size_t i = 0; i < adapter->Ports().size(); ++i) {
         const Port& port = adapter->Ports()[i];
-        for (int step = 0; step <= 20 && port.isNumber; ++step) {
+        for (int step = 0; step <= 20 && port.isNumber && !port.isOutput; ++step) {
             const float value = port.Value(static_cast<float>(step) / 20.0f);
             const std::string text = adapter->Text(static_cast<int>(i), value);
             float shown = 0.0f;
@@ -108,7 +108,7 @@ TEST_P(EveryPlugin, StateOfEveryPresetIsExact) {
         ASSERT_TRUE(other->TakeState(state));
         EXPECT_EQ(other->State(), state);
         // A host that sets the values that it read changes nothing.
-        for (std::size_t i = 0; i < adapter->Ports().size(); ++i) {
+        for (std::size_t i = 0; i < adapter->Ports().size() && !adapter->Ports()[i].isOutput; ++i) {
             const int port = static_cast<int>(i);
             other->Set(port, other->Value(port) * (1.0f + 2e-7f));
             EXPECT_EQ(adapter->Value(port), other->Value(port));
@@ -137,6 +137,24 @@ TEST(SideChain, CountsOnceItSounds) {
     EXPECT_EQ(level(&quiet), own);
     EXPECT_LT(level(&loud), 0.7f * own);
     EXPECT_GT(level(&quiet), 1.1f * own);
+}
+
+TEST(Results, TellTheNoteThatIsHeard) {
+    Adapter adapter(*FindPluginRow("cantrix"), 1);
+    adapter.Prepare(kRate, kLongest);
+    const auto first = static_cast<int>(adapter.Ports().size()) - 5;
+    const auto expect = [&](const std::vector<float>& values) {
+        for (int i = 0; i < 5; ++i)
+            EXPECT_NEAR(adapter.Value(first + i), values[static_cast<std::size_t>(i)], i < 2 ? 0.0f : 2.0f)
+                << i;
+    };
+    expect({-1.0f, 0.0f, 0.0f, 0.0f, 0.0f});
+    EXPECT_EQ(adapter.Text(first, adapter.Value(first)), "None");
+    Processed(adapter, Sine(223.85, 48000), [](std::size_t) {});  // A3 and 30 cents
+    expect({9.0f, 3.0f, 223.85f, 30.0f, -30.0f});
+    EXPECT_EQ(adapter.Text(first, adapter.Value(first)), "A");
+    adapter.Reset();
+    EXPECT_EQ(adapter.Text(first, adapter.Value(first)), "None");
 }
 
 // What a tone of 2000 Hz becomes under automation at 50 Hz: energy further than 700 Hz from all its
@@ -191,7 +209,7 @@ TEST_P(EveryPlugin, AutomationAtFiftyHertzMakesNoZipperNoise) {
     const auto& layout = LayoutOf(*GetParam().row, GetParam().channels);
     for (std::size_t i = 0; i < layout.ports.size(); ++i) {
         const Port& port = layout.ports[i];
-        if (port.type != EffectParameterType::Continuous || port.whole) continue;
+        if (port.type != EffectParameterType::Continuous || port.whole || port.isOutput) continue;
         const Sound in = Sine(2000.0, 4 * 48000);
         // Up and down by a twentieth of the knob, told every 64 frames, as hosts do.
         const auto zipper = [&](double depth) {

@@ -12,46 +12,28 @@ namespace {
 
 using namespace Corvo::Plugins;
 
+constexpr const char* kNotes[] = {"None", "A", "A#", "B", "C", "C#", "D", "D#", "E", "F", "F#", "G", "G#"};
+
 // What is published, in the order of the ports.
 struct Output {
-    const char *name, *unit, *comment;
-    float silent, least, most;
-    bool whole;
+    ResultPort port;
     float (*read)(const Processor&);
 };
 // clang-format off
 constexpr Output kOutputs[] = {
-    {"Note",      "",      "What the tuner hears, without its octave", -1.0f,   -1.0f,    11.0f, true,  [](const Processor& p) { return static_cast<float>(p.GetTuner().GetTunedNote().note); }},
-    {"Octave",    "",      "Of the note",                               0.0f,   -2.0f,    12.0f, true,  [](const Processor& p) { return static_cast<float>(p.GetTuner().GetTunedNote().octave); }},
-    {"Cents",     "cents", "How far the note is out of tune",           0.0f, -100.0f,   100.0f, false, [](const Processor& p) { return p.GetTuner().GetErrorCents(); }},
-    {"Frequency", "Hz",    "Of the note; 0 without one",                0.0f,    0.0f, 24000.0f, false, [](const Processor& p) { return static_cast<float>(p.GetTuner().GetFrequency()); }},
-    {"Level",     "dB",    "The highest sample; falls by 20 dB/s",   -120.0f, -120.0f,    24.0f, false, [](const Processor& p) { return p.GetLevel(); }},
+    {{"Note",      "",      "What the tuner hears, without its octave", -1.0f,   -1.0f,    11.0f, true, kNotes}, [](const Processor& p) { return static_cast<float>(p.GetTuner().GetTunedNote().note); }},
+    {{"Octave",    "",      "Of the note",                               0.0f,   -2.0f,    12.0f, true},         [](const Processor& p) { return static_cast<float>(p.GetTuner().GetTunedNote().octave); }},
+    {{"Cents",     "cents", "How far the note is out of tune",           0.0f, -100.0f,   100.0f, false},        [](const Processor& p) { return p.GetTuner().GetErrorCents(); }},
+    {{"Frequency", "Hz",    "Of the note; 0 without one",                0.0f,    0.0f, 24000.0f, false},        [](const Processor& p) { return static_cast<float>(p.GetTuner().GetFrequency()); }},
+    {{"Level",     "dB",    "The highest sample; falls by 20 dB/s",   -120.0f, -120.0f,    24.0f, false},        [](const Processor& p) { return p.GetLevel(); }},
 };
 // clang-format on
 constexpr std::size_t kLevel = 4;
-constexpr const char* kNotes[] = {"None", "A", "A#", "B", "C", "C#", "D", "D#", "E", "F", "F#", "G", "G#"};
 
 const Layout& PortsOf() {
     static const Layout layout = [] {
         Layout made;
-        for (const Output& output : kOutputs) {
-            Port port;
-            port.name = output.name;
-            port.symbol = SymbolOf(port.name);
-            port.unit = output.unit;
-            port.comment = output.comment;
-            port.least = output.least;
-            port.most = output.most;
-            port.start = output.silent;
-            port.whole = output.whole;
-            port.isNumber = port.isOutput = true;
-            port.curve = Curve(static_cast<double>(port.least), static_cast<double>(port.most), 0.0);
-            made.ports.push_back(std::move(port));
-        }
-        Port& note = made.ports.front();
-        note.type = Corvo::EffectParameterType::List;
-        for (const char* const name : kNotes)
-            note.points.push_back({name, note.least + static_cast<float>(note.points.size())});
+        for (const Output& output : kOutputs) made.ports.push_back(OutputPort(output.port));
         return made;
     }();
     return layout;
@@ -80,8 +62,8 @@ void AnalyserCore::Prepare(double rate, int) { m_processor.SetRate(rate); }
 float AnalyserCore::Value(int port) const {
     const auto index = static_cast<std::size_t>(port);
     const Output& output = kOutputs[index];
-    if (index != kLevel && !m_processor.IsTunerOn()) return output.silent;
-    return std::clamp(output.read(m_processor), output.least, output.most);
+    if (index != kLevel && !m_processor.IsTunerOn()) return output.port.silent;
+    return std::clamp(output.read(m_processor), output.port.least, output.port.most);
 }
 
 void AnalyserCore::Run(const float* const* in, float* const* out, const float* const*, int frames) {
