@@ -293,7 +293,7 @@ part ffmpeg each render_with_ffmpeg $(uris)
 part jalv play_with_jalv
 part ardour try_ardour
 part qtractor scan_with_qtractor "$clap"
-part plugin_host each check_with_our_host "$clap" "$vst3" "$build/clap/$analyser.clap" "$build/vst3/$analyser.vst3"
+part plugin_host each check_with_our_host "$lv2" "$clap" "$vst3" "$build"/{lv2/$analyser.lv2,clap/$analyser.clap,vst3/$analyser.vst3}
 part presets same_presets "$build/bin/plugin_host"
 part win64 check_windows
 

@@ -75,6 +75,7 @@ const void* HostExtension(const clap_host_t*, const char* id) {
 }
 
 bool g_callbackWanted = false;
+int g_restarts = 0;
 const clap_host_t kHost{CLAP_VERSION,
                         nullptr,
                         "plugin_host",
@@ -82,7 +83,7 @@ const clap_host_t kHost{CLAP_VERSION,
                         "",
                         "1.0",
                         HostExtension,
-                        [](const clap_host_t*) {},
+                        [](const clap_host_t*) { ++g_restarts; },
                         [](const clap_host_t*) {},
                         [](const clap_host_t*) { g_callbackWanted = true; }};
 
@@ -209,6 +210,11 @@ public:
     }
     std::uint32_t Latency() override { return m_latency ? m_latency->get(m_plugin) : 0; }
 
+    int TakeLatencyNews() override {
+        RunCallback();
+        return std::exchange(g_restarts, 0);
+    }
+
     void Flush(std::span<const Change> changes) override {
         m_events.Set(changes);
         InRealTime([&] { m_params->flush(m_plugin, &m_events.in, &m_events.out); });
@@ -307,7 +313,7 @@ private:
         clap_event_transport_t transport{};
         transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
         transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
-        transport.tempo = 120;
+        transport.tempo = tempo;
         const clap_process_t process{m_time,
                                      block.frames,
                                      &transport,

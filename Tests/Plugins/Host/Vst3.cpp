@@ -12,6 +12,7 @@
 #include <cstring>
 #include <set>
 #include <stdexcept>
+#include <utility>
 
 #include "Formats.h"
 #include "Module.h"
@@ -44,11 +45,13 @@ v3_result OnMainThread(const char* call) {
     return V3_OK;
 }
 bool g_choosing = false;  // a program; hosts deadlock on a restart then
+int g_restarts = 0;       // for another latency
 using HandlerTable = Table<v3_component_handler, v3_component_handler_iid>;
 HandlerTable g_handler({[](void*, v3_param_id) { return OnMainThread("begin_edit"); },
                         [](void*, v3_param_id, double) { return OnMainThread("perform_edit"); },
                         [](void*, v3_param_id) { return OnMainThread("end_edit"); },
-                        [](void*, std::int32_t) {
+                        [](void*, std::int32_t flags) {
+                            g_restarts += (flags & V3_RESTART_LATENCY_CHANGED) != 0;
                             Expect(!g_choosing, "calls restart_component while a program is chosen");
                             return OnMainThread("restart_component");
                         }});
@@ -201,7 +204,10 @@ public:
     void Deactivate() override {
         OnAudioThread([&] { m_processor->set_processing(m_processor.Get(), false); });
         m_component->set_active(m_component.Get(), false);
-        // What the processor sent goes to the controller.
+        HandOver();
+    }
+    // What the processor sent goes to the controller.
+    void HandOver() {
         for (std::size_t i = 0; i < m_out.used; ++i)
             for (const Change& change : m_out.queues[i].points)
                 Expect(m_controller->set_parameter_normalised(m_controller.Get(), change.parameter,
@@ -210,6 +216,11 @@ public:
         m_out.Set({});
     }
     std::uint32_t Latency() override { return m_processor->get_latency_samples(m_processor.Get()); }
+
+    int TakeLatencyNews() override {
+        HandOver();
+        return std::exchange(g_restarts, 0);
+    }
 
     // A host sends a change to both halves; the processor gets it without audio.
     void Flush(std::span<const Change> changes) override {
@@ -231,7 +242,7 @@ public:
         v3_process_context context{};
         context.state = V3_PROCESS_CTX_PLAYING | V3_PROCESS_CTX_TEMPO_VALID;
         context.sample_rate = m_rate;
-        context.bpm = 120;
+        context.bpm = tempo;
         v3_process_data data{};
         data.nframes = static_cast<std::int32_t>(block.frames);
         data.num_input_buses = audio ? static_cast<std::int32_t>(inputs.size()) : 0;
