@@ -20,10 +20,9 @@ std::string KeyOf(const PluginRow& row, int preset) {
 
 // False when the host wants no more.
 bool ListPresets(const PluginRow& row, const ClapPresetReceiver& host) {
-    const auto core = MakeCore(row, 2);
-    for (int preset = 0; preset < core->Presets(); ++preset) {
-        if (!host.beginPreset(&host, core->PresetName(preset).c_str(), KeyOf(row, preset).c_str()))
-            return false;
+    int preset = 0;
+    for (const std::string& name : PresetNamesOf(row)) {
+        if (!host.beginPreset(&host, name.c_str(), KeyOf(row, preset++).c_str())) return false;
         for (const int channels : {2, 1}) {
             const std::string uri = PluginUri(row, channels);
             const ClapPresetReceiver::PluginId id{"clap", uri.c_str()};
@@ -72,8 +71,8 @@ constexpr ClapPresetFactory kFactory{
     Create};
 
 bool HasPresets() {
-    static const bool has = std::ranges::any_of(
-        PluginRows(), [](const PluginRow& row) { return MakeCore(row, 2)->Presets() > 0; });
+    static const bool has =
+        std::ranges::any_of(PluginRows(), [](const PluginRow& row) { return !PresetNamesOf(row).empty(); });
     return has;
 }
 

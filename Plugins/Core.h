@@ -91,5 +91,7 @@ enum class Values { OfPlugin, OfHost };
 
 // A plug-in of the file's table, for 1 or 2 channels. Throws std::bad_alloc.
 std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values values = Values::OfPlugin);
+// The names of the factory presets, in less time than a plug-in takes to make. Throws std::bad_alloc.
+std::vector<std::string> PresetNamesOf(const PluginRow& row);
 
 }  // namespace Corvo::Plugins

@@ -36,6 +36,13 @@ std::unique_ptr<DSP::CorvoEffectBase> PluginRow::Make() const {
 
 std::span<const PluginRow> PluginRows() { return kRows; }
 
+std::vector<std::string> PresetNamesOf(const PluginRow& row) {
+    const auto effect = row.Make();
+    std::vector<std::string> names;
+    for (int i = 0; i < effect->NumPresets(); ++i) names.push_back(effect->GetPresetName(i));
+    return names;
+}
+
 std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values values) {
     return std::make_unique<Adapter>(row, channels, values);
 }

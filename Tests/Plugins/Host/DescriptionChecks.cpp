@@ -21,11 +21,17 @@ void CheckLife(PluginFile& file, std::size_t index) {
         other->Deactivate();
     }
     other->CheckFormat();
+    Parameter unknown{};
+    unknown.id = 0x7fffffff;
+    Expect(!other->Text(unknown, 0) && !other->Value(unknown, "1"), "has texts for an unknown parameter");
+    other->Flush(std::vector<Change>{{unknown.id, 0.5, 0}});
+    for (const std::string& text : file.Texts(index)) Expect(!text.empty(), "has no name, version or vendor");
     const auto audible = file.Create(index);
     for (const auto* ports : {&audible->inputs, &audible->outputs}) {
-        Expect(!ports->empty() && ports->front().main, "has no main input or no main output");
+        Expect(!ports->empty(), "has no input or no output");
         for (const Port& port : *ports)
-            Expect(!port.name.empty() && port.channels > 0, "has a port without name");
+            Expect(!port.name.empty() && port.channels > 0 && port.main == (&port == &ports->front()),
+                   "has a port without name, or another main one than the first");
     }
 }
 

@@ -124,6 +124,7 @@ public:
     virtual ~PluginFile() = default;
     virtual std::size_t Count() const = 0;
     virtual std::string Name(std::size_t index) const = 0;
+    virtual std::vector<std::string> Texts(std::size_t index) const = 0;  // none may be empty
     virtual std::unique_ptr<Instance> Create(std::size_t index) = 0;
 };
 

@@ -239,6 +239,7 @@ public:
         const auto from = text.find(before) + before.size();
         return text.substr(from, text.find('"', from) - from);
     }
+    std::vector<std::string> Texts(std::size_t index) const override { return {Name(index)}; }
     std::unique_ptr<Instance> Create(std::size_t index) override {
         return std::make_unique<Lv2Instance>(*m_describe(static_cast<std::uint32_t>(index)), Turtle(index));
     }

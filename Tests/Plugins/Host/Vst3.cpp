@@ -29,14 +29,9 @@ std::string Narrow(const std::int16_t* text) {
 }
 
 using ApplicationTable = Table<v3_host_application, v3_host_application_iid>;
-ApplicationTable g_application({[](void*, v3_str_128 name) -> v3_result {
-                                    name[0] = 'h';
-                                    name[1] = 0;
-                                    return V3_OK;
-                                },
-                                [](void*, v3_tuid, v3_tuid, void**) -> v3_result {
-                                    return V3_NOT_IMPLEMENTED;
-                                }});
+ApplicationTable g_application(
+    {[](void*, v3_str_128 name) -> v3_result { return name[0] = 'h', name[1] = 0, V3_OK; },
+     [](void*, v3_tuid, v3_tuid, void**) -> v3_result { return V3_NOT_IMPLEMENTED; }});
 ApplicationTable* g_applicationObject = &g_application;
 
 v3_result OnMainThread(const char* call) {
@@ -79,25 +74,25 @@ struct Queue {
     std::vector<Change> points;
 
     static Queue& Of(void* self) { return *static_cast<Queue*>(self); }
+    bool Add(double value, std::uint32_t frame) {
+        if (points.size() == points.capacity()) return false;
+        points.push_back({id, value, frame});
+        return true;
+    }
 };
 QueueTable g_queue({[](void* self) { return Queue::Of(self).id; },
                     [](void* self) { return static_cast<std::int32_t>(Queue::Of(self).points.size()); },
                     [](void* self, std::int32_t index, std::int32_t* frame, double* value) -> v3_result {
-                        const auto& points = Queue::Of(self).points;
-                        if (index < 0 || static_cast<std::size_t>(index) >= points.size())
-                            return V3_INVALID_ARG;
-                        *frame = static_cast<std::int32_t>(points[static_cast<std::size_t>(index)].frame);
-                        *value = points[static_cast<std::size_t>(index)].value;
+                        const Change& point = Queue::Of(self).points.at(static_cast<std::size_t>(index));
+                        *frame = static_cast<std::int32_t>(point.frame);
+                        *value = point.value;
                         return V3_OK;
                     },
                     [](void* self, std::int32_t frame, double value, std::int32_t* index) -> v3_result {
                         if (!(value >= 0 && value <= 1)) Finding("sends a value outside of 0..1");
                         *index = 0;
-                        const Queue& queue = Queue::Of(self);
-                        auto& points = Queue::Of(self).points;
-                        if (points.size() == points.capacity()) return V3_FALSE;
-                        points.push_back({queue.id, value, static_cast<std::uint32_t>(frame)});
-                        return V3_OK;
+                        return Queue::Of(self).Add(value, static_cast<std::uint32_t>(frame)) ? V3_OK
+                                                                                             : V3_FALSE;
                     }});
 using ChangesTable = Table<v3_param_changes, v3_param_changes_iid>;
 struct Changes {
@@ -106,31 +101,32 @@ struct Changes {
     std::size_t used = 0;
 
     static Changes& Of(void* self) { return *static_cast<Changes*>(self); }
+    Queue* QueueOf(v3_param_id id) {  // null when all are in use
+        std::size_t i = 0;
+        while (i < used && queues[i].id != id) ++i;
+        if (i == queues.size()) return nullptr;
+        used = std::max(used, i + 1);
+        queues[i].id = id;
+        return &queues[i];
+    }
     void Set(std::span<const Change> changes) {
         for (std::size_t i = 0; i < used; ++i) queues[i].points.clear();
         used = 0;
-        for (const Change& change : changes) {
-            std::size_t i = 0;
-            while (i < used && queues[i].id != change.parameter) ++i;
-            if (i == queues.size()) continue;
-            used = std::max(used, i + 1);
-            queues[i].id = change.parameter;
-            if (queues[i].points.size() < queues[i].points.capacity()) queues[i].points.push_back(change);
-        }
+        for (const Change& change : changes)
+            if (Queue* const queue = QueueOf(change.parameter)) queue->Add(change.value, change.frame);
     }
 };
-v3_param_value_queue** QueueAt(void* self, std::int32_t index) {
-    auto& queues = Changes::Of(self).queues;
-    return reinterpret_cast<v3_param_value_queue**>(&queues[static_cast<std::size_t>(index)]);
-}
-ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Changes::Of(self).used); }, QueueAt,
+ChangesTable g_changes({[](void* self) { return static_cast<std::int32_t>(Changes::Of(self).used); },
+                        [](void* self, std::int32_t index) {
+                            Queue& queue = Changes::Of(self).queues[static_cast<std::size_t>(index)];
+                            return reinterpret_cast<v3_param_value_queue**>(&queue);
+                        },
                         [](void* self, v3_param_id* id, std::int32_t* index) {
-                            Changes& changes = Changes::Of(self);
-                            if (changes.used == changes.queues.size())
-                                return static_cast<v3_param_value_queue**>(nullptr);
-                            changes.queues[changes.used].id = *id;
-                            *index = static_cast<std::int32_t>(changes.used++);
-                            return QueueAt(self, *index);
+                            Queue* const queue = Changes::Of(self).QueueOf(*id);
+                            *index = queue
+                                         ? static_cast<std::int32_t>(queue - Changes::Of(self).queues.data())
+                                         : 0;
+                            return reinterpret_cast<v3_param_value_queue**>(queue);
                         }});
 
 constexpr std::size_t kQueues = 512, kPoints = 64;
@@ -157,19 +153,17 @@ public:
 
     std::optional<std::string> Text(const Parameter& parameter, double value) override {
         v3_str_128 text{};
-        if (m_controller->get_parameter_string_for_value(m_controller.Get(), parameter.id, value, text) !=
-            V3_OK)
-            return {};
-        m_lastText.assign(text, text + 128);
-        return Narrow(text);
+        const auto result =
+            m_controller->get_parameter_string_for_value(m_controller.Get(), parameter.id, value, text);
+        return result == V3_OK ? std::optional(Narrow(text)) : std::nullopt;
     }
-    // Takes the text that Text gave last.
-    std::optional<double> Value(const Parameter& parameter, const std::string&) override {
+    std::optional<double> Value(const Parameter& parameter, const std::string& text) override {
+        v3_str_128 wide{};
+        std::copy(text.begin(), text.end(), wide);
         double value = 0;
-        if (m_controller->get_parameter_value_for_string(m_controller.Get(), parameter.id, m_lastText.data(),
-                                                         &value) != V3_OK)
-            return {};
-        return value;
+        const auto result =
+            m_controller->get_parameter_value_for_string(m_controller.Get(), parameter.id, wide, &value);
+        return result == V3_OK ? std::optional(value) : std::nullopt;
     }
     double Get(const Parameter& parameter) override {
         return m_controller->get_parameter_normalised(m_controller.Get(), parameter.id);
@@ -286,15 +280,10 @@ public:
         const auto count = m_controller->get_parameter_count(m_controller.Get());
         Expect(m_controller->get_parameter_info(m_controller.Get(), count, &info) != V3_OK,
                "describes a parameter that it does not have");
-        v3_str_128 text{};
-        Expect(m_controller->get_parameter_string_for_value(m_controller.Get(), 0x7fffffff, 0, text) != V3_OK,
-               "has texts for an unknown parameter");
         v3_speaker_arrangement odd = V3_SPEAKER_LFE;
         Expect(m_processor->set_bus_arrangements(m_processor.Get(), &odd, 1, &odd, 1) != V3_OK ||
                    outputs.size() != 1,
                "accepts a layout of one bass channel");
-        Expect(m_processor->can_process_sample_size(m_processor.Get(), V3_SAMPLE_32) == V3_OK,
-               "cannot process 32-bit samples");
         for (const Parameter& p : parameters)
             for (const double value : {0.0, 0.25, p.initial, 1.0}) {
                 const double plain =
@@ -305,8 +294,6 @@ public:
                        p.name + ": " + std::to_string(value) + " is " + std::to_string(back) +
                            " after the way through plain values");
             }
-        const Change unknown{0x7fffffff, 0.5, 0};
-        Flush({&unknown, 1});
     }
 
 private:
@@ -352,7 +339,6 @@ private:
             for (std::int32_t i = 0; i < count; ++i) {
                 Expect(m_component->get_bus_info(m_component.Get(), V3_AUDIO, direction, i, &info) == V3_OK,
                        "get_bus_info fails");
-                Expect(info.bus_type != V3_MAIN || i == 0, "a bus that is not the first is a main one");
                 ports.push_back({Narrow(info.bus_name), info.channel_count, info.bus_type == V3_MAIN});
                 m_component->activate_bus(m_component.Get(), V3_AUDIO, direction, i, true);
             }
@@ -365,7 +351,6 @@ private:
     const Held<v3_edit_controller> m_controller{m_component, v3_edit_controller_iid};
     v3_param_info m_program{};
     Changes m_in{&g_changes, {}}, m_out{&g_changes, {}};
-    std::vector<std::int16_t> m_lastText;
     double m_rate = 48000;
 };
 
@@ -400,6 +385,7 @@ public:
 
     std::size_t Count() const override { return m_effects.size(); }
     std::string Name(std::size_t index) const override { return m_effects[index].name; }
+    std::vector<std::string> Texts(std::size_t index) const override { return m_texts[index]; }
     std::unique_ptr<Instance> Create(std::size_t index) override {
         return std::make_unique<Vst3Instance>(m_factory, m_effects[index].class_id);
     }
@@ -425,17 +411,12 @@ private:
                    "get_class_info fails");
             if (std::strcmp(info.category, "Audio Module Class") != 0) continue;
             m_effects.push_back(info);
-            Expect(*info.name, "has no name");
             v3_class_info_2 more{};
-            if (!factory2 || v3_cpp_obj(factory2)->get_class_info_2(factory2, i, &more) != V3_OK) {
-                Finding("has no description of the second kind");
-                continue;
-            }
-            Expect(std::strcmp(more.name, info.name) == 0, "its descriptions differ in the name");
-            Expect(std::string(more.sub_categories).rfind("Fx", 0) == 0,
-                   "its category does not begin with Fx");
-            Expect(*more.version && *more.vendor && *more.sdk_version,
-                   "has no version, vendor or SDK version");
+            Expect(factory2 && v3_cpp_obj(factory2)->get_class_info_2(factory2, i, &more) == V3_OK &&
+                       std::strcmp(more.name, info.name) == 0 &&
+                       std::string(more.sub_categories).rfind("Fx", 0) == 0,
+                   "has no description of the second kind, or another one");
+            m_texts.push_back({info.name, more.version, more.vendor, more.sdk_version});
         }
         if (factory2) v3_cpp_obj_unref(factory2);
         if (m_effects.empty()) throw std::runtime_error("has no effect");
@@ -451,6 +432,7 @@ private:
     Module m_module;
     v3_plugin_factory** m_factory;
     std::vector<v3_class_info> m_effects;
+    std::vector<std::vector<std::string>> m_texts;
 };
 
 }  // namespace
