@@ -408,19 +408,19 @@ std::vector<std::uint8_t> Adapter::State() {
 
 bool Adapter::TakeState(const std::vector<std::uint8_t>& bytes) {
     // An effect leaves everything as it was, without a word, when it does not take a chunk: one that is read
-    // makes two different instances the same.
-    const auto other = Row().Make(), another = Row().Make();
+    // makes an instance of lowest and one of highest values the same.
+    const auto low = Row().Make(), high = Row().Make();
     std::vector<std::uint8_t> before, after;
-    for (int i = 0; i < other->GetParamCount(); ++i) other->SetParam(i, 0.0f, false);
-    for (int i = 0; i < another->GetParamCount(); ++i) another->SetParam(i, 1.0f, false);
-    other->SetSettingsChunk(bytes);
-    another->SetSettingsChunk(bytes);
-    other->GetSettingsChunk(before);
-    another->GetSettingsChunk(after);
+    for (int i = 0; i < low->GetParamCount(); ++i) low->SetParam(i, 0.0f, false);
+    for (int i = 0; i < high->GetParamCount(); ++i) high->SetParam(i, 1.0f, false);
+    low->SetSettingsChunk(bytes);
+    high->SetSettingsChunk(bytes);
+    low->GetSettingsChunk(before);
+    high->GetSettingsChunk(after);
     if (before != after) return false;
     // Nor are settings taken that no control gives: such a file is damaged.
     const DSP::EffectKind* const kind = DSP::FindEffectKind(Row().name);
-    if (kind && !DSP::ParameterOutOfRange(*kind, *other).empty()) return false;
+    if (kind && !DSP::ParameterOutOfRange(*kind, *low).empty()) return false;
     const Gate gate(m_busy, Gate::If::Waiting);
     m_effect->SetSettingsChunk(bytes);
     ReadBack();

@@ -287,6 +287,7 @@ private:
         else if (!port.momentary)
             info->flags = CLAP_PARAM_IS_AUTOMATABLE;
         if (port.whole) info->flags |= CLAP_PARAM_IS_STEPPED;
+        if (port.isIdle) info->flags |= CLAP_PARAM_IS_HIDDEN;
         CopyText(info->name, sizeof info->name, port.name);
         if (port.group >= 0)
             CopyText(info->module, sizeof info->module, groups[static_cast<std::size_t>(port.group)]);

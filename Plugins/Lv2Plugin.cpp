@@ -118,8 +118,7 @@ public:
 
 private:
     void ReadControls() {
-        if (const auto* const enabled = Port<const float>(m_order.Enabled()))
-            core->Bypass(*enabled <= 0.5f);
+        if (const auto* const enabled = Port<const float>(m_order.Enabled())) core->Bypass(*enabled <= 0.5f);
         for (std::size_t i = 0; i < m_seen.size(); ++i) {
             const auto* const value = Port<const float>(m_order.FirstControl() + static_cast<int>(i));
             if (!value || core->Ports()[i].isOutput || *value == m_seen[i] || std::isnan(*value)) continue;

@@ -217,6 +217,7 @@ private:
         if (port.type == Corvo::EffectParameterType::List)
             file << "        lv2:portProperty lv2:enumeration, lv2:integer ;\n";
         if (port.whole && port.points.empty()) file << "        lv2:portProperty lv2:integer ;\n";
+        if (port.isIdle) file << "        lv2:portProperty pprops:notOnGUI ;\n";
         if (port.momentary) file << "        lv2:portProperty pprops:notAutomatic ;\n";
         if (port.springsBack) file << "        lv2:portProperty pprops:trigger ;\n";
         if (port.logarithmic) file << "        lv2:portProperty pprops:logarithmic ;\n";

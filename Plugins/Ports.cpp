@@ -78,7 +78,7 @@ struct LayoutMaker {
         port.resolution = read.isNumber ? read.Resolution() * (read.keepsFractions ? 0.01 : 1.0) : 1e-4;
         port.whole = read.isNumber && !read.keepsFractions && read.decimals == 0 &&
                      port.most - port.least <= kMostSteps;
-        // What depends on other settings may mean a note: it jumps.
+        // What shows no number may choose among notes: a glide would play those in between.
         port.glides = read.isNumber && !port.whole && !row.smooth;
         const float middle = port.curve.Number(0.5f), product = port.least * port.most;
         port.logarithmic = port.least > 0.0f && std::abs(middle - std::sqrt(product)) <
@@ -121,6 +121,7 @@ struct LayoutMaker {
                 SetRange(port, description);
             else
                 SetChoices(port, description);
+            port.isIdle = channels == 1 && port.name.starts_with("Stereo ");
             port.start = port.ValueOf(*fresh);
             layout.ports.push_back(std::move(port));
         }

@@ -30,6 +30,7 @@ struct Port {
     bool isOutput = false;      // tells the host a value, and is none of its own
     bool momentary = false;     // a switch that does something, and is no setting: off after loading
     bool springsBack = false;   // a momentary one that is off again at once
+    bool isIdle = false;        // has nothing to do on one channel: hosts need not show it
     bool isNumber = false;      // the effect shows numbers
     double resolution = 1.0;    // of the values that are told
     bool logarithmic = false;   // the knob has ratios, not differences

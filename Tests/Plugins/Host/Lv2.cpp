@@ -67,7 +67,10 @@ public:
     }
     ~Lv2Instance() override { m_plugin.cleanup(m_handle); }
 
-    std::optional<std::string> Text(const Parameter&, double value) override { return std::to_string(value); }
+    std::optional<std::string> Text(const Parameter& p, double value) override {
+        const bool known = std::ranges::count(parameters, p.id, &Parameter::id) > 0;
+        return known ? std::optional(std::to_string(value)) : std::nullopt;
+    }
     std::optional<double> Value(const Parameter&, const std::string& text) override {
         return std::stod(text);
     }
