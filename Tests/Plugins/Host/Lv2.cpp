@@ -68,11 +68,10 @@ public:
     ~Lv2Instance() override { m_plugin.cleanup(m_handle); }
 
     std::optional<std::string> Text(const Parameter& p, double value) override {
-        const bool known = std::ranges::count(parameters, p.id, &Parameter::id) > 0;
-        return known ? std::optional(std::to_string(value)) : std::nullopt;
+        return IsOwn(p) ? std::optional(std::to_string(value)) : std::nullopt;
     }
-    std::optional<double> Value(const Parameter&, const std::string& text) override {
-        return std::stod(text);
+    std::optional<double> Value(const Parameter& p, const std::string& text) override {
+        return IsOwn(p) ? std::optional(std::stod(text)) : std::nullopt;
     }
     double Get(const Parameter& p) override {
         const auto value = static_cast<double>(m_values[p.id]);
@@ -150,6 +149,7 @@ public:
     void CheckFormat() override {}
 
 private:
+    bool IsOwn(const Parameter& p) const { return p.id < m_values.size(); }
     void ReadPort(const std::string& text) {
         const auto index = static_cast<std::uint32_t>(std::stoi(After(text, "lv2:index")));
         const bool input = Has(text, "lv2:InputPort");
