@@ -42,9 +42,9 @@ private:
     bool m_open = false;
 };
 
-Adapter::Adapter(const PluginRow& row, int channels, Start start)
+Adapter::Adapter(const PluginRow& row, int channels, Values values)
     : Core(row, channels, LayoutOf(row, channels)),
-      m_start(start),
+      m_values(values),
       m_effect(row.Make()),
       m_planar(m_effect->SupportsNoninterleaved()),
       m_results(row.results ? row.results->make(*m_effect) : nullptr),
@@ -100,20 +100,25 @@ void Adapter::Prepare(double rate, int frames) {
     m_interleaved.assign(m_planar || Channels() == 1 ? 0 : 2 * piece, 0.0f);
     m_glideSteps = std::max(1, static_cast<int>(kGlide * rate / kStep));
     m_mixStep = static_cast<float>(1.0 / (kBypass * rate));
-    Restart();
-}
-
-void Adapter::Reset() {
-    const Gate gate(m_busy, Gate::If::Waiting);
-    TakeEdits(false);
-    for (auto& ring : m_dry) std::ranges::fill(ring, 0.0f);
-    Restart();
-}
-
-void Adapter::Restart() {
     m_effect->Cleanup();
+    Start();
+}
+
+// Prepared for what it is prepared for already, an effect keeps its memory; one that may allocate anyway
+// begins anew.
+void Adapter::Reset() {
+    if (m_longest == 0) return;
+    if (const Gate gate(m_busy, Gate::If::Free); gate) TakeEdits(false);
+    for (auto& ring : m_dry) std::ranges::fill(ring, 0.0f);
+    if (Row().realTime)
+        m_effect->InitResetProcessingLight(true);
+    else
+        m_effect->Cleanup();
+    Start();
+}
+
+void Adapter::Start() {
     m_effect->InitProcessing(m_longest, &m_format);
-    m_mix = m_goal = Bypassed() ? 0.0f : 1.0f;
     m_sideHeard = false;
     m_fresh = true;
     UpdateLatency();
@@ -174,9 +179,9 @@ void Adapter::Recall(const std::vector<float>& values) {
     for (std::size_t i = 0; i < m_controls.size() && i < values.size(); ++i) {
         const Port& port = Ports()[i];
         const float value = std::clamp(values[i], port.least, port.most);
-        if (!std::isfinite(values[i])) continue;
+        if (!std::isfinite(values[i]) || port.momentary) continue;
         const float before = copy->GetParam(port.parameter);
-        copy->SetParam(port.parameter, port.Position(value), false);
+        port.SetOn(*copy, port.Position(value), false);
         if (copy->GetParam(port.parameter) == before) m_controls[i].wanted = value;
     }
 }
@@ -190,9 +195,8 @@ float Adapter::Value(int port) const {
 void Adapter::Apply(std::size_t index, float position) {
     const Port& port = Ports()[index];
     m_controls[index].position = position;
-    const bool early = m_longest == 0 || (m_fresh && m_start == Start::WithFirstValues);
-    const bool automated = port.type != EffectParameterType::List && !early;
-    m_effect->SetParam(port.parameter, position, automated);
+    const bool automated = port.type != EffectParameterType::List && m_longest > 0;
+    port.SetOn(*m_effect, position, automated);
 }
 
 // Of the lists, or of all others. Whether there were any.
@@ -209,6 +213,9 @@ bool Adapter::TakeEditsOf(bool lists, bool glide) {
         control.stepsLeft = glides ? m_glideSteps : 0;
         control.touched = true;
         if (!glides) Apply(i, control.target);
+        if (!port.springsBack) continue;
+        control.wanted = port.start;
+        m_otherValues = true;
     }
     return any;
 }
@@ -230,12 +237,20 @@ void Adapter::ReadBackOthers() {
     }
 }
 
+void Adapter::KeepOthers() {
+    for (std::size_t i = 0; i < m_controls.size(); ++i) {
+        Control& control = m_controls[i];
+        if (control.edited || m_effect->GetParam(Ports()[i].parameter) == control.position) continue;
+        control.touched = true;
+        Apply(i, control.position);
+    }
+}
+
 void Adapter::TakeEdits(bool glide) {
     if (!m_edits.load() || !m_edits.exchange(false)) return;  // exchanging takes longer
     // Lists first: one may move other parameters with it, those that the host leaves alone.
-    if (TakeEditsOf(true, false)) ReadBackOthers();
+    if (TakeEditsOf(true, false)) m_values == Values::OfHost ? KeepOthers() : ReadBackOthers();
     TakeEditsOf(false, glide);
-    if (m_fresh && m_start == Start::WithFirstValues) Restart();
 }
 
 void Adapter::StepGlides() {
@@ -254,6 +269,7 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
     const Gate gate(m_busy, Gate::If::Free);
     if (gate) TakeEdits(!m_fresh);
     m_goal = Bypassed() ? 0.0f : 1.0f;
+    if (m_fresh) m_mix = m_goal;
     for (int done = 0; done < frames;) {
         const int piece = std::min(frames - done, m_longest);
         std::array<const float*, 2> from{}, beside{};
@@ -384,7 +400,7 @@ std::vector<std::uint8_t> Adapter::State() {
             const bool isList = port.type == EffectParameterType::List;
             if (isList != lists || !touched(m_controls[i]) || port.momentary) continue;
             const float position = port.Position(m_controls[i].wanted);
-            if (copy->GetParam(port.parameter) != position) copy->SetParam(port.parameter, position, false);
+            if (copy->GetParam(port.parameter) != position) port.SetOn(*copy, position, false);
         }
     copy->GetSettingsChunk(chunk);
     return chunk;
@@ -392,19 +408,19 @@ std::vector<std::uint8_t> Adapter::State() {
 
 bool Adapter::TakeState(const std::vector<std::uint8_t>& bytes) {
     // An effect leaves everything as it was, without a word, when it does not take a chunk: one that is read
-    // makes two different instances the same.
-    const auto other = Row().Make(), another = Row().Make();
+    // makes an instance of lowest and one of highest values the same.
+    const auto low = Row().Make(), high = Row().Make();
     std::vector<std::uint8_t> before, after;
-    for (int i = 0; i < other->GetParamCount(); ++i) other->SetParam(i, 0.0f, false);
-    for (int i = 0; i < another->GetParamCount(); ++i) another->SetParam(i, 1.0f, false);
-    other->SetSettingsChunk(bytes);
-    another->SetSettingsChunk(bytes);
-    other->GetSettingsChunk(before);
-    another->GetSettingsChunk(after);
+    for (int i = 0; i < low->GetParamCount(); ++i) low->SetParam(i, 0.0f, false);
+    for (int i = 0; i < high->GetParamCount(); ++i) high->SetParam(i, 1.0f, false);
+    low->SetSettingsChunk(bytes);
+    high->SetSettingsChunk(bytes);
+    low->GetSettingsChunk(before);
+    high->GetSettingsChunk(after);
     if (before != after) return false;
     // Nor are settings taken that no control gives: such a file is damaged.
     const DSP::EffectKind* const kind = DSP::FindEffectKind(Row().name);
-    if (kind && !DSP::ParameterOutOfRange(*kind, *other).empty()) return false;
+    if (kind && !DSP::ParameterOutOfRange(*kind, *low).empty()) return false;
     const Gate gate(m_busy, Gate::If::Waiting);
     m_effect->SetSettingsChunk(bytes);
     ReadBack();

@@ -17,7 +17,7 @@ namespace Corvo::Plugins {
 class Adapter final : public Core, CorvoEffectHostCallback {
 public:
     // For 1 or 2 channels. Throws std::bad_alloc.
-    Adapter(const PluginRow& row, int channels, Start start = Start::AsPrepared);
+    Adapter(const PluginRow& row, int channels, Values values = Values::OfPlugin);
     ~Adapter() override;
 
     int SideChannels() const override { return m_sideChannels; }
@@ -36,6 +36,7 @@ public:
     std::string PresetName(int preset) override { return m_effect->GetPresetName(preset); }
     int StartPreset() override { return m_effect->GetDefaultPreset(); }
     void TakePreset(int preset) override;
+    bool HasOtherValues() const override { return m_otherValues; }
     bool TakeOtherValues() override { return m_otherValues.exchange(false); }
     std::string Text(int port, float value) override;
     bool FromText(int port, const std::string& text, float& value) override;
@@ -61,8 +62,9 @@ private:
     void TakeEdits(bool glide);
     bool TakeEditsOf(bool lists, bool glide);
     void ReadBackOthers();
+    void KeepOthers();
     void StepGlides();
-    void Restart();
+    void Start();
     void SilenceResults();
     void TellResults();
     void TakeInput(const std::array<const float*, 2>& in, const std::array<float*, 2>& out, int frames);
@@ -71,7 +73,7 @@ private:
     void Give(const std::array<float*, 2>& out, int frames);
     void UpdateLatency();
 
-    const Start m_start;
+    const Values m_values;
     const std::unique_ptr<DSP::CorvoEffectBase> m_effect;
     const bool m_planar;
     int m_sideChannels = 0;

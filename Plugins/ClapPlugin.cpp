@@ -34,6 +34,24 @@ void CopyText(char* to, std::size_t size, const std::string& text) {
     to[count] = '\0';
 }
 
+// Hosts draw a knob from its least to its most value in a straight line: a continuous one is told as its
+// place, 0..1, so that frequencies and times are as far apart as the effect has them.
+bool IsPlace(const Port& port) { return !port.whole && !port.isOutput; }
+double ToClap(const Port& port, float value) {
+    return static_cast<double>(IsPlace(port) ? port.curve.Place(value) : value);
+}
+float FromClap(const Port& port, double told) {
+    const auto value = static_cast<float>(told);
+    return IsPlace(port) && std::isfinite(value) ? port.curve.Number(value) : value;
+}
+
+// Younger than DPF's headers.
+struct ClapTail {
+    std::uint32_t (*get)(const clap_plugin_t* plugin);  // frames; endless from 2^31 - 1 on
+};
+constexpr char kClapTail[] = "clap.tail";
+constexpr std::uint32_t kEndlessTail = 0x7fffffff;
+
 // One for each row: of two channels, and of one.
 struct Entry {
     const PluginRow* row;
@@ -72,7 +90,7 @@ public:
                  Init,
                  Destroy,
                  Activate,
-                 [](const clap_plugin_t*) {},
+                 [](const clap_plugin_t* self) { Of(self).m_isActive = false; },
                  [](const clap_plugin_t*) { return true; },
                  [](const clap_plugin_t*) {},
                  DoReset,
@@ -105,13 +123,28 @@ private:
         } catch (const std::exception&) {
             return false;
         }
+        self.m_isActive = true;
         self.TellLatency();
         return true;
     }
-    static void DoReset(const clap_plugin_t* plugin) { Of(plugin).m_core->Reset(); }
+    static void DoReset(const clap_plugin_t* plugin) try {
+        Of(plugin).m_core->Reset();
+    } catch (const std::exception&) {
+        return;  // no memory
+    }
 
-    // A host takes a new latency only while it activates.
+    // A host takes a new latency only while it activates, for which it is asked once.
+    bool HasNewLatency() const {
+        const int latency = m_core->Latency();
+        return latency != m_told && latency != m_restartFor;
+    }
+    void AskForRestart() {
+        if (!m_isActive || !HasNewLatency()) return;
+        m_restartFor = m_core->Latency();
+        m_host->request_restart(m_host);
+    }
     void TellLatency() {
+        m_restartFor = m_core->Latency();
         if (m_told == m_core->Latency()) return;
         m_told = m_core->Latency();
         const auto* const latency = HostExtension<clap_host_latency_t>(CLAP_EXT_LATENCY);
@@ -121,7 +154,8 @@ private:
     // The audio thread asks for this when something happened that only this thread may tell.
     static void OnMainThread(const clap_plugin_t* plugin) {
         ClapPlugin& self = Of(plugin);
-        if (self.m_latencyMoved.exchange(false)) self.m_host->request_restart(self.m_host);
+        self.m_callbackIsWanted = false;
+        self.AskForRestart();
         if (self.m_core->TakeOtherValues()) self.TellValues();
     }
     void TellValues() {
@@ -139,7 +173,8 @@ private:
         if (change.param_id == kBypass)
             m_core->Bypass(change.value > 0.5);
         else if (change.param_id <= m_core->Ports().size())
-            m_core->Set(static_cast<int>(change.param_id) - 1, static_cast<float>(change.value));
+            m_core->Set(static_cast<int>(change.param_id) - 1,
+                        FromClap(m_core->Ports()[change.param_id - 1], change.value));
     }
     void TakeTransport(const clap_event_transport_t& transport) {
         const bool hasMeter = (transport.flags & CLAP_TRANSPORT_HAS_TIME_SIGNATURE) != 0;
@@ -174,10 +209,12 @@ private:
             RunPiece(block, done, until - done);
             done = until;
         }
-        if (m_core->Latency() != m_told && !m_latencyMoved.exchange(true)) m_host->request_callback(m_host);
+        if ((m_core->HasOtherValues() || HasNewLatency()) && !m_callbackIsWanted.exchange(true))
+            m_host->request_callback(m_host);
         block.audio_outputs[0].constant_mask = 0;
         SendOutputs(block.out_events);
-        return CLAP_PROCESS_CONTINUE;
+        // What rings, or shows what it hears, goes on in silence.
+        return m_core->Row().rings || m_core->HasWindow() ? CLAP_PROCESS_CONTINUE : CLAP_PROCESS_TAIL;
     }
     void SendOutputs(const clap_output_events_t* events) {
         for (std::size_t i = 0; events && i < m_sent.size(); ++i) {
@@ -191,7 +228,7 @@ private:
                 -1,
                 -1,
                 -1,
-                static_cast<double>(value)};
+                ToClap(m_core->Ports()[i], value)};
             if (events->try_push(events, &event.header)) m_sent[i] = value;
         }
     }
@@ -204,7 +241,7 @@ private:
         }
         if (m_core->SideChannels() > 0 && block.audio_inputs_count > 1 && block.audio_inputs[1].data32)
             for (std::uint32_t c = 0; c < block.audio_inputs[1].channel_count && c < 2; ++c)
-                side[c] = block.audio_inputs[1].data32[c] + from;
+                if (const float* const channel = block.audio_inputs[1].data32[c]) side[c] = channel + from;
         m_core->Run(in, out, side, static_cast<int>(frames));
     }
 
@@ -250,27 +287,29 @@ private:
         else if (!port.momentary)
             info->flags = CLAP_PARAM_IS_AUTOMATABLE;
         if (port.whole) info->flags |= CLAP_PARAM_IS_STEPPED;
+        if (port.isIdle) info->flags |= CLAP_PARAM_IS_HIDDEN;
         CopyText(info->name, sizeof info->name, port.name);
         if (port.group >= 0)
             CopyText(info->module, sizeof info->module, groups[static_cast<std::size_t>(port.group)]);
-        info->min_value = static_cast<double>(port.least);
-        info->max_value = static_cast<double>(port.most);
-        info->default_value = static_cast<double>(port.start);
+        info->min_value = ToClap(port, port.least);
+        info->max_value = ToClap(port, port.most);
+        info->default_value = ToClap(port, port.start);
         return true;
     }
     static bool Value(const clap_plugin_t* plugin, clap_id id, double* value) {
         if (id >= Count(plugin)) return false;
         const Core& core = *Of(plugin).m_core;
-        *value = id == kBypass ? core.Bypassed() : static_cast<double>(core.Value(static_cast<int>(id) - 1));
+        *value = id == kBypass ? core.Bypassed()
+                               : ToClap(core.Ports()[id - 1], core.Value(static_cast<int>(id) - 1));
         return true;
     }
     static bool ValueToText(const clap_plugin_t* plugin, clap_id id, double value, char* text,
                             std::uint32_t size) try {
         if (id >= Count(plugin) || size == 0 || !std::isfinite(value)) return false;
+        Core& core = *Of(plugin).m_core;
         CopyText(text, size,
-                 id == kBypass
-                     ? (value > 0.5 ? "On" : "Off")
-                     : Of(plugin).m_core->Text(static_cast<int>(id) - 1, static_cast<float>(value)));
+                 id == kBypass ? (value > 0.5 ? "On" : "Off")
+                               : core.Text(static_cast<int>(id) - 1, FromClap(core.Ports()[id - 1], value)));
         return true;
     } catch (const std::exception&) {
         return false;
@@ -284,8 +323,9 @@ private:
             *value = shown == "On" ? 1.0 : 0.0;
             return true;
         }
-        if (!Of(plugin).m_core->FromText(static_cast<int>(id) - 1, shown, number)) return false;
-        *value = static_cast<double>(number);
+        Core& core = *Of(plugin).m_core;
+        if (!core.FromText(static_cast<int>(id) - 1, shown, number)) return false;
+        *value = ToClap(core.Ports()[id - 1], number);
         return true;
     } catch (const std::exception&) {
         return false;
@@ -300,6 +340,10 @@ private:
         return static_cast<std::uint32_t>(Of(plugin).m_core->Latency());
     }
     static constexpr clap_plugin_latency_t kLatency{LatencyNow};
+    static std::uint32_t TailNow(const clap_plugin_t* plugin) {
+        return Of(plugin).m_core->Row().rings ? kEndlessTail : LatencyNow(plugin);
+    }
+    static constexpr ClapTail kTail{TailNow};
 
     // State.
     static bool Save(const clap_plugin_t* plugin, const clap_ostream_t* stream) try {
@@ -317,6 +361,7 @@ private:
         ClapPlugin& self = Of(plugin);
         if (!ReadAll(bytes, read) || !LoadState(*self.m_core, bytes)) return false;
         self.TellValues();
+        self.AskForRestart();
         return true;
     } catch (const std::exception&) {
         return false;
@@ -334,6 +379,7 @@ private:
         if (preset < 0) return false;
         m_core->TakePreset(preset);
         TellValues();
+        AskForRestart();
         return true;
     } catch (const std::exception&) {
         return false;
@@ -356,6 +402,7 @@ private:
         if (std::strcmp(id, CLAP_EXT_PARAMS) == 0) return &kParams;
         if (std::strcmp(id, CLAP_EXT_LATENCY) == 0) return &kLatency;
         if (std::strcmp(id, CLAP_EXT_STATE) == 0) return &kState;
+        if (std::strcmp(id, kClapTail) == 0) return &kTail;
         for (const char* const known : kClapPresetLoad)
             if (std::strcmp(id, known) == 0) return Of(plugin).m_core->Presets() > 0 ? &kPresetLoad : nullptr;
         return Of(plugin).m_core->HasWindow() ? ClapWindow::Extension<WindowOf>(id) : nullptr;
@@ -364,9 +411,10 @@ private:
     const clap_host_t* const m_host;
     const std::unique_ptr<Core> m_core;
     ClapWindow m_window;
-    std::vector<float> m_sent;   // of the outputs
-    std::atomic<int> m_told{0};  // the latency that the host knows
-    std::atomic<bool> m_latencyMoved{false};
+    std::vector<float> m_sent;  // of the outputs
+    bool m_isActive = false;
+    std::atomic<int> m_told{0}, m_restartFor{0};  // the latencies that the host knows, and was asked for
+    std::atomic<bool> m_callbackIsWanted{false};
 };
 
 const clap_plugin_factory_t kFactory{

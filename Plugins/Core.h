@@ -17,7 +17,8 @@ namespace Corvo::Plugins {
 //
 // Threads: Set, Bypass, Tempo and Run belong to the thread that processes; while nothing is processed any one
 // thread may call them. Everything else belongs to another thread, and may be called while Run runs, except
-// Prepare and Reset. Run neither allocates nor waits, unless the plug-in's own row says that it may.
+// Prepare. Reset belongs to either, while nothing is processed. Run and Reset neither allocate nor wait,
+// unless the plug-in's own row says that they may.
 class Core {
 public:
     virtual ~Core() = default;
@@ -40,8 +41,8 @@ public:
     // continuous port glides to it over some milliseconds while sound is processed.
     virtual void Set(int, float) {}
     virtual float Value(int port) const = 0;  // any thread
-    // After TakeState: the values that a host had set. They are told again where the effect stores the same
-    // for them, being coarser.
+    // After TakeState: one value per port, as the host had set them. The effect may store numbers more
+    // coarsely than a host sets them: where such a value means what the effect has now, Value gives it back.
     virtual void Recall(const std::vector<float>&) {}
     // Over 20 ms from the effect to its delayed input, or back.
     void Bypass(bool on) { m_bypass = on; }
@@ -62,7 +63,8 @@ public:
     virtual std::string PresetName(int) { return {}; }
     virtual int StartPreset() { return 0; }  // that a new instance has
     virtual void TakePreset(int) {}
-    // True once after values changed that the host did not set.
+    // Whether values changed that the host did not set (any thread); taking it forgets it.
+    virtual bool HasOtherValues() const { return false; }
     virtual bool TakeOtherValues() { return false; }
 
     virtual std::string Text(int port, float value);
@@ -83,12 +85,12 @@ private:
     std::atomic<bool> m_bypass{false};
 };
 
-// What the values of the first block after preparation are: changes like all others, or what the sound begins
-// with. For formats that hand over values with the first block only; that block may allocate then.
-enum class Start { AsPrepared, WithFirstValues };
+// Whose the values of the ports are. Of the plug-in: a list may move other values with it, and the host is
+// told. Of the host, where a format cannot tell it: the others stay as it set them.
+enum class Values { OfPlugin, OfHost };
 
 // A plug-in of the file's table, for 1 or 2 channels. Throws std::bad_alloc.
-std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start start = Start::AsPrepared);
+std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values values = Values::OfPlugin);
 // The names of the factory presets, in less time than a plug-in takes to make. Throws std::bad_alloc.
 std::vector<std::string> PresetNamesOf(const PluginRow& row);
 

@@ -96,6 +96,7 @@ bool EqualiserEffect::DoSetParam(int index, float normalised, bool) {
 }
 
 void EqualiserEffect::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
+    const bool otherChannels = format->nChannels != m_format.nChannels;
     const auto cook = TakeCook(m_format, *format, force);
     if (!cook.due) return;
     for (std::size_t band = 0; band < kBands; ++band) {
@@ -105,11 +106,11 @@ void EqualiserEffect::CheckCookProperties(const tWAVEFORMATEX* format, bool forc
                                     words[kFrequency], words[kGain], words[kQ]};
     }
     const auto rate = static_cast<int>(format->nSamplesPerSec);
-    if (cook.afresh)
+    if (otherChannels)
         m_equaliser.Cook(false, false, m_records.data(), rate,
                          std::min<int>(format->nChannels, MaxNumChannels));
     else
-        m_equaliser.CookBandsOnly(true, false, m_records[0], rate);
+        m_equaliser.CookBandsOnly(!cook.afresh, false, m_records[0], rate);
 }
 
 void EqualiserEffect::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format,

@@ -6,6 +6,7 @@
 #include <src/lv2/time.h>
 #include <src/lv2/urid.h>
 
+#include <atomic>
 #include <cmath>
 #include <cstring>
 #include <exception>
@@ -20,6 +21,9 @@
 namespace {
 
 using namespace Corvo::Plugins;
+
+// Numbers of tempo and time signature.
+constexpr double kLeastTime = 1.0, kMostTime = 1e6;
 
 struct Identifiers {
     explicit Identifiers(const LV2_URID_Map* map) {
@@ -48,7 +52,7 @@ struct Identifiers {
 class Lv2Plugin final : public Lv2Instance {
 public:
     Lv2Plugin(const PluginRow& row, int channels, double rate, const LV2_Feature* const* features)
-        : Lv2Instance(MakeCore(row, channels, Start::WithFirstValues)),
+        : Lv2Instance(MakeCore(row, channels, Values::OfHost)),
           m_ids(static_cast<const LV2_URID_Map*>(Lv2Feature(features, LV2_URID__map))),
           m_order{channels, core->SideChannels(), row.tempo},
           m_rate(rate),
@@ -65,17 +69,17 @@ public:
     void Connect(std::uint32_t port, void* data) {
         if (port < m_ports.size()) m_ports[port] = data;
     }
-    void Activate() { core->Prepare(m_rate, m_longest); }
+    // The sound begins with the values that the host has put into the ports by now.
+    void Activate() {
+        m_actionsAreKnown = false;
+        ReadControls();
+        core->Prepare(m_rate, m_longest);
+    }
 
     void Run(std::uint32_t frames) {
         if (const auto* const events = Port<const LV2_Atom_Sequence>(m_order.Time())) ReadTime(*events);
-        if (const auto* const enabled = Port<const float>(m_order.Enabled()))
-            core->Bypass(!(*enabled > 0.5f));
-        for (std::size_t i = 0; i < m_seen.size(); ++i) {
-            const auto* const value = Port<const float>(m_order.FirstControl() + static_cast<int>(i));
-            if (!value || core->Ports()[i].isOutput || *value == m_seen[i] || std::isnan(*value)) continue;
-            core->Set(static_cast<int>(i), m_seen[i] = *value);
-        }
+        ReadControls();
+        m_actionsAreKnown = true;
         const float *in[2]{}, *side[2]{};
         float* out[2]{};
         bool whole = true;
@@ -108,25 +112,42 @@ public:
         if (!data) return LV2_STATE_ERR_NO_PROPERTY;
         if (type != m_ids.chunk) return LV2_STATE_ERR_BAD_TYPE;
         const auto* const bytes = static_cast<const std::uint8_t*>(data);
+        m_actionsAreKnown = false;
         return core->TakeState({bytes, bytes + size}) ? LV2_STATE_SUCCESS : LV2_STATE_ERR_UNKNOWN;
     }
 
 private:
+    void ReadControls() {
+        if (const auto* const enabled = Port<const float>(m_order.Enabled())) core->Bypass(*enabled <= 0.5f);
+        for (std::size_t i = 0; i < m_seen.size(); ++i) {
+            const auto* const value = Port<const float>(m_order.FirstControl() + static_cast<int>(i));
+            if (!value || core->Ports()[i].isOutput || *value == m_seen[i] || std::isnan(*value)) continue;
+            m_seen[i] = *value;
+            // A switch that the host restores as it stood is not pressed again.
+            if (m_actionsAreKnown || !core->Ports()[i].momentary) core->Set(static_cast<int>(i), *value);
+        }
+    }
+
     template <typename T>
     T* Port(int index) const {
         return index < 0 ? nullptr : static_cast<T*>(m_ports[static_cast<std::size_t>(index)]);
     }
 
-    // A number of any type; 0 for none.
-    double NumberOf(const LV2_Atom* atom) const {
-        if (!atom) return 0.0;
+    // Takes a number of any type, if it may be a tempo or part of a time signature.
+    template <typename T>
+    void TakeNumber(const LV2_Atom* atom, T& number) const {
+        if (!atom) return;
         const void* const body = atom + 1;
-        if (atom->type == m_ids.real) return static_cast<double>(*static_cast<const float*>(body));
-        if (atom->type == m_ids.longReal) return *static_cast<const double*>(body);
-        if (atom->type == m_ids.integer) return *static_cast<const std::int32_t*>(body);
-        if (atom->type == m_ids.longInteger)
-            return static_cast<double>(*static_cast<const std::int64_t*>(body));
-        return 0.0;
+        double read = 0.0;
+        if (atom->type == m_ids.real)
+            read = static_cast<double>(*static_cast<const float*>(body));
+        else if (atom->type == m_ids.longReal)
+            read = *static_cast<const double*>(body);
+        else if (atom->type == m_ids.integer)
+            read = *static_cast<const std::int32_t*>(body);
+        else if (atom->type == m_ids.longInteger)
+            read = static_cast<double>(*static_cast<const std::int64_t*>(body));
+        if (read >= kLeastTime && read <= kMostTime) number = static_cast<T>(read);
     }
 
     void ReadTime(const LV2_Atom_Sequence& events) {
@@ -136,9 +157,9 @@ private:
             if (object->body.otype != m_ids.position || m_ids.position == 0) continue;
             const LV2_Atom *bpm = nullptr, *beats = nullptr, *unit = nullptr;
             lv2_atom_object_get(object, m_ids.bpm, &bpm, m_ids.beatsPerBar, &beats, m_ids.beatUnit, &unit, 0);
-            if (bpm) m_bpm = NumberOf(bpm);
-            if (beats) m_numerator = static_cast<int>(NumberOf(beats));
-            if (unit) m_denominator = static_cast<int>(NumberOf(unit));
+            TakeNumber(bpm, m_bpm);
+            TakeNumber(beats, m_numerator);
+            TakeNumber(unit, m_denominator);
             core->Tempo(m_bpm, m_numerator, m_denominator);
         }
     }
@@ -148,12 +169,22 @@ private:
     const double m_rate;
     int m_longest = 4096;
     std::vector<void*> m_ports;
-    std::vector<float> m_seen;  // values of the control ports at the last run
+    std::vector<float> m_seen;                   // values of the control ports at the last run
+    std::atomic<bool> m_actionsAreKnown{false};  // how they stood since the settings were taken as a whole
     double m_bpm = 120.0;
     int m_numerator = 4, m_denominator = 4;
 };
 
 Lv2Plugin& Of(LV2_Handle plugin) { return static_cast<Lv2Plugin&>(*static_cast<Lv2Instance*>(plugin)); }
+
+// Hosts in C cannot take what is thrown.
+LV2_State_Status Guarded(auto call) {
+    try {
+        return call();
+    } catch (const std::exception&) {
+        return LV2_STATE_ERR_UNKNOWN;  // no memory
+    }
+}
 
 // Two descriptors for each row: of two channels, and of one.
 struct Entry {
@@ -178,7 +209,7 @@ const std::vector<Entry>& Entries() {
                 entry.uri.c_str(),
                 Instantiate,
                 [](LV2_Handle plugin, std::uint32_t port, void* data) { Of(plugin).Connect(port, data); },
-                [](LV2_Handle plugin) { Of(plugin).Activate(); },
+                [](LV2_Handle plugin) { Guarded([&] { return Of(plugin).Activate(), LV2_STATE_SUCCESS; }); },
                 [](LV2_Handle plugin, std::uint32_t frames) { Of(plugin).Run(frames); },
                 nullptr,
                 [](LV2_Handle plugin) { delete static_cast<Lv2Instance*>(plugin); },
@@ -203,9 +234,9 @@ LV2_Handle Instantiate(const LV2_Descriptor* descriptor, double rate, const char
 
 const LV2_State_Interface kState{
     [](LV2_Handle plugin, LV2_State_Store_Function store, LV2_State_Handle handle, std::uint32_t,
-       const LV2_Feature* const*) { return Of(plugin).Save(store, handle); },
+       const LV2_Feature* const*) { return Guarded([&] { return Of(plugin).Save(store, handle); }); },
     [](LV2_Handle plugin, LV2_State_Retrieve_Function retrieve, LV2_State_Handle handle, std::uint32_t,
-       const LV2_Feature* const*) { return Of(plugin).Restore(retrieve, handle); }};
+       const LV2_Feature* const*) { return Guarded([&] { return Of(plugin).Restore(retrieve, handle); }); }};
 
 }  // namespace
 

@@ -139,9 +139,14 @@ public:
                  << "> ;\n    rdfs:label " << Quoted(m_core->PresetName(preset)) << " ;\n"
                  << "    state:state [ <" << kLv2SettingsKey << "> \"" << Base64(m_core->State())
                  << "\"^^xsd:base64Binary ] ;\n    lv2:port";
-            for (std::size_t i = 0; i < m_core->Ports().size() && !m_core->Ports()[i].isOutput; ++i)
-                file << (i > 0 ? "," : "") << "\n        [ lv2:symbol " << Quoted(m_core->Ports()[i].symbol)
-                     << " ; pset:value " << Number(m_core->Value(static_cast<int>(i))) << " ]";
+            const char* before = "";
+            for (std::size_t i = 0; i < m_core->Ports().size(); ++i) {
+                const Port& port = m_core->Ports()[i];
+                if (port.momentary || port.isOutput) continue;
+                file << before << "\n        [ lv2:symbol " << Quoted(port.symbol) << " ; pset:value "
+                     << Number(m_core->Value(static_cast<int>(i))) << " ]";
+                before = ",";
+            }
             file << " .\n";
         }
     }
@@ -206,13 +211,15 @@ private:
         if (!port.isOutput) file << "        lv2:default " << Number(port.start) << " ;\n";
         file << "        lv2:minimum " << Number(port.least) << " ;\n        lv2:maximum "
              << Number(port.most) << " ;\n        rdfs:comment " << Quoted(port.comment) << " ;\n";
-        // Short enough for a narrow strip.
-        if (port.name.size() > 16)
-            file << "        lv2:shortName " << Quoted(port.name.substr(0, 16)) << " ;\n";
+        if (const auto name = ShortNameOf(port.name); name != port.name)
+            file << "        lv2:shortName " << Quoted(name) << " ;\n";
         if (toggled) file << "        lv2:portProperty lv2:toggled, lv2:integer ;\n";
         if (port.type == Corvo::EffectParameterType::List)
             file << "        lv2:portProperty lv2:enumeration, lv2:integer ;\n";
         if (port.whole && port.points.empty()) file << "        lv2:portProperty lv2:integer ;\n";
+        if (port.isIdle) file << "        lv2:portProperty pprops:notOnGUI ;\n";
+        if (port.momentary) file << "        lv2:portProperty pprops:notAutomatic ;\n";
+        if (port.springsBack) file << "        lv2:portProperty pprops:trigger ;\n";
         if (port.logarithmic) file << "        lv2:portProperty pprops:logarithmic ;\n";
         if (port.group >= 0)
             file << "        pg:group <" << GroupUri(static_cast<std::size_t>(port.group)) << "> ;\n";

@@ -18,6 +18,14 @@ std::string PluginName(const PluginRow& row, int channels) {
     return std::string(row.name) + (channels == 1 ? " (mono)" : "");
 }
 
+std::string ShortNameOf(const std::string& name) {
+    constexpr std::size_t kMost = 16;
+    if (name.size() <= kMost) return name;
+    const std::string side = name.ends_with(" L") || name.ends_with(" R") ? name.substr(name.size() - 2) : "";
+    const auto end = name.rfind(' ', kMost - side.size());
+    return end == name.npos ? name : name.substr(0, end) + side;
+}
+
 std::string SymbolOf(const std::string& name) {
     std::string symbol;
     for (const char c : name) {

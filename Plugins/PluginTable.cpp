@@ -14,7 +14,7 @@ constexpr PluginRow kRows[]{
     {"Gain",        "gain",        "DGai", 2, "AmplifierPlugin",  "utility",          "Tools",        true,  false, false, false, false, "Level, stereo width, pan and polarity"},
     {"Compressor",  "compressor",  "DCmp", 2, "CompressorPlugin", "compressor",       "Dynamics",     true,  false, false, false, true,  "Compressor, limiter, gate and expander on a transfer curve, with side-chain"},
     {"Tremolo",     "tremolo",     "DTrm", 2, "ModulatorPlugin",  "tremolo",          "Modulation",   true,  false, false, false, false, "Tremolo, auto-pan and ring modulation"},
-    {"Equaliser",   "equaliser",   "DEqu", 2, "ParaEQPlugin",     "equalizer",        "EQ",           true,  false, false, true,  true,  "Eight gliding bands: peaks, shelves and passes"},
+    {"Equaliser",   "equaliser",   "DEqu", 2, "ParaEQPlugin",     "equalizer",        "EQ",           true,  false, false, true,  true,  "Eight gliding bands: peaks of Q/133 octaves, shelves and passes"},
     {"Valvex",      "valvex",      "DVal", 2, "DistortionPlugin", "distortion",       "Distortion",   true,  false, false, false, false, "Tube distortion of four shapes, oversampled up to 16 times"},
     {"Echo",        "echo",        "DEch", 2, "DelayPlugin",      "delay",            "Delay",        true,  false, true,  true,  false, "Stereo delay in milliseconds or notes of the host's tempo"},
     {"Chorus",      "chorus",      "DCho", 2, "ChorusPlugin",     "chorus",           "Modulation",   true,  false, false, true,  false, "Chorus and flanger"},
@@ -43,8 +43,8 @@ std::vector<std::string> PresetNamesOf(const PluginRow& row) {
     return names;
 }
 
-std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start start) {
-    return std::make_unique<Adapter>(row, channels, start);
+std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values values) {
+    return std::make_unique<Adapter>(row, channels, values);
 }
 
 }  // namespace Corvo::Plugins

@@ -38,6 +38,8 @@ const PluginRow* FindPluginRow(std::string_view id);  // null where there is non
 std::string PluginUri(const PluginRow& row, int channels);
 std::string PluginName(const PluginRow& row, int channels);
 
+// A name for a narrow strip: whole words, at most 16 characters where there are several; the side stays.
+std::string ShortNameOf(const std::string& name);
 // A name as an identifier: letters, digits and "_".
 std::string SymbolOf(const std::string& name);
 

@@ -20,12 +20,18 @@ struct LayoutMaker {
     std::unique_ptr<CorvoEffectBase> fresh = row.Make(), tried = row.Make();
     Layout layout{};
 
+    // The other one of a pair; -1 for none.
+    int OtherSide(int parameter) {
+        const auto name = fresh->Describe(parameter).name;
+        for (int i = 0; i < fresh->GetParamCount(); ++i)
+            if (i != parameter && fresh->Describe(i).name == name) return i;
+        return -1;
+    }
+
     // Sides are told apart only where the plug-in has both, and where they are two parameters indeed.
     bool IsSecondSide(int parameter) {
         const auto description = fresh->Describe(parameter);
-        int first = -1;
-        for (int i = 0; i < fresh->GetParamCount(); ++i)
-            if (i != parameter && fresh->Describe(i).name == description.name) first = i;
+        const int first = OtherSide(parameter);
         if (first < 0) return false;
         if (fresh->Describe(first).label == description.label) return parameter > first;
         const bool right = description.label.ends_with(" R");
@@ -38,13 +44,6 @@ struct LayoutMaker {
         }
         return true;
     }
-    bool HasSecondSide(int parameter) {
-        const auto name = fresh->Describe(parameter).name;
-        for (int i = 0; i < fresh->GetParamCount(); ++i)
-            if (i != parameter && fresh->Describe(i).name == name) return !IsSecondSide(i);
-        return false;
-    }
-
     // Switched on, an action is off again in what is stored.
     bool IsAction(int parameter) {
         std::vector<std::uint8_t> chunk;
@@ -57,6 +56,7 @@ struct LayoutMaker {
 
     void SetChoices(Port& port, const DSP::ParameterDescription& description) {
         port.momentary = port.type == EffectParameterType::Switch && IsAction(port.parameter);
+        port.springsBack = port.momentary && tried->GetParam(port.parameter) == 0.0f;
         for (const auto& choice : description.choices) {
             port.points.push_back({choice.text, static_cast<float>(port.points.size())});
             port.m_choices.push_back(choice.normalised);
@@ -78,7 +78,7 @@ struct LayoutMaker {
         port.resolution = read.isNumber ? read.Resolution() * (read.keepsFractions ? 0.01 : 1.0) : 1e-4;
         port.whole = read.isNumber && !read.keepsFractions && read.decimals == 0 &&
                      port.most - port.least <= kMostSteps;
-        // What depends on other settings may mean a note: it jumps.
+        // What shows no number may choose among notes: a glide would play those in between.
         port.glides = read.isNumber && !port.whole && !row.smooth;
         const float middle = port.curve.Number(0.5f), product = port.least * port.most;
         port.logarithmic = port.least > 0.0f && std::abs(middle - std::sqrt(product)) <
@@ -107,10 +107,13 @@ struct LayoutMaker {
         for (int parameter = 0; parameter < fresh->GetParamCount(); ++parameter) {
             if (IsSecondSide(parameter)) continue;
             const auto description = fresh->Describe(parameter);
+            const int other = OtherSide(parameter);
+            const bool isApart = other >= 0 && !IsSecondSide(other);
             tried = row.Make();
             Port port;
             port.parameter = parameter;
-            port.name = HasSecondSide(parameter) ? description.label : description.name;
+            if (channels == 1) port.second = other;
+            port.name = isApart ? description.label : description.name;
             port.symbol = SymbolOf(port.name);
             port.type = description.type;
             port.group = GroupOf(parameter);
@@ -118,6 +121,7 @@ struct LayoutMaker {
                 SetRange(port, description);
             else
                 SetChoices(port, description);
+            port.isIdle = channels == 1 && port.name.starts_with("Stereo ");
             port.start = port.ValueOf(*fresh);
             layout.ports.push_back(std::move(port));
         }
@@ -140,6 +144,11 @@ float Port::Value(float position) const {
             std::round(static_cast<double>(curve.Number(position)) / resolution) * resolution + 0.0);
     const auto distance = [position](float choice) { return std::abs(choice - position); };
     return static_cast<float>(std::ranges::min_element(m_choices, {}, distance) - m_choices.begin());
+}
+
+void Port::SetOn(CorvoEffectBase& effect, float position, bool automated) const {
+    effect.SetParam(parameter, position, automated);
+    if (second >= 0) effect.SetParam(second, position, automated);
 }
 
 float Port::ValueOf(CorvoEffectBase& effect) const {

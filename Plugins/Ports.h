@@ -16,6 +16,7 @@ struct Port {
     };
 
     int parameter = 0;    // external index of an effect
+    int second = -1;      // of the other side, which a mono plug-in sets along; none: -1
     std::string symbol;   // unique within the plug-in; never changes
     std::string name;     // " L" and " R" where the effect has sides
     std::string unit;     // empty where numbers have none
@@ -28,6 +29,8 @@ struct Port {
     bool glides = false;        // moves to its values in small steps
     bool isOutput = false;      // tells the host a value, and is none of its own
     bool momentary = false;     // a switch that does something, and is no setting: off after loading
+    bool springsBack = false;   // a momentary one that is off again at once
+    bool isIdle = false;        // has nothing to do on one channel: hosts need not show it
     bool isNumber = false;      // the effect shows numbers
     double resolution = 1.0;    // of the values that are told
     bool logarithmic = false;   // the knob has ratios, not differences
@@ -36,6 +39,7 @@ struct Port {
 
     float Position(float value) const;  // 0..1, as the effect takes it
     float Value(float position) const;
+    void SetOn(DSP::CorvoEffectBase& effect, float position, bool automated) const;
     // The value of the effect's parameter as it stands: the number that it shows.
     float ValueOf(DSP::CorvoEffectBase& effect) const;
 

@@ -15,8 +15,10 @@ std::vector<std::uint8_t> SaveState(Core& core) {
     std::vector<std::uint8_t> bytes(std::begin(kTag), std::end(kTag));
     bytes.push_back(core.Bypassed());
     for (std::size_t i = 0; i < core.Ports().size(); ++i) {
-        if (core.Ports()[i].isOutput) continue;
-        const auto word = std::bit_cast<std::uint32_t>(core.Value(static_cast<int>(i)));
+        const Port& port = core.Ports()[i];
+        if (port.isOutput) continue;
+        const float value = port.momentary ? port.start : core.Value(static_cast<int>(i));
+        const auto word = std::bit_cast<std::uint32_t>(value);
         for (int shift = 0; shift < 32; shift += 8) bytes.push_back(static_cast<std::uint8_t>(word >> shift));
     }
     const auto settings = core.State();

@@ -35,6 +35,7 @@ v3_result Vst3Plugin::ParameterInfo(std::int32_t index, v3_param_info* info) {
 v3_result Vst3Plugin::TextOf(v3_param_id id, double normalised, std::int16_t* text) {
     if (!m_parameters.Find(id) || !std::isfinite(normalised)) return V3_INVALID_ARG;
     CopyText(AsText(text), m_parameters.Text(id, std::clamp(normalised, 0.0, 1.0)));
+    TellLatency();
     return V3_OK;
 }
 
@@ -95,7 +96,9 @@ void Vst3Plugin::Restart(std::int32_t flags) {
     if (m_handler) v3_cpp_obj(m_handler)->restart_component(m_handler, flags);
 }
 
+// Hosts that do not hand over what the processor sends hear of it when they ask for something else.
 void Vst3Plugin::TellLatency() {
+    if (!m_active) return;  // it is asked for afterwards
     const int latency = m_core->Latency();
     if (m_toldLatency.exchange(latency) != latency) Restart(V3_RESTART_LATENCY_CHANGED);
 }

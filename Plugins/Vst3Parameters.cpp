@@ -61,7 +61,7 @@ bool Vst3Parameters::Info(std::size_t index, v3_param_info& info) const {
                               : id == kProgram ? "Program"
                                                : "Latency";
     CopyText(info.title, title);
-    CopyText(info.short_title, title.substr(0, 16));
+    CopyText(info.short_title, ShortNameOf(title));
     info.step_count = Steps(id);
     info.default_normalised_value = Start(id);
     if (id == kBypass) info.flags = V3_PARAM_CAN_AUTOMATE | V3_PARAM_IS_BYPASS;

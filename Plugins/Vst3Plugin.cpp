@@ -13,7 +13,9 @@ namespace {
 
 constexpr v3_speaker_arrangement kMono = V3_SPEAKER_M, kStereo = V3_SPEAKER_L | V3_SPEAKER_R;
 
-v3_speaker_arrangement ArrangementOf(int channels) { return channels == 1 ? kMono : kStereo; }
+v3_speaker_arrangement ArrangementOf(int channels) {
+    return channels == 0 ? 0 : channels == 1 ? kMono : kStereo;
+}
 
 // The number of the preset, in 4 bytes, stands before what CLAP keeps too.
 constexpr std::size_t kProgramBytes = 4;
@@ -62,7 +64,8 @@ Vst3Plugin::Vst3Plugin(const PluginRow& row)
       m_core(MakeCore(row, 2)),
       m_parameters(*m_core),
       m_hasOutputs(std::ranges::count(m_core->Ports(), true, &Port::isOutput) > 0),
-      m_values(m_parameters.Count()) {
+      m_values(m_parameters.Count()),
+      m_sideChannels(m_core->SideChannels()) {
     m_queues.reserve(m_parameters.Count());
     for (std::size_t i = 0; i < m_values.size(); ++i) m_values[i] = m_parameters.Start(m_parameters.Id(i));
 }
@@ -120,7 +123,7 @@ v3_result Vst3Plugin::BusInfo(std::int32_t media, std::int32_t direction, std::i
     *info = {};
     info->media_type = media;
     info->direction = direction;
-    info->channel_count = main ? m_core->Channels() : m_sideIsMono ? 1 : m_core->SideChannels();
+    info->channel_count = main ? m_core->Channels() : m_sideChannels;
     CopyText(info->bus_name, !main ? "Side-chain" : direction == V3_INPUT ? "In" : "Out");
     info->bus_type = main ? V3_MAIN : V3_AUX;
     info->flags = main ? V3_DEFAULT_ACTIVE : 0;
@@ -138,9 +141,10 @@ v3_result Vst3Plugin::SetArrangements(v3_speaker_arrangement* in, std::int32_t i
     if (ins < 0 || outs < 0 || (ins > 0 && !in) || (outs > 0 && !out)) return V3_INVALID_ARG;
     if (m_active || ins < 1 || ins > BusCount(V3_AUDIO, V3_INPUT) || outs != 1) return V3_FALSE;
     if (in[0] != out[0] || (in[0] != kMono && in[0] != kStereo)) return V3_FALSE;
-    if (ins == 2 && in[1] != in[0] && in[1] != kMono) return V3_FALSE;
+    // Of a wider side-chain the first channels are heard; some hosts ask for one without any.
+    if (ins == 2 && in[1] != 0 && in[1] != kMono && in[1] != kStereo) return V3_FALSE;
     m_core->SetChannels(in[0] == kMono ? 1 : 2);
-    m_sideIsMono = ins == 2 && in[1] == kMono;
+    m_sideChannels = ins < 2 ? m_core->SideChannels() : in[1] == 0 ? 0 : in[1] == kMono ? 1 : 2;
     return V3_OK;
 }
 
@@ -170,6 +174,7 @@ v3_result Vst3Plugin::SetState(v3_bstream** stream) {
     if (const auto index = m_parameters.Find(Vst3Parameters::kProgram))
         m_values[*index] = m_parameters.Normalised(Vst3Parameters::kProgram, program);
     Restart(V3_RESTART_PARAM_VALUES_CHANGED);
+    TellLatency();
     return V3_OK;
 }
 

@@ -109,7 +109,7 @@ private:
     void TakeChange(v3_param_id id, double normalised);
     bool FindChannels(const v3_process_data& block, Channels& channels) const;
     void Send(v3_param_changes** changes);
-    static void SendValue(v3_param_changes** changes, v3_param_id id, double normalised);
+    static bool SendValue(v3_param_changes** changes, v3_param_id id, double normalised);
 
     Face m_component, m_processor, m_controller, m_units, m_requirements;
     std::atomic<std::uint32_t> m_references{1};
@@ -122,7 +122,7 @@ private:
     double m_rate = 48000.0;
     int m_longest = 1024;
     bool m_active = false, m_ran = false;
-    bool m_sideIsMono = false;
+    int m_sideChannels;  // that the host gives, 0 to 2
     std::atomic<bool> m_sideIsOn{false};
     std::atomic<bool> m_sendAll{false};  // values, with the next block
     std::atomic<int> m_toldLatency{0};

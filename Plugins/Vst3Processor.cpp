@@ -163,16 +163,19 @@ void Vst3Plugin::Send(v3_param_changes** changes) {
             SendValue(changes, id, value);
         }
     const int latency = m_core->Latency();
-    if (latency != m_toldLatency && latency != m_sentLatency)
-        SendValue(changes, Vst3Parameters::kLatency,
-                  m_parameters.Normalised(Vst3Parameters::kLatency, latency));
-    m_sentLatency = latency;
+    if (latency == m_toldLatency)
+        m_sentLatency = latency;
+    else if (latency != m_sentLatency &&
+             SendValue(changes, Vst3Parameters::kLatency,
+                       m_parameters.Normalised(Vst3Parameters::kLatency, latency)))
+        m_sentLatency = latency;
 }
 
-void Vst3Plugin::SendValue(v3_param_changes** changes, v3_param_id id, double normalised) {
+// False where the host has no room for it.
+bool Vst3Plugin::SendValue(v3_param_changes** changes, v3_param_id id, double normalised) {
     std::int32_t index = 0;
     auto** const queue = changes ? v3_cpp_obj(changes)->add_param_data(changes, &id, &index) : nullptr;
-    if (queue) v3_cpp_obj(queue)->add_point(queue, 0, normalised, &index);
+    return queue && v3_cpp_obj(queue)->add_point(queue, 0, normalised, &index) == V3_OK;
 }
 
 }  // namespace Corvo::Plugins

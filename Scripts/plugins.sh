@@ -80,8 +80,22 @@ name_of() { lv2info "$1" | sed -n 's/^\tName: *//p'; }
 channels_of() { case $1 in *-mono) echo 1 ;; *) echo 2 ;; esac; }
 # What dsphost calls the effect in a plug-in.
 effect_of() { name_of "$1" | sed 's/ (mono)$//; s/^Equaliser$/EQ: 1000 peak 6 q=200/'; }
-# The values that a host sets. The equaliser is flat at first, and dsphost's has no values of its own.
-values_of() { case $1 in *:equaliser*) echo band_4_frequency=1000 band_4_gain=6 ;; esac; }
+# The values that a host sets where a new instance would leave the sound as it is, and dsphost's words for them: its
+# equaliser has them in its name.
+values_of() {
+    case $1 in
+        *:equaliser*) echo band_4_frequency=1000 band_4_gain=6 ;;
+        *:gain*) echo gain=-6 ;;
+        *:valvex-mono) echo drive=80 oversampling=2 ;;
+        *:valvex) echo drive_l=80 drive_r=80 oversampling_l=2 oversampling_r=2 ;;
+    esac
+}
+settings_of() {
+    case $1 in
+        *:gain*) echo 'Gain=-6' ;;
+        *:valvex*) echo 'Drive L=80, Drive R=80, Oversampling L=4, Oversampling R=4' ;;
+    esac
+}
 about() {
     local effect
     effect=$(effect_of "$1")
@@ -89,7 +103,7 @@ about() {
     [[ $effect != EQ:* ]] || effect=Gain
     "$dsphost" effects "$effect" --json | "$python" -c "import json, sys; effect = json.load(sys.stdin)[0]; print($2)"
 }
-latency_of() { about "$1" 'effect["latency"]'; }
+latency_of() { case $1 in *:valvex*) echo 4 ;; *) about "$1" 'effect["latency"]' ;; esac; }
 # One that is not where the effect starts; nothing where it has none.
 preset_of() { about "$1" '([p for i, p in enumerate(effect["presets"]) if i != effect["default_preset"]] or [""])[0]'; }
 
@@ -114,8 +128,10 @@ input_of() {
 # expect URI FILE LATENCY [PRESET] [LEAD]: whether the file is the library's own result so many frames later. LEAD frames
 # of silence came before it.
 expect() {
-    local uri=$1 preset=${4:-} lead=${5:-0} effect in out
-    effect=$(effect_of "$uri") in=$work/in$(channels_of "$uri").wav
+    local uri=$1 preset=${4:-} lead=${5:-0} effect settings in out
+    settings=${preset:+preset=$preset}
+    settings+=$(settings_of "$uri" | sed "s/^/${preset:+, }/")
+    effect=$(effect_of "$uri")${settings:+: $settings} in=$work/in$(channels_of "$uri").wav
     out="$work/reference-${uri##*:}${preset:+-preset}-$lead.wav"
     if [ "$lead" != 0 ]; then
         [ -e "${in%.wav}-$lead.wav" ] ||
@@ -123,7 +139,7 @@ expect() {
         in=${in%.wav}-$lead.wav
     fi
     [ -e "$out" ] || "$dsphost" render -q -y --precision 32 --format f32 --block 1024 "$in" "$out" \
-        --fx "$effect${preset:+: preset=$preset}" >&2 || return 1
+        --fx "$effect" >&2 || return 1
     "$python" "$hosts/compare.py" "$out" "$2" "$3" $lead
 }
 sounds() { "$python" "$hosts/compare.py" --sounds "$@"; }
@@ -239,7 +255,7 @@ try_ardour() {
         LD_LIBRARY_PATH=/usr/lib/ardour7 timeout 60 /usr/lib/ardour7/ardour-vst3-scanner -f "$file" > "$work/scan.log" 2>&1 || :
         grep -q 'Found Plugin' "$work/scan.log" || { echo "Ardour's VST3 scanner finds nothing in $file"; status=1; }
     done
-    local uri plugins=("VST3 urn:dspdll:gain")
+    local uri plugins=("VST3 urn:dspdll:reverb")
     for uri in $(uris); do plugins+=("LV2 $uri"); done
     each render_with_ardour "${plugins[@]}" || status=1
     return $status
@@ -254,6 +270,21 @@ scan_with_qtractor() {
 # A process for each file: one that crashes or hangs does not hide the others.
 check_with_our_host() {
     timeout 300 "$build/bin/plugin_host" "$1" || { echo "${1##*/}: plugin_host ends with $?"; return 1; }
+}
+
+# What musicians get, and what an installation puts where hosts look.
+pack() {
+    local file archive
+    HOME=$real_home XDG_CACHE_HOME=$real_cache cmake --build --preset plugins --target dsp_plugin_archive > "$work/pack.log"
+    archive=$(ls "$build"/dspdll-plugins-*.tar.xz)
+    tar -tf "$archive" > "$work/archive.txt"
+    for file in README.txt lv2/dspdll.lv2/dspdll.so lv2/dspdll.lv2/manifest.ttl clap/dspdll.clap \
+        vst3/dspdll.vst3/Contents/x86_64-linux/dspdll.so; do
+        grep -q "^[^/]*/$file\$" "$work/archive.txt" || { echo "${archive##*/} has no $file"; return 1; }
+    done
+    cmake --install "$build" --component plugins --prefix "$work/installed" > "$work/install.log"
+    [ "$(LV2_PATH=$work/installed/lib/lv2 lv2ls)" = "$(LV2_PATH=$build/lv2 lv2ls)" ] ||
+        { echo "an installation has other plug-ins than the build"; return 1; }
 }
 
 same_presets() { "$@" --presets "$clap" "$vst3" | "$python" "$hosts/presets.py" "$lv2"; }
@@ -293,7 +324,8 @@ part ffmpeg each render_with_ffmpeg $(uris)
 part jalv play_with_jalv
 part ardour try_ardour
 part qtractor scan_with_qtractor "$clap"
-part plugin_host each check_with_our_host "$clap" "$vst3" "$build/clap/$analyser.clap" "$build/vst3/$analyser.vst3"
+part plugin_host each check_with_our_host "$lv2" "$clap" "$vst3" "$build"/{lv2/$analyser.lv2,clap/$analyser.clap,vst3/$analyser.vst3}
+part archive pack
 part presets same_presets "$build/bin/plugin_host"
 part win64 check_windows
 

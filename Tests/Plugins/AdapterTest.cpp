@@ -118,6 +118,18 @@ TEST_P(EveryPlugin, StateOfEveryPresetIsExact) {
     }
 }
 
+TEST(Actions, AreOffAgainAndTheHostHearsOfIt) {
+    Adapter adapter(*FindPluginRow("denoiser"), 1);
+    adapter.Prepare(kRate, kLongest);
+    const auto at = std::ranges::find(adapter.Ports(), true, &Port::springsBack) - adapter.Ports().begin();
+    for (int press = 0; press < 2; ++press) {
+        adapter.Set(static_cast<int>(at), 1.0f);
+        Processed(adapter, Sound(64), [](std::size_t) {});
+        EXPECT_EQ(adapter.Value(static_cast<int>(at)), 0.0f);
+        EXPECT_TRUE(adapter.TakeOtherValues());
+    }
+}
+
 TEST(SideChain, CountsOnceItSounds) {
     Adapter adapter(*FindPluginRow("compressor"), 2);
     adapter.Prepare(kRate, kLongest);

@@ -89,7 +89,7 @@ std::span<const PluginRow> PluginRows() { return {&analyser::kRow, 1}; }
 
 std::vector<std::string> PresetNamesOf(const PluginRow&) { return {}; }
 
-std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Start) {
+std::unique_ptr<Core> MakeCore(const PluginRow& row, int channels, Values) {
     return std::make_unique<analyser::AnalyserCore>(row, channels);
 }
 

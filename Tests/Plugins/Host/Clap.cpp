@@ -72,6 +72,7 @@ const void* HostExtension(const clap_host_t*, const char* id) {
 }
 
 bool g_callbackWanted = false;
+int g_restarts = 0;
 const clap_host_t kHost{CLAP_VERSION,
                         nullptr,
                         "plugin_host",
@@ -79,7 +80,7 @@ const clap_host_t kHost{CLAP_VERSION,
                         "",
                         "1.0",
                         HostExtension,
-                        [](const clap_host_t*) {},
+                        [](const clap_host_t*) { ++g_restarts; },
                         [](const clap_host_t*) {},
                         [](const clap_host_t*) { g_callbackWanted = true; }};
 
@@ -200,9 +201,14 @@ public:
     }
     std::uint32_t Latency() override { return m_latency ? m_latency->get(m_plugin) : 0; }
 
+    int TakeLatencyNews() override {
+        RunCallback();
+        return std::exchange(g_restarts, 0);
+    }
+
     void Flush(std::span<const Change> changes) override {
         m_events.Set(changes);
-        m_params->flush(m_plugin, &m_events.in, &m_events.out);
+        InRealTime([&] { m_params->flush(m_plugin, &m_events.in, &m_events.out); });
     }
     void FlushActive(std::span<const Change> changes) override { Flush(changes); }
 
@@ -210,7 +216,9 @@ public:
         m_events.Set(block.changes);
         return Run(block) != CLAP_PROCESS_ERROR;
     }
-    void Reset() override { m_plugin->reset(m_plugin); }
+    void Reset() override {
+        InRealTime([&] { m_plugin->reset(m_plugin); });
+    }
 
     std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
         return OpenClapWindow(m_plugin, parent);
@@ -287,13 +295,15 @@ private:
         clap_event_transport_t transport{};
         transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
         transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
-        transport.tempo = 120;
+        transport.tempo = tempo;
         clap_process_t process{m_time, block.frames, &transport,   in.data(), out.data(), 0,
                                0,      &m_events.in, &m_events.out};
         process.audio_inputs_count = static_cast<std::uint32_t>(inputs.size());
         process.audio_outputs_count = static_cast<std::uint32_t>(outputs.size());
         m_time += block.frames;
-        return InRealTime([&] { return m_plugin->process(m_plugin, &process); });
+        clap_process_status status = CLAP_PROCESS_ERROR;
+        InRealTime([&] { status = m_plugin->process(m_plugin, &process); });
+        return status;
     }
     void RunCallback() {
         if (std::exchange(g_callbackWanted, false)) m_plugin->on_main_thread(m_plugin);

@@ -21,18 +21,10 @@ void Divide(const std::vector<Port>& ports, std::span<float* const> channels, st
     }
 }
 
-// The plug-in's process, under the rules of the audio thread.
-template <typename Call>
-auto InRealTime(Call call) {
-    std::string broken;
-    const auto result = [&] {
-        TestSupport::AudioThreadRules rules;
-        const auto made = call();
-        broken = rules.Broken();
-        return made;
-    }();
+// The plug-in's work, under the rules of the audio thread.
+inline void InRealTime(const auto& call) {
+    const std::string broken = TestSupport::BrokenBy(call);
     if (!broken.empty() && IsRealTime()) Finding("does on the audio thread: " + broken);
-    return result;
 }
 
 }  // namespace PluginHost

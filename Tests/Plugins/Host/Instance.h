@@ -85,6 +85,7 @@ public:
     std::vector<Parameter> parameters;
     std::vector<Port> inputs, outputs;
     std::vector<std::string> presets;  // names
+    double tempo = 120;                // in beats per minute
 
     virtual std::optional<std::string> Text(const Parameter&, double value) = 0;
     virtual std::optional<double> Value(const Parameter&, const std::string& text) = 0;
@@ -100,6 +101,8 @@ public:
     virtual bool Activate(double rate, std::uint32_t maxFrames) = 0;
     virtual void Deactivate() = 0;
     virtual std::uint32_t Latency() = 0;
+    // How often the host was told since that the latency is another. It has heard the plug-in out.
+    virtual int TakeLatencyNews() = 0;
 
     virtual void Flush(std::span<const Change>) = 0;        // while inactive
     virtual void FlushActive(std::span<const Change>) = 0;  // without audio
@@ -126,6 +129,7 @@ public:
 };
 
 // Throw std::runtime_error where there is nothing to check.
+std::unique_ptr<PluginFile> OpenLv2(const std::filesystem::path& bundle);
 std::unique_ptr<PluginFile> OpenClap(const std::filesystem::path&);
 std::unique_ptr<PluginFile> OpenVst3(const std::filesystem::path&);
 

@@ -58,6 +58,53 @@ void CheckRestoring(PluginFile& file, std::size_t index, unsigned seed) {
            "sounds otherwise (by " + std::to_string(difference) + ") after its state came back");
 }
 
+// A list may move other values with it. A session that is saved then goes on with them.
+void CheckMovedValues(PluginFile& file, std::size_t index) {
+    const auto fresh = file.Create(index);
+    const Signal noise = Noise(Channels(fresh->inputs), 2400);
+    std::mt19937 random(8);
+    for (const Parameter& p : fresh->parameters)
+        for (int step = 0; step <= p.steps && p.steps > 1 && p.automatable; ++step) {
+            const auto plugin = file.Create(index), restored = file.Create(index);
+            const Change change{p.id, p.At(1.0 * step / p.steps), 0};
+            RenderAt(*plugin, 48000, noise, {.changes = ForAll(*plugin, [&] { return Share(random); })});
+            RenderAt(*plugin, 48000, noise, {.changes = {&change, 1}});
+            const auto state = plugin->Save();
+            Expect(restored->Load({.bytes = state.value_or(Bytes{})}), "refuses its own state");
+            ExpectSameValues(*plugin, *restored, "saved after a change of " + p.name);
+            RenderAt(*restored, 48000, noise);
+            Expect(restored->Save() == state,
+                   "goes on otherwise than it was saved after a change of " + p.name);
+        }
+}
+
+// Learning noise and forgetting it are done, not set: neither is done again by loading.
+void CheckActions(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index), restored = file.Create(index);
+    const Signal noise = Noise(Channels(plugin->inputs), 48000);
+    std::vector<Parameter> actions;
+    for (const Parameter& p : plugin->parameters)
+        if (p.steps == 1 && !p.automatable && !p.readOnly) actions.push_back(p);
+    if (actions.size() < 2) return;
+    const auto press = [&](Instance& pressed, const Parameter& action, double value) {
+        const Change change{action.id, value, 0};
+        Render(pressed, noise, {.changes = {&change, 1}});
+    };
+    for (const auto& each : {plugin.get(), restored.get()}) each->Activate(48000, 256);
+    const auto empty = plugin->Save();
+    press(*plugin, actions.back(), 1);
+    press(*plugin, actions.front(), 1);
+    press(*plugin, actions.front(), 0);
+    const auto learned = plugin->Save();
+    Expect(learned && empty && learned->size() > 2 * empty->size(), "learns nothing");
+    press(*plugin, actions.front(), 1);
+    Expect(restored->Load({.bytes = plugin->Save().value_or(Bytes{})}), "refuses its own state");
+    restored->Deactivate();
+    restored->Activate(48000, 256);
+    press(*restored, actions.front(), 0);
+    Expect(restored->Save() == learned, "does something again when its state is loaded");
+}
+
 void CheckHarm(PluginFile& file, std::size_t index) {
     const auto fresh = file.Create(index), plugin = file.Create(index);
     const auto state = fresh->Save();
@@ -106,6 +153,8 @@ void CheckBesideAudio(PluginFile& file, std::size_t index) {
 
 void CheckState(PluginFile& file, std::size_t index) {
     for (unsigned seed = 1; seed <= 6; ++seed) CheckRestoring(file, index, seed);
+    CheckMovedValues(file, index);
+    CheckActions(file, index);
     CheckHarm(file, index);
     CheckBesideAudio(file, index);
 }

@@ -81,6 +81,40 @@ void CheckLatency(PluginFile& file, std::size_t index) {
         }
 }
 
+// A setting may move the latency, which the host is told once.
+void CheckNewLatency(PluginFile& file, std::size_t index) {
+    const auto plugin = file.Create(index);
+    const Signal input = Noise(Channels(plugin->inputs), 4800);
+    plugin->Activate(48000, 256);
+    plugin->TakeLatencyNews();
+    for (const Parameter& p : plugin->parameters)
+        for (const double part : {0.0, 1.0}) {
+            if (p.steps == 0 || p.readOnly || p.bypass || !p.automatable) continue;
+            const std::uint32_t before = plugin->Latency();
+            const Change change{p.id, p.At(part), 0};
+            Render(*plugin, input, {.changes = {&change, 1}});
+            const int told = plugin->TakeLatencyNews(), expected = plugin->Latency() != before ? 1 : 0;
+            Expect(told == expected, "tells " + std::to_string(told) + " times and not " +
+                                         std::to_string(expected) + " that " + p.name + " moved the latency");
+        }
+    plugin->Deactivate();
+}
+
+void CheckTempo(PluginFile& file, std::size_t index) {
+    if (file.Name(index).rfind("Echo", 0) != 0) return;
+    std::mt19937 random(4);
+    double difference = 0;
+    for (int round = 0; round < 20 && difference < 1e-4; ++round) {
+        const auto slow = file.Create(index), fast = file.Create(index);
+        slow->tempo = 60;
+        const auto changes = ForAll(*slow, [&] { return Share(random); });
+        const Signal noise = Noise(Channels(slow->inputs), 96000);
+        difference = LargestDifference(RenderAt(*slow, 48000, noise, {.changes = changes}),
+                                       RenderAt(*fast, 48000, noise, {.changes = changes}));
+    }
+    Expect(difference >= 1e-4, "does not follow the tempo");
+}
+
 double SharpestBend(const std::vector<float>& signal, std::size_t from, std::size_t to) {
     double sharpest = 0;
     for (std::size_t i = from + 2; i < std::min(to, signal.size()); ++i)
@@ -114,6 +148,8 @@ void CheckBypass(PluginFile& file, std::size_t index) {
 
 void CheckTiming(PluginFile& file, std::size_t index) {
     CheckLatency(file, index);
+    CheckNewLatency(file, index);
+    CheckTempo(file, index);
     CheckBypass(file, index);
 }
 

@@ -12,6 +12,7 @@
 #include <cstring>
 #include <set>
 #include <stdexcept>
+#include <utility>
 
 #include "Formats.h"
 #include "Module.h"
@@ -39,11 +40,13 @@ v3_result OnMainThread(const char* call) {
     return V3_OK;
 }
 bool g_choosing = false;  // a program; hosts deadlock on a restart then
+int g_restarts = 0;       // for another latency
 using HandlerTable = Table<v3_component_handler, v3_component_handler_iid>;
 HandlerTable g_handler({[](void*, v3_param_id) { return OnMainThread("begin_edit"); },
                         [](void*, v3_param_id, double) { return OnMainThread("perform_edit"); },
                         [](void*, v3_param_id) { return OnMainThread("end_edit"); },
-                        [](void*, std::int32_t) {
+                        [](void*, std::int32_t flags) {
+                            g_restarts += (flags & V3_RESTART_LATENCY_CHANGED) != 0;
                             Expect(!g_choosing, "calls restart_component while a program is chosen");
                             return OnMainThread("restart_component");
                         }});
@@ -195,7 +198,10 @@ public:
     void Deactivate() override {
         OnAudioThread([&] { m_processor->set_processing(m_processor.Get(), false); });
         m_component->set_active(m_component.Get(), false);
-        // What the processor sent goes to the controller.
+        HandOver();
+    }
+    // What the processor sent goes to the controller.
+    void HandOver() {
         for (std::size_t i = 0; i < m_out.used; ++i)
             for (const Change& change : m_out.queues[i].points)
                 Expect(m_controller->set_parameter_normalised(m_controller.Get(), change.parameter,
@@ -204,6 +210,11 @@ public:
         m_out.Set({});
     }
     std::uint32_t Latency() override { return m_processor->get_latency_samples(m_processor.Get()); }
+
+    int TakeLatencyNews() override {
+        HandOver();
+        return std::exchange(g_restarts, 0);
+    }
 
     // A host sends a change to both halves; the processor gets it without audio.
     void Flush(std::span<const Change> changes) override {
@@ -225,7 +236,7 @@ public:
         v3_process_context context{};
         context.state = V3_PROCESS_CTX_PLAYING | V3_PROCESS_CTX_TEMPO_VALID;
         context.sample_rate = m_rate;
-        context.bpm = 120;
+        context.bpm = tempo;
         v3_process_data data{};
         data.nframes = static_cast<std::int32_t>(block.frames);
         data.num_input_buses = audio ? static_cast<std::int32_t>(inputs.size()) : 0;
@@ -235,11 +246,15 @@ public:
         data.input_params = reinterpret_cast<v3_param_changes**>(&m_in);
         data.output_params = reinterpret_cast<v3_param_changes**>(&m_out);
         data.ctx = &context;
-        return InRealTime([&] { return m_processor->process(m_processor.Get(), &data); }) == V3_OK;
+        v3_result result = V3_FALSE;
+        InRealTime([&] { result = m_processor->process(m_processor.Get(), &data); });
+        return result == V3_OK;
     }
     void Reset() override {
-        m_processor->set_processing(m_processor.Get(), false);
-        m_processor->set_processing(m_processor.Get(), true);
+        InRealTime([&] {
+            m_processor->set_processing(m_processor.Get(), false);
+            m_processor->set_processing(m_processor.Get(), true);
+        });
     }
 
     std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {

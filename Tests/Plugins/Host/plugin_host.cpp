@@ -1,9 +1,9 @@
 // plugin_host [--windows | --presets] FILE...
-// Does to CLAP and VST3 plug-ins what a strict host may do, or on a display to their windows, and prints what
-// it finds; or prints the states of their presets. Exits 0 when it found nothing, 1 otherwise.
+// Does to LV2, CLAP and VST3 plug-ins what a strict host may do, or on a display to their windows, and prints
+// what it finds; or prints the states of their presets. Exits 0 when it found nothing, 1 otherwise.
 #include <cctype>
-#include <chrono>
 #include <cstdio>
+#include <ctime>
 #include <exception>
 #include <map>
 #include <mutex>
@@ -27,21 +27,31 @@ const std::map<std::string, std::vector<Check>> kChecks{
 #endif
     {"--presets", {PrintPresets}}};
 
+struct Format {
+    const char* name;
+    std::unique_ptr<PluginFile> (*open)(const std::filesystem::path&);
+};
+// By the ending.
+const std::map<std::string, Format> kFormats{
+#ifndef _WIN32
+    {".lv2", {"LV2", OpenLv2}},
+#endif
+    {".clap", {"CLAP", OpenClap}},
+    {".vst3", {"VST3", OpenVst3}}};
+
 void CheckFile(const std::filesystem::path& path, const std::vector<Check>& checks) {
     g_subject = path.filename().string();
-    const auto begin = std::chrono::steady_clock::now();
-    const bool clap = path.extension() == ".clap";
-    const auto file = clap ? OpenClap(path) : OpenVst3(path);
+    const auto begin = std::clock();
+    const auto seconds = [&] { return static_cast<double>(std::clock() - begin) / CLOCKS_PER_SEC; };
+    const auto [format, open] = kFormats.at(path.extension().string());
+    const auto file = open(path);
     Expect(file->Count() > 0, "has no plug-in");
-    Expect(std::chrono::steady_clock::now() - begin < std::chrono::seconds(1),
-           "takes more than a second to scan");
+    Expect(seconds() < 1, "takes more than a second to scan");
     for (std::size_t i = 0; i < file->Count(); ++i) {
-        g_subject = path.filename().string() + ", " + file->Name(i) + " (" + (clap ? "CLAP" : "VST3") + ")";
+        g_subject = path.filename().string() + ", " + file->Name(i) + " (" + format + ")";
         const auto before = g_findings.size();
         for (const auto check : checks) check(*file, i);
-        const std::chrono::duration<double> time = std::chrono::steady_clock::now() - begin;
-        std::printf("%s: %zu findings, %.1f s\n", g_subject.c_str(), g_findings.size() - before,
-                    time.count());
+        std::printf("%s: %zu findings, %.1f s\n", g_subject.c_str(), g_findings.size() - before, seconds());
         std::fflush(stdout);
     }
 }
@@ -71,7 +81,7 @@ int main(int count, char** arguments) {
             Finding(error.what());
         }
     if (count <= first)
-        std::fprintf(stderr, "usage: plugin_host [--windows|--presets] FILE.clap|FILE.vst3...\n");
+        std::fprintf(stderr, "usage: plugin_host [--windows|--presets] BUNDLE.lv2|FILE.clap|FILE.vst3...\n");
     std::printf("%d files, %zu findings\n", count - first, g_findings.size());
     return count <= first || !g_findings.empty();
 }

@@ -13,10 +13,13 @@ expected = {}
 for file in pathlib.Path(sys.argv[1]).glob("*-presets.ttl"):
     description = file.with_name(file.name.replace("-presets", "")).read_text()
     names = dict(re.findall(r'\n<(\S+)>\n    a .*lv2:Plugin, .*\n    doap:name "(.+)"', description))
+    controls = r'InputPort, lv2:ControlPort ;\n.*\n *lv2:symbol "(.*)"'
+    symbols = {part.split(">")[0]: re.findall(controls, part)[1:] for part in description.split("\n<")}
     for text in file.read_text().split("\n<")[1:]:
-        values = [float(value) for value in re.findall(r"pset:value (\S+)", text)]
+        uri, told = re.search("appliesTo <(.+)>", text)[1], dict(re.findall(r'symbol "(.+)" ; pset:value (\S+)', text))
+        values = [float(told.get(symbol, 0)) for symbol in symbols[uri]]  # actions are in no preset
         settings = base64.b64decode(re.search(r'state:state .* "(.+)"\^\^', text)[1])
-        preset = names[re.search("appliesTo <(.+)>", text)[1]], re.search('label "(.+)"', text)[1]
+        preset = names[uri], re.search('label "(.+)"', text)[1]
         expected[preset] = b"DSP1\0" + struct.pack(f"<{len(values)}f", *values) + settings
 
 wrong, found = [], collections.Counter()

@@ -93,10 +93,12 @@ bool DenoiserProcessor::LearnedDensity(double rate, float* density, int bins) {
 
 void DenoiserProcessor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const auto cook = TakeCook(m_state->format, *format, force);
-    if (force) m_state->Prepare(RateOf(*format), ChannelsOf(*format));
+    // Prepared for this format already, an engine has the memory, and what was learned.
+    const bool prepares = force && !m_state->IsPreparedFor(RateOf(*format), ChannelsOf(*format));
+    if (prepares) m_state->Prepare(RateOf(*format), ChannelsOf(*format));
     if (!cook.due || !m_state->engine) return;
     InitEnvelopes(true);
-    if (cook.afresh && !force) m_state->engine->SetFormat(RateOf(*format), ChannelsOf(*format));
+    if (cook.afresh && !prepares) m_state->engine->SetFormat(RateOf(*format), ChannelsOf(*format));
     m_state->TakeProfiles();
     m_state->engine->Apply(EngineSettingsOf(Snapshot(m_settings)));
     m_state->HandOverLearned();

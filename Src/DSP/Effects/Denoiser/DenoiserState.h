@@ -53,6 +53,10 @@ struct State {
             m_fromAudio.Take();
         }
         rate.store(static_cast<std::uint32_t>(preparedRate));
+        m_channels = channels;
+    }
+    bool IsPreparedFor(double wantedRate, std::size_t wantedChannels) const {
+        return engine && rate == static_cast<std::uint32_t>(wantedRate) && m_channels == wantedChannels;
     }
     void Free() {
         EndPassage();
@@ -89,6 +93,7 @@ private:
     }
 
     LatestValue<NoiseProfile> m_toAudio, m_fromAudio;
+    std::size_t m_channels = 0;      // that the engine is prepared for
     NoiseProfile m_known;            // user-interface thread
     std::uint32_t m_generation = 0;  // user-interface thread
     std::uint32_t m_taken = 0;       // audio thread

@@ -97,6 +97,7 @@ void Phaser::Cleanup() {
 }
 
 void Phaser::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
+    if (force) Cleanup();
     if (TakeCook(m_format, *format, force).due) InitState(Snapshot(m_settings));
 }
 
