@@ -225,7 +225,9 @@ void Adapter::ReadBackOthers() {
         Control& control = m_controls[i];
         if (control.stepsLeft > 0 || control.edited) continue;
         const float position = m_effect->GetParam(Ports()[i].parameter);
-        control.touched = false;
+        control.touched = position >= 1.0f;
+        // Moved, a value may lie beyond the end of its control: no state with it would be taken again.
+        if (control.touched) Apply(i, 1.0f);
         const Port& port = Ports()[i];
         const float value = port.Value(position), before = control.wanted;
         const double step =

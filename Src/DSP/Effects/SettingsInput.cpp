@@ -8,7 +8,9 @@ namespace {
 
 std::unique_ptr<CorvoEffectBase> MakeAt(const EffectKind& kind, float normalised) {
     auto effect = kind.make();
-    for (int i = 0; i < effect->GetParamCount(); ++i) effect->SetParam(i, normalised, false);
+    // Again: a list may have moved what was set before it.
+    for (int pass = 0; pass < 2; ++pass)
+        for (int i = 0; i < effect->GetParamCount(); ++i) effect->SetParam(i, normalised, false);
     return effect;
 }
 
