@@ -104,16 +104,15 @@ void Adapter::Prepare(double rate, int frames) {
     Start();
 }
 
-// Prepared for what it is prepared for already, an effect keeps its memory; one that may allocate anyway
-// begins anew.
+// Prepared for what it is prepared for already, an effect keeps its memory; Cleanup would free it.
 void Adapter::Reset() {
     if (m_longest == 0) return;
     if (const Gate gate(m_busy, Gate::If::Free); gate) TakeEdits(false);
     for (auto& ring : m_dry) std::ranges::fill(ring, 0.0f);
-    if (Row().realTime)
-        m_effect->InitResetProcessingLight(true);
-    else
+    if (Row().Is(kMayWait) || Row().Is(kOnlyClears))
         m_effect->Cleanup();
+    else
+        m_effect->InitResetProcessingLight(true);
     Start();
 }
 
@@ -286,7 +285,7 @@ void Adapter::Run(const float* const* in, float* const* out, const float* const*
         for (int at = 0; at < piece;) {
             const bool gliding = gate && m_gliding > 0;
             if (gliding) StepGlides();
-            const int count = gliding || Row().shortPieces ? std::min(piece - at, kStep) : piece - at;
+            const int count = gliding || Row().Is(kShortPieces) ? std::min(piece - at, kStep) : piece - at;
             ProcessEffect(at, count);
             at += count;
         }

@@ -214,7 +214,7 @@ private:
         block.audio_outputs[0].constant_mask = 0;
         SendOutputs(block.out_events);
         // What rings, or shows what it hears, goes on in silence.
-        return m_core->Row().rings || m_core->HasWindow() ? CLAP_PROCESS_CONTINUE : CLAP_PROCESS_TAIL;
+        return m_core->Row().Is(kRings) || m_core->HasWindow() ? CLAP_PROCESS_CONTINUE : CLAP_PROCESS_TAIL;
     }
     void SendOutputs(const clap_output_events_t* events) {
         for (std::size_t i = 0; events && i < m_sent.size(); ++i) {
@@ -341,7 +341,7 @@ private:
     }
     static constexpr clap_plugin_latency_t kLatency{LatencyNow};
     static std::uint32_t TailNow(const clap_plugin_t* plugin) {
-        return Of(plugin).m_core->Row().rings ? kEndlessTail : LatencyNow(plugin);
+        return Of(plugin).m_core->Row().Is(kRings) ? kEndlessTail : LatencyNow(plugin);
     }
     static constexpr ClapTail kTail{TailNow};
 

@@ -54,7 +54,7 @@ public:
     Lv2Plugin(const PluginRow& row, int channels, double rate, const LV2_Feature* const* features)
         : Lv2Instance(MakeCore(row, channels, Values::OfHost)),
           m_ids(static_cast<const LV2_URID_Map*>(Lv2Feature(features, LV2_URID__map))),
-          m_order{channels, core->SideChannels(), row.tempo},
+          m_order{channels, core->SideChannels(), row.Is(kTempo)},
           m_rate(rate),
           m_ports(static_cast<std::size_t>(m_order.FirstControl()) + core->Ports().size()),
           m_seen(core->Ports().size()) {

@@ -94,7 +94,7 @@ public:
     PluginTurtle(const PluginRow& row, int channels)
         : m_row(row),
           m_core(MakeCore(row, channels)),
-          m_order{channels, m_core->SideChannels(), row.tempo},
+          m_order{channels, m_core->SideChannels(), row.Is(kTempo)},
           m_uri(PluginUri(row, channels)) {}
 
     void WriteManifest(File& file, const std::string& binary) {
@@ -122,7 +122,7 @@ public:
              << "    lv2:optionalFeature <http://lv2plug.in/ns/ext/urid#map>, "
                 "<http://lv2plug.in/ns/ext/options#options>, "
                 "<http://lv2plug.in/ns/ext/buf-size#boundedBlockLength>"
-             << (m_row.realTime ? ", lv2:hardRTCapable" : "") << " ;\n"
+             << (m_row.Is(kMayWait) ? "" : ", lv2:hardRTCapable") << " ;\n"
              << (m_core->HasWindow() ? std::string("    ui:ui <") + kLv2WindowUri + "> ;\n" : "")
              << "    <http://lv2plug.in/ns/ext/options#supportedOption> "
                 "<http://lv2plug.in/ns/ext/buf-size#maxBlockLength> ;\n    lv2:port";

@@ -10,19 +10,19 @@ namespace {
 
 // clang-format off
 constexpr PluginRow kRows[]{
-    // name         id            code    version  LV2                       CLAP                VST3          real time, short pieces, tempo, rings, smooth
-    {"Gain",        "gain",        "DGai", 2, "AmplifierPlugin",  "utility",          "Tools",        true,  false, false, false, false, "Level, stereo width, pan and polarity"},
-    {"Compressor",  "compressor",  "DCmp", 2, "CompressorPlugin", "compressor",       "Dynamics",     true,  false, false, false, true,  "Compressor, limiter, gate and expander on a transfer curve, with side-chain"},
-    {"Tremolo",     "tremolo",     "DTrm", 2, "ModulatorPlugin",  "tremolo",          "Modulation",   true,  false, false, false, false, "Tremolo, auto-pan and ring modulation"},
-    {"Equaliser",   "equaliser",   "DEqu", 2, "ParaEQPlugin",     "equalizer",        "EQ",           true,  false, false, true,  true,  "Eight gliding bands: peaks of Q/133 octaves, shelves and passes"},
-    {"Valvex",      "valvex",      "DVal", 2, "DistortionPlugin", "distortion",       "Distortion",   true,  false, false, false, false, "Tube distortion of four shapes, oversampled up to 16 times"},
-    {"Echo",        "echo",        "DEch", 2, "DelayPlugin",      "delay",            "Delay",        true,  false, true,  true,  false, "Stereo delay in milliseconds or notes of the host's tempo"},
-    {"Chorus",      "chorus",      "DCho", 2, "ChorusPlugin",     "chorus",           "Modulation",   true,  false, false, true,  false, "Chorus and flanger"},
-    {"Phaser",      "phaser",      "DPha", 2, "PhaserPlugin",     "phaser",           "Modulation",   true,  false, false, true,  false, "1 to 30 all-pass stages with feedback"},
-    {"Reverb",      "reverb",      "DRev", 2, "ReverbPlugin",     "reverb",           "Reverb",       true,  false, false, true,  false, "Early reflections and damped combs"},
-    {"Cantrix",     "cantrix",     "DCan", 4, "PitchPlugin",      "pitch-correction", "Pitch Shift",  true,  false, false, false, true,  "Pitch correction of a voice to a scale; formants stay", &kPitchResults},
-    {"Pitch Shift", "pitch-shift", "DPit", 2, "PitchPlugin",      "pitch-shifter",    "Pitch Shift",  false, true,  false, false, true,  "Transposes by up to an octave up"},
-    {"Denoiser",    "denoiser",    "DDen", 2, "SpectralPlugin",   "restoration",      "Restoration",  true,  false, false, false, true,  "Takes steady noise out of recordings, learned or found while it plays"},
+    // name         id            code    version  LV2                       CLAP                VST3          traits
+    {"Gain",        "gain",        "DGai", 2, "AmplifierPlugin",  "utility",          "Tools",        0,                                  "Level, stereo width, pan and polarity"},
+    {"Compressor",  "compressor",  "DCmp", 2, "CompressorPlugin", "compressor",       "Dynamics",     kSmooth,                            "Compressor, limiter, gate and expander on a transfer curve, with side-chain"},
+    {"Tremolo",     "tremolo",     "DTrm", 2, "ModulatorPlugin",  "tremolo",          "Modulation",   0,                                  "Tremolo, auto-pan and ring modulation"},
+    {"Equaliser",   "equaliser",   "DEqu", 2, "ParaEQPlugin",     "equalizer",        "EQ",           kRings | kSmooth,                   "Eight gliding bands: peaks of Q/133 octaves, shelves and passes"},
+    {"Valvex",      "valvex",      "DVal", 2, "DistortionPlugin", "distortion",       "Distortion",   0,                                  "Tube distortion of four shapes, oversampled up to 16 times"},
+    {"Echo",        "echo",        "DEch", 2, "DelayPlugin",      "delay",            "Delay",        kTempo | kRings,                    "Stereo delay in milliseconds or notes of the host's tempo"},
+    {"Chorus",      "chorus",      "DCho", 2, "ChorusPlugin",     "chorus",           "Modulation",   kRings,                             "Chorus and flanger"},
+    {"Phaser",      "phaser",      "DPha", 2, "PhaserPlugin",     "phaser",           "Modulation",   kRings | kOnlyClears,               "1 to 30 all-pass stages with feedback"},
+    {"Reverb",      "reverb",      "DRev", 2, "ReverbPlugin",     "reverb",           "Reverb",       kRings,                             "Early reflections and damped combs"},
+    {"Cantrix",     "cantrix",     "DCan", 4, "PitchPlugin",      "pitch-correction", "Pitch Shift",  kSmooth,                            "Pitch correction of a voice to a scale; formants stay", &kPitchResults},
+    {"Pitch Shift", "pitch-shift", "DPit", 2, "PitchPlugin",      "pitch-shifter",    "Pitch Shift",  kMayWait | kShortPieces | kSmooth,  "Transposes by up to an octave up"},
+    {"Denoiser",    "denoiser",    "DDen", 2, "SpectralPlugin",   "restoration",      "Restoration",  kSmooth,                            "Takes steady noise out of recordings, learned or found while it plays"},
 };
 // clang-format on
 

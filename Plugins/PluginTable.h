@@ -10,6 +10,15 @@
 
 namespace Corvo::Plugins {
 
+enum Trait : unsigned {
+    kMayWait = 1,      // its engine may allocate or wait while it processes
+    kShortPieces = 2,  // its lag grows with the length of what it gets at a time
+    kTempo = 4,        // follows the host's tempo
+    kRings = 8,        // sounds on when its input has ended
+    kSmooth = 16,      // the effect itself moves smoothly to what it is set to, or is too slow to
+    kOnlyClears = 32,  // its Cleanup frees nothing, and nothing else clears it
+};
+
 // What distinguishes one plug-in from another. Everything else comes from its effect.
 struct PluginRow {
     const char* name;          // what GetName() of an effect says
@@ -19,13 +28,11 @@ struct PluginRow {
     const char* lv2Class;      // of the LV2 specification
     const char* clapFeature;   // of CLAP's list
     const char* vst3Category;  // after "Fx|"
-    bool realTime;             // false: its engine may allocate or wait while it processes
-    bool shortPieces;          // its lag grows with the length of what it gets at a time
-    bool tempo;                // follows the host's tempo
-    bool rings;                // sounds on when its input has ended
-    bool smooth;               // the effect itself moves smoothly to what it is set to, or is too slow to
+    unsigned traits;           // what is so of it
     const char* about;
     const ResultKind* results = nullptr;  // null: it tells hosts nothing
+
+    bool Is(Trait trait) const { return (traits & trait) != 0; }
 
     std::unique_ptr<DSP::CorvoEffectBase> Make() const;  // of an effect; throws std::bad_alloc
 };

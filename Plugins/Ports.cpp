@@ -79,7 +79,7 @@ struct LayoutMaker {
         port.whole = read.isNumber && !read.keepsFractions && read.decimals == 0 &&
                      port.most - port.least <= kMostSteps;
         // What shows no number may choose among notes: a glide would play those in between.
-        port.glides = read.isNumber && !port.whole && !row.smooth;
+        port.glides = read.isNumber && !port.whole && !row.Is(kSmooth);
         const float middle = port.curve.Number(0.5f), product = port.least * port.most;
         port.logarithmic = port.least > 0.0f && std::abs(middle - std::sqrt(product)) <
                                                     std::abs(middle - 0.5f * (port.least + port.most));

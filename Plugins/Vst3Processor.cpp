@@ -45,11 +45,11 @@ std::uint32_t Vst3Plugin::Latency() {
 }
 
 std::uint32_t Vst3Plugin::Tail() {
-    return m_core->Row().rings ? kEndlessTail : static_cast<std::uint32_t>(m_core->Latency());
+    return m_core->Row().Is(kRings) ? kEndlessTail : static_cast<std::uint32_t>(m_core->Latency());
 }
 
 std::uint32_t Vst3Plugin::Requirements() {
-    return m_core->Row().tempo ? V3_PROCESS_CTX_NEED_TEMPO | V3_PROCESS_CTX_NEED_TIME_SIG : 0;
+    return m_core->Row().Is(kTempo) ? V3_PROCESS_CTX_NEED_TEMPO | V3_PROCESS_CTX_NEED_TIME_SIG : 0;
 }
 
 v3_result Vst3Plugin::Process(v3_process_data* block) {

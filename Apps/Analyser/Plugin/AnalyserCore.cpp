@@ -39,19 +39,10 @@ const Layout& PortsOf() {
     return layout;
 }
 
-constexpr PluginRow kRow{"Analyser",
-                         "analyser",
-                         "DAna",
-                         2,
-                         "AnalyserPlugin",
-                         "analyzer",
-                         "Analyzer",
-                         true,
-                         false,
-                         false,
-                         false,
-                         true,
-                         "Spectrum, sonogram and tuner. The sound passes through untouched."};
+constexpr PluginRow kRow{
+    "Analyser", "analyser",       "DAna",
+    2,          "AnalyserPlugin", "analyzer",
+    "Analyzer", kSmooth,          "Spectrum, sonogram and tuner. The sound passes through untouched."};
 
 }  // namespace
 

@@ -97,7 +97,6 @@ void Phaser::Cleanup() {
 }
 
 void Phaser::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
-    if (force) Cleanup();
     if (TakeCook(m_format, *format, force).due) InitState(Snapshot(m_settings));
 }
 
