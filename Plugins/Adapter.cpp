@@ -85,12 +85,12 @@ void Adapter::Prepare(double rate, int frames) {
     const Gate gate(m_busy, Gate::If::Waiting);
     m_longest = 0;
     TakeEdits(false);
-    m_longest = std::clamp(frames, kStep, kLongestPiece);
+    const int longest = std::clamp(frames, kStep, kLongestPiece);
     m_format = {};
     m_format.nChannels = static_cast<std::uint16_t>(Channels());
     m_format.nSamplesPerSec = static_cast<std::uint32_t>(std::lround(std::clamp(rate, 1000.0, 768000.0)));
     m_format.wBitsPerSample = 32;
-    const auto piece = static_cast<std::size_t>(m_longest);
+    const auto piece = static_cast<std::size_t>(longest);
     const auto ring = std::bit_ceil(piece + static_cast<std::size_t>(kLongestLag * rate));
     for (std::size_t c = 0; c < static_cast<std::size_t>(Channels()); ++c) {
         m_wet[c].assign(piece, 0.0f);
@@ -100,6 +100,7 @@ void Adapter::Prepare(double rate, int frames) {
     m_interleaved.assign(m_planar || Channels() == 1 ? 0 : 2 * piece, 0.0f);
     m_glideSteps = std::max(1, static_cast<int>(kGlide * rate / kStep));
     m_mixStep = static_cast<float>(1.0 / (kBypass * rate));
+    m_longest = longest;  // now that there is memory for it
     m_effect->Cleanup();
     Start();
 }
@@ -107,7 +108,8 @@ void Adapter::Prepare(double rate, int frames) {
 // Prepared for what it is prepared for already, an effect keeps its memory; Cleanup would free it.
 void Adapter::Reset() {
     if (m_longest == 0) return;
-    if (const Gate gate(m_busy, Gate::If::Free); gate) TakeEdits(false);
+    const Gate gate(m_busy, Gate::If::Free);
+    if (gate) TakeEdits(false);
     for (auto& ring : m_dry) std::ranges::fill(ring, 0.0f);
     if (Row().Is(kMayWait) || Row().Is(kOnlyClears))
         m_effect->Cleanup();
@@ -140,8 +142,7 @@ void Adapter::TellResults() {
 
 void Adapter::UpdateLatency() {
     const auto most = static_cast<int>(m_dry[0].size()) - m_longest;
-    const int latency = std::clamp(m_effect->GetLatency(), 0, std::max(most, 0));
-    if (latency != m_latency) m_latency = latency;
+    m_latency = std::clamp(m_effect->GetLatency(), 0, std::max(most, 0));
 }
 
 // The values that the effect has, after it changed as a whole.
@@ -223,11 +224,12 @@ void Adapter::ReadBackOthers() {
     for (std::size_t i = 0; i < m_controls.size(); ++i) {
         Control& control = m_controls[i];
         if (control.stepsLeft > 0 || control.edited) continue;
-        const float position = m_effect->GetParam(Ports()[i].parameter);
-        control.touched = position >= 1.0f;
-        // Moved, a value may lie beyond the end of its control: no state with it would be taken again.
-        if (control.touched) Apply(i, 1.0f);
         const Port& port = Ports()[i];
+        const float position = m_effect->GetParam(port.parameter);
+        const bool moved = port.type == EffectParameterType::Continuous && position != control.position;
+        control.touched = moved && position >= 1.0f;
+        // It may lie beyond the end of its control: no state with it would be taken again.
+        if (control.touched) Apply(i, 1.0f);
         const float value = port.Value(position), before = control.wanted;
         const double step =
             std::max(1.01 * port.resolution, 5e-4 * static_cast<double>(port.most - port.least));

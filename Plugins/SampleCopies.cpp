@@ -89,8 +89,10 @@ DSP_WIDE void WideSeparate(const float* both, float* left, float* right, std::si
     SeparateLoop(both, left, right, frames);
 }
 #undef DSP_WIDE
-const Kernels kKernels =
-    __builtin_cpu_supports("avx2") ? Kernels{WideCopy, WideClean, WideInterleave, WideSeparate} : Kernels{};
+// Wide registers slow down all SSE code of a 32-bit program.
+const Kernels kKernels = sizeof(void*) == 8 && __builtin_cpu_supports("avx2")
+                             ? Kernels{WideCopy, WideClean, WideInterleave, WideSeparate}
+                             : Kernels{};
 
 }  // namespace
 

@@ -32,17 +32,24 @@ std::string Minutes(double seconds) {
     return text;
 }
 
-// The beginning of a text that fits, up to a blank if there is one. Longer pieces would be cut off.
+bool ContinuesCharacter(std::string_view text, std::size_t at) {
+    return at < text.size() && (text[at] & 0xC0) == 0x80;
+}
+
+// The beginning of a text that fits, up to a blank if there is one; one character at least. Longer pieces
+// would be cut off.
 std::string_view FittingPiece(DrawTarget& target, std::string_view text, float size, float room) {
     constexpr std::size_t kMost = 80;
     std::size_t end = std::min(text.size(), kMost + 1);
     const auto shorten = [&] {
         const auto blank = text.rfind(' ', end - 1);
         const bool found = blank != text.npos && blank > 0;
-        for (end = found ? blank : end - 1; (text[end] & 0xC0) == 0x80; --end) {
-        }  // not within a character
+        end = found ? blank : end - 1;
+        while (end > 0 && ContinuesCharacter(text, end)) --end;
     };
     while (end > 1 && (end > kMost || target.MeasureText(text.substr(0, end), size).width > room)) shorten();
+    end = std::max<std::size_t>(end, 1);
+    while (ContinuesCharacter(text, end)) ++end;
     return text.substr(0, end);
 }
 

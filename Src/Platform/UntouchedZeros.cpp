@@ -12,8 +12,8 @@
 namespace Corvo {
 namespace {
 
-// What is larger comes from the system and goes back to it: what the heap has had before, it would have to
-// clear.
+// Larger pieces come straight from the system, which hands out zeroed pages; memory that the heap uses again
+// would have to be cleared.
 constexpr std::size_t kLarge = 64 * 1024;
 
 #if defined(_WIN32)

@@ -33,7 +33,7 @@ struct RectF;
 // menu's: do not read the buffers while a command runs.
 //
 // Cost: Feed copies one value per frame. A refresh transforms and smooths when new samples came, in time
-// proportional to n log n of the transform's length n; it allocates after a change of the settings.
+// proportional to n log n of the transform's length n; now and then it allocates.
 class DSP_API kivspectrum : public Corvo::SpectrumDisplay {
 public:
     using spectrum_settings = Corvo::SpectrumSettings;            // what a host stores

@@ -267,7 +267,7 @@ void Program::LookAfterInput() {
             "There is no sound system here; an audio file can be dropped on the window.");
     m_failures = m_input->Retry() || !m_input->IsThere() ? 0 : m_failures + 1;
     m_view->SetTrouble(m_input->Trouble());
-    if (m_failures >= kFailures) RestartAudio();
+    if (m_failures >= kFailures && !IsToneOn()) RestartAudio();  // which would end the tone
 }
 
 // The same system as before: another would not have the input that was chosen.

@@ -31,7 +31,7 @@ int RealLength(const SetUp& setUp) {
     return std::max(static_cast<int>(2 * setUp.plan->points), 1);
 }
 
-// What no transform of this length writes is zero.
+// Transforms write the first power of two of it; the rest is set to 0.
 template <typename T>
 T* AllocateScratch(int length) {
     auto* const values = static_cast<T*>(AlignedAllocate(static_cast<std::size_t>(length) * sizeof(T)));

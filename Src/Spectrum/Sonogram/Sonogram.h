@@ -28,7 +28,7 @@ struct SonogramPalette;
 //
 // Threads: speed and colour scheme are shared by all sonograms and may be read and set from any thread.
 // Everything else belongs to the display thread of its analyser and takes no lock. A step works on every row
-// of its new columns and moves the picture; memory is made when size or scales change.
+// of its new columns and moves the picture; once in a while it allocates.
 class DSP_API Sonogram {
 public:
     // 0..8: 5, 10, 15, 30, 60, 90, 150, 300 or 450 columns a second; an index outside is moved to the nearer

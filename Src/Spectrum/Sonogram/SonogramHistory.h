@@ -53,7 +53,7 @@ public:
     // How many levels are kept at least, once they came.
     void Keep(std::size_t levels) { m_kept = levels > kLeastLevels ? levels : kLeastLevels; }
     // The levels of a new column, to be filled by the caller. Allocates once for many of them; without memory
-    // it throws std::bad_alloc and nothing has changed.
+    // it throws std::bad_alloc; only the oldest columns may be gone.
     std::uint8_t* Add(const SonogramScale& scale, float pitch);
     // Time goes on from where it was.
     void Clear();
