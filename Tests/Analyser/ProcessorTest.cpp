@@ -18,14 +18,14 @@ using Hold = Processor::Hold;
 class ProcessorTest : public ViewTest {
 protected:
     static constexpr double kRate = 48000.0;
-    void Process(const std::vector<float>& left, const std::vector<float>& right, std::vector<float>& outLeft,
-                 std::vector<float>& outRight) {
+    void Process(const std::vector<float>& left, const std::vector<float>& right) {
         const float* const inputs[2] = {left.data(), right.data()};
-        float* const outputs[2] = {outLeft.data(), outRight.data()};
+        float* const outputs[2] = {m_left.data(), m_right.data()};
         m_processor.Process(inputs, outputs, 2, static_cast<int>(left.size()), m_bypassed);
     }
     Processor m_processor;
     bool m_bypassed = false;
+    std::vector<float> m_left = std::vector<float>(1600), m_right = m_left;
 };
 
 // Catches a bit that changes on the way, and a tone that sounds by itself or stays when the window has gone.
@@ -33,11 +33,10 @@ TEST_F(ProcessorTest, PassesTheSoundThroughUnlessToneIsAskedFor) {
     auto left = TestSupport::Noise<float>(1000), right = TestSupport::Noise<float>(1000);
     right[9] = -0.0f;
     const int windows[2] = {};
-    std::vector<float> outLeft(1000), outRight(1000);
     const auto same = [&] {
-        Process(left, right, outLeft, outRight);
-        return std::memcmp(left.data(), outLeft.data(), 4000) == 0 &&
-               std::memcmp(right.data(), outRight.data(), 4000) == 0;
+        Process(left, right);
+        return std::memcmp(left.data(), m_left.data(), 4000) == 0 &&
+               std::memcmp(right.data(), m_right.data(), 4000) == 0;
     };
     std::string copied;
     for (const int* window = windows; window != windows + 2; ++window)
@@ -63,10 +62,9 @@ TEST_F(ProcessorTest, PassesTheSoundThroughUnlessToneIsAskedFor) {
 TEST_F(ProcessorTest, PublishesTheNoteWithoutAWindow) {
     m_processor.SetRate(kRate);
     const auto sine = TestSupport::Sine<float>(1600, 330.0, static_cast<int>(kRate), 0.25);
-    std::vector<float> outLeft(1600), outRight(1600);
     const Tuner& tuner = m_processor.GetTuner();
     for (int i = 0; i < 150 && !tuner.IsTuned(); ++i) {
-        Process(sine, sine, outLeft, outRight);
+        Process(sine, sine);
         std::this_thread::sleep_for(std::chrono::milliseconds(20));
     }
     EXPECT_EQ(tuner.GetTunedNote(), (TunedNote{7, 4}));  // E4
@@ -78,7 +76,6 @@ TEST_F(ProcessorTest, PublishesTheNoteWithoutAWindow) {
 // sanitizers and by the test never ending.
 TEST_F(ProcessorTest, FeedsDrawsAndChoosesAtOnce) {
     const auto noise = TestSupport::Noise<float>(512);
-    std::vector<float> outLeft(512), outRight(512);
     AnalyserTest::Canvas canvas;
     int drawn = 0;
     const auto choose = [&](int round) {
@@ -90,17 +87,15 @@ TEST_F(ProcessorTest, FeedsDrawsAndChoosesAtOnce) {
         Hold(m_processor)->Wheel(static_cast<float>(round % 960), 300.0f, 1.0f, round % 7 == 0);
         Hold(m_processor)->PointTo(static_cast<float>(round % 960), 400.0f);
     };
-    TestSupport::WhileAnotherThread([&](int) { Process(noise, noise, outLeft, outRight); },
-                                    [&] {
-                                        TestSupport::WhileAnotherThread(choose, [&] {
-                                            const auto end = std::chrono::steady_clock::now() +
-                                                             std::chrono::milliseconds(500);
-                                            for (; std::chrono::steady_clock::now() < end; ++drawn) {
-                                                Hold hold(m_processor);
-                                                canvas.Draw(*hold.operator->());
-                                            }
-                                        });
-                                    });
+    const auto feed = [&](int) { Process(noise, noise); };
+    const auto draw = [&] {
+        const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(500);
+        for (; std::chrono::steady_clock::now() < end; ++drawn) {
+            Hold hold(m_processor);
+            canvas.Draw(*hold.operator->());
+        }
+    };
+    TestSupport::WhileAnotherThread(feed, [&] { TestSupport::WhileAnotherThread(choose, draw); });
     EXPECT_GT(drawn, 0);
 }
 

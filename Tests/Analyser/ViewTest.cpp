@@ -20,18 +20,27 @@ using Plot = Corvo::AnalyserReading::Plot;
 
 class LiveView : public ViewTest {
 protected:
+    static constexpr int kRate = 48000, kRefresh = kRate / 30;
+
     void SetUp() override { Draw(); }
     void Draw() { m_canvas.Draw(m_view); }
     void Hear(double hz, double amplitude, double seconds = 0.5) {
-        constexpr int kRate = 48000, kRefresh = kRate / 30;
-        m_view.SetSamplingRate(kRate);
         const auto sine =
             TestSupport::Sine<float>(static_cast<std::size_t>(seconds * kRate), hz, kRate, amplitude);
-        for (std::size_t i = 0; i + kRefresh <= sine.size(); i += kRefresh) {
-            m_view.Feed(sine.data() + i, kRefresh, 1);
+        Hear(sine, 1);
+    }
+    void Hear(const std::vector<float>& sound, int channels) {
+        m_view.SetSamplingRate(kRate);
+        const auto step = static_cast<std::size_t>(kRefresh * channels);
+        for (std::size_t i = 0; i + step <= sound.size(); i += step) {
+            m_view.Feed(sound.data() + i, kRefresh, channels);
             m_view.Refresh();
         }
         Draw();
+    }
+    void Click(float x, float y, int times = 1) {
+        m_view.Press({Button::Left, x, y, times});
+        m_view.Release(x, y);
     }
     void Press(char32_t key, bool control = false) {
         m_view.KeyDown({key, control});
@@ -161,11 +170,9 @@ TEST_F(LiveView, WheelAndDragMoveTheFrequencies) {
         Draw();
         EXPECT_NEAR(FrequencyAt(to), 1000.0, 25.0);
         EXPECT_EQ(m_view.GetAnalyser().GetMarker().plot, Plot::None) << "a drag is no click";
-        m_view.Press({Button::Left, to.x, to.y});
-        m_view.Release(to.x, to.y);
+        Click(to.x, to.y);
         EXPECT_NEAR(m_view.GetAnalyser().GetMarker().frequency, 1000.0, 25.0);
-        m_view.Press({Button::Left, to.x, to.y, 2});
-        m_view.Release(to.x, to.y);
+        Click(to.x, to.y, 2);
         Draw();
         EXPECT_EQ(m_view.GetAnalyser().GetFrequencySpan(), Corvo::FrequencySpan{});
         EXPECT_EQ(m_view.GetAnalyser().GetMarker().plot, Plot::None);
@@ -252,8 +259,7 @@ TEST_F(LiveView, TheTimelineSeeks) {
     Draw();
     double before = -1.0;
     for (float x = 200.0f; x <= 700.0f; x += 100.0f) {
-        m_view.Press({Button::Left, x, 590.0f});
-        m_view.Release(x, 590.0f);
+        Click(x, 590.0f);
         EXPECT_GT(m_shell.playback->position, before);
         before = m_shell.playback->position;
     }
@@ -271,15 +277,10 @@ TEST_F(LiveView, ShowsTheChannelsApart) {
     for (const int command : {kFirstSpeed + 1, 1266, 1348}) EXPECT_TRUE(other.IsChosen(command)) << command;
     other.Do(1282);
     m_view.Refresh();
-    m_view.SetSamplingRate(48000);
-    const auto left = TestSupport::Sine<float>(48000, 1000.0, 48000, 0.5);
+    const auto left = TestSupport::Sine<float>(kRate, 1000.0, kRate, 0.5);
     std::vector<float> stereo(2 * left.size());
     for (std::size_t i = 0; i < left.size(); ++i) stereo[2 * i] = left[i];
-    for (std::size_t i = 0; i + 1600 <= left.size(); i += 1600) {
-        m_view.Feed(stereo.data() + 2 * i, 1600, 2);
-        m_view.Refresh();
-    }
-    Draw();
+    Hear(stereo, 2);
     const auto peak = m_view.GetAnalyser().GetSpectrumDrawer()->HighestPeak(20.0);
     EXPECT_NEAR(peak.level, -6.0, 0.5) << "the mean of both would have -12 dB";
 }

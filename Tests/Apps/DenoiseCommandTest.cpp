@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 
 #include "Apps/Program.h"
@@ -49,12 +50,11 @@ TEST_F(DenoiseCommand, LearnsAndCleansInOneCommand) {
     EXPECT_NEAR(Power(in, 0.5, 1.7) - Power(Load("adaptive.wav"), 0.5, 1.7), 25.0, 3.0);
 
     // The profile's line runs along the noise: white, so level.
-    const auto table = Succeed("spectrum in.wav --csv - --profile hiss --length 1024 -q");
-    ASSERT_TRUE(table.starts_with("frequency_hz,level_db,profile_db\n"));
-    const auto row = table.find("\n12000.0000,");
-    ASSERT_NE(row, table.npos);
-    const auto level = table.find(',', row) + 1, profile = table.find(',', level) + 1;
-    EXPECT_NEAR(std::stod(table.substr(level)), std::stod(table.substr(profile)), 1.5);
+    const auto table = Rows(Succeed("spectrum in.wav --csv - --profile hiss --length 1024 -q"),
+                            "frequency_hz,level_db,profile_db");
+    const auto row = std::ranges::find(table, "12000.0000", [](const auto& cells) { return cells[0]; });
+    ASSERT_NE(row, table.end());
+    EXPECT_NEAR(std::stod((*row)[1]), std::stod((*row)[2]), 1.5);
 }
 
 }  // namespace

@@ -66,6 +66,20 @@ void SaveBytes(const std::string& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary) << bytes;
 }
 
+std::vector<std::vector<std::string>> Rows(const std::string& csv, const std::string& heading) {
+    std::istringstream lines(csv);
+    std::string line;
+    std::getline(lines, line);
+    EXPECT_EQ(line, heading);
+    std::vector<std::vector<std::string>> rows;
+    while (std::getline(lines, line)) {
+        std::istringstream cells(line);
+        rows.emplace_back();
+        while (std::getline(cells, line, ',')) rows.back().push_back(line);
+    }
+    return rows;
+}
+
 namespace {
 
 std::vector<std::string> Files() {

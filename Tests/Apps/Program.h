@@ -30,6 +30,8 @@ Sound NoiseSound(std::size_t frames, int channels = 2, int format = kPcm16);
 
 std::string Bytes(const std::string& path);
 void SaveBytes(const std::string& path, const std::string& bytes);
+// The cells of a table below its heading, which must be this one.
+std::vector<std::vector<std::string>> Rows(const std::string& csv, const std::string& heading);
 
 // Runs dsphost as a person would, every test in an empty directory of its own.
 class Program : public testing::Test {

@@ -119,15 +119,13 @@ TEST_F(Rendering, PlaysEveryPointOnce) {
     for (int i = 0; i < 20000; ++i) points.push_back({12 * i, static_cast<float>(i % 7) / 7.0f});
     const dsphost::EffectKind kind{
         "Tremolo", []() -> std::unique_ptr<dsphost::Effect> { return std::make_unique<CountingTremolo>(); }};
-    std::vector<std::unique_ptr<dsphost::ChainElement>> tremolo;
-    tremolo.push_back(std::make_unique<dsphost::EffectElement>(kind, ""));
-    dsphost::Chain chain(std::move(tremolo));
-    chain.Automate(0, chain.Element(0).AutomationLanes("Depth L")[0], points);
-    chain.Prepare(12, dsphost::ChainFormat(1, Model::kRate, 64), false);
+    dsphost::EffectElement tremolo(kind, "");
+    tremolo.Automate(tremolo.AutomationLanes("Depth L")[0], points);
+    tremolo.Prepare(12, dsphost::ChainFormat(1, Model::kRate, 64), false);
     std::vector<double> block(12, 0.5);
     for (int i = 0; i < 20000; ++i) {
         g_sets = 0;
-        chain.Process(block.data(), 12, 12 * i);
+        tremolo.Process(block.data(), 12, 12 * i);
         ASSERT_EQ(g_sets, 1) << i;
     }
 }

@@ -4,7 +4,6 @@
 #include <complex>
 #include <numbers>
 #include <set>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -32,22 +31,6 @@ protected:
                         TestSupport::Sing(3.0, 44100, [=](double t) { return t < 1.0 ? 0.0 : hz; })});
     }
 };
-
-using Table = std::vector<std::vector<double>>;
-
-Table ParseCsv(const std::string& csv, const std::string& heading = "frequency_hz,level_db") {
-    std::istringstream lines(csv);
-    std::string line;
-    std::getline(lines, line);
-    EXPECT_EQ(line, heading);
-    Table rows;
-    while (std::getline(lines, line)) {
-        std::istringstream cells(line);
-        auto& row = rows.emplace_back();
-        for (std::string cell; std::getline(cells, cell, ',');) row.push_back(std::stod(cell));
-    }
-    return rows;
-}
 
 // Whatever effects there are: complete records, distinct names, defaults in range, texts in UTF-8 (the parser
 // throws otherwise), and every effect and preset can be named in a chain.
@@ -89,17 +72,16 @@ TEST_F(Reports, EqCurveAgreesWithAnImpulseThroughRender) {
         SCOPED_TRACE(bands);
         const std::string fx = " --fx \"EQ: " + bands + "\" ";
         Succeed("render -y --tail 1 impulse.wav out.wav" + fx);
-        const auto curve =
-            ParseCsv(Succeed("eq-curve --rate 48000 -" + fx), "frequency_hz,gain_db,phase_deg");
+        const auto curve = Rows(Succeed("eq-curve --rate 48000 -" + fx), "frequency_hz,gain_db,phase_deg");
         ASSERT_EQ(curve.size(), 512u);
-        EXPECT_NEAR(curve[256][0], 10.0 * std::pow(2400.0, 256.0 / 511.0), 1e-6);
+        EXPECT_NEAR(std::stod(curve[256][0]), 10.0 * std::pow(2400.0, 256.0 / 511.0), 1e-6);
         const Sound out = Load("out.wav");
         for (std::size_t i = 0; i < curve.size(); i += 17) {
-            const double hz = curve[i][0], decibels = curve[i][1], degrees = curve[i][2];
+            const double hz = std::stod(curve[i][0]), decibels = std::stod(curve[i][1]);
             if (decibels < -120.0) continue;
             const auto sum = TestSupport::TransformAt(out.samples, hz / kRate) / 0.1;
             EXPECT_NEAR(20.0 * std::log10(std::abs(sum)), decibels, 0.01) << hz;
-            const double apart = std::arg(sum) * 180.0 / std::numbers::pi - degrees;
+            const double apart = std::arg(sum) * 180.0 / std::numbers::pi - std::stod(curve[i][2]);
             EXPECT_NEAR(std::remainder(apart, 360.0), 0.0, 0.1) << hz;
         }
     }

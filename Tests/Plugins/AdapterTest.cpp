@@ -11,6 +11,7 @@
 #include <sstream>
 
 #include "Spectrum/Fft/CorvoFFT.h"
+#include "Support/Signals.h"
 
 // The adapter behind every plug-in, over all plug-ins of both widths. Bypass, latency, blocks of any length,
 // samples that are no numbers and the rules of the audio thread are plugin_host's.
@@ -19,7 +20,7 @@ namespace {
 using namespace Corvo::Plugins;
 using Corvo::EffectParameterType;
 
-constexpr double kRate = 48000.0;
+constexpr int kRate = 48000;
 constexpr int kLongest = 256;
 
 struct Plugin {
@@ -46,14 +47,6 @@ INSTANTIATE_TEST_SUITE_P(All, EveryPlugin, testing::ValuesIn(All()), [](const au
 });
 
 using Sound = std::vector<float>;
-
-Sound Sine(double hz, std::size_t frames) {
-    Sound sound(frames);
-    for (std::size_t i = 0; i < frames; ++i)
-        sound[i] =
-            static_cast<float>(0.25 * std::sin(2.0 * std::numbers::pi * hz * static_cast<double>(i) / kRate));
-    return sound;
-}
 
 // Processes a sound, the same in every channel, in blocks of 64 frames; gives the first channel.
 // before(frame) is called in front of every block.
@@ -131,17 +124,17 @@ TEST(Actions, AreOffAgainAndTheHostHearsOfIt) {
 }
 
 TEST(SideChain, CountsOnceItSounds) {
-    Adapter adapter(*FindPluginRow("compressor"), 2);
+    Adapter adapter(*FindPluginRow("compressor"), 1);
     adapter.Prepare(kRate, kLongest);
-    const Sound quiet(kLongest), loud(kLongest, 0.9f), in = Sine(440.0, kLongest);
+    const Sound quiet(kLongest), loud(kLongest, 0.9f), in = TestSupport::Sine<float>(kLongest, 440.0);
     const auto level = [&](const Sound* side) {
         float last = 0.0f;
         for (int block = 0; block < 200; ++block) {
-            Sound left(in), right(in);
-            float* const at[]{left.data(), right.data()};
-            const float* const beside[]{side ? side->data() : nullptr, side ? side->data() : nullptr};
+            Sound out(in);
+            float* const at[]{out.data()};
+            const float* const beside[]{side ? side->data() : nullptr};
             adapter.Run(at, at, side ? beside : nullptr, kLongest);
-            last = *std::ranges::max_element(left);
+            last = *std::ranges::max_element(out);
         }
         return last;
     };
@@ -162,7 +155,7 @@ TEST(Results, TellTheNoteThatIsHeard) {
     };
     expect({-1.0f, 0.0f, 0.0f, 0.0f, 0.0f});
     EXPECT_EQ(adapter.Text(first, adapter.Value(first)), "None");
-    Processed(adapter, Sine(223.85, 48000), [](std::size_t) {});  // A3 and 30 cents
+    Processed(adapter, TestSupport::Sine<float>(kRate, 223.85), [](std::size_t) {});  // A3 and 30 cents
     expect({9.0f, 3.0f, 223.85f, 30.0f, -30.0f});
     EXPECT_EQ(adapter.Text(first, adapter.Value(first)), "A");
     adapter.Reset();
@@ -222,7 +215,7 @@ TEST_P(EveryPlugin, AutomationAtFiftyHertzMakesNoZipperNoise) {
     for (std::size_t i = 0; i < layout.ports.size(); ++i) {
         const Port& port = layout.ports[i];
         if (port.type != EffectParameterType::Continuous || port.whole || port.isOutput) continue;
-        const Sound in = Sine(2000.0, 4 * 48000);
+        const Sound in = TestSupport::Sine<float>(4 * kRate, 2000.0, kRate, 0.25);
         // Up and down by a twentieth of the knob, told every 64 frames, as hosts do.
         const auto zipper = [&](double depth) {
             const auto adapter = Make();

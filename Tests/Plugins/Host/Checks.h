@@ -25,15 +25,15 @@ struct Way {
 
 int Channels(const std::vector<Port>&);
 inline double Share(std::mt19937& random) { return static_cast<double>(random()) / 4294967295.0; }
-Signal Noise(int channels, std::size_t frames, float level = 0.25f, unsigned seed = 1);
+Signal Noise(const Instance&, std::size_t frames, float level = 0.25f, unsigned seed = 1);
 // The output of an active plug-in.
 Signal Render(Instance&, const Signal& input, const Way& = {});
 // Activates, renders and deactivates.
 Signal RenderAt(Instance&, double rate, const Signal& input, const Way& = {});
 bool IsFinite(const Signal&);
-// Whether the output of an active plug-in stays finite while the main thread works.
-bool FiniteWhile(Instance&, const std::function<void()>& work);
 double LargestDifference(const Signal&, const Signal&);
+// Whether two inputs, or two tempos, sound alike at any settings.
+bool AlwaysAlike(PluginFile&, std::size_t, const Signal& one, const Signal& other, double tempo = 120);
 
 // A value for every parameter that a host may automate; `of` gives its place in the range, 0..1.
 template <typename Of>

@@ -189,14 +189,13 @@ public:
 
     bool Activate(double rate, std::uint32_t maxFrames) override {
         if (!m_plugin->activate(m_plugin, rate, 1, maxFrames)) return false;
-        OnAudioThread([&] { m_started = m_plugin->start_processing(m_plugin); });
-        m_active = true;
-        return m_started;
+        bool started = false;
+        OnAudioThread([&] { started = m_plugin->start_processing(m_plugin); });
+        return started;
     }
     void Deactivate() override {
-        if (m_started) OnAudioThread([&] { m_plugin->stop_processing(m_plugin); });
-        if (m_active) m_plugin->deactivate(m_plugin);
-        m_started = m_active = false;
+        OnAudioThread([&] { m_plugin->stop_processing(m_plugin); });
+        m_plugin->deactivate(m_plugin);
         RunCallback();
     }
     std::uint32_t Latency() override { return m_latency ? m_latency->get(m_plugin) : 0; }
@@ -220,14 +219,7 @@ public:
         InRealTime([&] { m_plugin->reset(m_plugin); });
     }
 
-    std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
-        return OpenClapWindow(m_plugin, parent);
-    }
-
-    bool SetChannels(int channels) override {
-        return std::all_of(outputs.begin(), outputs.end(),
-                           [=](const Port& p) { return p.channels == channels; });
-    }
+    std::unique_ptr<Window> MakeWindow() override { return MakeClapWindow(m_plugin); }
 
     void CheckFormat() override {
         clap_param_info_t info{};
@@ -253,7 +245,7 @@ public:
 private:
     template <typename Table>
     const Table* Extension(const char* id) const {
-        return static_cast<const Table*>(m_plugin->get_extension(m_plugin, id));
+        return ClapExtension<Table>(m_plugin, id);
     }
 
     void ReadParameters() {
@@ -317,7 +309,6 @@ private:
     const std::vector<Preset>& m_list;
     Events m_events;
     std::int64_t m_time = 0;
-    bool m_active = false, m_started = false;
 };
 
 class ClapFile : public PluginFile {
@@ -410,10 +401,8 @@ private:
 
     void CheckCreation(const clap_plugin_descriptor_t& d) const {
         for (const std::string& id : {std::string(d.id) + "x", std::string("no.such.plugin")})
-            if (const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, id.c_str())) {
-                Finding("creates a plug-in of the unknown id " + id);
-                plugin->destroy(plugin);
-            }
+            Expect(!m_factory->create_plugin(m_factory, &kHost, id.c_str()),
+                   "creates a plug-in of the unknown id " + id);
         // Never initialised.
         const clap_plugin_t* plugin = m_factory->create_plugin(m_factory, &kHost, d.id);
         if (plugin) plugin->destroy(plugin);

@@ -10,14 +10,14 @@ std::set<clap_id> g_timers;
 class ClapWindow : public Window {
 public:
     explicit ClapWindow(const clap_plugin_t* plugin)
-        : m_plugin(plugin), m_gui(Extension<clap_plugin_gui_t>(CLAP_EXT_GUI)) {}
+        : m_plugin(plugin), m_gui(ClapExtension<clap_plugin_gui_t>(plugin, CLAP_EXT_GUI)) {}
     ~ClapWindow() override {
         if (!m_open) return;
         m_gui->hide(m_plugin);
         m_gui->destroy(m_plugin);
         Expect(g_timers.empty(), "leaves its timer behind");
     }
-    bool Open(std::uintptr_t parent) {
+    bool Open(std::uintptr_t parent) override {
         if (!m_gui) return false;
         Expect(!m_gui->is_api_supported(m_plugin, "no.such.api", false) &&
                    !m_gui->create(m_plugin, "no.such.api", false),
@@ -36,16 +36,11 @@ public:
                m_gui->set_size(m_plugin, fitWidth, fitHeight);
     }
     void Tick() override {
-        const auto* timer = Extension<clap_plugin_timer_support_t>(CLAP_EXT_TIMER_SUPPORT);
+        const auto* timer = ClapExtension<clap_plugin_timer_support_t>(m_plugin, CLAP_EXT_TIMER_SUPPORT);
         for (const clap_id id : g_timers) timer->on_timer(m_plugin, id);
     }
 
 private:
-    template <typename Table>
-    const Table* Extension(const char* id) const {
-        return static_cast<const Table*>(m_plugin->get_extension(m_plugin, id));
-    }
-
     const clap_plugin_t* const m_plugin;
     const clap_plugin_gui_t* const m_gui;
     bool m_open = false;
@@ -54,8 +49,8 @@ private:
 }  // namespace
 
 const clap_host_timer_support_t kClapTimers{[](const clap_host_t*, std::uint32_t, clap_id* timer) {
-                                                *timer = g_timers.empty() ? 1 : *g_timers.rbegin() + 1;
-                                                return g_timers.insert(*timer).second;
+                                                static clap_id last = 0;
+                                                return g_timers.insert(*timer = ++last).second;
                                             },
                                             [](const clap_host_t*, clap_id timer) {
                                                 Expect(g_timers.erase(timer) == 1,
@@ -63,10 +58,8 @@ const clap_host_timer_support_t kClapTimers{[](const clap_host_t*, std::uint32_t
                                                 return true;
                                             }};
 
-std::unique_ptr<Window> OpenClapWindow(const clap_plugin_t* plugin, std::uintptr_t parent) {
-    auto window = std::make_unique<ClapWindow>(plugin);
-    if (!window->Open(parent)) window.reset();
-    return window;
+std::unique_ptr<Window> MakeClapWindow(const clap_plugin_t* plugin) {
+    return std::make_unique<ClapWindow>(plugin);
 }
 
 }  // namespace PluginHost

@@ -10,6 +10,11 @@ namespace PluginHost {
 // The host's timers, which only windows use.
 extern const clap_host_timer_support_t kClapTimers;
 
-std::unique_ptr<Window> OpenClapWindow(const clap_plugin_t*, std::uintptr_t parent);
+std::unique_ptr<Window> MakeClapWindow(const clap_plugin_t*);
+
+template <typename Table>
+const Table* ClapExtension(const clap_plugin_t* plugin, const char* id) {
+    return static_cast<const Table*>(plugin->get_extension(plugin, id));
+}
 
 }  // namespace PluginHost

@@ -7,19 +7,13 @@
 namespace PluginHost {
 
 void CheckLife(PluginFile& file, std::size_t index) {
-    for (int i = 0; i < 10; ++i) file.Create(index);
     auto one = file.Create(index), other = file.Create(index);
     for (Instance* plugin : {one.get(), other.get()})
         Expect(plugin->Activate(48000, 256), "two instances cannot both be activated");
     one->Deactivate();
     one.reset();
-    Expect(IsFinite(Render(*other, Noise(Channels(other->inputs), 256))),
-           "suffers from another instance's end");
+    Expect(IsFinite(Render(*other, Noise(*other, 256))), "suffers from another instance's end");
     other->Deactivate();
-    for (int i = 0; i < 3; ++i) {
-        other->Activate(44100 + 1000 * i, 64);
-        other->Deactivate();
-    }
     other->CheckFormat();
     Parameter unknown{};
     unknown.id = 0x7fffffff;
@@ -43,22 +37,13 @@ void CheckTexts(Instance& plugin, const Parameter& parameter) {
     for (int i = 0; i <= last; ++i) {
         const double value = parameter.At(static_cast<double>(i) / last);
         const std::string place = parameter.name + " at " + std::to_string(value);
-        const auto text = plugin.Text(parameter, value);
-        if (!text || text->empty()) {
-            Finding(place + " has no text");
-            continue;
-        }
-        texts.insert(*text);
-        const auto back = plugin.Value(parameter, *text);
-        if (!back) {
-            Finding(place + ": its own text \"" + *text + "\" is not understood");
-            continue;
-        }
-        Expect(*back >= parameter.minimum && *back <= parameter.maximum,
-               place + ": its own text \"" + *text + "\" comes back as " + std::to_string(*back));
-        const auto again = plugin.Text(parameter, *back);
-        Expect(again && *again == *text,
-               place + ": the text \"" + *text + "\" becomes \"" + again.value_or("") + "\" on the way back");
+        const std::string text = plugin.Text(parameter, value).value_or("");
+        const double back = plugin.Value(parameter, text).value_or(NAN);
+        const std::string again = plugin.Text(parameter, back).value_or("");
+        texts.insert(text);
+        Expect(!text.empty() && back >= parameter.minimum && back <= parameter.maximum && again == text,
+               place + ": its text \"" + text + "\" comes back as " + std::to_string(back) + ", \"" + again +
+                   "\"");
     }
     Expect(parameter.steps == 0 || parameter.steps > 64 || texts.size() == static_cast<std::size_t>(last) + 1,
            parameter.name + ": two of its steps have one text");

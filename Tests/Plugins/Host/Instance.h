@@ -73,6 +73,7 @@ struct Stream {
 class Window {
 public:
     virtual ~Window() = default;
+    virtual bool Open(std::uintptr_t parent) = 0;  // inside of this X11 window
     virtual bool Resize(int width, int height) = 0;
     virtual void Tick() = 0;  // of the host's timers
 };
@@ -90,11 +91,9 @@ public:
     virtual std::optional<std::string> Text(const Parameter&, double value) = 0;
     virtual std::optional<double> Value(const Parameter&, const std::string& text) = 0;
     virtual double Get(const Parameter&) = 0;
-    virtual bool TakePreset(std::size_t preset) = 0;
+    virtual bool TakePreset(std::size_t) { return false; }
 
-    std::optional<Bytes> Save(Stream stream = {}) {
-        return SaveTo(stream) ? std::optional(stream.bytes) : std::nullopt;
-    }
+    Bytes Save(Stream stream = {}) { return SaveTo(stream) ? stream.bytes : Bytes{}; }
     virtual bool SaveTo(Stream&) = 0;
     virtual bool Load(Stream) = 0;
 
@@ -104,18 +103,23 @@ public:
     // How often the host was told since that the latency is another. It has heard the plug-in out.
     virtual int TakeLatencyNews() = 0;
 
-    virtual void Flush(std::span<const Change>) = 0;        // while inactive
-    virtual void FlushActive(std::span<const Change>) = 0;  // without audio
+    // While inactive.
+    virtual void Flush(std::span<const Change> changes) {
+        Expect(Activate(48000, 64), "cannot be activated");
+        OnAudioThread([&] { FlushActive(changes); });
+        Deactivate();
+    }
     virtual bool Process(const Block&) = 0;
+    // Without audio.
+    virtual void FlushActive(std::span<const Change> changes) { Process({{}, {}, 0, changes}); }
     virtual void Reset() = 0;
 
     // One channel everywhere, or two; false when the plug-in has no such layout. While inactive.
-    virtual bool SetChannels(int channels) = 0;
-    // Inside of the X11 window `parent`; null where it has none.
-    virtual std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) = 0;
+    virtual bool SetChannels(int channels) { return outputs.front().channels == channels; }
+    virtual std::unique_ptr<Window> MakeWindow() { return nullptr; }  // null where it has none
 
     // The plug-in's own rules for this format, such as what events it must leave alone.
-    virtual void CheckFormat() = 0;
+    virtual void CheckFormat() {}
 };
 
 // A file of a format. Loading it checks what it says of itself.

@@ -7,7 +7,6 @@
 #include <lv2/urid.h>
 
 #include <cmath>
-#include <cstring>
 #include <fstream>
 #include <map>
 #include <sstream>
@@ -77,13 +76,10 @@ public:
         const auto value = static_cast<double>(m_values[p.id]);
         return p.bypass ? 1 - value : value;
     }
-    bool TakePreset(std::size_t) override { return false; }
 
     bool SaveTo(Stream& stream) override {
-        for (const Parameter& p : parameters) {
-            const auto* const bytes = reinterpret_cast<const char*>(&m_values[p.id]);
-            if (!p.readOnly) stream.bytes.insert(stream.bytes.end(), bytes, bytes + sizeof(float));
-        }
+        for (const Parameter& p : parameters)
+            if (!p.readOnly) stream.Write(&m_values[p.id], sizeof(float));
         const auto settings = Settings();
         stream.bytes.insert(stream.bytes.end(), settings.begin(), settings.end());
         return true;
@@ -93,12 +89,10 @@ public:
         const auto size = static_cast<std::ptrdiff_t>(sizeof(float)) * count;
         if (static_cast<std::ptrdiff_t>(stream.bytes.size()) < size) return false;
         if (!Restore({stream.bytes.begin() + size, stream.bytes.end()})) return false;
-        const char* from = stream.bytes.data();
         for (const Parameter& p : parameters) {
             float value = 0;
             if (p.readOnly) continue;
-            std::memcpy(&value, from, sizeof value);
-            from += sizeof value;
+            stream.Read(&value, sizeof value);
             if (value >= static_cast<float>(p.minimum) && value <= static_cast<float>(p.maximum))
                 m_values[p.id] = value;
         }
@@ -122,12 +116,6 @@ public:
     std::uint32_t Latency() override { return static_cast<std::uint32_t>(m_values[m_latency]); }
     int TakeLatencyNews() override { return std::exchange(m_news, 0); }
 
-    void Flush(std::span<const Change> changes) override {
-        Activate(m_rate, 0);
-        OnAudioThread([&] { FlushActive(changes); });
-        Deactivate();
-    }
-    void FlushActive(std::span<const Change> changes) override { Process({{}, {}, 0, changes}); }
     bool Process(const Block& block) override {
         for (const Change& change : block.changes)
             for (const Parameter& p : parameters)
@@ -143,10 +131,6 @@ public:
         return true;
     }
     void Reset() override { m_plugin.activate(m_handle); }
-
-    bool SetChannels(int channels) override { return outputs.front().channels == channels; }
-    std::unique_ptr<Window> OpenWindow(std::uintptr_t) override { return nullptr; }
-    void CheckFormat() override {}
 
 private:
     bool IsOwn(const Parameter& p) const { return p.id < m_values.size(); }

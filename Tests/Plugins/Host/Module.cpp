@@ -12,25 +12,23 @@ namespace PluginHost {
 
 #ifdef _WIN32
 Module::Module(const std::filesystem::path& file)
-    : m_handle(LoadLibraryW(std::filesystem::absolute(file).c_str())) {
+    : m_handle(LoadLibraryW(std::filesystem::absolute(file).c_str()),
+               [](void* handle) { FreeLibrary(static_cast<HMODULE>(handle)); }) {
     if (!m_handle) throw std::runtime_error("cannot be loaded: error " + std::to_string(GetLastError()));
 }
 
-Module::~Module() { FreeLibrary(static_cast<HMODULE>(m_handle)); }
-
 void* Module::Address(const char* name) const {
-    return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_handle), name));
+    return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(m_handle.get()), name));
 }
 #else
 // All symbols at once: what is missing shows here and not in the middle of a session.
 Module::Module(const std::filesystem::path& file)
-    : m_handle(dlopen(std::filesystem::absolute(file).c_str(), RTLD_NOW | RTLD_LOCAL)) {
+    : m_handle(dlopen(std::filesystem::absolute(file).c_str(), RTLD_NOW | RTLD_LOCAL),
+               [](void* handle) { dlclose(handle); }) {
     if (!m_handle) throw std::runtime_error(std::string("cannot be loaded: ") + dlerror());
 }
 
-Module::~Module() { dlclose(m_handle); }
-
-void* Module::Address(const char* name) const { return dlsym(m_handle, name); }
+void* Module::Address(const char* name) const { return dlsym(m_handle.get(), name); }
 #endif
 
 }  // namespace PluginHost

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <filesystem>
+#include <memory>
 
 namespace PluginHost {
 
@@ -9,9 +10,6 @@ class Module {
 public:
     // Throws std::runtime_error with the system's reason.
     explicit Module(const std::filesystem::path& file);
-    ~Module();
-    Module(const Module&) = delete;
-    Module& operator=(const Module&) = delete;
 
     template <typename Symbol>
     Symbol* Find(const char* name) const {
@@ -21,7 +19,7 @@ public:
 private:
     void* Address(const char* name) const;  // null when there is none
 
-    void* m_handle;
+    std::unique_ptr<void, void (*)(void*)> m_handle;
 };
 
 }  // namespace PluginHost

@@ -1,9 +1,9 @@
 #include <algorithm>
-#include <atomic>
 #include <cmath>
 #include <thread>
 
 #include "Checks.h"
+#include "Support/Signals.h"
 
 namespace PluginHost {
 namespace {
@@ -45,11 +45,10 @@ int Channels(const std::vector<Port>& ports) {
     return channels;
 }
 
-Signal Noise(int channels, std::size_t frames, float level, unsigned seed) {
-    std::mt19937 random(seed);
-    Signal signal(static_cast<std::size_t>(channels), std::vector<float>(frames));
-    for (auto& channel : signal)
-        for (float& sample : channel) sample = level * (static_cast<float>(random()) / 2147483648.0f - 1.0f);
+Signal Noise(const Instance& plugin, std::size_t frames, float level, unsigned seed) {
+    Signal signal;
+    for (int c = 0; c < Channels(plugin.inputs); ++c)
+        signal.push_back(TestSupport::Noise<float>(frames, level, seed + 100 * static_cast<unsigned>(c)));
     return signal;
 }
 
@@ -73,8 +72,7 @@ Signal Render(Instance& plugin, const Signal& input, const Way& way) {
             changes.clear();
             for (; next < way.changes.size() && way.changes[next].frame < at + count; ++next) {
                 changes.push_back(way.changes[next]);
-                changes.back().frame -=
-                    static_cast<std::uint32_t>(std::min<std::size_t>(at, changes.back().frame));
+                changes.back().frame -= static_cast<std::uint32_t>(at);
             }
             failed |= !plugin.Process({ins, outs, static_cast<std::uint32_t>(count), changes});
             at += count;
@@ -93,24 +91,7 @@ Signal RenderAt(Instance& plugin, double rate, const Signal& input, const Way& w
 }
 
 bool IsFinite(const Signal& signal) {
-    for (const auto& channel : signal)
-        if (!std::all_of(channel.begin(), channel.end(), [](float sample) { return std::isfinite(sample); }))
-            return false;
-    return true;
-}
-
-bool FiniteWhile(Instance& plugin, const std::function<void()>& work) {
-    const Signal input = Noise(Channels(plugin.inputs), 256);
-    std::atomic<bool> working = true, finite = true;
-    std::thread audio([&] {
-        t_thread = Thread::Audio;
-        while (working)
-            if (!IsFinite(Render(plugin, input))) finite = false;
-    });
-    work();
-    working = false;
-    audio.join();
-    return finite;
+    return std::ranges::all_of(signal, [](const auto& channel) { return TestSupport::AllFinite(channel); });
 }
 
 double LargestDifference(const Signal& a, const Signal& b) {
@@ -121,6 +102,19 @@ double LargestDifference(const Signal& a, const Signal& b) {
             if (!(difference <= largest)) largest = difference;
         }
     return largest;
+}
+
+bool AlwaysAlike(PluginFile& file, std::size_t index, const Signal& one, const Signal& other, double tempo) {
+    const auto first = file.Create(index), second = file.Create(index);
+    second->tempo = tempo;
+    std::mt19937 random(2);
+    for (int round = 0; round < 20; ++round) {
+        const auto changes = ForAll(*first, [&] { return Share(random); });
+        if (LargestDifference(RenderAt(*first, 48000, one, {.changes = changes}),
+                              RenderAt(*second, 48000, other, {.changes = changes})) >= 1e-4)
+            return false;
+    }
+    return true;
 }
 
 }  // namespace PluginHost

@@ -28,11 +28,9 @@ std::string Narrow(const std::int16_t* text) {
     return narrow;
 }
 
-using ApplicationTable = Table<v3_host_application, v3_host_application_iid>;
-ApplicationTable g_application(
+Table<v3_host_application, v3_host_application_iid> g_application(
     {[](void*, v3_str_128 name) -> v3_result { return name[0] = 'h', name[1] = 0, V3_OK; },
      [](void*, v3_tuid, v3_tuid, void**) -> v3_result { return V3_NOT_IMPLEMENTED; }});
-ApplicationTable* g_applicationObject = &g_application;
 
 v3_result OnMainThread(const char* call) {
     Expect(CurrentThread() == Thread::Main,
@@ -41,16 +39,15 @@ v3_result OnMainThread(const char* call) {
 }
 bool g_choosing = false;  // a program; hosts deadlock on a restart then
 int g_restarts = 0;       // for another latency
-using HandlerTable = Table<v3_component_handler, v3_component_handler_iid>;
-HandlerTable g_handler({[](void*, v3_param_id) { return OnMainThread("begin_edit"); },
-                        [](void*, v3_param_id, double) { return OnMainThread("perform_edit"); },
-                        [](void*, v3_param_id) { return OnMainThread("end_edit"); },
-                        [](void*, std::int32_t flags) {
-                            g_restarts += (flags & V3_RESTART_LATENCY_CHANGED) != 0;
-                            Expect(!g_choosing, "calls restart_component while a program is chosen");
-                            return OnMainThread("restart_component");
-                        }});
-HandlerTable* g_handlerObject = &g_handler;
+Table<v3_component_handler, v3_component_handler_iid> g_handler(
+    {[](void*, v3_param_id) { return OnMainThread("begin_edit"); },
+     [](void*, v3_param_id, double) { return OnMainThread("perform_edit"); },
+     [](void*, v3_param_id) { return OnMainThread("end_edit"); },
+     [](void*, std::int32_t flags) {
+         g_restarts += (flags & V3_RESTART_LATENCY_CHANGED) != 0;
+         Expect(!g_choosing, "calls restart_component while a program is chosen");
+         return OnMainThread("restart_component");
+     }});
 
 // Ours read and write from one end to the other.
 Stream& StreamOf(void* self) { return *static_cast<Stream*>(self); }
@@ -134,13 +131,13 @@ constexpr std::size_t kQueues = 512, kPoints = 64;
 class Vst3Instance : public Instance {
 public:
     Vst3Instance(v3_plugin_factory** factory, const v3_tuid id) : m_component(Create(factory, id)) {
-        const auto context = reinterpret_cast<v3_funknown**>(&g_applicationObject);
+        const auto context = reinterpret_cast<v3_funknown**>(&g_application.itself);
         if (v3_cpp_obj_initialize(m_component.Get(), context) != V3_OK)
             throw std::runtime_error("initialize fails");
         // Ours are one object.
         if (!m_processor || !m_controller) throw std::runtime_error("has no processor or no controller");
         m_controller->set_component_handler(m_controller.Get(),
-                                            reinterpret_cast<v3_component_handler**>(&g_handlerObject));
+                                            reinterpret_cast<v3_component_handler**>(&g_handler.itself));
         for (Changes* changes : {&m_in, &m_out}) {
             changes->queues.resize(kQueues, Queue{&g_queue, 0, {}});
             for (Queue& queue : changes->queues) queue.points.reserve(kPoints);
@@ -172,8 +169,7 @@ public:
     bool TakePreset(std::size_t preset) override {
         g_choosing = true;
         const double place = static_cast<double>(preset) / std::max(m_program.step_count, 1);
-        const bool taken =
-            m_controller->set_parameter_normalised(m_controller.Get(), m_program.param_id, place) == V3_OK;
+        const bool taken = Tell(m_program.param_id, place);
         g_choosing = false;
         return taken;
     }
@@ -204,9 +200,7 @@ public:
     void HandOver() {
         for (std::size_t i = 0; i < m_out.used; ++i)
             for (const Change& change : m_out.queues[i].points)
-                Expect(m_controller->set_parameter_normalised(m_controller.Get(), change.parameter,
-                                                              change.value) == V3_OK,
-                       "does not know a parameter that it sends");
+                Expect(Tell(change.parameter, change.value), "does not know a parameter that it sends");
         m_out.Set({});
     }
     std::uint32_t Latency() override { return m_processor->get_latency_samples(m_processor.Get()); }
@@ -218,13 +212,9 @@ public:
 
     // A host sends a change to both halves; the processor gets it without audio.
     void Flush(std::span<const Change> changes) override {
-        for (const Change& change : changes)
-            m_controller->set_parameter_normalised(m_controller.Get(), change.parameter, change.value);
-        Expect(Activate(48000, 64), "cannot be activated");
-        OnAudioThread([&] { FlushActive(changes); });
-        Deactivate();
+        for (const Change& change : changes) Tell(change.parameter, change.value);
+        Instance::Flush(changes);
     }
-    void FlushActive(std::span<const Change> changes) override { Process({{}, {}, 0, changes}); }
 
     bool Process(const Block& block) override {
         m_in.Set(block.changes);
@@ -257,9 +247,7 @@ public:
         });
     }
 
-    std::unique_ptr<Window> OpenWindow(std::uintptr_t parent) override {
-        return OpenVst3Window(m_controller, parent);
-    }
+    std::unique_ptr<Window> MakeWindow() override { return MakeVst3Window(m_controller); }
 
     bool SetChannels(int channels) override {
         const v3_speaker_arrangement one = channels == 1 ? V3_SPEAKER_M : V3_SPEAKER_L | V3_SPEAKER_R;
@@ -297,6 +285,9 @@ public:
     }
 
 private:
+    bool Tell(v3_param_id id, double value) {
+        return m_controller->set_parameter_normalised(m_controller.Get(), id, value) == V3_OK;
+    }
     static v3_component** Create(v3_plugin_factory** factory, const v3_tuid id) {
         void* made = nullptr;
         if (v3_cpp_obj(factory)->create_instance(factory, id, v3_component_iid, &made) != V3_OK)

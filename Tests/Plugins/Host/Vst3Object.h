@@ -15,6 +15,7 @@ v3_result V3_API Query(void* self, const v3_tuid iid, void** object) {
 template <typename Functions, const v3_tuid& kId>
 struct Table : v3_funknown {
     Functions functions;
+    Table* itself = this;
     explicit Table(const Functions& f)
         : v3_funknown{Query<kId>, [](void*) { return 1u; }, [](void*) { return 1u; }}, functions(f) {}
 };

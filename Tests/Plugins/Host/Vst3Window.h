@@ -7,6 +7,6 @@
 
 namespace PluginHost {
 
-std::unique_ptr<Window> OpenVst3Window(const Held<v3_edit_controller>&, std::uintptr_t parent);
+std::unique_ptr<Window> MakeVst3Window(const Held<v3_edit_controller>&);
 
 }  // namespace PluginHost

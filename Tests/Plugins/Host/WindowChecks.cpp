@@ -101,7 +101,7 @@ void UseWindow(Instance& plugin, Window& window, Parent& parent) {
     for (const unsigned key : {13u, 11u, 12u}) {  // "4", "2" and "3", each after Escape for what is open
         for (const unsigned each : {9u, 9u, 9u, key}) parent.Send(XCB_KEY_PRESS, each, 0, 0);
         Tick(window, 2);
-        states.insert(plugin.Save().value_or(Bytes{}));
+        states.insert(plugin.Save());
     }
     Expect(states.size() == 3, "does not do what is typed into its window");
     for (int i = 0; i < 20; ++i) {
@@ -129,11 +129,11 @@ void CheckWindow(PluginFile& file, std::size_t index) {
         if (round == kWarm) before = Used();
         const auto plugin = file.Create(index);
         plugin->Activate(48000, 1024);
-        Render(*plugin, Noise(Channels(plugin->inputs), 24000));
+        Render(*plugin, Noise(*plugin, 24000));
         for (const bool parentGoesFirst : {false, true}) {
             Parent parent;
-            auto window = plugin->OpenWindow(parent.Handle());
-            if (!window) return Finding("has no window");
+            auto window = plugin->MakeWindow();
+            if (!window || !window->Open(parent.Handle())) return Finding("has no window");
             UseWindow(*plugin, *window, parent);
             if (parentGoesFirst) parent.Destroy();
             Tick(*window, 1);
