@@ -18,7 +18,10 @@ Fuzz/seeds.sh $programs/dsphost $work/seeds
 fuzzers=($programs/fuzz_[A-Z]*)
 share=$(((seconds + ${#fuzzers[@]} - 1) / ${#fuzzers[@]}))
 export ASAN_OPTIONS=allocator_may_return_null=1 UBSAN_OPTIONS=print_stacktrace=1
-export LSAN_OPTIONS=suppressions=$PWD/Tests/leaks.supp:print_suppressions=0
+# Pango has a thread of its own, and what that holds of GLib's memory looks lost in the middle of a run. At their end
+# the tests of ./check asan look for it all the same.
+{ cat Tests/leaks.supp; echo leak:libglib; } > $work/leaks.supp
+export LSAN_OPTIONS=suppressions=$PWD/$work/leaks.supp:print_suppressions=0
 
 # One fuzzer over its corpus; its report is shown when it finds something.
 fuzz() {
@@ -37,8 +40,6 @@ fuzz() {
     sed -n "s/^Done \([0-9]*\) runs.*/$target: \1 runs/p" "$report"
 }
 export -f fuzz
-# A leak shows in every block that GLib hands out.
-export G_SLICE=always-malloc
 export SHELLOPTS  # failures inside pipes count there too
 export work share
 
