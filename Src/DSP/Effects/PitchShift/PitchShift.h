@@ -60,7 +60,7 @@ public:
     int SeparateLeftRightControls() override;
     // Of either side, 0 or 1, though both are one external parameter.
     std::wstring GetParameterFormattedText(int index, double value) override;
-    float GetParamValueNormalizedFromText(int index, std::string text) override;
+    float GetParamValueNormalizedFromText(int index, std::string text) override;  // not limited
     bool AllowChangeParamFromInputBox(int index) override;
 
     // Configures the back-end that the record names for the format; it is made on the spot when another one
