@@ -40,7 +40,7 @@ void ExpectTheSameHoweverCut(const EffectCase& row, int rate) {
     for (auto& cut : random) cut = 1 + source.Below(700);
     std::vector<Sample> whole;
     for (const auto& cuts : {std::vector<int>{kFrames}, {1}, {7}, {64}, {511}, {4096}, random}) {
-        const auto effect = row.make();
+        const auto effect = row.Make();
         const auto output = Render(*effect, input, format, cuts, MoveEverything(*effect, kFrames, 3));
         if (whole.empty()) whole = output;
         for (std::size_t i = 0; i < output.size(); ++i)
