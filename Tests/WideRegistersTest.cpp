@@ -14,6 +14,7 @@
 #include "DSP/Pitch/ClassicKernel.h"
 #include "DSP/Resampler/PolePairKernel.h"
 #include "Platform/AlignedMemory.h"
+#include "Platform/FiniteSamples.h"
 #include "Platform/Processor.h"
 #include "Spectrum/Fft/FftPlan.h"
 #include "Spectrum/Scales/DecibelKernel.h"
@@ -229,6 +230,34 @@ Floats Everything(const Corvo::DSP::Denoising::SpectrumKernels& kernels) {
 TEST_F(WideRegisters, OfTheDenoiser) {
     using namespace Corvo::DSP::Denoising;
     ExpectSameBits(Everything(BaselineSpectrumKernels()), Everything(Avx2SpectrumKernels()));
+}
+
+// Catches a lane, a loop or an end that is not looked at, and one that looks past the block: NaN stands
+// around it.
+template <typename Sample>
+void ExpectEveryPlaceSeen(bool (*version)(const Sample*, std::size_t)) {
+    using Limits = std::numeric_limits<Sample>;
+    const Sample finite[] = {1, -Sample(0), Limits::denorm_min(), Limits::max(), -Limits::max()};
+    for (std::size_t count = 0; count <= 70; ++count) {
+        std::vector<Sample> samples(count + 2, Limits::quiet_NaN());
+        Sample* const block = samples.data() + 1;
+        for (std::size_t i = 0; i < count; ++i) block[i] = finite[i % (count % 2 ? 5 : 3)];
+        ASSERT_TRUE(version(block, count)) << count;
+        for (std::size_t at = 0; at < count; ++at)
+            for (const Sample bad : {Limits::infinity(), -Limits::infinity(), Limits::quiet_NaN()}) {
+                const Sample good = std::exchange(block[at], bad);
+                ASSERT_FALSE(version(block, count)) << bad << " at " << at << " of " << count;
+                block[at] = good;
+            }
+    }
+}
+
+TEST(FiniteSamples, OneThatIsNotIsSeenAtEveryPlace) {
+    ExpectEveryPlaceSeen<float>(Corvo::AllFiniteBaseline);
+    ExpectEveryPlaceSeen<double>(Corvo::AllFiniteBaseline);
+    if (!Corvo::HasAvx2()) return;
+    ExpectEveryPlaceSeen<float>(Corvo::AllFiniteAvx2);
+    ExpectEveryPlaceSeen<double>(Corvo::AllFiniteAvx2);
 }
 
 }  // namespace
