@@ -1,5 +1,4 @@
 // States: what a session keeps must come back, and what is no state must do no harm.
-#include <algorithm>
 #include <cmath>
 #include <cstdio>
 
