@@ -106,7 +106,10 @@ TEST_F(Outputs, KeepOwnerAndPermissionsAndWhatIsProtected) {
     ExpectRefused(Shell("DSPHOST render -y - in.wav < in.wav"), "in.wav|input");
     ExpectRefused(Shell("DSPHOST render in.wav - >> in.wav"), "standard output|input");
     // What is printed of a name stays on its line.
-    ExpectRefused(Run("render '\x1B[31m\n.wav' o.wav"), "\\x1b[31m\\n.wav");
+    ExpectRefused(Run("render '\x1B[31m\n\xC5\xBC\xC2\x85\x9B\xE2\x80\xAE.wav' o.wav"),
+                  "\\x1b[31m\\n\xC5\xBC\\x85\\x9b\\u202e.wav");
+    const auto mixed = Shell("DSPHOST render in.wav - --fx Gain --save-chunk /dev/stdout | wc -c");
+    EXPECT_EQ(std::stoi(mixed.out), 0) << mixed.err;
 }
 #endif
 
