@@ -1,6 +1,7 @@
 // A host that does everything in any order to any effect: chunks, presets, texts, edits, automation, formats.
 #include <algorithm>
 #include <cmath>
+#include <iterator>
 
 #include "EffectSettings.h"
 #include "Support/EffectCases.h"
@@ -20,6 +21,8 @@ struct Host : CorvoEffectHostCallback {
     int numerator = 4, denominator = 4;
 };
 
+constexpr int kMostFrames = 700;
+
 struct Session : Fuzz::EffectSettings {
     Host host{};
     tWAVEFORMATEX format{};
@@ -36,7 +39,7 @@ struct Session : Fuzz::EffectSettings {
     }
     void Prepare() {
         ChooseFormat();
-        largest = input.Between(0, 700);
+        largest = input.Between(0, kMostFrames);
         Require(effect->InitProcessing(largest, &format), "preparation is always true");
         Require(effect->GetLatency() >= 0, "latency is not negative");
     }
@@ -81,7 +84,7 @@ struct Session : Fuzz::EffectSettings {
     void SideChain() {
         const int bus = input.Between(0, 1);
         effect->SetSidechainBusNumChannels(bus, input.Between(0, 3));
-        sideChain = input.Samples<double>(700);
+        sideChain = input.Samples<double>(kMostFrames);
         static double* channels[2];
         channels[0] = channels[1] = sideChain.data();
         effect->SetSidechainBuffer(0, input.Flag() ? channels : nullptr);
@@ -115,6 +118,13 @@ struct Session : Fuzz::EffectSettings {
             before = finite;
         }
     }
+    // A format, and more frames, than the effect was prepared for.
+    void PlayUnannounced() {
+        ChooseFormat();
+        const int announced = std::exchange(largest, kMostFrames);
+        Play();
+        largest = announced;
+    }
     void Rewind() { effect->InitResetProcessingLight(input.Flag()); }
     void StartOver() {
         effect->Cleanup();
@@ -134,7 +144,12 @@ const Fuzz::Target target("Effects", [](Input& input) {
     Session session{{input, all[which].Make()}};
     session.Preset();
     session.Prepare();
-    for (int step = 0; step < 60 && !input.AtEnd(); ++step) (session.*input.OneOf(kSteps))();
+    for (int step = 0; step < 60 && !input.AtEnd(); ++step) {
+        // Values that none of the inputs that once failed has here, so that they still do what they did.
+        const int choice = input.Between(0, 255);
+        const bool unannounced = choice >= 192 && choice < 208;
+        (session.*(unannounced ? &Session::PlayUnannounced : kSteps[choice % std::ssize(kSteps)]))();
+    }
     if (session.format.wBitsPerSample == 32)
         session.EndInSilence<float>();
     else if (session.format.wBitsPerSample == 64)

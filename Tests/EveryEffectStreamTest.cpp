@@ -104,6 +104,15 @@ TEST_P(EveryEffect, TreatsPlanarBlocksLikeInterleavedOnes) {
     }
 }
 
+// Catches a preparation that goes another way, or leaves something behind, where there was one before.
+TEST_P(EveryEffect, SoundsTheSamePreparedTwice) {
+    const auto once = Make(), twice = Make();
+    const auto format = Format<float>();
+    const auto input = Noise<float>(2 * 20000);
+    twice->InitProcessing(512, &format);
+    EXPECT_EQ(Render(*twice, input, format, {512}), Render(*once, input, format, {512}));
+}
+
 // Catches delay lines and filters that only fit the usual rates, a format change in mid-stream that the
 // effect was not prepared for, and prepared memory that a block larger than announced, or a second
 // preparation, runs out of.

@@ -22,6 +22,9 @@ constexpr int kLowestRate = 1000, kHighestRate = 768000;
 
 // Every kind of audio file is known by what stands in its first bytes; so many are more than enough.
 constexpr std::size_t kEnoughToRecognise = 1 << 16;
+// Of what looks like one so much must be readable: more than the largest picture in front of a FLAC's
+// samples.
+constexpr std::int64_t kEnoughToOpen = std::int64_t{32} << 20;
 
 std::string Counted(std::int64_t count, const char* one, const char* several) {
     return std::to_string(count) + (count == 1 ? one : several);
@@ -37,15 +40,17 @@ File Spool(File& from, const std::vector<unsigned char>& start, std::int64_t lim
     to.Write(start.data(), start.size());
     std::vector<unsigned char> buffer(kEnoughToRecognise);
     auto size = static_cast<std::int64_t>(start.size());
-    for (bool recognised = false; const std::size_t count = from.Read(buffer.data(), buffer.size());) {
+    bool recognised = false, opened = false;
+    while (const std::size_t count = from.Read(buffer.data(), buffer.size())) {
         size += static_cast<std::int64_t>(count);
         if (size > limit)
             throw UserError(from.Name() + ": does not stream, and its temporary file would be larger than " +
                             Counted(limit, " byte", " bytes") + "; --spool-limit allows more");
         to.Write(buffer.data(), count);
         to.ThrowIfFailed();
-        if (std::exchange(recognised, true)) continue;
-        const bool sound = SoundFile::MayBeSound(to);
+        const bool enough = size >= kEnoughToOpen;
+        if (enough ? std::exchange(opened, true) : std::exchange(recognised, true)) continue;
+        const bool sound = enough ? SoundFile::Opens(to) : SoundFile::MayBeSound(to);
         to.ThrowIfFailed();
         if (!sound) throw UserError(NoAudio(from.Name()));
         to.Seek(0, SEEK_END);
@@ -105,7 +110,8 @@ AudioReader::AudioReader(const std::string& path, std::int64_t spoolLimit)
         OpenStream(File::StandardInput());
     } else {
         File file(PathOf(path), File::Mode::Read, path);
-        if (fs::exists(status) && !fs::is_regular_file(status))
+        // What a system makes up while it is read has no length.
+        if ((fs::exists(status) && !fs::is_regular_file(status)) || file.Length() == 0)
             OpenStream(std::move(file));
         else
             OpenFile(std::move(file));

@@ -21,9 +21,9 @@ constexpr double kLatestSecond = 1e9;
 constexpr const char* kLaneForm =
     R"(a lane is {"effect": "NAME", "parameter": "LABEL", "points": [[seconds, value], ...]})";
 
-constexpr std::size_t kLargestFile = std::size_t{64} << 20;
-constexpr int kDeepest = 8;              // of nested brackets
-constexpr std::size_t kLongestList = 8;  // that a message repeats
+constexpr std::size_t kLargestFile = std::size_t{16} << 20;  // about a million points
+constexpr int kDeepest = 8;                                  // of nested brackets
+constexpr std::size_t kLongestList = 8;                      // that a message repeats
 
 // What stands in a file, cut to a length that a message can have.
 std::string Quoted(const Json& json) {

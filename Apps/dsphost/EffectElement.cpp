@@ -102,10 +102,11 @@ void EffectElement::LoadChunk(const std::string& path) {
 }
 
 void EffectElement::SetParameter(std::string_view label, std::string_view text) {
-    std::string warning;
-    for (const auto* parameter : FindParameters(*m_effect, m_parameters, label))
+    for (const auto* parameter : FindParameters(*m_effect, m_parameters, label)) {
+        std::string warning;
         m_effect->SetParam(parameter->index, ParseValue(*m_effect, *parameter, text, warning), false);
-    if (!warning.empty()) PrintMessage("warning: " + warning);
+        if (!warning.empty()) PrintMessage("warning: " + warning);
+    }
 }
 
 bool EffectElement::Prepare(int maxFrames, const tWAVEFORMATEX& format, bool planar) {

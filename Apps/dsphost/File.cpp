@@ -101,7 +101,7 @@ std::FILE* OpenTemporary(const fs::path& directory) {
 }
 
 std::optional<FileIdentity> Identity(int result, const struct stat& status) {
-    if (result != 0 || !S_ISREG(status.st_mode)) return {};
+    if (result != 0 || !(S_ISREG(status.st_mode) || S_ISFIFO(status.st_mode))) return {};
     return FileIdentity{status.st_dev, status.st_ino};
 }
 
@@ -153,13 +153,15 @@ File::File(std::FILE* stream, std::string name, bool owned)
 File::File(const fs::path& path, Mode mode, std::string name)
     : m_stream(OpenStream(path, mode)), m_name(std::move(name)) {
     const int reason = errno;
-    if (std::error_code none; fs::is_directory(path, none)) {
+    if (path.empty()) throw UserError("the name of a file is empty");
+    std::error_code none;
+    if (fs::is_directory(path, none)) {
         if (m_stream) std::fclose(m_stream);
         throw UserError(m_name + ": is a directory; name a file");
     }
     if (!m_stream) throw UserError(m_name + ": " + std::strerror(reason));
     // What comes or goes through a pipe must not wait for more.
-    if (IdentityOf(m_stream)) EnlargeBuffer();
+    if (fs::is_regular_file(path, none)) EnlargeBuffer();
 }
 
 void File::EnlargeBuffer() {

@@ -21,7 +21,7 @@ struct FileIdentity {
     std::uint64_t volume, file;
     bool operator==(const FileIdentity&) const = default;
 };
-// Of an existing regular file; nothing otherwise.
+// Of an existing regular file or, but for Windows, a pipe; nothing otherwise.
 std::optional<FileIdentity> IdentityOf(const std::filesystem::path& path);
 std::optional<FileIdentity> IdentityOf(std::FILE* stream);
 

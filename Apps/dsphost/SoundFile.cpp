@@ -64,17 +64,18 @@ SoundFile::SoundFile(File& file, int mode, SF_INFO& info)
     throw UserError(file.Name() + ": " + sf_strerror(nullptr));
 }
 
-bool SoundFile::MayBeSound(File& file) {
+bool SoundFile::Opens(File& file) try {
     SF_INFO info{};
-    Stream stream{file, true};
-    auto io = Callbacks();
     file.Seek(0);
-    if (SNDFILE* const handle = sf_open_virtual(&io, SFM_READ, &info, &stream)) {
-        sf_close(handle);
-        return true;
-    }
+    const SoundFile trial(file, SFM_READ, info);
+    return true;
+} catch (const UserError&) {
+    return false;
+}
+
+bool SoundFile::MayBeSound(File& file) {
     // A tag may be longer than all that there is.
-    return sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT || StartsWith(file, "ID3");
+    return Opens(file) || sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT || StartsWith(file, "ID3");
 }
 
 SoundFile::~SoundFile() {

@@ -23,6 +23,8 @@ public:
     // False for bytes, from the start of `file` on, that no kind of sound file starts with; true where only
     // the rest is missing.
     static bool MayBeSound(File& file);
+    // Whether what is there of `file` can be read already.
+    static bool Opens(File& file);
 
     SNDFILE* Get() const { return m_handle; }
     File& Bytes() const { return m_stream.file; }

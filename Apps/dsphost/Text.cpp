@@ -1,9 +1,11 @@
 #include "Text.h"
 
 #include <algorithm>
+#include <array>
 #include <charconv>
 #include <cmath>
 #include <cstdint>
+#include <cstdio>
 #include <numeric>
 #include <utility>
 
@@ -30,6 +32,32 @@ std::size_t Distance(std::string_view a, std::string_view b) {
         }
     }
     return row.back();
+}
+
+struct Character {
+    std::uint32_t code;
+    std::size_t length;  // in bytes; 0 where there is none, and the code is that of the first byte
+};
+
+// What a text that is not empty starts with.
+Character FirstCharacter(std::string_view utf8) {
+    constexpr std::array<std::uint32_t, 5> kLowest{0, 0, 0x80, 0x800, 0x10000};
+    const std::uint32_t lead = static_cast<unsigned char>(utf8[0]);
+    const std::size_t length = lead < 0x80 ? 1 : lead < 0xC0 ? 0 : lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
+    std::uint32_t code = length > 1 ? lead & (0x7Fu >> length) : lead;
+    for (std::size_t i = 1; i < length; ++i) {
+        const auto next = i < utf8.size() ? static_cast<unsigned char>(utf8[i]) : 0u;
+        if ((next & 0xC0) != 0x80) return {lead, 0};
+        code = code << 6 | (next & 0x3F);
+    }
+    const bool none = code < kLowest[length] || (code >= 0xD800 && code < 0xE000) || code > 0x10FFFF;
+    return none || lead > 0xF4 ? Character{lead, 0} : Character{code, length};
+}
+
+// Marks that break a line or turn the direction in which what follows is shown.
+bool MovesText(std::uint32_t code) {
+    return code == 0x061C || code == 0x200E || code == 0x200F || (code >= 0x2028 && code <= 0x202E) ||
+           (code >= 0x2066 && code <= 0x2069);
 }
 
 }  // namespace
@@ -65,22 +93,10 @@ std::string Utf8(std::wstring_view wide) {
 
 std::wstring Wide(std::string_view utf8) {
     std::wstring wide;
-    for (std::size_t i = 0; i < utf8.size();) {
-        const auto lead = static_cast<unsigned char>(utf8[i++]);
-        const int tail = lead < 0x80   ? 0
-                         : lead < 0xC2 ? -1
-                         : lead < 0xE0 ? 1
-                         : lead < 0xF0 ? 2
-                         : lead < 0xF5 ? 3
-                                       : -1;
-        std::uint32_t code = tail > 0 ? lead & (0x3Fu >> tail) : tail == 0 ? lead : 0xFFFD;
-        for (int k = 0; k < tail; ++k) {
-            if (i == utf8.size() || (static_cast<unsigned char>(utf8[i]) & 0xC0) != 0x80) {
-                code = 0xFFFD;
-                break;
-            }
-            code = code << 6 | (static_cast<unsigned char>(utf8[i++]) & 0x3Fu);
-        }
+    while (!utf8.empty()) {
+        auto [code, length] = FirstCharacter(utf8);
+        utf8.remove_prefix(std::max(length, std::size_t{1}));
+        if (length == 0) code = 0xFFFD;
         if (code > 0xFFFF && sizeof(wchar_t) == 2) {
             wide += static_cast<wchar_t>(0xD7C0 + (code >> 10));
             code = 0xDC00 + (code & 0x3FF);
@@ -92,20 +108,20 @@ std::wstring Wide(std::string_view utf8) {
 
 std::string Escaped(std::string_view text) {
     std::string escaped;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        const auto byte = static_cast<unsigned char>(text[i]);
-        // The upper control characters are two bytes, of which the first is no character alone.
-        const bool upper =
-            byte == 0xC2 && i + 1 < text.size() && static_cast<unsigned char>(text[i + 1]) < 0xA0;
-        if (byte == '\n') {
-            escaped += "\\n";
-        } else if (byte < 0x20 || byte == 0x7F || upper) {
-            constexpr char kDigits[] = "0123456789abcdef";
-            const auto code = upper ? static_cast<unsigned char>(text[++i]) : byte;
-            escaped.append("\\x").append(1, kDigits[code >> 4]).append(1, kDigits[code & 15]);
+    while (!text.empty()) {
+        const auto [code, length] = FirstCharacter(text);
+        const std::size_t bytes = std::max(length, std::size_t{1});
+        char number[16];
+        if (length == 0 || code < 0x20 || (code >= 0x7F && code < 0xA0)) {
+            std::snprintf(number, sizeof number, "\\x%02x", static_cast<unsigned>(code));
+            escaped += code == '\n' ? "\\n" : number;
+        } else if (MovesText(code)) {
+            std::snprintf(number, sizeof number, "\\u%04x", static_cast<unsigned>(code));
+            escaped += number;
         } else {
-            escaped += text[i];
+            escaped += text.substr(0, bytes);
         }
+        text.remove_prefix(bytes);
     }
     return escaped;
 }

@@ -11,7 +11,8 @@ namespace dsphost {
 std::string Utf8(std::wstring_view wide);
 // What is no UTF-8 becomes U+FFFD.
 std::wstring Wide(std::string_view utf8);
-// Control characters as \n or \x1b, so that a text keeps to its line and a terminal only shows it.
+// Control characters, marks that turn the direction and what is no UTF-8 as \n, \x1b or \u202e, so that a
+// text keeps to its line and a terminal only shows it.
 std::string Escaped(std::string_view text);
 // At most `most` bytes, with dots where the rest was.
 std::string Shortened(std::string_view text, std::size_t most);

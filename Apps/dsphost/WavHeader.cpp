@@ -4,6 +4,8 @@
 #include <array>
 #include <string_view>
 
+#include "Text.h"
+
 namespace dsphost {
 namespace {
 
@@ -27,10 +29,10 @@ constexpr std::array<std::uint32_t, 6> kUnknownSizes{0,          0xFFFFFFFF, 0x7
                                                      0x7FFFFF00, 0x7FFFFFFF, 0x80000000};
 constexpr std::size_t kCertainlyUnknown = 2;
 
-// Chunks that stand behind the samples.
-constexpr std::array<std::string_view, 18> kChunkNames{"LIST", "bext", "id3 ", "ID3 ", "cue ", "smpl",
-                                                       "JUNK", "PAD ", "fact", "iXML", "inst", "plst",
-                                                       "acid", "_PMX", "axml", "umid", "PEAK", "afsp"};
+// Chunks that stand behind the samples, in either case.
+constexpr std::array<std::string_view, 17> kChunkNames{"LIST", "bext", "id3 ", "cue ", "smpl", "JUNK",
+                                                       "PAD ", "fact", "iXML", "inst", "plst", "acid",
+                                                       "_PMX", "axml", "umid", "PEAK", "afsp"};
 
 // The bytes of a stream, all of them kept.
 class Keeper {
@@ -135,7 +137,9 @@ std::optional<WavStreamHeader> ReadWavStreamHeader(const ByteSource& source,
 
 bool StartsChunk(std::string_view bytes, std::int64_t sampleBytes) {
     const std::size_t padding = sampleBytes % 2 == 0 ? 0 : 1;
-    return bytes.size() >= padding + 4 && std::ranges::count(kChunkNames, bytes.substr(padding, 4)) > 0;
+    return bytes.size() >= padding + 4 && std::ranges::any_of(kChunkNames, [&](std::string_view name) {
+               return SameNoCase(name, bytes.substr(padding, 4));
+           });
 }
 
 std::vector<unsigned char> MakeWavHeader(const WavShape& shape, std::optional<std::int64_t> sampleBytes) {

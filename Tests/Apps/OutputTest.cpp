@@ -15,6 +15,17 @@
 #include <unistd.h>
 #endif
 
+#if defined(__linux__)
+#include <sys/syscall.h>
+
+// Stands in front of the system's: how often it stored before there was a file "a", and after.
+static int g_early, g_late;
+extern "C" int fsync(int descriptor) {
+    ++(std::filesystem::exists("a") ? g_late : g_early);
+    return static_cast<int>(syscall(SYS_fsync, descriptor));
+}
+#endif
+
 // What becomes of files that are there before, or come meanwhile.
 namespace AppTest {
 namespace {
@@ -69,6 +80,15 @@ TEST_F(Outputs, FollowLinksAndKeepThem) {
 }
 #endif
 
+#if defined(__linux__)
+TEST_F(Outputs, AreOnTheDiskBeforeTheyHaveTheirName) {
+    g_early = g_late = 0;
+    Open("a", false)->Commit();
+    EXPECT_EQ(g_early, 1);
+    EXPECT_EQ(g_late, 0);
+}
+#endif
+
 // Names that leave no room for what is put behind them, and names that are not of this place.
 TEST_F(Outputs, HaveAnyName) {
     for (const std::string& name :
@@ -106,7 +126,10 @@ TEST_F(Outputs, KeepOwnerAndPermissionsAndWhatIsProtected) {
     ExpectRefused(Shell("DSPHOST render -y - in.wav < in.wav"), "in.wav|input");
     ExpectRefused(Shell("DSPHOST render in.wav - >> in.wav"), "standard output|input");
     // What is printed of a name stays on its line.
-    ExpectRefused(Run("render '\x1B[31m\n.wav' o.wav"), "\\x1b[31m\\n.wav");
+    ExpectRefused(Run("render '\x1B[31m\n\xC5\xBC\xC2\x85\x9B\xE2\x80\xAE.wav' o.wav"),
+                  "\\x1b[31m\\n\xC5\xBC\\x85\\x9b\\u202e.wav");
+    const auto mixed = Shell("DSPHOST render in.wav - --fx Gain --save-chunk /dev/stdout | wc -c");
+    EXPECT_EQ(std::stoi(mixed.out), 0) << mixed.err;
 }
 #endif
 

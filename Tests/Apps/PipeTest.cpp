@@ -140,7 +140,7 @@ TEST_F(Pipes, KnowTheirSizeOrNot) {
         EXPECT_EQ(result.err.find("ended after 3000 of") != std::string::npos, c.meant) << result.err;
         EXPECT_EQ(Load("out.wav").samples, Load("in.wav").samples);
     }
-    EXPECT_TRUE(dsphost::StartsChunk("LIST.", 6));
+    EXPECT_TRUE(dsphost::StartsChunk("Junk.", 6));
     EXPECT_TRUE(dsphost::StartsChunk("\0LIST"s, 7));
     EXPECT_FALSE(dsphost::StartsChunk("\0\0\0\0\0"s, 6));
 }
@@ -163,6 +163,8 @@ TEST_F(Pipes, BoundsWhatItKeepsOfAStream) {
     for (const auto& [line, words] :
          {std::pair{"DSPHOST render /dev/zero out.wav", "/dev/zero|not an audio file"},
           {"{ printf 'RIFF....WAVE'; yes LIST | tr '\\n' '\\0'; } | DSPHOST render - out.wav", "first MiB"},
+          {"{ printf fLaC; cat /dev/zero; } | DSPHOST render - out.wav", "not an audio file"},
+          {"DSPHOST render /proc/version out.wav", "/proc/version|not an audio file"},
           {"DSPHOST denoise /dev/zero out.wav --learn 0:1", "--learn|/dev/zero"},
           {"DSPHOST render - out.wav --spool-limit 64K < in.flac", "65536 bytes|--spool-limit"}})
         ExpectRefused(Shell(line), words);

@@ -26,6 +26,8 @@ TEST_F(RenderCommand, SetsParametersByLabelAndText) {
         {"the effect alone is not neutral", "Gain", 1, 0, 0, 1},
         {"case, blanks, no unit", "gain:  gAIN = -6 ", half, 0, 0, half},
         {"text without a number", "Gain: Gain=-Inf. dB", 1e-4, 0, 0, 1e-4},
+        {"far below all floors", "Gain: Gain=-1e400", 1e-4, 0, 0, 1e-4},
+        {"next to nothing", "Gain: Gain=1e-400", 1, 0, 0, 1},
         {"normalised value", "Gain: Pan=n:1", 0, 0, 0, makeUp},
         {"one side", "Gain: Flip phase L=On", -1, 0, 0, 1},
         {"later settings win", "Gain: Flip phase=On, Flip phase R=Off", -1, 0, 0, 1},
@@ -47,6 +49,9 @@ TEST_F(RenderCommand, SetsParametersByLabelAndText) {
     }
     for (const auto& [fx, warning] :
          {std::pair{"Gain: Gain=40 dB", "Gain=40 dB is beyond the range; 20.0 dB is used"},
+          {"Gain: Gain=1e39", "Gain=1e39 is beyond the range; 20.0 dB is used"},
+          {"Echo: Delay=-1e400", "Delay L=-1e400 is beyond the range; -30.0 dB is used"},
+          {"Echo: Delay=-1e400", "Delay R=-1e400 is beyond the range; -30.0 dB is used"},
           {"Pitch Shift: Pitch=100", "Pitch=100 is beyond the range; 12.0 semitones"}}) {
         const auto beyond = Run(std::string("render in.wav out.wav -y --fx \"") + fx + "\"");
         EXPECT_EQ(beyond.status, 0);

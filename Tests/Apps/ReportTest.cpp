@@ -51,6 +51,7 @@ TEST_F(Reports, DescribeEveryEffect) {
         for (const std::string preset : effect.at("presets")) chain.push_back(name + ": preset=" + preset);
         EXPECT_NO_THROW(dsphost::Chain{chain});
     }
+    EXPECT_NE(Succeed("effects EQ").find("lowshelf"), std::string::npos);
     const auto text = Succeed("effects Gain");
     for (const std::string words : {"-Inf. dB", "20.0 dB", "-1.00", "Flip phase R", "Off", "On", "latency 0"})
         EXPECT_NE(text.find(words), std::string::npos) << words << " in\n" << text;

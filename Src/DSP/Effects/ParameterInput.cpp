@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <limits>
 #include <memory>
 #include <optional>
 #include <stdexcept>
@@ -30,12 +31,19 @@ std::size_t NumberLength(std::string_view text) {
     return error == std::errc::invalid_argument ? 0 : static_cast<std::size_t>(end - text.data());
 }
 
+// Infinite or 0 where a double holds no such number.
 std::optional<double> NumberOf(std::string_view text) {
-    if (text.starts_with('+')) text.remove_prefix(1);
+    const std::string_view number = text.substr(0, NumberLength(text));
+    if (number.empty()) return {};
+    const std::size_t plus = number[0] == '+' ? 1 : 0;
     double value;
-    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
-    if (error != std::errc{} || end == text.data() || !std::isfinite(value)) return {};
-    return value;
+    if (std::from_chars(number.data() + plus, number.data() + number.size(), value).ec == std::errc{})
+        return value;
+    const auto exponent = number.find_first_of("eE");
+    const bool tiny = exponent == number.npos ? number.find_first_of("123456789") > number.find('.')
+                                              : number[exponent + 1] == '-';
+    const double size = tiny ? 0.0 : std::numeric_limits<double>::infinity();
+    return number[0] == '-' ? -size : size;
 }
 
 // "4 x" and "4" name the same choice when the unit is "x".
@@ -79,14 +87,18 @@ bool BeyondRange(double number, float normalised, std::string_view shown) {
     return normalised >= 1.0f ? number > *end + slack : number < *end - slack;
 }
 
-// -1 for what the effect's parser does not take.
+// -1 for what the effect's parser does not take. A number that no float holds is beyond the range on its
+// side, or nothing.
 float Parsed(CorvoEffectBase& effect, int index, std::string_view text) {
     try {
         return effect.GetParamValueNormalizedFromText(index, std::string(text));
     } catch (const std::invalid_argument&) {
         return -1.0f;
     } catch (const std::out_of_range&) {
-        return -1.0f;
+        const double number = NumberOf(text).value_or(0.0);
+        return number == 0.0  ? effect.GetParamValueNormalizedFromText(index, "0")
+               : number > 0.0 ? 1.0f
+                              : 0.0f;
     }
 }
 

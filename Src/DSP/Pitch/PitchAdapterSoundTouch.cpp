@@ -186,22 +186,39 @@ void PitchAdapterSoundTouch::SetQuality(int index) {
 void PitchAdapterSoundTouch::Fill() {
     if (!Ready() || (m_filledChannels == m_told.channels && m_filledRate == m_told.rate)) return;
     const auto wanted = m_told;
-    m_scratch.assign(kScratchSamples, 0.0f);
     const int block = static_cast<int>(kScratchSamples) / m_channels;
+    m_scratch.assign(kScratchSamples, 0.0f);
     for (const float pitch : {kLowestPitch, 1.0f, kOctave}) {
         auto other = wanted;
         other.pitch = pitch;
         other.quickSeek = 1;  // as much output of silence, sooner
         Configure(other);
         m_engine->clear();
-        // The lowest pitch asks for the most input, but for no more output than the others.
-        const std::int64_t enough = pitch == kLowestPitch ? 1 : block;
-        for (int i = 0; Held() < enough && i < kMostFillPieces; ++i) Put(m_scratch.data(), kPiece);
-        if (pitch != kLowestPitch) Put(m_scratch.data(), block);
+        if (pitch < 1.0f)
+            FillBeforeStart();
+        else
+            FillWhileRunning(block);
     }
     Configure(wanted);
     m_filledChannels = wanted.channels;
     m_filledRate = wanted.rate;
+}
+
+// The lowest pitch asks for the most input: a piece that comes when one frame is missing to a whole sequence.
+// The engine begins somewhat before its latency, as its filter starts with silence.
+void PitchAdapterSoundTouch::FillBeforeStart() {
+    const int early = m_told.filterLength;
+    for (int left = m_engine->getSetting(SETTING_INITIAL_LATENCY) - early; left > 0; left -= kPiece)
+        Put(m_scratch.data(), std::min(left, kPiece));
+    WithEngine([&] { m_engine->putSamples(m_scratch.data(), static_cast<unsigned>(kPiece + early)); });
+}
+
+// The others make the most output: of a block that ends one more sequence, with another block still held.
+void PitchAdapterSoundTouch::FillWhileRunning(int block) {
+    for (int i = 0; Held() < block && i < kMostFillPieces; ++i) Put(m_scratch.data(), kPiece);
+    const int frames = block + m_engine->getSetting(SETTING_NOMINAL_INPUT_SEQUENCE);
+    const std::vector<float> silence(Samples(frames, m_channels));
+    Put(silence.data(), frames);
 }
 
 void PitchAdapterSoundTouch::ProcessInPlace(float* buffer, int frames) {

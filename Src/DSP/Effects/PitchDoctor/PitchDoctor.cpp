@@ -12,6 +12,7 @@ namespace Corvo::DSP {
 namespace {
 
 constexpr std::int32_t kChunkVersion = 1;
+constexpr std::uint32_t kHighestRate = 768000;
 constexpr std::uint32_t kFields = kWordsOf<PitchDoctorSettings>;
 
 }  // namespace
@@ -131,8 +132,9 @@ void PitchDoctor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const Cook cook = TakeCook(m_format, *format, force);
     if (!cook.due) return;
     InitEnvelopes(true);
-    if (cook.afresh) m_engines->Prepare(format->nSamplesPerSec);
-    m_rate.store(format->nSamplesPerSec, std::memory_order_relaxed);
+    const auto rate = std::min<std::uint32_t>(format->nSamplesPerSec, kHighestRate);
+    if (cook.afresh) m_engines->Prepare(rate);
+    m_rate.store(rate, std::memory_order_relaxed);
     const auto settings = WithinRanges(Snapshot(m_settings));
     m_engines->Use(m_engines->all[LowestPitchOf(settings)].get());
     if (m_engines->inUse) m_engines->inUse->Cook(VoiceOf(settings));

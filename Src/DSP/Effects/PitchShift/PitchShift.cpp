@@ -39,7 +39,7 @@ constexpr _transform_props SettingsOf(std::int32_t pitch) {
             .backEnd = 1};
 }
 
-constexpr int kMostEngineChannels = 16;  // of the "New" back-end
+constexpr int kMostEngineChannels = 16, kQualityOfANewEngine = 5;  // of the "New" back-end
 
 // Semitones of a ratio, and the way back to a normalised value, in the single precision of saved projects.
 constexpr float kSemitonesPerDecade = 39.863106f;
@@ -109,9 +109,11 @@ struct Setup {
     static Setup Of(const _transform_props& record, int channels, int rate) {
         return {record.pitch, record.fftSize, record.quality, channels, rate};
     }
-    // May throw std::bad_alloc.
-    void Tell(PitchAdapter& adapter) const {
+    // To one that was told before, `afresh` makes it sound like a new one: how much silence the engine starts
+    // with comes from the quality that it had. May throw std::bad_alloc.
+    void Tell(PitchAdapter& adapter, bool afresh) const {
         if (channels < 1 || channels > kMostEngineChannels) return;
+        if (afresh) adapter.SetQuality(kQualityOfANewEngine);
         adapter.SetChannelsNum(channels);
         adapter.SetSampleRate(rate);
         SendFactors(adapter, pitch, channels);
@@ -150,7 +152,7 @@ struct PitchShift::BackEnds {
         BackEnd made = Make(index);
         if (const int known = rate.load(); known > 0) {
             made.toldAhead = Setup::Of(record, channels.load(), known);
-            made.toldAhead->Tell(*made.adapter);
+            made.toldAhead->Tell(*made.adapter, true);
         }
         // The audio thread may have given the old one back without having named the new one yet.
         auto* cameBack = slots.Draft().adapter.get();
@@ -176,7 +178,7 @@ struct PitchShift::BackEnds {
     }
     PitchAdapter* InUse() { return slots.Taken().adapter.get(); }
     // May throw std::bad_alloc.
-    void Use(int index, const Setup& setup) {
+    void Use(int index, const Setup& setup, bool afresh) {
         BackEnd& taken = slots.Taken();
         if (taken.index != index) {
             int expectedIndex = taken.index;
@@ -187,7 +189,7 @@ struct PitchShift::BackEnds {
             newest.compare_exchange_strong(expected, InUse());
             NameTheOneInUse();
         }
-        if (std::exchange(taken.toldAhead, {}) != setup) setup.Tell(*InUse());
+        if (std::exchange(taken.toldAhead, {}) != setup) setup.Tell(*InUse(), afresh);
     }
 
 private:
@@ -280,13 +282,13 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
         m_back_ends->factorsPending.store(true, std::memory_order_relaxed);
 }
 
-bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool) {
+bool PitchShift::InitState(const _transform_props& record, const tWAVEFORMATEX* format, bool force) {
     InitEnvelopes(true);
     const int channels = format->nChannels, rate = static_cast<int>(format->nSamplesPerSec);
     m_back_ends->channels.store(channels);
     m_back_ends->rate.store(rate);
     try {
-        m_back_ends->Use(BackEndIndex(record), Setup::Of(record, channels, rate));
+        m_back_ends->Use(BackEndIndex(record), Setup::Of(record, channels, rate), force);
     } catch (const std::bad_alloc&) {
         return false;
     }

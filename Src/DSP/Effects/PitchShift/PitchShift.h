@@ -64,7 +64,8 @@ public:
     bool AllowChangeParamFromInputBox(int index) override;
 
     // Configures the back-end that the record names for the format; it is made on the spot when another one
-    // is in use. Not while another thread edits. False without memory. `force` makes no difference.
+    // is in use. Not while another thread edits. False without memory. With `force` it sounds like a new one;
+    // without, it allocates only for another format or back-end.
     bool InitState(const PitchShiftPrivate::_transform_props& record, const tWAVEFORMATEX* format,
                    bool force);
     // Derives the pitch factors and sends them to the newest back-end, if there is one. On the user-interface

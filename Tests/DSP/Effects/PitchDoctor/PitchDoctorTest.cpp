@@ -293,7 +293,11 @@ TEST(PitchDoctor, ListsNotesWithoutWhatIsShort) {
 TEST(PitchDoctor, AnnouncesAnotherLatency) {
     PitchDoctor effect;
     EXPECT_EQ(effect.GetLatency(), 0);
-    const auto format = Format<float>(2, 96000);
+    auto format = Format<float>(2, 96000);
+    format.nSamplesPerSec = 0xFFFFFFFF;
+    effect.InitProcessing(64, &format);
+    EXPECT_EQ(effect.GetLatency(), 16384) << "counts as 768 kHz";
+    format.nSamplesPerSec = 96000;
     effect.InitProcessing(64, &format);
     EXPECT_EQ(effect.GetLatency(), 2048);
     const auto lowest = IndexOf(effect, "Lowest pitch");

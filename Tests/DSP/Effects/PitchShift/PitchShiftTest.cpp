@@ -59,7 +59,8 @@ TEST_F(PitchShiftTest, DrivesTheBackEndItsRecordNames) {
 }
 
 // Catches a back-end that is configured, made or freed, and an engine that grows its buffers, by the block
-// that takes an edit. "New", which all presets name, locks.
+// that takes an edit, or by the largest blocks at either end of the pitch. "New", which all presets name,
+// locks.
 TEST_F(PitchShiftTest, OnlyNewLocksWhileItProcesses) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
     for (const int rate : {8000, 48000}) {
@@ -77,6 +78,17 @@ TEST_F(PitchShiftTest, OnlyNewLocksWhileItProcesses) {
             const auto broken = BrokenBy([&] { ProcessBlock(m_effect, m_block.data(), frames, format); });
             const bool locksOnly = broken.ends_with("locks") && broken.find(',') == broken.npos;
             ASSERT_TRUE(backEnd == 1 ? locksOnly : broken.empty()) << broken << ", block " << i;
+        }
+        m_block.resize(2 * 8192);
+        for (const float pitch : {0.0f, 1.0f}) {
+            PitchShift effect;
+            effect.SetPreset(0);
+            effect.SetParam(0, pitch, false);
+            effect.InitProcessing(8192, &format);
+            for (int i = 0; i < 20; ++i) {
+                const auto broken = BrokenBy([&] { ProcessBlock(effect, m_block.data(), 8192, format); });
+                ASSERT_EQ(broken.find("alloc"), broken.npos) << pitch << ", block " << i;
+            }
         }
     }
 }
