@@ -289,9 +289,9 @@ void Program::LookAfterSound(bool inTurn) {
 
 std::string Program::Trouble() const {
     if (m_player.IsOpen())
-        return m_wasHeard && !m_options.noAudio ? "The sound output is gone: the file goes on silently, and "
-                                                  "is heard when there is one again."
-                                                : "";
+        return m_wasHeard && !m_options.noAudio
+                   ? "The sound output is gone; the file is heard again as soon as there is one."
+                   : "";
     if (m_options.noAudio) return "Nothing is listened to (--no-audio): drop an audio file here.";
     if (!m_hasAudio) return "There is no sound system here; an audio file can be dropped on the window.";
     return m_input->Trouble();
