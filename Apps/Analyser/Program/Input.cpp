@@ -76,18 +76,16 @@ void Input::KeepTime() {
     SDL_UnlockAudioDevice(m_device);
 }
 
-bool Input::Want(const std::string& name) {
+void Input::Want(const std::string& name) {
     m_wanted = name;
     Close();
-    return Retry();
 }
 
-bool Input::Retry() {
+bool Input::Open() {
     if (m_wanted.empty()) m_systems = DefaultName();
     if (m_device) return true;
     const std::string name = m_wanted.empty() ? "" : Present();
-    // Where none is listed none is asked for: that would only make the system complain.
-    if ((name.empty() && !m_wanted.empty()) || SDL_GetNumAudioDevices(1) == 0) return false;
+    if (name.empty() && !m_wanted.empty()) return false;
     SDL_AudioSpec wanted = FloatSound(48000, 2, 512), got{};
     wanted.callback = Take;
     wanted.userdata = this;

@@ -18,7 +18,8 @@ namespace {
 
 constexpr int kRefreshes = 30;
 constexpr int kRetryEvery = 60, kKeepEvery = 60;  // refreshes
-constexpr int kFailures = 2;                      // until the sound system is asked anew
+// Until the sound system is asked anew: soon for one that was heard, seldom where there may be none.
+constexpr int kFailures = 2, kFailuresAtFirst = 5;
 constexpr const char* kInputLine = "Input = ";
 
 struct KeyPair {
@@ -264,19 +265,26 @@ void Program::Listen(const std::string& name) {
     m_input->Close();
     m_chosenInput = name;
     m_view->StartOver();
-    if (m_hasAudio) m_input->Want(name);
+    m_input->Want(name);
     LookAfterSound(false);
+}
+
+bool Program::Hear(bool inTurn) {
+    if (m_options.noAudio || (!m_hasAudio && !StartAudio())) return false;
+    const bool plays = m_player.IsOpen(), open = plays ? m_player.IsHeard() : m_input->IsOpen();
+    // Where none is listed another try would only make the system complain.
+    if (inTurn && !open && SDL_GetNumAudioDevices(plays ? 0 : 1) == 0) return false;
+    return plays ? m_player.Hear() : m_input->Open();
 }
 
 // `inTurn`: not because something has come or gone.
 void Program::LookAfterSound(bool inTurn) {
     const bool plays = m_player.IsOpen();
-    const bool works =
-        !m_options.noAudio && (m_hasAudio || StartAudio()) && (plays ? m_player.Hear() : m_input->Retry());
+    const bool works = Hear(inTurn);
     m_wasHeard = m_wasHeard || (plays && works);
     m_view->SetTrouble(works && plays ? "" : Trouble());
     if (m_options.noAudio || !m_hasAudio) return;
-    if (works && SDL_GetCurrentAudioDriver() && (plays || m_input->HasHeard()))
+    if (works && (plays ? m_player.Get().position > 0.0 : m_input->HasHeard()))
         m_audioDriver = SDL_GetCurrentAudioDriver();
     // What is not there now may come. Another system may be there, too, while none was heard yet.
     const bool hopes = !m_audioDriver.empty() && !plays && !m_input->IsThere();
@@ -284,7 +292,9 @@ void Program::LookAfterSound(bool inTurn) {
         m_failures = 0;
     else if (inTurn)
         ++m_failures;
-    if (m_failures >= kFailures && !IsToneOn()) RestartAudio();  // which would end the tone
+    // A moment without pictures, and the end of the tone.
+    const int most = m_audioDriver.empty() ? kFailuresAtFirst : kFailures;
+    if (m_failures >= most && !IsToneOn()) RestartAudio();
 }
 
 std::string Program::Trouble() const {

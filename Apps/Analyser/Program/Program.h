@@ -57,6 +57,7 @@ private:
     void Paint();
     void OpenFile(const std::string& path);
     void Listen(const std::string& name);
+    bool Hear(bool inTurn);
     void LookAfterSound(bool inTurn);
     std::string Trouble() const;
     bool StartAudio();
