@@ -116,11 +116,14 @@ TEST_F(PlayedFile, WaitsForItsOutputAndGoesOnWithoutIt) {
     ASSERT_EQ(SDL_AudioInit("dummy"), 0) << SDL_GetError();
     Open(Write("heard.wav", SF_FORMAT_WAV, 0.6));
     ASSERT_TRUE(m_player.Hear());
-    while (m_player.Get().position < 0.3) {
+    while (m_player.Get().position < 0.45) {
         Step();
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
     EXPECT_NEAR(Beginning(), -m_half, 0.04);
+    m_player.TogglePlaying();
+    EXPECT_FALSE(m_player.Get().ended) << "though the output has got the end already";
+    m_player.TogglePlaying();
     m_player.Mute();
     Step(30);
     EXPECT_TRUE(m_player.Get().ended);

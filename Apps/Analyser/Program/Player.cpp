@@ -63,7 +63,7 @@ void Player::Mute() {
 
 Playback Player::Get() const {
     const double rate = m_info.samplerate;
-    const bool ended = !m_playing && (m_atEnd || Position() >= m_info.frames);
+    const bool ended = !m_playing && ((m_atEnd && m_ahead.empty()) || Position() >= m_info.frames);
     return {static_cast<double>(Position()) / rate, static_cast<double>(m_info.frames) / rate, m_playing,
             m_waits, ended};
 }

@@ -29,10 +29,7 @@ std::string Manual(const std::vector<ShellOption>& options) {
                        "dropped on the window.\n.SH OPTIONS\n";
     for (const auto& option : options) page += Item(option.name, option.type, option.help);
     page += ".SH KEYS\nEvery entry of the menu is two keys away, which it shows.\n";
-    for (const CommandRow& row : Commands()) {
-        const std::string group = row.group;
-        page += Item(row.shortcut, "", group.empty() ? row.text : group + ": " + row.text);
-    }
+    for (const CommandRow& row : Commands()) page += Item(row.shortcut, "", row.text);
     return page +
            ".SH FILES\n.TP\n.I ~/.config/dspdll/analyser.conf\nWhat was chosen, or below "
            "\\fB$XDG_CONFIG_HOME\\fR.\n"
