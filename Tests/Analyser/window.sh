@@ -173,6 +173,15 @@ plug_in() {
     plug_in
     hears 330 -12 "the microphone of a new sound server"
     stop
+    plays() { pactl list sink-inputs | grep -q '"dspdll-analyser"' || fail "$1 is not played"; }
+    start "$work/330.wav"
+    plays "a file"
+    kill $server
+    sleep 3
+    sound
+    sleep 5
+    plays "a file whose sound server was started again"
+    stop
     kill $server
     exit $failed
 ) || failed=1

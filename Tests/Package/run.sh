@@ -12,6 +12,13 @@ cmake --install "$build_dir" --prefix "$work/first" >/dev/null
 mv "$work/first" "$work/installed"
 
 if [ -x "$work/installed/bin/dsphost" ]; then "$work/installed/bin/dsphost" --version; fi
+if [ -x "$work/installed/bin/dspdll-analyser" ]; then
+    "$work/installed/bin/dspdll-analyser" --version
+    for file in man/man1/dspdll-analyser.1 bash-completion/completions/dspdll-analyser \
+        applications/dspdll-analyser.desktop icons/hicolor/scalable/apps/dspdll-analyser.svg; do
+        [ -s "$work/installed/share/$file" ]
+    done
+fi
 
 # The examples are the README's only blocks of C++ and of C.
 for language in cpp c; do

@@ -76,13 +76,12 @@ void Input::KeepTime() {
     SDL_UnlockAudioDevice(m_device);
 }
 
-bool Input::Want(const std::string& name) {
+void Input::Want(const std::string& name) {
     m_wanted = name;
     Close();
-    return Retry();
 }
 
-bool Input::Retry() {
+bool Input::Open() {
     if (m_wanted.empty()) m_systems = DefaultName();
     if (m_device) return true;
     const std::string name = m_wanted.empty() ? "" : Present();

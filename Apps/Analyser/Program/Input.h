@@ -22,12 +22,13 @@ public:
     // The names of what is there.
     static std::vector<std::string> Names();
 
-    // The device that is wanted from now on; an empty name is the system's choice. False when it cannot be
-    // opened now; Retry does so when it is there.
-    bool Want(const std::string& name);
-    bool Retry();
+    // The device that is wanted from now on; an empty name is the system's choice.
+    void Want(const std::string& name);
+    // Listens to it, unless it does; false while it cannot be opened.
+    bool Open();
     void Close();
     bool IsOpen() const { return m_device != 0; }
+    bool HasHeard() const { return m_blocks.load(std::memory_order_relaxed) != 0; }
     // Whether what is wanted is there, so that it should open.
     bool IsThere() const;
     // At each refresh: lets silence be heard where nothing has come for a while.
