@@ -21,8 +21,8 @@ struct GlidingCurve {
     };
     // Room for the points of what is heard and of a new target.
     static constexpr std::size_t kRoom = 2 * TransferCurve::kMaxPoints;
-    std::array<Point, kRoom> points;
     int count = 0;
+    std::array<Point, kRoom> points;
 
     double X(int i, double factor) const {
         const Point& point = points[static_cast<std::size_t>(i)];
@@ -60,9 +60,9 @@ int GlideFrames(double factor, double smoothing);
 // Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
 // targets exactly.
 struct GlidingMap {
-    std::array<GlidingCurve, 2> m_comp_map;
     double factor = 0.0;
     int framesLeft = 0;
+    std::array<GlidingCurve, 2> m_comp_map;
 
     // Sets out for new curves from wherever the points are; nothing changes when these are the targets
     // already. What is heard stays the same until the factor shrinks. Where the last target's points have
