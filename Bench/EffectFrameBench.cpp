@@ -49,7 +49,7 @@ BENCHMARK_TEMPLATE(BM_BlockCopy, double)->Arg(512);
     for (const auto& row : TestSupport::AllEffects())
         benchmark::RegisterBenchmark((std::string("BM_EveryEffect/") + row.name).c_str(),
                                      [&row](benchmark::State& state) {
-                                         const auto effect = row.make();
+                                         const auto effect = row.Make();
                                          effect->SetPreset(effect->GetDefaultPreset());
                                          RunEffect<float>(state, *effect);
                                      })

@@ -252,7 +252,7 @@ void OpenEffect(benchmark::State& state, const TestSupport::EffectCase& effect) 
     constexpr std::size_t kInstances = 64;
     const auto format = TestSupport::Format<float>();
     std::vector<std::uint8_t> chunk;
-    const auto saved = effect.make();
+    const auto saved = effect.Make();
     saved->SetPreset(saved->GetDefaultPreset());
     saved->GetSettingsChunk(chunk);
     std::vector<std::unique_ptr<Corvo::DSP::CorvoEffectBase>> open;
@@ -265,7 +265,7 @@ void OpenEffect(benchmark::State& state, const TestSupport::EffectCase& effect) 
         rusage before{}, after{};
         getrusage(RUSAGE_THREAD, &before);
         const double start = ThreadSeconds();
-        open.push_back(effect.make());
+        open.push_back(effect.Make());
         open.back()->SetSettingsChunk(chunk);
         open.back()->InitProcessing(kMostFrames, &format);
         state.SetIterationTime(ThreadSeconds() - start);

@@ -142,7 +142,7 @@ list {
     sub(/^\/\* ---- /, "", title)
     sub(/ ----.*/, "", title)
     section = group "_" ++sections
-    printf "/** @} */ /** \\defgroup %s C: %s */ ", section, title
+    printf "/** @} */ /** \\defgroup %s C: %s\n * \\ingroup %s */ ", section, title, group
     if (/\*\//) print "/** \\addtogroup " section " */ /** @{ */"
     else print "/** \\addtogroup " section
     heading = !/\*\//
@@ -151,6 +151,23 @@ list {
 heading && /\*\// {
     print $0 " /** \\addtogroup " section " */ /** @{ */"
     heading = 0
+    next
+}
+# What the C interface's header begins with is about all of it; another one's is about that header, a part of it.
+FNR == 1 && /^\/\* / {
+    opening = 1
+    section = group
+    if (FILENAME !~ /\/dspdll\.h$/) {
+        title = FILENAME
+        sub(/^.*\//, "", title)
+        section = group "_" substr(title, 1, length(title) - 2)
+        printf "/** @} */ /** \\defgroup %s C: %s\n * \\ingroup %s */ ", section, title, group
+    } else printf "/** @} */ "
+    sub(/^\/\* /, "/** \\addtogroup " section "\n * ")
+}
+opening {
+    opening = !/\*\//
+    print code($0) (opening ? "" : " /** \\addtogroup " section " */ /** @{ */")
     next
 }
 /^\/\* / { said_in_c = "" }

@@ -131,7 +131,7 @@ constexpr void (Session::*kSteps[])() = {
 const Fuzz::Target target("Effects", [](Input& input) {
     const auto all = TestSupport::AllEffects();
     const auto which = static_cast<std::size_t>(input.Between(0, static_cast<int>(all.size()) - 1));
-    Session session{{input, all[which].make()}};
+    Session session{{input, all[which].Make()}};
     session.Preset();
     session.Prepare();
     for (int step = 0; step < 60 && !input.AtEnd(); ++step) (session.*input.OneOf(kSteps))();

@@ -64,4 +64,5 @@ Scripts/doc-links.py "$docs/site"
 
 say "spelling"
 codespell --ignore-words Docs/Site/words.txt README.md CHANGELOG.md Docs Src --skip '*.png,*.cpp'
+codespell --ignore-words Docs/Site/words.txt examples
 say "the documentation is build/docs/site/index.html"

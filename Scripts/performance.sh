@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # performance.sh [--write]: measures the library beside its packaged peers (Bench/rows.txt) and prints the tables of
-# Docs/performance.md, or puts them there. About five minutes on a machine with nothing else to do.
+# Docs/performance.md, or puts them there, and tells which rows miss their goals. About five minutes on a machine with
+# nothing else to do.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 source Scripts/common.sh
@@ -29,7 +30,7 @@ tables=$recordings/tables.md
         "$(cut -d' ' -f1 /proc/loadavg)" "$(c++ --version | head -1)"
     printf '`Scripts/performance.sh`, beside these Debian packages:\n'
     dpkg-query -W -f='`${Package}` ${Version}\n' "${peers[@]}" | sort -u | paste -sd, | sed 's/,/, /g; s/$/./'
-    printf '\nRatios are our time to theirs, medians of rounds in turn; one above its goal is bold.\n'
+    printf '\nA ratio is our time to theirs, so that below 1 ours is the quicker one. Times are medians of rounds in turn.\n'
     Scripts/performance.py "$PWD/build/bench/bin" "$recordings"
 } >"$tables"
 

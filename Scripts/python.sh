@@ -17,8 +17,6 @@ say "testing (python)"
 export PYTHONDONTWRITEBYTECODE=1
 PYTHONPATH=$PWD/build/python $python -m pytest -q -p no:cacheprovider Tests/Python
 
-PYTHONPATH=$PWD/build/python $python examples/08-python.py
-
 # The blocks of Python in the documentation.
 recordings=build/python/recordings
 mkdir -p $recordings
@@ -30,7 +28,7 @@ prefix=build/python/installed
 rm -rf $prefix build/python/moved
 cmake --install build/python --prefix "$PWD/$prefix" >/dev/null
 mv $prefix build/python/moved
-PYTHONPATH=$(echo build/python/moved/lib/python3*/*-packages) $python -c '
-import dspdll, numpy
-assert "moved" in dspdll.__file__ and dspdll.Gain()(numpy.zeros(9), 48000).shape == (9,)'
+installed=$(echo "$PWD"/build/python/moved/lib/python3*/*-packages)
+PYTHONPATH=$installed $python -c 'import dspdll; assert "moved" in dspdll.__file__'
+PYTHONPATH=$installed $python examples/08-python.py
 say "to use it: PYTHONPATH=$PWD/build/python $python"

@@ -82,7 +82,7 @@ protected:
     }
 
     static std::string Now() {
-        const auto effect = GetParam().make();
+        const auto effect = GetParam().Make();
         std::ostringstream out;
         out << "== " << effect->GetName() << "\nimage " << effect->GetImage() << ", icon "
             << effect->GetPluginIconPath() << ", chunk of " << effect->GetSettingsChunkSize() << ", default "
@@ -152,7 +152,7 @@ TEST_P(EveryEffectContract, IsAsPromised) {
 
 // Catches the oldest layout half loaded, or its words in the wrong places.
 TEST_P(EveryEffectContract, TakesItsOldestLayout) {
-    const auto effect = GetParam().make();
+    const auto effect = GetParam().Make();
     const auto fits = [&](const Bytes& chunk) {
         return FitsOldChunk<Corvo::DSP::Autovol, Corvo::DSP::Chorus, Corvo::DSP::Echo, Corvo::DSP::Reverb>(
             *effect, chunk);

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <functional>
 #include <limits>
 
 #include "Support/EveryEffect.h"
@@ -40,7 +41,7 @@ void ExpectTheSameHoweverCut(const EffectCase& row, int rate) {
     for (auto& cut : random) cut = 1 + source.Below(700);
     std::vector<Sample> whole;
     for (const auto& cuts : {std::vector<int>{kFrames}, {1}, {7}, {64}, {511}, {4096}, random}) {
-        const auto effect = row.make();
+        const auto effect = row.Make();
         const auto output = Render(*effect, input, format, cuts, MoveEverything(*effect, kFrames, 3));
         if (whole.empty()) whole = output;
         for (std::size_t i = 0; i < output.size(); ++i)
@@ -48,6 +49,25 @@ void ExpectTheSameHoweverCut(const EffectCase& row, int rate) {
                 << "frame " << i / 2 << ", blocks of " << cuts.front() << ": " << output[i] << " instead of "
                 << whole[i];
     }
+}
+
+using EditSettings = std::function<void(CorvoEffectBase&)>;
+
+// The second of two blocks; the edit is made in front of the first or between them.
+std::vector<float> SecondBlock(CorvoEffectBase& effect, const EditSettings& edit, bool whileItRuns) {
+    constexpr int kFrames = 4000;
+    const auto format = Format<float>(2, 8000);
+    Random random(5);
+    SetAllParams(effect, random);
+    if (!whileItRuns) edit(effect);
+    effect.InitProcessing(kFrames, &format);
+    std::vector<float> block;
+    for (const bool second : {false, true}) {
+        block = Noise<float>(2 * kFrames);
+        if (second && whileItRuns) edit(effect);
+        ProcessBlock(effect, block.data(), kFrames, format);
+    }
+    return block;
 }
 
 }  // namespace
@@ -156,4 +176,38 @@ TEST_P(EveryEffect, KeepsSilenceSilent) {
     const auto format = Format<double>();
     for (const double sample : Render(*effect, std::vector<double>(2 * 20000), format, {512}))
         ASSERT_LT(std::abs(sample), 1e-9);
+}
+
+// Catches settings that are stored and never taken into use: what makes a difference beforehand makes one
+// while the stream runs.
+TEST_P(EveryEffect, HearsEditsWhileTheStreamRuns) {
+    const auto expectHeard = [&](const EditSettings& edit, const std::string& what) {
+        const auto plain = SecondBlock(
+            *Make(), [](auto&) {}, true);
+        if (SecondBlock(*Make(), edit, false) != plain) {
+            EXPECT_NE(SecondBlock(*Make(), edit, true), plain) << what;
+        }
+    };
+    const auto other = Make();
+    for (int index = 0; index < other->GetParamCount(); ++index)
+        expectHeard(
+            [=](auto& effect) { effect.SetParam(index, effect.GetParam(index) < 0.5f ? 0.9f : 0.1f, false); },
+            "parameter " + std::to_string(index));
+    for (int preset = 0; preset < other->NumPresets(); preset += 5)
+        expectHeard([=](auto& effect) { effect.SetPreset(preset); }, "preset " + std::to_string(preset));
+    Random random(8);
+    SetAllParams(*other, random);
+    expectHeard([chunk = Chunk(*other)](auto& effect) { effect.SetSettingsChunk(chunk); }, "a chunk");
+}
+
+// Catches delay lines that play on what was there before the host jumped.
+TEST_P(EveryEffect, RingsNoMoreAfterALightReset) {
+    const auto effect = Make();
+    const auto format = Format<float>(2, 8000);
+    auto block = Render(*effect, Noise<float>(2 * 4000), format, {4000});
+    if (!(effect->LongestGap() > 0.0)) GTEST_SKIP() << "has no delay line";
+    effect->InitResetProcessingLight(true);
+    std::ranges::fill(block, 0.0f);
+    ProcessBlock(*effect, block.data(), 4000, format);
+    EXPECT_EQ(block, std::vector<float>(block.size()));
 }

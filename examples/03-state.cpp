@@ -1,9 +1,9 @@
-// State and presets: choose a preset by name, turn a control, save everything, restore it in another
-// instance.
+// State and presets: choose a preset by name, turn a control, save everything, restore it elsewhere.
 #include <cstdint>
 #include <cstdio>
 #include <fstream>
 #include <iterator>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -36,8 +36,7 @@ int main() {
         std::printf("as expected: %s\n", error.what());
     }
 
-    // The chunk is the same on every platform. Save it and not the preset's number: a control was turned
-    // since.
+    // The chunk is the same on every platform. Save it and not the preset's number: a control was turned.
     std::vector<std::uint8_t> chunk;
     chorus->GetSettingsChunk(chunk);
     std::ofstream("chorus.state", std::ios::binary)

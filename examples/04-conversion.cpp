@@ -29,8 +29,7 @@ int main() {
     // The filter still holds the end.
     while (const int frames = converter.Finish(piece.data(), static_cast<int>(piece.size()))) keep(frames);
 
-    // The filter's delay is taken out, so the output is the same sine at the other rate. The ends are left
-    // out.
+    // The filter's delay is taken out, so the output is the same sine at the other rate. Without the ends:
     double error = 0.0;
     for (int i = 480; i < 47520; ++i) error += std::pow(out[i] / 32768.0 - Sine(i / 48000.0), 2);
     const double decibels = 10.0 * std::log10(error / (47520 - 480));

@@ -1,5 +1,5 @@
-// Drawing into a window's pixels: a siren in spectrum and sonogram, 30 pictures a second. A window would show
-// the surface after each; here the last one becomes siren.png.
+// Drawing into a window's pixels: a siren in spectrum and sonogram, 30 pictures a second.
+// A window would show the surface after each; here the last one becomes siren.png.
 #include <cairo.h>
 
 #include <cmath>

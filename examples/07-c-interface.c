@@ -1,5 +1,4 @@
-/* The C interface, which every language can call: a limiter set up with texts, on a block that is too loud.
- */
+/* The C interface, which every language can call: a compressor set up with texts, on loud sound. */
 #include <math.h>
 #include <stdio.h>
 

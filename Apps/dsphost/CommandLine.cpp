@@ -38,9 +38,12 @@ void AddInput(CLI::App& command, ReadingOptions& reading) {
     command.add_option("IN", reading.input, "Audio file, or - for standard input")
         ->required()
         ->type_name(kFile);
-    command.add_option_function<std::string>(
-        "--spool-limit", [&reading](const std::string& size) { reading.spoolLimit = ParseSpoolLimit(size); },
-        "Most that a temporary file may take for input that does not stream (8G)");
+    command
+        .add_option_function<std::string>(
+            "--spool-limit",
+            [&reading](const std::string& size) { reading.spoolLimit = ParseSpoolLimit(size); },
+            "Most that a temporary file may take for input that does not stream (8G)")
+        ->type_name("BYTES");
 }
 
 void AddAudioOutput(CLI::App& command, std::string& output) {
@@ -60,7 +63,7 @@ void AddWriting(CLI::App& command, WritingOptions& writing) {
 }
 
 void AddPicture(CLI::App& command, PictureOptions& o) {
-    command.add_option("--size", o.size, "Of the picture, WIDTHxHEIGHT in pixels (1280x720)");
+    command.add_option("--size", o.size, "Of the picture, in pixels (1280x720)")->type_name("WIDTHxHEIGHT");
     command.add_option("--dpi", o.dpi, "Dots per inch that texts and lines are sized for (96)");
     command.add_option("--font", o.font, "The typeface, where Montserrat is not installed")->type_name(kFile);
 }
@@ -90,11 +93,13 @@ void AddDenoise(CLI::App& app) {
         app, "denoise", "Takes steady noise out of a recording, aligned and as long as it was", RunDenoise);
     AddInput(command, a);
     AddAudioOutput(command, a.output);
-    command.add_option("--learn", a.learn, "FROM:TO, seconds that hold noise only; as often as there are")
+    command.add_option("--learn", a.learn, "Seconds that hold noise only; as often as there are")
+        ->type_name("FROM:TO")
         ->allow_extra_args(false);
     command.add_option("--profile", a.profile, "File of noise learned before")->type_name(kFile);
     command.add_option("--save-profile", a.saveProfile, "Writes what was learned")->type_name(kFile);
-    command.add_option("--set", a.settings, "\"label=value, ...\", as of the effect Denoiser");
+    command.add_option("--set", a.settings, "\"label=value, ...\", as of the effect Denoiser")
+        ->type_name("SETTINGS");
     command.add_option("--residue", a.residue, "Audio file of what was taken away")->type_name(kFile);
     AddFormat(command, a.format);
     AddWriting(command, a.writing);
@@ -125,6 +130,7 @@ void AddEqCurve(CLI::App& app) {
         Add(app, "eq-curve", "Writes the frequency response of the equaliser", RunEqCurve);
     command.add_option("OUT", a.output, "CSV file, or - for standard output")->required()->type_name(kFile);
     command.add_option("--fx", a.effect, "\"EQ: FREQ TYPE [GAIN_DB] [q=Q]; ...\"")
+        ->type_name("BANDS")
         ->required()
         ->allow_extra_args(false);
     command.add_option("--rate", a.rate, "Sample rate in Hz");
@@ -147,7 +153,8 @@ void AddRender(CLI::App& app) {
         ->type_name(kFile)
         ->allow_extra_args(false);
     AddFormat(command, a.format);
-    command.add_option("--tail", a.tail, "Seconds after the input's end, or auto: until it has died away");
+    command.add_option("--tail", a.tail, "So long after the input's end, or auto: until it has died away")
+        ->type_name("SECONDS");
     command.add_option("--precision", a.options.precision, "Bits of the samples in the chain, 32 or 64");
     command.add_option("--block", a.options.block, "Most frames per block");
     command.add_flag("--planar", a.options.planar, "One buffer per channel, where an effect supports it");
@@ -198,10 +205,12 @@ void AddTuner(CLI::App& app) {
         ->required()
         ->type_name(kFile);
     command.add_flag("--json", a.json, "What was heard 30 times a second, on standard output");
-    command.add_option("--at", a.at, "The moment to draw instead, in seconds");
+    command.add_option("--at", a.at, "The moment to draw instead")->type_name("SECONDS");
     command.add_option("--method", a.method, "Of detection")->type_name(Joined(DetectionMethods(), "|"));
-    command.add_option("--temperament", a.temperament, "Equal, Pythagorean, Vallotti, ...");
-    command.add_option("--sensitivity", a.sensitivity, "Standard, Noisy environment, Sensitive, ...");
+    command.add_option("--temperament", a.temperament, "Equal, Pythagorean, Vallotti, ...")
+        ->type_name("NAME");
+    command.add_option("--sensitivity", a.sensitivity, "Standard, Noisy environment, Sensitive, ...")
+        ->type_name("NAME");
     AddDrawing(command, a.drawing);
     AddWriting(command, a.writing);
 }
@@ -211,11 +220,16 @@ void AddTuneVoice(CLI::App& app) {
         Add(app, "tune-voice", "Corrects the pitch of a voice, aligned and as long as it was", RunTuneVoice);
     AddInput(command, a);
     AddAudioOutput(command, a.output);
-    command.add_option("--scale", a.scale, "Root and mode, such as \"A minor\"; chromatic when left out");
-    command.add_option("--retune", a.retune, "Milliseconds that the correction takes, 0 to 400 (20)");
-    command.add_option("--transition", a.transition, "Milliseconds from note to note, 0 to 500 (40)");
-    command.add_option("--ratio", a.ratio, "Per cent of the error taken away, 0 to 100 (100)");
-    command.add_option("--lowest", a.lowest, "Hz: the lowest pitch sung, 55, 75, 110 or 160 (75)");
+    command.add_option("--scale", a.scale, "Root and mode, such as \"A minor\"; chromatic when left out")
+        ->type_name("SCALE");
+    command.add_option("--retune", a.retune, "Time that the correction takes, 0 to 400 (20)")
+        ->type_name("MILLISECONDS");
+    command.add_option("--transition", a.transition, "Time from note to note, 0 to 500 (40)")
+        ->type_name("MILLISECONDS");
+    command.add_option("--ratio", a.ratio, "Share of the error taken away, 0 to 100 (100)")
+        ->type_name("PERCENT");
+    command.add_option("--lowest", a.lowest, "The lowest pitch sung, 55, 75, 110 or 160 (75)")
+        ->type_name("HERTZ");
     command.add_option("--notes", a.notes, "The notes decided, as .csv or .mid")->type_name(kFile);
     command.add_option("--curve", a.curve, "PNG picture: the pitch heard and corrected over the notes")
         ->type_name(kFile);

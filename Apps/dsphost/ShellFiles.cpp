@@ -102,7 +102,8 @@ std::string Manual(const Commands& commands) {
            ".TP\n2\nSomething was asked for that cannot be done.\n.TP\n130\nInterrupted.\n"
            ".SH EXAMPLES\n.nf\n"
            "dsphost render in.flac out.wav \\-\\-fx \"Echo: preset=Long Echo\" \\-\\-tail auto\n"
-           "dsphost convert in.wav out.wav \\-\\-rate 96000 \\-\\-format s24\n.fi\n";
+           "dsphost convert in.wav out.wav \\-\\-rate 96000 \\-\\-exact \\-\\-format s24\n.fi\n"
+           ".SH SEE ALSO\n.BR sox (1),\n.BR parallel (1)\n";
 }
 
 // ---- bash

@@ -8,7 +8,9 @@
 #include "Chart.h"
 #include "DSP/Equalizer/ParEQ.h"
 #include "FlowDiagram.h"
+#include "Measurements.h"
 #include "PageText.h"
+#include "Svg.h"
 
 namespace docs {
 namespace {
@@ -75,15 +77,27 @@ std::string DrawCurves(std::string_view text) {
 }
 
 std::string TypeTable() {
-    std::string table = "| Type | What it does | Q | Q at first |\n| --- | --- | --- | --- |\n";
+    std::string table = Headings({"Type", "What it does", "Q", "Default Q"});
     for (const auto& type : kTypes) {
         builtin_effects_data data;
         data.SetEqType(0, type.type);
         data.SetDefaultQ(0);
-        table.append("| `").append(type.name).append("` | ").append(type.does).append(" | ").append(type.q);
-        table.append(" | ").append(std::to_string(data.GetEqQ(0))).append(" |\n");
+        table +=
+            Cells({std::string("`") + type.name + "`", type.does, type.q, std::to_string(data.GetEqQ(0))});
     }
     return table;
+}
+
+// Of so many peaks, none of them flat or on the move.
+std::string Cost(int bands) {
+    builtin_effects_data data;
+    data.SetNumBands(bands);
+    for (int i = 0; i < bands; ++i) data.SetEqData(i, {EQ_PEAK, 100 << i, 60, 200});
+    ParEQ equaliser;
+    equaliser.Cook(false, false, &data, kRate, 2);
+    std::array records{data, data};
+    return Number(NanosecondsPerFrame(
+        [&](float* samples, int frames) { equaliser.Process(samples, frames, 2, false, records.data()); }));
 }
 
 }  // namespace
@@ -93,15 +107,20 @@ std::string EqualiserPage(const std::string& textPath) {
         textPath, {"Good for", "Signal flow", "What it does to sound", "Formulae", "Latency", "Try it"});
     sections[1] = ReplaceFences(sections[1], "flow", DrawFlow);
     sections[2] = ReplaceFences(sections[2], "curves", DrawCurves);
-    return "# EQ\n" + sections[0] + "\n## Signal flow\n" + sections[1] + "\n## What it does to sound\n" +
-           sections[2] + "\n## Bands\n\nUp to " + std::to_string(builtin_effects_data::kMaxBands) +
+    const auto facts = FactsTable(
+        {"none", "no: bands are edited, and glide to where they go", "no",
+         Cost(3) + " ns per stereo frame with 3 bands, " + Cost(8) + " with 8, while none of them glides"});
+    return "# EQ\n" + sections[0] + '\n' + facts + "\n## Signal flow\n" + sections[1] +
+           "\n## What it does to sound\n" + sections[2] + "\n## Bands\n\nUp to " +
+           std::to_string(builtin_effects_data::kMaxBands) +
            ", each with a type, a frequency in whole Hz below half the sampling rate, a gain in steps of 0.1 "
-           "dB "
-           "and a Q. `dsphost` takes them as `FREQ TYPE [GAIN] [q=Q]`, with semicolons between; gains from "
-           "-100 "
-           "to 100 dB. A high- or low-pass gives its gain to all that it lets through.\n\n" +
-           TypeTable() + "\n## Formulae\n" + sections[3] + "\n## Latency\n" + sections[4] + "\n## Try it\n" +
-           sections[5];
+           "dB and a Q. `dsphost` takes them as `FREQ TYPE [GAIN] [q=Q]`, with semicolons between: gains "
+           "from "
+           "-100 to 100 dB, Q from 1 to 100000. What a Q means depends on the type; a peak with a Q of many "
+           "thousands, which is wider than all that can be heard, makes no stable filter and is left out. A "
+           "high- or low-pass gives its gain to all that it lets through.\n\n" +
+           TypeTable() + "\n## Presets\n\nNone: it starts flat.\n\n## Formulae\n" + sections[3] +
+           "\n## Latency\n" + sections[4] + TryIt(sections[5]);
 }
 
 }  // namespace docs

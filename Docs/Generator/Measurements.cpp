@@ -217,25 +217,29 @@ std::string DrawMeasurement(const EffectKind& kind, std::string_view text) {
     throw std::invalid_argument("no such measure: " + measure);
 }
 
-double NanosecondsPerFrame(const EffectKind& kind) {
-    using Clock = std::chrono::steady_clock;
-    constexpr int kRounds = 60, kBlocks = 16;
-    const auto effect = kind.MakeReady();
+double NanosecondsPerFrame(const EffectKind& kind, std::string_view settings) {
+    const auto effect = Prepared(kind, settings, kRate);
     const auto format = Format(kRate, 32);
     effect->InitProcessing(kBlock, &format);
+    Corvo::DSP::ProcessFlags flags;
+    return NanosecondsPerFrame(
+        [&](float* samples, int frames) { effect->Process(samples, frames, &format, flags); });
+}
+
+double NanosecondsPerFrame(const std::function<void(float*, int)>& process) {
+    using Clock = std::chrono::steady_clock;
+    constexpr int kRounds = 120, kBlocks = 16;
     std::vector<float> noise(2 * kBlock * kBlocks);
     std::uint32_t state = 1;
     for (float& sample : noise) {
         state = state * 1664525u + 1013904223u;
         sample = static_cast<float>(state >> 8) / static_cast<float>(1 << 24) - 0.5f;
     }
-    Corvo::DSP::ProcessFlags flags;
     double fastest = 1e9;
     for (int round = 0; round < kRounds; ++round) {
         auto samples = noise;
         const auto begin = Clock::now();
-        for (int block = 0; block < kBlocks; ++block)
-            effect->Process(samples.data() + 2 * kBlock * block, kBlock, &format, flags);
+        for (int block = 0; block < kBlocks; ++block) process(samples.data() + 2 * kBlock * block, kBlock);
         const std::chrono::duration<double, std::nano> taken = Clock::now() - begin;
         fastest = std::min(fastest, taken.count() / (kBlock * kBlocks));
     }

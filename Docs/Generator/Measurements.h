@@ -1,5 +1,6 @@
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -27,7 +28,9 @@ std::unique_ptr<CorvoEffectBase> Prepared(const EffectKind& kind, std::string_vi
 // Throws std::invalid_argument for anything else.
 std::string DrawMeasurement(const EffectKind& kind, std::string_view text);
 
-// Nanoseconds that a frame of stereo floats takes here, with the default preset, in blocks of 512.
-double NanosecondsPerFrame(const EffectKind& kind);
+// Nanoseconds that a frame of stereo floats takes here, in blocks of 512 of noise: with settings as above,
+// and for whatever processes `frames` frames of them.
+double NanosecondsPerFrame(const EffectKind& kind, std::string_view settings);
+double NanosecondsPerFrame(const std::function<void(float* samples, int frames)>& process);
 
 }  // namespace docs

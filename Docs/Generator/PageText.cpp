@@ -64,4 +64,30 @@ std::string ReplaceFences(std::string_view markdown, std::string_view kind,
     }
 }
 
+std::string Cells(std::initializer_list<std::string> cells) {
+    std::string row = "|";
+    for (std::string cell : cells) {
+        for (std::size_t at = 0; (at = cell.find('|', at)) != std::string::npos; at += 2)
+            cell.insert(at, "\\");
+        row.append(" ").append(cell).append(" |");
+    }
+    return row + '\n';
+}
+
+std::string Headings(std::initializer_list<std::string> cells) {
+    std::string line = "|";
+    for (std::size_t i = 0; i < cells.size(); ++i) line += " --- |";
+    return Cells(cells) + line + '\n';
+}
+
+std::string FactsTable(const Facts& facts) {
+    return Headings({"", ""}) + Cells({"Latency", facts.latency}) + Cells({"Automation", facts.automation}) +
+           Cells({"Side-chain", facts.sidechain}) +
+           Cells({"Cost", facts.cost + ", on the machine that made this page"});
+}
+
+std::string TryIt(const std::string& written) {
+    return "\n## Try it\n\nThe recordings are those of Debian's `sonic-pi-samples`.\n" + written;
+}
+
 }  // namespace docs

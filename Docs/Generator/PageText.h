@@ -1,6 +1,7 @@
 #pragma once
 
 #include <functional>
+#include <initializer_list>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -19,5 +20,18 @@ std::vector<std::string> ReadSections(const std::string& path, const std::vector
 // Replaces each block in a fence of the given kind ("```kind") by what `draw` makes of its lines.
 std::string ReplaceFences(std::string_view markdown, std::string_view kind,
                           const std::function<std::string(std::string_view)>& draw);
+
+// A row of a table.
+std::string Cells(std::initializer_list<std::string> cells);
+// The row of a table's headings, and the line below it.
+std::string Headings(std::initializer_list<std::string> cells);
+
+// What a reader asks first.
+struct Facts {
+    std::string latency, automation, sidechain, cost;
+};
+std::string FactsTable(const Facts& facts);
+// The last section of a page, of what a person wrote for it.
+std::string TryIt(const std::string& written);
 
 }  // namespace docs

@@ -14,7 +14,7 @@ namespace {
 struct Room {
     std::string name;
     std::vector<std::string> uses;  // as the table says
-    bool publicHeadersOnly = false;
+    std::string headers;            // instead, for what stands outside of the library
 };
 
 // What stands in backquotes.
@@ -41,8 +41,8 @@ std::vector<Room> ReadRooms(const std::string& path) {
         if (!line.starts_with("|")) inTable = false;
         const auto cells = Split(line, "|");
         if (!inTable || cells.size() != 3 || Names(cells[0]).empty()) continue;
-        rooms.push_back(
-            {WithoutSource(Names(cells[0])[0]), Names(cells[2]), cells[2].starts_with("public headers")});
+        const bool isOutside = cells[2].starts_with("public headers");
+        rooms.push_back({WithoutSource(Names(cells[0])[0]), Names(cells[2]), isOutside ? cells[2] : ""});
     }
     if (rooms.empty()) throw std::runtime_error(path + " has no table of rooms");
     return rooms;
@@ -61,8 +61,8 @@ std::string DrawRooms(const std::string& readmePath) {
     Svg svg;
     for (std::size_t i = 0; i < rooms.size(); ++i) {
         svg.Text(kLeft - 8, row(i) + 4, rooms[i].name, "end", "tick");
-        if (rooms[i].publicHeadersOnly) {
-            svg.Text(column(0), row(i) + 4, "public headers", "start", "tick");
+        if (!rooms[i].headers.empty()) {
+            svg.Text(column(0), row(i) + 4, rooms[i].headers, "start", "tick");
             continue;
         }
         svg.Text(column(i), row(i) + 5, "■");

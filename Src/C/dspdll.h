@@ -19,7 +19,10 @@
  * this version does not know are not read. An array of records steps by the first one's size.
  *
  * Threads. An object is used by one thread at a time, but for what the sections below say. Functions for the
- * audio thread neither allocate nor wait once their object is prepared. */
+ * audio thread neither allocate nor wait once their object is prepared.
+ *
+ * Cost. A block costs some nanoseconds a frame; create and prepare make memory, up to some megabytes; texts
+ * and states copy what they give; a transform takes n log n. */
 #ifndef DSPDLL_C_H
 #define DSPDLL_C_H
 
@@ -27,6 +30,7 @@
 #include <stdint.h>
 
 #if !defined(_WIN32)
+/* What the library exports. */
 #define DSP_C_API __attribute__((visibility("default")))
 /* How functions are called; it means something in 32-bit programs on Windows only. */
 #define DSP_CALL
@@ -104,33 +108,33 @@ typedef struct dsp_format {
 /* One effect. */
 typedef struct dsp_effect dsp_effect;
 
-/* How many kinds there are, and their names, from 0. Constant; any thread. */
+/* How many kinds there are, and their names, from 0; DSP_OUT_OF_RANGE for others. Constant; any thread. */
 DSP_C_API int32_t DSP_CALL dsp_effect_kinds(void);
 DSP_C_API dsp_status DSP_CALL dsp_effect_kind_name(int32_t kind, char* buffer, size_t size, size_t* needed);
-/* By name, in letters of either case, with the default preset. */
+/* By name, in letters of either case, with the default preset; DSP_UNKNOWN for another name. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_create(const char* name, dsp_effect** effect, dsp_error* error);
 /* The name of its kind. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_name(dsp_effect* effect, char* buffer, size_t size, size_t* needed);
 
-/* Makes all memory and starts the stream at position 0. A format that cannot be changes nothing; after
- * DSP_NO_MEMORY the effect is not prepared. */
+/* Makes all memory and starts the stream at position 0. A format that cannot be changes nothing and is
+ * DSP_OUT_OF_RANGE; after DSP_NO_MEMORY the effect is not prepared. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_prepare(dsp_effect* effect, const dsp_format* format,
                                                  dsp_error* error);
-/* Forgets the sound and starts the stream anew, prepared as before. */
+/* Forgets the sound and starts the stream anew, prepared as before; DSP_UNPREPARED if it never was. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_reset(dsp_effect* effect);
 /* Processes a block in place, any number of frames: interleaved, or one pointer per channel. The samples are
- * what the effect was prepared for, else DSP_UNPREPARED. */
+ * what the effect was prepared for, else DSP_UNPREPARED. DSP_OUT_OF_RANGE for a negative number. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_process_f32(dsp_effect* effect, float* samples, int32_t frames);
 DSP_C_API dsp_status DSP_CALL dsp_effect_process_f64(dsp_effect* effect, double* samples, int32_t frames);
 DSP_C_API dsp_status DSP_CALL dsp_effect_process_planar_f32(dsp_effect* effect, float* const* channels,
                                                             int32_t frames);
 DSP_C_API dsp_status DSP_CALL dsp_effect_process_planar_f64(dsp_effect* effect, double* const* channels,
                                                             int32_t frames);
-/* How many frames the output is later than the input, at the prepared format; may change with parameters. */
+/* How many frames the output is later than the input, at the prepared format; may change with parameters.
+ * DSP_UNPREPARED before. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_latency(dsp_effect* effect, int32_t* frames);
-/* The stream position of the next block, in frames, which automation is played by; negative
- * while an earlier latency runs out. What sounds goes
- * on: see reset. */
+/* The stream position of the next block, in frames, which automation is played by; negative while an earlier
+ * latency runs out. What sounds goes on: see reset. DSP_OUT_OF_RANGE beyond 2^61 either way. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_seek(dsp_effect* effect, int64_t position);
 /* Seek for a playback that jumps: the delay lines of Echo, Chorus, Cantrix and Denoiser are cleared, at a
  * small part of what reset costs. What other effects remember goes on. */
@@ -139,7 +143,8 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_rewind(dsp_effect* effect, int64_t posi
 /* Ringing out, when the stream has ended: start with the most frames the tail may have; process blocks of
  * silence until `finished`; of each block the first `frames` are output; end. What still sounds then, as
  * an echo's feedback does, comes out of further blocks of silence; `gap` is how many seconds may
- * pass between two echoes: wait as long for the next before taking silence for the end. */
+ * pass between two echoes: wait as long for the next before taking silence for the end. A negative
+ * `max_frames` counts as 0: the tail is over with its first block. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_start_tail(dsp_effect* effect, int64_t max_frames);
 DSP_C_API dsp_status DSP_CALL dsp_effect_tail(dsp_effect* effect, int32_t* frames, int32_t* finished);
 DSP_C_API dsp_status DSP_CALL dsp_effect_end_tail(dsp_effect* effect);
@@ -147,7 +152,8 @@ DSP_C_API dsp_status DSP_CALL dsp_effect_longest_gap(dsp_effect* effect, double*
 
 /* Side-chain: how many busses there are, and how many channels a bus can have. Announce a bus's channels
  * before preparing; 0 takes it away. Its planar samples, as many as the next block has, hold for that block
- * only; without them the block uses its own signal. */
+ * only; without them the block uses its own signal. DSP_OUT_OF_RANGE for a bus, or a number of channels, that
+ * there is not; DSP_UNPREPARED for samples of a bus that was not announced, or other than prepared for. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_sidechain_busses(dsp_effect* effect, int32_t* busses);
 DSP_C_API dsp_status DSP_CALL dsp_effect_sidechain_most_channels(dsp_effect* effect, int32_t bus,
                                                                  int32_t* channels);
@@ -191,26 +197,29 @@ typedef struct dsp_parameter {
     int32_t choices; /* of a switch or list */
     float neutral;   /* where a control rests */
 } dsp_parameter;
-/* How many there are; what one is; its texts, of which `which` is a DSP_TEXT_... */
+/* How many there are; what one is; its texts, of which `which` is a DSP_TEXT_... DSP_OUT_OF_RANGE for a
+ * parameter or text that there is not, here and below. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_parameters(dsp_effect* effect, int32_t* count);
 DSP_C_API dsp_status DSP_CALL dsp_effect_parameter(dsp_effect* effect, int32_t parameter,
                                                    dsp_parameter* record);
 DSP_C_API dsp_status DSP_CALL dsp_effect_parameter_text(dsp_effect* effect, int32_t parameter, int32_t which,
                                                         char* buffer, size_t size, size_t* needed);
-/* By label or name, in letters of either case; the left one of a pair that is named without its side. */
+/* By label or name, in letters of either case; the left one of a pair that is named without its side.
+ * DSP_UNKNOWN for another name. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_find_parameter(dsp_effect* effect, const char* name,
                                                         int32_t* parameter, dsp_error* error);
 /* A choice's text and the value that sets it, from 0. To see which one is chosen compare texts: other values
- * may mean the same choice. */
+ * may mean the same choice. DSP_OUT_OF_RANGE for a choice that there is not. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_choice(dsp_effect* effect, int32_t parameter, int32_t choice,
                                                 float* value, char* buffer, size_t size, size_t* needed);
 /* Its value, 0 to 1. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_get(dsp_effect* effect, int32_t parameter, float* value);
-/* Takes effect with the next block. */
+/* Takes effect with the next block. DSP_OUT_OF_RANGE for a value outside 0 to 1, or not a number. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_set(dsp_effect* effect, int32_t parameter, float value);
 /* The text that the effect shows at a value, and the value that a text means: a choice, or a number with or
- * without its unit. Numbers beyond the range are limited to it. Neither changes the effect; both try the
- * value on a copy of it, which takes up to some milliseconds. */
+ * without its unit. Numbers beyond the range are limited to it; DSP_NOT_UNDERSTOOD for what is neither, and
+ * DSP_OUT_OF_RANGE for a value outside 0 to 1. Neither changes the effect; both try the value on a copy of
+ * it, which takes up to some milliseconds. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_value_to_text(dsp_effect* effect, int32_t parameter, float value,
                                                        char* buffer, size_t size, size_t* needed);
 DSP_C_API dsp_status DSP_CALL dsp_effect_text_to_value(dsp_effect* effect, int32_t parameter,
@@ -223,7 +232,8 @@ typedef struct dsp_point {
     float reserved; /* 0 */
 } dsp_point;
 /* Replaces the automation of one parameter by `count` points, which are copied. They are in ascending order
- * and are met to the frame; 0 points end the automation. DSP_UNSUPPORTED where the effect plays none. */
+ * and are met to the frame; 0 points end the automation. DSP_UNSUPPORTED where the effect plays none;
+ * DSP_OUT_OF_RANGE for points that descend, values outside 0 to 1, and frames beyond 2^61 either way. */
 DSP_C_API dsp_status DSP_CALL dsp_effect_automate(dsp_effect* effect, int32_t parameter,
                                                   const dsp_point* points, size_t count);
 
@@ -277,7 +287,7 @@ DSP_C_API dsp_status DSP_CALL dsp_equaliser_bands(dsp_equaliser* equaliser, int3
  * equaliser leaves it out: take a peak or shelf to 0.1 dB first and let it arrive, where that would click. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_set_bands(dsp_equaliser* equaliser, const dsp_band* bands,
                                                       int32_t count, dsp_error* error);
-/* One of them as it was set. */
+/* One of them as it was set; DSP_OUT_OF_RANGE for one that there is not. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_band(dsp_equaliser* equaliser, int32_t band, dsp_band* record);
 /* Inverted polarity. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_invert(dsp_equaliser* equaliser, int32_t invert);
@@ -285,14 +295,14 @@ DSP_C_API dsp_status DSP_CALL dsp_equaliser_is_inverted(dsp_equaliser* equaliser
 /* `max_frames` is not used: nothing is cut. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_prepare(dsp_equaliser* equaliser, const dsp_format* format,
                                                     dsp_error* error);
-/* Any number of interleaved frames in place, of the samples it was prepared for, else DSP_UNPREPARED. Neither
- * allocates nor waits. */
+/* Any number of interleaved frames in place, of the samples it was prepared for, else DSP_UNPREPARED;
+ * DSP_OUT_OF_RANGE for a negative number. Neither allocates nor waits. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_process_f32(dsp_equaliser* equaliser, float* samples,
                                                         int32_t frames);
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_process_f64(dsp_equaliser* equaliser, double* samples,
                                                         int32_t frames);
-/* The curve at `count` frequencies, when all glides have ended: real and imaginary parts, either may be null.
- */
+/* The curve at `count` frequencies in Hz, when all glides have ended: real and imaginary parts, either may be
+ * null. DSP_UNPREPARED before the equaliser knows a rate. */
 DSP_C_API dsp_status DSP_CALL dsp_equaliser_response(dsp_equaliser* equaliser, const double* frequencies,
                                                      double* real, double* imaginary, size_t count);
 
@@ -318,13 +328,15 @@ typedef struct dsp_conversion {
 /* Ready for the first block. DSP_OUT_OF_RANGE, with a sentence, for what it cannot convert. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_create(const dsp_conversion* conversion,
                                                    dsp_converter** converter, dsp_error* error);
-/* Frames that a recording of so many becomes, and the most that one block of so many gives. */
+/* Frames that a recording of so many becomes, and the most that one block of so many gives. DSP_OUT_OF_RANGE
+ * below 0 and from 2^38 on. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_frames(dsp_converter* converter, int64_t in_frames,
                                                    int64_t* out_frames, int64_t* most_of_a_block);
 /* It converts by up / down, which differs from the rates' ratio only with `nearest`. Either may be null. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_factors(dsp_converter* converter, int32_t* up, int32_t* down);
 /* Converts a block into `out`, which has room for `capacity` frames: at least the most that the block gives,
- * else DSP_TOO_SMALL and nothing is done. The buffers must not overlap. */
+ * else DSP_TOO_SMALL and nothing is done. The buffers must not overlap. DSP_OUT_OF_RANGE for a negative
+ * number of frames, DSP_UNPREPARED after finish. */
 DSP_C_API dsp_status DSP_CALL dsp_converter_process(dsp_converter* converter, const void* in, int32_t frames,
                                                     void* out, int32_t capacity, int32_t* written);
 /* After the last block, until it writes nothing: what is left. `capacity` as for a block of 1 frame. */
@@ -353,12 +365,12 @@ typedef struct dsp_shift {
 /* Ready for the recording. DSP_OUT_OF_RANGE, with a sentence, for what it cannot do. */
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_create(const dsp_shift* shift, dsp_pitch_shift** pitch_shift,
                                                      dsp_error* error);
-/* The next frames, which are copied. DSP_UNPREPARED after finish. */
+/* The next frames, which are copied. DSP_OUT_OF_RANGE for a negative number, DSP_UNPREPARED after finish. */
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_feed(dsp_pitch_shift* pitch_shift, const float* samples,
                                                    int32_t frames);
 /* The recording has ended; nothing is fed after that. */
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_finish(dsp_pitch_shift* pitch_shift);
-/* What is ready, at most `capacity` frames. */
+/* What is ready, at most `capacity` frames; DSP_OUT_OF_RANGE where that is negative. */
 DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_take(dsp_pitch_shift* pitch_shift, float* samples,
                                                    int32_t capacity, int32_t* written);
 
@@ -367,12 +379,13 @@ DSP_C_API dsp_status DSP_CALL dsp_pitch_shift_take(dsp_pitch_shift* pitch_shift,
  * In place, of one length, a power of two from 2 to 524288. One thread.
  *
  * Real: `length` values become the packed spectrum: the real parts of bin 0 and of bin length/2, then real
- * and imaginary part of bins 1, 2, ... Complex: `length` points, real and imaginary parts in turn. Forward is
- * unscaled, inverse scaled by 1/length. */
+ * and imaginary part of bins 1, 2 and so on. Complex: `length` points, real and imaginary parts in turn.
+ * Forward is unscaled, inverse scaled by 1/length. */
 
 /* Transforms of one length. */
 typedef struct dsp_transform dsp_transform;
-/* Of `length` real values or, where `complex_points` is not 0, as many points. All memory is made here. */
+/* Of `length` real values or, where `complex_points` is not 0, as many points. All memory is made here.
+ * DSP_OUT_OF_RANGE for any other length than those above. */
 DSP_C_API dsp_status DSP_CALL dsp_transform_create(int32_t length, int32_t complex_points,
                                                    dsp_transform** transform, dsp_error* error);
 /* `inverse`: 0 forward, else back. Takes `length` values, or twice as many where they are points. */
@@ -386,15 +399,16 @@ DSP_C_API dsp_status DSP_CALL dsp_transform_f64(dsp_transform* transform, double
 
 /* One analyser, with its tuner and its sonogram. */
 typedef struct dsp_analyser dsp_analyser;
-/* For sound of `rate` Hz, above 0; on, its tuner off. */
+/* For sound of `rate` Hz, above 0, else DSP_OUT_OF_RANGE; on, its tuner off. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, dsp_error* error);
 /* Switches: the analyser (on at first), its tuner, its frozen state, and what a drawing of it shows beside
  * the spectrum. */
 enum { DSP_ANALYSER_ON = 0, DSP_TUNER_ON = 1, DSP_FROZEN = 2, DSP_SHOW_SONOGRAM = 3, DSP_SHOW_INFO = 4 };
-/* Turns one of them on, or off with 0, and says whether it is on. */
+/* Turns one of them on, or off with 0, and says whether it is on. DSP_OUT_OF_RANGE for another switch. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_switch(dsp_analyser* analyser, int32_t which, int32_t on);
 DSP_C_API dsp_status DSP_CALL dsp_analyser_is_on(dsp_analyser* analyser, int32_t which, int32_t* on);
-/* Interleaved; the mean of the channels, 1 to 64, is analysed. */
+/* Interleaved; the mean of the channels, 1 to 64, is analysed. DSP_OUT_OF_RANGE for other numbers of channels
+ * and for a negative number of frames. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_feed_f32(dsp_analyser* analyser, const float* samples,
                                                     int32_t frames, int32_t channels);
 DSP_C_API dsp_status DSP_CALL dsp_analyser_feed_f64(dsp_analyser* analyser, const double* samples,
@@ -404,20 +418,22 @@ DSP_C_API dsp_status DSP_CALL dsp_analyser_refresh(dsp_analyser* analyser, int32
 /* Levels of the bins from 0 Hz up, dB below a full-scale sine, and their frequencies, Hz. Bin 0 also holds
  * what stands at half the rate. */
 enum { DSP_SPECTRUM_NOW = 0, DSP_SPECTRUM_SMOOTHED = 1, DSP_SPECTRUM_PEAKS = 2 };
-/* `which` is a DSP_SPECTRUM_... */
+/* `which` is a DSP_SPECTRUM_..., else DSP_OUT_OF_RANGE. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_spectrum(dsp_analyser* analyser, int32_t which, float* decibels,
                                                     size_t count, size_t* needed);
 /* As many as levels. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_frequencies(dsp_analyser* analyser, float* hz, size_t count,
                                                        size_t* needed);
-/* The highest peak from `lowest` Hz up, between bins; 0 Hz and -300 dB where there is none. */
+/* The highest peak from `lowest` Hz up, between bins; 0 Hz and -300 dB where there is none. DSP_OUT_OF_RANGE
+ * where `lowest` is not a number. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_highest_peak(dsp_analyser* analyser, double lowest, double* hz,
                                                         double* decibels);
 /* The peaks begin anew. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_forget_peaks(dsp_analyser* analyser);
 
-/* The menu: entries from 0, each with its command, its group's title and its text. A command that the menu
- * does not have is DSP_UNKNOWN. */
+/* The menu: entries from 0, each with its command, its group's title and its text. It is constant: these may
+ * be asked on any thread. A command goes to the analyser on the display thread, as does the question whether
+ * it has a tick. DSP_OUT_OF_RANGE for an entry, DSP_UNKNOWN for a command that the menu does not have. */
 DSP_C_API int32_t DSP_CALL dsp_menu_entries(void);
 DSP_C_API dsp_status DSP_CALL dsp_menu_command(int32_t entry, int32_t* command);
 DSP_C_API dsp_status DSP_CALL dsp_menu_group(int32_t entry, char* buffer, size_t size, size_t* needed);
@@ -439,13 +455,14 @@ typedef struct dsp_tuner_reading {
 } dsp_tuner_reading;
 /* What the tuner shows now. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_tuner(dsp_analyser* analyser, dsp_tuner_reading* reading);
-/* The name of note 0 to 11 in the naming that the menu chose, without its octave. */
+/* The name of note 0 to 11 in the naming that the menu chose, without its octave; DSP_OUT_OF_RANGE for
+ * others. Any thread. */
 DSP_C_API dsp_status DSP_CALL dsp_note_name(int32_t note, char* buffer, size_t size, size_t* needed);
 
 /* The sonogram's picture: as wide and high as asked for, each side 1 to 16384 and at most 2^26 pixels, until
  * a drawing of it needs another size; it moves with every refresh while DSP_SHOW_SONOGRAM is on. Pixels are
  * 0xLLRRGGBB, L the level from 0, silence, to 255, full scale; rows from the highest frequency down, the
- * newest column at the right. */
+ * newest column at the right. DSP_OUT_OF_RANGE for another size. */
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_resize(dsp_analyser* analyser, int32_t width, int32_t height);
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_pixels(dsp_analyser* analyser, uint32_t* pixels, size_t count,
                                                   size_t* needed);

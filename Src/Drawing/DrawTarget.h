@@ -13,7 +13,7 @@ namespace Corvo {
 // What something is drawn with.
 struct Ink {
     ColourReference colour;      // red in the low byte
-    std::uint8_t opacity = 255;  // 0 clear .. 255
+    std::uint8_t opacity = 255;  // 0 clear to 255
 };
 
 // A line of `width` pixels along a path; joins and ends are round.
@@ -41,6 +41,9 @@ constexpr float kCapHeight = 0.7f;
 // character of 95 bytes; `size` is its em in pixels. A size, width or rectangle that is empty, not a number
 // or beyond 32767 draws nothing. Used on the thread that draws, where drawing may allocate and throw
 // std::bad_alloc; nothing is kept of the arguments.
+//
+// Cost: a primitive takes what its back-end needs for the pixels that it covers. A whole frame of 1280 x 720
+// pixels, analyser and scales, takes 0.5 to 2 ms with Cairo.
 class DSP_API DrawTarget {
 public:
     // `dpi` is the surface's dots per inch; what is not above 0 counts as 96.

@@ -29,18 +29,29 @@ export DISPLAY
 
 failed=0
 fail() { echo "FAILED: $*"; failed=1; }
-start() {  # ARGUMENT...: leaves pid and window
-    "$program" --save-to "$work/out" "$@" & pid=$!
+open() {  # PROGRAM ARGUMENT...: leaves pid and window, which is empty where none comes
+    "$@" & pid=$!
     jobs+=($pid)
     window=
     for ((i = 0; i < 100 && ${#window} == 0; ++i)); do
         sleep 0.1
-        window=$(xdotool search --pid $pid 2> /dev/null | tail -1) || true
+        window=$(xdotool search --onlyvisible --pid $pid --name '^Analyser$' 2> /dev/null | tail -1) || true
     done
+}
+start() {
+    open "$program" --save-to "$work/out" "$@"
     xdotool mousemove 2590 1490
     sleep 1
 }
-stop() { kill $pid && wait $pid || fail "the program ended with $?"; }
+stop() {
+    kill $pid
+    for ((i = 0; i < 100; ++i)); do
+        kill -0 $pid 2> /dev/null || break
+        sleep 0.1
+    done
+    [ $i -lt 100 ] || { fail "the program does not end"; kill -KILL $pid; }
+    wait $pid || fail "the program ended with $?"
+}
 keys() { for key in "$@"; do xdotool key --window "$window" "$key"; sleep 0.2; done; }
 chosen() { grep -qxF "$1" "$XDG_CONFIG_HOME/dspdll/analyser.conf" || fail "not chosen: $1"; }
 of() { soxi -D "$1" | awk '{print int($1) + 3}'; }
@@ -172,31 +183,17 @@ jackd -r -n "$JACK_DEFAULT_SERVER" -d dummy -r 48000 -p 256 > "$work/jackd" 2>&1
 jobs+=($!)
 timeout 20 jack_wait -w > /dev/null 2>&1 || fail "JACK does not start: $(tail -3 "$work/jackd")"
 memory=()
-for ((i = 1; i <= 20; ++i)); do
-    jalv.gtk3 urn:dspdll:analyser > "$work/jalv" 2>&1 & pid=$!
-    jobs+=($pid)
-    window=
-    for ((j = 0; j < 100 && ${#window} == 0; ++j)); do
-        sleep 0.1
-        window=$(xdotool search --onlyvisible --pid $pid --name '^Analyser$' 2> /dev/null | tail -1) || true
-    done
+for round in {1..20}; do
+    open jalv.gtk3 urn:dspdll:analyser > "$work/jalv" 2>&1
     sleep 0.5
     if [ -n "$window" ] && import -window "$window" "$work/plugin.png"; then
         colours=$(identify -format %k "$work/plugin.png")
-        [ "$colours" -gt 50 ] || fail "window $i of the plug-in is empty"
+        [ "$colours" -gt 50 ] || fail "window $round of the plug-in is empty"
     else
-        fail "window $i of the plug-in does not appear: $(tail -3 "$work/jalv")"
+        fail "window $round of the plug-in does not appear: $(tail -3 "$work/jalv")"
     fi
     memory+=("$(resident)")
-    kill -INT $pid
-    for ((j = 0; j < 100; ++j)); do
-        kill -0 $pid 2> /dev/null || break
-        sleep 0.1
-    done
-    [ $j -lt 100 ] || { fail "window $i of the plug-in does not close"; kill -KILL $pid; }
-    status=0
-    wait $pid || status=$?
-    [ $status = 0 ] || fail "the host ended with $status: $(tail -3 "$work/jalv")"
+    stop
 done
 echo "KiB with a window: ${memory[*]}"
 sorted=($(printf '%s\n' "${memory[@]}" | sort -n))

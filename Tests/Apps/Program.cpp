@@ -18,35 +18,27 @@ namespace AppTest {
 namespace fs = std::filesystem;
 
 void Save(const std::string& path, const Sound& sound) {
-    SF_INFO info{};
-    info.channels = sound.channels;
-    info.samplerate = sound.rate;
-    info.format = sound.format;
-    SNDFILE* const file = sf_open(path.c_str(), SFM_WRITE, &info);
-    ASSERT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
+    SndfileHandle file(path, SFM_WRITE, sound.format, sound.channels, sound.rate);
+    ASSERT_TRUE(file) << path << ": " << file.strError();
     // As 32-bit integers: scaled by libsndfile a full scale of 1 would be one step too small.
     std::vector<int> integers;
     for (const double sample : sound.samples)
         integers.push_back(static_cast<int>(std::lrint(sample * 0x1p31)));
     const int subtype = sound.format & SF_FORMAT_SUBMASK;
-    const auto frames = static_cast<sf_count_t>(sound.Frames());
+    const auto count = std::ssize(integers);
     if (subtype == SF_FORMAT_FLOAT || subtype == SF_FORMAT_DOUBLE || subtype == SF_FORMAT_VORBIS)
-        EXPECT_EQ(sf_writef_double(file, sound.samples.data(), frames), frames);
+        EXPECT_EQ(file.write(sound.samples.data(), count), count);
     else
-        EXPECT_EQ(sf_writef_int(file, integers.data(), frames), frames);
-    sf_close(file);
+        EXPECT_EQ(file.write(integers.data(), count), count);
 }
 
 Sound Load(const std::string& path) {
-    SF_INFO info{};
-    SNDFILE* const file = sf_open(path.c_str(), SFM_READ, &info);
-    EXPECT_NE(file, nullptr) << path << ": " << sf_strerror(nullptr);
-    Sound sound{1, 0, 0, {}};
-    if (!file) return sound;
-    sound = {info.channels, info.samplerate, info.format, {}};
-    sound.samples.resize(static_cast<std::size_t>(info.frames * info.channels));
-    EXPECT_EQ(sf_readf_double(file, sound.samples.data(), info.frames), info.frames);
-    sf_close(file);
+    SndfileHandle file(path);
+    EXPECT_TRUE(file) << path << ": " << file.strError();
+    if (!file) return {1, 0, 0, {}};
+    Sound sound{file.channels(), file.samplerate(), file.format(), {}};
+    sound.samples.resize(static_cast<std::size_t>(file.frames() * file.channels()));
+    EXPECT_EQ(file.read(sound.samples.data(), std::ssize(sound.samples)), std::ssize(sound.samples));
     return sound;
 }
 

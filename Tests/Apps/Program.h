@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include <sndfile.h>
+#include <sndfile.hh>
 
 namespace AppTest {
 

@@ -2,6 +2,7 @@
 
 #include <memory>
 #include <optional>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -11,6 +12,7 @@
 #include "Chain.h"
 #include "DSP/Effects/Tremolo/Autovol.h"
 #include "EffectElement.h"
+#include "Relay.h"
 #include "Render.h"
 
 // Rendering with elements made for the purpose: what happens to time, whatever the effects are.
@@ -146,6 +148,26 @@ TEST_F(Rendering, CutsTheTailWhereToldOrWhereItHasDied) {
     // Nothing rings for longer than a minute.
     EXPECT_EQ(frames(60 * 48000 + 11, 0.5, {}), 1000u);
     EXPECT_EQ(frames(60 * 48000 + 9, 0.5, {}), 60u * 48000 + 1000);
+}
+
+void Fill(dsphost::Relay& relay) {
+    while (relay.ToFill()) relay.Pass();
+}
+
+// Whoever fills must not wait for a thread that has failed, nor the relay's end for one that has no more to
+// do.
+TEST(Relay, LeavesNobodyWaiting) {
+    dsphost::Relay full(1);
+    full.Start([&] {
+        for (int i = 0; i < 3 && full.ToTake(); ++i) full.Return();
+        throw std::runtime_error("disk full");
+    });
+    EXPECT_THROW(Fill(full), std::runtime_error);
+    EXPECT_THROW(full.Finish(), std::runtime_error);
+
+    dsphost::Relay taker(1), filler(1);
+    taker.Start([&] { EXPECT_FALSE(taker.ToTake()); });
+    filler.Start([&] { Fill(filler); });
 }
 
 }  // namespace

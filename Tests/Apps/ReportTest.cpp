@@ -3,7 +3,6 @@
 #include <cmath>
 #include <complex>
 #include <numbers>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -32,26 +31,22 @@ protected:
     }
 };
 
-// Whatever effects there are: complete records, distinct names, defaults in range, texts in UTF-8 (the parser
-// throws otherwise), and every effect and preset can be named in a chain.
+// Whatever effects there are: in UTF-8 (the parser throws otherwise), with all parameters in their order, and
+// every effect and preset can be named in a chain.
 TEST_F(Reports, DescribeEveryEffect) {
     const auto overview = Succeed("effects");
-    std::set<std::string> names;
     for (const auto& effect : json::parse(Succeed("effects --json"))) {
         const std::string name = effect.at("name");
-        SCOPED_TRACE(name);
-        EXPECT_TRUE(names.insert(name).second);
         EXPECT_NE(overview.find(name), std::string::npos);
         if (effect.contains("bands")) continue;
-        EXPECT_FALSE(effect.at("parameters").empty());
         int index = 0;
         for (const auto& parameter : effect.at("parameters")) {
             EXPECT_EQ(parameter.at("index"), index++);
-            EXPECT_NE(parameter.at("name"), "");
-            EXPECT_NE(parameter.at("text"), "");
+            for (const char* key : {"name", "text"}) EXPECT_NE(parameter.at(key), "") << name;
             EXPECT_TRUE(parameter.at("default") >= 0.0 && parameter.at("default") <= 1.0) << parameter;
             EXPECT_TRUE(parameter.at("type") != "list" || parameter.at("values").size() > 1) << parameter;
         }
+        EXPECT_GT(index, 0) << name;
         std::vector<std::string> chain{name};
         for (const std::string preset : effect.at("presets")) chain.push_back(name + ": preset=" + preset);
         EXPECT_NO_THROW(dsphost::Chain{chain});

@@ -50,7 +50,7 @@ std::vector<double> FixedSignal() {
 
 // Every parameter at random, and one moved now and then: the settings' chunk and the sound.
 void RecordAtRandom(const EffectCase& which, std::uint64_t seed, std::vector<Take>& takes) {
-    const auto effect = which.make();
+    const auto effect = which.Make();
     Random random(seed);
     SetAllParams(*effect, random);
     const auto chunk = Chunk(*effect);

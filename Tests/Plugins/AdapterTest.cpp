@@ -93,6 +93,13 @@ TEST_P(EveryPlugin, ShowsTheNumberThatAPortIsSetTo) {
     }
 }
 
+TEST_P(EveryPlugin, TellsTheLatencyOfItsEffect) {
+    const auto effect = GetParam().row->Make();
+    const auto format = TestSupport::Format<float>(GetParam().channels);
+    effect->InitProcessing(kLongest, &format);
+    EXPECT_EQ(Make()->Latency(), effect->GetLatency());
+}
+
 TEST_P(EveryPlugin, StateOfEveryPresetIsExact) {
     const auto adapter = Make(), other = Make();
     for (int preset = -1; preset < adapter->Presets(); ++preset) {

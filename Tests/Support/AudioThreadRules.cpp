@@ -70,15 +70,12 @@ void* New(std::size_t size, std::size_t alignment = kUsualAlignment) {
 
 #if COUNTS_CALLS
 
-template <typename Result>
-Result Counted(Kind kind, Result result) {
-    Note(kind);
-    return result;
-}
-
+// Notes it and goes on with the system's own function.
 template <typename Function>
-Function* Next(const char* name) {
-    return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+auto Pass(Kind kind, const char* name, auto... arguments) {
+    static const auto next = reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
+    Note(kind);
+    return next(arguments...);
 }
 #endif
 
@@ -194,25 +191,18 @@ void free(void* memory) {
 
 // Trying a lock is allowed; only a lock that can wait counts. A condition is waited for under such a lock.
 int pthread_mutex_lock(pthread_mutex_t* mutex) {
-    static const auto next = Next<int(pthread_mutex_t*)>("pthread_mutex_lock");
-    return Counted(kLock, next(mutex));
+    return Pass<int(pthread_mutex_t*)>(kLock, "pthread_mutex_lock", mutex);
 }
 int clock_nanosleep(clockid_t clock, int flags, const timespec* time, timespec* rest) {
-    static const auto next = Next<int(clockid_t, int, const timespec*, timespec*)>("clock_nanosleep");
-    return Counted(kWait, next(clock, flags, time, rest));
+    using Sleep = int(clockid_t, int, const timespec*, timespec*);
+    return Pass<Sleep>(kWait, "clock_nanosleep", clock, flags, time, rest);
 }
 int nanosleep(const timespec* time, timespec* rest) {
-    static const auto next = Next<int(const timespec*, timespec*)>("nanosleep");
-    return Counted(kWait, next(time, rest));
+    return Pass<int(const timespec*, timespec*)>(kWait, "nanosleep", time, rest);
 }
-int sched_yield() noexcept {
-    static const auto next = Next<int()>("sched_yield");
-    return Counted(kWait, next());
-}
+int sched_yield() noexcept { return Pass<int()>(kWait, "sched_yield"); }
 [[noreturn]] void __cxa_throw(void* object, std::type_info* type, void (*destroy)(void*)) {
-    static const auto next = Next<void(void*, std::type_info*, void (*)(void*))>("__cxa_throw");
-    Note(kThrow);
-    next(object, type, destroy);
+    Pass<void(void*, std::type_info*, void (*)(void*))>(kThrow, "__cxa_throw", object, type, destroy);
     __builtin_unreachable();
 }
 }

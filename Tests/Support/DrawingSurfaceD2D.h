@@ -43,35 +43,33 @@ private:
     Microsoft::WRL::ComPtr<ID2D1RenderTarget> m_target;
 };
 
-// Keeps its picture itself, and lends it to the target while it is painted on. At most as large as the
-// target.
+// At most as large as the target, whose upper left corner it is. One is painted on at a time: a new one
+// begins with another picture.
 template <>
 class DrawingSurface<Corvo::DrawingD2D> {
 public:
     // At a resolution of its own, which must not matter.
     DrawingSurface(int width, int height)
         : m_width(static_cast<UINT32>(width)),
-          m_height(static_cast<UINT32>(height)),
-          m_pixels(static_cast<std::size_t>(width) * static_cast<std::size_t>(height), 0xFF000000) {
+          m_pixels(static_cast<std::size_t>(width) * static_cast<std::size_t>(height)),
+          m_place{0, 0, width, height} {
         m_target->SetDpi(144.0f, 144.0f);
         m_target->SetAntialiasMode(D2D1_ANTIALIAS_MODE_PER_PRIMITIVE);
+        const D2D1_COLOR_F black{0.0f, 0.0f, 0.0f, 1.0f};
+        PaintPlainly([&] { m_target->Clear(&black); });
     }
 
     template <typename Draw>
     void Paint(float dpi, Draw draw) {
-        Lend();
-        {
+        PaintPlainly([&] {
             Corvo::DrawingD2D::DrawTarget target(m_drawing, dpi);
             draw(target);
-        }
-        TakeBack();
+        });
     }
 
     void PaintWith(Corvo::DrawingBrush brush) {
         const D2D1_RECT_F everything{0.0f, 0.0f, 1e4f, 1e4f};
-        Lend();
-        m_target->FillRectangle(&everything, static_cast<ID2D1Brush*>(brush.object));
-        TakeBack();
+        PaintPlainly([&] { m_target->FillRectangle(&everything, static_cast<ID2D1Brush*>(brush.object)); });
     }
 
     std::uint32_t Pixel(int x, int y) const {
@@ -93,32 +91,20 @@ public:
     }
 
 private:
-    void Lend() {
-        D2D1_BITMAP_PROPERTIES properties{};
-        properties.pixelFormat = {DXGI_FORMAT_B8G8R8A8_UNORM, D2D1_ALPHA_MODE_PREMULTIPLIED};
-        Microsoft::WRL::ComPtr<ID2D1Bitmap> picture;
-        m_target->CreateBitmap({m_width, m_height}, m_pixels.data(), m_width * 4, &properties, &picture);
-        const D2D1_RECT_F place{0.0f, 0.0f, static_cast<float>(m_width), static_cast<float>(m_height)};
-        float x = 0.0f, y = 0.0f;
-        m_target->BeginDraw();
-        m_target->GetDpi(&x, &y);
-        m_target->SetDpi(96.0f, 96.0f);
-        m_target->DrawBitmap(picture.Get(), &place, 1.0f, D2D1_BITMAP_INTERPOLATION_MODE_NEAREST_NEIGHBOR);
-        m_target->SetDpi(x, y);
-    }
-
     // After a failure every pixel is of a colour that no test draws.
-    void TakeBack() {
-        const WICRect place{0, 0, static_cast<INT>(m_width), static_cast<INT>(m_height)};
+    void PaintPlainly(const auto& draw) {
+        m_target->BeginDraw();
+        draw();
         const UINT bytes = static_cast<UINT>(m_pixels.size() * 4);
         if (FAILED(m_target->EndDraw()) ||
-            FAILED(m_target.Image()->CopyPixels(&place, m_width * 4, bytes,
+            FAILED(m_target.Image()->CopyPixels(&m_place, m_width * 4, bytes,
                                                 reinterpret_cast<BYTE*>(m_pixels.data()))))
             m_pixels.assign(m_pixels.size(), 0xFFBADBAD);
     }
 
-    UINT32 m_width, m_height;
+    UINT32 m_width;
     std::vector<std::uint32_t> m_pixels;
+    WICRect m_place;
     SharedRenderTarget& m_target = SharedRenderTarget::Get();
     Corvo::DrawingD2D m_drawing{m_target.Target()};
 };

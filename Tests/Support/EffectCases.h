@@ -3,7 +3,7 @@
 #include <memory>
 #include <span>
 
-#include "DSP/Effects/Framework/CorvoEffectBase.h"
+#include "DSP/Effects/EffectKinds.h"
 
 namespace TestSupport {
 
@@ -18,7 +18,7 @@ enum class Cuts {
 // benchmarks read this table. A new effect is one line in EffectCases.cpp.
 struct EffectCase {
     const char* name;
-    std::unique_ptr<Corvo::DSP::CorvoEffectBase> (*make)();
+    const char* kind = name;  // to the library
     Cuts cuts = Cuts::SameBits;
     // The engine's splices are choices between near equals, which another build may make otherwise.
     bool splices = false;
@@ -40,6 +40,10 @@ struct EffectCase {
     bool textTruncates = false;
     // A switch that a loaded chunk always leaves off.
     int loadsOff = -1;
+
+    std::unique_ptr<Corvo::DSP::CorvoEffectBase> Make() const {
+        return Corvo::DSP::FindEffectKind(kind)->make();
+    }
 };
 
 std::span<const EffectCase> AllEffects();

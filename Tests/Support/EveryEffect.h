@@ -10,9 +10,7 @@ class EveryEffect : public testing::TestWithParam<TestSupport::EffectCase> {
 protected:
     // A new instance in the state a host starts from.
     static std::unique_ptr<TestSupport::CorvoEffectBase> Make() {
-        auto effect = GetParam().make();
-        if (effect->NumPresets() > 0) effect->SetPreset(effect->GetDefaultPreset());
-        return effect;
+        return Corvo::DSP::FindEffectKind(GetParam().kind)->MakeReady();
     }
 };
 

@@ -14,7 +14,8 @@ namespace Corvo::DSP {
 // long as what went in.
 //
 // Construct, Feed block by block, Finish; in between and afterwards Take what is there. Interleaved floats.
-// Allocates as it goes: for offline use. One thread at a time.
+// Allocates as it goes: for offline use. One thread at a time. Cost: its engine's, see PitchAdapter, and
+// memory for what was not taken yet.
 class DSP_API OfflinePitchShift {
 public:
     // As in PitchAdapterInfo::GetPitchAdapters().

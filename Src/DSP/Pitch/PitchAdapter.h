@@ -37,6 +37,16 @@ private:
 // given: ProcessInPlaceNoPadding per block, Flush, then ReceiveSamples for what GetNumSamplesAvailable says.
 // A block is `frames` frames of as many samples as there are channels. Pitch factors are frequency ratios.
 //
+// "New" is overlap-add, done by the library SoundTouch: W. Verhelst and M. Roelands, "An overlap-add
+// technique based on waveform similarity (WSOLA) for high quality time-scale modification of speech", ICASSP
+// 1993. "Classic" keeps frequencies by their phases as a phase vocoder does (J. L. Flanagan and R. M. Golden,
+// "Phase Vocoder", Bell System Technical Journal 45, 1966), but takes the windowed samples themselves for
+// bins, without a transform; that is its sound, 60 to 70 dB below the input.
+//
+// Cost of a stereo frame: "New" 10 to 20 ns at quality 0, 90 to 190 at quality 9, most where the pitch moves
+// far. "Classic" 12 ns at the lowest quality, 20 at an overlap of 4, 80 at 8 and 350 at 32; it works once in
+// a step, so that some blocks take many times as long as others. Configuring fills tables and buffers.
+//
 // Threads: "New" may be configured from one thread while another processes; it holds a lock for the length of
 // each call, and every configuration call drops the audio it holds. "Classic" takes pitch factors from
 // another thread; all else must not run at the same time.

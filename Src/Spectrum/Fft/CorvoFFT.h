@@ -19,6 +19,10 @@ struct SharedPlan;
 // values holds the real parts of bin 0 and of bin N/2 at positions 0 and 1, then bin k's real part at 2k and
 // its imaginary part at 2k + 1. The split form holds position 2k in re[k] and position 2k + 1 in im[k].
 //
+// Stages of radix 8 and 4 after J. W. Cooley and J. W. Tukey, "An algorithm for the machine calculation of
+// complex Fourier series", Mathematics of Computation 19 (1965), in the form of T. G. Stockham that leaves
+// its results in order: C. Van Loan, "Computational Frameworks for the Fast Fourier Transform", SIAM, 1992.
+//
 // All memory is obtained by Allocate and AllocateReal; no transform allocates, and each takes time
 // proportional to N log N. The tables belong to all objects of a length together, and the last one frees
 // them: building and releasing may wait for other threads. A transform that was not built does nothing. One

@@ -37,7 +37,7 @@ public:
 
 // A note with its octave.
 struct TunedNote {
-    int note = -1;   // 0 A .. 11 G#; negative for none
+    int note = -1;   // 0 A to 11 G#; negative for none
     int octave = 0;  // changes at C: 440 Hz is the A of octave 4
     bool operator==(const TunedNote&) const = default;
 };
@@ -62,11 +62,13 @@ public:
     Tuner& operator=(const Tuner&) = delete;
 
     // 0 denoised harmonic product: the candidate whose partials, in decibels above the noise floor, explain
-    // most of what is heard, less for partials that are missing. 1 harmonic product, of five spectra. 2
-    // pseudo harmonic product: the largest sum of the first partials' levels. 3 legacy: the strongest partial
-    // or what it is an overtone of. 4 two-way mismatch (R. C. Maher and J. W. Beauchamp, "Fundamental
-    // frequency estimation of musical signals using a two-way mismatch procedure", J. Acoust. Soc. Am. 95,
-    // 1994). Kept as given; any other value works as 3.
+    // most of what is heard, less for partials that are missing. 1 harmonic product, of five spectra (M. R.
+    // Schroeder, "Period histogram and product spectrum", J. Acoust. Soc. Am. 43, 1968). 2 pseudo harmonic
+    // product: the largest sum of the first partials' levels. 3 legacy: the strongest partial
+    // or what it is an overtone of. 0 and 2 add up decibels, as the logarithm of method 1's product does, but
+    // over partials alone; they and 3 are this library's own. 4 two-way mismatch (R. C. Maher and J. W.
+    // Beauchamp, "Fundamental frequency estimation of musical signals using a two-way mismatch procedure", J.
+    // Acoust. Soc. Am. 95, 1994). Kept as given; any other value works as 3.
     static void SetDetectionMethod(int method);
     static int GetDetectionMethod();
 
@@ -75,9 +77,14 @@ public:
     static void SetShowDenoisedSpectrum(bool show);
     static bool GetShowDenoisedSpectrum();
 
-    // 0 Equal .. 10 Vallotti. One other than the current one is marked as changed and told to the listener;
-    // the notes follow at the next CookNotesFrequencies. Negative counts as 0; above 10 it is a change, too,
-    // and stored as 0.
+    // 0 Equal to 10 Vallotti. 1 Pythagorean: pure fifths from E flat to G sharp. 2, 7, 8 and 9 Meantone: each
+    // of them narrower by 1/4, 1/7, 2/7 and 1/3 of a syntonic comma. 3 Werckmeister III: C-G-D-A and B-F#
+    // narrower by 1/4 of a Pythagorean comma; 10 Vallotti: C-G-D-A-E-B-F# by 1/6. 4 to 6 Just: A-E, and Bb-F
+    // in 4, narrower by a whole syntonic comma. All other fifths are pure but the one that closes the circle.
+    // Cf. J. M. Barbour, "Tuning and Temperament: A Historical Survey", 1951.
+    //
+    // One other than the current one is marked as changed and told to the listener; the notes follow at the
+    // next CookNotesFrequencies. Negative counts as 0; above 10 it is a change, too, and stored as 0.
     static void SetTemperament(int temperament);
     static int GetTemperament();
     // Until the notes have followed.
@@ -91,7 +98,7 @@ public:
 
     // Works out the notes for temperament and calibration, unless neither `force` nor a change asks for it.
     static void CookNotesFrequencies(bool force);
-    // The octave of notes from the calibration base up, Hz: 0 A, 1 A#, 2 B, 3 C .. 11 G#, 12 the next A. 0
+    // The octave of notes from the calibration base up, Hz: 0 A, 1 A#, 2 B, 3 C to 11 G#, 12 the next A. 0
     // outside.
     static double GetNoteFrequency(int entry);
     // The A two octaves below the one the orchestra tunes to, Hz; 110 unless calibrated.
@@ -100,7 +107,7 @@ public:
     // 0 letters with sharps, 1 letters with flats, 2 solfege; anything else is stored as 0.
     static void SetNoteNaming(int naming);
     static int GetNoteNaming();
-    // The name of note 0 (A) .. 11 (G#) in the current naming, without its octave; empty outside.
+    // The name of note 0 (A) to 11 (G#) in the current naming, without its octave; empty outside.
     static const char* GetNoteName(int note);
 
     // Cents within which a note counts as tuned. Presets 0..5 are 0.1, 0.5, 1, 2, 5 and 10; any other is 2.
@@ -108,7 +115,7 @@ public:
     static float GetTunedQuantum();
     static void SetTunedQuantumPreset(int preset);
 
-    // 0 Standard .. 5 Very high frequencies; an index outside changes no value. Either way the tuner forgets
+    // 0 Standard to 5 Very high frequencies; an index outside changes no value. Either way the tuner forgets
     // what it heard: what is shown at once, its memories at the next analysis, when the values take effect.
     // Reading back gives 2 for both Standard and Sensitive.
     //
@@ -129,7 +136,7 @@ public:
     // Null for none.
     void SetDisplayListener(TunerDisplayListener* listener);
 
-    // The shape of the window that the spectra come through, as in the analyser's settings (0 rectangular ..
+    // The shape of the window that the spectra come through, as in the analyser's settings (0 rectangular to
     // 4 Blackman, which it is until set; anything else counts as Blackman). Display thread.
     void SetWindowType(int type);
 
@@ -148,7 +155,7 @@ public:
     bool IsTunedCentered() const;
     // Whether the note shown was heard only just now.
     bool IsTracking() const;
-    // Note and octave of the same analysis, and either of them alone: 0 A .. 11 G#, negative for no note; the
+    // Note and octave of the same analysis, and either of them alone: 0 A to 11 G#, negative for no note; the
     // octave, 0 without one.
     TunedNote GetTunedNote() const;
     int GetNote() const;

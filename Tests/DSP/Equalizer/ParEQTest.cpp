@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
-#include <numbers>
 #include <optional>
 #include <span>
 
@@ -50,7 +49,7 @@ void CompareWithPlain(int channels, int bands, std::uint64_t seed) {
     data.numBands = bands;
     for (auto& band : data.bands) band = RandomBand(random);
     ParEQ eq;
-    Plain::ParEQ<> plain(channels);
+    Plain::ParEQ plain(channels);
     eq.Cook(false, false, &data, rate, channels);
     plain.Cook(false, false, data, rate);
     for (int block = 0; block < 60; ++block) {
@@ -95,22 +94,6 @@ TEST(ParEQ, EqualsThePlainFormToTheBitWithEveryKernel) {
     }
 }
 
-// Catches a cascade that is right in itself but runs the wrong way round or with the wrong signs.
-TEST(ParEQ, LiftsASineByThePeaksHeight) {
-    constexpr int kRate = 48000, kHz = 1000;
-    auto data = Bands({{EQ_PEAK, kHz, 60, 200}, {EQ_LOWSHELF, 100, 0, 50}});
-    data.SetPhaseShift(true);
-    ParEQ eq;
-    eq.Cook(false, false, &data, kRate, 1);
-    const double centre = std::atan(std::numbers::pi * kHz / kRate) / std::numbers::pi * kRate;
-    const auto input = TestSupport::Sine<double>(9600, centre);
-    auto output = input;
-    eq.Process(output.data(), 9600, 1, false, &data);
-    const double gain = std::pow(10.0, 0.3);
-    for (std::size_t i = 4800; i < output.size(); ++i) ASSERT_NEAR(output[i], -gain * input[i], 1e-9) << i;
-    EXPECT_NEAR(std::abs(eq.GetResponse(0, centre, kRate, &data) + gain), 0.0, 1e-9);
-}
-
 TEST(ParEQ, StaysBoundedWhateverTheRecordSays) {
     constexpr int kMost = std::numeric_limits<int>::max();
     for (int type = 0; type < 8; ++type)
@@ -151,6 +134,9 @@ TEST_F(Peaks, TouchNothingButTheirChannel) {
 // Each channel's analyser gets that channel's result.
 TEST_F(Peaks, FeedTheAnalysersWithTheResult) {
     m_eq.Cook(false, false, &m_data, 48000, 3);
+    EXPECT_NEAR(m_eq.GetResponse(0, 1000.0, 48000, m_records.data()).real(), 1.995, 0.001);
+    m_records[1].SetPhaseShift(true);
+    EXPECT_NEAR(m_eq.GetResponse(1, 1000.0, 48000, m_records.data()).real(), -1.995, 0.001);
     auto samples = Noise<float>(3 * 2000);
     m_eq.Process(samples.data(), 2000, 3, true, m_records.data());
     for (std::size_t c = 0; c < 3; ++c) {

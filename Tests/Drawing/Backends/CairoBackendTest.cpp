@@ -142,32 +142,4 @@ TEST_F(CairoBackend, CopiesBitmapsPixelByPixel) {
     }
 }
 
-// Catches a kept copy that differs from what it was made of, one that outlives a change, and one that is
-// drawn for another bitmap, whose module has counted as far.
-TEST_F(CairoBackend, StretchesBitmapsTheSameEveryTime) {
-    DrawingBitmap bitmap, other;
-    bitmap.Size(4, 1);
-    const auto row = [](DrawingSurface<DrawingCairo>& surface, const DrawingBitmap& drawn) {
-        std::vector<std::uint32_t> pixels;
-        surface.Paint(96.0f, [&](DrawTarget& target) {
-            target.Clear(0x304050);
-            target.Bitmap(drawn, {2, 1, 11, 3}, 200);
-        });
-        for (int x = 0; x < 16; ++x) pixels.push_back(surface.Pixel(x, 2));
-        return pixels;
-    };
-    DrawingSurface<DrawingCairo> keeps(16, 5);
-    for (const std::uint32_t last : {0xFFFFFFFFu, 0x80004000u}) {
-        bitmap.pixels = {0xFF102030, 0, 0x80800000, last};
-        bitmap.Changed();
-        other = bitmap;
-        other.pixels[0] = 0xFFFF0000;
-        for (const DrawingBitmap* drawn : {&bitmap, &other}) {
-            DrawingSurface<DrawingCairo> first(16, 5);
-            const auto expected = row(first, *drawn);
-            for (int time = 1; time <= 3; ++time) EXPECT_EQ(row(keeps, *drawn), expected) << time;
-        }
-    }
-}
-
 }  // namespace

@@ -5,6 +5,7 @@
 #include <string_view>
 #include <type_traits>
 #include <utility>
+#include <vector>
 
 #include <gtest/gtest.h>
 
@@ -178,22 +179,42 @@ TYPED_TEST(Primitives, BlendBitmapsByTheirAlpha) {
     }
 }
 
-// Catches a copy that is kept after the bitmap has changed (its pixels, its kind, its size), the unused top
-// byte taken for an alpha, and rounding of what should be copied.
+// Catches a copy that is kept after the bitmap has changed (its pixels, its kind, its size), one that is
+// drawn for another bitmap, whose module has counted as far, or differs from what it was made of; the unused
+// top byte taken for an alpha, and rounding of what should be copied.
 TYPED_TEST(Primitives, CopyEveryVersionOfABitmap) {
-    DrawingSurface<TypeParam> surface(4, 4);
-    DrawingBitmap bitmap;
+    constexpr int kSide = 12;
+    DrawingSurface<TypeParam> surface(kSide, 4);
+    const auto row = [](auto& painted, const DrawingBitmap& drawn, int width, std::uint8_t opacity) {
+        std::vector<std::uint32_t> pixels;
+        painted.Paint(96.0f, [&](DrawTarget& target) {
+            target.Clear(0x304050);
+            target.Bitmap(drawn, {1, 1, static_cast<float>(width), 1}, opacity);
+        });
+        for (int x = 0; x < width; ++x) pixels.push_back(painted.Pixel(1 + x, 1));
+        return pixels;
+    };
+    DrawingBitmap bitmap, other;
     for (const DrawingBitmap& next : {DrawingBitmap{1, 1, {0xFF112233}},
                                       {1, 1, {0x00445566}, true},
-                                      {2, 1, {0x00FF0102, 0x80030405}, true}}) {
+                                      {2, 1, {0x00FF0102, 0x80030405}, true},
+                                      {4, 1, {0xFF102030, 0, 0x80800000, 0x80004000}},
+                                      {4, 1, {0xFF102030, 0, 0x80800000, 0xFFFFFFFF}}}) {
         bitmap = next;
         bitmap.Changed();
-        surface.Paint(96.0f, [&](DrawTarget& target) {
-            target.Clear(0x808080);
-            target.Bitmap(bitmap, {1, 1, static_cast<float>(bitmap.width), 1}, 255);
-        });
-        for (int x = 0; x < bitmap.width; ++x)
-            EXPECT_EQ(surface.Pixel(1 + x, 1), bitmap.Row(0)[x] & 0xFFFFFF) << x;
+        other = bitmap;
+        other.pixels[0] = 0xFFFF0000;
+        for (int time = 0; time < 6; ++time) {
+            const DrawingBitmap& drawn = time % 2 ? other : bitmap;
+            const auto copied = row(surface, drawn, drawn.width, 255);
+            for (std::size_t x = 0; x < copied.size(); ++x)
+                if (drawn.opaque || drawn.pixels[x] >> 24 == 0xFF) {
+                    EXPECT_EQ(copied[x], drawn.pixels[x] & 0xFFFFFF) << x;
+                }
+            DrawingSurface<TypeParam> fresh(kSide, 4);
+            const auto stretched = row(fresh, drawn, kSide - 1, 200);
+            EXPECT_EQ(row(surface, drawn, kSide - 1, 200), stretched) << time;
+        }
     }
 }
 

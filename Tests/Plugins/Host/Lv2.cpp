@@ -6,7 +6,6 @@
 #include <lv2/time.h>
 #include <lv2/urid.h>
 
-#include <cmath>
 #include <fstream>
 #include <map>
 #include <sstream>

@@ -10,7 +10,6 @@
 #include <array>
 #include <cmath>
 #include <cstring>
-#include <set>
 #include <stdexcept>
 #include <utility>
 

@@ -8,8 +8,6 @@
 #include <vector>
 
 #include "Plain/PlainFft.h"
-#include "Platform/AlignedMemory.h"
-#include "Spectrum/Fft/FftPlan.h"
 #include "Support/AudioThreadRules.h"
 #include "Support/Signals.h"
 
@@ -117,30 +115,6 @@ TYPED_TEST(CorvoFFTOf, DoesNothingUnlessBuilt) {
     const TestSupport::AudioThreadRules rules;
     runAll();
     EXPECT_EQ(rules.Broken(), "");
-}
-
-// The same project must sound and look the same on every machine.
-TYPED_TEST(CorvoFFTOf, EveryInstructionSetGivesTheSameBits) {
-    using namespace Corvo::Fft;
-    using Bytes = std::vector<unsigned char, Corvo::AlignedAllocator<unsigned char>>;
-    for (const Kind kind : {Kind::Real, Kind::Complex})
-        for (int order = 0; order <= 13; ++order) {
-            Bytes memory(PlanBytes<TypeParam>(order, kind));
-            const auto& plan = *BuildPlan<TypeParam>(memory.data(), order, kind);
-            Bytes work(WorkValues(plan.points) * sizeof(TypeParam));
-            auto* const scratch = reinterpret_cast<TypeParam*>(work.data());
-            const auto input = Noise<TypeParam>(std::max<std::size_t>(2 * plan.points, 1));
-            const auto run = [&](const Kernels<TypeParam>& kernels) {
-                Values<TypeParam> out(input.size()), back(input.size());
-                const bool real = kind == Kind::Real;
-                (real ? kernels.realForward : kernels.complexForward)(plan, input.data(), out.data(),
-                                                                      scratch);
-                (real ? kernels.realInverse : kernels.complexInverse)(plan, out.data(), back.data(), scratch);
-                out.insert(out.end(), back.begin(), back.end());
-                return out;
-            };
-            EXPECT_EQ(run(BestKernels<TypeParam>()), run(BaselineKernels<TypeParam>())) << order;
-        }
 }
 
 // Catches tables that go while another object of the length still has them.

@@ -46,13 +46,13 @@ public:
         return m_analyser.GetPower();
     }
     // Hop 1: every analysis counts as one refresh.
-    void Tune(const std::vector<float>& power, bool denoise = false) {
-        tuner.Tune(power, {}, m_length, 1, m_length, m_rate, true, denoise);
+    void Tune(const std::vector<float>& power) {
+        tuner.Tune(power, {}, m_length, 1, m_length, m_rate, true, false);
     }
-    void Tune(const float* samples, bool denoise = false) { Tune(Transform(samples), denoise); }
+    void Tune(const float* samples) { Tune(Transform(samples)); }
     // A first note needs two analyses.
-    void Show(const float* samples, bool denoise = false) {
-        for (int i = 0; i < 2; ++i) Tune(samples, denoise);
+    void Show(const float* samples) {
+        for (int i = 0; i < 2; ++i) Tune(samples);
     }
     // What analyses of one sound hear, whatever came before.
     double Hear(const float* samples) { return Hear(Transform(samples)); }

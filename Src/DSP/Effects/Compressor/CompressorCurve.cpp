@@ -231,6 +231,7 @@ double TransferCurve::KeepDetached(const Knee& knee, float threshold) {
 
 void TransferCurve::Redraw(const Knee& knee, float threshold, double slope) {
     const bool soft = knee.shape == Knee::Shape::Soft;
+    const auto before = count;
     double pivot = threshold;
     const auto level = [&](double up) {
         const double bent = soft ? up - (1.0 - slope) * KneeRamp(up, 2.0 * knee.halfWidth) : up * slope;
@@ -279,7 +280,7 @@ void TransferCurve::Redraw(const Knee& knee, float threshold, double slope) {
         draw(0.0, range, soft ? kHalfKneeSegments + kSegmentsAbove : kSegmentsAbove);
     }
     Add(1.0, level(range));
-    std::fill(points.begin() + count, points.end(), CurvePoint{});
+    std::fill(points.begin() + count, points.begin() + std::max(before, count), CurvePoint{});
     UpdateSlopes();
 }
 

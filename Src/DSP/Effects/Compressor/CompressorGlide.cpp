@@ -110,20 +110,23 @@ int GlideFrames(double factor, double smoothing) {
 }
 
 bool GlidingMap::SetOutFor(const CompMapStereo& wanted, double smoothing) {
-    if (m_target == wanted.m_comp_map) return false;
+    const auto isTarget = [this](std::size_t channel, const TransferCurve& curve) {
+        return m_target[channel].curve == curve;
+    };
+    if (isTarget(0, wanted.m_comp_map[0]) && isTarget(1, wanted.m_comp_map[1])) return false;
     bool otherPoints = false;
     for (std::size_t channel = 0; channel < 2; ++channel) {
         auto& curve = m_comp_map[channel];
         const auto& target = wanted.m_comp_map[channel];
         m_heard.count = 0;
         for (int i = 0; i < curve.count; ++i) m_heard.Add(curve.X(i, factor), curve.Y(i, factor));
-        if (HaveSamePoints(m_target[channel], target)) {
+        if (HaveSamePoints(m_target[channel].curve, target)) {
             MoveTargets(curve, target);
         } else {
             MergePoints(curve, target);
             otherPoints = true;
         }
-        m_target[channel] = target;
+        CopyInUse(target, m_target[channel].curve);
     }
     factor = 1.0;
     framesLeft = GlideFrames(factor, smoothing);
@@ -166,9 +169,10 @@ void GlidingMap::Arrive() {
     framesLeft = 0;
     for (std::size_t channel = 0; channel < 2; ++channel) {
         auto& curve = m_comp_map[channel];
-        curve.count = m_target[channel].count;
+        const auto& target = m_target[channel].curve;
+        curve.count = target.count;
         std::size_t i = 0;
-        for (const auto& point : m_target[channel]) {
+        for (const auto& point : target) {
             curve.points[i].x = point.x;
             curve.points[i].y = point.y;
             curve.points[i].offsetX = curve.points[i].offsetY = 0.0;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 
@@ -21,7 +22,7 @@ struct GlidingCurve {
     };
     // Room for the points of what is heard and of a new target.
     static constexpr std::size_t kRoom = 2 * TransferCurve::kMaxPoints;
-    int count = 0;
+    int count = 0;  // in front, near the first points
     std::array<Point, kRoom> points;
 
     double X(int i, double factor) const {
@@ -36,10 +37,29 @@ struct GlidingCurve {
     int SegmentAt(double level, double factor) const;
 };
 
+// Leaves what is beyond the points in use as it is.
+inline void CopyInUse(const TransferCurve& from, TransferCurve& to) {
+    std::copy(from.begin(), from.end(), to.points.begin());
+    to.count = from.count;
+}
+inline void CopyInUse(const CompMapStereo& from, CompMapStereo& to) {
+    for (std::size_t channel = 0; channel < 2; ++channel)
+        CopyInUse(from.m_comp_map[channel], to.m_comp_map[channel]);
+    to.reserved = from.reserved;
+    to.last_threshold = from.last_threshold;
+    to.last_ratio_step = from.last_ratio_step;
+}
+
+// The curve that a glide leads to, of which only the points in use are ever written.
+union GlideTarget {
+    GlideTarget() { curve.count = 0; }
+    TransferCurve curve;
+};
+
 // A curve as it is heard at one moment.
 struct HeardCurve {
-    std::array<double, GlidingCurve::kRoom> x, y;
     std::size_t count = 0;
+    std::array<double, GlidingCurve::kRoom> x, y;
 
     void Add(double level, double output);
     // The output level for an input level that is at the point `next`, or between it and the one before.
@@ -80,7 +100,7 @@ private:
     void MoveTargets(GlidingCurve& curve, const TransferCurve& target);
     void MergePoints(GlidingCurve& curve, const TransferCurve& target);
 
-    std::array<TransferCurve, 2> m_target;
+    std::array<GlideTarget, 2> m_target;
     HeardCurve m_heard;  // while a curve sets out
 };
 

@@ -4,7 +4,6 @@
 #include <atomic>
 #include <cmath>
 #include <cstdint>
-#include <memory>
 
 #include "DSP/Effects/Compressor/Compressor.h"
 #include "DSP/Effects/Compressor/CompressorCore.h"
@@ -17,11 +16,25 @@ namespace Corvo::DSP::CompressorPrivate {
 constexpr std::int32_t kMonitorFlag = 1;                              // of the flags word
 constexpr std::int32_t kSilentOutGain = -960, kHighestOutGain = 200;  // tenths of a decibel
 
+// Settings of which only the points in use are ever written: most of the memory is not touched.
+union SettingsInUse {
+    SettingsInUse() {}
+    SettingsInUse& operator=(const Compressor::Settings& from) {
+        value.parameters = from.parameters;
+        CopyInUse(from.map, value.map);
+        return *this;
+    }
+    SettingsInUse(const SettingsInUse&) = delete;
+    SettingsInUse& operator=(const SettingsInUse& from) { return *this = from.value; }
+    Compressor::Settings value;
+};
+
 // Settings as they travel between the threads, with the number of the user interface's submission that they
 // are, or derive from.
 struct NumberedSettings {
-    Compressor::Settings settings;
-    std::uint32_t submission = 0;
+    NumberedSettings() {}  // a new one is not written either
+    SettingsInUse settings;
+    std::uint32_t submission;
 };
 
 // What the user interface edits, guarded by the section.
@@ -60,21 +73,11 @@ struct AudioSide {
     }
 };
 
-// Settings on their way, which are handed over whole; until then the memory is not touched.
-union SettingsSlot {
-    SettingsSlot() {}
-    SettingsSlot& operator=(const NumberedSettings& settings) {
-        std::construct_at(&value, settings);
-        return *this;
-    }
-    NumberedSettings value;
-};
-
 // The ways across, and the single values that both sides see.
 struct HandOver {
     std::atomic<bool> meterOn{false}, usingSideChain{false};
     std::array<std::atomic<float>, 2> displayGain{1.0f, 1.0f};
-    LatestValue<SettingsSlot> toAudio, toUserInterface;
+    LatestValue<NumberedSettings> toAudio, toUserInterface;
 };
 
 }  // namespace Corvo::DSP::CompressorPrivate

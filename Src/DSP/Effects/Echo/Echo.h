@@ -33,8 +33,8 @@ struct Delay;
 // Stereo delay with feedback; the two sides have their own time, gains and mix, and share the mode.
 //
 // Modes, parameters 2 and 3 ("Depth mode"; only 2 sets it): 0 "Time (linear)" 0..10 s, 1 "Time (log)"
-// 20..4999 ms, 2 to 4 "Tempo (straight)", "(triplet)", "(dotted)": a note of the host's tempo, from 1/256
-// to a measure. Entering a time mode keeps the delay that is heard.
+// 20..4999 ms, 2 to 4 "Tempo (straight)", "(triplet)", "(dotted)": a part of the host's beat, from 1/256
+// of it to a whole measure. Entering a time mode keeps the delay that is heard.
 //
 // Blocks are interleaved, mono or stereo; 64-bit samples are double, every other width is taken for
 // float. Channels after the second pass unchanged, and so does everything when there was no memory for

@@ -270,7 +270,7 @@ public:
     // InitProcessing; 0 when there are none. A host that waits for silence waits as long. Between blocks.
     double LongestGap() const;
 
-    std::vector<int> GetAllSupportedParameterIds();  // 0 .. real count - 1
+    std::vector<int> GetAllSupportedParameterIds();  // 0 to real count - 1
     // One normalised value per parameter, in external order; -1 without preset data.
     std::vector<float> GetPresetValues(int preset);
     // A pad for InitializeXyEditingData, made of its four fields.

@@ -13,9 +13,9 @@ namespace Corvo::DSP {
 
 // The settings, the chunk after its first two words, and a row of the preset table: plain values.
 struct PitchDoctorSettings {
-    float scaleRoot;              // 0 C .. 11 B
-    float scaleMode;              // 0 chromatic .. 12 whole tone
-    std::array<float, 12> notes;  // 1 allowed, 0 not; C .. B
+    float scaleRoot;              // 0 C to 11 B
+    float scaleMode;              // 0 chromatic to 12 whole tone
+    std::array<float, 12> notes;  // 1 allowed, 0 not; C to B
     float retune, transition;     // ms
     float ratio;                  // %
     float tolerance;              // cents
@@ -30,7 +30,7 @@ struct PitchDoctorSettings {
     float silence;                // dB
     float followTuner;            // 1 on, 0 off
     float concertPitch;           // Hz
-    float temperament;            // 0 equal .. 10 Vallotti, in the tuner's order
+    float temperament;            // 0 equal to 10 Vallotti, in the tuner's order
     float mix;                    // %
 };
 static_assert(sizeof(PitchDoctorSettings) == 4 * 32);

@@ -26,7 +26,7 @@ static_assert(sizeof(_transform_props) == 88);
 // Transposes a stream by a fixed ratio per side. The work is done by a pitch-shift back-end, which the
 // settings choose: "New" (SoundTouch, one ratio for all channels; overlap-add as in W. Verhelst and M.
 // Roelands, "An overlap-add technique based on waveform similarity (WSOLA) for high quality time-scale
-// modification of speech", ICASSP 1993) or "Classic" (a ratio per side, float only).
+// modification of speech", ICASSP 1993) or "Classic" (a ratio per side, float only; see PitchAdapter).
 //
 // Blocks are interleaved, 1 to 16 channels; 64-bit blocks are double, all others float. The start of the
 // stream is silence until the back-end is full, so the output depends on how the stream is cut. "New"

@@ -22,8 +22,12 @@ namespace Corvo::DSP {
 // run over the newest input. Cleanup and InitProcessing are not called while a block is processed.
 //
 // Settings chunk: 44 bytes, the leading word and the ten values as floats. They are stored as they come; out
-// of range, drive, function and oversampling act like the nearest end, a boost like none, and the tone
-// follows its formula.
+// of range, drive, function and oversampling act like the nearest end, a boost like none, and the tone like
+// none unless its corner, 0.35 + 3.15 tone radians per sample, lies within 0.1..3.
+//
+// A boost v multiplies by 1 + 10 v. The tone's low-pass is four equal sections of first order, designed by
+// the bilinear transform with k = tan(corner / 2). Without drive no function acts, and samples are not
+// limited.
 class DSP_API TubeDistorsion : public CorvoEffect {
 public:
     TubeDistorsion();

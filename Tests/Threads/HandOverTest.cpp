@@ -1,12 +1,17 @@
-#include "Threads/LatestValue.h"
-
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <array>
 #include <memory>
 #include <thread>
 
+#include "Threads/LatestValue.h"
+#include "Threads/RecentValues.h"
+
+// Values on their way from one thread to another.
+
 using Corvo::DSP::LatestValue;
+using Corvo::DSP::RecentValues;
 
 TEST(LatestValue, GivesTheNewestOnce) {
     LatestValue<int> slot;
@@ -58,4 +63,41 @@ TEST(LatestValue, KeepsTheThreadsApart) {
     for (int i = 0; i < 2; ++i, slot.Publish())
         for (auto* rest : {&slot.Draft(), &slot.Taken()})
             if (*rest) (*rest)->owner = std::this_thread::get_id();
+}
+
+using Two = std::array<std::uint32_t, 2>;
+
+TEST(RecentValues, KeepsTheNewest) {
+    RecentValues<Two, 8> values;
+    std::vector<Two> taken;
+    for (std::uint32_t i = 0; i < 20; ++i) values.Push({i, i});
+    values.Take(taken);
+    ASSERT_EQ(taken.size(), 8u);
+    EXPECT_EQ(taken.front()[0], 12u);
+    values.Push({20, 20});
+    values.Take(taken);
+    EXPECT_EQ(taken.back()[0], 20u);
+    EXPECT_EQ(taken.size(), 9u);
+}
+
+// Catches values that are half of one and half of another, or out of order. Under the thread sanitizer:
+// races.
+TEST(RecentValues, NeverGivesOneHalfWritten) {
+    constexpr std::uint32_t kLast = 200000;
+    RecentValues<Two, 4> values;
+    std::thread writer([&] {
+        for (std::uint32_t i = 1; i <= kLast; ++i) values.Push({i, ~i});
+    });
+    std::uint32_t before = 0;
+    std::vector<Two> taken;
+    while (before < kLast) {
+        taken.clear();
+        values.Take(taken);
+        for (const auto& [first, second] : taken) {
+            ASSERT_EQ(second, ~first);
+            ASSERT_GT(first, before);
+            before = first;
+        }
+    }
+    writer.join();
 }
