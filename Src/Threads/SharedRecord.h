@@ -39,6 +39,12 @@ inline void StoreWord(void* record, std::size_t place, std::uint32_t word) {
     __atomic_store_n(static_cast<AnyWord*>(record) + place, word, __ATOMIC_RELAXED);
 }
 
+// Audio thread: lowers the flag that says there is something new, and tells whether it was up. It looks
+// first: an exchange holds up all reading behind it, however far away the flag's memory is.
+inline bool TakeFlag(std::atomic<bool>& flag) {
+    return flag.load(std::memory_order_relaxed) && flag.exchange(false, std::memory_order_acquire);
+}
+
 template <SharedRecord Record>
 Record Snapshot(const Record& shared) {
     std::array<std::uint32_t, sizeof(Record) / 4> words;

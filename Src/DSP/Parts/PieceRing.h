@@ -49,11 +49,15 @@ public:
         m_position = end >= m_length ? end - m_length : end;
     }
 
-    // For a line that is only written here and read elsewhere.
-    void Push(const T* samples, int count) {
+    // For a line that is only written here and read elsewhere: where a piece goes before the ring advances.
+    // It stays there until it is the oldest.
+    T* Space() {
         // A piece may begin before the first sample.
         if (!m_full && m_position == 0) std::fill_n(m_cells + m_length - kPiece, kPiece, T(0));
-        std::copy_n(samples, count, m_cells + m_position);
+        return m_cells + m_position;
+    }
+    void Push(const T* samples, int count) {
+        std::copy_n(samples, count, Space());
         Advance(count);
     }
     // `count` samples that were pushed one after the other, the first of them `delay` ago, 1..length. The
@@ -64,6 +68,14 @@ public:
         const int at = m_position - delay;
         return m_cells + (at < 0 ? at + m_length : at);
     }
+
+    // Where the sample is that will be the oldest in `frames`, less than a length, or was it -`frames` ago:
+    // to ask for memory beforehand.
+    const T* Ahead(int frames) const {
+        const int at = m_position + frames;
+        return m_cells + (at < 0 ? at + m_length : at < m_length ? at : at - m_length);
+    }
+    int Length() const { return m_length; }
 
 private:
     T* m_cells = nullptr;

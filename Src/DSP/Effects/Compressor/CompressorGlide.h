@@ -80,9 +80,9 @@ int GlideFrames(double factor, double smoothing);
 // Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
 // targets exactly.
 struct GlidingMap {
-    std::array<GlidingCurve, 2> m_comp_map;
     double factor = 0.0;
     int framesLeft = 0;
+    std::array<GlidingCurve, 2> m_comp_map;
 
     // Sets out for new curves from wherever the points are; nothing changes when these are the targets
     // already. What is heard stays the same until the factor shrinks. Where the last target's points have

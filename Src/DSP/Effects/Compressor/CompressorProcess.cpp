@@ -78,15 +78,15 @@ void Compressor::SetSidechainBuffer(int bus, double* const* channels) {
             channels[audio.sideChainChannels];
         ++audio.sideChainChannels;
     }
-    m_hand_over->usingSideChain = audio.sideChainChannels > 0;
+    m_hand_over->usingSideChain.store(audio.sideChainChannels > 0, std::memory_order_relaxed);
 }
 
 void Compressor::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     const int channels = format->nChannels;
     auto& audio = *m_audio;
-    m_hand_over->usingSideChain = audio.sideChainChannels > 0;
-    audio.coefficients.meter = m_hand_over->meterOn;
+    m_hand_over->usingSideChain.store(audio.sideChainChannels > 0, std::memory_order_relaxed);
+    audio.coefficients.meter = m_hand_over->meterOn.load(std::memory_order_relaxed);
     if (frames > 0 && (channels == 1 || channels == 2))
         WithSamples(buffer, *format, OtherWidths::Skip,
                     [&](auto* samples) { ProcessBlock(samples, frames, channels); });
@@ -159,7 +159,8 @@ void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
     }
     audio.ClearUnlessFinite();
     for (std::size_t channel = 0; channel < 2; ++channel)
-        m_hand_over->displayGain[channel] = static_cast<float>(audio.state.displayGain[channel]);
+        m_hand_over->displayGain[channel].store(static_cast<float>(audio.state.displayGain[channel]),
+                                                std::memory_order_relaxed);
 }
 
 template <typename Sample>

@@ -45,16 +45,17 @@ struct UserInterfaceSide {
     EditChannelMode editChannelMode = EditChannelMode::Both;
 };
 
-// What belongs to the audio thread alone.
+// What belongs to the audio thread alone. What every block needs stands first and together: in a session of
+// many tracks each page and each line of it has to be fetched again.
 struct AudioSide {
-    NumberedSettings current;
     tWAVEFORMATEX format{};
-    GlidingMap map;
     CoreCoefficients coefficients;
     CoreState state;
     int gainFramesLeft = 0;  // of the out gain's glide
     std::array<double*, 2> sideChain{};
     int sideChainChannels = 0;  // 0: none was handed over for this block
+    GlidingMap map;
+    NumberedSettings current;
 
     void ClearUnlessFinite() {
         for (std::size_t channel = 0; channel < 2; ++channel) {
@@ -74,9 +75,9 @@ struct AudioSide {
 
 // The ways across, and the single values that both sides see.
 struct HandOver {
-    LatestValue<NumberedSettings> toAudio, toUserInterface;
     std::atomic<bool> meterOn{false}, usingSideChain{false};
     std::array<std::atomic<float>, 2> displayGain{1.0f, 1.0f};
+    LatestValue<NumberedSettings> toAudio, toUserInterface;
 };
 
 }  // namespace Corvo::DSP::CompressorPrivate

@@ -9,6 +9,7 @@
 #include "DSP/Effects/Parameters/EffectTable.h"
 #include "Platform/DenormalGuard.h"
 #include "Platform/FiniteSamples.h"
+#include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -87,7 +88,7 @@ void CorvoEffectBase::SetParam(int index, float normalised, bool fromAutomation)
 CorvoEffectBase::Cook CorvoEffectBase::TakeCook(tWAVEFORMATEX& seen, const tWAVEFORMATEX& now, bool force) {
     const bool afresh = force || now.nChannels != seen.nChannels || now.nSamplesPerSec != seen.nSamplesPerSec;
     seen = now;
-    return {m_cook.exchange(false, std::memory_order_acquire) || afresh, afresh};
+    return {TakeFlag(m_cook) || afresh, afresh};
 }
 
 // An effect that runs out of memory may be in any state: it is left alone until it is prepared again.

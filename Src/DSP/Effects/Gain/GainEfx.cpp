@@ -187,14 +187,14 @@ void GainEfx::CheckCookProperties(const tWAVEFORMATEX* format, bool) {
     m_format = *format;
     const bool mono = m_format.nChannels != 2;
     m_stereo_hidden.store(mono, std::memory_order_relaxed);
-    if (!m_layout_dirty.exchange(false, std::memory_order_acquire) && mono == wasMono) return;
+    if (!TakeFlag(m_layout_dirty) && mono == wasMono) return;
     if (!mono) m_had_stereo.store(true, std::memory_order_relaxed);
     m_mono_layout.store(mono, std::memory_order_relaxed);
     SetUpdateUiFromScratch(true);
 }
 
 void GainEfx::UpdateCoefficients() {
-    if (!m_coef_dirty.exchange(false, std::memory_order_acquire)) return;
+    if (!TakeFlag(m_coef_dirty)) return;
     const auto params = Snapshot(m_params);
     // Above 1 the width grows twice as fast, up to 4.
     m_coef_side = params[kWidth] > 1.0f ? 2.0f * params[kWidth] : params[kWidth];

@@ -268,7 +268,7 @@ void PitchShift::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
     const tWAVEFORMATEX& before = m_back_ends->format;
     const bool newFormat = format->nChannels != before.nChannels ||
                            format->nSamplesPerSec != before.nSamplesPerSec || !m_back_ends->InUse();
-    if (!m_cook.exchange(false, std::memory_order_acquire) && !force && !newFormat) return;
+    if (!TakeFlag(m_cook) && !force && !newFormat) return;
     m_back_ends->factorsPending.store(false, std::memory_order_relaxed);  // the cook sends them
     const unsigned edits = m_back_ends->edits.load(std::memory_order_acquire);
     auto record = Snapshot(m_record);

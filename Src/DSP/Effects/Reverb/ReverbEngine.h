@@ -5,12 +5,15 @@
 #include <cmath>
 #include <memory>
 #include <new>
+#include <type_traits>
+#include <xsimd/xsimd.hpp>
 
 #include "DSP/Effects/Reverb/ReverbDesign.h"
 #include "DSP/Effects/Reverb/ReverbKernel.h"
 #include "DSP/Equalizer/BiquadSection.h"
 #include "DSP/Parts/PieceRing.h"
 #include "Platform/FiniteSamples.h"
+#include "Platform/Prefetch.h"
 #include "Platform/Processor.h"
 
 namespace Corvo::DSP {
@@ -116,6 +119,7 @@ public:
 private:
     static constexpr int kPiece = PieceRing<T>::kPiece;
     static constexpr std::size_t kCombs = ReverbDesign::kCombs;
+    static constexpr int kFetches = 4;  // parts of a piece, each with memory to ask for
     static constexpr double kFilterHz = 10.0, kFilterQ = 50.0;
     using Early = PieceRing<T, kReverbStretch>;
 
@@ -149,12 +153,14 @@ private:
 
     template <std::size_t Channels>
     void RunStretch(const Pointers& samples, std::ptrdiff_t stride, int frames) {
-        // On their way: input, reflections, tail.
-        alignas(64) std::array<std::array<T, kReverbStretch>, 2> in, early;
+        // On their way: reflections, tail. The input goes straight to where it is reflected from.
+        alignas(64) std::array<std::array<T, kReverbStretch>, 2> early;
         alignas(64) std::array<std::array<T, kPiece>, 2> sum;
-        const Pointers from{in[0].data(), in[1].data()}, reflected{early[0].data(), early[1].data()};
+        const Pointers reflected{early[0].data(), early[1].data()};
+        Pointers from = reflected;
+        for (std::size_t c = 0; m_reflects && c < Channels; ++c) from[c] = m_data[c].early.Space();
         Filter<Channels>(samples, stride, frames, from);
-        for (std::size_t c = 0; c < Channels; ++c) Reflect(m_data[c], from[c], reflected[c], frames);
+        for (std::size_t c = 0; m_reflects && c < Channels; ++c) Reflect(m_data[c], reflected[c], frames);
         for (int done = 0, count; done < frames; done += count) {
             count = std::min(frames - done, m_shortest);
             RunCombs<Channels>({reflected[0] + done, reflected[1] + done}, {sum[0].data(), sum[1].data()},
@@ -179,32 +185,88 @@ private:
         }
     }
 
+    // Into `in`, while the delay lines' memory is on its way: in a session of many tracks it is in no near
+    // cache.
     template <std::size_t Channels>
     void Filter(const std::array<T*, 2>& samples, std::ptrdiff_t stride, int count, const Pointers& in) {
-        if (!m_filters) {
-            for (std::size_t c = 0; c < Channels; ++c)
-                for (int i = 0; i < count; ++i) in[c][i] = samples[c][i * stride];
-            return;
-        }
-        const auto s = m_section;
-        std::array<double, Channels> w1, w2;
-        for (std::size_t c = 0; c < Channels; ++c) w1[c] = m_data[c].w1, w2[c] = m_data[c].w2;
-        for (int i = 0; i < count; ++i)
-            for (std::size_t c = 0; c < Channels; ++c) {
-                const double w = samples[c][i * stride] - s.a1 * w1[c] - s.a2 * w2[c];
-                in[c][i] = static_cast<T>(s.b0 * w + s.b1 * w1[c] + s.b2 * w2[c]);
-                w2[c] = w1[c];
-                w1[c] = w;
+        using Value = std::conditional_t<Channels == 2, xsimd::batch<double, xsimd::sse2>, double>;
+        const auto both = [](double first, [[maybe_unused]] double second) {
+            if constexpr (Channels == 2)
+                return Value{first, second};
+            else
+                return first;
+        };
+        const Value b0(m_section.b0), b1(m_section.b1), b2(m_section.b2), a1(m_section.a1), a2(m_section.a2);
+        Value w1 = both(m_data[0].w1, m_data[1].w1), w2 = both(m_data[0].w2, m_data[1].w2);
+        for (int i = 0; i < count;) {
+            const int first = i, piece = std::min(count - i, kPiece);
+            for (int part = 0; part < kFetches; ++part) {
+                Fetch<Channels>(part, first, piece, first + piece == count);
+                const int end = first + piece * (part + 1) / kFetches;
+                for (; i < end && !m_filters; ++i)
+                    for (std::size_t c = 0; c < Channels; ++c) in[c][i] = samples[c][i * stride];
+                for (; i < end; ++i) {
+                    const Value x = both(samples[0][i * stride], samples[Channels - 1][i * stride]);
+                    const Value w = x - a1 * w1 - a2 * w2, y = b0 * w + b1 * w1 + b2 * w2;
+                    w2 = w1;
+                    w1 = w;
+                    if constexpr (Channels == 2) {
+                        in[0][i] = static_cast<T>(y.get(0));
+                        in[1][i] = static_cast<T>(y.get(1));
+                    } else {
+                        in[0][i] = static_cast<T>(y);
+                    }
+                }
             }
-        for (std::size_t c = 0; c < Channels; ++c) m_data[c].w1 = w1[c], m_data[c].w2 = w2[c];
+        }
+        if constexpr (Channels == 2) {
+            m_data[0].w1 = w1.get(0), m_data[1].w1 = w1.get(1);
+            m_data[0].w2 = w2.get(0), m_data[1].w2 = w2.get(1);
+        } else {
+            m_data[0].w1 = w1, m_data[0].w2 = w2;
+        }
     }
 
-    void Reflect(ReverbData<T>& data, const T* in, T* early, int count) {
-        if (!m_reflects) {
-            std::copy_n(in, count, early);
-            return;
+    // Asks for a part of the memory of the piece that comes `ahead` frames after the present one.
+    template <std::size_t Channels>
+    [[gnu::always_inline]] void Fetch(int part, int ahead, int count, bool last) const {
+        const auto& data = m_data[static_cast<std::size_t>(part) % Channels];
+        if (part >= static_cast<int>(2 * Channels)) return;
+        if (part >= static_cast<int>(Channels))
+            FetchLoops(data, ahead, count, last);
+        else if (m_reflects)
+            FetchTaps(data, ahead, count, last);
+    }
+    // What the tap before read is there already.
+    [[gnu::always_inline]] static void FetchTaps(const ReverbData<T>& data, int ahead, int count, bool last) {
+        int before = 0;
+        for (const int tap : data.taps) {
+            if (tap - before > ahead) FetchCells(data.early.Ahead(-tap) + ahead, count, last);
+            before = tap;
         }
-        data.early.Push(in, count);
+    }
+    [[gnu::always_inline]] static void FetchLoops(const ReverbData<T>& data, int ahead, int count,
+                                                  bool last) {
+        const auto fetch = [=](const auto& ring, int frames) {
+            if (ring.Length() >= kReverbStretch) FetchCells(ring.Ahead(frames), count, last);
+        };
+        for (const auto& comb : data.combs) fetch(comb, ahead);
+        if (data.offset == 0) return;
+        fetch(data.align, ahead);
+        fetch(data.align, ahead - std::abs(data.offset));
+    }
+    [[gnu::always_inline]] static void FetchCells(const T* cells, int count, bool last) {
+        constexpr int kStep = static_cast<int>(kCacheLine / sizeof(T));
+        if (count == kPiece)
+            for (int i = 0; i < kPiece; i += kStep) Prefetch(cells + i);
+        else
+            for (int i = 0; i < count; i += kStep) Prefetch(cells + i);
+        if (last) Prefetch(cells + count - 1);
+    }
+
+    // The input is in its place.
+    void Reflect(ReverbData<T>& data, T* early, int count) {
+        data.early.Advance(count);
         std::array<const T*, ReverbDesign::kTaps> from;
         for (std::size_t k = 0; k < from.size(); ++k)
             from[k] = data.early.Before(data.taps[k] + count, count);
@@ -222,15 +284,16 @@ private:
     }
 
     // From the combs' sum to the finished samples, in place.
-    void Output(ReverbData<T>& data, const T* in, T* early, T* sum, int count) {
+    void Output(ReverbData<T>& data, const T* in, const T* early, T* sum, int count) {
         m_allPassOverflowed |= !m_kernels.allPass(data.allPass.MakeReady(count), sum, count);
         data.allPass.Advance(count);
+        const T* tail = sum;
         if (data.offset != 0) {
-            T* const waits = data.offset > 0 ? sum : early;
+            const T*& waits = data.offset > 0 ? tail : early;
             data.align.Push(waits, count);
-            std::copy_n(data.align.Before(std::abs(data.offset) + count, count), count, waits);
+            waits = data.align.Before(std::abs(data.offset) + count, count);
         }
-        m_kernels.mix(data.levels, in, early, sum, count);
+        m_kernels.mix(data.levels, in, early, tail, sum, count);
     }
 
     const ReverbKernels<T>& m_kernels = HasAvx2() ? Avx2ReverbKernels<T>() : BaselineReverbKernels<T>();

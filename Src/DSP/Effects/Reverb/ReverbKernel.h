@@ -35,8 +35,8 @@ struct ReverbKernels {
                   const std::array<T*, 2>& sum, int channels, int count);
     // The all-pass, in place. False when something that is not finite came out.
     bool (*allPass)(T* cells, T* sum, int count);
-    // Dry sound, reflections and tail; the result takes the tail's place.
-    void (*mix)(const ReverbLevels<T>& levels, const T* in, const T* early, T* tail, int count);
+    // Dry sound, reflections and tail; the result may take the tail's place.
+    void (*mix)(const ReverbLevels<T>& levels, const T* in, const T* early, const T* tail, T* out, int count);
 };
 
 // One for every processor, and one for those with AVX2. Both give the same bits.

@@ -48,8 +48,7 @@ struct ReverbKernelsFor {
     static void Store(Wide value, T* at) { value.store_unaligned(at); }
     static void Store(T value, T* at) { *at = value; }
 
-    // A few reflections at a time over all samples: that many streams a processor can follow, in a session
-    // whose delay lines are in no cache.
+    // Half of the reflections at a time over all samples: fewer streams for the processor to follow than all.
     template <std::size_t First, std::size_t Count>
     static void Add(const std::array<const T*, kTaps>& from, T* early, int count) {
         ForAll(count, [&](auto kind, int i) {
@@ -63,7 +62,7 @@ struct ReverbKernelsFor {
         });
     }
     static void Reflect(const std::array<const T*, kTaps>& from, T* early, int count) {
-        constexpr std::size_t kAtATime = 5, kRounds = (kTaps + kAtATime - 1) / kAtATime;
+        constexpr std::size_t kAtATime = 10, kRounds = (kTaps + kAtATime - 1) / kAtATime;
         Unrolled<kRounds>([&](auto round) {
             constexpr std::size_t kFirst = round * kAtATime;
             Add<kFirst, std::min(kAtATime, kTaps - kFirst)>(from, early, count);
@@ -147,13 +146,14 @@ struct ReverbKernelsFor {
         return restFinite && xsimd::all(finite);
     }
 
-    static void Mix(const ReverbLevels<T>& levels, const T* in, const T* early, T* tail, int count) {
+    static void Mix(const ReverbLevels<T>& levels, const T* in, const T* early, const T* tail, T* out,
+                    int count) {
         ForAll(count, [&](auto kind, int i) {
             using Value = decltype(kind);
             const Value x = Load(kind, in + i) * Value(levels.dry);
             const Value wet =
                 Load(kind, tail + i) * Value(levels.tail) + Load(kind, early + i) * Value(levels.reflections);
-            Store(x + wet * Value(levels.wet), tail + i);
+            Store(x + wet * Value(levels.wet), out + i);
         });
     }
 
