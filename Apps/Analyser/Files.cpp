@@ -3,7 +3,6 @@
 #include <cstdlib>
 #include <ctime>
 #include <fstream>
-#include <iterator>
 #include <system_error>
 
 namespace analyser {
@@ -19,21 +18,13 @@ fs::path FromEnvironment(const char* name) {
 }  // namespace
 
 fs::path SettingsFolder() {
-#if defined(_WIN32)
-    fs::path base = FromEnvironment("APPDATA");
-#else
     fs::path base = FromEnvironment("XDG_CONFIG_HOME");
     if (base.empty() && !FromEnvironment("HOME").empty()) base = FromEnvironment("HOME") / ".config";
-#endif
     return base / "dspdll";
 }
 
 fs::path PictureFolder() {
-#if defined(_WIN32)
-    const fs::path home = FromEnvironment("USERPROFILE");
-#else
     const fs::path home = FromEnvironment("HOME");
-#endif
     std::error_code none;
     if (fs::is_directory(home / "Pictures", none)) return home / "Pictures";
     return home.empty() ? fs::path(".") : home;
@@ -74,9 +65,13 @@ bool WriteWhole(const fs::path& path, const std::string& bytes) {
     return false;
 }
 
-std::string ReadWhole(const fs::path& path) {
+std::optional<std::string> ReadWhole(const fs::path& path) {
     std::ifstream file(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
+    std::string bytes;
+    for (char buffer[4096]; file.read(buffer, sizeof buffer) || file.gcount() > 0;)
+        bytes.append(buffer, static_cast<std::size_t>(file.gcount()));
+    if (!file.eof()) return std::nullopt;
+    return bytes;
 }
 
 }  // namespace analyser

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <filesystem>
+#include <optional>
 #include <string>
 
 namespace analyser {
@@ -16,7 +17,7 @@ std::string FreshName(const std::filesystem::path& folder);
 
 // Writes the file whole or not at all: beside its place first. False when that failed.
 bool WriteWhole(const std::filesystem::path& path, const std::string& bytes);
-// Empty when it cannot be read.
-std::string ReadWhole(const std::filesystem::path& path);
+// Nothing when it cannot be read.
+std::optional<std::string> ReadWhole(const std::filesystem::path& path);
 
 }  // namespace analyser

@@ -10,6 +10,8 @@ namespace analyser {
 struct Playback {
     double position = 0.0, length = 0.0;
     bool playing = false;
+    bool waits = false;  // plays, but nothing comes of it yet
+    bool ended = false;  // rests at its end
 };
 
 // What the view asks of the window that it is in. Called on the display thread.

@@ -69,6 +69,7 @@ void View::StartOver() {
     for (kivspectrum& each : m_analysers) {
         each.Feed(silence.data(), static_cast<int>(silence.size()), 1, 1);
         each.GetSonogram()->Clear();
+        each.GetSonogram()->SetTimeAtRightEdge(0.0);
         each.GetTuner()->Forget();
         each.peak_reset();
     }
@@ -76,7 +77,8 @@ void View::StartOver() {
 }
 
 void View::SetTime(double seconds) {
-    for (kivspectrum& each : m_analysers) each.GetSonogram()->SetTimeAtRightEdge(seconds);
+    for (kivspectrum& each : m_analysers)
+        if (each.GetOn() && !each.GetFrozen()) each.GetSonogram()->SetTimeAtRightEdge(seconds);
 }
 
 bool View::Refresh() {
@@ -84,7 +86,7 @@ bool View::Refresh() {
     if (m_apart != (kivspectrum::GetSettings().view_flag_a != 0)) FollowFirst();
     // A file that rests leaves its last picture as it is.
     const auto playback = m_shell.GetPlayback();
-    if (!playback || playback->playing)
+    if (!playback || (playback->playing && !playback->waits))
         for (kivspectrum& each : m_analysers)
             if (each.Refresh()) m_dirty = true;
     FollowLevel();

@@ -38,7 +38,7 @@ public:
     void Draw(cairo_t* context, int width, int height, float dpi);
     // Nothing of what was heard is shown any more: another input or place in a file. Nothing feeds meanwhile.
     void StartOver();
-    // What the sonogram's right edge is called, seconds; 0 for what is live.
+    // What the sonogram's next column is called, seconds; 0 for what is live, and after StartOver.
     void SetTime(double seconds);
 
     void PointTo(float x, float y);

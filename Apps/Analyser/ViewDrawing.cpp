@@ -25,10 +25,13 @@ float FittingSize(DrawTarget& target, std::string_view text, float wanted, float
     return width > room ? wanted * room / width : wanted;
 }
 
-std::string Minutes(double seconds) {
-    const int whole = static_cast<int>(seconds);
+std::string Minutes(double seconds, int decimals) {
+    const double unit = std::pow(10.0, decimals);
+    const double shown = decimals > 0 ? std::round(seconds * unit) / unit : std::floor(seconds);
+    const int minutes = static_cast<int>(shown / 60.0);
     char text[32];
-    std::snprintf(text, sizeof text, "%d:%02d", whole / 60, whole % 60);
+    std::snprintf(text, sizeof text, "%d:%0*.*f", minutes, decimals > 0 ? 3 + decimals : 2, decimals,
+                  shown - 60.0 * minutes);
     return text;
 }
 
@@ -138,8 +141,10 @@ void View::DrawBar(DrawTarget& target, const RectF& bar) {
     if (keys) target.Text(right, {end, baseline}, TextAlign::Right, size, {Look::kLabel});
     m_bar.timeline = {};
     if (!playback) return;
-    const std::string time = (playback->playing ? "" : "Paused  ") + Minutes(playback->position) + " / " +
-                             Minutes(playback->length);
+    const char* const rests = playback->playing ? "" : playback->ended ? "Ended  " : "Paused  ";
+    const int decimals = playback->length < 1.0 ? 2 : playback->length < 10.0 ? 1 : 0;
+    const std::string time =
+        rests + Minutes(playback->position, decimals) + " / " + Minutes(playback->length, decimals);
     const float timeWidth = target.MeasureText(time, size).width;
     const float timeEnd = keys ? end - rightWidth - 2.0f * pad : end;
     target.Text(time, {timeEnd, baseline}, TextAlign::Right, size, {Look::kText});
@@ -242,7 +247,7 @@ void View::Draw(cairo_t* context, int width, int height, float dpi) {
             each.GetSonogram()->CheckPixelBufferSize({0.0f, 0.0f, picture.width, picture.height / 2.0f}, 0);
     DrawAnalysers(target, picture);
     if (m_bar.whole.height > 0.0f) DrawBar(target, m_bar.whole);
-    if (!m_heard && !m_menu.IsOpen() && !m_keysShown) DrawHints(target, picture);
+    if (!m_heard && !m_shell.GetPlayback() && !m_menu.IsOpen() && !m_keysShown) DrawHints(target, picture);
     DrawSentences(target, picture);
     if (m_keysShown) DrawKeys(target, picture);
     m_menu.Draw(target, whole);

@@ -295,11 +295,24 @@ bool Analyser::AnnounceNote() {
 bool Analyser::AdvanceSonogram() {
     // The smoothed spectrum is rebuilt under this lock.
     const Lock lock(m_lock);
-    if (!state.on || state.frozen || m_drawer->GetSamplingFrequency() <= 0) return false;
+    if (m_drawer->GetSamplingFrequency() <= 0) return false;
+    if (!state.on || state.frozen) {
+        ++m_stoodFor;
+        return false;
+    }
+    if (m_stoodFor > 0) LeaveGap(std::exchange(m_stoodFor, 0));
     m_sonogram->m_hidden = !state.showSonogram;
     const double pitch = state.tunerOn ? m_tuner->GetHeardFrequency() : 0.0;
     return m_sonogram->Step(*m_drawer, std::exchange(m_frameForSonogram, false), static_cast<float>(pitch)) &&
            !m_sonogram->m_hidden;
+}
+
+void Analyser::LeaveGap(int refreshes) {
+    constexpr int kRefreshesPerSecond = 30;
+    m_sonogram->m_history->Skip(std::int64_t{refreshes} * SonogramHistory::kTicksPerSecond /
+                                kRefreshesPerSecond);
+    m_sonogram->ClearColumn();
+    m_sonogram->m_pictureStale = true;
 }
 
 double Analyser::SonogramSeconds() const {

@@ -110,8 +110,9 @@ public:
     bool LetTunerWait();
     bool AnnounceNote();
 
-    // The sonogram's part of a display refresh; hidden, it hears all the same once it had a size. True when
-    // its picture has new columns.
+    // The sonogram's part of a display refresh; hidden, it hears all the same once it had a size. Off or
+    // frozen it stands, and leaves a gap as long as that lasted when it goes on. True when its picture has
+    // new columns.
     bool AdvanceSonogram();
     // Of the right edge of the sonogram's picture, since its beginning.
     double SonogramSeconds() const;
@@ -125,6 +126,7 @@ private:
     void ComputePower();
     void ResizeFilter(int spectra);
     void UpdateDrawer(const SpectrumSettings& settings);
+    void LeaveGap(int refreshes);
 
     mutable CriticalSection m_lock;
     CorvoFFT m_fft;
@@ -132,6 +134,7 @@ private:
     SpectrumSettings m_built;         // lengths and window type that the buffers are for
     bool m_powerIsFrame = false;      // m_power was made since the buffers were built
     bool m_frameForSonogram = false;  // processed since its last step
+    int m_stoodFor = 0;               // refreshes that the sonogram missed
     std::atomic<bool> m_transforming{false};
 
     CaptureBuffer m_capture;

@@ -86,7 +86,8 @@ bool Input::Retry() {
     if (m_wanted.empty()) m_systems = DefaultName();
     if (m_device) return true;
     const std::string name = m_wanted.empty() ? "" : Present();
-    if (name.empty() && !m_wanted.empty()) return false;
+    // Where none is listed none is asked for: that would only make the system complain.
+    if ((name.empty() && !m_wanted.empty()) || SDL_GetNumAudioDevices(1) == 0) return false;
     SDL_AudioSpec wanted = FloatSound(48000, 2, 512), got{};
     wanted.callback = Take;
     wanted.userdata = this;

@@ -28,6 +28,7 @@ public:
     bool Retry();
     void Close();
     bool IsOpen() const { return m_device != 0; }
+    bool HasHeard() const { return m_blocks.load(std::memory_order_relaxed) != 0; }
     // Whether what is wanted is there, so that it should open.
     bool IsThere() const;
     // At each refresh: lets silence be heard where nothing has come for a while.

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstdio>
 #include <filesystem>
 
 #include "FloatSound.h"
@@ -12,10 +13,13 @@ namespace {
 constexpr int kRefreshes = 30;
 constexpr int kMostChannels = 64, kLowestRate = 1000, kHighestRate = 768000;
 constexpr int kMostOutputs = 2;
+// Outputs take their sound in lumps: so many thirtieths of a second the picture may be behind what they took.
+constexpr int kMostLate = 10;
+constexpr double kMissed = 0.1;  // seconds that a file is shorter than it says
 
 }  // namespace
 
-std::string Player::Open(const std::string& path, bool sound) {
+std::string Player::Open(const std::string& path) {
     const std::string name = std::filesystem::path(path).filename().string();
     SF_INFO info{};
     std::unique_ptr<SNDFILE, Closer> file(sf_open(path.c_str(), SFM_READ, &info));
@@ -26,67 +30,96 @@ std::string Player::Open(const std::string& path, bool sound) {
     Close();
     m_file = std::move(file);
     m_info = info;
+    m_path = path;
     m_name = name;
-    if (sound) {
-        const SDL_AudioSpec wanted =
-            FloatSound(info.samplerate, info.channels <= kMostOutputs ? info.channels : 1, 1024);
-        m_device = SDL_OpenAudioDevice(nullptr, 0, &wanted, nullptr, 0);
-    }
-    Seek(0.0);
+    GoTo(0);
     m_playing = true;
-    if (m_device) SDL_PauseAudioDevice(m_device, 0);
     return {};
 }
 
 void Player::Close() {
-    if (m_device) SDL_CloseAudioDevice(m_device);
-    m_device = 0;
+    Mute();
     m_file.reset();
     m_playing = false;
 }
 
+// Where no device is listed none is asked for: that would only make the system complain.
+bool Player::Hear() {
+    if (m_device) return true;
+    if (!m_file || SDL_GetNumAudioDevices(0) == 0) return false;
+    const SDL_AudioSpec wanted = FloatSound(m_info.samplerate, static_cast<int>(Outputs()), 1024);
+    m_device = SDL_OpenAudioDevice(nullptr, 0, &wanted, nullptr, 0);
+    if (!m_device) return false;
+    if (m_playing) GoTo(Position());
+    SDL_PauseAudioDevice(m_device, m_playing ? 0 : 1);
+    return true;
+}
+
+void Player::Mute() {
+    if (!m_device) return;
+    SDL_CloseAudioDevice(m_device);
+    m_device = 0;
+    if (m_playing) GoTo(Position());
+}
+
 Playback Player::Get() const {
     const double rate = m_info.samplerate;
-    return {static_cast<double>(m_start + m_fed) / rate, static_cast<double>(m_info.frames) / rate,
-            m_playing};
+    const bool ended = !m_playing && (m_atEnd || Position() >= m_info.frames);
+    return {static_cast<double>(Position()) / rate, static_cast<double>(m_info.frames) / rate, m_playing,
+            m_waits, ended};
 }
 
 void Player::Seek(double seconds) {
-    if (!m_file) return;
     const auto frame = static_cast<std::int64_t>(std::max(seconds, 0.0) * m_info.samplerate);
-    m_start = std::max<std::int64_t>(
-        sf_seek(m_file.get(), std::min<std::int64_t>(frame, m_info.frames), SEEK_SET), 0);
-    m_steps = m_fed = m_queued = 0;
-    m_ended = false;
+    GoTo(std::min<std::int64_t>(frame, m_info.frames));
+}
+
+void Player::GoTo(std::int64_t frame) {
+    if (!m_file) return;
+    m_start = sf_seek(m_file.get(), frame, SEEK_SET);
+    if (m_start < 0) Reopen();
+    m_read = m_fed = m_steps = m_silent = 0;
+    m_atEnd = m_waits = false;
     m_ahead.clear();
     if (m_device) SDL_ClearQueuedAudio(m_device);
 }
 
+// Behind the end of a file that was cut off its reader gets lost.
+void Player::Reopen() {
+    SF_INFO same{};
+    if (SNDFILE* const again = sf_open(m_path.c_str(), SFM_READ, &same)) m_file.reset(again);
+    m_start = 0;
+}
+
 void Player::TogglePlaying() {
-    if (!m_file) return;
-    if (!m_playing && m_start + m_fed >= m_info.frames) Seek(0.0);
+    if (!m_file || Get().ended) return;
     // Counted anew, or the time of the pause would be caught up with.
-    if (!m_playing) Seek(Get().position);
+    if (!m_playing) GoTo(Position());
     m_playing = !m_playing;
     if (m_device) SDL_PauseAudioDevice(m_device, m_playing ? 0 : 1);
 }
 
-// Into m_block; fewer at the end.
+std::size_t Player::Outputs() const {
+    return m_info.channels <= kMostOutputs ? static_cast<std::size_t>(m_info.channels) : 1;
+}
+
+// Into m_block; fewer at the end, with silence behind them.
 int Player::Read(int frames) {
-    m_block.resize(static_cast<std::size_t>(frames) * static_cast<std::size_t>(m_info.channels));
+    m_block.assign(static_cast<std::size_t>(frames) * static_cast<std::size_t>(m_info.channels), 0.0f);
     const auto got =
         static_cast<int>(std::max<sf_count_t>(sf_readf_float(m_file.get(), m_block.data(), frames), 0));
-    if (got < frames) m_ended = true;
+    if (got < frames) m_atEnd = true;
+    m_read += got;
     return got;
 }
 
 // A fifth of a second ahead of what is heard.
 void Player::Queue() {
     const auto channels = static_cast<std::size_t>(m_info.channels);
-    const std::size_t outputs = m_info.channels <= kMostOutputs ? channels : 1;
+    const std::size_t outputs = Outputs();
     const auto waiting = static_cast<int>(SDL_GetQueuedAudioSize(m_device) / (sizeof(float) * outputs));
     const int wanted = m_info.samplerate / 5 - waiting;
-    if (m_ended || wanted <= 0) return;
+    if (m_atEnd || wanted <= 0) return;
     const auto got = static_cast<std::size_t>(Read(wanted));
     const auto samples = static_cast<std::ptrdiff_t>(got * channels);
     m_ahead.insert(m_ahead.end(), m_block.begin(), m_block.begin() + samples);
@@ -97,32 +130,60 @@ void Player::Queue() {
             m_block[i] = sum / static_cast<float>(channels);
         }
     SDL_QueueAudio(m_device, m_block.data(), static_cast<Uint32>(got * outputs * sizeof(float)));
-    m_queued += static_cast<std::int64_t>(got);
+}
+
+// Frames that the output took and the view has not got yet.
+std::int64_t Player::Taken() const {
+    return m_read - m_fed -
+           static_cast<std::int64_t>(SDL_GetQueuedAudioSize(m_device) / (sizeof(float) * Outputs()));
+}
+
+// Into m_block, with silence behind the end.
+int Player::Next(int frames) {
+    if (!m_device) return Read(frames);
+    const std::size_t channels = static_cast<std::size_t>(m_info.channels);
+    const std::size_t got = std::min(m_ahead.size(), static_cast<std::size_t>(frames) * channels);
+    const auto end = m_ahead.begin() + static_cast<std::ptrdiff_t>(got);
+    m_block.assign(static_cast<std::size_t>(frames) * channels, 0.0f);
+    std::copy(m_ahead.begin(), end, m_block.begin());
+    m_ahead.erase(m_ahead.begin(), end);
+    return static_cast<int>(got / channels);
+}
+
+void Player::End(View& view) {
+    m_playing = false;
+    const Playback at = Get();
+    if (at.length - at.position < kMissed) return;
+    char text[80];
+    std::snprintf(text, sizeof text, " ends at %.1f of %.1f s: the rest cannot be read.", at.position,
+                  at.length);
+    view.Say("\"" + m_name + "\"" + text);
+    m_info.frames = Position();
 }
 
 void Player::Step(View& view) {
     if (!m_file || !m_playing) return;
-    const int channels = m_info.channels;
+    const int half = kivspectrum::GetSettings().window_length / 2;
+    if (m_atEnd && m_ahead.empty() && m_silent >= half) return End(view);
     if (m_device) {
         Queue();
-        const std::size_t outputs = channels <= kMostOutputs ? static_cast<std::size_t>(channels) : 1;
-        const std::int64_t waiting = SDL_GetQueuedAudioSize(m_device) / (sizeof(float) * outputs);
-        const std::int64_t due = std::max<std::int64_t>(m_queued - waiting - m_fed, 0);
-        m_block.assign(m_ahead.begin(), m_ahead.begin() + static_cast<std::ptrdiff_t>(due * channels));
-        m_ahead.erase(m_ahead.begin(), m_ahead.begin() + static_cast<std::ptrdiff_t>(due * channels));
-        view.Feed(m_block.data(), static_cast<int>(due), channels);
-        m_fed += due;
-        if (m_ended && m_ahead.empty()) m_playing = false;
-    } else {
-        ++m_steps;
-        const int got = Read(static_cast<int>(m_steps * m_info.samplerate / kRefreshes - m_fed));
-        view.Feed(m_block.data(), got, channels);
-        m_fed += got;
-        if (m_ended) m_playing = false;
+        const std::int64_t late = (m_fed + Taken()) * kRefreshes / m_info.samplerate - m_steps;
+        if (late > kMostLate) m_steps += late - kMostLate;
     }
+    const auto due = static_cast<int>((m_steps + 1) * m_info.samplerate / kRefreshes - m_fed - m_silent);
+    // The picture waits for the output, or it would fill with a silence that is not the file's.
+    m_waits = m_device && Taken() < due && !(m_atEnd && SDL_GetQueuedAudioSize(m_device) == 0);
+    if (m_waits) return;
+    ++m_steps;
+    const int got = Next(due);
+    // Until the end stands in the middle of the window.
+    const int silent = m_atEnd && m_ahead.empty() ? std::clamp(due - got, 0, half - m_silent) : 0;
+    view.Feed(m_block.data(), got + silent, m_info.channels);
+    m_fed += got;
+    m_silent += silent;
     // The middle of the newest window stands at the right edge.
-    const double half = kivspectrum::GetSettings().window_length / 2.0 / m_info.samplerate;
-    view.SetTime(std::max(Get().position - half, 0.0));
+    const auto middle = static_cast<double>(Position() + m_silent - half);
+    view.SetTime(std::max(middle / m_info.samplerate, 0.0));
 }
 
 }  // namespace analyser

@@ -17,8 +17,8 @@ namespace analyser {
 namespace {
 
 constexpr int kRefreshes = 30;
-constexpr int kRetryEvery = 30, kKeepEvery = 60;  // refreshes
-constexpr int kFailures = 3;                      // until the sound system is asked anew
+constexpr int kRetryEvery = 60, kKeepEvery = 60;  // refreshes
+constexpr int kFailures = 2;                      // until the sound system is asked anew
 constexpr const char* kInputLine = "Input = ";
 
 struct KeyPair {
@@ -57,7 +57,7 @@ Program::~Program() {
     KeepSettings();
     m_input->Close();
     m_player.Close();
-    if (m_toneDevice) SDL_CloseAudioDevice(m_toneDevice);
+    CloseTone();
     SDL_DestroyWindow(m_window);
 }
 
@@ -86,7 +86,7 @@ void Program::Step() {
         m_player.Step(*m_view);
     else
         m_input->KeepTime();
-    if (m_refreshes % kRetryEvery == 0) LookAfterInput();
+    if (m_refreshes % kRetryEvery == 0) LookAfterSound(true);
     if (m_refreshes % kKeepEvery == 0) KeepSettings();
     m_stale = m_view->Refresh() || m_stale;
     if (m_stale && !m_hidden) Paint();
@@ -127,7 +127,6 @@ void Program::Paint() {
 }
 
 void Program::Handle(const SDL_Event& event) {
-    const auto x = [](int value) { return static_cast<float>(value); };
     switch (event.type) {
         case SDL_QUIT:
             m_quit = true;
@@ -136,27 +135,11 @@ void Program::Handle(const SDL_Event& event) {
             HandleWindow(event.window);
             break;
         case SDL_MOUSEMOTION:
-            m_view->PointTo(x(event.motion.x), x(event.motion.y));
-            break;
         case SDL_MOUSEBUTTONDOWN:
-            if (event.button.button == SDL_BUTTON_LEFT || event.button.button == SDL_BUTTON_RIGHT)
-                m_view->Press({event.button.button == SDL_BUTTON_LEFT ? Button::Left : Button::Right,
-                               x(event.button.x), x(event.button.y), event.button.clicks});
-            break;
         case SDL_MOUSEBUTTONUP:
-            if (event.button.button == SDL_BUTTON_LEFT) m_view->Release(x(event.button.x), x(event.button.y));
+        case SDL_MOUSEWHEEL:
+            HandlePointer(event);
             break;
-        case SDL_MOUSEWHEEL: {
-            int mouseX = 0, mouseY = 0;
-            SDL_GetMouseState(&mouseX, &mouseY);
-            const bool shift = (SDL_GetModState() & KMOD_SHIFT) != 0;
-            if (event.wheel.preciseX != 0.0f || shift)
-                m_view->ScrollBack(shift ? event.wheel.preciseY : -event.wheel.preciseX);
-            else
-                m_view->Wheel(x(mouseX), x(mouseY), event.wheel.preciseY,
-                              (SDL_GetModState() & KMOD_CTRL) != 0);
-            break;
-        }
         case SDL_KEYDOWN:
             HandleKey(event.key);
             break;
@@ -172,15 +155,43 @@ void Program::Handle(const SDL_Event& event) {
             SDL_free(event.drop.file);
             break;
         case SDL_AUDIODEVICEADDED:
-            if (event.adevice.iscapture) LookAfterInput();
+            LookAfterSound(false);
             break;
         case SDL_AUDIODEVICEREMOVED:
-            if (event.adevice.iscapture && m_input->IsGone(event.adevice.which)) m_input->Close();
-            LookAfterInput();
+            LoseDevice(event.adevice.which);
             break;
         default:
             break;
     }
+}
+
+void Program::HandlePointer(const SDL_Event& event) {
+    const auto x = [](int value) { return static_cast<float>(value); };
+    const bool left = event.button.button == SDL_BUTTON_LEFT;
+    int mouseX = 0, mouseY = 0;
+    SDL_GetMouseState(&mouseX, &mouseY);
+    const bool shift = (SDL_GetModState() & KMOD_SHIFT) != 0, control = (SDL_GetModState() & KMOD_CTRL) != 0;
+    if (event.type == SDL_MOUSEMOTION)
+        m_view->PointTo(x(event.motion.x), x(event.motion.y));
+    else if (event.type == SDL_MOUSEBUTTONDOWN && (left || event.button.button == SDL_BUTTON_RIGHT))
+        m_view->Press(
+            {left ? Button::Left : Button::Right, x(event.button.x), x(event.button.y), event.button.clicks});
+    else if (event.type == SDL_MOUSEBUTTONUP && left)
+        m_view->Release(x(event.button.x), x(event.button.y));
+    else if (event.type == SDL_MOUSEWHEEL && (event.wheel.preciseX != 0.0f || shift))
+        m_view->ScrollBack(shift ? event.wheel.preciseY : -event.wheel.preciseX);
+    else if (event.type == SDL_MOUSEWHEEL)
+        m_view->Wheel(x(mouseX), x(mouseY), event.wheel.preciseY, control);
+}
+
+void Program::LoseDevice(SDL_AudioDeviceID device) {
+    if (m_input->IsGone(device)) m_input->Close();
+    if (m_player.IsHeardOn(device)) m_player.Mute();
+    if (m_toneDevice == device) {
+        CloseTone();
+        if (IsToneOn()) SetTone(true);
+    }
+    LookAfterSound(false);
 }
 
 void Program::HandleKey(const SDL_KeyboardEvent& event) {
@@ -253,28 +264,43 @@ void Program::Listen(const std::string& name) {
     m_input->Close();
     m_chosenInput = name;
     m_view->StartOver();
-    m_view->SetTime(0.0);
     if (m_hasAudio) m_input->Want(name);
-    LookAfterInput();
+    LookAfterSound(false);
 }
 
-void Program::LookAfterInput() {
-    if (m_player.IsOpen()) return m_view->SetTrouble({});
-    if (m_options.noAudio)
-        return m_view->SetTrouble("Nothing is listened to (--no-audio): drop an audio file here.");
-    if (!m_hasAudio && !StartAudio())
-        return m_view->SetTrouble(
-            "There is no sound system here; an audio file can be dropped on the window.");
-    m_failures = m_input->Retry() || !m_input->IsThere() ? 0 : m_failures + 1;
-    m_view->SetTrouble(m_input->Trouble());
+// `inTurn`: not because something has come or gone.
+void Program::LookAfterSound(bool inTurn) {
+    const bool plays = m_player.IsOpen();
+    const bool works =
+        !m_options.noAudio && (m_hasAudio || StartAudio()) && (plays ? m_player.Hear() : m_input->Retry());
+    m_wasHeard = m_wasHeard || (plays && works);
+    m_view->SetTrouble(works && plays ? "" : Trouble());
+    if (m_options.noAudio || !m_hasAudio) return;
+    if (works && SDL_GetCurrentAudioDriver() && (plays || m_input->HasHeard()))
+        m_audioDriver = SDL_GetCurrentAudioDriver();
+    // What is not there now may come. Another system may be there, too, while none was heard yet.
+    const bool hopes = !m_audioDriver.empty() && !plays && !m_input->IsThere();
+    if (works || hopes)
+        m_failures = 0;
+    else if (inTurn)
+        ++m_failures;
     if (m_failures >= kFailures && !IsToneOn()) RestartAudio();  // which would end the tone
 }
 
-// The same system as before: another would not have the input that was chosen.
+std::string Program::Trouble() const {
+    if (m_player.IsOpen())
+        return m_wasHeard && !m_options.noAudio ? "The sound output is gone: the file goes on silently, and "
+                                                  "is heard when there is one again."
+                                                : "";
+    if (m_options.noAudio) return "Nothing is listened to (--no-audio): drop an audio file here.";
+    if (!m_hasAudio) return "There is no sound system here; an audio file can be dropped on the window.";
+    return m_input->Trouble();
+}
+
+// The same system as the one that was heard: another would not have the input that was chosen.
 bool Program::StartAudio() {
     if (!m_audioDriver.empty()) SDL_SetHint(SDL_HINT_AUDIODRIVER, m_audioDriver.c_str());
     m_hasAudio = SDL_InitSubSystem(SDL_INIT_AUDIO) == 0;
-    if (m_hasAudio) m_audioDriver = SDL_GetCurrentAudioDriver();
     return m_hasAudio;
 }
 
@@ -282,15 +308,15 @@ bool Program::StartAudio() {
 void Program::RestartAudio() {
     m_failures = 0;
     m_input->Close();
+    m_player.Mute();
     SetTone(false);
-    if (m_toneDevice) SDL_CloseAudioDevice(m_toneDevice);
-    m_toneDevice = 0;
+    CloseTone();
     SDL_QuitSubSystem(SDL_INIT_AUDIO);
     StartAudio();
 }
 
 void Program::OpenFile(const std::string& path) {
-    const std::string wrong = m_player.Open(path, m_hasAudio);
+    const std::string wrong = m_player.Open(path);
     if (!wrong.empty()) {
         std::fprintf(stderr, "dspdll-analyser: %s\n", wrong.c_str());
         return m_view->Say(wrong);
@@ -298,8 +324,9 @@ void Program::OpenFile(const std::string& path) {
     m_input->Close();
     m_view->SetSamplingRate(m_player.Rate());
     m_view->StartOver();
-    m_view->SetTrouble({});
-    if (m_hasAudio && !m_player.IsHeard())
+    m_wasHeard = false;
+    LookAfterSound(false);
+    if (!m_options.noAudio && !m_player.IsHeard())
         m_view->Say("There is no sound output: the file is shown silently.");
 }
 
@@ -311,7 +338,10 @@ void Program::Seek(double seconds) {
     m_player.Seek(seconds);
     m_view->StartOver();
 }
-void Program::TogglePlaying() { m_player.TogglePlaying(); }
+void Program::TogglePlaying() {
+    if (m_player.Get().ended) Seek(0.0);
+    m_player.TogglePlaying();
+}
 
 void Program::ToggleFullScreen() {
     const bool is = (SDL_GetWindowFlags(m_window) & SDL_WINDOW_FULLSCREEN) != 0;
@@ -338,19 +368,26 @@ void Program::SetTone(bool on) {
     m_view->Say("There is no sound output for the reference tone.");
 }
 
+void Program::CloseTone() {
+    if (m_toneDevice) SDL_CloseAudioDevice(m_toneDevice);
+    m_toneDevice = 0;
+}
+
 void Program::LoadSettings() {
-    std::string text = ReadWhole(SettingsPath());
-    if (text.empty()) return;
-    const auto at = text.rfind(kInputLine);
-    if (m_view->SetSettings(text)) {
-        if (at != std::string::npos && (at == 0 || text[at - 1] == '\n')) {
+    std::error_code none;
+    if (!std::filesystem::exists(SettingsPath(), none)) return;
+    const auto text = ReadWhole(SettingsPath());
+    if (text && m_view->SetSettings(*text)) {
+        const auto at = text->rfind(kInputLine);
+        if (at != text->npos && (at == 0 || (*text)[at - 1] == '\n')) {
             const auto from = at + std::string_view(kInputLine).size();
-            m_chosenInput = text.substr(from, text.find('\n', from) - from);
+            m_chosenInput = text->substr(from, text->find('\n', from) - from);
         }
         m_keptChoices = m_view->GetChoices();
         return;
     }
-    const std::string sentence = SettingsPath().string() + " is not understood and was ignored.";
+    const std::string sentence =
+        SettingsPath().string() + (text ? " is not understood" : " cannot be read") + " and was ignored.";
     std::fprintf(stderr, "dspdll-analyser: %s\n", sentence.c_str());
     m_view->Say(sentence);
 }

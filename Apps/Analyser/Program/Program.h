@@ -50,14 +50,18 @@ public:
 private:
     void Handle(const SDL_Event& event);
     void HandleKey(const SDL_KeyboardEvent& event);
+    void HandlePointer(const SDL_Event& event);
     void HandleWindow(const SDL_WindowEvent& event);
+    void LoseDevice(SDL_AudioDeviceID device);
     void Step();
     void Paint();
     void OpenFile(const std::string& path);
     void Listen(const std::string& name);
-    void LookAfterInput();
+    void LookAfterSound(bool inTurn);
+    std::string Trouble() const;
     bool StartAudio();
     void RestartAudio();
+    void CloseTone();
     void LoadSettings();
     void KeepSettings();
     float Dpi() const;
@@ -71,8 +75,10 @@ private:
     Tone m_tone;
     SDL_AudioDeviceID m_toneDevice = 0;
     double m_toneRate = 48000.0;
-    std::string m_chosenInput, m_audioDriver;
-    int m_failures = 0;  // to open an input that is there
+    std::string m_chosenInput;
+    std::string m_audioDriver;  // once something was heard
+    bool m_wasHeard = false;    // the file that plays
+    int m_failures = 0;         // to hear what should be there
     unsigned m_keptChoices = 0;
     int m_refreshes = 0;
 };

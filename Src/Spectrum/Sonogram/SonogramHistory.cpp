@@ -33,7 +33,7 @@ float SonogramHistory::Hear(float hz) {
 
 std::uint8_t* SonogramHistory::Add(const SonogramScale& scale, float pitch) {
     const auto height = static_cast<std::size_t>(scale.axis.height);
-    if (m_stretches.empty() || m_stretches.back().scale != scale ||
+    if (m_stretches.empty() || m_stretches.back().scale != scale || m_stretches.back().End() != m_now ||
         m_stretches.back().Columns() == SonogramStretch::kMostColumns) {
         SonogramStretch next{scale, m_now, {}, {}};
         // The memory of what goes.

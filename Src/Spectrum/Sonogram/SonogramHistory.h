@@ -61,6 +61,8 @@ public:
     std::uint8_t* Add(const SonogramScale& scale, float pitch);
     // Time goes on from where it was.
     void Clear();
+    // Nothing was heard for so many ticks.
+    void Skip(std::int64_t ticks) { m_now += ticks; }
 
     // The end of the newest column, and the beginning of the oldest, in ticks.
     std::int64_t Now() const { return m_now; }

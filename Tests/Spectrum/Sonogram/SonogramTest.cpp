@@ -124,7 +124,7 @@ TEST_F(SonogramTest, LosesNoBin) {
         }
 }
 
-// What passes while another view is shown is heard, too.
+// What passes while another view is shown is heard, too; what passes while it is frozen is a gap.
 TEST_F(SonogramTest, AdvancesWhileShownAndNotFrozen) {
     kivspectrum analyser;
     analyser.SetOn(true);
@@ -136,7 +136,20 @@ TEST_F(SonogramTest, AdvancesWhileShownAndNotFrozen) {
         analyser.SetFrozen(frozen);
         EXPECT_EQ(analyser.AdvanceSonogram(), shown && !frozen);
     }
-    EXPECT_EQ(analyser.GetSonogram()->GetHeardColumns(), 3) << "Refresh, hidden, shown";
+    const Corvo::Sonogram& sonogram = *analyser.GetSonogram();
+    EXPECT_EQ(sonogram.GetHeardColumns(), 3) << "Refresh, hidden, shown";
+    for (int i = 0; i < 4; ++i) analyser.AdvanceSonogram();
+    EXPECT_EQ(sonogram.GetHeardColumns(), 3) << "it stands";
+    analyser.SetFrozen(false);
+    EXPECT_TRUE(analyser.AdvanceSonogram());
+    EXPECT_EQ(sonogram.GetHeardColumns(), 9);
+    const auto loudest = [&](int column) {
+        std::uint32_t pixel = 0;
+        for (int y = 0; y < 300; ++y) pixel = std::max(pixel, sonogram.GetBitmap().Row(y)[column] >> 24);
+        return pixel;
+    };
+    EXPECT_GT(loudest(13), 0u) << "the last before the gap";
+    for (int column = 14; column < 19; ++column) EXPECT_EQ(loudest(column), 0u) << column;
 }
 
 // Catches a past that moves or loses a pixel when it is left and returned to in any way, and one without end.
