@@ -5,6 +5,8 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "Drawing/Backends/DrawingCairo.h"
 #include "Events.h"
@@ -77,6 +79,9 @@ private:
     struct Bar {
         Corvo::RectF whole{}, timeline{};
     };
+    struct KeyRow {
+        std::string_view key, text;
+    };
     struct Action;
     static const Action kActions[];
 
@@ -126,6 +131,7 @@ private:
     void SizeSonograms(const Corvo::RectF& picture);
     void DrawHints(Corvo::DrawTarget& target, const Corvo::RectF& rectangle);
     void DrawSentences(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
+    std::vector<KeyRow> KeyRows() const;
     void DrawKeys(Corvo::DrawTarget& target, const Corvo::RectF& rectangle);
 
     Shell& m_shell;

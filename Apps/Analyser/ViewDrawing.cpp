@@ -114,6 +114,45 @@ bool DrawBox(DrawTarget& target, const RectF& bounds, Place place, const std::ve
     return true;
 }
 
+// How a list of keys and what they do stands in the window. Lengths are shares of the text's size.
+struct KeysLayout {
+    static constexpr float kPitch = 1.6f, kGap = 1.2f, kPad = 1.0f;
+
+    float key = 0.0f, text = 0.0f, size = 0.0f;
+    int columns = 1, perColumn = 1;
+
+    float Column() const { return key + text + 2.0f * kGap; }
+};
+
+// As large as it may be so that everything is seen at once, else in pages.
+template <typename Rows>
+KeysLayout LayOutKeys(DrawTarget& target, const RectF& rectangle, const Rows& rows) {
+    constexpr float kMostColumns = 3.0f;
+    const float scale = target.Scale(), least = Look::kSmallest * scale;
+    const auto count = static_cast<int>(rows.size());
+    KeysLayout l;
+    l.size = Look::kInfoSize * scale;
+    for (const auto& [key, text] : rows) {
+        l.key = std::max(l.key, target.MeasureText(key, l.size).width / l.size);
+        l.text = std::max(l.text, target.MeasureText(text, l.size).width / l.size);
+    }
+    const auto fits = [&] {
+        const float most = (rectangle.width / l.size - KeysLayout::kPad) / l.Column();
+        l.columns = static_cast<int>(std::clamp(most, 1.0f, kMostColumns));
+        l.perColumn =
+            static_cast<int>((rectangle.height / l.size - 2.0f * KeysLayout::kPad) / KeysLayout::kPitch);
+        return most >= 1.0f && l.columns * l.perColumn >= count;
+    };
+    while (!fits() && l.size > least) l.size = std::max(l.size - scale, least);
+    if (l.columns * l.perColumn < count) {
+        l.perColumn = std::max(l.perColumn - 1, 1);  // and a line that leads on
+    } else {
+        l.columns = std::min(l.columns, std::max((count + l.perColumn - 1) / l.perColumn, 2));
+        l.perColumn = (count + l.columns - 1) / l.columns;
+    }
+    return l;
+}
+
 float BaselineIn(const RectF& bar, float size) {
     return bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f;
 }
@@ -264,10 +303,9 @@ void View::DrawHints(DrawTarget& target, const RectF& rectangle) {
                     DrawBox(target, rectangle, Place::Middle, {lines[0]}, size);
 }
 
-// In as many columns and pages as it takes: keys and what they do.
-void View::DrawKeys(DrawTarget& target, const RectF& rectangle) {
-    using Row = std::pair<std::string_view, std::string_view>;
-    std::vector<Row> rows;
+// What there is to press here.
+std::vector<View::KeyRow> View::KeyRows() const {
+    std::vector<KeyRow> rows;
     for (const CommandRow& row : Commands())
         if (IsOffered(row.command)) rows.push_back({row.shortcut, row.text});
     rows.insert(rows.end(), {{"Wheel", "Zoom around the pointer"},
@@ -279,59 +317,40 @@ void View::DrawKeys(DrawTarget& target, const RectF& rectangle) {
                              {"Right button", "Menu"},
                              {"Esc", "Close menu or list; no marker"}});
     if (m_shell.CanFillScreen()) rows.push_back({"Ctrl+Q", "End, as does Ctrl+W"});
-    const float scale = target.Scale();
-    float size = Look::kInfoSize * scale, keyWidth = 0.0f, textWidth = 0.0f;
-    for (const auto& [key, text] : rows) {
-        keyWidth = std::max(keyWidth, target.MeasureText(key, size).width / size);
-        textWidth = std::max(textWidth, target.MeasureText(text, size).width / size);
-    }
-    // Of the text's size, as the widths are.
-    constexpr float kPitch = 1.6f, kGap = 1.2f, kPad = 1.0f, kMostColumns = 3.0f;
-    const float column = keyWidth + textWidth + 2.0f * kGap;
-    const auto count = static_cast<int>(rows.size());
-    int columns = 1, perColumn = 1;
-    const auto fitsAt = [&](float each) {
-        const float most = (rectangle.width / each - 2.0f * kPad + kGap) / column;
-        columns = static_cast<int>(std::clamp(most, 1.0f, kMostColumns));
-        perColumn = std::max(static_cast<int>((rectangle.height / each - 2.0f * kPad) / kPitch), 1);
-        return most >= 1.0f && columns * perColumn >= count;
-    };
-    while (!fitsAt(size) && size > Look::kSmallest * scale)
-        size = std::max(size - scale, Look::kSmallest * scale);
-    if (columns * perColumn < count) --perColumn;  // for what leads on
-    perColumn = std::max(perColumn, 1);
-    m_keyPages = (count + columns * perColumn - 1) / (columns * perColumn);
-    m_keysPage = std::min(m_keysPage, m_keyPages - 1);
-    const int least = (count + perColumn - 1) / perColumn;
-    columns = m_keyPages > 1 ? columns : std::min(std::max(least, 2), columns);
-    perColumn = m_keyPages > 1 ? perColumn : (count + columns - 1) / columns;
+    return rows;
+}
 
+void View::DrawKeys(DrawTarget& target, const RectF& rectangle) {
+    const auto rows = KeyRows();
+    const KeysLayout layout = LayOutKeys(target, rectangle, rows);
+    const int count = static_cast<int>(rows.size()), perPage = layout.columns * layout.perColumn;
+    m_keyPages = (count + perPage - 1) / perPage;
+    m_keysPage = std::min(m_keysPage, m_keyPages - 1);
+    const float size = layout.size, pad = KeysLayout::kPad * size, pitch = KeysLayout::kPitch * size;
     const float width =
-        std::min((static_cast<float>(columns) * column - kGap + 2.0f * kPad) * size, rectangle.width);
-    const float high = static_cast<float>(perColumn + (m_keyPages > 1 ? 1 : 0)) * kPitch + 2.0f * kPad;
+        std::min(static_cast<float>(layout.columns) * layout.Column() * size + pad, rectangle.width);
+    const float height = static_cast<float>(layout.perColumn + (m_keyPages > 1 ? 1 : 0)) * pitch + 2.0f * pad;
     const RectF box{std::round(rectangle.x + (rectangle.width - width) / 2.0f),
-                    std::round(rectangle.y + std::max((rectangle.height - high * size) / 2.0f, 0.0f)),
-                    std::round(width), std::round(high * size)};
-    target.FillRoundedRectangle(box, kPad * size, {Look::kBox, 245});
-    const auto write = [&](std::string_view text, float x, int row, float room,
-                           Corvo::ColourReference colour) {
-        const float y = box.y + (kPad + (static_cast<float>(row) + 0.7f) * kPitch) * size;
-        target.Text(Shortened(target, std::string(text), size, room), {x, y}, TextAlign::Left, size,
-                    {colour});
+                    std::round(rectangle.y + std::max((rectangle.height - height) / 2.0f, 0.0f)),
+                    std::round(width), std::round(height)};
+    target.FillRoundedRectangle(box, pad, {Look::kBox, 245});
+    const auto write = [&](std::string_view text, float x, int row, Corvo::ColourReference colour) {
+        const float y = box.y + pad + (static_cast<float>(row) + 0.7f) * pitch;
+        const std::string shown = Shortened(target, std::string(text), size, box.x + box.width - x);
+        target.Text(shown, {x, y}, TextAlign::Left, size, {colour});
     };
-    const int first = m_keysPage * columns * perColumn, end = std::min(first + columns * perColumn, count);
+    const int first = m_keysPage * perPage, end = std::min(first + perPage, count);
     for (int i = first; i < end; ++i) {
-        const int row = (i - first) % perColumn;
-        const auto& [key, text] = rows[static_cast<std::size_t>(i)];
-        const float x = box.x + (kPad + static_cast<float>((i - first) / perColumn) * column) * size;
-        const float textX = x + (keyWidth + kGap) * size;
-        write(key, x, row, keyWidth * size + 1.0f, Look::kCurve);
-        write(text, textX, row, std::min(textWidth * size + 1.0f, box.x + box.width - textX), Look::kText);
+        const int column = (i - first) / layout.perColumn, row = (i - first) % layout.perColumn;
+        const float x = box.x + pad + static_cast<float>(column) * layout.Column() * size;
+        write(rows[static_cast<std::size_t>(i)].key, x, row, Look::kCurve);
+        write(rows[static_cast<std::size_t>(i)].text, x + (layout.key + KeysLayout::kGap) * size, row,
+              Look::kText);
     }
     if (m_keyPages == 1) return;
     const std::string more =
         "H: page " + std::to_string(m_keysPage + 1) + " of " + std::to_string(m_keyPages);
-    write(more, box.x + kPad * size, perColumn, box.width, Look::kLabel);
+    write(more, box.x + pad, layout.perColumn, Look::kLabel);
 }
 
 // What happened a moment ago, and what is wrong where that is not said elsewhere.
