@@ -19,7 +19,8 @@ using Corvo::DrawTarget, Corvo::PointF, Corvo::RectF, Corvo::TextAlign;
 using Plot = Corvo::AnalyserReading::Plot;
 namespace Look = Corvo::Look;
 
-constexpr float kBar = 24.0f;  // in 1/96 inch
+constexpr float kBar = 24.0f;           // in 1/96 inch
+constexpr std::size_t kMostBytes = 90;  // of a text: more could be cut off
 constexpr const char* kEllipsis = "\u2026";
 
 std::string Minutes(double seconds, int decimals) {
@@ -36,18 +37,17 @@ bool ContinuesCharacter(std::string_view text, std::size_t at) {
     return at < text.size() && (text[at] & 0xC0) == 0x80;
 }
 
-// The beginning of a text that fits, up to a blank if there is one; one character at least. Longer pieces
-// would be cut off.
+// The beginning of a text that fits, up to a blank if there is one; one character at least.
 std::string_view FittingPiece(DrawTarget& target, std::string_view text, float size, float room) {
-    constexpr std::size_t kMost = 80;
-    std::size_t end = std::min(text.size(), kMost + 1);
+    std::size_t end = std::min(text.size(), kMostBytes + 1);
     const auto shorten = [&] {
         const auto blank = text.rfind(' ', end - 1);
         const bool found = blank != text.npos && blank > 0;
         end = found ? blank : end - 1;
         while (end > 0 && ContinuesCharacter(text, end)) --end;
     };
-    while (end > 1 && (end > kMost || target.MeasureText(text.substr(0, end), size).width > room)) shorten();
+    while (end > 1 && (end > kMostBytes || target.MeasureText(text.substr(0, end), size).width > room))
+        shorten();
     end = std::max<std::size_t>(end, 1);
     while (ContinuesCharacter(text, end)) ++end;
     return text.substr(0, end);
@@ -55,9 +55,8 @@ std::string_view FittingPiece(DrawTarget& target, std::string_view text, float s
 
 // The text, or its beginning with an ellipsis.
 std::string Shortened(DrawTarget& target, std::string text, float size, float room) {
-    constexpr std::size_t kMost = 90;  // longer ones would be cut off
     const auto fits = [&](const std::string& s) {
-        return s.size() <= kMost && target.MeasureText(s, size).width <= room;
+        return s.size() <= kMostBytes && target.MeasureText(s, size).width <= room;
     };
     if (fits(text)) return text;
     while (!text.empty() && !fits(text + kEllipsis)) {

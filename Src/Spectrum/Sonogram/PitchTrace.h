@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <optional>
@@ -18,8 +19,8 @@ public:
     // At every refresh, `hz` being 0 for nothing. `now` counts time. Since when the pitch has been part of a
     // line; nothing while that is not sure.
     std::optional<std::int64_t> Hear(float hz, std::int64_t now) {
-        ++m_line.unheard;
-        ++m_next.unheard;
+        m_line.Wait();
+        m_next.Wait();
         if (!(hz > 0.0f)) return std::nullopt;
         if (m_line.GoesOnWith(hz)) {
             m_line.Add(hz);
@@ -49,9 +50,11 @@ private:
             return heard > 0 && unheard <= kLongestGap + 1 && next <= hz * kLargestStep &&
                    hz <= next * kLargestStep;
         }
+        // Counted as far as it matters.
+        void Wait() { unheard = std::min(unheard + 1, kLongestGap + 2); }
         void Add(float next) {
             hz = next;
-            ++heard;
+            heard = std::min(heard + 1, kLeastOfOctave);
             unheard = 0;
         }
     };
