@@ -108,6 +108,8 @@ struct Session {
         Corvo::Sonogram::SetColourScheme(input.Between(-1, 9));
         const auto x = input.Raw<float>(), y = input.Raw<float>();
         analyser.GetSonogram()->GetPointAmplitude(x, y, {0, 0, 100, 100});
+        if (input.Flag())
+            analyser.GetSonogram()->LookBack(input.Flag() ? input.Value() * 60.0 : input.Raw<double>());
         const auto amplitude = input.Raw<float>();
         analyser.GetSonogram()->ColorFromAmplitude(amplitude, input.Flag());
     }

@@ -36,12 +36,22 @@ enum Command : int {
     kFaster,
     kNextColours,
     kOpenMenu,
-    kFirstSpeed = 100,      // 9 of them
-    kFirstColours = 120,    // 7
+    kFirstSpeed = 100,      // kSpeeds of them
+    kFirstColours = 120,    // kColours
     kFirstReference = 140,  // of kReferences
     kFirstInput = 200,      // as many as there are
     kFirstOfAnalyser = 1200,
+    // Of the analyser's own.
+    kAnalyserOn = 1258,
+    kLargestOverlap = 1267,
+    kResetAnalyserPeaks = 1295,
+    kFirstSensitivity = 1344,  // kSensitivities of them
 };
+constexpr int kSpeeds = 9, kColours = 7, kSensitivities = 6;
+
+constexpr bool IsSensitivity(int command) {
+    return command >= kFirstSensitivity && command < kFirstSensitivity + kSensitivities;
+}
 
 struct CommandRow {
     int command;

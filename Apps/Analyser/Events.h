@@ -19,7 +19,7 @@ enum Key : char32_t {
 
 struct KeyPress {
     char32_t key = 0;
-    bool control = false, shift = false;
+    bool control = false;
 };
 
 enum class Button { Left, Right };

@@ -62,21 +62,16 @@ std::optional<int> Menu::Choose(int level, int row) {
         OpenGroup(row, true);
         return std::nullopt;
     }
-    const MenuEntry& entry =
-        m_groups[static_cast<std::size_t>(m_group)].entries[static_cast<std::size_t>(row)];
-    if (!entry.enabled) return std::nullopt;
     Close();
-    return entry.command;
+    return m_groups[static_cast<std::size_t>(m_group)].entries[static_cast<std::size_t>(row)].command;
 }
 
-bool Menu::PointTo(PointF place) {
-    const int group = m_group, lit = m_levels[1].row;
+void Menu::PointTo(PointF place) {
     const int entry = m_group < 0 ? -1 : RowAt(m_levels[1], place);
     if (entry >= 0)
         m_levels[1].row = entry;
     else if (const int row = RowAt(m_levels[0], place); row >= 0)
         OpenGroup(row, false);
-    return group != m_group || lit != m_levels[1].row;
 }
 
 std::optional<int> Menu::Press(PointF place) {
@@ -180,12 +175,10 @@ void Menu::DrawLevel(DrawTarget& target, int index) const {
         float x = row.x + pad;
         target.Text(KeyOf(number), {x, baseline}, TextAlign::Left, size, {Look::kLabel, 170});
         x += kKeyWidth * scale;
-        bool enabled = true;
         if (index == 0) {
             target.Text("\u203a", {right, baseline}, TextAlign::Right, size, {Look::kLabel});
         } else {
             const MenuEntry& entry = m_groups[static_cast<std::size_t>(m_group)].entries[i];
-            enabled = entry.enabled;
             if (entry.checked) {
                 const float middle = row.y + row.height / 2.0f, unit = 4.0f * scale;
                 const PointF tick[] = {
@@ -195,8 +188,7 @@ void Menu::DrawLevel(DrawTarget& target, int index) const {
             x += kTickWidth * scale;
             target.Text(entry.shortcut, {right, baseline}, TextAlign::Right, size, {Look::kLabel});
         }
-        target.Text(TextOf(index, number), {x, baseline}, TextAlign::Left, size,
-                    {enabled ? Look::kText : Look::kLabel, static_cast<std::uint8_t>(enabled ? 255 : 130)});
+        target.Text(TextOf(index, number), {x, baseline}, TextAlign::Left, size, {Look::kText});
     }
 }
 

@@ -14,7 +14,6 @@ struct MenuEntry {
     std::string shortcut;  // shown at the right
     int command = 0;
     bool checked = false;
-    bool enabled = true;
 };
 
 struct MenuGroup {
@@ -34,8 +33,7 @@ public:
     // Both are to be given to an open menu only; what they return was chosen, and the menu is closed.
     std::optional<int> Press(Corvo::PointF place);
     std::optional<int> KeyDown(const KeyPress& press);
-    // True when the picture changes.
-    bool PointTo(Corvo::PointF place);
+    void PointTo(Corvo::PointF place);
 
     void Draw(Corvo::DrawTarget& target, const Corvo::RectF& bounds);
 

@@ -30,6 +30,7 @@ public:
     virtual void Seek(double /*seconds*/) {}
     virtual void TogglePlaying() {}
 
+    // Whether the window is the view's own: it may fill the screen, and Ctrl+Q or Ctrl+W ends it.
     virtual bool CanFillScreen() const { return false; }
     virtual void ToggleFullScreen() {}
     // False where there is no clipboard.

@@ -33,7 +33,7 @@ View::View(Shell& shell) : m_shell(shell) {
     first.SetTunerOn(true);
     // What is shared stays as it was chosen in another.
     if (s_views++ == 0) {
-        Do(1267);             // an overlap of 93.75 %: a new spectrum at every refresh
+        Do(kLargestOverlap);  // a new spectrum at every refresh
         Do(kFirstSpeed + 4);  // 60 columns a second: something to see within seconds
     }
     Do(kShowBoth);
@@ -42,15 +42,16 @@ View::View(Shell& shell) : m_shell(shell) {
 
 View::~View() { --s_views; }
 
-void View::Feed(const float* samples, int frames, int channels) {
-    if (!samples || frames < 1 || channels < 1) return;
+float View::Feed(const float* samples, int frames, int channels) {
+    if (!samples || frames < 1 || channels < 1) return 0.0f;
     float peak = 0.0f;
     for (int i = 0; i < frames * channels; ++i) peak = std::max(peak, std::abs(samples[i]));
     if (peak > m_peak.load(std::memory_order_relaxed)) m_peak.store(peak, std::memory_order_relaxed);
     if (peak > kHeard) m_heard.store(true, std::memory_order_relaxed);
     const bool apart = m_apart.load(std::memory_order_relaxed) && channels > 1;
     m_analysers[0].Feed(samples, frames, channels, apart ? 1 : channels);
-    if (apart) m_analysers[1].Feed(samples + 1, frames, channels, 1);
+    m_analysers[1].Feed(samples + (apart ? 1 : 0), frames, channels, apart ? 1 : channels);
+    return peak;
 }
 
 void View::SetSamplingRate(int rate) {
@@ -108,13 +109,14 @@ void View::FollowLevel() {
     m_level = level;
 }
 
-// The channels apart: the second shows as the first does, but has no tuner of its own.
+// The channels apart: the second shows as the first does, but has no tuner of its own. Until they are it
+// hears what the first one hears, so that their sonograms have the same past.
 void View::FollowFirst() {
     const kivspectrum& first = GetAnalyser();
     kivspectrum& second = m_analysers[1];
     const bool apart = kivspectrum::GetSettings().view_flag_a != 0;
     m_apart.store(apart, std::memory_order_relaxed);
-    second.SetOn(apart && first.GetOn());
+    second.SetOn(first.GetOn() && (apart || m_width > 0));  // nothing was shown before
     if (second.GetFrozen() != first.GetFrozen()) second.SetFrozen(first.GetFrozen());
     while (second.GetDisplayMode() != first.GetDisplayMode()) second.ToggleDisplayMode();
     second.SetFrequencySpan(first.GetFrequencySpan());
@@ -181,6 +183,20 @@ bool View::LookBack(double seconds) {
     return true;
 }
 
+// The same, but never further into what was not heard than it is already.
+bool View::Scroll(double seconds) {
+    const int before = UnheardColumns();
+    if (!LookBack(seconds)) return false;
+    const int more = UnheardColumns() - std::max(before, 0);
+    if (more > 0) LookBack(SecondsBack() - 1.0 * more / Corvo::Sonogram::GetColumnsPerSecond());
+    return true;
+}
+
+int View::UnheardColumns() const {
+    const Corvo::Sonogram& sonogram = *GetAnalyser().GetSonogram();
+    return sonogram.GetBitmap().width - sonogram.GetHeardColumns();
+}
+
 double View::SecondsBack() const {
     const kivspectrum& first = GetAnalyser();
     return first.IsShowSonogram() ? first.GetSonogram()->GetSecondsBack() : 0.0;
@@ -191,7 +207,7 @@ void View::DragTime(float x) {
     const double since = ReadingAt(m_drag->x, m_drag->y).since;
     if (!std::exchange(m_drag->inTime, true)) m_drag->start.since = since;
     const double moved = static_cast<double>(x - m_drag->x) / Corvo::Sonogram::GetColumnsPerSecond();
-    LookBack(SecondsBack() + since - m_drag->start.since + moved);
+    Scroll(SecondsBack() + since - m_drag->start.since + moved);
 }
 
 void View::PointTo(float x, float y) {
@@ -285,7 +301,7 @@ void View::Wheel(float x, float y, float steps, bool control) {
 void View::ScrollBack(float steps) {
     if (m_menu.IsOpen() || !std::isfinite(steps)) return;
     const double columns = kScrolled * static_cast<double>(steps * m_dpi / 96.0f);
-    LookBack(SecondsBack() + columns / Corvo::Sonogram::GetColumnsPerSecond());
+    Scroll(SecondsBack() + columns / Corvo::Sonogram::GetColumnsPerSecond());
 }
 
 bool View::KeyDown(const KeyPress& press) {

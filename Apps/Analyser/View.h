@@ -5,6 +5,8 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <string_view>
+#include <vector>
 
 #include "Drawing/Backends/DrawingCairo.h"
 #include "Events.h"
@@ -27,8 +29,8 @@ public:
     View(const View&) = delete;
     View& operator=(const View&) = delete;
 
-    // Audio thread; never waits. Interleaved frames.
-    void Feed(const float* samples, int frames, int channels);
+    // Audio thread; never waits. Interleaved frames, of which the highest sample's magnitude is returned.
+    float Feed(const float* samples, int frames, int channels);
 
     // Display thread from here on.
     void SetSamplingRate(int rate);
@@ -59,10 +61,10 @@ public:
     // All that is chosen, as lines of text; false, with nothing changed, for a text that is no settings.
     std::string GetSettings() const;
     bool SetSettings(const std::string& text);
-    // Counts up with every choice.
+    // Counts up with every choice that is kept.
     unsigned GetChoices() const { return m_choices; }
 
-    // One sentence that stays until it is taken back with an empty one.
+    // One sentence that stays until it is taken back with an empty one: why nothing is heard.
     void SetTrouble(std::string sentence);
     // One sentence that goes after a few seconds.
     void Say(std::string sentence);
@@ -77,14 +79,30 @@ private:
     struct Bar {
         Corvo::RectF whole{}, timeline{};
     };
+    struct KeyRow {
+        std::string_view key, text;
+    };
+    struct Action;
+    static const Action kActions[];
 
+    static const Action* FindAction(int command);
+    bool Act(int command);
+    bool IsOffered(int command) const;
     std::vector<MenuGroup> MakeMenu() const;
+    void ToggleStrip();
+    void ToggleFrozen();
+    void TurnKeys();
+    void CopyReading();
+    void Calibrate();
+    bool Skip(double seconds);
     void ShowMode(kivspectrum::_display_mode mode);
     void FollowFirst();
     void Zoom(double aroundHz, double factor);
     void Pan(double fromHz, double toHz);
     void DragTime(float x);
     bool LookBack(double seconds);
+    bool Scroll(double seconds);
+    int UnheardColumns() const;
     double SecondsBack() const;
     void SetSpan(double low, double high);
     int Rate() const;
@@ -93,16 +111,28 @@ private:
     void SetReference(double hz);
     void Save(Kind kind);
     std::string Numbers() const;
+    std::string TunerNumbers() const;
     std::string DescribeHeard() const;
+    const char* ChannelAt(float x, float y) const;
     void SeekTo(float x);
     void FollowLevel();
 
+    std::string Trouble() const;
+    // For a file there is nothing but what is measured.
+    enum class For { Window, File };
+    void DrawFor(For what, cairo_t* context, int width, int height, float dpi);
     void DrawAnalysers(Corvo::DrawingCairo::DrawTarget& target, const Corvo::RectF& rectangle);
-    void DrawBar(Corvo::DrawTarget& target, const Corvo::RectF& bar);
+    void DrawChannelNames(Corvo::DrawTarget& target, const Corvo::RectF& rectangle, float half) const;
+    void DrawBar(Corvo::DrawTarget& target, const Corvo::RectF& bar, For what);
     float DrawLevel(Corvo::DrawTarget& target, const Corvo::RectF& bar, float x) const;
-    void DrawHints(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
-    void DrawKeys(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
+    float DrawStatus(Corvo::DrawTarget& target, const Corvo::RectF& bar, float x, float room);
+    void DrawTimeline(Corvo::DrawTarget& target, const Corvo::RectF& bar, float x, float end,
+                      const Playback& playback);
+    void SizeSonograms(const Corvo::RectF& picture);
+    void DrawHints(Corvo::DrawTarget& target, const Corvo::RectF& rectangle);
     void DrawSentences(Corvo::DrawTarget& target, const Corvo::RectF& rectangle) const;
+    std::vector<KeyRow> KeyRows() const;
+    void DrawKeys(Corvo::DrawTarget& target, const Corvo::RectF& rectangle);
 
     Shell& m_shell;
     std::unique_ptr<Corvo::DrawingCairo> m_drawing;  // made with the first picture
@@ -117,7 +147,8 @@ private:
     Bar m_bar;
     int m_width = 0, m_height = 0;
     float m_dpi = 96.0f;
-    bool m_dirty = true, m_keysShown = false;
+    bool m_dirty = true, m_keysShown = false, m_troubleSaid = false;
+    int m_keysPage = 0, m_keyPages = 1;
     static std::atomic<int> s_views, s_sensitivity;  // the analyser cannot tell all of those apart
     unsigned m_choices = 0;
     std::string m_trouble, m_said, m_folder;

@@ -14,17 +14,14 @@ namespace {
 
 using Corvo::Sonogram;
 
-constexpr int kSpeeds = 9, kColours = 7, kManyReferences = static_cast<int>(std::size(kReferences));
+constexpr int kManyReferences = static_cast<int>(std::size(kReferences));
 constexpr const char* kSpeedTexts[kSpeeds] = {
     "5 columns a second", "10", "15", "30", "60", "90", "150", "300", "450"};
 constexpr const char* kColourTexts[kColours] = {
     "Blue and red", "Blue and green", "Orange and yellow", "Red", "Green", "Blue", "Grey"};
-constexpr int kFirstSensitivity = 1344, kLastSensitivity = 1349;
 constexpr double kSkipSeconds = 5.0;
 
 double Reference() { return 4.0 * Tuner::GetCalibrationBase(); }
-
-bool IsWithin(int command, int first, int count) { return command >= first && command < first + count; }
 
 }  // namespace
 
@@ -37,12 +34,10 @@ std::vector<MenuGroup> View::MakeMenu() const {
     const auto add = [&](std::string_view to, std::string text, const char* shortcut, int command) {
         group(to).push_back({std::move(text), shortcut, command, IsChosen(command)});
     };
-    const bool plays = m_shell.GetPlayback().has_value();
     const auto inputs = m_shell.Inputs();
     for (const CommandRow& row : Commands()) {
         const std::string_view name = row.group;
-        if (name.empty() || (row.command == kPlay && !plays)) continue;
-        if (row.command == kFullScreen && !m_shell.CanFillScreen()) continue;
+        if (name.empty() || !IsOffered(row.command)) continue;
         if (row.command == kLowerReference) {
             for (std::size_t i = 0; i < inputs.size(); ++i)
                 add("Input", inputs[i], "", kFirstInput + static_cast<int>(i));
@@ -55,42 +50,14 @@ std::vector<MenuGroup> View::MakeMenu() const {
         add(name, row.text, row.shortcut, row.command);
     }
     for (const Corvo::AnalyserMenuEntry& entry : Corvo::AnalyserMenu())
-        add(entry.group, entry.text, entry.command == 1295 ? "R" : "", entry.command);
+        add(entry.group, entry.text, entry.command == kResetAnalyserPeaks ? "R" : "", entry.command);
     return groups;
 }
 
-bool View::IsChosen(int command) const {
-    const kivspectrum& first = GetAnalyser();
-    const auto mode = first.GetDisplayMode();
-    if (IsWithin(command, kFirstSpeed, kSpeeds)) return Sonogram::GetSpeedIndex() == command - kFirstSpeed;
-    if (IsWithin(command, kFirstColours, kColours))
-        return Sonogram::GetColourScheme() == command - kFirstColours;
-    if (IsWithin(command, kFirstReference, kManyReferences))
-        return std::abs(Reference() - kReferences[command - kFirstReference]) < 0.05;
-    if (command >= kFirstSensitivity && command <= kLastSensitivity)
-        return command - kFirstSensitivity == s_sensitivity;
-    if (command >= kFirstOfAnalyser) return first.popupmenu_checked(command);
-    if (command >= kFirstInput) return m_shell.CurrentInput() == command - kFirstInput;
-    switch (command) {
-        case kShowSpectrum:
-            return mode == kivspectrum::display_spectrum;
-        case kShowSonogram:
-            return mode == kivspectrum::display_sonogram;
-        case kShowBoth:
-            return mode == kivspectrum::display_both;
-        case kShowTuner:
-            return mode == kivspectrum::display_tuner;
-        case kTunerStrip:
-            return first.IsShowTuner();
-        case kFreeze:
-            return first.GetFrozen();
-        case kTone:
-            return m_shell.IsToneOn();
-        case kShowKeys:
-            return m_keysShown;
-        default:
-            return false;
-    }
+// False for what the window that it is in has not.
+bool View::IsOffered(int command) const {
+    if (command == kPlay) return m_shell.GetPlayback().has_value();
+    return command != kFullScreen || m_shell.CanFillScreen();
 }
 
 void View::SetReference(double hz) {
@@ -104,133 +71,133 @@ void View::SetReference(double hz) {
     Say(text);
 }
 
-bool View::Do(int command) {
-    kivspectrum& first = GetAnalyser();
+bool View::Skip(double seconds) {
+    const auto playback = m_shell.GetPlayback();
+    if (!playback) return Scroll(SecondsBack() - seconds);
+    m_shell.Seek(std::clamp(playback->position + seconds, 0.0, playback->length));
+    return true;
+}
+
+// Commands in a row that are done alike; those of the analyser's own that need nothing else come last.
+struct View::Action {
+    int first, count;
+    bool (*act)(View& view, int index);             // false where there is nothing to do
+    bool (*isChosen)(const View& view, int index);  // null for what leaves nothing chosen
+};
+
+// clang-format off
+const View::Action View::kActions[] = {
+    {kShowSpectrum, kivspectrum::display_tuner + 1,
+     [](View& v, int mode) { v.ShowMode(static_cast<kivspectrum::_display_mode>(mode)); return true; },
+     [](const View& v, int mode) { return v.GetAnalyser().GetDisplayMode() == mode; }},
+    {kTunerStrip, 1,
+     [](View& v, int) { v.ToggleStrip(); return true; },
+     [](const View& v, int) { return v.GetAnalyser().IsShowTuner(); }},
+    {kFreeze, 1,
+     [](View& v, int) { v.ToggleFrozen(); return true; },
+     [](const View& v, int) { return v.GetAnalyser().GetFrozen(); }},
+    {kZoomIn, 2,
+     [](View& v, int out) { v.Zoom(v.ReadingAt(v.m_pointer.x, v.m_pointer.y).frequency, out ? 2.0 : 0.5); return true; },
+     nullptr},
+    {kWholeRange, 1, [](View& v, int) { v.SetSpan(0.0, 1.0); return true; }, nullptr},
+    {kFullScreen, 1, [](View& v, int) { v.m_shell.ToggleFullScreen(); return true; }, nullptr},
+    {kShowKeys, 1,
+     [](View& v, int) { v.TurnKeys(); return true; },
+     [](const View& v, int) { return v.m_keysShown; }},
+    {kSavePicture, 3, [](View& v, int kind) { v.Save(static_cast<Kind>(kind)); return true; }, nullptr},
+    {kCopyReading, 1, [](View& v, int) { v.CopyReading(); return true; }, nullptr},
+    {kPlay, 1, [](View& v, int) { v.m_shell.TogglePlaying(); return v.IsOffered(kPlay); }, nullptr},
+    {kBack, 2, [](View& v, int on) { return v.Skip(on ? kSkipSeconds : -kSkipSeconds); }, nullptr},
+    {kNow, 1, [](View& v, int) { return v.LookBack(0.0); }, nullptr},
+    {kLowerReference, 1, [](View& v, int) { v.SetReference(std::ceil(Reference() - 1.001)); return true; }, nullptr},
+    {kHigherReference, 1, [](View& v, int) { v.SetReference(std::floor(Reference() + 1.001)); return true; }, nullptr},
+    {kCalibrate, 1, [](View& v, int) { v.Calibrate(); return true; }, nullptr},
+    {kTone, 1,
+     [](View& v, int) { v.m_shell.SetTone(!v.m_shell.IsToneOn()); return true; },
+     [](const View& v, int) { return v.m_shell.IsToneOn(); }},
+    {kResetPeaks, 1, [](View& v, int) { for (kivspectrum& each : v.m_analysers) each.peak_reset(); return true; }, nullptr},
+    {kSlower, 1, [](View&, int) { Sonogram::SetSpeedIndex(Sonogram::GetSpeedIndex() - 1); return true; }, nullptr},
+    {kFaster, 1, [](View&, int) { Sonogram::SetSpeedIndex(Sonogram::GetSpeedIndex() + 1); return true; }, nullptr},
+    {kNextColours, 1,
+     [](View&, int) { Sonogram::SetColourScheme((Sonogram::GetColourScheme() + 1) % kColours); return true; },
+     nullptr},
+    {kOpenMenu, 1, [](View& v, int) { v.m_menu.Open(v.MakeMenu(), {std::max(v.m_pointer.x, 0.0f), std::max(v.m_pointer.y, 0.0f)}); return true; }, nullptr},
+    {kFirstSpeed, kSpeeds,
+     [](View&, int speed) { Sonogram::SetSpeedIndex(speed); return true; },
+     [](const View&, int speed) { return Sonogram::GetSpeedIndex() == speed; }},
+    {kFirstColours, kColours,
+     [](View&, int scheme) { Sonogram::SetColourScheme(scheme); return true; },
+     [](const View&, int scheme) { return Sonogram::GetColourScheme() == scheme; }},
+    {kFirstReference, kManyReferences,
+     [](View& v, int index) { v.SetReference(kReferences[index]); return true; },
+     [](const View&, int index) { return std::abs(Reference() - kReferences[index]) < 0.05; }},
+    {kFirstInput, kFirstOfAnalyser - kFirstInput,
+     [](View& v, int input) { v.m_shell.ChooseInput(input); ++v.m_choices; return true; },
+     [](const View& v, int input) { return v.m_shell.CurrentInput() == input; }},
+    {kFirstSensitivity, kSensitivities,
+     [](View& v, int index) { s_sensitivity = index; return v.GetAnalyser().popupmenu_process(kFirstSensitivity + index); },
+     [](const View&, int index) { return s_sensitivity == index; }},
+    {kFirstOfAnalyser, 1000,
+     [](View& v, int index) { return v.GetAnalyser().popupmenu_process(kFirstOfAnalyser + index); },
+     [](const View& v, int index) { return v.GetAnalyser().popupmenu_checked(kFirstOfAnalyser + index); }},
+};
+// clang-format on
+
+const View::Action* View::FindAction(int command) {
+    for (const Action& action : kActions)
+        if (command >= action.first && command - action.first < action.count) return &action;
+    return nullptr;
+}
+
+bool View::IsChosen(int command) const {
+    const Action* const action = FindAction(command);
+    return action && action->isChosen && action->isChosen(*this, command - action->first);
+}
+
+bool View::Act(int command) {
+    const Action* const action = FindAction(command);
     m_dirty = true;
-    ++m_choices;
-    if (command >= kFirstOfAnalyser) {
-        if (!first.popupmenu_process(command)) return false;
-        if (command >= kFirstSensitivity && command <= kLastSensitivity)
-            s_sensitivity = command - kFirstSensitivity;
-        FollowFirst();
-        return true;
-    }
-    if (IsWithin(command, kFirstSpeed, kSpeeds)) {
-        Sonogram::SetSpeedIndex(command - kFirstSpeed);
-        return true;
-    }
-    if (IsWithin(command, kFirstColours, kColours)) {
-        Sonogram::SetColourScheme(command - kFirstColours);
-        return true;
-    }
-    if (IsWithin(command, kFirstReference, kManyReferences)) {
-        SetReference(kReferences[command - kFirstReference]);
-        return true;
-    }
-    if (command >= kFirstInput) {
-        m_shell.ChooseInput(command - kFirstInput);
-        return true;
-    }
-    const auto skip = [&](double seconds) {
-        const auto playback = m_shell.GetPlayback();
-        if (!playback) return LookBack(SecondsBack() - seconds);
-        m_shell.Seek(std::clamp(playback->position + seconds, 0.0, playback->length));
-        return true;
-    };
-    switch (command) {
-        case kShowSpectrum:
-            ShowMode(kivspectrum::display_spectrum);
-            break;
-        case kShowSonogram:
-            ShowMode(kivspectrum::display_sonogram);
-            break;
-        case kShowBoth:
-            ShowMode(kivspectrum::display_both);
-            break;
-        case kShowTuner:
-            ShowMode(kivspectrum::display_tuner);
-            break;
-        case kTunerStrip:
-            if (!first.GetTunerOn())
-                first.ToggleTuner();
-            else
-                first.ShowTuner(!first.IsShowTuner());
-            break;
-        case kFreeze:
-            first.SetFrozen(!first.GetFrozen());
-            if (!first.GetFrozen()) LookBack(0.0);
-            break;
-        case kZoomIn:
-        case kZoomOut: {
-            const auto pointed = ReadingAt(m_pointer.x, m_pointer.y);
-            Zoom(pointed.frequency, command == kZoomIn ? 0.5 : 2.0);
-            break;
-        }
-        case kWholeRange:
-            SetSpan(0.0, 1.0);
-            break;
-        case kFullScreen:
-            m_shell.ToggleFullScreen();
-            break;
-        case kShowKeys:
-            m_keysShown = !m_keysShown;
-            break;
-        case kSavePicture:
-            Save(Kind::Png);
-            break;
-        case kSaveSvg:
-            Save(Kind::Svg);
-            break;
-        case kSavePdf:
-            Save(Kind::Pdf);
-            break;
-        case kCopyReading:
-            Say(m_shell.Copy(DescribeHeard()) ? "Copied the reading." : "There is no clipboard here.");
-            break;
-        case kPlay:
-            m_shell.TogglePlaying();
-            return m_shell.GetPlayback().has_value();
-        case kBack:
-            return skip(-kSkipSeconds);
-        case kForward:
-            return skip(kSkipSeconds);
-        case kNow:
-            return LookBack(0.0);
-        case kLowerReference:
-            SetReference(std::ceil(Reference() - 1.001));
-            break;
-        case kHigherReference:
-            SetReference(std::floor(Reference() + 1.001));
-            break;
-        case kCalibrate:
-            if (TunerCalibrateNow(*first.GetTuner()))
-                SetReference(Reference());
-            else
-                Say("To calibrate, let one note sound steadily for half a second.");
-            break;
-        case kTone:
-            m_shell.SetTone(!m_shell.IsToneOn());
-            break;
-        case kResetPeaks:
-            for (kivspectrum& each : m_analysers) each.peak_reset();
-            break;
-        case kSlower:
-            Sonogram::SetSpeedIndex(Sonogram::GetSpeedIndex() - 1);
-            break;
-        case kFaster:
-            Sonogram::SetSpeedIndex(Sonogram::GetSpeedIndex() + 1);
-            break;
-        case kNextColours:
-            Sonogram::SetColourScheme((Sonogram::GetColourScheme() + 1) % kColours);
-            break;
-        case kOpenMenu:
-            m_menu.Open(MakeMenu(), m_pointer.x >= 0.0f ? m_pointer : Corvo::PointF{0.0f, 0.0f});
-            break;
-        default:
-            return false;
-    }
+    if (!action || !action->act(*this, command - action->first)) return false;
     FollowFirst();
     return true;
+}
+
+bool View::Do(int command) {
+    const std::string before = GetSettings();
+    const bool done = Act(command);
+    if (GetSettings() != before) ++m_choices;
+    return done;
+}
+
+void View::ToggleStrip() {
+    kivspectrum& first = GetAnalyser();
+    if (!first.GetTunerOn())
+        first.ToggleTuner();
+    else
+        first.ShowTuner(!first.IsShowTuner());
+}
+
+void View::ToggleFrozen() {
+    kivspectrum& first = GetAnalyser();
+    first.SetFrozen(!first.GetFrozen());
+    if (!first.GetFrozen()) LookBack(0.0);
+}
+
+// To the list of keys, its next page, and away again.
+void View::TurnKeys() {
+    m_keysPage = m_keysShown ? m_keysPage + 1 : 0;
+    m_keysShown = m_keysPage < (m_keysShown ? m_keyPages : 1);
+}
+
+void View::CopyReading() {
+    Say(m_shell.Copy(DescribeHeard()) ? "Copied the reading." : "There is no clipboard here.");
+}
+
+void View::Calibrate() {
+    if (TunerCalibrateNow(*GetAnalyser().GetTuner()))
+        SetReference(Reference());
+    else
+        Say("To calibrate, let one note sound steadily for half a second.");
 }
 
 }  // namespace analyser

@@ -3,6 +3,7 @@
 #include <cstdio>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "Commands.h"
@@ -15,15 +16,12 @@ namespace analyser {
 namespace {
 
 using Corvo::DrawTarget, Corvo::PointF, Corvo::RectF, Corvo::TextAlign;
+using Plot = Corvo::AnalyserReading::Plot;
 namespace Look = Corvo::Look;
 
-constexpr float kBar = 24.0f;  // in 1/96 inch
-
-// As large as asked for, or as it fits.
-float FittingSize(DrawTarget& target, std::string_view text, float wanted, float room) {
-    const float width = target.MeasureText(text, wanted).width;
-    return width > room ? wanted * room / width : wanted;
-}
+constexpr float kBar = 24.0f;           // in 1/96 inch
+constexpr std::size_t kMostBytes = 90;  // of a text: more could be cut off
+constexpr const char* kEllipsis = "\u2026";
 
 std::string Minutes(double seconds, int decimals) {
     const double unit = std::pow(10.0, decimals);
@@ -39,59 +37,155 @@ bool ContinuesCharacter(std::string_view text, std::size_t at) {
     return at < text.size() && (text[at] & 0xC0) == 0x80;
 }
 
-// The beginning of a text that fits, up to a blank if there is one; one character at least. Longer pieces
-// would be cut off.
+// The beginning of a text that fits, up to a blank if there is one; one character at least.
 std::string_view FittingPiece(DrawTarget& target, std::string_view text, float size, float room) {
-    constexpr std::size_t kMost = 80;
-    std::size_t end = std::min(text.size(), kMost + 1);
+    std::size_t end = std::min(text.size(), kMostBytes + 1);
     const auto shorten = [&] {
         const auto blank = text.rfind(' ', end - 1);
         const bool found = blank != text.npos && blank > 0;
         end = found ? blank : end - 1;
         while (end > 0 && ContinuesCharacter(text, end)) --end;
     };
-    while (end > 1 && (end > kMost || target.MeasureText(text.substr(0, end), size).width > room)) shorten();
+    while (end > 1 && (end > kMostBytes || target.MeasureText(text.substr(0, end), size).width > room))
+        shorten();
     end = std::max<std::size_t>(end, 1);
     while (ContinuesCharacter(text, end)) ++end;
     return text.substr(0, end);
 }
 
-// In as many lines as it takes, downwards from `edge` or upwards to it.
-void DrawCentredBox(DrawTarget& target, const RectF& bounds, float edge, bool upwards, std::string_view text,
-                    Corvo::ColourReference colour) {
-    const float scale = target.Scale(), pad = 2.0f * Look::kGap * scale, room = bounds.width - 4.0f * pad;
-    const float size = Look::kInfoSize * scale;
-    std::vector<std::string_view> lines;
-    float widest = 0.0f;
-    while (!text.empty() && room > 0.0f) {
-        lines.push_back(FittingPiece(target, text, size, room));
-        widest = std::max(widest, target.MeasureText(lines.back(), size).width);
-        text.remove_prefix(lines.back().size());
-        if (text.starts_with(' ')) text.remove_prefix(1);
+// The text, or its beginning with an ellipsis.
+std::string Shortened(DrawTarget& target, std::string text, float size, float room) {
+    const auto fits = [&](const std::string& s) {
+        return s.size() <= kMostBytes && target.MeasureText(s, size).width <= room;
+    };
+    if (fits(text)) return text;
+    while (!text.empty() && !fits(text + kEllipsis)) {
+        while (text.size() > 1 && ContinuesCharacter(text, text.size() - 1)) text.pop_back();
+        text.pop_back();
     }
-    const auto metrics = target.MeasureText("Ag", size);
-    const float pitch = std::round(1.2f * (metrics.ascent + metrics.descent));
-    const float height = std::round(pitch * static_cast<float>(lines.size()) + pad);
-    const RectF box{std::round(bounds.x + (bounds.width - widest) / 2.0f - pad),
-                    std::round(upwards ? edge - height : edge), std::round(widest + 2.0f * pad), height};
+    return text.empty() ? text : text + kEllipsis;
+}
+
+struct TextLine {
+    std::string_view text;
+    Corvo::ColourReference colour;
+};
+
+// In as many lines as it takes.
+std::vector<TextLine> Wrapped(DrawTarget& target, const std::vector<TextLine>& texts, float size,
+                              float room) {
+    std::vector<TextLine> lines;
+    for (auto [text, colour] : texts)
+        while (!text.empty() && room > 0.0f) {
+            std::string_view piece = FittingPiece(target, text, size, room);
+            text.remove_prefix(piece.size());
+            while (piece.ends_with(' ')) piece.remove_suffix(1);
+            while (text.starts_with(' ')) text.remove_prefix(1);
+            lines.push_back({piece, colour});
+        }
+    return lines;
+}
+
+enum class Place { Middle, Below };
+
+// False, with nothing drawn, where there is no room for it.
+bool DrawBox(DrawTarget& target, const RectF& bounds, Place place, const std::vector<TextLine>& texts,
+             float size) {
+    const float pad = size, room = bounds.width - 3.0f * pad;
+    const auto lines = Wrapped(target, texts, size, room);
+    float widest = 0.0f;
+    for (const TextLine& line : lines) widest = std::max(widest, target.MeasureText(line.text, size).width);
+    const float pitch = std::round((place == Place::Middle ? 1.8f : 1.5f) * size);
+    const float height = pitch * static_cast<float>(lines.size()) + pad;
+    if (lines.empty() || height > bounds.height) return false;
+    const float below = std::min(20.0f * target.Scale(), bounds.height - height);
+    const float top =
+        place == Place::Middle ? (bounds.height - height) / 2.0f : bounds.height - height - below;
+    const float middle = bounds.x + bounds.width / 2.0f;
+    const RectF box{std::round(middle - widest / 2.0f - pad), std::round(bounds.y + top),
+                    std::round(widest + 2.0f * pad), std::round(height)};
     target.FillRoundedRectangle(box, pad / 2.0f, {Look::kBox, 240});
     float baseline = box.y + pad / 2.0f + (pitch + Corvo::kCapHeight * size) / 2.0f;
-    for (const std::string_view line : lines) {
-        target.Text(line, {bounds.x + bounds.width / 2.0f, baseline}, TextAlign::Centre, size, {colour});
+    for (const TextLine& line : lines) {
+        target.Text(line.text, {middle, baseline}, TextAlign::Centre, size, {line.colour});
         baseline += pitch;
     }
+    return true;
+}
+
+// How a list of keys and what they do stands in the window. Lengths are shares of the text's size.
+struct KeysLayout {
+    static constexpr float kPitch = 1.6f, kGap = 1.2f, kPad = 1.0f;
+
+    float key = 0.0f, text = 0.0f, size = 0.0f;
+    int columns = 1, perColumn = 1;
+
+    float Column() const { return key + text + 2.0f * kGap; }
+};
+
+// As large as it may be so that everything is seen at once, else in pages.
+template <typename Rows>
+KeysLayout LayOutKeys(DrawTarget& target, const RectF& rectangle, const Rows& rows) {
+    constexpr float kMostColumns = 3.0f;
+    const float scale = target.Scale(), least = Look::kSmallest * scale;
+    const auto count = static_cast<int>(rows.size());
+    KeysLayout l;
+    l.size = Look::kInfoSize * scale;
+    for (const auto& [key, text] : rows) {
+        l.key = std::max(l.key, target.MeasureText(key, l.size).width / l.size);
+        l.text = std::max(l.text, target.MeasureText(text, l.size).width / l.size);
+    }
+    const auto fits = [&] {
+        const float most = (rectangle.width / l.size - KeysLayout::kPad) / l.Column();
+        l.columns = static_cast<int>(std::clamp(most, 1.0f, kMostColumns));
+        l.perColumn =
+            static_cast<int>((rectangle.height / l.size - 2.0f * KeysLayout::kPad) / KeysLayout::kPitch);
+        return most >= 1.0f && l.columns * l.perColumn >= count;
+    };
+    while (!fits() && l.size > least) l.size = std::max(l.size - scale, least);
+    if (l.columns * l.perColumn < count) {
+        l.perColumn = std::max(l.perColumn - 1, 1);  // and a line that leads on
+    } else {
+        l.columns = std::min(l.columns, std::max((count + l.perColumn - 1) / l.perColumn, 2));
+        l.perColumn = (count + l.columns - 1) / l.columns;
+    }
+    return l;
+}
+
+float BaselineIn(const RectF& bar, float size) {
+    return bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f;
 }
 
 }  // namespace
 
 void View::DrawAnalysers(Corvo::DrawingCairo::DrawTarget& target, const RectF& rectangle) {
     kivspectrum& first = GetAnalyser();
-    if (!m_apart || first.GetDisplayMode() == kivspectrum::display_tuner)
-        return first.DoDraw<Corvo::DrawingCairo>(target, rectangle);
-    const float half = std::round(rectangle.height / 2.0f);
+    const bool tuner = first.GetDisplayMode() == kivspectrum::display_tuner;
+    const float half = m_apart && !tuner ? std::round(rectangle.height / 2.0f) : rectangle.height;
     first.DoDraw<Corvo::DrawingCairo>(target, {rectangle.x, rectangle.y, rectangle.width, half});
     m_analysers[1].DoDraw<Corvo::DrawingCairo>(
         target, {rectangle.x, rectangle.y + half, rectangle.width, rectangle.height - half});
+    if (m_apart) DrawChannelNames(target, rectangle, half);
+}
+
+// In the upper left corner of what each channel has; the tuner hears the left one.
+void View::DrawChannelNames(DrawTarget& target, const RectF& rectangle, float half) const {
+    const float scale = target.Scale(), size = Look::kInfoSize * scale, pad = Look::kGap * scale;
+    for (const bool right : {false, true}) {
+        const float top = rectangle.y + (right ? half : 0.0f), end = right ? rectangle.height : half;
+        const kivspectrum& analyser = m_analysers[right ? 1 : 0];
+        if (end - top < 3.0f * size) continue;
+        PointF place{rectangle.x + rectangle.width / 2.0f, top};
+        const auto isPlot = [&] { return analyser.GetReading(place.x, place.y).plot != Plot::None; };
+        while (place.y < end && !isPlot()) ++place.y;
+        if (place.y >= end) place = {rectangle.x, top};  // the tuner alone
+        while (place.x > rectangle.x && isPlot()) --place.x;
+        const std::string_view name = right ? "Right" : "Left";
+        const RectF box{place.x + pad, place.y + pad, target.MeasureText(name, size).width + 2.0f * pad,
+                        1.5f * size};
+        target.FillRoundedRectangle(box, pad, {Look::kBox, 225});
+        target.Text(name, {box.x + pad, BaselineIn(box, size)}, TextAlign::Left, size, {Look::kText});
+    }
 }
 
 // Whether anything is heard at all, and whether it is too much. Gives where the next thing may stand.
@@ -107,54 +201,75 @@ float View::DrawLevel(DrawTarget& target, const RectF& bar, float x) const {
     x += whole.width + 2.0f * Look::kGap * scale;
     if (!loud) return x;
     const std::string_view text = m_shell.GetPlayback() ? "Full scale" : "Too loud";
-    target.Text(text, {x, bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f}, TextAlign::Left, size,
-                {colour});
+    target.Text(text, {x, BaselineIn(bar, size)}, TextAlign::Left, size, {colour});
     return x + target.MeasureText(text, size).width + 2.0f * Look::kGap * scale;
 }
 
-void View::DrawBar(DrawTarget& target, const RectF& bar) {
+// Why nothing is heard; empty when there is no reason.
+std::string View::Trouble() const {
+    return GetAnalyser().GetOn() ? m_trouble : "The analyser is switched off (menu: Analyser, On).";
+}
+
+// What is heard, or why it does not move. Gives where the next thing may stand.
+float View::DrawStatus(DrawTarget& target, const RectF& bar, float x, float room) {
+    const float size = Look::kLabelSize * target.Scale();
+    const double back = SecondsBack();
+    std::string text = m_shell.Source();
+    bool special = back > 0.0;
+    if (back > 0.0) {
+        char moment[64];
+        std::snprintf(moment, sizeof moment, "Sonogram %.1f s back (End: now)     ", back);
+        text = moment + text;
+    }
+    if (GetAnalyser().GetFrozen()) {
+        text = "Frozen (Space goes on)     " + text;
+        special = true;
+    }
+    if (const std::string trouble = Trouble(); !trouble.empty() && !m_troubleSaid) {
+        m_troubleSaid = Shortened(target, trouble, size, room) == trouble;
+        if (m_troubleSaid) text = trouble;
+        special = special || m_troubleSaid;
+    }
+    text = Shortened(target, text, size, room);
+    target.Text(text, {x, BaselineIn(bar, size)}, TextAlign::Left, size,
+                {special ? Look::kPeaks : Look::kLabel});
+    return x + target.MeasureText(text, size).width;
+}
+
+void View::DrawBar(DrawTarget& target, const RectF& bar, For what) {
     const float scale = target.Scale(), size = Look::kLabelSize * scale, pad = 2.0f * Look::kGap * scale;
     target.FillRectangle(bar, {Look::kBox});
-    const float baseline = bar.y + (bar.height + Corvo::kCapHeight * size) / 2.0f;
-    const std::string right = "M  menu     H  keys";
+    const bool opened = m_menu.IsOpen() || m_keysShown;
+    const std::string_view right = what == For::File ? "" : opened ? "Esc  close" : "M  menu     H  keys";
     const float rightWidth = target.MeasureText(right, size).width;
-    const bool frozen = GetAnalyser().GetFrozen();
-    const double back = SecondsBack();
-    std::string source = m_shell.Source();
-    if (back > 0.0) {
-        char text[64];
-        std::snprintf(text, sizeof text, "Sonogram %.1f s back (End: now)     ", back);
-        source = text + source;
-    }
-    if (frozen) source = "Frozen (Space goes on)     " + source;
     const auto playback = m_shell.GetPlayback();
-    const float room = playback ? bar.width * 0.35f : bar.width - rightWidth - 4.0f * pad;
-    float x = bar.x + pad;
+    float x = bar.x + pad, end = bar.x + bar.width - pad;
+    const float statusEnd = playback ? bar.width * 0.35f + pad : end - rightWidth - 2.0f * pad;
     if (bar.width > 480.0f * scale) x = DrawLevel(target, bar, x);
-    target.PushClip({x, bar.y, std::max(room + pad - x, 1.0f), bar.height});
-    target.Text(source, {x, baseline}, TextAlign::Left, size,
-                {frozen || back > 0.0 ? Look::kPeaks : Look::kLabel});
-    target.PopClip();
-    x += std::min(target.MeasureText(source, size).width, room - x) + 2.0f * pad;
-    const float end = bar.x + bar.width - pad;
-    const bool keys = end - rightWidth > x + 60.0f * scale;
-    if (keys) target.Text(right, {end, baseline}, TextAlign::Right, size, {Look::kLabel});
+    x = DrawStatus(target, bar, x, statusEnd - x) + 2.0f * pad;
+    if (end - rightWidth > x + (playback ? 60.0f * scale : 0.0f)) {
+        target.Text(right, {end, BaselineIn(bar, size)}, TextAlign::Right, size, {Look::kLabel});
+        end -= rightWidth + (right.empty() ? 0.0f : 2.0f * pad);
+    }
     m_bar.timeline = {};
-    if (!playback) return;
-    const char* const rests = playback->playing ? "" : playback->ended ? "Ended  " : "Paused  ";
-    const int decimals = playback->length < 1.0 ? 2 : playback->length < 10.0 ? 1 : 0;
+    if (playback) DrawTimeline(target, bar, x, end, *playback);
+}
+
+// The time up to `end`, and the line as far as there is room for it.
+void View::DrawTimeline(DrawTarget& target, const RectF& bar, float x, float end, const Playback& playback) {
+    const float scale = target.Scale(), size = Look::kLabelSize * scale, pad = 2.0f * Look::kGap * scale;
+    const char* const rests = playback.playing ? "" : playback.ended ? "Ended  " : "Paused  ";
+    const int decimals = playback.length < 1.0 ? 2 : playback.length < 10.0 ? 1 : 0;
     const std::string time =
-        rests + Minutes(playback->position, decimals) + " / " + Minutes(playback->length, decimals);
-    const float timeWidth = target.MeasureText(time, size).width;
-    const float timeEnd = keys ? end - rightWidth - 2.0f * pad : end;
-    target.Text(time, {timeEnd, baseline}, TextAlign::Right, size, {Look::kText});
-    const RectF line{x, bar.y, timeEnd - timeWidth - 2.0f * pad - x, bar.height};
+        rests + Minutes(playback.position, decimals) + " / " + Minutes(playback.length, decimals);
+    target.Text(time, {end, BaselineIn(bar, size)}, TextAlign::Right, size, {Look::kText});
+    const RectF line{x, bar.y, end - target.MeasureText(time, size).width - 2.0f * pad - x, bar.height};
     if (line.width < 40.0f * scale) return;
     m_bar.timeline = line;
     const float thick = std::max(std::round(4.0f * scale), 1.0f);
     const float y = std::round(bar.y + (bar.height - thick) / 2.0f);
-    const double length = std::max(playback->length, 1e-9);
-    const auto played = static_cast<float>(std::clamp(playback->position / length, 0.0, 1.0)) * line.width;
+    const double length = std::max(playback.length, 1e-9);
+    const auto played = static_cast<float>(std::clamp(playback.position / length, 0.0, 1.0)) * line.width;
     target.FillRoundedRectangle({line.x, y, line.width, thick}, thick / 2.0f, {Look::kGrid});
     target.FillRoundedRectangle({line.x, y, std::max(played, 0.1f), thick}, thick / 2.0f, {Look::kCurve});
     const float knob = 5.0f * scale;
@@ -162,73 +277,94 @@ void View::DrawBar(DrawTarget& target, const RectF& bar) {
                                 knob, {Look::kText});
 }
 
-void View::DrawHints(DrawTarget& target, const RectF& rectangle) const {
-    constexpr std::string_view kLines[] = {
-        "Make a sound: its spectrum, its course and its note appear here.",
-        "1 spectrum   2 sonogram   3 both   4 tuner   T tuner above   Space freezes",
-        "M or right button: menu   Wheel: zoom   Click: marker   H: all keys",
+// What to press, while nothing has been heard yet, and why nothing is.
+void View::DrawHints(DrawTarget& target, const RectF& rectangle) {
+    const bool empty = !m_heard && !m_shell.GetPlayback();
+    if ((!empty && GetAnalyser().GetOn()) || m_menu.IsOpen() || m_keysShown) return;
+    constexpr std::string_view kFirst = "Make a sound: its spectrum, its course and its note appear here.";
+    constexpr std::string_view kRest[] = {
+        "1\u00a0spectrum   2\u00a0sonogram   3\u00a0both   4\u00a0tuner   T\u00a0tuner\u00a0above   "
+        "Space\u00a0freezes",
+        "M or right button:\u00a0menu   Wheel:\u00a0zoom   Click:\u00a0marker   H:\u00a0all\u00a0keys",
     };
-    const float scale = target.Scale(), pad = 3.0f * Look::kGap * scale;
-    float size = 15.0f * scale, widest = 0.0f;
-    for (const std::string_view line : kLines)
-        size = std::min(size, FittingSize(target, line, size, 0.86f * rectangle.width));
-    for (const std::string_view line : kLines)
-        widest = std::max(widest, target.MeasureText(line, size).width);
-    if (size < 5.0f * scale) return;
-    const float pitch = 1.8f * size, middle = rectangle.x + rectangle.width / 2.0f;
-    const RectF box{std::round(middle - widest / 2.0f - pad),
-                    std::round(rectangle.y + (rectangle.height - 3.0f * pitch) / 2.0f - pad),
-                    std::round(widest + 2.0f * pad), std::round(3.0f * pitch + 2.0f * pad)};
-    target.FillRoundedRectangle(box, pad, {Look::kBox, 225});
-    for (int i = 0; i < 3; ++i)
-        target.Text(kLines[i], {middle, box.y + pad + pitch * (static_cast<float>(i) + 0.7f)},
-                    TextAlign::Centre, size, {i == 0 ? Look::kText : Look::kLabel});
+    const std::string trouble = Trouble();
+    std::vector<TextLine> lines;
+    if (!trouble.empty())
+        lines.push_back({trouble, Look::kPeaks});
+    else
+        lines.push_back({kFirst, Look::kText});
+    if (empty)
+        for (const std::string_view line : kRest) lines.push_back({line, Look::kLabel});
+    const float scale = target.Scale(), largest = 15.0f * scale;
+    const float fitting = largest * 0.86f * rectangle.width / target.MeasureText(kRest[0], largest).width;
+    const float size = std::clamp(fitting, Look::kSmallest * scale, largest);
+    m_troubleSaid = DrawBox(target, rectangle, Place::Middle, lines, size) ||
+                    DrawBox(target, rectangle, Place::Middle, {lines[0]}, size);
 }
 
-// Two columns: keys and what they do.
-void View::DrawKeys(DrawTarget& target, const RectF& rectangle) const {
-    const auto commands = Commands();
-    constexpr std::string_view kPointer[][2] = {{"Wheel", "Zoom around the pointer"},
-                                                {"Ctrl+Wheel", "Zoom in time: sonogram's speed"},
-                                                {"Shift+Wheel", "Sonogram back in time"},
-                                                {"Click", "Marker; differences are from it"},
-                                                {"Drag", "Move in frequency and time"},
-                                                {"Double click", "All frequencies, now, no marker"},
-                                                {"Right button", "Menu"}};
-    const float count = static_cast<float>(commands.size() + std::size(kPointer));
-    const float rows = std::ceil(count / 2.0f), scale = target.Scale();
-    const float pitch = std::min(22.0f * scale, (rectangle.height - 40.0f * scale) / rows);
-    const float size = std::min(0.6f * pitch, Look::kInfoSize * scale);
-    if (size < 4.0f) return;
-    const float column = std::min(27.5f * size, rectangle.width / 2.0f - size), pad = size;
-    const RectF box{std::round(rectangle.x + rectangle.width / 2.0f - column - pad / 2.0f),
-                    std::round(rectangle.y + (rectangle.height - rows * pitch) / 2.0f - pad),
-                    std::round(2.0f * column + pad), std::round(rows * pitch + 2.0f * pad)};
+// What there is to press here.
+std::vector<View::KeyRow> View::KeyRows() const {
+    std::vector<KeyRow> rows;
+    for (const CommandRow& row : Commands())
+        if (IsOffered(row.command)) rows.push_back({row.shortcut, row.text});
+    rows.insert(rows.end(), {{"Wheel", "Zoom around the pointer"},
+                             {"Ctrl+Wheel", "Zoom in time: sonogram's speed"},
+                             {"Shift+Wheel", "Sonogram back in time"},
+                             {"Click", "Marker; differences are from it"},
+                             {"Drag", "Move in frequency and time"},
+                             {"Double click", "All frequencies, now, no marker"},
+                             {"Right button", "Menu"},
+                             {"Esc", "Close menu or list; no marker"}});
+    if (m_shell.CanFillScreen()) rows.push_back({"Ctrl+Q", "End, as does Ctrl+W"});
+    return rows;
+}
+
+void View::DrawKeys(DrawTarget& target, const RectF& rectangle) {
+    const auto rows = KeyRows();
+    const KeysLayout layout = LayOutKeys(target, rectangle, rows);
+    const int count = static_cast<int>(rows.size()), perPage = layout.columns * layout.perColumn;
+    m_keyPages = (count + perPage - 1) / perPage;
+    m_keysPage = std::min(m_keysPage, m_keyPages - 1);
+    const float size = layout.size, pad = KeysLayout::kPad * size, pitch = KeysLayout::kPitch * size;
+    const float width =
+        std::min(static_cast<float>(layout.columns) * layout.Column() * size + pad, rectangle.width);
+    const float height = static_cast<float>(layout.perColumn + (m_keyPages > 1 ? 1 : 0)) * pitch + 2.0f * pad;
+    const RectF box{std::round(rectangle.x + (rectangle.width - width) / 2.0f),
+                    std::round(rectangle.y + std::max((rectangle.height - height) / 2.0f, 0.0f)),
+                    std::round(width), std::round(height)};
     target.FillRoundedRectangle(box, pad, {Look::kBox, 245});
-    int number = 0;
-    const auto line = [&](std::string_view key, std::string_view text) {
-        const float at = static_cast<float>(number % static_cast<int>(rows));
-        const float x = box.x + pad + (number >= static_cast<int>(rows) ? column : 0.0f);
-        const float y = box.y + pad + (at + 0.7f) * pitch;
-        target.Text(key, {x, y}, TextAlign::Left, size, {Look::kCurve});
-        target.Text(text, {x + 8.0f * size, y}, TextAlign::Left, size, {Look::kText});
-        ++number;
+    const auto write = [&](std::string_view text, float x, int row, Corvo::ColourReference colour) {
+        const float y = box.y + pad + (static_cast<float>(row) + 0.7f) * pitch;
+        const std::string shown = Shortened(target, std::string(text), size, box.x + box.width - x);
+        target.Text(shown, {x, y}, TextAlign::Left, size, {colour});
     };
-    for (const CommandRow& row : commands) line(row.shortcut, row.text);
-    for (const auto& row : kPointer) line(row[0], row[1]);
+    const int first = m_keysPage * perPage, end = std::min(first + perPage, count);
+    for (int i = first; i < end; ++i) {
+        const int column = (i - first) / layout.perColumn, row = (i - first) % layout.perColumn;
+        const float x = box.x + pad + static_cast<float>(column) * layout.Column() * size;
+        write(rows[static_cast<std::size_t>(i)].key, x, row, Look::kCurve);
+        write(rows[static_cast<std::size_t>(i)].text, x + (layout.key + KeysLayout::kGap) * size, row,
+              Look::kText);
+    }
+    if (m_keyPages == 1) return;
+    const std::string more =
+        "H: page " + std::to_string(m_keysPage + 1) + " of " + std::to_string(m_keyPages);
+    write(more, box.x + pad, layout.perColumn, Look::kLabel);
 }
 
+// What happened a moment ago, and what is wrong where that is not said elsewhere.
 void View::DrawSentences(DrawTarget& target, const RectF& rectangle) const {
-    const float scale = target.Scale();
-    if (!m_trouble.empty())
-        DrawCentredBox(target, rectangle, rectangle.y + 12.0f * scale, false, m_trouble, Look::kPeaks);
-    if (!m_said.empty())
-        DrawCentredBox(target, rectangle, rectangle.y + rectangle.height - 20.0f * scale, true, m_said,
-                       Look::kText);
+    const std::string trouble = m_troubleSaid ? "" : Trouble();
+    DrawBox(target, rectangle, Place::Below, {{trouble, Look::kPeaks}, {m_said, Look::kText}},
+            Look::kInfoSize * target.Scale());
 }
 
 void View::Draw(cairo_t* context, int width, int height, float dpi) {
-    m_width = width;
+    DrawFor(For::Window, context, width, height, dpi);
+}
+
+void View::DrawFor(For what, cairo_t* context, int width, int height, float dpi) {
+    if (std::exchange(m_width, width) == 0) FollowFirst();
     m_height = height;
     m_dpi = dpi;
     if (!m_drawing) m_drawing = std::make_unique<Corvo::DrawingCairo>();
@@ -241,16 +377,25 @@ void View::Draw(cairo_t* context, int width, int height, float dpi) {
         picture.height -= bar;
         m_bar.whole = {0.0f, picture.height, whole.width, bar};
     }
-    // A sonogram hears from the beginning, whichever view is shown.
-    for (kivspectrum& each : m_analysers)
-        if (each.GetOn() && each.GetSonogram()->GetBitmap().IsEmpty())
-            each.GetSonogram()->CheckPixelBufferSize({0.0f, 0.0f, picture.width, picture.height / 2.0f}, 0);
+    SizeSonograms(picture);
     DrawAnalysers(target, picture);
-    if (m_bar.whole.height > 0.0f) DrawBar(target, m_bar.whole);
-    if (!m_heard && !m_shell.GetPlayback() && !m_menu.IsOpen() && !m_keysShown) DrawHints(target, picture);
+    m_troubleSaid = what == For::File;
+    if (what == For::Window) DrawHints(target, picture);
+    if (m_bar.whole.height > 0.0f) DrawBar(target, m_bar.whole, what);
+    if (what == For::File) return;
     DrawSentences(target, picture);
     if (m_keysShown) DrawKeys(target, picture);
     m_menu.Draw(target, whole);
+}
+
+// A sonogram hears from the beginning, whichever view is shown; one that is not drawn is as narrow as can be.
+void View::SizeSonograms(const RectF& picture) {
+    Corvo::Sonogram &first = *GetAnalyser().GetSonogram(), &second = *m_analysers[1].GetSonogram();
+    if (!GetAnalyser().GetOn()) return;
+    if (first.GetBitmap().IsEmpty())
+        first.CheckPixelBufferSize({0.0f, 0.0f, picture.width, picture.height / 2.0f}, 0);
+    if (!m_apart || second.GetBitmap().IsEmpty())
+        second.CheckPixelBufferSize({0.0f, 0.0f, 1.0f, 1.0f}, first.GetBitmap().height);
 }
 
 }  // namespace analyser

@@ -17,8 +17,8 @@ namespace {
 
 constexpr std::string_view kTitle = "analyser settings 1";
 constexpr const char *kView = "View", *kStrip = "Tuner above", *kSpeed = "Sonogram speed",
-                     *kColours = "Sonogram colours", *kReference = "Tuner reference";
-constexpr int kModes = 4, kSpeeds = 9, kSchemes = 7;
+                     *kScheme = "Sonogram colours", *kReference = "Tuner reference";
+constexpr int kModes = kivspectrum::display_tuner + 1;
 
 using Lines = std::vector<std::pair<std::string, std::string>>;
 
@@ -60,7 +60,7 @@ bool WithNumber(const Lines& lines, std::string_view name, Number lowest, Number
 }
 
 // An analyser that was left off would start as an empty window.
-bool IsKept(int command) { return command != 1258; }
+bool IsKept(int command) { return command != kAnalyserOn; }
 
 std::string Number(double value) {
     char text[32];
@@ -79,7 +79,7 @@ std::string View::GetSettings() const {
     line(kView, std::to_string(static_cast<int>(first.GetDisplayMode())));
     line(kStrip, std::to_string(first.IsShowTuner() ? 1 : 0));
     line(kSpeed, std::to_string(Corvo::Sonogram::GetSpeedIndex()));
-    line(kColours, std::to_string(Corvo::Sonogram::GetColourScheme()));
+    line(kScheme, std::to_string(Corvo::Sonogram::GetColourScheme()));
     line(kReference, Number(4.0 * Tuner::GetCalibrationBase()));
     for (const Corvo::AnalyserMenuEntry& entry : Corvo::AnalyserMenu())
         if (IsKept(entry.command) && IsChosen(entry.command)) line(entry.group, entry.text);
@@ -93,27 +93,23 @@ bool View::SetSettings(const std::string& text) {
     if (!ReadLines(text, lines) || !WithNumber(lines, kView, 0, kModes - 1, [&](int i) { mode = i; }) ||
         !WithNumber(lines, kStrip, 0, 1, [&](int i) { strip = i; }) ||
         !WithNumber(lines, kSpeed, 0, kSpeeds - 1, [&](int i) { speed = i; }) ||
-        !WithNumber(lines, kColours, 0, kSchemes - 1, [&](int i) { colours = i; }) ||
+        !WithNumber(lines, kScheme, 0, kColours - 1, [&](int i) { colours = i; }) ||
         !WithNumber(lines, kReference, kLowestReference, kHighestReference,
                     [&](double hz) { reference = hz; }))
         return false;
     // What is wanted first: then what has a tick without being wanted is a switch that is to be off.
-    constexpr int kFirstSensitivity = 1344, kLastSensitivity = 1349;
     const auto menu = Corvo::AnalyserMenu();
     const auto wanted = [&](const Corvo::AnalyserMenuEntry& entry) {
         return Has(lines, entry.group, entry.text);
     };
-    const auto isSensitivity = [](int command) {
-        return command >= kFirstSensitivity && command <= kLastSensitivity;
-    };
     // Twice: a tuner that is to be off holds the window's length until it is.
     for (int pass = 0; pass < 2; ++pass) {
         for (const auto& entry : menu)
-            if (wanted(entry) && !IsChosen(entry.command)) Do(entry.command);
+            if (wanted(entry) && !IsChosen(entry.command)) Act(entry.command);
         for (const auto& entry : menu)
-            if (!wanted(entry) && IsKept(entry.command) && !isSensitivity(entry.command) &&
+            if (!wanted(entry) && IsKept(entry.command) && !IsSensitivity(entry.command) &&
                 IsChosen(entry.command))
-                Do(entry.command);
+                Act(entry.command);
     }
     if (mode >= 0) ShowMode(static_cast<kivspectrum::_display_mode>(mode));
     if (strip >= 0) GetAnalyser().ShowTuner(strip != 0);

@@ -467,7 +467,7 @@ DSP_C_API dsp_status DSP_CALL dsp_sonogram_resize(dsp_analyser* analyser, int32_
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_pixels(dsp_analyser* analyser, uint32_t* pixels, size_t count,
                                                   size_t* needed);
 /* The frequency at the middle of each row, from the top, and what the tuner heard at each column, 0 for
- * nothing. */
+ * nothing that lasted for four refreshes. */
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_frequencies(dsp_analyser* analyser, float* hz, size_t count,
                                                        size_t* needed);
 DSP_C_API dsp_status DSP_CALL dsp_sonogram_pitches(dsp_analyser* analyser, float* hz, size_t count,

@@ -38,6 +38,16 @@ int FilterLength(const SpectrumSettings& settings) {
     return std::clamp(settings.smoothing_filter_length, 0, kMaxFilterSpectra);
 }
 
+// The height of the curve last drawn, whose points go from left to right; at the ground where it has none.
+double CurveAt(const std::vector<PointF>& points, float x, const RectF& plot) {
+    const auto right = std::ranges::lower_bound(points, x, {}, &PointF::x);
+    if (points.empty()) return plot.y + plot.height;
+    if (right == points.begin()) return right->y;
+    const PointF before = right[-1];
+    if (right == points.end() || right->x <= before.x) return before.y;
+    return std::lerp(before.y, right->y, (x - before.x) / (right->x - before.x));
+}
+
 bool SameBuffers(const SpectrumSettings& a, const SpectrumSettings& b) {
     return a.fft_length == b.fft_length && a.window_type == b.window_type &&
            a.window_length == b.window_length && a.hop_length == b.hop_length;
@@ -313,7 +323,8 @@ AnalyserReading Analyser::ReadingAt(PointF place) const {
     using Plot = AnalyserReading::Plot;
     const Lock lock(m_lock);
     if (shown.map && Contains(shown.spectrum, place))
-        return {Plot::Spectrum, shown.map->XToFrequency(place.x), shown.map->YToLevel(place.y)};
+        return {Plot::Spectrum, shown.map->XToFrequency(place.x),
+                shown.map->YToLevel(CurveAt(m_drawer->GetXYPoints(), place.x, shown.spectrum))};
     if (!Contains(shown.sonogram, place)) return {};
     const RectF& axis = shown.sonogramAxis;
     const double rows = m_sonogram->GetBitmap().height;

@@ -14,7 +14,7 @@ struct AnalyserReading {
     enum class Plot { None, Spectrum, Sonogram };
     Plot plot = Plot::None;  // where the place is
     double frequency = 0.0;  // Hz
-    double level = 0.0;      // in the spectrum of its scale's unit, in the sonogram dB below full scale
+    double level = 0.0;      // of the spectrum's curve in its scale's unit, or of the sonogram's pixel in dB
     double seconds = 0.0;    // in the sonogram: what its timeline says there
     double since = 0.0;      // the same moment counted from the sonogram's beginning, which does not move
 };

@@ -4,6 +4,7 @@
 #include <filesystem>
 #include <fstream>
 #include <map>
+#include <set>
 #include <string>
 
 #include "Analyser/ViewFixture.h"
@@ -125,6 +126,32 @@ TEST_F(LiveView, EveryEntryOfTheMenuIsTwoKeysAway) {
               static_cast<int>(own + 9 + 7 + 13 + 2 + static_cast<long>(Corvo::AnalyserMenu().size())));
 }
 
+// Catches settings that are written again although nothing of them was chosen.
+TEST_F(LiveView, CountsWhatIsKept) {
+    const unsigned before = m_view.GetChoices();
+    for (const char32_t key : {U' ', U'+', U'0', U'h', U'h', U'r', U'm', U'm'}) Press(key);
+    EXPECT_EQ(m_view.GetChoices(), before);
+    for (const char32_t key : {U'2', U']', U'.'}) m_view.Do(FindCommand({key})->command);
+    m_view.Do(kFirstInput + 1);
+    EXPECT_EQ(m_view.GetChoices(), before + 4);
+}
+
+// Catches a list of keys that ends where a small window does.
+TEST_F(LiveView, KeysTurnTheirPages) {
+    const auto presses = [&](int width, int height) {
+        TestSupport::DrawingSurface<Corvo::DrawingCairo> small{width, height};
+        int count = 0;
+        do {
+            m_view.Do(kShowKeys);
+            small.PaintPlainly([&](cairo_t* context) { m_view.Draw(context, width, height, 96.0f); });
+            ++count;
+        } while (m_view.IsChosen(kShowKeys));
+        return count;
+    };
+    EXPECT_EQ(presses(960, 600), 2);
+    EXPECT_EQ(presses(240, 184), 6);
+}
+
 // Catches a choice that is not kept, a switch that comes back on, and a broken file that changes something.
 TEST_F(LiveView, SettingsComeBackAsTheyWere) {
     const std::string fresh = m_view.GetSettings();
@@ -204,6 +231,9 @@ TEST_F(LiveView, SonogramIsDraggedThroughTime) {
     m_view.Wheel(to.x, to.y, 1.0f, true);
     Draw();
     EXPECT_NEAR(since(to), moment, 0.02);
+    m_view.ScrollBack(1e6f);
+    EXPECT_GT(sonogram.GetSecondsBack(), 10.0);
+    EXPECT_EQ(sonogram.GetHeardColumns(), sonogram.GetBitmap().width);
     m_view.ScrollBack(-1e6f);
     EXPECT_EQ(sonogram.GetSecondsBack(), 0.0);
     for (const auto leave : {+[](View& view) { view.KeyDown({kKeyEnd}); },
@@ -218,15 +248,31 @@ TEST_F(LiveView, SonogramIsDraggedThroughTime) {
     }
 }
 
-// Catches files that are cut off, levels that are not those of the picture, and one file that takes another's
-// place.
+// Catches a zoom in time that loses the moment because there is too little before it.
+TEST_F(LiveView, TimeZoomsAroundTheBeginning) {
+    Press(U'2');
+    Hear(1000.0, 0.5, 2.0);
+    Press(U' ');
+    const auto reading = [&] { return m_view.GetAnalyser().GetReading(820.0f, 300.0f); };
+    const double moment = reading().since;
+    ASSERT_GT(moment, 0.5);
+    for (const float steps : {1.0f, 1.0f, 1.0f, -1.0f}) {
+        m_view.Wheel(820.0f, 300.0f, steps, true);
+        Draw();
+        EXPECT_NEAR(reading().since, moment, 0.02);
+    }
+}
+
+// Catches files that are cut off, levels that are not those of the picture, one file that takes another's
+// place, and a picture with the list of keys.
 TEST_F(LiveView, WritesThePictureAndItsNumbers) {
     namespace fs = std::filesystem;
     const fs::path folder = fs::temp_directory_path() / "analyser_view_test";
     fs::remove_all(folder);
     m_view.SetFolder(folder.string());
     Hear(1500.0, 0.1, 2.0);
-    for (const char32_t key : {U'p', U'p', U's', U'd'}) Press(key);
+    for (const char32_t key : {U'p', U'h', U'p', U's', U'd'}) Press(key);
+    std::set<std::string> pictures;
     std::map<std::string, int> endings;
     for (const auto& entry : fs::directory_iterator(folder)) ++endings[entry.path().extension().string()];
     EXPECT_EQ(endings, (std::map<std::string, int>{{".csv", 2}, {".pdf", 1}, {".png", 2}, {".svg", 1}}));
@@ -238,6 +284,7 @@ TEST_F(LiveView, WritesThePictureAndItsNumbers) {
         const std::map<std::string, std::string> ends{
             {".png", "IEND"}, {".pdf", "%%EOF"}, {".svg", "</svg>"}, {".csv", "\n"}};
         EXPECT_NE(text.rfind(ends.at(ending)), std::string::npos) << ending;
+        if (ending == ".png") pictures.insert(text);
         if (ending != ".csv") continue;
         double hz = 0.0, decibels = 0.0;
         for (std::size_t at = text.find('\n') + 1; at < text.size(); at = text.find('\n', at) + 1)
@@ -246,6 +293,7 @@ TEST_F(LiveView, WritesThePictureAndItsNumbers) {
                 loudest = hz;
             }
     }
+    EXPECT_EQ(pictures.size(), 1u);
     EXPECT_NEAR(loudest, 1500.0, 6.0);
     EXPECT_NEAR(level, -20.0, 1.5);
     fs::remove_all(folder);
@@ -283,6 +331,11 @@ TEST_F(LiveView, ShowsTheChannelsApart) {
     Hear(stereo, 2);
     const auto peak = m_view.GetAnalyser().GetSpectrumDrawer()->HighestPeak(20.0);
     EXPECT_NEAR(peak.level, -6.0, 0.5) << "the mean of both would have -12 dB";
+    for (const auto& [y, name] : {std::pair{100.0f, "left"}, {350.0f, "right"}}) {
+        m_view.PointTo(400.0f, y);
+        m_view.Do(kCopyReading);
+        EXPECT_TRUE(m_shell.copied.ends_with(name)) << m_shell.copied;
+    }
 }
 
 }  // namespace

@@ -1,6 +1,5 @@
 // The analyser in a plain window with Direct2D, fed from a WAV file (16 bits), as if it were played.
-//     windows-analyser.exe FILE.wav [PICTURE.bmp]    with a picture: writes the last one of the file, and
-//     ends
+//     windows-analyser.exe FILE.wav [PICTURE.bmp]    with a picture: writes the file's last one and ends
 // The right button opens the analyser's menu; the keys 1 to 4 choose the view.
 #include <algorithm>
 #include <cstdint>
@@ -27,25 +26,29 @@ using Microsoft::WRL::ComPtr;
 
 namespace {
 struct Wave {
-    int rate = 0, channels = 0;
+    int rate = 0, channels = 0, bits = 0;
     std::vector<float> samples;  // interleaved
 };
-// Without samples for what is no WAV file with 16 bits.
+// Chunk by chunk; without samples for what is no WAV file with 16 bits.
 Wave ReadWave(const char* path) {
     std::ifstream file(path, std::ios::binary);
     const std::string bytes((std::istreambuf_iterator<char>(file)), {});
-    const std::size_t format = bytes.find("fmt "), data = bytes.find("data");
-    if (bytes.compare(0, 4, "RIFF") != 0 || format > bytes.size() - 24 || data > bytes.size() - 8) return {};
     const auto number = [&](std::size_t at, auto value) {
         std::memcpy(&value, bytes.data() + at, sizeof value);
         return value;
     };
-    Wave wave{number(format + 12, std::int32_t{}), number(format + 10, std::uint16_t{}), {}};
-    for (std::size_t i = data + 8; i + 2 <= bytes.size(); i += 2)
-        wave.samples.push_back(static_cast<float>(number(i, std::int16_t{})) / 32768.0f);
-    return number(format + 22, std::uint16_t{}) == 16 && wave.rate > 0 && wave.channels > 0 ? wave : Wave{};
+    Wave wave;
+    for (std::size_t at = 12; bytes.starts_with("RIFF") && at + 8 <= bytes.size();) {
+        const std::size_t length = number(at + 4, std::uint32_t{}), from = at + 8;
+        const std::size_t end = from + std::min(length, bytes.size() - from);
+        if (bytes.compare(at, 4, "fmt ") == 0 && end - from >= 16)
+            wave = {number(from + 4, 0), number(from + 2, short{}), number(from + 14, short{}), {}};
+        for (std::size_t i = from; bytes.compare(at, 4, "data") == 0 && i + 2 <= end; i += 2)
+            wave.samples.push_back(static_cast<float>(number(i, std::int16_t{})) / 32768.0f);
+        at = end + length % 2;
+    }
+    return wave.bits == 16 && wave.rate > 0 && wave.channels > 0 ? wave : Wave{};
 }
-
 // The back-end belongs to the target.
 void Draw(kivspectrum& analyser, Corvo::DrawingD2D& drawing, ID2D1RenderTarget& target, float dpi) {
     const D2D1_SIZE_U size = target.GetPixelSize();
@@ -116,7 +119,9 @@ struct Window {
         Draw(analyser, *drawing, *target.Get(), static_cast<float>(Corvo::DpiOfWindow(window)));
         if (target->EndDraw() == static_cast<HRESULT>(D2DERR_RECREATE_TARGET)) target.Reset();
     }
-    void ShowMenu(HWND window, int x, int y) {
+    void ShowMenu(HWND window, LPARAM where) {
+        POINT place{GET_X_LPARAM(where), GET_Y_LPARAM(where)};
+        if (where == -1) ClientToScreen(window, &(place = {}));  // the keyboard's
         const HMENU menu = CreatePopupMenu();
         HMENU group = nullptr;
         const char* name = "";
@@ -128,8 +133,8 @@ struct Window {
             const UINT tick = analyser.popupmenu_checked(entry.command) ? MF_CHECKED : MF_UNCHECKED;
             AppendMenuA(group, MF_STRING | tick, static_cast<UINT_PTR>(entry.command), entry.text);
         }
-        analyser.popupmenu_process(
-            TrackPopupMenu(menu, TPM_RETURNCMD | TPM_RIGHTBUTTON, x, y, 0, window, nullptr));
+        constexpr UINT kHow = TPM_RETURNCMD | TPM_RIGHTBUTTON;
+        analyser.popupmenu_process(TrackPopupMenu(menu, kHow, place.x, place.y, 0, window, nullptr));
         DestroyMenu(menu);
     }
 };
@@ -143,19 +148,16 @@ LRESULT CALLBACK Handle(HWND window, UINT message, WPARAM first, LPARAM second) 
             self->Paint(window);
             return ValidateRect(window, nullptr), 0;
         case WM_MOUSEMOVE:
-            self->analyser.SetPointer(1.0f * GET_X_LPARAM(second), 1.0f * GET_Y_LPARAM(second));
-            return 0;
+            return self->analyser.SetPointer(1.0f * GET_X_LPARAM(second), 1.0f * GET_Y_LPARAM(second)), 0;
         case WM_CONTEXTMENU:
-            self->ShowMenu(window, GET_X_LPARAM(second), GET_Y_LPARAM(second));
-            return 0;
+            return self->ShowMenu(window, second), 0;
         case WM_CHAR:
             for (int i = 0; first >= '1' && first <= '4' && i < 3; ++i)
                 if (self->analyser.GetDisplayMode() != static_cast<int>(first - '1'))
                     self->analyser.ToggleDisplayMode();
             return 0;
         case WM_DESTROY:
-            PostQuitMessage(0);
-            return 0;
+            return PostQuitMessage(0), 0;
     }
     return DefWindowProcA(window, message, first, second);
 }
@@ -171,9 +173,9 @@ int main(int argc, char** argv) {
     self.analyser.set_parameters(self.wave.rate);
     self.analyser.SetOn(true);
     self.analyser.SetTunerOn(true);
-    self.analyser.popupmenu_process(1267);  // windows overlap, so that every refresh has a new spectrum
+    constexpr int kLargestOverlap = 1267;  // of windows, so that every refresh has a new spectrum
+    self.analyser.popupmenu_process(kLargestOverlap);
     self.analyser.ShowSonogram(true);
-
     WNDCLASSA kind{};
     kind.lpfnWndProc = Handle;
     kind.lpszClassName = "Analyser";
@@ -192,8 +194,6 @@ int main(int argc, char** argv) {
         return 0;
     }
     SetTimer(window, 1, 33, nullptr);
-    for (MSG message; GetMessageA(&message, nullptr, 0, 0) > 0;) {
+    for (MSG message; GetMessageA(&message, nullptr, 0, 0) > 0; DispatchMessageA(&message))
         TranslateMessage(&message);
-        DispatchMessageA(&message);
-    }
 }

@@ -46,17 +46,15 @@ void Processor::Process(const float* const* inputs, float* const* outputs, int c
     for (int from = 0; from < frames; from += kBlock) {
         const int count = std::min(kBlock, frames - from);
         const auto samples = static_cast<std::size_t>(count) * width;
-        float peak = 0.0f;
         for (std::size_t i = 0; i < samples; ++i) {
             const float sample = inputs[i % width][static_cast<std::size_t>(from) + i / width];
             block[i] = std::isfinite(sample) ? sample : 0.0f;
-            peak = std::max(peak, std::abs(block[i]));
         }
-        if (!bypassed) m_view.Feed(block.data(), count, channels);
+        const float peak = bypassed ? 0.0f : m_view.Feed(block.data(), count, channels);
         m_tone.AddTo(block.data(), count, channels, rate, !bypassed);
         for (std::size_t i = 0; i < samples; ++i)
             outputs[i % width][static_cast<std::size_t>(from) + i / width] = block[i];
-        const float now = peak > 1e-6f && !bypassed ? std::min(20.0f * std::log10(peak), kLoudest) : kSilence;
+        const float now = peak > 1e-6f ? std::min(20.0f * std::log10(peak), kLoudest) : kSilence;
         const float fallen = GetLevel() - kFallPerSecond * static_cast<float>(count / rate);
         m_level.store(std::max(now, std::max(fallen, kSilence)), std::memory_order_relaxed);
     }

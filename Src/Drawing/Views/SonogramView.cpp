@@ -13,6 +13,7 @@
 #include "Drawing/Views/ViewAccess.h"
 #include "Drawing/Views/Views.h"
 #include "Spectrum/Drawer/SpectrumDrawer.h"
+#include "Spectrum/Sonogram/PitchTrace.h"
 #include "Spectrum/Sonogram/Sonogram.h"
 
 namespace Corvo {
@@ -183,15 +184,14 @@ void DrawPitchTrace(Sonogram& sonogram, DrawTarget& target, const RectF& rectang
     if (!IsDrawable(rectangle) || bitmap.IsEmpty()) return;
     const CoordinatesAndFrequencies& map = sonogram.GetFrequencyMap();
     std::vector<PointF>& trace = ViewAccess::Trace(sonogram);
-    constexpr float kLargestStep = 1.09f;  // one and a half semitones from column to column is another note
-    constexpr float kLongestGap = 0.1f;    // seconds that a note may go unheard without a gap in its line
+    constexpr float kLargestStep = PitchTrace::kLargestStep;
     const float perRow = rectangle.height / static_cast<float>(bitmap.height);
     const float perColumn = rectangle.width / static_cast<float>(bitmap.width);
     const float width = Look::kTraceWidth * target.Scale();
     trace.reserve(static_cast<std::size_t>(bitmap.width));
     target.PushClip(rectangle);
     const int longestGap =
-        static_cast<int>(kLongestGap * static_cast<float>(Sonogram::GetColumnsPerSecond()));
+        PitchTrace::kLongestGap * Sonogram::GetColumnsPerSecond() / PitchTrace::kRefreshesPerSecond;
     for (int column = 0; column < bitmap.width;) {
         trace.clear();
         float before = 0.0f;

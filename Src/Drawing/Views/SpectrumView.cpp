@@ -80,19 +80,21 @@ void DrawCurve(DrawTarget& target, const RectF& plot, const CoordinatesAndFreque
     target.Polyline(points.data(), count, {{Look::kCurve}, Look::kCurveWidth * target.Scale()});
 }
 
-// The pointer's frequency and level, with a hair-cross; without a pointer over the plot the curve's highest
-// peak, in its colour, where that does not hide much of it. A band's level is not its highest bin's.
+// The pointer's frequency and the curve's level there, with a hair-cross; without a pointer over the plot the
+// curve's highest peak, in its colour, where that does not hide much of it. A band's level is not its highest
+// bin's.
 void DrawSpectrumInfo(kivspectrum& analyser, DrawTarget& target, const RectF& plot,
                       const CoordinatesAndFrequencies& map) {
     const PointF pointer = ViewAccess::Pointer(analyser);
     if (Contains(plot, pointer)) {
         const Stroke hair{{Look::kPointer, 110}, std::max(std::round(target.Scale()), 1.0f)};
+        const AnalyserReading pointed = ViewAccess::PointedAt(analyser);
+        const float level = map.LevelToY(pointed.level);
         target.Line({pointer.x, plot.y}, {pointer.x, Bottom(plot)}, hair);
-        target.Line({plot.x, pointer.y}, {Right(plot), pointer.y}, hair);
-        const ShortText text =
-            DescribeSpectrum(map.XToFrequency(pointer.x), map.YToLevel(pointer.y), map.GetLevelScale());
-        const ShortText difference = DescribeDifference(ViewAccess::Marker(analyser),
-                                                        ViewAccess::PointedAt(analyser), map.GetLevelScale());
+        target.Line({plot.x, level}, {Right(plot), level}, hair);
+        const ShortText text = DescribeSpectrum(pointed.frequency, pointed.level, map.GetLevelScale());
+        const ShortText difference =
+            DescribeDifference(ViewAccess::Marker(analyser), pointed, map.GetLevelScale());
         return DrawPointerBox(target, plot, pointer, text.View(), difference.View());
     }
     const SpectrumDrawer& drawer = *analyser.GetSpectrumDrawer();

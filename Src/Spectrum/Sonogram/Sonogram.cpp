@@ -20,7 +20,7 @@
 namespace Corvo {
 namespace {
 
-constexpr int kRefreshesPerSecond = 30;
+constexpr int kRefreshesPerSecond = PitchTrace::kRefreshesPerSecond;
 constexpr int kColumnsPerSecond[] = {5, 10, 15, 30, 60, 90, 150, 300, 450};
 constexpr int kFastest = static_cast<int>(std::size(kColumnsPerSecond)) - 1;
 constexpr int kUsualRate = 44100;
@@ -57,6 +57,44 @@ int Pixels(float length) {
 int PartAt(float position, float start, float length, int count) {
     const float part = (position - start) / length * static_cast<float>(count);
     return part >= 0.0f && part < static_cast<float>(count) ? static_cast<int>(part) : -1;
+}
+
+// The columns from `from` on of a picture `width` columns wide that begins at `left`.
+struct PaintedTime {
+    std::int64_t left, ticks;
+    int from, width;
+
+    std::int64_t At(int column) const { return left + column * ticks; }
+    int ColumnAt(std::int64_t tick) const {
+        return static_cast<int>(std::clamp<std::int64_t>((tick - left) / ticks, from, width));
+    }
+    ColumnRange ColumnsAt(const SonogramStretch& past, int column) const {
+        return past.Within(At(column), At(column + 1));
+    }
+};
+
+// Calls visit(stretch, its first column in the picture, the one behind its last), the newest first.
+template <typename Visit>
+void ForShown(const SonogramHistory& history, const PaintedTime& time, Visit visit) {
+    const std::int64_t end = time.At(time.width);
+    const auto& stretches = history.Stretches();
+    for (auto past = stretches.rbegin(); past != stretches.rend() && past->End() > time.At(time.from); ++past)
+        if (past->begin < end)
+            visit(*past, time.ColumnAt(past->begin),
+                  time.ColumnAt(std::min(past->End(), end) + time.ticks - 1));
+}
+
+void PlacePitches(const SonogramHistory& history, PaintedTime time, std::vector<float>& pitches) {
+    std::ranges::fill(pitches, kSilent);
+    time.from = 0;
+    ForShown(history, time, [&](const SonogramStretch& past, int begin, int end) {
+        for (int x = begin; x < end; ++x) {
+            const ColumnRange columns = time.ColumnsAt(past, x);
+            for (int column = columns.first; column < columns.end; ++column)
+                if (const float pitch = past.pitches[static_cast<std::size_t>(column)]; pitch > 0.0f)
+                    pitches[static_cast<std::size_t>(x)] = pitch;
+        }
+    });
 }
 
 }  // namespace
@@ -155,10 +193,12 @@ void Sonogram::CheckPixelBufferSize(const RectF& rectangle, int rows) {
     m_pictureStale = false;
 }
 
-// Where the picture is to end, and how much of it was heard.
+// Where the picture is to end, and how much of it was heard. As the oldest columns go, what looks back moves
+// along: no less of it is heard then than before.
 void Sonogram::PlaceRightEdge(int width) {
     const std::int64_t now = m_history->Now(), ticks = kTicksPerSecond / m_columnsPerSecond;
-    const std::int64_t earliest = std::min(m_history->Oldest() + width * ticks, now);
+    const int heard = m_heardColumns >= m_bitmap.width ? width : std::max(m_heardColumns - 1, 1);
+    const std::int64_t earliest = std::min(m_history->Oldest() + heard * ticks, now);
     if (m_looksBack && m_rightEdge < earliest) {
         m_rightEdge = earliest;
         m_pictureStale = true;
@@ -169,24 +209,20 @@ void Sonogram::PlaceRightEdge(int width) {
         std::clamp<std::int64_t>((m_rightEdge - m_history->Oldest() + ticks - 1) / ticks, 0, width));
 }
 
-// The columns from `from` on. Of several rows or columns that become one the loudest stays, and silence stays
-// silence: a wider range must not bring out a floor that was never measured.
+// The columns from `from` on, and all pitches: what is heard now may tell of columns before. Of several rows
+// or columns that become one the loudest stays, and silence stays silence: a wider range must not bring out a
+// floor that was never measured.
 void Sonogram::Paint(DrawingBitmap& picture, std::vector<float>& pitches, int from) const {
     const int width = picture.width;
     for (int y = 0; y < picture.height; ++y) std::fill_n(picture.Row(y) + from, width - from, m_pixels[0]);
-    std::fill(pitches.begin() + from, pitches.end(), kSilent);
     const SonogramAxis axis{picture.height, m_samplingRate, m_frequencies};
     const std::int64_t ticks = kTicksPerSecond / m_columnsPerSecond;
-    const std::int64_t left = m_rightEdge - (width - from) * ticks;
-    const auto columnAt = [&](std::int64_t tick) {
-        return static_cast<int>(std::clamp<std::int64_t>((tick - left) / ticks + from, from, width));
-    };
+    const PaintedTime time{m_rightEdge - width * ticks, ticks, from, width};
+    PlacePitches(*m_history, time, pitches);
     std::vector<RowRange> rows;
     const SonogramAxis* rowsOf = nullptr;
-    const auto& stretches = m_history->Stretches();
-    for (auto past = stretches.rbegin(); past != stretches.rend() && past->End() > left; ++past) {
-        if (past->begin >= m_rightEdge) continue;
-        const SonogramScale& scale = past->scale;
+    ForShown(*m_history, time, [&](const SonogramStretch& past, int begin, int end) {
+        const SonogramScale& scale = past.scale;
         const bool sameRows = scale.axis == axis;
         if (!sameRows && (!rowsOf || scale.axis != *rowsOf)) rows = RowsWithin(scale.axis, axis);
         rowsOf = sameRows ? rowsOf : &scale.axis;
@@ -195,16 +231,13 @@ void Sonogram::Paint(DrawingBitmap& picture, std::vector<float>& pitches, int fr
             const float share = static_cast<float>(level) / kFullLevel;
             shown[level] = m_pixels[static_cast<std::size_t>(LevelOf((share - 1.0f) * scale.range))];
         }
-        const int begin = columnAt(past->begin);
-        const int end = columnAt(std::min(past->End(), m_rightEdge) + ticks - 1);
         // In bands of rows: each row of the picture is a page of memory of its own.
         constexpr int kBand = 64;
         for (int top = 0; top < picture.height; top += kBand)
             for (int x = begin; x < end; ++x) {
-                const std::int64_t since = left + (x - from) * ticks;
-                const ColumnRange columns = past->Within(since, since + ticks);
+                const ColumnRange columns = time.ColumnsAt(past, x);
                 for (int column = columns.first; column < columns.end; ++column) {
-                    const std::uint8_t* const levels = past->Column(column);
+                    const std::uint8_t* const levels = past.Column(column);
                     std::uint32_t* pixel = picture.Row(top) + x;
                     for (int y = top; y < std::min(top + kBand, picture.height); ++y, pixel += width) {
                         const RowRange range =
@@ -212,32 +245,28 @@ void Sonogram::Paint(DrawingBitmap& picture, std::vector<float>& pitches, int fr
                         for (int row = range.first; row < range.end; ++row)
                             *pixel = std::max(*pixel, shown[levels[row]]);
                     }
-                    const float pitch = past->pitches[static_cast<std::size_t>(column)];
-                    if (pitch > 0.0f) pitches[static_cast<std::size_t>(x)] = pitch;
                 }
             }
-    }
+    });
 }
 
 bool Sonogram::Step(const SpectrumDrawer& drawer, bool newFrame, float pitchHz) {
     FollowColours();
     FollowScales(drawer);
+    const float pitch = m_history->Hear(pitchHz > 0.0f && std::isfinite(pitchHz) ? pitchHz : kSilent);
     m_frameWaits = m_frameWaits || newFrame;
     const int columns = ColumnsDue();
     if (columns == 0 || m_bitmap.IsEmpty()) return false;
     const bool stale = m_columnsStale || m_newest->Height() != m_bitmap.height;
     if (stale || m_frameWaits) ComputeColumn(drawer.GetPowerSmoothed(), m_bitmap.height);
-    Remember(m_frameWaits && !stale ? *m_previous : *m_newest, columns, pitchHz);
+    Remember(m_frameWaits && !stale ? *m_previous : *m_newest, columns, pitch);
     m_frameWaits = m_columnsStale = false;
     m_pictureStale = m_pictureStale || m_hidden;
     if (m_hidden) return true;
     PlaceRightEdge(m_bitmap.width);
     if (m_looksBack && !m_pictureStale) return true;
     const int first = m_pictureStale ? 0 : std::max(m_bitmap.width - columns, 0);
-    if (first > 0) {
-        ScrollPixels(columns);
-        std::shift_left(m_pitches.begin(), m_pitches.end(), columns);
-    }
+    if (first > 0) ScrollPixels(columns);
     Paint(m_bitmap, m_pitches, first);
     m_bitmap.Changed();
     m_pictureStale = false;
@@ -251,6 +280,7 @@ void Sonogram::LookBack(double seconds) {
     const auto columns =
         seconds > 0.0 ? std::llround(std::min(seconds, most) * static_cast<double>(m_columnsPerSecond)) : 0;
     m_rightEdge = now - columns * ticks;
+    m_heardColumns = 0;
     m_looksBack = true;
     m_pictureStale = true;
     PlaceRightEdge(m_bitmap.width);
@@ -287,13 +317,12 @@ void Sonogram::ScrollPixels(int columns) {
 
 // Counted from the last column, which is the newest spectrum exactly.
 void Sonogram::Remember(const SonogramColumn& from, int columns, float pitchHz) {
-    const float pitch = pitchHz > 0.0f && std::isfinite(pitchHz) ? pitchHz : kSilent;
     const SonogramScale scale{Axis(), m_range, kTicksPerSecond / m_columnsPerSecond};
     const float* const newest = m_newest->Levels();
     const float* const old = from.Levels();
     for (int back = columns - 1; back >= 0; --back) {
         const float share = static_cast<float>(back) / static_cast<float>(columns);
-        std::uint8_t* const levels = m_history->Add(scale, pitch);
+        std::uint8_t* const levels = m_history->Add(scale, pitchHz);
         for (int y = 0; y < scale.axis.height; ++y)
             levels[y] = static_cast<std::uint8_t>(LevelOf(newest[y] - (newest[y] - old[y]) * share));
     }

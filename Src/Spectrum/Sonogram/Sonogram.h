@@ -60,12 +60,14 @@ public:
     // and says whether there were any. They lead in equal steps of dB from the previous spectrum to the
     // drawer's smoothed one, or repeat the last when no frame came since the last columns. A change of the
     // drawer's sampling frequency, frequency scale or range, or of the speed, moves the past to where it
-    // belongs now. `pitchHz` is what the tuner hears, 0 for nothing. Once in a while it allocates.
+    // belongs now. `pitchHz` is what the tuner hears, 0 for nothing; the picture has it, from its beginning,
+    // once it has lasted four refreshes, or eight an octave beside the note before. Once in a while it
+    // allocates.
     bool Step(const SpectrumDrawer& drawer, bool newFrame, float pitchHz);
 
     // The picture ends so many seconds before now, in whole columns, and stays at that moment while new
-    // columns come: at most as long ago as the past fills it. 0, less, or what is not a number: it ends now,
-    // and goes on. The picture follows with the next check of its size.
+    // columns come: at most with the oldest column. 0, less, or what is not a number: it ends now, and goes
+    // on. The picture follows with the next check of its size.
     void LookBack(double seconds);
     // How long before now the picture ends; 0 while it goes on.
     double GetSecondsBack() const;
@@ -106,7 +108,7 @@ public:
     float GetRange() const;
     // The frequency axis: its x is the distance in rows from the lower edge of the picture.
     const CoordinatesAndFrequencies& GetFrequencyMap() const;
-    // What the tuner heard at a column, 0 the left one; 0 where it heard nothing, or outside.
+    // What the tuner heard at a column, 0 the left one; 0 where it heard nothing that lasted, or outside.
     float GetPitch(int column) const;
     // How many columns at the right were ever written.
     int GetHeardColumns() const;

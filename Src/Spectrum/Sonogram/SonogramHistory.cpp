@@ -1,6 +1,7 @@
 #include "Spectrum/Sonogram/SonogramHistory.h"
 
 #include <algorithm>
+#include <cmath>
 
 namespace Corvo {
 namespace {
@@ -19,6 +20,15 @@ ColumnRange SonogramStretch::Within(std::int64_t since, std::int64_t to) const {
     if (middle < 0 || middle >= twice * columns) return {0, 0};
     const auto at = static_cast<int>(middle / twice);
     return {at, at + 1};
+}
+
+float SonogramHistory::Hear(float hz) {
+    const auto since = m_trace.Hear(hz, m_now);
+    if (!since) return -hz;
+    for (auto past = m_stretches.rbegin(); past != m_stretches.rend() && past->End() > *since; ++past)
+        for (int i = past->Columns(); i-- > 0 && past->begin + std::int64_t{i} * past->scale.ticks >= *since;)
+            past->pitches[static_cast<std::size_t>(i)] = std::abs(past->pitches[static_cast<std::size_t>(i)]);
+    return hz;
 }
 
 std::uint8_t* SonogramHistory::Add(const SonogramScale& scale, float pitch) {
@@ -53,6 +63,7 @@ std::uint8_t* SonogramHistory::Add(const SonogramScale& scale, float pitch) {
 void SonogramHistory::Clear() {
     m_stretches.clear();
     m_levels = 0;
+    m_trace = {};
 }
 
 // Columns of the oldest stretch that need not be kept.

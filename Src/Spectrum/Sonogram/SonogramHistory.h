@@ -6,6 +6,7 @@
 #include <utility>
 #include <vector>
 
+#include "Spectrum/Sonogram/PitchTrace.h"
 #include "Spectrum/Sonogram/SonogramRows.h"
 
 namespace Corvo {
@@ -30,7 +31,7 @@ struct SonogramStretch {
     SonogramScale scale;
     std::int64_t begin;                // tick
     std::vector<std::uint8_t> levels;  // 0 silence .. 255 full scale, column by column, top row first
-    std::vector<float> pitches;        // one per column; 0 for none
+    std::vector<float> pitches;        // one per column; 0 for none, below 0 what did not last
 
     int Columns() const { return static_cast<int>(pitches.size()); }
     std::int64_t End() const { return begin + std::int64_t{Columns()} * scale.ticks; }
@@ -52,6 +53,9 @@ public:
 
     // How many levels are kept at least, once they came.
     void Keep(std::size_t levels) { m_kept = levels > kLeastLevels ? levels : kLeastLevels; }
+    // What the tuner hears at a refresh, 0 for nothing. Gives what columns that begin now are to keep of it:
+    // less than 0 until it has lasted; then it is there from its beginning.
+    float Hear(float hz);
     // The levels of a new column, to be filled by the caller. Allocates once for many of them; without memory
     // it throws std::bad_alloc; only the oldest columns may be gone.
     std::uint8_t* Add(const SonogramScale& scale, float pitch);
@@ -69,6 +73,7 @@ private:
     int Surplus() const;
 
     std::deque<SonogramStretch> m_stretches;
+    PitchTrace m_trace;
     std::size_t m_levels = 0, m_kept = kLeastLevels;
     std::int64_t m_now = 0;
 };

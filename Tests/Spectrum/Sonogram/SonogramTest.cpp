@@ -182,9 +182,10 @@ TEST_F(SonogramTest, LooksBackToThePixel) {
         Corvo::Sonogram::SetSpeedIndex(3);
         EXPECT_EQ(size(40, 30), past) << width << " " << height << " " << speed;
     }
+    m_sonogram.LookBack(190.0 / 30.0);
+    EXPECT_EQ(m_sonogram.GetHeardColumns(), 11) << "what was not heard may stand at the left";
     m_sonogram.LookBack(1e300);
-    EXPECT_NEAR(m_sonogram.GetSecondsBack(), 161.0 / 30.0, 1e-9);
-    EXPECT_EQ(m_sonogram.GetHeardColumns(), 40);
+    EXPECT_NEAR(m_sonogram.GetSecondsBack(), 200.0 / 30.0, 1e-9);
     m_sonogram.LookBack(kNan);
     size(1, 16384);
     for (int i = 0; i < 1100; ++i) m_sonogram.Step(m_drawer, false, 0.0f);
@@ -222,7 +223,7 @@ TEST_F(SonogramTest, RecoloursThePast) {
 
 // Another size or frequency scale: a tone and the pitch heard stay at their time and frequency.
 TEST_F(SonogramTest, KeepsThePastInPlace) {
-    Step(Spike(100), 440.0f);
+    for (int i = 0; i < 4; ++i) Step(Spike(100), 440.0f);
     Step(Values(kBins));
     const auto toneAt = [&](int back) {
         const auto& map = m_sonogram.GetFrequencyMap();
@@ -246,6 +247,32 @@ TEST_F(SonogramTest, KeepsThePastInPlace) {
     m_sonogram.Clear();
     EXPECT_EQ(toneAt(2), -kRange);
     EXPECT_EQ(m_sonogram.GetPitch(6), 0.0f);
+}
+
+// Catches a line for what sounded for a moment only, one without its beginning, and one that ends at a moment
+// of something else.
+TEST_F(SonogramTest, TracesPitchesThatLast) {
+    m_sonogram.CheckPixelBufferSize(Size(500, 4), 0);
+    for (const auto& [speed, times] : {std::pair{3, 1}, {6, 5}}) {
+        Corvo::Sonogram::SetSpeedIndex(speed);
+        m_sonogram.Clear();
+        int steps = 0, columns[3] = {};
+        for (const auto& [hz, refreshes] : {std::pair{100.0f, 3},
+                                            {0.0f, 9},
+                                            {200.0f, 6},
+                                            {700.0f, 2},
+                                            {200.0f, 1},
+                                            {400.0f, 7},
+                                            {0.0f, 5},
+                                            {100.0f, 5}})
+            for (int i = 0; i < refreshes; ++i, ++steps) m_sonogram.Step(m_drawer, true, hz);
+        for (int column = 0; column < 500; ++column)
+            if (const float hz = m_sonogram.GetPitch(column); hz > 0.0f)
+                ++columns[hz == 100.0f ? 0 : hz == 200.0f ? 1 : 2];
+        EXPECT_EQ(columns[0], 5 * times);
+        EXPECT_EQ(columns[1], 7 * times);
+        EXPECT_EQ(columns[2], 0) << "an octave needs more";
+    }
 }
 
 TEST_F(SonogramTest, StandsAnySize) {
