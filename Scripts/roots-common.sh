@@ -13,6 +13,19 @@ debian_archive() {
         awk '$1 == "Debian" && $2 == "main" && $3 !~ /-/ && !seen++ { print $4, $3 }'
 }
 
+# apt with lists and downloads of its own in the current folder, of packages (deb) or sources (deb-src): the
+# system's stay as they are.
+own_lists() {
+    local mirror release
+    read -r mirror release < <(debian_archive)
+    mkdir -p lists/partial cache/archives/partial
+    echo "$1 $mirror $release main" > sources.list
+}
+own_apt() {
+    apt-get -qq -o Dir::Etc::sourcelist="$PWD/sources.list" -o Dir::Etc::sourceparts=/dev/null \
+        -o Dir::State::Lists="$PWD/lists" -o Dir::Cache="$PWD/cache" -o APT::Sandbox::User=root "$@"
+}
+
 # debootstrap and the apt in a root take the machine's proxy from the environment.
 export_apt_proxy() {
     eval "$(apt-config shell http_proxy Acquire::http::Proxy)"

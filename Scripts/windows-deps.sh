@@ -20,16 +20,10 @@ part=$(mktemp -d "$cache/prefix.part.XXXXXX")
 trap 'rm -rf "$work" "$part"' EXIT
 cd "$work"
 
-# Debian's source packages, through lists of our own: the system's stay as they are.
 fetch_sources() {
-    local mirror release
-    read -r mirror release < <(debian_archive)
-    mkdir -p lists/partial cache/archives/partial
-    echo "deb-src $mirror $release main" > sources.list
-    local own=(-qq -o Dir::Etc::sourcelist="$PWD/sources.list" -o Dir::Etc::sourceparts=/dev/null
-        -o Dir::State::Lists="$PWD/lists" -o Dir::Cache="$PWD/cache" -o APT::Sandbox::User=root)
-    apt-get "${own[@]}" update
-    apt-get "${own[@]}" source "$@"
+    own_lists deb-src
+    own_apt update
+    own_apt source "$@"
 }
 
 # build SOURCE [CMAKE OPTION...]
