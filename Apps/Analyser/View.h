@@ -89,6 +89,8 @@ private:
     bool Act(int command);
     bool IsOffered(int command) const;
     std::vector<MenuGroup> MakeMenu() const;
+    void OpenMenu();  // at the pointer
+    bool TogglePlaying();
     void ToggleStrip();
     void ToggleFrozen();
     void TurnKeys();

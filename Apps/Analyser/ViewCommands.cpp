@@ -25,6 +25,14 @@ double Reference() { return 4.0 * Tuner::GetCalibrationBase(); }
 
 }  // namespace
 
+void View::OpenMenu() { m_menu.Open(MakeMenu(), {std::max(m_pointer.x, 0.0f), std::max(m_pointer.y, 0.0f)}); }
+
+bool View::TogglePlaying() {
+    if (!IsOffered(kPlay)) return false;
+    m_shell.TogglePlaying();
+    return true;
+}
+
 std::vector<MenuGroup> View::MakeMenu() const {
     std::vector<MenuGroup> groups;
     const auto group = [&](std::string_view name) -> std::vector<MenuEntry>& {
@@ -106,7 +114,7 @@ const View::Action View::kActions[] = {
      [](const View& v, int) { return v.m_keysShown; }},
     {kSavePicture, 3, [](View& v, int kind) { v.Save(static_cast<Kind>(kind)); return true; }, nullptr},
     {kCopyReading, 1, [](View& v, int) { v.CopyReading(); return true; }, nullptr},
-    {kPlay, 1, [](View& v, int) { v.m_shell.TogglePlaying(); return v.IsOffered(kPlay); }, nullptr},
+    {kPlay, 1, [](View& v, int) { return v.TogglePlaying(); }, nullptr},
     {kBack, 2, [](View& v, int on) { return v.Skip(on ? kSkipSeconds : -kSkipSeconds); }, nullptr},
     {kNow, 1, [](View& v, int) { return v.LookBack(0.0); }, nullptr},
     {kLowerReference, 1, [](View& v, int) { v.SetReference(std::ceil(Reference() - 1.001)); return true; }, nullptr},
@@ -121,7 +129,7 @@ const View::Action View::kActions[] = {
     {kNextColours, 1,
      [](View&, int) { Sonogram::SetColourScheme((Sonogram::GetColourScheme() + 1) % kColours); return true; },
      nullptr},
-    {kOpenMenu, 1, [](View& v, int) { v.m_menu.Open(v.MakeMenu(), {std::max(v.m_pointer.x, 0.0f), std::max(v.m_pointer.y, 0.0f)}); return true; }, nullptr},
+    {kOpenMenu, 1, [](View& v, int) { v.OpenMenu(); return true; }, nullptr},
     {kFirstSpeed, kSpeeds,
      [](View&, int speed) { Sonogram::SetSpeedIndex(speed); return true; },
      [](const View&, int speed) { return Sonogram::GetSpeedIndex() == speed; }},

@@ -163,6 +163,7 @@ void View::DrawAnalysers(Corvo::DrawingCairo::DrawTarget& target, const RectF& r
     const bool tuner = first.GetDisplayMode() == kivspectrum::display_tuner;
     const float half = m_apart && !tuner ? std::round(rectangle.height / 2.0f) : rectangle.height;
     first.DoDraw<Corvo::DrawingCairo>(target, {rectangle.x, rectangle.y, rectangle.width, half});
+    // Without a height where it is not seen, so that no reading comes from there.
     m_analysers[1].DoDraw<Corvo::DrawingCairo>(
         target, {rectangle.x, rectangle.y + half, rectangle.width, rectangle.height - half});
     if (m_apart) DrawChannelNames(target, rectangle, half);

@@ -402,7 +402,7 @@ typedef struct dsp_analyser dsp_analyser;
 /* For sound of `rate` Hz, above 0, else DSP_OUT_OF_RANGE; on, its tuner off. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_create(int32_t rate, dsp_analyser** analyser, dsp_error* error);
 /* Switches: the analyser (on at first), its tuner, its frozen state, and what a drawing of it shows beside
- * the spectrum. */
+ * the spectrum. Off or frozen, it hears nothing; its sonogram goes on behind a gap of that length. */
 enum { DSP_ANALYSER_ON = 0, DSP_TUNER_ON = 1, DSP_FROZEN = 2, DSP_SHOW_SONOGRAM = 3, DSP_SHOW_INFO = 4 };
 /* Turns one of them on, or off with 0, and says whether it is on. DSP_OUT_OF_RANGE for another switch. */
 DSP_C_API dsp_status DSP_CALL dsp_analyser_switch(dsp_analyser* analyser, int32_t which, int32_t on);

@@ -307,10 +307,9 @@ bool Analyser::AdvanceSonogram() {
            !m_sonogram->m_hidden;
 }
 
-void Analyser::LeaveGap(int refreshes) {
-    constexpr int kRefreshesPerSecond = 30;
-    m_sonogram->m_history->Skip(std::int64_t{refreshes} * SonogramHistory::kTicksPerSecond /
-                                kRefreshesPerSecond);
+void Analyser::LeaveGap(std::int64_t refreshes) {
+    m_sonogram->m_history->Skip(refreshes * SonogramHistory::kTicksPerSecond /
+                                PitchTrace::kRefreshesPerSecond);
     m_sonogram->ClearColumn();
     m_sonogram->m_pictureStale = true;
 }

@@ -126,7 +126,7 @@ private:
     void ComputePower();
     void ResizeFilter(int spectra);
     void UpdateDrawer(const SpectrumSettings& settings);
-    void LeaveGap(int refreshes);
+    void LeaveGap(std::int64_t refreshes);
 
     mutable CriticalSection m_lock;
     CorvoFFT m_fft;
@@ -134,7 +134,7 @@ private:
     SpectrumSettings m_built;         // lengths and window type that the buffers are for
     bool m_powerIsFrame = false;      // m_power was made since the buffers were built
     bool m_frameForSonogram = false;  // processed since its last step
-    int m_stoodFor = 0;               // refreshes that the sonogram missed
+    std::int64_t m_stoodFor = 0;      // refreshes that the sonogram missed
     std::atomic<bool> m_transforming{false};
 
     CaptureBuffer m_capture;

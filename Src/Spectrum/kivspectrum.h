@@ -177,7 +177,8 @@ public:
     // Whether a tuner that runs stands in a strip above the other views, as it does once it is switched on.
     void ShowTuner(bool show);
     bool IsShowTuner() const;
-    // A frozen analyser runs no analysis; a thawed one has fresh buffers.
+    // A frozen analyser runs no analysis; a thawed one has fresh buffers. Its sonogram goes on behind a gap
+    // as long as it stood, and so it does where the analyser was switched off.
     void SetFrozen(bool frozen);
     bool GetFrozen() const;
 

@@ -116,10 +116,11 @@ TEST_F(PlayedFile, WaitsForItsOutputAndGoesOnWithoutIt) {
     ASSERT_EQ(SDL_AudioInit("dummy"), 0) << SDL_GetError();
     Open(Write("heard.wav", SF_FORMAT_WAV, 0.6));
     ASSERT_TRUE(m_player.Hear());
-    while (m_player.Get().position < 0.45) {
+    for (int left = 2000; left > 0 && m_player.Get().position < 0.45; --left) {
         Step();
         std::this_thread::sleep_for(std::chrono::milliseconds(10));
     }
+    ASSERT_GE(m_player.Get().position, 0.45);
     EXPECT_NEAR(Beginning(), -m_half, 0.04);
     m_player.TogglePlaying();
     EXPECT_FALSE(m_player.Get().ended) << "though the output has got the end already";

@@ -17,7 +17,8 @@ struct TestShell : analyser::Shell {
     std::optional<analyser::Playback> GetPlayback() const override { return playback; }
     void Seek(double seconds) override { playback->position = seconds; }
     void TogglePlaying() override {
-        if (playback) playback->playing = !playback->playing;
+        ASSERT_TRUE(playback);
+        playback->playing = !playback->playing;
     }
     bool CanFillScreen() const override { return true; }
     void ToggleFullScreen() override { full = !full; }

@@ -129,7 +129,7 @@ TEST_F(LiveView, EveryEntryOfTheMenuIsTwoKeysAway) {
 // Catches settings that are written again although nothing of them was chosen.
 TEST_F(LiveView, CountsWhatIsKept) {
     const unsigned before = m_view.GetChoices();
-    for (const char32_t key : {U' ', U'+', U'0', U'h', U'h', U'r', U'm', U'm'}) Press(key);
+    for (const char32_t key : {U' ', U'+', U'0', U'h', U'h', U'k', U'r', U'm', U'm'}) Press(key);
     EXPECT_EQ(m_view.GetChoices(), before);
     for (const char32_t key : {U'2', U']', U'.'}) m_view.Do(FindCommand({key})->command);
     m_view.Do(kFirstInput + 1);

@@ -85,8 +85,12 @@ void Player::GoTo(std::int64_t frame) {
 
 // Behind the end of a file that was cut off its reader gets lost.
 void Player::Reopen() {
-    SF_INFO same{};
-    if (SNDFILE* const again = sf_open(m_path.c_str(), SFM_READ, &same)) m_file.reset(again);
+    SF_INFO now{};
+    SNDFILE* const again = sf_open(m_path.c_str(), SFM_READ, &now);
+    if (again && now.channels == m_info.channels && now.samplerate == m_info.samplerate)
+        m_file.reset(again);
+    else if (again)  // another file has its name by now
+        sf_close(again);
     m_start = 0;
 }
 

@@ -345,10 +345,12 @@ std::optional<Playback> Program::GetPlayback() const {
     return m_player.Get();
 }
 void Program::Seek(double seconds) {
+    if (!m_player.IsOpen()) return;
     m_player.Seek(seconds);
     m_view->StartOver();
 }
 void Program::TogglePlaying() {
+    if (!m_player.IsOpen()) return;
     if (m_player.Get().ended) Seek(0.0);
     m_player.TogglePlaying();
 }

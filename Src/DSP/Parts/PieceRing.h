@@ -50,7 +50,7 @@ public:
     }
 
     // For a line that is only written here and read elsewhere: where a piece goes before the ring advances.
-    // It stays there until it is the oldest.
+    // What was written there stays until it is the oldest.
     T* Space() {
         // A piece may begin before the first sample.
         if (!m_full && m_position == 0) std::fill_n(m_cells + m_length - kPiece, kPiece, T(0));

@@ -193,8 +193,8 @@ void Sonogram::CheckPixelBufferSize(const RectF& rectangle, int rows) {
     m_pictureStale = false;
 }
 
-// Where the picture is to end, and how much of it was heard. As the oldest columns go, what looks back moves
-// along: no less of it is heard then than before.
+// Where the picture is to end, and how much of it was heard. As the oldest columns go, a picture that looks
+// back and is full moves along; one that is not moves when its last column would go.
 void Sonogram::PlaceRightEdge(int width) {
     const std::int64_t now = m_history->Now(), ticks = kTicksPerSecond / m_columnsPerSecond;
     const int heard = m_heardColumns >= m_bitmap.width ? width : std::max(m_heardColumns - 1, 1);

@@ -62,7 +62,10 @@ public:
     // Time goes on from where it was.
     void Clear();
     // Nothing was heard for so many ticks.
-    void Skip(std::int64_t ticks) { m_now += ticks; }
+    void Skip(std::int64_t ticks) {
+        m_now += ticks;
+        m_trace = {};
+    }
 
     // The end of the newest column, and the beginning of the oldest, in ticks.
     std::int64_t Now() const { return m_now; }

@@ -217,7 +217,7 @@ bool Compressor::DoSetParam(int index, float normalised, bool fromAutomation) {
     }
     TakeUiSettings();
     auto& current = m_audio->current;
-    auto& settings = current.settings.value;
+    auto& settings = *current.settings;
     SetParamInternal(index, normalised, settings.parameters, &settings.map);
     if (PairOf(index) == kThreshold || PairOf(index) == kRatio) {
         m_hand_over->toUserInterface.Draft() = current;
@@ -229,7 +229,7 @@ bool Compressor::DoSetParam(int index, float normalised, bool fromAutomation) {
 void Compressor::SetParamFromUi(int index, float normalised, bool submit) {
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    SetParamInternal(index, normalised, m_ui->edited.settings.value.parameters, nullptr);
+    SetParamInternal(index, normalised, m_ui->edited.settings->parameters, nullptr);
     if (submit)
         SubmitUiSettingsChange();
     else
@@ -240,7 +240,7 @@ void Compressor::SetParamInternal(int index, float normalised, Parameters& param
     const ParameterRow* const row = RealRow(index);
     if (!row) return;
     const auto word = row->storage.store(row->storage, normalised);
-    CompMapStereo& curves = map ? *map : m_ui->edited.settings.value.map;
+    CompMapStereo& curves = map ? *map : m_ui->edited.settings->map;
     if (PairOf(index) == kThreshold) {
         curves.last_threshold = static_cast<std::int32_t>(word);
         AdjustThreshold(curves.last_threshold, SideOf(index), map);
@@ -257,21 +257,21 @@ void Compressor::SetParamInternal(int index, float normalised, Parameters& param
 
 // A threshold or ratio that the curve shows already leaves it alone: no control is as fine as a curve.
 void Compressor::AdjustThreshold(std::int32_t tenths, std::size_t channel, CompMapStereo* map) {
-    auto& m_comp_map = (map ? *map : m_ui->edited.settings.value.map).m_comp_map;
+    auto& m_comp_map = (map ? *map : m_ui->edited.settings->map).m_comp_map;
     if (channel >= m_comp_map.size()) return;
     tenths = std::clamp(tenths, kLowestThreshold, kHighestThreshold);
     if (auto& curve = m_comp_map[channel]; tenths != ThresholdOf(curve)) curve.MoveThreshold(tenths);
 }
 
 void Compressor::AdjustRatio(std::int32_t step, std::size_t channel, CompMapStereo* map) {
-    auto& m_comp_map = (map ? *map : m_ui->edited.settings.value.map).m_comp_map;
+    auto& m_comp_map = (map ? *map : m_ui->edited.settings->map).m_comp_map;
     if (channel >= m_comp_map.size()) return;
     step = std::clamp(step, 0, kRatioSteps);
     if (auto& curve = m_comp_map[channel]; step != RatioStepOf(curve)) curve.SetRatioStep(step);
 }
 
 void Compressor::ApplyRatioToMap(CompMapStereo* map) {
-    auto& curves = map ? *map : m_ui->edited.settings.value.map;
+    auto& curves = map ? *map : m_ui->edited.settings->map;
     const auto step = curves.last_ratio_step;
     if (step == kNotSet) return;
     for (std::size_t channel = 0; channel < 2; ++channel)
@@ -284,7 +284,7 @@ float Compressor::GetParam(int index) {
     if (!row) return 0.0f;
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    auto& [parameters, map] = m_ui->edited.settings.value;
+    auto& [parameters, map] = *m_ui->edited.settings;
     const auto& curve = map.m_comp_map[SideOf(index)];
     if (PairOf(index) == kThreshold) return row->storage.map.Normalised(ThresholdOf(curve));
     if (PairOf(index) == kRatio) return row->storage.map.Normalised(RatioStepOf(curve));
@@ -297,7 +297,7 @@ std::wstring Compressor::GetParameterFormattedText(int index, double value) {
     if (!RealRow(index) || !ofTheCurve) return CorvoEffect::GetParameterFormattedText(index, value);
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    const TransferCurve& curve = m_ui->edited.settings.value.map.m_comp_map[SideOf(index)];
+    const TransferCurve& curve = m_ui->edited.settings->map.m_comp_map[SideOf(index)];
     if (curve.Threshold() == curve.end())
         ReportAssertion("Src/DSP/Effects/Compressor", "itThreshold!=m_comp_map[canale].end()");
     return WithUnit(PairOf(index) == kRatio ? RatioText(curve)
@@ -330,9 +330,9 @@ void Compressor::SetPreset(int preset) {
 void Compressor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    const auto& parameters = m_ui->edited.settings.value.parameters;
+    const auto& parameters = m_ui->edited.settings->parameters;
     CompMapStereo map;  // without points beyond those in use
-    CopyInUse(m_ui->edited.settings.value.map, map);
+    CopyInUse(m_ui->edited.settings->map, map);
     ChunkWriter write(chunk, kChunkSize);
     write(m_chunk_tag) && VisitParameters(write, parameters) && VisitCurves(write, map) &&
         write(m_ui->preset) && write(map.last_threshold) && write(map.last_ratio_step);
@@ -350,8 +350,8 @@ bool Compressor::LoadChunk(const std::vector<std::uint8_t>& chunk, std::int32_t&
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
     auto& map = settings.map;
-    map.last_threshold = m_ui->edited.settings.value.map.last_threshold;
-    map.last_ratio_step = m_ui->edited.settings.value.map.last_ratio_step;
+    map.last_threshold = m_ui->edited.settings->map.last_threshold;
+    map.last_ratio_step = m_ui->edited.settings->map.last_ratio_step;
     read(m_ui->preset) && read(map.last_threshold) && read(map.last_ratio_step);
     m_ui->edited.settings = settings;
     SubmitUiSettingsChange();
@@ -380,7 +380,7 @@ void Compressor::ApplyEnvelopeToUi() {
     // Curves that derive from settings submitted before the last ones are out of date.
     const auto* changed = m_hand_over->toUserInterface.Take();
     if (changed && changed->submission == m_ui->edited.submission)
-        CopyInUse(changed->settings.value.map, m_ui->edited.settings.value.map);
+        CopyInUse(changed->settings->map, m_ui->edited.settings->map);
 }
 
 }  // namespace Corvo::DSP

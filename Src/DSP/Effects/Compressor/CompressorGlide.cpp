@@ -111,7 +111,7 @@ int GlideFrames(double factor, double smoothing) {
 
 bool GlidingMap::SetOutFor(const CompMapStereo& wanted, double smoothing) {
     const auto isTarget = [this](std::size_t channel, const TransferCurve& curve) {
-        return m_target[channel].curve == curve;
+        return *m_target[channel] == curve;
     };
     if (isTarget(0, wanted.m_comp_map[0]) && isTarget(1, wanted.m_comp_map[1])) return false;
     bool otherPoints = false;
@@ -120,13 +120,13 @@ bool GlidingMap::SetOutFor(const CompMapStereo& wanted, double smoothing) {
         const auto& target = wanted.m_comp_map[channel];
         m_heard.count = 0;
         for (int i = 0; i < curve.count; ++i) m_heard.Add(curve.X(i, factor), curve.Y(i, factor));
-        if (HaveSamePoints(m_target[channel].curve, target)) {
+        if (HaveSamePoints(*m_target[channel], target)) {
             MoveTargets(curve, target);
         } else {
             MergePoints(curve, target);
             otherPoints = true;
         }
-        CopyInUse(target, m_target[channel].curve);
+        CopyInUse(target, *m_target[channel]);
     }
     factor = 1.0;
     framesLeft = GlideFrames(factor, smoothing);
@@ -169,7 +169,7 @@ void GlidingMap::Arrive() {
     framesLeft = 0;
     for (std::size_t channel = 0; channel < 2; ++channel) {
         auto& curve = m_comp_map[channel];
-        const auto& target = m_target[channel].curve;
+        const auto& target = *m_target[channel];
         curve.count = target.count;
         std::size_t i = 0;
         for (const auto& point : target) {

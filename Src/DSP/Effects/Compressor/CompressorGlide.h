@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <new>
+#include <type_traits>
 
 #include "DSP/Effects/Compressor/CompressorCurve.h"
 
@@ -50,10 +52,20 @@ inline void CopyInUse(const CompMapStereo& from, CompMapStereo& to) {
     to.last_ratio_step = from.last_ratio_step;
 }
 
-// The curve that a glide leads to, of which only the points in use are ever written.
-union GlideTarget {
-    GlideTarget() { curve.count = 0; }
-    TransferCurve curve;
+// A plain record in memory that nobody touches before something is assigned to its members.
+template <typename Plain>
+class Untouched {
+    static_assert(std::is_trivially_copyable_v<Plain> && std::is_trivially_destructible_v<Plain>);
+
+public:
+    Untouched() {}
+    Plain& operator*() { return *std::launder(reinterpret_cast<Plain*>(m_memory.data())); }
+    const Plain& operator*() const { return *std::launder(reinterpret_cast<const Plain*>(m_memory.data())); }
+    Plain* operator->() { return &**this; }
+    const Plain* operator->() const { return &**this; }
+
+private:
+    alignas(Plain) std::array<std::byte, sizeof(Plain)> m_memory;
 };
 
 // A curve as it is heard at one moment.
@@ -80,6 +92,9 @@ int GlideFrames(double factor, double smoothing);
 // Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
 // targets exactly.
 struct GlidingMap {
+    GlidingMap() {
+        for (auto& target : m_target) target->count = 0;
+    }
     double factor = 0.0;
     int framesLeft = 0;
     std::array<GlidingCurve, 2> m_comp_map;
@@ -100,7 +115,7 @@ private:
     void MoveTargets(GlidingCurve& curve, const TransferCurve& target);
     void MergePoints(GlidingCurve& curve, const TransferCurve& target);
 
-    std::array<GlideTarget, 2> m_target;
+    std::array<Untouched<TransferCurve>, 2> m_target;
     HeardCurve m_heard;  // while a curve sets out
 };
 

@@ -35,7 +35,7 @@ void Compressor::InitState(bool forced) {
     TakeUiSettings();
     auto& audio = *m_audio;
     auto& c = audio.coefficients;
-    const auto& [parameters, curves] = audio.current.settings.value;
+    const auto& [parameters, curves] = *audio.current.settings;
     const double fs = audio.format.nSamplesPerSec;
 
     const auto coefficient = [](double frames) { return 1.0 - std::pow(10.0, -1.0 / (frames + 1.0)); };
@@ -115,7 +115,7 @@ template <typename Sample>
 void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
     auto& audio = *m_audio;
     const bool sideChain = audio.sideChainChannels > 0;
-    const bool monitor = (audio.current.settings.value.parameters.flags & kMonitorFlag) != 0;
+    const bool monitor = (audio.current.settings->parameters.flags & kMonitorFlag) != 0;
     // What the detector reads, per channel, and the distance between its samples.
     std::array<const Sample*, 2> detector{block, block + (channels - 1)};
     if (sideChain)
@@ -168,8 +168,8 @@ void Compressor::RunPiece(Sample* block, const Sample* const* detector, int dete
                           int channels) {
     auto& audio = *m_audio;
     // One channel under two detectors follows their mean.
-    const bool linked = channels == 2 ? audio.current.settings.value.parameters.stereoLink != 0
-                                      : audio.sideChainChannels == 2;
+    const bool linked =
+        channels == 2 ? audio.current.settings->parameters.stereoLink != 0 : audio.sideChainChannels == 2;
     const auto run = [&](auto& parameters, auto gains) {
         if (linked)
             return ProcessStereoLinked(block, detector[1], detector[0], frames, channels, detectorStride,

@@ -17,16 +17,15 @@ constexpr std::int32_t kMonitorFlag = 1;                              // of the 
 constexpr std::int32_t kSilentOutGain = -960, kHighestOutGain = 200;  // tenths of a decibel
 
 // Settings of which only the points in use are ever written: most of the memory is not touched.
-union SettingsInUse {
+struct SettingsInUse : Untouched<Compressor::Settings> {
     SettingsInUse() {}
+    SettingsInUse(const SettingsInUse&) = delete;
+    SettingsInUse& operator=(const SettingsInUse& from) { return *this = *from; }
     SettingsInUse& operator=(const Compressor::Settings& from) {
-        value.parameters = from.parameters;
-        CopyInUse(from.map, value.map);
+        (*this)->parameters = from.parameters;
+        CopyInUse(from.map, (*this)->map);
         return *this;
     }
-    SettingsInUse(const SettingsInUse&) = delete;
-    SettingsInUse& operator=(const SettingsInUse& from) { return *this = from.value; }
-    Compressor::Settings value;
 };
 
 // Settings as they travel between the threads, with the number of the user interface's submission that they
@@ -54,8 +53,8 @@ struct AudioSide {
     int gainFramesLeft = 0;  // of the out gain's glide
     std::array<double*, 2> sideChain{};
     int sideChainChannels = 0;  // 0: none was handed over for this block
+    NumberedSettings current;   // its parameters, that is
     GlidingMap map;
-    NumberedSettings current;
 
     void ClearUnlessFinite() {
         for (std::size_t channel = 0; channel < 2; ++channel) {

@@ -6,6 +6,7 @@
 #include "DSP/Effects/Denoiser/DenoiserEngine.h"
 #include "DSP/Effects/Denoiser/DenoiserProcessor.h"
 #include "Threads/LatestValue.h"
+#include "Threads/SharedRecord.h"
 
 namespace Corvo::DSP::DenoiserPrivate {
 
@@ -69,7 +70,7 @@ struct State {
             engine->Adopt(*loaded);
             m_taken = loaded->generation;
         }
-        if (clearRequested.exchange(false, std::memory_order_acquire)) {
+        if (TakeFlag(clearRequested)) {
             engine->Forget();
             HandOver();
         }

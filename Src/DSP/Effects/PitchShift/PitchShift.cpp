@@ -152,7 +152,7 @@ struct PitchShift::BackEnds {
         BackEnd made = Make(index);
         if (const int known = rate.load(); known > 0) {
             made.toldAhead = Setup::Of(record, channels.load(), known);
-            made.toldAhead->Tell(*made.adapter, true);
+            made.toldAhead->Tell(*made.adapter, false);
         }
         // The audio thread may have given the old one back without having named the new one yet.
         auto* cameBack = slots.Draft().adapter.get();
@@ -303,7 +303,7 @@ void PitchShift::CookPitchShift(const _transform_props& record, int channels) {
 void PitchShift::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags&) {
     CheckCookProperties(format, false);
     PitchAdapter* const adapter = m_back_ends->InUse();
-    if (m_back_ends->factorsPending.exchange(false, std::memory_order_relaxed) && adapter)
+    if (TakeFlag(m_back_ends->factorsPending) && adapter)
         SendFactors(*adapter, Snapshot(m_record).pitch, m_back_ends->channels.load());
     const int channels = m_back_ends->channels.load(std::memory_order_relaxed);
     // A cook that failed leaves a back-end that knows other channels: skip the block.
