@@ -26,6 +26,7 @@ struct ExponentialProgress {
 };
 
 // The equaliser written the obvious way: channel by channel, band by band, sample by sample.
+template <typename Progress = Corvo::DSP::AudioParameterProgressAlternate>
 class ParEQ {
 public:
     explicit ParEQ(int channels) : m_channels(static_cast<std::size_t>(channels)) {
@@ -90,8 +91,7 @@ public:
     std::int32_t counter = 0;
 
 private:
-    using Coefficient =
-        Corvo::DSP::AudioParameterManaged<double, Corvo::DSP::AudioParameterProgressAlternate>;
+    using Coefficient = Corvo::DSP::AudioParameterManaged<double, Progress>;
     struct Band {
         bool active = false;
         Corvo::DSP::coeff<Coefficient> coefficients{};

@@ -49,7 +49,7 @@ void CompareWithPlain(int channels, int bands, std::uint64_t seed) {
     data.numBands = bands;
     for (auto& band : data.bands) band = RandomBand(random);
     ParEQ eq;
-    Plain::ParEQ plain(channels);
+    Plain::ParEQ<> plain(channels);
     eq.Cook(false, false, &data, rate, channels);
     plain.Cook(false, false, data, rate);
     for (int block = 0; block < 60; ++block) {
