@@ -1,6 +1,8 @@
 #include "DSP/Effects/Gain/GainEfx.h"
 
+#include <algorithm>
 #include <cmath>
+#include <limits>
 #include <numbers>
 
 #include "DSP/Effects/Gain/GainKernel.h"
@@ -195,13 +197,21 @@ void GainEfx::CheckCookProperties(const tWAVEFORMATEX* format, bool) {
 
 void GainEfx::UpdateCoefficients() {
     if (!TakeFlag(m_coef_dirty)) return;
-    const auto params = Snapshot(m_params);
+    constexpr float kLargest = std::numeric_limits<float>::max();
+    auto params = Snapshot(m_params);
+    // A chunk may hold anything, and is kept as it is.
+    for (std::size_t i = 0; i < kCount; ++i)
+        if (!std::isfinite(params[i])) params[i] = kRows[i].range.neutral;
     // Above 1 the width grows twice as fast, up to 4.
-    m_coef_side = params[kWidth] > 1.0f ? 2.0f * params[kWidth] : params[kWidth];
+    const float width = std::min(params[kWidth], kLargest / 2.0f);
+    m_coef_side = width > 1.0f ? 2.0f * width : width;
     m_coef_mid = std::max(2.0f - m_coef_side, 1.0f);
-    const auto gain = [&](Index flip) { return params[flip] != 0.0f ? -params[kGain] : params[kGain]; };
-    m_gain_left = static_cast<float>(gain(kFlipLeft) * PanLeft(params[kPan]));
-    m_gain_right = static_cast<float>(gain(kFlipRight) * PanRight(params[kPan]));
+    const auto gain = [&](Index flip, double pan) {
+        const double level = (params[flip] != 0.0f ? -params[kGain] : params[kGain]) * pan;
+        return static_cast<float>(std::clamp<double>(level, -kLargest, kLargest));
+    };
+    m_gain_left = gain(kFlipLeft, PanLeft(params[kPan]));
+    m_gain_right = gain(kFlipRight, PanRight(params[kPan]));
 }
 
 void GainEfx::ProcessInternal(double* buffer, int frames, const tWAVEFORMATEX* format, ProcessFlags& flags) {
