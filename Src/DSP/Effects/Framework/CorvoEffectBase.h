@@ -116,7 +116,7 @@ public:
     // Its length in bytes with the settings of now.
     virtual int GetSettingsChunkSize();
     // Takes a chunk as a whole, or leaves everything as it was when it is too short for any layout the effect
-    // had. Bytes after the layout are not read. What values mean is limited in use, except a NaN in Gain.
+    // had. Bytes after the layout are not read. What the values mean is limited where they are used.
     virtual void SetSettingsChunk(const std::vector<std::uint8_t>& chunk);
     // Clears delay lines, filters and detectors, and frees what they use; InitProcessing follows before the
     // next block. No block is being processed.
