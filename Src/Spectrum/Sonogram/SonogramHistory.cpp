@@ -1,7 +1,6 @@
 #include "Spectrum/Sonogram/SonogramHistory.h"
 
 #include <algorithm>
-#include <cmath>
 
 namespace Corvo {
 namespace {
@@ -26,8 +25,12 @@ float SonogramHistory::Hear(float hz) {
     const auto since = m_trace.Hear(hz, m_now);
     if (!since) return -hz;
     for (auto past = m_stretches.rbegin(); past != m_stretches.rend() && past->End() > *since; ++past)
-        for (int i = past->Columns(); i-- > 0 && past->begin + std::int64_t{i} * past->scale.ticks >= *since;)
-            past->pitches[static_cast<std::size_t>(i)] = std::abs(past->pitches[static_cast<std::size_t>(i)]);
+        for (int i = past->Columns();
+             i-- > 0 && past->begin + std::int64_t{i} * past->scale.ticks >= *since;) {
+            float& pitch = past->pitches[static_cast<std::size_t>(i)];
+            if (pitch > 0.0f) return hz;  // and so is what came before
+            pitch = -pitch;
+        }
     return hz;
 }
 
