@@ -23,6 +23,7 @@ struct Lanes {
     using Value = T;
     static constexpr std::size_t kWidth = 1;
     static T Load(const T* from) { return *from; }
+    static T LoadAligned(const T* from) { return *from; }
     static void Store(T value, T* to) { *to = value; }
     static T Reverse(T value) { return value; }
     static Complex<T> LoadPairs(const T* from) { return {from[0], from[1]}; }
@@ -45,6 +46,7 @@ struct Lanes<xsimd::batch<T, Arch>> {
     static constexpr std::size_t kWidth = V::size;
     static constexpr std::size_t kSide = 16 / sizeof(T);
     static V Load(const T* from) { return V::load_unaligned(from); }
+    static V LoadAligned(const T* from) { return V::load_aligned(from); }
     static void Store(V value, T* to) { value.store_unaligned(to); }
     static V Reverse(V value) { return Shuffle::Reverse(value); }
     static Complex<V> LoadPairs(const T* from) {

@@ -34,6 +34,10 @@ struct SplitSource {
     Complex<V> Load(std::size_t i) const {
         return {Lanes<V>::Load(re + i), Lanes<V>::Load(im + i)};
     }
+    template <typename V>
+    Complex<V> LoadAligned(std::size_t i) const {
+        return {Lanes<V>::LoadAligned(re + i), Lanes<V>::LoadAligned(im + i)};
+    }
 };
 
 template <typename T>
@@ -100,19 +104,55 @@ template <typename V>
     x[3] = difference02 - turned13;
 }
 
-template <typename V>
-[[gnu::always_inline]] inline void Butterfly(Complex<V> (&x)[8]) {
-    Complex<V> even[4] = {x[0], x[2], x[4], x[6]};
-    Complex<V> odd[4] = {x[1], x[3], x[5], x[7]};
-    Butterfly(even);
-    Butterfly(odd);
-    const V half(static_cast<typename Lanes<V>::Value>(0.70710678118654752440));
-    odd[1] = {(odd[1].re + odd[1].im) * half, (odd[1].im - odd[1].re) * half};
-    odd[2] = TimesMinusI(odd[2]);
-    odd[3] = {(odd[3].im - odd[3].re) * half, (odd[3].re + odd[3].im) * -half};
-    for (std::size_t k = 0; k < 4; ++k) {
-        x[k] = even[k] + odd[k];
-        x[k + 4] = even[k] - odd[k];
+// A transform of R points in halves, as a 32-bit program has registers for no more than one: the outputs with
+// even numbers come from the sums of points that lie half of them apart, the others from the differences.
+template <typename V, std::size_t R, typename Sum, typename Put>
+[[gnu::always_inline]] inline void EvenOutputs(Sum sum, Put put) {
+    Complex<V> x[R / 2];
+    for (std::size_t k = 0; k < R / 2; ++k) x[k] = sum(k);
+    Butterfly(x);
+    for (std::size_t k = 0; k < R / 2; ++k) put(x[k], 2 * k);
+}
+
+template <typename V, std::size_t R, typename Difference, typename Put>
+[[gnu::always_inline]] inline void OddOutputs(Difference difference, Put put) {
+    if constexpr (R == 2) {
+        put(difference(0), 1);
+    } else if constexpr (R == 4) {
+        Complex<V> x[2] = {difference(0), TimesMinusI(difference(1))};
+        Butterfly(x);
+        put(x[0], 1);
+        put(x[1], 3);
+    } else {
+        const V half(static_cast<typename Lanes<V>::Value>(0.70710678118654752440));
+        Complex<V> even[2] = {difference(0), TimesMinusI(difference(2))};
+        Complex<V> odd[2] = {difference(1), TimesMinusI(difference(3))};
+        Butterfly(even);
+        Butterfly(odd);
+        odd[0] = {(odd[0].re + odd[0].im) * half, (odd[0].im - odd[0].re) * half};
+        put(even[0] + odd[0], 1);
+        put(even[0] - odd[0], 5);
+        odd[1] = {(odd[1].im - odd[1].re) * half, (odd[1].re + odd[1].im) * -half};
+        put(even[1] + odd[1], 3);
+        put(even[1] - odd[1], 7);
+    }
+}
+
+// All points are read before the first output is put.
+template <typename V, std::size_t R, typename At, typename Put>
+[[gnu::always_inline]] inline void Outputs(At at, Put put) {
+    if constexpr (R == 1) {
+        put(at(0), 0);
+    } else {
+        Complex<V> differences[R / 2];
+        EvenOutputs<V, R>(
+            [&](std::size_t k) {
+                const Complex<V> a = at(k), b = at(k + R / 2);
+                differences[k] = a - b;
+                return a + b;
+            },
+            put);
+        OddOutputs<V, R>([&](std::size_t k) { return differences[k]; }, put);
     }
 }
 
@@ -124,18 +164,16 @@ void FirstStage(const Plan<T>& plan, Source source, SplitSink<T> to) {
     for (std::size_t first = 0; first < columns; first += group, twiddles += 2 * group * (R - 1))
         for (std::size_t i = 0; i < group; i += Lanes<V>::kWidth) {
             const std::size_t p = first + i;
-            Complex<V> x[R];
-            for (std::size_t k = 0; k < R; ++k) x[k] = source.template Load<V>(p + columns * k);
-            Butterfly(x);
             V re[R], im[R];
-            re[0] = x[0].re;
-            im[0] = x[0].im;
-            for (std::size_t k = 1; k < R; ++k) {
-                const T* const w = twiddles + 2 * group * (k - 1) + i;
-                x[k] = x[k] * Complex<V>{Lanes<V>::Load(w), Lanes<V>::Load(w + group)};
-                re[k] = x[k].re;
-                im[k] = x[k].im;
-            }
+            const auto put = [&](Complex<V> x, std::size_t k) {
+                if (k > 0) {
+                    const T* const w = twiddles + 2 * group * (k - 1) + i;
+                    x = x * Complex<V>{Lanes<V>::LoadAligned(w), Lanes<V>::LoadAligned(w + group)};
+                }
+                re[k] = x.re;
+                im[k] = x.im;
+            };
+            Outputs<V, R>([&](std::size_t k) { return source.template Load<V>(p + columns * k); }, put);
             Lanes<V>::StoreTransposed(re, to.re + R * p);
             Lanes<V>::StoreTransposed(im, to.im + R * p);
         }
@@ -150,12 +188,15 @@ void MiddleStage(std::size_t points, std::size_t stride, const T* twiddles, Spli
                                  {V(twiddles[2]), V(twiddles[3])},
                                  {V(twiddles[4]), V(twiddles[5])}};
         for (std::size_t q = 0; q < stride; q += Lanes<V>::kWidth) {
-            Complex<V> x[4];
-            for (std::size_t k = 0; k < 4; ++k) x[k] = from.template Load<V>(start + q + quarter * k);
-            Butterfly(x);
-            to.template Store<V>(x[0], 4 * start + q);
-            for (std::size_t k = 1; k < 4; ++k)
-                to.template Store<V>(x[k] * w[k - 1], 4 * start + stride * k + q);
+            const auto at = [&](std::size_t k) {
+                return from.template LoadAligned<V>(start + q + quarter * k);
+            };
+            const auto put = [&](const Complex<V>& x, std::size_t k) {
+                to.template Store<V>(k > 0 ? x * w[k - 1] : x, 4 * start + stride * k + q);
+            };
+            // Reading the points once more costs less than keeping them.
+            EvenOutputs<V, 4>([&](std::size_t k) { return at(k) + at(k + 2); }, put);
+            OddOutputs<V, 4>([&](std::size_t k) { return at(k) - at(k + 2); }, put);
         }
     }
 }
@@ -163,12 +204,9 @@ void MiddleStage(std::size_t points, std::size_t stride, const T* twiddles, Spli
 template <typename V, std::size_t R, typename T, typename Sink>
 void LastStage(std::size_t points, SplitSource<T> from, Sink sink) {
     const std::size_t stride = points / R;
-    for (std::size_t q = 0; q < stride; q += Lanes<V>::kWidth) {
-        Complex<V> x[R];
-        for (std::size_t k = 0; k < R; ++k) x[k] = from.template Load<V>(q + stride * k);
-        Butterfly(x);
-        for (std::size_t k = 0; k < R; ++k) sink.template Store<V>(x[k], q + stride * k);
-    }
+    for (std::size_t q = 0; q < stride; q += Lanes<V>::kWidth)
+        Outputs<V, R>([&](std::size_t k) { return from.template LoadAligned<V>(q + stride * k); },
+                      [&](const Complex<V>& x, std::size_t k) { sink.template Store<V>(x, q + stride * k); });
 }
 
 // Every stage but the last. `source` may be the second buffer of `work`; returns the buffer that holds the
