@@ -12,9 +12,6 @@ using namespace TestSupport;
 
 // What every effect promises about its two threads.
 
-using EveryEffectThread = EveryEffect;
-INSTANTIATE_TEST_SUITE_P(All, EveryEffectThread, testing::ValuesIn(AllEffects()), EffectTestName);
-
 // Catches counters that see nothing, which would make the next test pass whatever an effect does.
 TEST(AudioThreadRules, SeesWhatIsForbidden) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
@@ -30,7 +27,7 @@ TEST(AudioThreadRules, SeesWhatIsForbidden) {
 }
 
 // Catches work on the audio thread that may stop it: edits, presets, automation and forced cooks included.
-TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
+TEST_P(EveryEffect, NeitherAllocatesNorLocksWhileProcessing) {
     if (!AudioThreadRules::CanCount()) GTEST_SKIP() << "no counters on this build";
     if (GetParam().engineAllocates) GTEST_SKIP() << GetParam().engineAllocates;
     const auto effect = Make();
@@ -66,7 +63,7 @@ TEST_P(EveryEffectThread, NeitherAllocatesNorLocksWhileProcessing) {
 
 // Catches races between edits, automation and processing (under the thread sanitizer), and a hand-over that
 // takes no more settings after many edits: the last ones must sound as they do in a new instance.
-TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
+TEST_P(EveryEffect, TakesEditsFromAnotherThreadWhileItRuns) {
     const auto effect = Make();
     const auto format = Format<float>();
     const MP_ENVELOPE_SEGMENT segments[] = {{0, 0, 0.4f, 0.4f, MP_CURVE_JUMP, 0},
@@ -98,8 +95,7 @@ TEST_P(EveryEffectThread, TakesEditsFromAnotherThreadWhileItRuns) {
     });
 
     const auto donor = Make(), fresh = Make();
-    Random random(17);
-    SetAllParams(*donor, random);
+    SetAllParams(*donor, Random(17));
     if (const int off = GetParam().loadsOff; off >= 0) donor->SetParam(off, 0.0f, false);
     const auto settings = Chunk(*donor);
     std::vector<float> heard[2];

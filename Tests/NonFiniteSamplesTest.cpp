@@ -116,30 +116,24 @@ int ExpectToForget(
 
 }  // namespace
 
-using EveryEffectForgets = EveryEffect;
-INSTANTIATE_TEST_SUITE_P(All, EveryEffectForgets, testing::ValuesIn(AllEffects()), EffectTestName);
-
-TEST_P(EveryEffectForgets, SamplesThatAreNotFinite) {
+TEST_P(EveryEffect, ForgetsSamplesThatAreNotFinite) {
     for (const std::uint64_t seed : {0u, 1u, 2u})
         for (const bool planar : {false, true}) {
             if (planar && !Make()->SupportsNoninterleaved()) continue;
-            const auto make = [=]<typename Sample>(Sample) {
-                return [=] {
-                    auto effect = Make();
-                    Random random(seed);
-                    if (seed > 0 && !GetParam().mayGrow) SetAllParams(*effect, random);
-                    return std::make_unique<EffectSubject<Sample>>(std::move(effect), planar);
-                };
-            };
             const auto name = "settings " + std::to_string(seed) + (planar ? ", planar" : "");
-            ExpectToCountAsZero<float>(name + " floats", make(0.0f));
-            ExpectToCountAsZero<double>(name + " doubles", make(0.0));
+            ForBothSamples([&]<typename Sample>(Sample) {
+                ExpectToCountAsZero<Sample>(name + (sizeof(Sample) == 4 ? " floats" : " doubles"), [&] {
+                    auto effect = Make();
+                    if (seed > 0 && !GetParam().mayGrow) SetAllParams(*effect, Random(seed));
+                    return std::make_unique<EffectSubject<Sample>>(std::move(effect), planar);
+                });
+            });
         }
 }
 
-TEST_P(EveryEffectForgets, Overflows) {
+TEST_P(EveryEffect, ForgetsOverflows) {
     int overflows = 0, grown = 0;
-    const auto check = [&]<typename Sample>(Sample) {
+    ForBothSamples([&]<typename Sample>(Sample) {
         for (const float setting : {0.0f, 0.9f, 1.0f}) {
             // As they are, or all up but for short delays.
             const auto edit = [=](Subject<Sample>& subject) {
@@ -155,15 +149,13 @@ TEST_P(EveryEffectForgets, Overflows) {
             overflows += run(kNearTheLimit);
             if (setting == 1.0f && GetParam().mayGrow) grown += run(kUntilItGrows);
         }
-    };
-    check(0.0f);
-    check(0.0);
+    });
     EXPECT_TRUE(overflows > 0 || GetParam().bounded) << "nothing was asked of it";
     EXPECT_TRUE(grown > 1 || !GetParam().mayGrow) << "nothing grew";
 }
 
 TEST(NonFiniteSamples, AreForgottenBesideTheEffectsAsOverflowsAre) {
-    const auto check = []<typename Sample>(Sample) {
+    ForBothSamples([]<typename Sample>(Sample) {
         ForSubjectsBesideTheEffects<Sample>([](const std::string& name, const MakeSubject<Sample>& make) {
             ExpectToCountAsZero<Sample>(name, make);
             ExpectToForget<Sample>(name, make, kNearTheLimit);
@@ -171,7 +163,5 @@ TEST(NonFiniteSamples, AreForgottenBesideTheEffectsAsOverflowsAre) {
         for (const bool monitored : {false, true})
             ExpectToCountAsZero<Sample>(
                 "side-chain", [=] { return std::make_unique<SideChainSubject<Sample>>(monitored); });
-    };
-    check(0.0f);
-    check(0.0);
+    });
 }

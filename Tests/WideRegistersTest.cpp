@@ -26,6 +26,7 @@
 namespace {
 
 using TestSupport::Channel;
+using TestSupport::ForBothSamples;
 using TestSupport::Noise;
 using Floats = std::vector<float>;
 
@@ -49,7 +50,7 @@ protected:
 
 TEST_F(WideRegisters, OfTheGainInBothLayouts) {
     using namespace Corvo::DSP::GainEfx;
-    const auto check = []<typename Sample>(Sample) {
+    ForBothSamples([]<typename Sample>(Sample) {
         const Coefficients<Sample> c{Sample(0.7), Sample(1.3), Sample(-0.4), Sample(2.5)};
         for (int frames = 0; frames < 40; ++frames) {
             auto baseline = Noise<Sample>(2 * static_cast<std::size_t>(frames)), wide = baseline;
@@ -61,16 +62,14 @@ TEST_F(WideRegisters, OfTheGainInBothLayouts) {
             ExpectSameBits(left, Channel(wide, 0));
             ExpectSameBits(right, Channel(wide, 1));
         }
-    };
-    check(0.0f);
-    check(0.0);
+    });
 }
 
 // Noise reaches every branch and both clamps; beside it what a damaged stream may hold.
 TEST_F(WideRegisters, OfTheTube) {
     using namespace Corvo::DSP;
     constexpr int kFunctions = TubeShaping::kNoFunction + 1;
-    const auto check = []<typename Sample>(Sample) {
+    ForBothSamples([]<typename Sample>(Sample) {
         using Limits = std::numeric_limits<Sample>;
         auto input = Noise<Sample>(1000, 1.2);
         for (const auto value : {Sample(0), -Sample(0), Limits::infinity(), Limits::quiet_NaN()})
@@ -84,9 +83,7 @@ TEST_F(WideRegisters, OfTheTube) {
                 Avx2TubeKernel<Sample>()(wide.data(), count, shaping);
                 ExpectSameBits(baseline, wide, testing::Message() << "functions " << both);
             }
-    };
-    check(0.0f);
-    check(0.0);
+    });
 }
 
 // Frame after frame; both directions of pitch, and silence of either sign.
@@ -178,10 +175,8 @@ TEST_F(WideRegisters, OfTheTransform) {
         ExpectSameBits(run(BestKernels<Sample>()), run(BaselineKernels<Sample>()));
     };
     for (const Kind kind : {Kind::Real, Kind::Complex})
-        for (int order = 0; order <= 13; ++order) {
-            check(0.0f, kind, order);
-            check(0.0, kind, order);
-        }
+        for (int order = 0; order <= 13; ++order)
+            ForBothSamples([&](auto sample) { check(sample, kind, order); });
 }
 
 // Everything that they make of the same input, one behind the other.

@@ -103,15 +103,17 @@ TEST_F(Reports, TunerTellsNotes) {
     EXPECT_GT(heard, 40);
 }
 
+// Catches an alpha that lets the viewer's ground through, and a --dpi without effect.
 TEST_F(Reports, PicturesHaveTheSizeAskedForAndTheSameBytesAgain) {
     SaveTone();
     for (const std::string command : {"spectrum", "sonogram", "tuner"}) {
         SCOPED_TRACE(command);
-        const std::string options = " -y --size 321x123 --dpi 144 --view filled,note-names";
-        for (const std::string file : {"a.png", "b.png"})
+        const std::string options = " -y --size 321x123 --view filled,note-names";
+        for (const std::string file : {"a.png --dpi 144", "b.png --dpi 144", "c.png"})
             EXPECT_EQ(Succeed(command + " in.wav " + file + options), "");
-        EXPECT_EQ(Bytes("a.png").substr(16, 8), std::string("\0\0\x01\x41\0\0\0\x7B", 8));
+        EXPECT_EQ(Bytes("a.png").substr(16, 10), std::string("\0\0\x01\x41\0\0\0\x7B\x08\x02", 10));
         EXPECT_EQ(Bytes("a.png"), Bytes("b.png"));
+        EXPECT_NE(Bytes("a.png"), Bytes("c.png"));
     }
     Succeed("spectrum in.wav o.png --csv o.csv --scale linear");
     EXPECT_TRUE(Bytes("o.csv").starts_with("frequency_hz,level_db\n"));

@@ -177,10 +177,7 @@ TEST(CInterface, TakesNullsHugeCountsAndForeignHandlesWithAStatus) {
 // The same bytes as the classes give, in blocks that are longer than the longest piece and cut by automation.
 TEST(CInterface, ProcessesLikeTheClasses) {
     constexpr int kFrames = 12000, kMost = 256, kPoint = 700, kRate = 48000;
-    tWAVEFORMATEX wave{};
-    wave.nChannels = 2;
-    wave.nSamplesPerSec = kRate;
-    wave.wBitsPerSample = 64;
+    const auto wave = TestSupport::Format<double>(2, kRate);
     const dsp_format format{sizeof(dsp_format), kRate, 2, DSP_F64, kMost};
     const auto noise = TestSupport::Noise<double>(2 * kFrames);
     for (const auto& kind : Corvo::DSP::EffectKinds()) {

@@ -6,15 +6,20 @@
 
 #include "Support/Sanitizers.h"
 
-#if WITH_ADDRESS_SANITIZER
 // The sanitizer's own functions stand behind malloc; operator new is replaced alone.
-#define REPLACES_NEW 1
+#define REPLACES_NEW WITH_ADDRESS_SANITIZER
+#if defined(__linux__) && !WITH_ADDRESS_SANITIZER && !WITH_THREAD_SANITIZER
+#define COUNTS_CALLS 1
+#else
+#define COUNTS_CALLS 0
+#endif
+
+#if REPLACES_NEW
 #include <sanitizer/lsan_interface.h>
 
 #include <cstdlib>
 #include <new>
-#elif defined(__linux__) && !WITH_THREAD_SANITIZER
-#define COUNTS_CALLS 1
+#elif COUNTS_CALLS
 #include <dlfcn.h>
 #include <pthread.h>
 #include <time.h>
@@ -117,21 +122,8 @@ FailingAllocations::~FailingAllocations() {
 
 bool FailingAllocations::Reached() const { return t_failed; }
 
-bool AudioThreadRules::CanCount() {
-#if COUNTS_CALLS
-    return true;
-#else
-    return false;
-#endif
-}
-
-bool FailingAllocations::CanFail() {
-#if REPLACES_NEW
-    return true;
-#else
-    return AudioThreadRules::CanCount();
-#endif
-}
+bool AudioThreadRules::CanCount() { return COUNTS_CALLS; }
+bool FailingAllocations::CanFail() { return REPLACES_NEW || COUNTS_CALLS; }
 
 }  // namespace TestSupport
 

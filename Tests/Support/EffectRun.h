@@ -19,24 +19,6 @@ struct Edit {
     float value;
 };
 
-// Guard zones around a block, to see writes outside it without a sanitizer.
-template <typename Sample>
-class FencedBlock {
-public:
-    explicit FencedBlock(std::size_t count) : m_samples(count + 2 * kFence, kMark) {}
-    Sample* Data() { return m_samples.data() + kFence; }
-    bool Intact() const {
-        const auto marked = [](Sample sample) { return sample == kMark; };
-        return std::all_of(m_samples.begin(), m_samples.begin() + kFence, marked) &&
-               std::all_of(m_samples.end() - kFence, m_samples.end(), marked);
-    }
-
-private:
-    static constexpr std::ptrdiff_t kFence = 64;
-    static constexpr Sample kMark = Sample(12345.625);
-    std::vector<Sample> m_samples;
-};
-
 template <typename Sample>
 void ProcessBlock(CorvoEffectBase& effect, Sample* block, int frames, const tWAVEFORMATEX& format) {
     Corvo::DSP::ProcessFlags flags;
@@ -123,7 +105,7 @@ inline std::vector<float> AllParams(CorvoEffectBase& effect) {
     return values;
 }
 
-inline void SetAllParams(CorvoEffectBase& effect, Random& random) {
+inline void SetAllParams(CorvoEffectBase& effect, auto&& random) {
     for (int i = 0; i < effect.GetParamCount(); ++i)
         effect.SetParam(i, static_cast<float>(random.Unit()), false);
 }

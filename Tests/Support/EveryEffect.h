@@ -15,8 +15,7 @@ protected:
 };
 
 inline std::string EffectTestName(const testing::TestParamInfo<TestSupport::EffectCase>& info) {
-    std::string name;
-    for (const char c : std::string(info.param.name))
-        if (std::isalnum(static_cast<unsigned char>(c))) name += c;
+    std::string name = info.param.name;
+    std::erase(name, ' ');
     return name;
 }

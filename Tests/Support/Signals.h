@@ -47,6 +47,12 @@ inline bool AllFinite(const auto& samples) {
     return std::ranges::all_of(samples, [](auto sample) { return std::isfinite(sample); });
 }
 
+// check(0.0f) and check(0.0).
+void ForBothSamples(const auto& check) {
+    check(0.0f);
+    check(0.0);
+}
+
 // `count` samples in -amplitude..amplitude.
 template <typename Sample>
 std::vector<Sample> Noise(std::size_t count, double amplitude = 0.25, std::uint64_t seed = 1) {

@@ -175,19 +175,27 @@ TEST_F(Readings, TraceStandsInThePitchsRow) {
     EXPECT_NEAR(heard.back().x, Right(m_plot), 2.0f);
 }
 
-// Catches gaps where a note went unheard for a tenth of a second, and lines across silence or to another
-// note, or a line for a note that did not last.
+// Catches gaps where a note went unheard for a tenth of a second, lines across silence or to another note, a
+// line for what sounded for a moment only, one without its beginning, and one that ends at a moment of
+// something else.
 TEST_F(Readings, TraceGoesOnOverAMoment) {
     HearIntoSonogram(440.0, 0.5);
-    for (const auto& [hz, columns] :
-         {std::pair{440.0f, 5}, {0.0f, 3}, {440.0f, 1}, {0.0f, 4}, {440.0f, 3}, {500.0f, 4}})
-        for (int i = 0; i < columns; ++i)
-            analyser.GetSonogram()->Step(*analyser.GetSpectrumDrawer(), true, hz);
     analyser.SetTunerOn(true);
-    std::vector<std::size_t> lengths;
-    for (const auto& [points, colour] : ShowSonogram().lines)
-        if (colour == Look::kTrace) lengths.push_back(points.size());
-    EXPECT_EQ(lengths, (std::vector<std::size_t>{6, 4})) << "the second 440 Hz did not last";
+    const std::pair<float, int> refreshes[] = {{440, 5}, {0, 3},   {440, 1}, {0, 4},   {440, 3},
+                                               {500, 4}, {100, 3}, {0, 9},   {200, 6}, {700, 2},
+                                               {200, 1}, {400, 7}, {0, 5},   {100, 5}};
+    for (const auto& [speed, columns] : {std::pair{3, 1u}, {6, 5u}}) {
+        Sonogram::SetSpeedIndex(speed);
+        analyser.GetSonogram()->Clear();
+        for (const auto& [hz, count] : refreshes)
+            for (int i = 0; i < count; ++i)
+                analyser.GetSonogram()->Step(*analyser.GetSpectrumDrawer(), true, hz);
+        std::vector<std::size_t> lengths;
+        for (const auto& [points, colour] : ShowSonogram().lines)
+            if (colour == Look::kTrace) lengths.push_back(points.size());
+        EXPECT_EQ(lengths, (std::vector<std::size_t>{6 * columns, 4 * columns, 7 * columns, 5 * columns}))
+            << "the second 440 Hz did not last, nor did the octave";
+    }
 }
 
 // Catches a dial, a needle or an arrow that is mirrored, and labels that are not the needle's.

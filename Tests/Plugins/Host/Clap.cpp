@@ -125,14 +125,14 @@ public:
     ClapInstance(const clap_plugin_t* plugin, const std::vector<Preset>& list)
         : m_plugin(plugin), m_list(list) {
         if (!plugin->init(plugin)) throw std::runtime_error("init fails");
-        m_params = Extension<clap_plugin_params_t>(CLAP_EXT_PARAMS);
-        m_state = Extension<clap_plugin_state_t>(CLAP_EXT_STATE);
-        m_latency = Extension<clap_plugin_latency_t>(CLAP_EXT_LATENCY);
+        m_params = ClapExtension<clap_plugin_params_t>(m_plugin, CLAP_EXT_PARAMS);
+        m_state = ClapExtension<clap_plugin_state_t>(m_plugin, CLAP_EXT_STATE);
+        m_latency = ClapExtension<clap_plugin_latency_t>(m_plugin, CLAP_EXT_LATENCY);
         if (!m_params || !m_state) throw std::runtime_error("has no parameters or no state");
         Expect(!plugin->get_extension(plugin, "no.such.extension"), "has an extension that does not exist");
         for (const Preset& preset : list) presets.push_back(preset.name);
         for (const char* const id : kClapPresetLoad) {
-            m_presetLoad = Extension<ClapPresetLoad>(id);
+            m_presetLoad = ClapExtension<ClapPresetLoad>(m_plugin, id);
             Expect((m_presetLoad != nullptr) == !list.empty(), "loads presets, or lists them, not both");
         }
         ReadParameters();
@@ -213,7 +213,22 @@ public:
 
     bool Process(const Block& block) override {
         m_events.Set(block.changes);
-        return Run(block) != CLAP_PROCESS_ERROR;
+        std::array<clap_audio_buffer_t, 4> in{}, out{};
+        using Buffer = clap_audio_buffer_t;
+        Divide(inputs, block.inputs, in, &Buffer::data32, &Buffer::channel_count);
+        Divide(outputs, block.outputs, out, &Buffer::data32, &Buffer::channel_count);
+        clap_event_transport_t transport{};
+        transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
+        transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
+        transport.tempo = tempo;
+        clap_process_t process{m_time, block.frames, &transport,   in.data(), out.data(), 0,
+                               0,      &m_events.in, &m_events.out};
+        process.audio_inputs_count = static_cast<std::uint32_t>(inputs.size());
+        process.audio_outputs_count = static_cast<std::uint32_t>(outputs.size());
+        m_time += block.frames;
+        clap_process_status status = CLAP_PROCESS_ERROR;
+        InRealTime([&] { status = m_plugin->process(m_plugin, &process); });
+        return status != CLAP_PROCESS_ERROR;
     }
     void Reset() override {
         InRealTime([&] { m_plugin->reset(m_plugin); });
@@ -243,11 +258,6 @@ public:
     }
 
 private:
-    template <typename Table>
-    const Table* Extension(const char* id) const {
-        return ClapExtension<Table>(m_plugin, id);
-    }
-
     void ReadParameters() {
         for (std::uint32_t i = 0; i < m_params->count(m_plugin); ++i) {
             clap_param_info_t info{};
@@ -261,7 +271,7 @@ private:
         }
     }
     void ReadPorts(bool input, std::vector<Port>& ports) {
-        const auto* audio = Extension<clap_plugin_audio_ports_t>(CLAP_EXT_AUDIO_PORTS);
+        const auto* audio = ClapExtension<clap_plugin_audio_ports_t>(m_plugin, CLAP_EXT_AUDIO_PORTS);
         if (!audio) throw std::runtime_error("has no audio ports");
         std::set<clap_id> ids;
         for (std::uint32_t i = 0; i < audio->count(m_plugin, input); ++i) {
@@ -279,24 +289,6 @@ private:
         Expect(!audio->get(m_plugin, count, input, &info), "describes one port more than it counts");
     }
 
-    clap_process_status Run(const Block& block) {
-        std::array<clap_audio_buffer_t, 4> in{}, out{};
-        using Buffer = clap_audio_buffer_t;
-        Divide(inputs, block.inputs, in, &Buffer::data32, &Buffer::channel_count);
-        Divide(outputs, block.outputs, out, &Buffer::data32, &Buffer::channel_count);
-        clap_event_transport_t transport{};
-        transport.header = {sizeof transport, 0, CLAP_CORE_EVENT_SPACE_ID, CLAP_EVENT_TRANSPORT, 0};
-        transport.flags = CLAP_TRANSPORT_HAS_TEMPO | CLAP_TRANSPORT_IS_PLAYING;
-        transport.tempo = tempo;
-        clap_process_t process{m_time, block.frames, &transport,   in.data(), out.data(), 0,
-                               0,      &m_events.in, &m_events.out};
-        process.audio_inputs_count = static_cast<std::uint32_t>(inputs.size());
-        process.audio_outputs_count = static_cast<std::uint32_t>(outputs.size());
-        m_time += block.frames;
-        clap_process_status status = CLAP_PROCESS_ERROR;
-        InRealTime([&] { status = m_plugin->process(m_plugin, &process); });
-        return status;
-    }
     void RunCallback() {
         if (std::exchange(g_callbackWanted, false)) m_plugin->on_main_thread(m_plugin);
     }

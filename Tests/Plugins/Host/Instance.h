@@ -88,8 +88,10 @@ public:
     std::vector<std::string> presets;  // names
     double tempo = 120;                // in beats per minute
 
-    virtual std::optional<std::string> Text(const Parameter&, double value) = 0;
-    virtual std::optional<double> Value(const Parameter&, const std::string& text) = 0;
+    // Where the format leaves the texts to the host, there are none to check.
+    virtual bool HasTexts() const { return true; }
+    virtual std::optional<std::string> Text(const Parameter&, double) { return {}; }
+    virtual std::optional<double> Value(const Parameter&, const std::string&) { return {}; }
     virtual double Get(const Parameter&) = 0;
     virtual bool TakePreset(std::size_t) { return false; }
 

@@ -65,12 +65,7 @@ public:
     }
     ~Lv2Instance() override { m_plugin.cleanup(m_handle); }
 
-    std::optional<std::string> Text(const Parameter& p, double value) override {
-        return IsOwn(p) ? std::optional(std::to_string(value)) : std::nullopt;
-    }
-    std::optional<double> Value(const Parameter& p, const std::string& text) override {
-        return IsOwn(p) ? std::optional(std::stod(text)) : std::nullopt;
-    }
+    bool HasTexts() const override { return false; }
     double Get(const Parameter& p) override {
         const auto value = static_cast<double>(m_values[p.id]);
         return p.bypass ? 1 - value : value;
@@ -132,7 +127,6 @@ public:
     void Reset() override { m_plugin.activate(m_handle); }
 
 private:
-    bool IsOwn(const Parameter& p) const { return p.id < m_values.size(); }
     void ReadPort(const std::string& text) {
         const auto index = static_cast<std::uint32_t>(std::stoi(After(text, "lv2:index")));
         const bool input = Has(text, "lv2:InputPort");
@@ -167,32 +161,27 @@ private:
         for (const Parameter& p : parameters) Connect(p.id, &m_values[p.id]);
     }
 
-    struct Kept {
-        Bytes bytes;
-        LV2_URID type;
-    };
     Bytes Settings() {
-        Kept kept{};
-        const auto store = [](void* to, LV2_URID, const void* data, std::size_t size, LV2_URID type,
+        Bytes settings;
+        const auto store = [](void* to, LV2_URID, const void* data, std::size_t size, LV2_URID,
                               std::uint32_t) {
             const auto* const bytes = static_cast<const char*>(data);
-            *static_cast<Kept*>(to) = {{bytes, bytes + size}, type};
+            static_cast<Bytes*>(to)->assign(bytes, bytes + size);
             return LV2_STATE_SUCCESS;
         };
-        Expect(m_state->save(m_handle, store, &kept, 0, nullptr) == LV2_STATE_SUCCESS, "cannot be saved");
-        return kept.bytes;
+        Expect(m_state->save(m_handle, store, &settings, 0, nullptr) == LV2_STATE_SUCCESS, "cannot be saved");
+        return settings;
     }
     bool Restore(Bytes settings) {
-        Kept kept{std::move(settings), Id(nullptr, LV2_ATOM__Chunk)};
         const auto retrieve = [](void* from, LV2_URID, std::size_t* size, LV2_URID* type,
                                  std::uint32_t* flags) -> const void* {
-            const auto& [bytes, itsType] = *static_cast<Kept*>(from);
+            const auto& bytes = *static_cast<Bytes*>(from);
             *size = bytes.size();
-            *type = itsType;
+            *type = Id(nullptr, LV2_ATOM__Chunk);
             *flags = LV2_STATE_IS_POD;
             return bytes.data();
         };
-        return m_state->restore(m_handle, retrieve, &kept, 0, nullptr) == LV2_STATE_SUCCESS;
+        return m_state->restore(m_handle, retrieve, &settings, 0, nullptr) == LV2_STATE_SUCCESS;
     }
 
     const LV2_Descriptor& m_plugin;

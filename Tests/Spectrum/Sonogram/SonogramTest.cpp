@@ -249,32 +249,6 @@ TEST_F(SonogramTest, KeepsThePastInPlace) {
     EXPECT_EQ(m_sonogram.GetPitch(6), 0.0f);
 }
 
-// Catches a line for what sounded for a moment only, one without its beginning, and one that ends at a moment
-// of something else.
-TEST_F(SonogramTest, TracesPitchesThatLast) {
-    m_sonogram.CheckPixelBufferSize(Size(500, 4), 0);
-    for (const auto& [speed, times] : {std::pair{3, 1}, {6, 5}}) {
-        Corvo::Sonogram::SetSpeedIndex(speed);
-        m_sonogram.Clear();
-        int steps = 0, columns[3] = {};
-        for (const auto& [hz, refreshes] : {std::pair{100.0f, 3},
-                                            {0.0f, 9},
-                                            {200.0f, 6},
-                                            {700.0f, 2},
-                                            {200.0f, 1},
-                                            {400.0f, 7},
-                                            {0.0f, 5},
-                                            {100.0f, 5}})
-            for (int i = 0; i < refreshes; ++i, ++steps) m_sonogram.Step(m_drawer, true, hz);
-        for (int column = 0; column < 500; ++column)
-            if (const float hz = m_sonogram.GetPitch(column); hz > 0.0f)
-                ++columns[hz == 100.0f ? 0 : hz == 200.0f ? 1 : 2];
-        EXPECT_EQ(columns[0], 5 * times);
-        EXPECT_EQ(columns[1], 7 * times);
-        EXPECT_EQ(columns[2], 0) << "an octave needs more";
-    }
-}
-
 TEST_F(SonogramTest, StandsAnySize) {
     Corvo::Sonogram::SetSpeedIndex(8);
     for (const auto& [wide, high, width] :

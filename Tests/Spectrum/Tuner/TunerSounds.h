@@ -61,11 +61,9 @@ inline std::vector<float> Partials(const std::vector<int>& numbers, double hz, i
 // With white noise this many decibels below the sound's own power.
 inline std::vector<float> WithNoise(const std::vector<float>& sound, double decibelsBelow,
                                     std::uint64_t seed) {
-    double power = 0.0;
-    for (const float value : sound) power += static_cast<double>(value) * value;
-    power /= static_cast<double>(sound.size());
+    const double level = TestSupport::Level(sound, 0.0, static_cast<double>(sound.size()), 1) - decibelsBelow;
     // Uniform noise of amplitude a has the power a^2 / 3.
-    const double amplitude = std::sqrt(3.0 * power * std::pow(10.0, -0.1 * decibelsBelow));
+    const double amplitude = std::sqrt(3.0 * std::pow(10.0, 0.1 * level));
     return Mixed(sound, TestSupport::Noise<float>(sound.size(), amplitude, seed));
 }
 

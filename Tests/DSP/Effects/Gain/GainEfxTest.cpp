@@ -46,16 +46,14 @@ TEST(GainEfx, ShapesStereoFrames) {
             gain.SetParam(kPan, c.pan, false);
             gain.SetParam(kFlipLeft, c.flipLeft ? 0.001f : 0.0f, false);  // anything but zero flips
             gain.SetParam(kFlipRight, c.flipRight ? 1.0f : 0.0f, false);
-            const auto check = [&]<typename Sample>(Sample) {
+            ForBothSamples([&]<typename Sample>(Sample) {
                 std::vector<Sample> input;
                 for (int i = 1; i <= frames; ++i) input.insert(input.end(), {Sample(i), Sample(0.5 * i)});
                 const auto output = Render(gain, input, Format<Sample>(), {frames});
                 for (std::size_t i = 0; i < output.size(); ++i)
                     EXPECT_NEAR(output[i], (i % 2 ? c.right : c.left) * static_cast<double>(i / 2 + 1), 2e-4)
                         << c.what << ", " << i << " of " << frames;
-            };
-            check(0.0f);
-            check(0.0);
+            });
         }
 }
 

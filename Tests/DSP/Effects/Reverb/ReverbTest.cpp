@@ -13,17 +13,12 @@ using namespace TestSupport;
 
 namespace {
 
-// The places of the settings' words; all but the last have a left and a right one.
-enum { kPreDelay, kMix = 2, kLength = 4, kWet = 6, kDry = 8, kDamping = 10 };
-enum { kReflections = 12, kRoom = 14, kFilterOff = 17 };
-using Words = std::array<std::int32_t, 18>;
+// The places of the settings' words in the chunk, behind one that is none; all but the last have a left and a
+// right one.
+enum { kPreDelay = 1, kMix = 3, kLength = 5, kWet = 7, kDry = 9, kDamping = 11 };
+enum { kReflections = 13, kRoom = 15, kFilterOff = 18 };
+using Words = std::array<std::int32_t, 19>;
 using Complex = std::complex<double>;
-
-void Load(Reverb& reverb, const Words& settings) {
-    std::vector<std::int32_t> words{0};
-    words.insert(words.end(), settings.begin(), settings.end());
-    LoadWords(reverb, words);
-}
 
 // What a frequency becomes on its way through one channel, from the meaning of the settings.
 Complex Response(const Words& s, std::size_t side, double rate, double hz) {
@@ -88,7 +83,7 @@ void ExpectTheResponse(const Words& settings, int channels, int rate, const char
     std::vector<Sample> samples(width * frames);
     std::fill_n(samples.begin(), width, Sample(1));
     Reverb reverb;
-    Load(reverb, settings);
+    LoadWords(reverb, {settings.begin(), settings.end()});
     samples = Render(reverb, samples, Format<Sample>(channels, rate), {512, 3, 61});
     for (std::size_t side = 0; side < width; ++side)
         for (const double hz : {1.0, 9.0, 107.3, 1234.5, 3600.0}) {
@@ -108,14 +103,14 @@ TEST(Reverb, HasTheResponseOfItsDesign) {
         const char* what;
         Words settings;
     } cases[] = {
-        // left and right pre-delay, mix, length, wet, dry, damping, reflections, room
-        {"a hall", {0, 2, 717, 600, 900, 800, -75, -60, -25, -35, 300, 900, 1786, 1584, 1049, 762}},
-        {"sides", {903, 316, 490, 158, 700, 600, 0, -225, -69, 0, 1200, 0, 254, 3055, 1123, 1900}},
-        {"smallest room", {0, 9, 0, 0, 600, 500, 0, 0, -450, 0, 0, 0, 469, 0, 1, 2, 0, 1}},
-        {"taps close together", {1, 0, 900, 400, 500, 600, 0, 0, -20, -450, 150, 0, 3, 90, 351, 351}},
-        {"reflections alone", {100, 0, 2000, 2000, 700, 500, 0, 10, -450, -450, 586, 0, 1000, 0, 1000, 1}},
+        // none, left and right pre-delay, mix, length, wet, dry, damping, reflections, room
+        {"a hall", {0, 0, 2, 717, 600, 900, 800, -75, -60, -25, -35, 300, 900, 1786, 1584, 1049, 762}},
+        {"sides", {0, 903, 316, 490, 158, 700, 600, 0, -225, -69, 0, 1200, 0, 254, 3055, 1123, 1900}},
+        {"smallest room", {0, 0, 9, 0, 0, 600, 500, 0, 0, -450, 0, 0, 0, 469, 0, 1, 2, 0, 1}},
+        {"taps close together", {0, 1, 0, 900, 400, 500, 600, 0, 0, -20, -450, 150, 0, 3, 90, 351, 351}},
+        {"reflections alone", {0, 100, 0, 2000, 2000, 700, 500, 0, 10, -450, -450, 586, 0, 1000, 0, 1000, 1}},
         {"silent at -450 alone",
-         {100, 0, 1000, 0, 700, 500, -450, -449, -449, -450, 586, 0, 1000, 0, 1000, 1}},
+         {0, 100, 0, 1000, 0, 700, 500, -450, -449, -449, -450, 586, 0, 1000, 0, 1000, 1}},
     };
     for (const auto& [what, settings] : cases) {
         ExpectTheResponse<double>(settings, 2, 8000, what);
@@ -131,7 +126,7 @@ TEST(Reverb, HasTheResponseOfItsDesign) {
 TEST(Reverb, LimitsWhatWouldNotDecay) {
     for (const std::int32_t length : {0, -1000, -1, 2147483647}) {
         Reverb reverb;
-        Load(reverb, {0, 0, 0, 0, length, length, 0, 0, -450, -450, -100000, 0, 0, 0, 1000, 1000});
+        LoadWords(reverb, {0, 0, 0, 0, 0, length, length, 0, 0, -450, -450, -100000, 0, 0, 0, 1000, 1000});
         std::vector<double> samples(20000);
         samples[0] = 1.0;
         for (const double sample : Render(reverb, samples, Format<double>(1, 8000), {512}))
