@@ -4,6 +4,7 @@
 #include <cmath>
 #include <limits>
 #include <mutex>
+#include <span>
 
 #include "DSP/Effects/Compressor/CompressorPresets.h"
 #include "DSP/Effects/Compressor/CompressorSides.h"
@@ -29,6 +30,7 @@ constexpr double kHighestRatioShown = 100.0;
 constexpr double kSameSlope = 0.01 / kRatioSteps;
 
 Pair PairOf(int index) { return static_cast<Pair>(index / 2); }
+bool IsOfTheCurve(int index) { return PairOf(index) == kThreshold || PairOf(index) == kRatio; }
 std::size_t SideOf(int index) { return static_cast<std::size_t>(index % 2); }
 
 std::int32_t Tenths(double db) { return static_cast<std::int32_t>(std::lround(db * 10.0)); }
@@ -153,12 +155,17 @@ bool VisitParameters(auto&& visit, auto& p) {
            visit(p.makeUp) && visit(p.flags) && visit(p.reserved);
 }
 
-bool VisitCurves(auto&& visit, auto& map) {
+// `skip` passes over so many words: what is beyond the points in use.
+bool VisitCurves(auto&& visit, auto& map, auto&& skip) {
     auto& curves = map.m_comp_map;
     if (!(visit(curves[0].count) && visit(curves[1].count) && visit(map.reserved))) return false;
-    for (auto& curve : curves)
-        for (auto& point : curve.points)
+    for (auto& curve : curves) {
+        const auto used = static_cast<std::size_t>(
+            std::clamp<std::int32_t>(curve.count, 0, static_cast<std::int32_t>(curve.points.size())));
+        for (auto& point : std::span(curve.points).first(used))
             if (!(visit(point.x) && visit(point.y) && visit(point.slope))) return false;
+        if (!skip(3 * (curve.points.size() - used))) return false;
+    }
     return true;
 }
 
@@ -174,8 +181,9 @@ Compressor::Compressor()
       m_audio(std::make_unique_for_overwrite<AudioSide>()),
       m_hand_over(std::make_unique_for_overwrite<HandOver>()) {
     m_ui->preset = kDefaultPreset;
-    m_ui->edited.submission = m_audio->current.submission = 0;
-    m_ui->edited.settings = m_audio->current.settings = GetPresetData(kDefaultPreset);
+    m_ui->edited.submission = 0;
+    m_ui->edited = GetPresetData(kDefaultPreset);
+    m_audio->current = m_ui->edited;
 }
 
 Compressor::~Compressor() = default;
@@ -217,19 +225,22 @@ bool Compressor::DoSetParam(int index, float normalised, bool fromAutomation) {
     }
     TakeUiSettings();
     auto& current = m_audio->current;
-    auto& settings = *current.settings;
-    SetParamInternal(index, normalised, settings.parameters, &settings.map);
-    if (PairOf(index) == kThreshold || PairOf(index) == kRatio) {
-        m_hand_over->toUserInterface.Draft() = current;
-        m_hand_over->toUserInterface.Publish();
+    if (!IsOfTheCurve(index)) {
+        SetParamInternal(index, normalised, current.parameters, nullptr);
+        return true;
     }
+    auto map = current.curves.Map();
+    SetParamInternal(index, normalised, current.parameters, &map);
+    current.curves = map;
+    *m_hand_over->toUserInterface.Draft() = current;
+    m_hand_over->toUserInterface.Publish();
     return true;
 }
 
 void Compressor::SetParamFromUi(int index, float normalised, bool submit) {
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    SetParamInternal(index, normalised, m_ui->edited.settings->parameters, nullptr);
+    SetParamInternal(index, normalised, m_ui->edited.parameters, nullptr);
     if (submit)
         SubmitUiSettingsChange();
     else
@@ -240,14 +251,17 @@ void Compressor::SetParamInternal(int index, float normalised, Parameters& param
     const ParameterRow* const row = RealRow(index);
     if (!row) return;
     const auto word = row->storage.store(row->storage, normalised);
-    CompMapStereo& curves = map ? *map : m_ui->edited.settings->map;
     if (PairOf(index) == kThreshold) {
-        curves.last_threshold = static_cast<std::int32_t>(word);
-        AdjustThreshold(curves.last_threshold, SideOf(index), map);
-        ApplyRatioToMap(map);
+        EditCurves(map, [&](CompMapStereo& curves) {
+            curves.last_threshold = static_cast<std::int32_t>(word);
+            AdjustThreshold(curves.last_threshold, SideOf(index), &curves);
+            ApplyRatioToMap(&curves);
+        });
     } else if (PairOf(index) == kRatio) {
-        curves.last_ratio_step = static_cast<std::int32_t>(word);
-        AdjustRatio(curves.last_ratio_step, SideOf(index), map);
+        EditCurves(map, [&](CompMapStereo& curves) {
+            curves.last_ratio_step = static_cast<std::int32_t>(word);
+            AdjustRatio(curves.last_ratio_step, SideOf(index), &curves);
+        });
     } else if (PairOf(index) == kMonitor) {
         parameters.flags = (parameters.flags & ~kMonitorFlag) | static_cast<std::int32_t>(word);
     } else {
@@ -255,28 +269,41 @@ void Compressor::SetParamInternal(int index, float normalised, Parameters& param
     }
 }
 
+template <typename Edit>
+void Compressor::EditCurves(CompMapStereo* map, Edit edit) {
+    if (map) return edit(*map);
+    auto own = m_ui->edited.curves.Map();
+    edit(own);
+    m_ui->edited.curves = own;
+}
+
 // A threshold or ratio that the curve shows already leaves it alone: no control is as fine as a curve.
 void Compressor::AdjustThreshold(std::int32_t tenths, std::size_t channel, CompMapStereo* map) {
-    auto& m_comp_map = (map ? *map : m_ui->edited.settings->map).m_comp_map;
-    if (channel >= m_comp_map.size()) return;
+    if (channel >= MaxNumChannels) return;
     tenths = std::clamp(tenths, kLowestThreshold, kHighestThreshold);
-    if (auto& curve = m_comp_map[channel]; tenths != ThresholdOf(curve)) curve.MoveThreshold(tenths);
+    EditCurves(map, [&](CompMapStereo& curves) {
+        auto& curve = curves.m_comp_map[channel];
+        if (tenths != ThresholdOf(curve)) curve.MoveThreshold(tenths);
+    });
 }
 
 void Compressor::AdjustRatio(std::int32_t step, std::size_t channel, CompMapStereo* map) {
-    auto& m_comp_map = (map ? *map : m_ui->edited.settings->map).m_comp_map;
-    if (channel >= m_comp_map.size()) return;
+    if (channel >= MaxNumChannels) return;
     step = std::clamp(step, 0, kRatioSteps);
-    if (auto& curve = m_comp_map[channel]; step != RatioStepOf(curve)) curve.SetRatioStep(step);
+    EditCurves(map, [&](CompMapStereo& curves) {
+        auto& curve = curves.m_comp_map[channel];
+        if (step != RatioStepOf(curve)) curve.SetRatioStep(step);
+    });
 }
 
 void Compressor::ApplyRatioToMap(CompMapStereo* map) {
-    auto& curves = map ? *map : m_ui->edited.settings->map;
-    const auto step = curves.last_ratio_step;
-    if (step == kNotSet) return;
-    for (std::size_t channel = 0; channel < 2; ++channel)
-        if (std::abs(curves.m_comp_map[channel].SlopeAboveThreshold() - SlopeOfStep(step)) < kSameSlope)
-            AdjustRatio(step, channel, map);
+    EditCurves(map, [&](CompMapStereo& curves) {
+        const auto step = curves.last_ratio_step;
+        if (step == kNotSet) return;
+        for (std::size_t channel = 0; channel < 2; ++channel)
+            if (std::abs(curves.m_comp_map[channel].SlopeAboveThreshold() - SlopeOfStep(step)) < kSameSlope)
+                AdjustRatio(step, channel, &curves);
+    });
 }
 
 float Compressor::GetParam(int index) {
@@ -284,20 +311,19 @@ float Compressor::GetParam(int index) {
     if (!row) return 0.0f;
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    auto& [parameters, map] = *m_ui->edited.settings;
-    const auto& curve = map.m_comp_map[SideOf(index)];
-    if (PairOf(index) == kThreshold) return row->storage.map.Normalised(ThresholdOf(curve));
-    if (PairOf(index) == kRatio) return row->storage.map.Normalised(RatioStepOf(curve));
-    const auto word = WordOf(parameters, *row);
+    if (IsOfTheCurve(index)) {
+        const auto curve = m_ui->edited.curves.Map().m_comp_map[SideOf(index)];
+        return row->storage.map.Normalised(PairOf(index) == kRatio ? RatioStepOf(curve) : ThresholdOf(curve));
+    }
+    const auto word = WordOf(m_ui->edited.parameters, *row);
     return row->storage.normalised(row->storage, PairOf(index) == kMonitor ? word & kMonitorFlag : word);
 }
 
 std::wstring Compressor::GetParameterFormattedText(int index, double value) {
-    const bool ofTheCurve = PairOf(index) == kThreshold || PairOf(index) == kRatio;
-    if (!RealRow(index) || !ofTheCurve) return CorvoEffect::GetParameterFormattedText(index, value);
+    if (!RealRow(index) || !IsOfTheCurve(index)) return CorvoEffect::GetParameterFormattedText(index, value);
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    const TransferCurve& curve = m_ui->edited.settings->map.m_comp_map[SideOf(index)];
+    const TransferCurve curve = m_ui->edited.curves.Map().m_comp_map[SideOf(index)];
     if (curve.Threshold() == curve.end())
         ReportAssertion("Src/DSP/Effects/Compressor", "itThreshold!=m_comp_map[canale].end()");
     return WithUnit(PairOf(index) == kRatio ? RatioText(curve)
@@ -323,18 +349,21 @@ void Compressor::SetPreset(int preset) {
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
     m_ui->preset = preset;
-    m_ui->edited.settings = GetPresetData(preset);  // forgets the last threshold and ratio
+    m_ui->edited = GetPresetData(preset);  // forgets the last threshold and ratio
     SubmitUiSettingsChange();
 }
 
 void Compressor::GetSettingsChunk(std::vector<std::uint8_t>& chunk) {
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
-    const auto& parameters = m_ui->edited.settings->parameters;
-    CompMapStereo map;  // without points beyond those in use
-    CopyInUse(m_ui->edited.settings->map, map);
+    const auto& parameters = m_ui->edited.parameters;
+    const auto map = m_ui->edited.curves.Map();
     ChunkWriter write(chunk, kChunkSize);
-    write(m_chunk_tag) && VisitParameters(write, parameters) && VisitCurves(write, map) &&
+    const auto clear = [&](std::size_t words) {
+        while (words > 0 && write(std::int32_t{0})) --words;
+        return words == 0;
+    };
+    write(m_chunk_tag) && VisitParameters(write, parameters) && VisitCurves(write, map, clear) &&
         write(m_ui->preset) && write(map.last_threshold) && write(map.last_ratio_step);
 }
 
@@ -343,17 +372,18 @@ bool Compressor::LoadChunk(const std::vector<std::uint8_t>& chunk, std::int32_t&
     ChunkReader read(chunk);
     TRANSFORM_PARAMETERS<Word> words;
     Settings settings;
-    if (!(read(tag) && VisitParameters(read, words) && VisitCurves(read, settings.map))) return false;
+    const auto skip = [&](std::size_t unused) { return read.Skip(4 * unused); };
+    if (!(read(tag) && VisitParameters(read, words) && VisitCurves(read, settings.map, skip))) return false;
     settings.parameters = Repaired(words);
     for (auto& curve : settings.map.m_comp_map) curve.Repair();
 
     const std::lock_guard lock(m_ui->section);
     ApplyEnvelopeToUi();
     auto& map = settings.map;
-    map.last_threshold = m_ui->edited.settings->map.last_threshold;
-    map.last_ratio_step = m_ui->edited.settings->map.last_ratio_step;
+    map.last_threshold = m_ui->edited.curves.last_threshold;
+    map.last_ratio_step = m_ui->edited.curves.last_ratio_step;
     read(m_ui->preset) && read(map.last_threshold) && read(map.last_ratio_step);
-    m_ui->edited.settings = settings;
+    m_ui->edited = settings;
     SubmitUiSettingsChange();
     return true;
 }
@@ -370,7 +400,7 @@ bool Compressor::FitsOldChunk(const std::vector<std::uint8_t>& chunk) {
 void Compressor::SubmitUiSettingsChange() {
     const std::lock_guard lock(m_ui->section);
     ++m_ui->edited.submission;
-    m_hand_over->toAudio.Draft() = m_ui->edited;
+    *m_hand_over->toAudio.Draft() = m_ui->edited;
     m_hand_over->toAudio.Publish();
     MarkStale();
 }
@@ -379,8 +409,8 @@ void Compressor::ApplyEnvelopeToUi() {
     const std::lock_guard lock(m_ui->section);
     // Curves that derive from settings submitted before the last ones are out of date.
     const auto* changed = m_hand_over->toUserInterface.Take();
-    if (changed && changed->submission == m_ui->edited.submission)
-        CopyInUse(changed->settings->map, m_ui->edited.settings->map);
+    if (changed && (*changed)->submission == m_ui->edited.submission)
+        m_ui->edited.curves = (*changed)->curves;
 }
 
 }  // namespace Corvo::DSP

@@ -148,6 +148,9 @@ protected:
                             GainAccessor gains);
 
 private:
+    // A null map stands for the user interface's own.
+    template <typename Edit>
+    void EditCurves(CompMapStereo* map, Edit edit);
     template <typename Word>
     bool LoadChunk(const std::vector<std::uint8_t>& chunk, std::int32_t& tag);
 

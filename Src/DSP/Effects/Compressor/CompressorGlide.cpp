@@ -42,6 +42,45 @@ double PlaceOf(double level, const TransferCurve& curve, std::size_t next) {
 
 }  // namespace
 
+KeptCurves& KeptCurves::operator=(const KeptCurves& from) {
+    count = from.count;
+    reserved = from.reserved;
+    last_threshold = from.last_threshold;
+    last_ratio_step = from.last_ratio_step;
+    std::copy_n(from.points.begin(), count[0] + count[1], points.begin());
+    return *this;
+}
+
+KeptCurves& KeptCurves::operator=(const CompMapStereo& from) {
+    auto to = points.begin();
+    for (std::size_t channel = 0; channel < 2; ++channel) {
+        count[channel] = from.m_comp_map[channel].count;
+        to = std::copy_n(from.m_comp_map[channel].points.begin(), count[channel], to);
+    }
+    reserved = from.reserved;
+    last_threshold = from.last_threshold;
+    last_ratio_step = from.last_ratio_step;
+    return *this;
+}
+
+CompMapStereo KeptCurves::Map() const {
+    CompMapStereo map;
+    for (std::size_t channel = 0; channel < 2; ++channel) {
+        map.m_comp_map[channel].count = count[channel];
+        std::ranges::copy(Curve(channel), map.m_comp_map[channel].points.begin());
+    }
+    map.reserved = reserved;
+    map.last_threshold = last_threshold;
+    map.last_ratio_step = last_ratio_step;
+    return map;
+}
+
+bool KeptCurves::HasPointsOf(const KeptCurves& other) const {
+    return count == other.count &&
+           std::equal(points.begin(), points.begin() + count[0] + count[1], other.points.begin(),
+                      [](const CurvePoint& a, const CurvePoint& b) { return a.x == b.x && a.y == b.y; });
+}
+
 int GlidingCurve::SegmentAt(double level, double factor) const {
     int i = 0;
     while (i < count - 2 && level > X(i + 1, factor)) ++i;
@@ -109,24 +148,22 @@ int GlideFrames(double factor, double smoothing) {
     return static_cast<int>(std::min(std::ceil(std::log(kEnd / factor) / std::log1p(-smoothing)), 1e9));
 }
 
-bool GlidingMap::SetOutFor(const CompMapStereo& wanted, double smoothing) {
-    const auto isTarget = [this](std::size_t channel, const TransferCurve& curve) {
-        return *m_target[channel] == curve;
-    };
-    if (isTarget(0, wanted.m_comp_map[0]) && isTarget(1, wanted.m_comp_map[1])) return false;
+bool GlidingMap::SetOutFor(const KeptCurves& wanted, double smoothing) {
+    if (m_target.HasPointsOf(wanted)) return false;
+    const CompMapStereo before = m_target.Map(), after = wanted.Map();
+    m_target = wanted;
     bool otherPoints = false;
     for (std::size_t channel = 0; channel < 2; ++channel) {
         auto& curve = m_comp_map[channel];
-        const auto& target = wanted.m_comp_map[channel];
+        const auto& target = after.m_comp_map[channel];
         m_heard.count = 0;
         for (int i = 0; i < curve.count; ++i) m_heard.Add(curve.X(i, factor), curve.Y(i, factor));
-        if (HaveSamePoints(*m_target[channel], target)) {
+        if (HaveSamePoints(before.m_comp_map[channel], target)) {
             MoveTargets(curve, target);
         } else {
             MergePoints(curve, target);
             otherPoints = true;
         }
-        CopyInUse(target, *m_target[channel]);
     }
     factor = 1.0;
     framesLeft = GlideFrames(factor, smoothing);
@@ -169,8 +206,8 @@ void GlidingMap::Arrive() {
     framesLeft = 0;
     for (std::size_t channel = 0; channel < 2; ++channel) {
         auto& curve = m_comp_map[channel];
-        const auto& target = *m_target[channel];
-        curve.count = target.count;
+        const auto target = m_target.Curve(channel);
+        curve.count = static_cast<int>(target.size());
         std::size_t i = 0;
         for (const auto& point : target) {
             curve.points[i].x = point.x;

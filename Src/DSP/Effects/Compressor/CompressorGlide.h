@@ -1,10 +1,9 @@
 #pragma once
 
-#include <algorithm>
 #include <array>
 #include <cstddef>
-#include <new>
-#include <type_traits>
+#include <cstdint>
+#include <span>
 
 #include "DSP/Effects/Compressor/CompressorCurve.h"
 
@@ -39,33 +38,24 @@ struct GlidingCurve {
     int SegmentAt(double level, double factor) const;
 };
 
-// Leaves what is beyond the points in use as it is.
-inline void CopyInUse(const TransferCurve& from, TransferCurve& to) {
-    std::copy(from.begin(), from.end(), to.points.begin());
-    to.count = from.count;
-}
-inline void CopyInUse(const CompMapStereo& from, CompMapStereo& to) {
-    for (std::size_t channel = 0; channel < 2; ++channel)
-        CopyInUse(from.m_comp_map[channel], to.m_comp_map[channel]);
-    to.reserved = from.reserved;
-    to.last_threshold = from.last_threshold;
-    to.last_ratio_step = from.last_ratio_step;
-}
+// Both channels' curves where they are kept: what there is to say about them, then the points in use, the
+// left curve's and the right one's. The memory behind them is never touched, so that few pages are.
+struct KeptCurves {
+    KeptCurves() {}  // nothing is written
+    KeptCurves(const KeptCurves&) = delete;
+    KeptCurves& operator=(const KeptCurves& from);
+    KeptCurves& operator=(const CompMapStereo& from);
+    CompMapStereo Map() const;
+    std::span<const CurvePoint> Curve(std::size_t channel) const {
+        const auto left = static_cast<std::size_t>(count[0]);
+        return std::span(points).subspan(channel * left, static_cast<std::size_t>(count[channel]));
+    }
+    // Whether all points in use are the same.
+    bool HasPointsOf(const KeptCurves& other) const;
 
-// A plain record in memory that nobody touches before something is assigned to its members.
-template <typename Plain>
-class Untouched {
-    static_assert(std::is_trivially_copyable_v<Plain> && std::is_trivially_destructible_v<Plain>);
-
-public:
-    Untouched() {}
-    Plain& operator*() { return *std::launder(reinterpret_cast<Plain*>(m_memory.data())); }
-    const Plain& operator*() const { return *std::launder(reinterpret_cast<const Plain*>(m_memory.data())); }
-    Plain* operator->() { return &**this; }
-    const Plain* operator->() const { return &**this; }
-
-private:
-    alignas(Plain) std::array<std::byte, sizeof(Plain)> m_memory;
+    std::array<std::int32_t, 2> count, reserved;
+    std::int32_t last_threshold, last_ratio_step;
+    std::array<CurvePoint, 2 * TransferCurve::kMaxPoints> points;
 };
 
 // A curve as it is heard at one moment.
@@ -92,9 +82,7 @@ int GlideFrames(double factor, double smoothing);
 // Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
 // targets exactly.
 struct GlidingMap {
-    GlidingMap() {
-        for (auto& target : m_target) target->count = 0;
-    }
+    GlidingMap() { m_target.count = {}; }
     double factor = 0.0;
     int framesLeft = 0;
     std::array<GlidingCurve, 2> m_comp_map;
@@ -103,9 +91,14 @@ struct GlidingMap {
     // already. What is heard stays the same until the factor shrinks. Where the last target's points have
     // only been moved, each goes its own way. To any other curve what is heard bends over, on the places of
     // both; then the result is true, and the segments must be found afresh.
-    bool SetOutFor(const CompMapStereo& target, double smoothing);
+    bool SetOutFor(const KeptCurves& target, double smoothing);
     // Stands on the targets at once, with their points only; the segments must be found afresh.
     void Arrive();
+    // The same for new ones.
+    void ArriveAt(const KeptCurves& target) {
+        m_target = target;
+        Arrive();
+    }
     // The segment that holds `level`.
     int SegmentAt(std::size_t channel, double level) const {
         return m_comp_map[channel].SegmentAt(level, factor);
@@ -115,7 +108,7 @@ private:
     void MoveTargets(GlidingCurve& curve, const TransferCurve& target);
     void MergePoints(GlidingCurve& curve, const TransferCurve& target);
 
-    std::array<Untouched<TransferCurve>, 2> m_target;
+    KeptCurves m_target;
     HeardCurve m_heard;  // while a curve sets out
 };
 

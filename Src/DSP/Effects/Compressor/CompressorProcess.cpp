@@ -21,8 +21,7 @@ constexpr double kMostMakeUp = 100.0;   // +40 dB
 
 void Compressor::TakeUiSettings() {
     const auto* newest = m_hand_over->toAudio.Take();
-    if (!newest) return;
-    m_audio->current = *newest;
+    if (newest) m_audio->current = **newest;
 }
 
 void Compressor::CheckCookProperties(const tWAVEFORMATEX* format, bool force) {
@@ -35,7 +34,8 @@ void Compressor::InitState(bool forced) {
     TakeUiSettings();
     auto& audio = *m_audio;
     auto& c = audio.coefficients;
-    const auto& [parameters, curves] = *audio.current.settings;
+    const auto& parameters = audio.current.parameters;
+    const auto& curves = audio.current.curves;
     const double fs = audio.format.nSamplesPerSec;
 
     const auto coefficient = [](double frames) { return 1.0 - std::pow(10.0, -1.0 / (frames + 1.0)); };
@@ -49,18 +49,18 @@ void Compressor::InitState(bool forced) {
         c.release[channel] = coefficient(parameters.release[channel] * fs * 0.0001);
         c.outGain[channel] = GainFromTenthsOfDb(parameters.outGain[channel], kSilentOutGain, kHighestOutGain);
         if (parameters.makeUp != 0) {
-            const double fullScale = curves.m_comp_map[channel].end()[-1].y;
+            const double fullScale = curves.Curve(channel).back().y;
             c.outGain[channel] *= fullScale * kMostMakeUp > 1.0 ? 1.0 / fullScale : kMostMakeUp;
         }
     }
 
-    if (audio.map.SetOutFor(curves, smoothing)) audio.FindSegments();
+    if (!forced && audio.map.SetOutFor(curves, smoothing)) audio.FindSegments();
     if (otherSmoothing) audio.map.framesLeft = GlideFrames(audio.map.factor, smoothing);
     if (c.outGain != outGainBefore || (otherSmoothing && audio.gainFramesLeft > 0))
         audio.gainFramesLeft = GlideFrames(1.0, smoothing);
 
     if (!forced) return;
-    audio.map.Arrive();
+    audio.map.ArriveAt(curves);
     audio.state = {};
     audio.state.appliedGain = c.outGain;
     audio.gainFramesLeft = 0;
@@ -115,7 +115,7 @@ template <typename Sample>
 void Compressor::ProcessBlock(Sample* block, int frames, int channels) {
     auto& audio = *m_audio;
     const bool sideChain = audio.sideChainChannels > 0;
-    const bool monitor = (audio.current.settings->parameters.flags & kMonitorFlag) != 0;
+    const bool monitor = (audio.current.parameters.flags & kMonitorFlag) != 0;
     // What the detector reads, per channel, and the distance between its samples.
     std::array<const Sample*, 2> detector{block, block + (channels - 1)};
     if (sideChain)
@@ -169,7 +169,7 @@ void Compressor::RunPiece(Sample* block, const Sample* const* detector, int dete
     auto& audio = *m_audio;
     // One channel under two detectors follows their mean.
     const bool linked =
-        channels == 2 ? audio.current.settings->parameters.stereoLink != 0 : audio.sideChainChannels == 2;
+        channels == 2 ? audio.current.parameters.stereoLink != 0 : audio.sideChainChannels == 2;
     const auto run = [&](auto& parameters, auto gains) {
         if (linked)
             return ProcessStereoLinked(block, detector[1], detector[0], frames, channels, detectorStride,

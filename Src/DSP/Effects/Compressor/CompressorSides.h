@@ -16,32 +16,29 @@ namespace Corvo::DSP::CompressorPrivate {
 constexpr std::int32_t kMonitorFlag = 1;                              // of the flags word
 constexpr std::int32_t kSilentOutGain = -960, kHighestOutGain = 200;  // tenths of a decibel
 
-// Settings of which only the points in use are ever written: most of the memory is not touched.
-struct SettingsInUse : Untouched<Compressor::Settings> {
-    SettingsInUse() {}
-    SettingsInUse(const SettingsInUse&) = delete;
-    SettingsInUse& operator=(const SettingsInUse& from) { return *this = *from; }
-    SettingsInUse& operator=(const Compressor::Settings& from) {
-        (*this)->parameters = from.parameters;
-        CopyInUse(from.map, (*this)->map);
+// Settings as they are kept and travel between the threads, with the number of the user interface's
+// submission that they are, or derive from.
+struct NumberedSettings {
+    NumberedSettings() {}  // nothing is written
+    NumberedSettings& operator=(const Compressor::Settings& from) {
+        parameters = from.parameters;
+        curves = from.map;
         return *this;
     }
-};
 
-// Settings as they travel between the threads, with the number of the user interface's submission that they
-// are, or derive from.
-struct NumberedSettings {
-    NumberedSettings() {}  // a new one is not written either
-    SettingsInUse settings;
     std::uint32_t submission;
+    union {  // whose members are not made with it
+        Compressor::Parameters parameters;
+    };
+    KeptCurves curves;
 };
 
 // What the user interface edits, guarded by the section.
 struct UserInterfaceSide {
     CriticalSection section;
-    NumberedSettings edited;
     std::int32_t preset = 0;
     EditChannelMode editChannelMode = EditChannelMode::Both;
+    NumberedSettings edited;
 };
 
 // What belongs to the audio thread alone. What every block needs stands first and together: in a session of
@@ -74,9 +71,19 @@ struct AudioSide {
 
 // The ways across, and the single values that both sides see.
 struct HandOver {
+    HandOver() {
+        for (std::size_t slot = 0; slot < records.size(); ++slot) {
+            auto& way = slot % 2 == 0 ? toAudio : toUserInterface;
+            way.Draft() = &records[slot];
+            way.Publish();
+            way.Take();
+        }
+    }
+
     std::atomic<bool> meterOn{false}, usingSideChain{false};
     std::array<std::atomic<float>, 2> displayGain{1.0f, 1.0f};
-    LatestValue<NumberedSettings> toAudio, toUserInterface;
+    LatestValue<NumberedSettings*> toAudio, toUserInterface;
+    std::array<NumberedSettings, 6> records;  // three each
 };
 
 }  // namespace Corvo::DSP::CompressorPrivate

@@ -26,6 +26,7 @@ public:
         m_taken = 0;
     }
     std::size_t Taken() const { return m_taken; }
+    bool Counting() const { return m_memory.empty(); }
 
     // `count` floats from a cache line on; null while counting.
     float* Take(std::size_t count) {

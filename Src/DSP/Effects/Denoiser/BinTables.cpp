@@ -29,6 +29,7 @@ void BinTables::Prepare(Arena& arena, int samples) {
     masking.Prepare(arena, static_cast<std::size_t>(samples) / 2 + 1);
     m_riskBands = arena.Take(kRiskBands * Values());
     gainPlace = arena.Take(Values());
+    riskPlace = arena.Take(Values());
 }
 
 void BinTables::SetRate(double rate, int blendLength) {
@@ -43,6 +44,12 @@ void BinTables::SetRate(double rate, int blendLength) {
                       last = static_cast<std::size_t>(length) / 2;
     const std::size_t bands = RiskBandCount(rate);
     riskRanges = {};
+    for (std::size_t bin = 0; bin < gridBins && length == blendLength; ++bin) {
+        const double hz = static_cast<double>(bin) * rate / length;
+        riskPlace[bin] = 0.0f;
+        for (std::size_t band = 0; band < bands; ++band)
+            riskPlace[bin] += static_cast<float>(RiskBandWeight(band, hz) * static_cast<double>(band));
+    }
     const auto ratio = static_cast<std::size_t>(std::max(length / blendLength, 1));
     std::array<float, 2 * kMostRatioOfLengths> hann;
     const auto shape = std::span(hann).first(2 * ratio - 1);

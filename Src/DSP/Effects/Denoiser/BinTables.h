@@ -29,6 +29,7 @@ struct BinTables {
     const float* RiskBand(std::size_t band) const { return m_riskBands + band * Values(); }
     std::array<std::pair<std::size_t, std::size_t>, kRiskBands> riskRanges{};
     float* gainPlace = nullptr;  // per bin the place between the gain bands
+    float* riskPlace = nullptr;  // per bin of the blend's own length the place between the risk bands
 
 private:
     std::size_t Values() const { return SpectrumValues(length); }

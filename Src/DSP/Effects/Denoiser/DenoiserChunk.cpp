@@ -1,4 +1,5 @@
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <new>
 
@@ -38,6 +39,25 @@ void WriteProfile(CMemoryFile& file, const NoiseProfile& profile) {
             KivFiles::WriteDoubles(file, {spectrum.begin(), spectrum.end()});
 }
 
+// Doubles behind a count: none, or the powers of so many bins. A piece at a time: there are thousands.
+std::vector<float> ReadPowers(CMemoryFile& file, std::size_t bins) {
+    const auto count = ReadValue<std::int32_t>(file);
+    Require(count == 0 || count == static_cast<std::int32_t>(bins));
+    std::vector<float> powers(count == 0 ? 0 : bins);
+    std::array<std::array<std::uint8_t, sizeof(double)>, 64> piece;
+    for (std::size_t done = 0; done < powers.size();) {
+        const std::size_t some = std::min(powers.size() - done, piece.size());
+        const auto bytes = static_cast<std::int64_t>(some * sizeof(double));
+        Require(file.Read(piece.data(), bytes) == bytes);
+        for (std::size_t i = 0; i < some; ++i, ++done) {
+            const auto power = LittleEndianValue<double>(piece[i]);
+            Require(power >= 0.0 && power <= kMostPower);
+            powers[done] = static_cast<float>(power);
+        }
+    }
+    return powers;
+}
+
 NoiseProfile ReadProfile(CMemoryFile& file) {
     NoiseProfile profile;
     profile.seconds = ReadValue<double>(file);
@@ -46,16 +66,8 @@ NoiseProfile ReadProfile(CMemoryFile& file) {
     Require(std::isfinite(profile.seconds) && profile.seconds >= 0.0 &&
             profile.channels <= profile.power.size() && (profile.rate > 0 || profile.channels == 0));
     for (std::size_t c = 0; c < profile.channels; ++c)
-        for (std::size_t which = 0; which < kLengths; ++which) {
-            std::vector<double> powers;
-            KivFiles::ReadDoubles(file, powers);
-            Require(powers.empty() || powers.size() == NoiseProfile::Bins(which, profile.rate));
-            Require(std::ranges::all_of(powers,
-                                        [](double power) { return power >= 0.0 && power <= kMostPower; }));
-            profile.power[c][which].assign(powers.size(), 0.0f);
-            std::ranges::transform(powers, profile.power[c][which].begin(),
-                                   [](double power) { return static_cast<float>(power); });
-        }
+        for (std::size_t which = 0; which < kLengths; ++which)
+            profile.power[c][which] = ReadPowers(file, NoiseProfile::Bins(which, profile.rate));
     bool any = false;
     for (std::size_t which = 0; which < kLengths; ++which) {
         const bool filled = !profile.power[0][which].empty();

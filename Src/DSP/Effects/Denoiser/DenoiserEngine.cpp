@@ -18,6 +18,10 @@ float AtPlace(const std::array<float, kGainBands>& bands, float place) {
     return bands[below] + (bands[below + 1] - bands[below]) * (place - static_cast<float>(below));
 }
 
+bool IsFlat(const std::array<float, kGainBands>& bands) {
+    return std::ranges::all_of(bands, [&](float band) { return band == bands[0]; });
+}
+
 bool SameCurves(const EngineSettings& a, const EngineSettings& b) {
     return a.reductionDb == b.reductionDb && a.sensitivityDb == b.sensitivityDb && a.gainDb == b.gainDb &&
            a.rangeDb == b.rangeDb;
@@ -40,7 +44,7 @@ std::size_t DenoiserEngine::LengthIndex(std::size_t size) const {
                                     kLearnedLengths.begin());
 }
 
-void DenoiserEngine::Prepare(double rate, std::size_t channels) {
+void DenoiserEngine::Prepare(double rate, std::size_t channels, int sizeSet) {
     const Scale scale = Scale::Of(rate);
     const bool afresh = !(scale == m_scale) || m_dry.empty();
     if (afresh) {
@@ -48,20 +52,16 @@ void DenoiserEngine::Prepare(double rate, std::size_t channels) {
         m_scale = scale;
         m_tick = std::min(kUnit, scale(kUnit));
         for (std::size_t i = 0; i < kLengths; ++i) m_windows[i].Prepare(scale(kLearnedLengths[i]));
-        ReserveFor(m_tableMemory, [&](Arena& arena) { LayoutTables(arena); });
-        for (std::size_t i = 0; i < kLengths; ++i) {
+        for (std::size_t i = 0; i < kLengths; ++i)
             if (i != kTrackIndex) m_conversions[i].Prepare(m_windows[kTrackIndex], m_windows[i]);
-            for (auto& channel : m_learned) channel[i].assign(m_windows[i].Values(), 1.0f);
-        }
-        m_order = UntouchedZeros<float>(m_windows[kTrackIndex].Values());
-        m_learner.Prepare(m_windows);
+        ReserveFor(m_tableMemory, [&](Arena& arena) { LayoutTables(arena); });
     }
     m_tables = TablesFor(rate);
     for (std::size_t i = 0; i < kLengths; ++i) {
         m_windows[i].Use(*m_tables, i);
         m_conversions[i].Use(m_tables->responses[i]);
     }
-    if (afresh) ReserveMemory(rate);
+    if (afresh) ReserveMemory(rate, sizeSet);
     m_learner.Cancel();
     m_learnedSeconds = 0.0;
     m_preparedRate = rate;
@@ -70,17 +70,30 @@ void DenoiserEngine::Prepare(double rate, std::size_t channels) {
 
 // What stays as it is through every change of settings.
 void DenoiserEngine::LayoutTables(Arena& arena) {
+    const int longest = m_windows.back().length;
+    float* const scratch = arena.Take(static_cast<std::size_t>(longest));
+    float* const work = arena.Take(Fft::SplitTransform::WorkFloats(longest));
+    std::size_t converting = 0;
+    for (const auto& conversion : m_conversions) converting = std::max(converting, conversion.WorkFloats());
+    float* const convertingWork = arena.Take(converting);
     for (std::size_t i = 0; i < kLengths; ++i) {
+        m_windows[i].WorkIn(scratch, work);
         m_windows[i].PrepareRates(arena);
+        m_conversions[i].WorkIn(convertingWork);
         for (auto* each : {&m_curves[i].offset, &m_curves[i].floor, &m_curves[i].logFloor})
             *each = arena.Take(m_windows[i].Values());
     }
+    for (auto& channel : m_learned)
+        for (std::size_t i = 0; i < kLengths; ++i)
+            channel[i] = {arena.Take(m_windows[i].Values()), m_windows[i].Values()};
     for (auto& passage : m_passage)
         passage = {arena.Take(m_windows.back().Values()), m_windows.back().Values()};
+    m_order = {arena.Take(m_windows[kTrackIndex].Values()), m_windows[kTrackIndex].Values()};
+    m_learner.Prepare(arena, m_windows);
 }
 
 // For any settings.
-void DenoiserEngine::ReserveMemory(double rate) {
+void DenoiserEngine::ReserveMemory(double rate, int sizeSet) {
     std::size_t most = 0;
     m_channels = kMostChannels;
     m_rate = rate;
@@ -90,7 +103,7 @@ void DenoiserEngine::ReserveMemory(double rate) {
         Layout(counting);
         most = std::max(most, counting.Taken());
     }
-    m_set = &kSizeSets[0];
+    m_set = &SizeSetAt(sizeSet);
     m_arena.Reserve(most);
     m_dry = UntouchedZeros<double>(kMostChannels * static_cast<std::size_t>(m_scale(kLongestRing)));
     m_dryTime = 0;
@@ -180,33 +193,37 @@ void DenoiserEngine::Apply(const EngineSettings& settings) {
         Start(!first);
     }
     if (settings.learn && !m_learner.Active() && AtPreparedRate()) m_learner.Begin(m_time, m_channels);
-    if (curves) CookCurves();
+    if (curves) m_curvesDue.fill(true);
     for (auto& reducer : std::span(m_reducers).first(static_cast<std::size_t>(m_set->count)))
         reducer.SetGains(settings.gains);
     for (auto& tracker : std::span(m_trackers).first(m_channels)) {
         tracker.SetMaterial(settings.music);
         tracker.SetWhitening(settings.gains.whitening > 0.0f);
     }
+    if (settings.gains.whitening > 0.0f) FindReference();
     ChooseMode(false);
     AimOutput(!first);
 }
 
-void DenoiserEngine::CookCurves() {
+void DenoiserEngine::CookCurves(std::size_t size) {
+    m_curvesDue[size] = false;
     const auto& kernels = BestSpectrumKernels();
-    for (std::size_t i = 0; i < static_cast<std::size_t>(m_set->count); ++i) {
-        auto& curves = m_curves[LengthIndex(i)];
-        const float* const places = m_windows[LengthIndex(i)].bins->gainPlace;
-        const std::size_t values = m_windows[LengthIndex(i)].Values();
-        for (std::size_t bin = 0; bin < values; ++bin) {
-            const float place = places[bin];
-            curves.floor[bin] = kPerDb * (m_settings.sensitivityDb + AtPlace(m_settings.gainDb, place));
-            curves.logFloor[bin] =
-                -0.5f * kPerDb * std::min(m_settings.reductionDb, AtPlace(m_settings.rangeDb, place));
-        }
-        kernels.exponential(curves.floor, curves.offset, values);
-        kernels.exponential(curves.logFloor, curves.floor, values);
-        m_reducers[i].SetCurves(curves.offset, curves.floor, curves.logFloor);
+    auto& curves = m_curves[LengthIndex(size)];
+    const float* const places = m_windows[LengthIndex(size)].bins->gainPlace;
+    const std::size_t values = m_windows[LengthIndex(size)].Values();
+    const bool flat = IsFlat(m_settings.gainDb) && IsFlat(m_settings.rangeDb);
+    const std::size_t worked = flat ? 16 : values;
+    for (std::size_t bin = 0; bin < worked; ++bin) {
+        const float place = places[bin];
+        curves.floor[bin] = kPerDb * (m_settings.sensitivityDb + AtPlace(m_settings.gainDb, place));
+        curves.logFloor[bin] =
+            -0.5f * kPerDb * std::min(m_settings.reductionDb, AtPlace(m_settings.rangeDb, place));
     }
+    kernels.exponential(curves.floor, curves.offset, worked);
+    kernels.exponential(curves.logFloor, curves.floor, worked);
+    for (float* const curve : {curves.offset, curves.floor, curves.logFloor})
+        std::fill(curve + worked, curve + values, curve[0]);
+    m_reducers[size].SetCurves(curves.offset, curves.floor, curves.logFloor);
 }
 
 void DenoiserEngine::AimOutput(bool glide) {
@@ -247,6 +264,7 @@ void DenoiserEngine::Tick() {
     for (std::size_t i = 0; i < static_cast<std::size_t>(m_set->count); ++i)
         m_reducerPaces[i].Tick(m_time, [&](std::int64_t frame, int step) {
             auto& job = m_jobs[i];
+            if (m_curvesDue[i]) CookCurves(i);
             if (step == 0) {
                 job.frame = frame;
                 job.input = input;
@@ -289,9 +307,10 @@ void DenoiserEngine::EndLearning() {
             else
                 ConvertSpectrum(std::span(shorter).first(m_windows[i - 1].Bins()), m_windows[i - 1].length,
                                 m_rate, passage.data(), bins, m_windows[i].length, m_rate);
-            auto& learned = m_learned[c][i];
+            const auto learned = m_learned[c][i];
             for (std::size_t bin = 0; bin < bins; ++bin)
                 learned[bin] = (1.0f - share) * learned[bin] + share * (passage[bin] + kLeastPower);
+            std::fill(learned.begin() + static_cast<std::ptrdiff_t>(bins), learned.end(), 1.0f);
         }
     for (std::size_t c = m_channels; c < kMostChannels; ++c)
         for (std::size_t i = 0; i < kLengths; ++i)
@@ -316,10 +335,12 @@ void DenoiserEngine::Adopt(const NoiseProfile& profile) {
             while (from < kLengths && spectra[from].empty()) ++from;
             whole = from < kLengths;
             if (!whole) break;
-            auto& learned = m_learned[c][i];
+            const auto learned = m_learned[c][i];
+            const std::size_t bins = m_windows[i].Bins();
             ConvertSpectrum(spectra[from], NoiseProfile::Length(from, profile.rate), profile.rate,
-                            learned.data(), m_windows[i].Bins(), m_windows[i].length, m_preparedRate);
-            for (float& power : learned) power = std::max(power, kLeastPower);
+                            learned.data(), bins, m_windows[i].length, m_preparedRate);
+            for (float& power : learned.first(bins)) power = std::max(power, kLeastPower);
+            std::fill(learned.begin() + static_cast<std::ptrdiff_t>(bins), learned.end(), 1.0f);
         }
     }
     if (whole) {
@@ -333,7 +354,7 @@ void DenoiserEngine::Adopt(const NoiseProfile& profile) {
 // One channel gets the mean of what two have learned.
 void DenoiserEngine::MixLearned() {
     for (std::size_t i = 0; i < kLengths; ++i) {
-        auto &left = m_learned[0][i], &right = m_learned[1][i];
+        const auto left = m_learned[0][i], right = m_learned[1][i];
         for (std::size_t bin = 0; bin < left.size(); ++bin)
             left[bin] = right[bin] = 0.5f * (left[bin] + right[bin]);
     }
@@ -341,28 +362,30 @@ void DenoiserEngine::MixLearned() {
 }
 
 void DenoiserEngine::FinishLearned() {
+    m_referenceDue = HasLearned();
+    ChooseMode(m_mode == ProfileMode::Following);
+}
+
+// The middle one of the logarithms of the powers, where the residual's whitening pivots.
+void DenoiserEngine::FindReference() {
+    if (!std::exchange(m_referenceDue, false)) return;
     const std::size_t bins = m_windows[kTrackIndex].Bins();
-    for (std::size_t c = 0; c < kMostChannels && HasLearned(); ++c) {
+    for (std::size_t c = 0; c < kMostChannels; ++c) {
         BestSpectrumKernels().logarithm(m_learned[c][kTrackIndex].data(), m_order.data(), m_order.size());
         const auto middle = m_order.begin() + static_cast<std::ptrdiff_t>(bins / 2);
         std::nth_element(m_order.begin(), middle, m_order.begin() + static_cast<std::ptrdiff_t>(bins));
         m_learnedReference[c] = *middle;
     }
-    ChooseMode(m_mode == ProfileMode::Following);
 }
 
-void DenoiserEngine::GiveRoom(NoiseProfile& profile) const {
-    for (auto& channel : profile.power)
-        for (std::size_t i = 0; i < kLengths; ++i) channel[i].resize(m_windows[i].Bins());
-}
-
-void DenoiserEngine::Export(NoiseProfile& profile) const {
-    profile.seconds = m_learnedSeconds;
-    profile.rate = static_cast<std::uint32_t>(m_preparedRate);
-    profile.channels = static_cast<std::uint32_t>(HasLearned() ? m_learnedChannels : 0);
-    for (std::size_t c = 0; c < kMostChannels; ++c)
+void DenoiserEngine::Export(LearnedNoise& learned) const {
+    learned.seconds = m_learnedSeconds;
+    learned.rate = static_cast<std::uint32_t>(m_preparedRate);
+    learned.channels = static_cast<std::uint32_t>(HasLearned() ? m_learnedChannels : 0);
+    auto to = learned.power.begin();
+    for (std::size_t c = 0; c < learned.channels; ++c)
         for (std::size_t i = 0; i < kLengths; ++i)
-            std::copy_n(m_learned[c][i].begin(), profile.power[c][i].size(), profile.power[c][i].begin());
+            to = std::copy_n(m_learned[c][i].begin(), m_windows[i].Bins(), to);
 }
 
 }  // namespace Corvo::DSP::Denoising

@@ -35,8 +35,9 @@ struct EngineSettings {
 // transform is never divided: a short block may have to do a whole one of the longest window.
 class DenoiserEngine {
 public:
-    // Makes all memory for a rate and any settings, and starts a stream with nothing learned.
-    void Prepare(double rate, std::size_t channels);
+    // Makes all memory for a rate and any settings, and starts a stream with nothing learned; with settings
+    // of another size set it would start again.
+    void Prepare(double rate, std::size_t channels, int sizeSet);
     // Starts a stream in another format; a passage still open ends. Window lengths stay as they were
     // prepared. At another rate than the prepared one nothing is learned, and what was learned is not used.
     void SetFormat(double rate, std::size_t channels);
@@ -54,11 +55,10 @@ public:
     void EndPassage() {
         if (m_learner.Active()) EndLearning();
     }
-    // True once after a passage has been learned; Export then fills a profile whose spectra have been given
-    // room.
+    // True once after a passage has been learned.
     bool TakeNewlyLearned() { return std::exchange(m_newlyLearned, false); }
-    void Export(NoiseProfile& profile) const;
-    void GiveRoom(NoiseProfile& profile) const;
+    // Into memory for as much as can be learned.
+    void Export(LearnedNoise& learned) const;
 
     const Format_t& Format() const { return m_format; }
 
@@ -79,13 +79,14 @@ private:
 
     void Start(bool afterSound);
     void LayoutTables(Arena& arena);
-    void ReserveMemory(double rate);
+    void ReserveMemory(double rate, int sizeSet);
     void Layout(Arena& arena);
     void PlacePaces();
-    void CookCurves();
+    void CookCurves(std::size_t size);
     void AimOutput(bool glide);
     void EndLearning();
     void FinishLearned();
+    void FindReference();
     void MixLearned();
     void ChooseMode(bool restart);
     bool HasLearned() const { return m_learnedSeconds > 0.0; }
@@ -112,11 +113,14 @@ private:
     std::array<WindowTables, kLengths> m_windows;
     std::array<SpectrumConversion, kLengths> m_conversions;
     std::array<Curves, kLengths> m_curves;
+    std::array<bool, 3> m_curvesDue{};  // of the sizes in use
     NoiseLearner m_learner;
-    std::array<std::array<Floats, kLengths>, kMostChannels> m_learned;
+    // Only written to when something is learned.
+    std::array<std::array<std::span<float>, kLengths>, kMostChannels> m_learned;
     std::array<float, kMostChannels> m_learnedReference{};
+    bool m_referenceDue = false;
     std::array<std::span<float>, 2> m_passage;
-    UntouchedZeros<float> m_order;
+    std::span<float> m_order;
     double m_learnedSeconds = 0.0;
     std::size_t m_learnedChannels = 0;
     bool m_newlyLearned = false;

@@ -95,7 +95,9 @@ void DenoiserProcessor::CheckCookProperties(const tWAVEFORMATEX* format, bool fo
     const auto cook = TakeCook(m_state->format, *format, force);
     // Prepared for this format already, an engine has the memory, and what was learned.
     const bool prepares = force && !m_state->IsPreparedFor(RateOf(*format), ChannelsOf(*format));
-    if (prepares) m_state->Prepare(RateOf(*format), ChannelsOf(*format));
+    if (prepares)
+        m_state->Prepare(RateOf(*format), ChannelsOf(*format),
+                         EngineSettingsOf(Snapshot(m_settings)).sizeSet);
     if (!cook.due || !m_state->engine) return;
     InitEnvelopes(true);
     if (cook.afresh && !prepares) m_state->engine->SetFormat(RateOf(*format), ChannelsOf(*format));

@@ -11,6 +11,7 @@
 namespace Corvo::DSP::DenoiserPrivate {
 
 using Denoising::DenoiserEngine;
+using Denoising::LearnedNoise;
 using Denoising::NoiseProfile;
 
 // The engine, and the learned noise on its way between the threads.
@@ -28,31 +29,27 @@ struct State {
     // User-interface thread.
     const NoiseProfile& Known() {
         if (const auto* newest = m_fromAudio.Take(); newest && newest->generation == m_generation)
-            m_known = *newest;
-        return m_known;
+            m_known = std::make_shared<const NoiseProfile>(newest->Profile());
+        return *m_known;
     }
     void Load(NoiseProfile profile) {
-        Known();
-        m_known = std::move(profile);
-        m_known.generation = ++m_generation;
+        profile.generation = m_generation + 1;
+        m_known = std::make_shared<const NoiseProfile>(std::move(profile));
+        ++m_generation;
         m_toAudio.Draft() = m_known;
         m_toAudio.Publish();
     }
 
     // No block is being processed. Without memory there is no engine, and the learned noise is kept.
-    void Prepare(double preparedRate, std::size_t channels) {
+    void Prepare(double preparedRate, std::size_t channels, int sizeSet) {
         EndPassage();
         auto made = engine ? std::move(engine) : std::make_unique<DenoiserEngine>();
-        made->Prepare(preparedRate, channels);
+        made->Prepare(preparedRate, channels, sizeSet);
         made->Adopt(Known());
+        GiveRoom(static_cast<std::uint32_t>(preparedRate));
+        // One that is still on its way is what is known.
+        if (const auto* loaded = m_toAudio.Take()) m_taken = (*loaded)->generation;
         engine = std::move(made);
-        // Every slot of what the audio thread will hand over gets its room; a value on its way has been
-        // taken.
-        for (int slot = 0; slot < 3; ++slot) {
-            engine->GiveRoom(m_fromAudio.Draft());
-            m_fromAudio.Publish();
-            m_fromAudio.Take();
-        }
         rate.store(static_cast<std::uint32_t>(preparedRate));
         m_channels = channels;
     }
@@ -67,8 +64,8 @@ struct State {
     // Audio thread.
     void TakeProfiles() {
         if (const auto* loaded = m_toAudio.Take()) {
-            engine->Adopt(*loaded);
-            m_taken = loaded->generation;
+            engine->Adopt(**loaded);
+            m_taken = (*loaded)->generation;
         }
         if (TakeFlag(clearRequested)) {
             engine->Forget();
@@ -80,6 +77,16 @@ struct State {
     }
 
 private:
+    // To every slot of what the audio thread will hand over; a value on its way has been taken.
+    void GiveRoom(std::uint32_t preparedRate) {
+        const std::size_t each = LearnedNoise::MostPowers(preparedRate);
+        m_room = UntouchedZeros<float>(3 * each);
+        for (std::size_t slot = 0; slot < 3; ++slot) {
+            m_fromAudio.Draft().power = std::span(m_room).subspan(slot * each, each);
+            m_fromAudio.Publish();
+            m_fromAudio.Take();
+        }
+    }
     void HandOver() {
         auto& draft = m_fromAudio.Draft();
         engine->Export(draft);
@@ -93,11 +100,13 @@ private:
         HandOverLearned();
     }
 
-    LatestValue<NoiseProfile> m_toAudio, m_fromAudio;
-    std::size_t m_channels = 0;      // that the engine is prepared for
-    NoiseProfile m_known;            // user-interface thread
-    std::uint32_t m_generation = 0;  // user-interface thread
-    std::uint32_t m_taken = 0;       // audio thread
+    LatestValue<std::shared_ptr<const NoiseProfile>> m_toAudio;  // the audio thread only looks at them
+    LatestValue<LearnedNoise> m_fromAudio;
+    UntouchedZeros<float> m_room;  // of m_fromAudio
+    std::size_t m_channels = 0;    // that the engine is prepared for
+    std::shared_ptr<const NoiseProfile> m_known = std::make_shared<NoiseProfile>();  // user-interface thread
+    std::uint32_t m_generation = 0;                                                  // user-interface thread
+    std::uint32_t m_taken = 0;                                                       // audio thread
 };
 
 }  // namespace Corvo::DSP::DenoiserPrivate

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <utility>
 
 namespace Corvo::DSP::Denoising {
 namespace {
@@ -22,6 +23,7 @@ void Lower(float* values, const float* others, std::size_t count) {
 
 void HumFinder::Prepare(Arena& arena, std::size_t bins, std::size_t values) {
     m_bins = bins;
+    m_begun = false;
     for (auto* each :
          {&m_smooth, &m_minimum, &m_sum, &m_lowest, &m_valley, &m_mean, &m_found, &m_level, &m_low})
         *each = arena.Take(values);
@@ -32,7 +34,7 @@ void HumFinder::Prepare(Arena& arena, std::size_t bins, std::size_t values) {
 void HumFinder::Start() {
     m_framesInPiece = 0;
     m_pieces = 0;
-    m_begun = false;
+    if (!std::exchange(m_begun, false)) return;  // the memory is all zeros
     std::fill_n(m_level, m_bins, 0.0f);
     std::fill_n(m_low, m_bins, 0.0f);
 }

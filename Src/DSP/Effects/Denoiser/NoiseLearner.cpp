@@ -11,9 +11,13 @@ constexpr std::size_t kShortLengths = 2;
 
 }  // namespace
 
-void NoiseLearner::Prepare(std::span<WindowTables, kLengths> windows) {
+void NoiseLearner::Prepare(Arena& arena, std::span<WindowTables, kLengths> windows) {
     m_windows = windows.data();
     m_active = false;
+    m_re = arena.Take(windows.back().Half());
+    m_im = arena.Take(windows.back().Half());
+    m_power = arena.Take(windows.back().Values());
+    if (arena.Counting()) return;
     std::size_t bins = 0;
     for (const auto& window : windows) bins += window.Bins();
     m_sumMemory = UntouchedZeros<double>(kMostChannels * bins);
@@ -21,9 +25,6 @@ void NoiseLearner::Prepare(std::span<WindowTables, kLengths> windows) {
     for (auto& channel : m_sums)
         for (std::size_t i = 0; i < kLengths; sums += windows[i++].Bins())
             channel[i] = {sums, windows[i].Bins()};
-    m_re = UntouchedZeros<float>(windows.back().Half());
-    m_im = UntouchedZeros<float>(windows.back().Half());
-    m_power = UntouchedZeros<float>(windows.back().Values());
 }
 
 void NoiseLearner::Begin(std::int64_t place, std::size_t channels) {
@@ -60,13 +61,13 @@ bool NoiseLearner::TakeWindow(std::size_t which, std::int64_t place, std::span<c
         // A passage begins anywhere, so the ring's end may cut it anywhere.
         input[c].ForEachRun(start, static_cast<std::size_t>(tables.length),
                             [&](const float* samples, std::size_t done, std::size_t count) {
-                                std::copy_n(samples, count, tables.scratch.data() + done);
+                                std::copy_n(samples, count, tables.scratch + done);
                             });
         const auto& kernels = BestSpectrumKernels();
-        kernels.multiply(tables.scratch.data(), tables.scratch.data(), tables.shape->analysis.data(),
+        kernels.multiply(tables.scratch, tables.scratch, tables.shape->analysis.data(),
                          static_cast<std::size_t>(tables.length));
-        tables.fft.DoFFTReal(tables.scratch.data(), m_re.data(), m_im.data(), tables.length, 0);
-        kernels.power(m_re.data(), m_im.data(), m_power.data(), tables.Half());
+        tables.Forward(m_re, m_im);
+        kernels.power(m_re, m_im, m_power, tables.Half());
         auto& sums = m_sums[c][which];
         for (std::size_t bin = 0; bin < sums.size(); ++bin) sums[bin] += static_cast<double>(m_power[bin]);
     }
@@ -79,7 +80,7 @@ const float* NoiseLearner::Mean(std::size_t channel, std::size_t which) {
     const auto& sums = m_sums[channel][which];
     for (std::size_t bin = 0; bin < sums.size(); ++bin)
         m_power[bin] = static_cast<float>(sums[bin] / static_cast<double>(m_count[which]));
-    return m_power.data();
+    return m_power;
 }
 
 }  // namespace Corvo::DSP::Denoising

@@ -16,7 +16,7 @@ namespace Corvo::DSP::Denoising {
 class NoiseLearner {
 public:
     // Allocates for the windows given.
-    void Prepare(std::span<WindowTables, kLengths> windows);
+    void Prepare(Arena& arena, std::span<WindowTables, kLengths> windows);
 
     bool Active() const { return m_active; }
     void Begin(std::int64_t place, std::size_t channels);
@@ -40,7 +40,7 @@ private:
     std::array<std::int64_t, kLengths> m_count{};
     UntouchedZeros<double> m_sumMemory;
     std::array<std::array<std::span<double>, kLengths>, kMostChannels> m_sums;
-    UntouchedZeros<float> m_re, m_im, m_power;
+    float *m_re = nullptr, *m_im = nullptr, *m_power = nullptr;
 };
 
 }  // namespace Corvo::DSP::Denoising

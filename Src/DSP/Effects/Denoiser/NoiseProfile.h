@@ -32,6 +32,18 @@ struct NoiseProfile {
     }
 };
 
+// What an engine has learned, on its way out of the audio thread, in memory that is made before: the powers
+// of one channel after the other, length by length.
+struct LearnedNoise {
+    double seconds = 0.0;
+    std::uint32_t rate = 0, channels = 0, generation = 0;
+    std::span<float> power;
+
+    // Powers of two channels at a rate.
+    static std::size_t MostPowers(std::uint32_t rate);
+    NoiseProfile Profile() const;
+};
+
 // Fills `to` (`bins` bins of windows of `length` at `rate`) from a spectrum of another length or rate:
 // linear over frequency, and scaled as the same sound's power would be.
 void ConvertSpectrum(std::span<const float> from, int fromLength, double fromRate, float* to,

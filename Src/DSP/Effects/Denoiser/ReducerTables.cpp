@@ -3,11 +3,10 @@
 #include <algorithm>
 #include <cmath>
 #include <mutex>
-#include <new>
 #include <numbers>
 #include <vector>
 
-#include "Spectrum/Fft/CorvoFFT.h"
+#include "Spectrum/Fft/SplitTransform.h"
 
 namespace Corvo::DSP::Denoising {
 namespace {
@@ -15,14 +14,12 @@ namespace {
 // The frequency response of a window that is shorter than the tracker's, at that one's bins, from its middle
 // upwards, squared and scaled so that it turns the noise's power in the one's bins into that in the other's.
 Floats Response(const WindowShape& track, const WindowShape& shorter) {
-    CorvoFFT fft;
-    fft.AllocateReal(track.length, 0);
+    Fft::SplitTransform transform;
+    transform.Prepare(track.length);
     const auto length = static_cast<std::size_t>(track.length);
-    Floats window(length), re(length / 2), im(length / 2);
+    Floats window(length), re(length / 2), im(length / 2), work(transform.WorkFloats(track.length));
     std::ranges::copy(shorter.analysis, window.begin());
-    fft.DoFFTReal(window.data(), re.data(), im.data(), track.length, 0);
-    const bool transformed = re[0] != 0.0f;
-    if (!transformed) throw std::bad_alloc();
+    transform.Forward(window.data(), re.data(), im.data(), work.data());
     im[0] = 0.0f;  // the highest bin's place
     const auto ratio = static_cast<std::size_t>(track.length / shorter.length);
     const float scale = static_cast<float>(shorter.length) / static_cast<float>(track.length);

@@ -28,7 +28,7 @@ void SizeBlend::Prepare(Arena& arena, WindowTables& grid, std::span<const SizeRe
     const auto tile = std::min(static_cast<std::size_t>(kTileSeconds * framesPerSecond) | 1, kMostTile);
     m_ahead = std::min(static_cast<int>(kTileAheadSeconds * framesPerSecond), kMostAhead);
     m_before = static_cast<std::int64_t>(tile / 2);
-    HannWeights(std::span(m_tile).first(tile), static_cast<std::size_t>(m_ahead));
+    if (!arena.Counting()) HannWeights(std::span(m_tile).first(tile), static_cast<std::size_t>(m_ahead));
     m_sharpness = kTurn * static_cast<float>(tile) / kTileFrames;
     for (std::size_t i = 0; i < sizes.size(); ++i) {
         m_risks[i].Take(arena, kMostTile + 1, kRiskBands);
@@ -37,13 +37,6 @@ void SizeBlend::Prepare(Arena& arena, WindowTables& grid, std::span<const SizeRe
             for (auto* part : {&m_re[i][c], &m_im[i][c]}) *part = arena.Take(grid.Half());
     }
     for (auto* each : {&m_outRe, &m_outIm}) *each = arena.Take(grid.Half());
-    m_band = arena.Take(grid.Values());
-    if (!m_band) return;
-    for (std::size_t bin = 0; bin < grid.Bins(); ++bin) {
-        const double hz = static_cast<double>(bin) * rate / grid.length;
-        for (std::size_t band = 0; band < m_bands; ++band)
-            m_band[bin] += static_cast<float>(RiskBandWeight(band, hz) * static_cast<double>(band));
-    }
 }
 
 void SizeBlend::Run(int step, const Job& job) {
@@ -90,8 +83,9 @@ void SizeBlend::Weigh(std::int64_t frame) {
         for (std::size_t i = 0; i < m_sizes.size(); ++i) weights[i][band] /= sum;
     }
     for (std::size_t bin = 0; bin < m_grid->Bins(); ++bin) {
-        const auto below = static_cast<std::size_t>(m_band[bin]);
-        const float share = m_band[bin] - static_cast<float>(below);
+        const float place = m_grid->bins->riskPlace[bin];
+        const auto below = static_cast<std::size_t>(place);
+        const float share = place - static_cast<float>(below);
         for (std::size_t i = 0; i < m_sizes.size(); ++i)
             m_weights[i][bin] = weights[i][below] + (weights[i][below + 1] - weights[i][below]) * share;
     }
@@ -109,7 +103,7 @@ void SizeBlend::Combine(std::size_t channel, const Job& job) {
             m_outIm[bin] += m_im[i][channel][bin];
         }
     }
-    grid.fft.DoIFFTReal(grid.scratch.data(), m_outRe, m_outIm, grid.length, 0);
+    grid.Inverse(m_outRe, m_outIm);
     OverlapAdd(*m_kernels, grid, job.output[channel],
                (job.frame - (kOverlap - 1)) * (grid.length / kOverlap));
 }

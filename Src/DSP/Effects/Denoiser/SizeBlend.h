@@ -44,7 +44,7 @@ private:
     float m_sharpness = 0.0f;
     FrameRing m_risks[kMostSizes];
     float *m_re[kMostSizes][kMostChannels]{}, *m_im[kMostSizes][kMostChannels]{};
-    float *m_weights[kMostSizes]{}, *m_band = nullptr, *m_outRe = nullptr, *m_outIm = nullptr;
+    float *m_weights[kMostSizes]{}, *m_outRe = nullptr, *m_outIm = nullptr;
 };
 
 }  // namespace Corvo::DSP::Denoising

@@ -32,11 +32,6 @@ void SizeReducer::Prepare(Arena& arena, const SizePlan& plan, WindowTables& tabl
     m_channels = channels;
     m_values = tables.Values();
     m_pieces = (m_values + kPiece - 1) / kPiece;
-    HannWeights(std::span(m_evidenceWeights).first(static_cast<std::size_t>(plan.kernel)),
-                static_cast<std::size_t>(plan.ahead));
-    HannWeights(m_supportWeights, static_cast<std::size_t>(SupportAhead()));
-    HannWeights(m_estimateWeights, static_cast<std::size_t>(EstimateAhead()));
-
     const auto frames = [](int count) { return static_cast<std::size_t>(count); };
     for (std::size_t c = 0; c < channels; ++c)
         for (auto* ring : {&m_re[c], &m_im[c]}) ring->Take(arena, frames(Delay() + 1), tables.Half());
@@ -47,12 +42,14 @@ void SizeReducer::Prepare(Arena& arena, const SizePlan& plan, WindowTables& tabl
     m_estimate.Take(arena, 3, m_values);
     m_risks.Take(arena, static_cast<std::size_t>(kRisks), kRiskBands);
     for (auto& raw : m_raw) raw = arena.Take(m_values + 2 * kEdge);
-    for (auto& power : m_power) {
-        power = arena.Take(m_values);
-        if (power) std::fill(power + tables.Bins(), power + m_values, 1.0f);
-    }
+    for (auto& power : m_power) power = arena.Take(m_values);
     for (auto* values : {&m_meanNoise, &m_gain, &m_risk, &m_whiteFloor, &m_logWhiteFloor})
         *values = arena.Take(m_values);
+    if (arena.Counting()) return;
+    HannWeights(std::span(m_evidenceWeights).first(static_cast<std::size_t>(plan.kernel)),
+                static_cast<std::size_t>(plan.ahead));
+    HannWeights(m_supportWeights, static_cast<std::size_t>(SupportAhead()));
+    HannWeights(m_estimateWeights, static_cast<std::size_t>(EstimateAhead()));
 }
 
 SizeReducer::Step SizeReducer::At(int step) const {
@@ -128,7 +125,9 @@ void SizeReducer::Analyse(std::size_t channel, const Job& job) {
     auto& tables = *m_tables;
     Transform(*m_kernels, tables, job.input[channel], (job.frame - (kOverlap - 1)) * Hop(),
               m_re[channel][job.frame], m_im[channel][job.frame]);
-    m_kernels->power(m_re[channel][job.frame], m_im[channel][job.frame], m_power[channel], tables.Half());
+    float* const power = m_power[channel];
+    m_kernels->power(m_re[channel][job.frame], m_im[channel][job.frame], power, tables.Half());
+    std::fill(power + tables.Bins(), power + m_values, 1.0f);
 }
 
 // The ratios of this frame, then how present signal is in an earlier one.
@@ -242,7 +241,7 @@ void SizeReducer::Synthesise(std::size_t channel, const Job& job) {
     const std::int64_t frame = job.frame - Delay(), start = (frame - (kOverlap - 1)) * Hop();
     float *const re = m_re[channel][frame], *const im = m_im[channel][frame];
     m_kernels->applyGain(re, im, m_gain, tables.Half());
-    tables.fft.DoIFFTReal(tables.scratch.data(), re, im, tables.length, 0);
+    tables.Inverse(re, im);
     OverlapAdd(*m_kernels, tables, job.output[channel], start);
 }
 

@@ -17,14 +17,11 @@ void Resample(const float* from, std::size_t fromCount, double step, float* to, 
 
 void SpectrumConversion::Prepare(const WindowTables& from, const WindowTables& to) {
     m_fromBins = from.Bins();
+    m_fromValues = from.Values();
     m_toBins = to.Bins();
     m_scale = static_cast<float>(to.length) / static_cast<float>(from.length);
     m_shorter = to.length < from.length;
     m_ratio = static_cast<std::size_t>(std::max(to.length, from.length) / std::min(to.length, from.length));
-    if (!m_shorter) return;
-    const std::size_t half = kResponseBins * m_ratio;
-    m_mirrored = UntouchedZeros<float>(from.Values() + 2 * half);
-    m_seen = UntouchedZeros<float>(from.Values());
 }
 
 void SpectrumConversion::Run(const float* from, float* to) {
@@ -38,14 +35,15 @@ void SpectrumConversion::Run(const float* from, float* to) {
         return;
     }
     const std::size_t half = m_response->size() - 1;
-    std::copy_n(from, m_fromBins, m_mirrored.data() + half);
+    float *const seen = m_work, *const mirrored = seen + m_fromValues, *const middle = mirrored + half;
+    std::copy_n(from, m_fromBins, middle);
     for (std::size_t i = 1; i <= half; ++i) {
-        m_mirrored[half - i] = from[i];
-        m_mirrored[half + m_fromBins - 1 + i] = from[m_fromBins - 1 - i];
+        mirrored[half - i] = from[i];
+        middle[m_fromBins - 1 + i] = from[m_fromBins - 1 - i];
     }
-    BestSpectrumKernels().smoothBins(m_mirrored.data() + half, m_seen.data(), m_response->data(),
-                                     static_cast<int>(half), 0, m_seen.size());
-    for (std::size_t i = 0; i < m_toBins; ++i) to[i] = m_seen[i * m_ratio];
+    BestSpectrumKernels().smoothBins(middle, seen, m_response->data(), static_cast<int>(half), 0,
+                                     m_fromValues);
+    for (std::size_t i = 0; i < m_toBins; ++i) to[i] = seen[i * m_ratio];
 }
 
 }  // namespace Corvo::DSP::Denoising

@@ -13,19 +13,21 @@ namespace Corvo::DSP::Denoising {
 // wider, frequency response.
 class SpectrumConversion {
 public:
-    // Allocates.
     void Prepare(const WindowTables& from, const WindowTables& to);
+    // Floats that it works in; conversions may share them.
+    std::size_t WorkFloats() const { return m_shorter ? 2 * (m_fromValues + kResponseBins * m_ratio) : 0; }
+    void WorkIn(float* work) { m_work = work; }
     // The frequency response of `to`, if it is the shorter; lives as long as it is in use.
     void Use(const Floats& response) { m_response = &response; }
     void Run(const float* from, float* to);
     std::size_t Bins() const { return m_toBins; }
 
 private:
-    std::size_t m_fromBins = 0, m_toBins = 0, m_ratio = 1;
+    std::size_t m_fromBins = 0, m_fromValues = 0, m_toBins = 0, m_ratio = 1;
     bool m_shorter = false;
     float m_scale = 1.0f;                // of the windows' energies
     const Floats* m_response = nullptr;  // at the longer window's bins, m_ratio to one of the shorter's
-    UntouchedZeros<float> m_mirrored, m_seen;
+    float* m_work = nullptr;
 };
 
 // `count` values at places step * i of `from`, linear between them; beyond the end its last value.

@@ -5,8 +5,7 @@
 #include "DSP/Effects/Denoiser/Arena.h"
 #include "DSP/Effects/Denoiser/ReducerTables.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
-#include "Platform/UntouchedZeros.h"
-#include "Spectrum/Fft/CorvoFFT.h"
+#include "Spectrum/Fft/SplitTransform.h"
 
 namespace Corvo::DSP::Denoising {
 
@@ -14,6 +13,12 @@ namespace Corvo::DSP::Denoising {
 struct WindowTables {
     // Allocates for windows of `samples`; throws std::bad_alloc.
     void Prepare(int samples);
+    // A window's samples, and what its transforms work in (SplitTransform::WorkFloats). Windows of other
+    // lengths may have the same.
+    void WorkIn(float* samples, float* work) {
+        scratch = samples;
+        m_work = work;
+    }
     // For what bins stand for at another rate than the shared tables'.
     void PrepareRates(Arena& arena) { m_otherRate.Prepare(arena, length); }
     // Takes length `which` of the tables that all reducers share, which live as long as they are in use.
@@ -24,8 +29,10 @@ struct WindowTables {
     int length = 0;
     const WindowShape* shape = nullptr;
     const BinTables* bins = nullptr;
-    CorvoFFT fft;
-    UntouchedZeros<float> scratch;
+    float* scratch = nullptr;
+    // Between scratch and a split spectrum.
+    void Forward(float* re, float* im) const { m_transform.Forward(scratch, re, im, m_work); }
+    void Inverse(const float* re, const float* im) const { m_transform.Inverse(re, im, scratch, m_work); }
 
     std::size_t Half() const { return static_cast<std::size_t>(length) / 2; }
     std::size_t Bins() const { return Half() + 1; }
@@ -33,6 +40,8 @@ struct WindowTables {
     std::size_t Values() const { return SpectrumValues(length); }
 
 private:
+    Fft::SplitTransform m_transform;
+    float* m_work = nullptr;
     const BinTables* m_preparedBins = nullptr;
     double m_preparedRate = 0.0;
     BinTables m_otherRate;
