@@ -44,7 +44,8 @@ VoicePitchTables::VoicePitchTables(double forRate, double forLowestHz)
         const double out = (kEndHz - bin * binHz) / (kEndHz - kFadeOutHz);
         band.push_back(static_cast<float>(std::clamp(in, 0.0, 1.0) * std::clamp(out, 0.0, 1.0)));
     }
-    m_plan = Fft::TakePlan<float>(std::bit_width(static_cast<unsigned>(size)) - 1, Fft::Kind::Real);
+    m_plan = Fft::TakePlan<float>(static_cast<int>(std::bit_width(static_cast<unsigned>(size))) - 1,
+                                  Fft::Kind::Real);
     if (!m_plan) throw std::bad_alloc();
 }
 
