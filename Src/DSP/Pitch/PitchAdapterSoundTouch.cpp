@@ -17,9 +17,11 @@ namespace {
 constexpr int kMostEngineChannels = 16;
 constexpr int kPrimingFrames = 28;
 constexpr int kFlushFrames = 128;
-constexpr int kPiece = 256;
+constexpr int kPiece = 1024;
 constexpr float kOctave = 2.0f;
-constexpr int kMostFillPieces = 1024;
+constexpr int kShortestFilter = 8, kMostTaps = 128;
+// A rate just above 1, at a tempo of 100.
+constexpr float kFillPitch = 0.01f, kFillSpeed = 100.5f;
 // The engine can only be flushed by more input; far more than its longest sequence ends the attempt.
 constexpr int kMostFlushBlocks = 1 << 16;
 // The engine throws at higher rates, and at a few Hz its sequences are too short to move on by a frame. It
@@ -33,7 +35,8 @@ constexpr float kLowestSpeed = 0.01f, kHighestSpeed = 100.0f;
 // Blocks up to this size need no new memory, whatever their precision.
 constexpr std::size_t kScratchSamples = 16384;
 
-constexpr std::array<float, kFlushFrames * kMostEngineChannels> kSilence{};
+// Silence to give to the engine. It is never written to: a constant would lie in the library's file.
+std::array<float, 1 << 18> g_silence{};
 
 std::size_t Samples(int frames, int channels) {
     return static_cast<std::size_t>(std::max(frames, 0)) * static_cast<std::size_t>(std::max(channels, 0));
@@ -105,8 +108,10 @@ PitchAdapterSoundTouch::Configuration PitchAdapterSoundTouch::WithFilter(Configu
 
 void PitchAdapterSoundTouch::Put(const float* samples, int frames) {
     if (!Ready()) return;
-    // In pieces where the engine first makes more of them, so that this stays small.
-    const int piece = m_told.pitch * m_told.speed < 1.0f ? kPiece : frames;
+    // Pieces of which it makes about kPiece frames, at most, leave its buffers small. At high rates they
+    // would change the sound: its resampler then steps over the end of what it has.
+    const float rate = m_told.pitch * m_told.speed;
+    const int piece = rate > kOctave ? frames : std::clamp(static_cast<int>(kPiece * rate), 1, kPiece);
     for (int count; frames > 0; frames -= count, samples += Samples(count, m_channels)) {
         count = std::min(frames, piece);
         WithEngine([&] { m_engine->putSamples(samples, static_cast<unsigned>(count)); });
@@ -138,7 +143,7 @@ void PitchAdapterSoundTouch::SetSampleRate(int rate) {
     if (m_rateSet) wanted.rate = static_cast<unsigned>(std::clamp(rate, kLowestRate, kHighestRate));
     Configure(wanted);
     TakeLatency();
-    Put(kSilence.data(), kPrimingFrames);
+    Put(g_silence.data(), kPrimingFrames);
 }
 
 void PitchAdapterSoundTouch::SetChannelsNum(int channels) {
@@ -182,43 +187,66 @@ void PitchAdapterSoundTouch::SetQuality(int index) {
 }
 
 // The engine's buffers keep their size when it is cleared: once they have held the most that a block of
-// kScratchSamples needs, at the lowest pitch and up to an octave, they grow no more.
+// kScratchSamples needs, from the lowest pitch to an octave up, they grow no more.
 void PitchAdapterSoundTouch::Fill() {
     if (!Ready() || (m_filledChannels == m_told.channels && m_filledRate == m_told.rate)) return;
     const auto wanted = m_told;
-    const int block = static_cast<int>(kScratchSamples) / m_channels;
-    m_scratch.assign(kScratchSamples, 0.0f);
-    for (const float pitch : {kLowestPitch, 1.0f, kOctave}) {
-        auto other = wanted;
-        other.pitch = pitch;
-        other.quickSeek = 1;  // as much output of silence, sooner
-        Configure(other);
-        m_engine->clear();
-        if (pitch < 1.0f)
-            FillBeforeStart();
-        else
-            FillWhileRunning(block);
+    try {
+        GrowBuffers();
+        Configure(wanted);
+    } catch (const std::bad_alloc&) {
+        m_told = wanted;  // for the engine to come
+        throw;
     }
-    Configure(wanted);
     m_filledChannels = wanted.channels;
     m_filledRate = wanted.rate;
 }
 
-// The lowest pitch asks for the most input: a piece that comes when one frame is missing to a whole sequence.
-// The engine begins somewhat before its latency, as its filter starts with silence.
-void PitchAdapterSoundTouch::FillBeforeStart() {
-    const int early = m_told.filterLength;
-    for (int left = m_engine->getSetting(SETTING_INITIAL_LATENCY) - early; left > 0; left -= kPiece)
-        Put(m_scratch.data(), std::min(left, kPiece));
-    WithEngine([&] { m_engine->putSamples(m_scratch.data(), static_cast<unsigned>(kPiece + early)); });
-}
+// No call makes the engine's buffers large, so silence goes through them, with as little work as can be. It
+// first stretches and then resamples above a rate of 1, and the other way round up to it; what it holds moves
+// on when the rate passes 1.
+void PitchAdapterSoundTouch::GrowBuffers() {
+    const auto tell = [&](float pitch, float speed) {
+        auto other = m_told;
+        other.pitch = pitch;
+        other.speed = speed;
+        other.filter = m_told.channels < kMostEngineChannels;
+        other.filterLength = kShortestFilter;
+        other.quickSeek = 1;
+        Configure(other);
+    };
+    tell(kLowestPitch, 1.0f);
+    const auto lowest = static_cast<float>(m_engine->getSetting(SETTING_INITIAL_LATENCY)) / kLowestPitch;
+    tell(kOctave, 1.0f);
+    const int sequence = m_engine->getSetting(SETTING_NOMINAL_INPUT_SEQUENCE) * static_cast<int>(kOctave);
+    // What the resampler is given at once: from the stretcher, or at the start, when it holds half a filter.
+    const int passed = std::max(kPiece + sequence, static_cast<int>(kMostTaps / 2 / kLowestPitch)) + kPiece;
+    // What is held when a block is taken: less than two of them, and than two sequences.
+    const int block = static_cast<int>(kScratchSamples) / m_channels;
+    const int held = 2 * std::max(block + sequence, passed);
 
-// The others make the most output: of a block that ends one more sequence, with another block still held.
-void PitchAdapterSoundTouch::FillWhileRunning(int block) {
-    for (int i = 0; Held() < block && i < kMostFillPieces; ++i) Put(m_scratch.data(), kPiece);
-    const int frames = block + m_engine->getSetting(SETTING_NOMINAL_INPUT_SEQUENCE);
-    const std::vector<float> silence(Samples(frames, m_channels));
-    Put(silence.data(), frames);
+    // Sequences so long, and so much stretching, that the stretcher waits for more than it is given here.
+    const auto giveStretcher = [&](int frames) {
+        tell(kFillPitch, kFillSpeed);
+        m_engine->clear();
+        const int most = static_cast<int>(g_silence.size()) / m_channels;
+        for (int count; frames > 0; frames -= count) {
+            count = std::min(frames, most);
+            m_engine->putSamples(g_silence.data(), static_cast<unsigned>(count));
+        }
+    };
+    WithEngine([&] {
+        m_engine->setSetting(SETTING_SEQUENCE_MS, 1 + static_cast<int>(1000.0 * held / m_told.rate));
+        giveStretcher(static_cast<int>(lowest) + kPiece + kMostTaps);
+        giveStretcher(held + passed + kMostTaps);
+        // One sequence goes to the stretcher's output and from there to the resampler's, the rest through
+        // that.
+        tell(1.0f, 1.0f);
+        m_engine->putSamples(g_silence.data(), 1);
+        tell(kFillPitch, kFillSpeed);
+        m_engine->setSetting(SETTING_SEQUENCE_MS, 0);  // back to what it finds best
+        m_engine->clear();
+    });
 }
 
 void PitchAdapterSoundTouch::ProcessInPlace(float* buffer, int frames) {
@@ -275,7 +303,7 @@ void PitchAdapterSoundTouch::Flush() {
     m_atRest = true;
     if (!Ready()) return;
     const std::int64_t owed = Owed();
-    for (int i = 0; Held() < owed && i < kMostFlushBlocks; ++i) Put(kSilence.data(), kFlushFrames);
+    for (int i = 0; Held() < owed && i < kMostFlushBlocks; ++i) Put(g_silence.data(), kFlushFrames);
 }
 
 int PitchAdapterSoundTouch::GetNumSamplesAvailable() {

@@ -56,8 +56,7 @@ private:
     void TakeLatency();
     Configuration WithFilter(Configuration wanted) const;
     void Fill();
-    void FillBeforeStart();
-    void FillWhileRunning(int block);
+    void GrowBuffers();
     // The engine throws when it is given samples before it knows rate and channels.
     bool Ready() const {
         return m_engine && m_rateSet && m_told.channels > 0 &&

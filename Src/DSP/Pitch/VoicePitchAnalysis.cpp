@@ -6,6 +6,7 @@
 #include <numbers>
 
 #include "DSP/Parts/Correlation.h"
+#include "DSP/Parts/SharedTables.h"
 
 namespace Corvo::DSP {
 namespace {
@@ -13,21 +14,15 @@ namespace {
 // Times are laid out for 48 kHz and scale with the rate.
 constexpr double kReferenceRate = 48000.0, kHopAtReference = 256.0, kStepAtReference = 32.0;
 constexpr int kLongestStep = 32, kLeastSteps = 3;
-constexpr double kAnalysisRate = 24000.0;  // about the rate of what is transformed
-constexpr double kFramePeriods = 2.2;      // length of a frame, in longest periods
-constexpr int kFrameExtra = 32;
 
 constexpr double kLimit = 1e9;     // of a sample: its square still is a float
 constexpr double kHighPass = 0.6;  // of the lowest pitch
 constexpr double kLowPassHz = 2500.0;
 constexpr double kAliasHz = 7000.0;  // for the full band, of which 5000 Hz are used
 
-// The flattened spectrum: power^0.2 between these edges, less most of its mean over 400 Hz to either side.
-constexpr double kFadeInHz = 30.0, kFadedInHz = 60.0, kFadeOutHz = 3500.0, kEndHz = 5000.0;
-constexpr double kMeanHz = 400.0;
-constexpr float kMeanShare = 0.9f;
+constexpr float kMeanShare = 0.9f;  // of the mean, by which the spectrum is flattened
 
-constexpr double kLeastPeak = 0.2, kFlatNeutral = 0.3, kLeastOverlap = 0.25;
+constexpr double kLeastPeak = 0.2, kFlatNeutral = 0.3;
 constexpr double kOctaveCost = 0.02, kHighOctaveCost = 0.14, kHighHz = 500.0;
 
 // The second measurement: over so many periods, at least this share of the longest.
@@ -66,53 +61,43 @@ float FifthRoot(float x) {
 }  // namespace
 
 VoicePitchAnalysis::VoicePitchAnalysis(const VoicePitchSettings& settings)
-    : m_rate(Within(settings.rate, 1000.0, 768000.0)), m_lowestHz(Within(settings.lowestHz, 20.0, 1000.0)) {
-    m_decimation = std::max(static_cast<int>(std::lround(m_rate / kAnalysisRate)), 1);
-    m_analysisRate = m_rate / m_decimation;
+    : m_rate(Within(settings.rate, 1000.0, 768000.0)),
+      m_lowestHz(Within(settings.lowestHz, 20.0, 1000.0)),
+      m_tables(SharedTables<VoicePitchTables>(m_rate, m_lowestHz)),
+      m_analysisRate(m_tables->analysisRate),
+      m_decimation(m_tables->decimation),
+      m_length(m_tables->length),
+      m_longestPiece(m_length * m_decimation) {
     const double reference = m_rate / kReferenceRate;
     m_step = std::clamp(static_cast<int>(std::lround(kStepAtReference * reference)), 1, kLongestStep);
     const double hop = kHopAtReference * reference * (settings.shortHop ? 0.5 : 1.0);
     m_hop = m_step * std::max(static_cast<int>(std::lround(hop / m_step)), kLeastSteps);
-    m_length = static_cast<int>(kFramePeriods * m_analysisRate / m_lowestHz) + kFrameExtra;
-    m_lags = static_cast<int>(m_analysisRate / m_lowestHz) + 3;
-    m_size = static_cast<int>(std::bit_ceil(static_cast<unsigned>(m_length + m_lags)));
-    m_longestPiece = m_length * m_decimation;
-    m_fft.AllocateReal(m_size, 1);
 
     m_highPass = Biquad::HighPass(kHighPass * m_lowestHz, std::numbers::sqrt2 / 2.0, m_rate);
     m_low1 = Biquad::LowPass(kLowPassHz, Biquad::kFirstOfFour, m_rate);
     m_low2 = Biquad::LowPass(kLowPassHz, Biquad::kSecondOfFour, m_rate);
     m_alias1 = Biquad::LowPass(kAliasHz, Biquad::kFirstOfFour, m_rate);
     m_alias2 = Biquad::LowPass(kAliasHz, Biquad::kSecondOfFour, m_rate);
-    m_low.Allocate(m_longestPiece + (kDecideStep + 1) * m_step);
-    m_lowSlow.Allocate(m_length);
-    m_full.Allocate(m_length);
-
-    const auto length = static_cast<std::size_t>(m_length), lags = static_cast<std::size_t>(m_lags);
-    for (int i = 0; i < m_length; ++i)
-        m_window.push_back(
-            static_cast<float>(0.5 - 0.5 * std::cos(2.0 * std::numbers::pi * i / (m_length - 1))));
-    const double whole = DotProduct(m_window.data(), m_window.data(), m_length);
-    for (int lag = 0; lag < m_lags; ++lag)
-        m_overlap.push_back(static_cast<float>(std::max(
-            DotProduct(m_window.data(), m_window.data() + lag, m_length - lag) / whole, kLeastOverlap)));
-    const double binHz = m_analysisRate / m_size;
-    const int bins = std::min(static_cast<int>(kEndHz / binHz) + 1, m_size / 2);
-    m_meanBins = std::max(static_cast<int>(kMeanHz / binHz), 8);
-    for (int bin = 0; bin < bins; ++bin) {
-        const double in = (bin * binHz - kFadeInHz) / (kFadedInHz - kFadeInHz);
-        const double out = (kEndHz - bin * binHz) / (kEndHz - kFadeOutHz);
-        m_band.push_back(static_cast<float>(std::clamp(in, 0.0, 1.0) * std::clamp(out, 0.0, 1.0)));
-    }
-    m_magnitudes.resize(m_band.size());
-    m_spectrum.resize(static_cast<std::size_t>(m_size));
-    m_nsdf.resize(lags);
-    m_flat.resize(lags);
-    m_sums.resize(length + 1);
-    m_pieceSums.resize(static_cast<std::size_t>(m_longestPiece) + 1);
     SetHighest(settings.highestHz);
     SetSilence(settings.silence);
-    Clear();
+}
+
+void VoicePitchAnalysis::Prepare(Arena& arena) {
+    const auto floats = [&](auto count) {
+        return std::span(arena.Take(static_cast<std::size_t>(count)), static_cast<std::size_t>(count));
+    };
+    const auto doubles = [&](int count) { return arena.Take<double>(static_cast<std::size_t>(count)); };
+    m_low.Prepare(arena, m_longestPiece + (kDecideStep + 1) * m_step);
+    m_lowSlow.Prepare(arena, m_length);
+    m_full.Prepare(arena, m_length);
+    m_work = arena.Take(Fft::WorkValues(m_tables->Transform().points));
+    m_magnitudes = floats(m_tables->band.size());
+    m_spectrum = floats(m_tables->size);
+    m_nsdf = floats(m_tables->lags);
+    m_flat = floats(m_tables->lags);
+    m_sums = doubles(m_length + 1);
+    m_pieceSums = doubles(m_longestPiece + 1);
+    m_frames = arena.Take<VoicePitchFrame>(kKept);
 }
 
 void VoicePitchAnalysis::Clear() {
@@ -120,7 +105,7 @@ void VoicePitchAnalysis::Clear() {
     m_low.Clear();
     m_lowSlow.Clear();
     m_full.Clear();
-    std::ranges::fill(m_flat, 0.0f);
+    if (m_given > 0) std::ranges::fill(m_flat, 0.0f);
     m_given = m_frameEnd = 0;
     m_untilDecimated = m_decimation;
     m_untilStep = m_step;
@@ -165,34 +150,46 @@ void VoicePitchAnalysis::Work() {
     if (m_stepInHop == steps - 1) CorrelateFull();
 }
 
+void VoicePitchAnalysis::Forward() {
+    const auto& plan = m_tables->Transform();
+    plan.kernels->realForward(plan, m_spectrum.data(), m_spectrum.data(), m_work);
+}
+
+void VoicePitchAnalysis::Inverse() {
+    const auto& plan = m_tables->Transform();
+    plan.kernels->realInverse(plan, m_spectrum.data(), m_spectrum.data(), m_work);
+}
+
 void VoicePitchAnalysis::TransformFull() {
     const float* const samples = m_full.At(m_full.End() - m_length);
-    for (std::size_t i = 0; i < m_window.size(); ++i) m_spectrum[i] = samples[i] * m_window[i];
+    const auto& window = m_tables->window;
+    for (std::size_t i = 0; i < window.size(); ++i) m_spectrum[i] = samples[i] * window[i];
     std::fill(m_spectrum.begin() + m_length, m_spectrum.end(), 0.0f);
-    m_fft.DoFFTReal(m_spectrum.data(), m_size, 0);
+    Forward();
 }
 
 void VoicePitchAnalysis::CorrelateFull() {
     if (m_hop / m_step == kLeastSteps) TransformFull();  // it had no step of its own
     Flatten();
-    m_fft.DoIFFTReal(m_spectrum.data(), m_size, 0);
+    Inverse();
     const float scale = 1.0f / (m_spectrum[0] + static_cast<float>(kTiny));
     for (std::size_t lag = 0; lag < m_flat.size(); ++lag)
-        m_flat[lag] = m_spectrum[lag] * scale / m_overlap[lag];
+        m_flat[lag] = m_spectrum[lag] * scale / m_tables->overlap[lag];
 }
 
 // The spectrum without its formants: what is above the mean around it.
 void VoicePitchAnalysis::Flatten() {
-    const auto end = static_cast<std::ptrdiff_t>(m_band.size());
-    auto& s = m_spectrum;
-    auto& magnitudes = m_magnitudes;
-    for (std::size_t bin = 0; bin < m_band.size(); ++bin)
+    const auto& band = m_tables->band;
+    const auto end = static_cast<std::ptrdiff_t>(band.size());
+    const auto s = m_spectrum;
+    const auto magnitudes = m_magnitudes;
+    for (std::size_t bin = 0; bin < band.size(); ++bin)
         magnitudes[bin] = s[2 * bin] * s[2 * bin] + s[2 * bin + 1] * s[2 * bin + 1];
-    for (std::size_t bin = 0; bin < m_band.size(); ++bin)
-        magnitudes[bin] = FifthRoot(std::max(magnitudes[bin], kLeastPower)) * m_band[bin];
+    for (std::size_t bin = 0; bin < band.size(); ++bin)
+        magnitudes[bin] = FifthRoot(std::max(magnitudes[bin], kLeastPower)) * band[bin];
     std::ranges::fill(s, 0.0f);
     const auto at = [&](std::ptrdiff_t bin) { return magnitudes[static_cast<std::size_t>(bin)]; };
-    const std::ptrdiff_t reach = m_meanBins;
+    const std::ptrdiff_t reach = m_tables->meanBins;
     const float share = kMeanShare / static_cast<float>(2 * reach + 1);
     double sum = 0.0;
     for (std::ptrdiff_t bin = 0; bin < std::min(reach, end); ++bin) sum += static_cast<double>(at(bin));
@@ -214,18 +211,18 @@ void VoicePitchAnalysis::TransformLow() {
     if (!m_loud) return;
     std::copy_n(samples, length, m_spectrum.begin());
     std::fill(m_spectrum.begin() + m_length, m_spectrum.end(), 0.0f);
-    m_fft.DoFFTReal(m_spectrum.data(), m_size, 0);
+    Forward();
 }
 
 void VoicePitchAnalysis::CorrelateLow() {
-    auto& s = m_spectrum;
+    const auto s = m_spectrum;
     s[0] *= s[0];
     s[1] *= s[1];
     for (std::size_t i = 2; i < s.size(); i += 2) {
         s[i] = s[i] * s[i] + s[i + 1] * s[i + 1];
         s[i + 1] = 0.0f;
     }
-    m_fft.DoIFFTReal(s.data(), m_size, 0);
+    Inverse();
     const auto length = static_cast<std::size_t>(m_length);
     for (std::size_t lag = 0; lag < m_nsdf.size(); ++lag) {
         const double energies = m_sums[length - lag] + (m_sums[length] - m_sums[lag]);
@@ -237,7 +234,7 @@ PeriodCandidate VoicePitchAnalysis::CandidateAt(int lag) const {
     const auto at = static_cast<std::size_t>(lag), last = m_nsdf.size() - 2;
     const ParabolaTop top(m_nsdf[at - 1], m_nsdf[at], m_nsdf[at + 1]);
     const double place = lag + top.offset;
-    const auto& flat = m_flat;
+    const auto flat = m_flat;
     auto near = std::clamp<std::size_t>(static_cast<std::size_t>(std::lround(place)), 1, last);
     if (flat[near - 1] > flat[near])
         --near;
@@ -263,7 +260,8 @@ void VoicePitchAnalysis::FindCandidates() {
     std::array<Maximum, kMostPeriods> best{};
     m_count = 0;
     if (!m_loud) return;
-    for (int lag = std::max(static_cast<int>(m_analysisRate / m_highestHz), 2); lag < m_lags - 1; ++lag) {
+    for (int lag = std::max(static_cast<int>(m_analysisRate / m_highestHz), 2); lag < m_tables->lags - 1;
+         ++lag) {
         const auto at = static_cast<std::size_t>(lag);
         const float here = m_nsdf[at];
         const bool isPeak =

@@ -3,15 +3,16 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <span>
 #include <utility>
-#include <vector>
 
+#include "DSP/Parts/Arena.h"
 #include "DSP/Parts/Biquad.h"
 #include "DSP/Parts/SampleHistory.h"
 #include "DSP/Pitch/VoicePitchDetector.h"
 #include "DSP/Pitch/VoicePitchPath.h"
-#include "Spectrum/Fft/CorvoFFT.h"
+#include "DSP/Pitch/VoicePitchTables.h"
 
 namespace Corvo::DSP {
 
@@ -27,7 +28,13 @@ namespace Corvo::DSP {
 // So the flattened spectrum is two steps older than the rest, which shortens the delay by as much.
 class VoicePitchAnalysis {
 public:
+    // Throws std::bad_alloc.
     explicit VoicePitchAnalysis(const VoicePitchSettings& settings);
+    // Takes the memory to work in, or makes its own.
+    void Prepare(Arena& arena);
+    void Prepare() {
+        ReserveFor(m_memory, [this](Arena& arena) { Prepare(arena); });
+    }
     void Clear();
     void SetHighest(double hz);
     void SetSilence(double decibels);
@@ -57,6 +64,8 @@ private:
 
     void Take(double sample);
     void Work();
+    void Forward();
+    void Inverse();
     void TransformFull();
     void CorrelateFull();
     void Flatten();
@@ -69,10 +78,11 @@ private:
     std::pair<double, int> Measure(double period);
 
     double m_rate, m_lowestHz, m_highestHz = 0.0, m_silencePower = 0.0;
+    std::shared_ptr<const VoicePitchTables> m_tables;
+    double m_analysisRate;  // of the decimated samples
     int m_decimation, m_step, m_hop;
-    double m_analysisRate;         // of the decimated samples
-    int m_length, m_lags, m_size;  // of frame and transform, in decimated samples
-    int m_longestPiece;            // of the second measurement, in samples
+    int m_length;        // of the frame, in decimated samples
+    int m_longestPiece;  // of the second measurement, in samples
 
     Biquad m_highPass, m_low1, m_low2, m_alias1, m_alias2;
     SampleHistory<float> m_low;              // at full rate
@@ -80,21 +90,20 @@ private:
     std::int64_t m_given = 0, m_frameEnd = 0;
     int m_untilDecimated = 0, m_untilStep = 0, m_stepInHop = 0;
 
-    CorvoFFT m_fft;
-    std::vector<float> m_window, m_overlap;   // the window's own autocorrelation
-    std::vector<float> m_band, m_magnitudes;  // of the flattened spectrum
-    int m_meanBins = 1;
-    std::vector<float> m_spectrum;      // packed, then an autocorrelation
-    std::vector<float> m_nsdf, m_flat;  // by lag, of the low band and of the flattened spectrum
-    std::vector<double> m_sums;         // of squares in front of each sample of the frame
-    std::vector<double> m_pieceSums;
+    Arena m_memory;                   // where it has its own
+    float* m_work = nullptr;          // of the transform
+    std::span<float> m_magnitudes;    // of the flattened spectrum
+    std::span<float> m_spectrum;      // packed, then an autocorrelation
+    std::span<float> m_nsdf, m_flat;  // by lag, of the low band and of the flattened spectrum
+    double* m_sums = nullptr;         // of squares in front of each sample of the frame
+    double* m_pieceSums = nullptr;
     bool m_loud = false;
 
     VoicePitchPath m_path;
     std::array<PeriodCandidate, kMostPeriods> m_periods{};
     std::array<VoicePitchCandidate, kMostPeriods> m_candidates{};
     std::size_t m_count = 0;
-    std::array<VoicePitchFrame, kKept> m_frames{};
+    VoicePitchFrame* m_frames = nullptr;  // kKept
     std::uint64_t m_made = 0, m_taken = 0;
 };
 

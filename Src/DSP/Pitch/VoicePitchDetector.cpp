@@ -6,7 +6,10 @@
 namespace Corvo::DSP {
 
 VoicePitchDetector::VoicePitchDetector(const VoicePitchSettings& settings)
-    : m_analysis(std::make_unique<VoicePitchAnalysis>(settings)) {}
+    : m_analysis(std::make_unique<VoicePitchAnalysis>(settings)) {
+    m_analysis->Prepare();
+    m_analysis->Clear();
+}
 VoicePitchDetector::~VoicePitchDetector() = default;
 
 void VoicePitchDetector::Clear() { m_analysis->Clear(); }

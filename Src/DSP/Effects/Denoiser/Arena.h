@@ -5,50 +5,12 @@
 #include <cstdint>
 #include <vector>
 
+#include "DSP/Parts/Arena.h"
 #include "Platform/AlignedMemory.h"
-#include "Platform/UntouchedZeros.h"
 
 namespace Corvo::DSP::Denoising {
 
 using Floats = std::vector<float, AlignedAllocator<float>>;
-
-// Zeroed memory that is handed out from the front, and all at once given back by Reset: what the reducer's
-// parts work in when the settings, and with them the parts, change while audio runs. Without memory of its
-// own it only counts, so that the same code says how much is needed.
-class Arena {
-public:
-    void Reserve(std::size_t count) {
-        m_memory = UntouchedZeros<float>(count);
-        m_taken = 0;
-    }
-    void Reset() {
-        std::fill_n(m_memory.begin(), std::min(m_taken, m_memory.size()), 0.0f);
-        m_taken = 0;
-    }
-    std::size_t Taken() const { return m_taken; }
-    bool Counting() const { return m_memory.empty(); }
-
-    // `count` floats from a cache line on; null while counting.
-    float* Take(std::size_t count) {
-        const std::size_t from = m_taken;
-        m_taken += (count + kLine - 1) / kLine * kLine;
-        return m_taken <= m_memory.size() ? m_memory.data() + from : nullptr;
-    }
-
-private:
-    static constexpr std::size_t kLine = 16;
-
-    UntouchedZeros<float> m_memory;
-    std::size_t m_taken = 0;
-};
-
-// Memory for all that `lay` takes out of an arena; called twice.
-void ReserveFor(Arena& arena, const auto& lay) {
-    Arena counting;
-    lay(counting);
-    arena.Reserve(counting.Taken());
-    lay(arena);
-}
 
 // The newest frames of a spectrum. A frame before the first is the first one.
 class FrameRing {

@@ -2,10 +2,11 @@
 
 #include <algorithm>
 #include <cmath>
-#include <mutex>
+#include <new>
 #include <numbers>
 #include <vector>
 
+#include "DSP/Parts/SharedTables.h"
 #include "Spectrum/Fft/SplitTransform.h"
 
 namespace Corvo::DSP::Denoising {
@@ -58,16 +59,6 @@ ReducerTables::ReducerTables(double forRate) : rate(forRate), scale(Scale::Of(fo
     tracker.Prepare(static_cast<std::size_t>(shapes[kTrackIndex].length) / 2 + 1);
 }
 
-std::shared_ptr<const ReducerTables> TablesFor(double rate) {
-    static std::mutex mutex;
-    static std::vector<std::weak_ptr<const ReducerTables>> all;
-    const std::lock_guard lock(mutex);
-    std::erase_if(all, [](const auto& tables) { return tables.expired(); });
-    for (const auto& tables : all)
-        if (auto found = tables.lock(); found && found->rate == rate) return found;
-    auto made = std::make_shared<const ReducerTables>(rate);
-    all.push_back(made);
-    return made;
-}
+std::shared_ptr<const ReducerTables> TablesFor(double rate) { return SharedTables<ReducerTables>(rate); }
 
 }  // namespace Corvo::DSP::Denoising

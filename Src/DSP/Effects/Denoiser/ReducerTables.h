@@ -27,6 +27,7 @@ struct WindowShape {
 struct ReducerTables {
     // Allocates; throws std::bad_alloc.
     explicit ReducerTables(double rate);
+    bool IsFor(double otherRate) const { return otherRate == rate; }
 
     const double rate;
     const Scale scale;

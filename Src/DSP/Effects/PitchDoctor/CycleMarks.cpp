@@ -19,17 +19,20 @@ constexpr int kMargin = 8;
 
 CycleMarks::CycleMarks(double rate, double longestPeriod, int latency)
     : m_rate(rate),
+      m_longestPeriod(longestPeriod),
       m_latency(latency),
       m_step(std::max(static_cast<int>(std::lround(rate / kStepRate)), 1)),
       m_unvoicedDistance(kUnvoicedSeconds * rate),
       m_low1(Biquad::LowPass(kLowPassHz, Biquad::kFirstOfFour, rate)),
-      m_low2(Biquad::LowPass(kLowPassHz, Biquad::kSecondOfFour, rate)) {
+      m_low2(Biquad::LowPass(kLowPassHz, Biquad::kSecondOfFour, rate)) {}
+
+void CycleMarks::Prepare(Arena& arena) {
     const auto most =
-        static_cast<std::int64_t>(3.0 * longestPeriod + 4.0 * m_unvoicedDistance) + latency + 64;
-    m_low.Allocate(most);
-    m_energy.Allocate(most);
-    m_sums.resize(static_cast<std::size_t>(1.5 * longestPeriod) + 64);
-    Clear();
+        static_cast<std::int64_t>(3.0 * m_longestPeriod + 4.0 * m_unvoicedDistance) + m_latency + 64;
+    m_low.Prepare(arena, most);
+    m_energy.Prepare(arena, most);
+    m_sums = arena.Take<double>(static_cast<std::size_t>(1.5 * m_longestPeriod) + 64);
+    m_marks = {arena.Take<Mark>(kKept), kKept};
 }
 
 void CycleMarks::Clear() {

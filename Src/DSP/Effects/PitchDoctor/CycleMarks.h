@@ -1,9 +1,8 @@
 #pragma once
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
-#include <vector>
+#include <span>
 
 #include "DSP/Effects/PitchDoctor/PitchTrack.h"
 #include "DSP/Parts/Biquad.h"
@@ -21,8 +20,10 @@ public:
         bool voiced = false;
     };
 
-    // All memory is made here. `latency`: how far the output is behind the input.
+    // `latency`: how far the output is behind the input.
     CycleMarks(double rate, double longestPeriod, int latency);
+    // Takes the memory to work in; Clear comes next.
+    void Prepare(Arena& arena);
     void Clear();
     void Push(double sample);
     // Sets the marks that what was pushed, and what is known of the voice, allow for.
@@ -47,14 +48,16 @@ private:
     double FromEnergy(double place, double period) const;
     double FromLikeness(double place, double next, double period);
 
-    double m_rate;
+    static constexpr std::size_t kKept = 1024;
+
+    double m_rate, m_longestPeriod;
     int m_latency, m_step;
     double m_unvoicedDistance;
     Biquad m_low1, m_low2;
     double m_last = 0.0;
     SampleHistory<float> m_low, m_energy;  // below 2000 Hz; squares of the differences
-    std::vector<double> m_sums;
-    std::array<Mark, 1024> m_marks{};
+    double* m_sums = nullptr;
+    std::span<Mark> m_marks;
     std::int64_t m_first = 0, m_end = 0;
 };
 

@@ -131,8 +131,12 @@ void Filter(const std::array<double, kTaps>& taps, const double* in, double* out
 
 }  // namespace
 
-void GrainSynthesis::Clear() {
+void GrainSynthesis::Prepare(Arena& arena) {
     Sincs();  // made here, not while processing
+    m_grains = {arena.Take<Grain>(kKept), kKept};
+}
+
+void GrainSynthesis::Clear() {
     m_firstGrain = m_endGrain = 0;
     m_mark = -1;
     m_centre = m_rendered = 0.0;

@@ -3,6 +3,7 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
+#include <span>
 
 #include "DSP/Effects/PitchDoctor/CycleMarks.h"
 #include "DSP/Effects/PitchDoctor/PitchTrack.h"
@@ -23,6 +24,8 @@ public:
     static constexpr int kMostFrames = 32;
 
     explicit GrainSynthesis(double rate) : m_rate(rate) {}
+    // Takes the memory to work in.
+    void Prepare(Arena& arena);
     void Clear();
     void Rebase(double samples);
 
@@ -37,6 +40,7 @@ public:
 
 private:
     static constexpr int kTaps = 16;
+    static constexpr std::size_t kKept = 64;
     struct Grain {
         double centre = 0.0;             // in the output
         double mark = 0.0;               // in the input
@@ -57,7 +61,7 @@ private:
     double Speed(const CycleMarks::Mark& mark, double ratio, const GrainSettings& settings) const;
 
     double m_rate;
-    std::array<Grain, 64> m_grains{};
+    std::span<Grain> m_grains;
     std::int64_t m_firstGrain = 0, m_endGrain = 0;
     std::int64_t m_mark = -1;  // of the newest grain
     double m_centre = 0.0, m_ratio = 1.0;

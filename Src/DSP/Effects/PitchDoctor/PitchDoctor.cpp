@@ -19,18 +19,25 @@ constexpr std::uint32_t kFields = kWordsOf<PitchDoctorSettings>;
 
 // One engine for each lowest pitch, so that choosing another one makes no memory.
 struct PitchDoctor::Engines {
+    Arena memory;  // of which only what is in use takes pages
     std::array<std::unique_ptr<PitchDoctorEngine>, kLowestPitches.size()> all;
     PitchDoctorEngine* inUse = nullptr;  // null until prepared
     std::uint32_t rate = 0;
-    std::atomic<bool> published{false};  // an editor wants readings
-    PitchReadingRing readings;
+    std::unique_ptr<PitchReadingRing> readings;         // the editor's thread's, from its first editor on
+    std::atomic<PitchReadingRing*> published{nullptr};  // while an editor wants readings
 
     void Prepare(std::uint32_t wanted) {
         inUse = nullptr;
         if (rate == wanted) return;
         rate = 0;  // should memory run out
+        all = {};
+        decltype(all) made;
         for (std::size_t i = 0; i < all.size(); ++i)
-            all[i] = std::make_unique<PitchDoctorEngine>(wanted, kLowestPitches[i]);
+            made[i] = std::make_unique<PitchDoctorEngine>(wanted, kLowestPitches[i]);
+        ReserveFor(memory, [&](Arena& arena) {
+            for (auto& engine : made) engine->Prepare(arena);
+        });
+        all = std::move(made);
         rate = wanted;
     }
     void Use(PitchDoctorEngine* engine) {
@@ -40,8 +47,7 @@ struct PitchDoctor::Engines {
     template <typename Sample>
     void Run(std::array<Sample*, MaxNumChannels> samples, int channels, int frames, std::ptrdiff_t stride) {
         if (frames < 1 || channels < 1 || !inUse) return;
-        const bool wanted = published.load(std::memory_order_relaxed);
-        inUse->Process(samples, channels, frames, stride, wanted ? &readings : nullptr);
+        inUse->Process(samples, channels, frames, stride, published.load(std::memory_order_acquire));
     }
 };
 
@@ -73,11 +79,15 @@ int PitchDoctor::GetLatency() {
 }
 
 void PitchDoctor::SetEditor(BuiltinEditor* editor) {
+    auto& ring = m_engines->readings;
+    if (editor && !ring) ring = std::make_unique<PitchReadingRing>();
     CorvoEffectBase::SetEditor(editor);
-    m_engines->published.store(editor != nullptr, std::memory_order_relaxed);
+    m_engines->published.store(editor ? ring.get() : nullptr, std::memory_order_release);
 }
 
-void PitchDoctor::TakeReadings(std::vector<PitchReading>& readings) { m_engines->readings.Take(readings); }
+void PitchDoctor::TakeReadings(std::vector<PitchReading>& readings) {
+    if (m_engines->readings) m_engines->readings->Take(readings);
+}
 
 template <typename Edit>
 void PitchDoctor::WatchingLatency(Edit edit) {

@@ -63,9 +63,9 @@ static_assert(sizeof(PitchDoctorSettings) == 4 * 32);
 //
 // Settings chunk: 136 bytes, the number 1, the number of settings (32), the settings. A chunk of fewer
 // settings leaves the others at their defaults, of more the rest is not read. Values out of range are kept,
-// and limited where they are used. Memory: about 1.5 MB at 48 kHz, and in proportion to the rate, which
-// counts as 768 kHz above that; a format that InitProcessing did not announce makes its own in the first
-// block that has it.
+// and limited where they are used. Memory: 1.3 MB at 48 kHz, and in proportion to the rate, which counts as
+// 768 kHz above that. Its pages are used while sound plays, by the lowest pitch chosen: 240 to 430 KB. A
+// format that InitProcessing did not announce makes its own memory in the first block that has it.
 class DSP_API PitchDoctor : public CorvoEffectBase {
 public:
     PitchDoctor();

@@ -31,17 +31,23 @@ int PitchDoctorEngine::LatencyOf(double rate, double lowestHz) {
 }
 
 PitchDoctorEngine::PitchDoctorEngine(double rate, double lowestHz)
-    : m_latency(LatencyOf(rate, lowestHz)),
+    : m_longestPeriod(LongestPeriod(rate, lowestHz)),
+      m_latency(LatencyOf(rate, lowestHz)),
       m_mixShare(1.0 - std::exp(-1.0 / (kMixSeconds * rate))),
       m_detector(DetectorSettings(rate, lowestHz)),
       m_track(rate),
-      m_control(m_detector.HopSamples() / rate),
-      m_marks(rate, LongestPeriod(rate, lowestHz), m_latency),
+      m_control(m_detector.Hop() / rate),
+      m_marks(rate, m_longestPeriod, m_latency),
       m_grains(rate),
-      m_behind(kKeptSeconds * rate) {
+      m_behind(kKeptSeconds * rate) {}
+
+void PitchDoctorEngine::Prepare(Arena& arena) {
+    m_detector.Prepare(arena);
+    m_track.Prepare(arena);
+    m_marks.Prepare(arena);
+    m_grains.Prepare(arena);
     for (auto& input : m_input)
-        input.Allocate(m_latency + static_cast<std::int64_t>(3.0 * LongestPeriod(rate, lowestHz)) + 64);
-    Clear();
+        input.Prepare(arena, m_latency + static_cast<std::int64_t>(3.0 * m_longestPeriod) + 64);
 }
 
 void PitchDoctorEngine::Clear(std::int64_t start) {
@@ -51,7 +57,7 @@ void PitchDoctorEngine::Clear(std::int64_t start) {
     m_marks.Clear();
     m_grains.Clear();
     for (auto& input : m_input) input.Clear();
-    m_untilStep = m_detector.StepSamples();
+    m_untilStep = m_detector.Step();
     m_origin = 0;
     m_start = start;
     m_fresh = true;
@@ -92,14 +98,14 @@ void PitchDoctorEngine::Run(int channels, int frames) {
 
 void PitchDoctorEngine::Step(PitchReadingRing* readings) {
     VoicePitchFrame frame;
-    while (m_detector.Take(frame)) {
+    while (m_detector.TakeFrame(frame)) {
         m_control.Step(m_track, static_cast<double>(frame.end - m_origin) - frame.age, frame.hz,
                        m_voice.scale, m_voice.control);
         if (readings) Publish(*readings);
     }
     m_marks.Extend(m_track);
     const auto output = static_cast<double>(m_input[0].End() - m_latency);
-    m_grains.Place(m_marks, m_track, m_voice.grains, output + m_detector.StepSamples() - 1);
+    m_grains.Place(m_marks, m_track, m_voice.grains, output + m_detector.Step() - 1);
     m_marks.Forget(output - m_behind, m_grains.Newest() - 2);
     if (m_input[0].End() >= kRebaseAt) Rebase();
 }

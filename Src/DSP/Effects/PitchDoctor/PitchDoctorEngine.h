@@ -12,7 +12,7 @@
 #include "DSP/Effects/PitchDoctor/PitchScale.h"
 #include "DSP/Effects/PitchDoctor/PitchTrack.h"
 #include "DSP/Parts/SampleHistory.h"
-#include "DSP/Pitch/VoicePitchDetector.h"
+#include "DSP/Pitch/VoicePitchAnalysis.h"
 #include "Threads/RecentValues.h"
 
 namespace Corvo::DSP {
@@ -31,8 +31,10 @@ struct PitchDoctorVoice {
 // stream, so that the output does not depend on how it is cut.
 class PitchDoctorEngine {
 public:
-    // All memory is made here.
+    // Throws std::bad_alloc.
     PitchDoctorEngine(double rate, double lowestHz);
+    // Takes the memory to work in; Clear comes next.
+    void Prepare(Arena& arena);
     static int LatencyOf(double rate, double lowestHz);
 
     int Latency() const { return m_latency; }
@@ -57,7 +59,7 @@ public:
                     *samples[c] = static_cast<Sample>(m_block[c][static_cast<std::size_t>(i)]);
             frames -= count;
             if ((m_untilStep -= count) > 0) continue;
-            m_untilStep = m_detector.StepSamples();
+            m_untilStep = m_detector.Step();
             Step(readings);
         }
     }
@@ -70,9 +72,10 @@ private:
     void Publish(PitchReadingRing& readings) const;
     void Rebase();
 
+    double m_longestPeriod;
     int m_latency;
     double m_mixShare;  // of the way to a new mix that each frame goes
-    VoicePitchDetector m_detector;
+    VoicePitchAnalysis m_detector;
     PitchTrack m_track;
     PitchControl m_control;
     CycleMarks m_marks;

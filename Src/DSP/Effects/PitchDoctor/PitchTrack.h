@@ -1,9 +1,11 @@
 #pragma once
 
 #include <algorithm>
-#include <array>
 #include <cstddef>
 #include <cstdint>
+#include <span>
+
+#include "DSP/Parts/Arena.h"
 
 namespace Corvo::DSP {
 
@@ -21,6 +23,7 @@ public:
     };
 
     explicit PitchTrack(double rate) : m_rate(rate) {}
+    void Prepare(Arena& arena) { m_frames = {arena.Take<Frame>(kKept), kKept}; }
     void Clear() { m_count = 0; }
     Frame& Add(const Frame& frame) { return At(m_count++) = frame; }
     std::int64_t Count() const { return m_count; }
@@ -74,6 +77,7 @@ public:
     }
 
 private:
+    static constexpr std::size_t kKept = 256;
     static constexpr double kReferenceRate = 48000.0, kAnyHz = 120.0;
     static constexpr int kSlopeFrames = 3;
     static constexpr double kSteepest = 0.06, kFarthest = 400.0;  // cents per sample and samples at 48 kHz
@@ -94,7 +98,7 @@ private:
     }
 
     double m_rate;
-    std::array<Frame, 256> m_frames{};
+    std::span<Frame> m_frames;
     std::int64_t m_count = 0;
 };
 

@@ -80,16 +80,19 @@ TEST_F(PitchShiftTest, OnlyNewLocksWhileItProcesses) {
             ASSERT_TRUE(backEnd == 1 ? locksOnly : broken.empty()) << broken << ", block " << i;
         }
         m_block.resize(2 * 8192);
-        for (const float pitch : {0.0f, 1.0f}) {
-            PitchShift effect;
-            effect.SetPreset(0);
-            effect.SetParam(0, pitch, false);
-            effect.InitProcessing(8192, &format);
-            for (int i = 0; i < 20; ++i) {
-                const auto broken = BrokenBy([&] { ProcessBlock(effect, m_block.data(), 8192, format); });
-                ASSERT_EQ(broken.find("alloc"), broken.npos) << pitch << ", block " << i;
+        for (const int channels : {1, 2, 15})
+            for (const float pitch : {0.0f, 0.5f, 1.0f}) {
+                const auto wide = Format<float>(channels, rate);
+                const int frames = 2 * 8192 / channels;
+                PitchShift effect;
+                effect.SetPreset(0);
+                effect.SetParam(0, pitch, false);
+                effect.InitProcessing(frames, &wide);
+                for (int i = 0; i < 20; ++i) {
+                    const auto broken = BrokenBy([&] { ProcessBlock(effect, m_block.data(), frames, wide); });
+                    ASSERT_EQ(broken.find("alloc"), broken.npos) << channels << ", " << pitch << ", " << i;
+                }
             }
-        }
     }
 }
 
