@@ -54,6 +54,15 @@ public:
             sum += m_pairs[k] * _mm256_load_pd(row + PolePairLowPass::ChangeAt(k));
         _mm_store_pd(out, _mm256_castpd256_pd128(sum) + _mm256_extractf128_pd(sum, 1));
     }
+    // Both at once wait less for each other's sums.
+    void TwoOutputs(const double* row, const double* next, double* out) const {
+        __m256d sum = m_sample * _mm256_load_pd(row), other = m_sample * _mm256_load_pd(next);
+        for (std::size_t k = 0; k < State::kPairs; ++k) {
+            sum += m_pairs[k] * _mm256_load_pd(row + PolePairLowPass::ChangeAt(k));
+            other += m_pairs[k] * _mm256_load_pd(next + PolePairLowPass::ChangeAt(k));
+        }
+        _mm256_storeu_pd(out, Lower(sum, other) + Upper(sum, other));
+    }
 
 private:
     static __m256d Beside(__m128d low, __m128d high) {
