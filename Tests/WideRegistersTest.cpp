@@ -95,23 +95,29 @@ TEST_F(WideRegisters, OfTheClassicShifter) {
     const auto run = [&](const Kernels& kernels, double over) {
         std::vector<std::int32_t> last(kBins), target(kBins);
         Floats strength(kBins), frequency(kBins), sum(kBins);
-        std::vector<double> phase(kBins);
+        std::vector<double> phase(kBins), advance(kBins), found(kBins), all;
         for (const float pitch : {0.5f, 1.7f, -0.001f, 1.0f}) {
             auto input = Noise<float>(kBins, pitch);
             input[3] = 0.0f;
             input[4] = -0.0f;
-            kernels.analyse(
-                {input.data(), window.data(), table.data(), table.data() + kBins, table.data() + 2 * kBins,
-                 pitch, last.data(), strength.data(), frequency.data(), target.data()},
-                kBins);
-            kernels.synthesise({strength.data(), frequency.data(), window.data(), 187.5, 0.7, over,
-                                128 * over, phase.data(), sum.data()},
-                               kBins);
+            kernels.place({pitch, target.data()}, kBins);
+            kernels.analyse({input.data(), window.data(), table.data(), table.data() + kBins,
+                             table.data() + 2 * kBins, last.data(), strength.data(), frequency.data()},
+                            kBins);
+            kernels.advance({frequency.data(), target.data(), pitch, 187.5, 0.7, over, advance.data()},
+                            kBins);
+            kernels.analyseStanding({input.data() + 1, window.data(), advance.data(), window.data(),
+                                     phase.data(), last.data(), strength.data(), found.data()},
+                                    kBins - 1);
+            kernels.synthesise(
+                {strength.data(), found.data(), window.data(), 128 * over, phase.data(), sum.data()}, kBins);
+            for (const auto* each : {&strength, &frequency, &sum})
+                all.insert(all.end(), each->begin(), each->end());
+            for (const auto* each : {&last, &target}) all.insert(all.end(), each->begin(), each->end());
+            for (const auto* each : {&phase, &advance, &found})
+                all.insert(all.end(), each->begin(), each->end());
         }
-        for (const auto* each : {&strength, &frequency, &sum})
-            phase.insert(phase.end(), each->begin(), each->end());
-        for (const auto* each : {&last, &target}) phase.insert(phase.end(), each->begin(), each->end());
-        return phase;
+        return all;
     };
     for (const double over : {3.0, 4.0})
         ExpectSameBits(run(BaselineKernels(), over), run(Avx2Kernels(), over));

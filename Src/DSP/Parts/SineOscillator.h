@@ -51,34 +51,30 @@ public:
 
     // The sines of the `frames` phases after this one, at most kPiece; the last of them becomes the phase.
     void StepAndTakeSines(double* sines, int frames) {
-        Turn(sines, frames, 1);
+        const double sine = std::sin(m_phase), cosine = std::cos(m_phase);
+        const double *cosines = m_cosines.data() + 1, *sinesOfTurns = m_sines.data() + 1;
+        for (int i = 0; i < frames; ++i) sines[i] = sine * cosines[i] + cosine * sinesOfTurns[i];
         m_phase = PhaseAfter(m_phase, m_increment, frames);
     }
 
-    // The sines of up to `frames` phases from this one on, at most kPiece. Ends early with the step that
-    // reaches `cycle`, which is taken off the phase. Returns how many there are.
-    int TakeSinesAndStep(double* sines, int frames, double cycle) {
+    // Steps up to `frames` times; ends early with the step that reaches `cycle`, which is taken off the
+    // phase. Returns how often.
+    int StepWithin(double cycle, int frames) {
         const double end = PhaseAfter(m_phase, m_increment, frames);
-        int taken = frames;
         if (end < cycle) {
-            Turn(sines, frames, 0);
             m_phase = end;
-        } else {
-            double phase = m_phase + m_increment;
-            for (taken = 1; phase < cycle; ++taken) phase += m_increment;
-            Turn(sines, taken, 0);
-            m_phase = phase - cycle;
+            return frames;
         }
+        int taken = 1;
+        for (m_phase += m_increment; m_phase < cycle; ++taken) m_phase += m_increment;
+        m_phase -= cycle;
         return taken;
     }
+    // Cosines and sines of 0 to kPiece increments, for those who turn by themselves.
+    const double* TurnedCosines() const { return m_cosines.data(); }
+    const double* TurnedSines() const { return m_sines.data(); }
 
 private:
-    void Turn(double* sines, int frames, std::size_t first) const {
-        const double sine = std::sin(m_phase), cosine = std::cos(m_phase);
-        const double *turnedCosines = m_cosines.data() + first, *turnedSines = m_sines.data() + first;
-        for (int i = 0; i < frames; ++i) sines[i] = sine * turnedCosines[i] + cosine * turnedSines[i];
-    }
-
     double m_phase = 0.0, m_increment = 0.0;
     // Of 0, 1, 2 ... kPiece increments; the turn by nothing is what others are built from.
     std::array<double, kPiece + 1> m_cosines = AllOnes(), m_sines{};

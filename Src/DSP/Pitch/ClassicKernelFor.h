@@ -16,37 +16,42 @@ inline double Nearest(double x) {
     return x + kShift - kShift;
 }
 
-// Cosine to 1e-10, which is far below the float that becomes of it. Without a call, so that the loop around
-// it fills the registers.
+// Cosine to 1e-10, which is far below the float that becomes of it, for |x| up to a little over pi. Without a
+// call, so that the loop around it fills the registers.
 inline double Cosine(double x) {
-    const double turns = Nearest(x * (1.0 / kPi));
-    const double r = x - turns * kPi, r2 = r * r;
-    const double odd = turns - 2.0 * Nearest(turns * 0.5);  // -1, 0 or 1
+    const double halfTurns = Nearest(x * (1.0 / kPi));  // -1, 0 or 1
+    const double r = x - halfTurns * kPi, r2 = r * r;
     constexpr double kTerms[] = {1.0 / 479001600.0, -1.0 / 3628800.0, 1.0 / 40320.0,
                                  -1.0 / 720.0,      1.0 / 24.0,       -0.5};
     double sum = -1.0 / 87178291200.0;
     for (const double term : kTerms) sum = sum * r2 + term;
-    return (1.0 + sum * r2) * (1.0 - 2.0 * odd * odd);
+    const double cosine = 1.0 + sum * r2;
+    return halfTurns == 0.0 ? cosine : -cosine;
 }
 
-void Analyse(const Analysis& a, std::size_t bins) {
+template <typename Number>
+void Analyse(const Analysis<Number>& a, std::size_t bins) {
     const auto count = static_cast<std::int32_t>(bins);
-    const float pitch = a.pitch;
     for (std::int32_t k = 0; k < count; ++k) {
         const auto value = static_cast<float>(static_cast<double>(a.input[k]) * a.window[k]);
         const auto bits = __builtin_bit_cast(std::int32_t, value);  // the sign of -0 counts too
         const bool changed = (bits ^ a.last[k]) < 0;
-        const float same = a.steady[k], down = a.fell[k], up = a.rose[k];
-        const float moved = bits < 0 ? down : up;
+        const Number same = a.steady[k], down = a.fell[k], up = a.rose[k];
+        const Number moved = bits < 0 ? down : up;
         a.last[k] = bits;
-        a.frequency[k] = (changed ? moved : same) * pitch;
+        a.found[k] = changed ? moved : same;
     }
     // A loop of its own: with too many arrays to tell apart the compiler makes no vectors.
+    for (std::int32_t k = 0; k < count; ++k)
+        a.strength[k] = 2.0f * __builtin_fabsf(__builtin_bit_cast(float, a.last[k]));
+}
+
+void Place(const Placement& p, std::size_t bins) {
+    const auto count = static_cast<std::int32_t>(bins);
     const auto beyond = static_cast<float>(count);
     for (std::int32_t k = 0; k < count; ++k) {
-        a.strength[k] = 2.0f * __builtin_fabsf(__builtin_bit_cast(float, a.last[k]));
-        const float place = static_cast<float>(k) * pitch;
-        a.target[k] = static_cast<std::int32_t>(place > -1.0f && place < beyond ? place : beyond);
+        const float place = static_cast<float>(k) * p.pitch;
+        p.target[k] = static_cast<std::int32_t>(place > -1.0f && place < beyond ? place : beyond);
     }
 }
 
@@ -61,33 +66,45 @@ struct PowerOfTwo {
     double Under(double x) const { return x * inverse; }
 };
 
-template <typename Divisor>
-void SynthesiseWith(const Synthesis& s, std::size_t bins) {
-    const double binWidth = s.binWidth, expected = s.expectedPhase;
-    const Divisor oversampling{s.oversampling}, scale{s.scale};
-    const auto count = static_cast<std::int32_t>(bins);
-    for (std::int32_t k = 0; k < count; ++k) {
-        const auto bin = static_cast<double>(k);
-        const double off = (static_cast<double>(s.frequency[k]) - bin * binWidth) / binWidth;
-        const double sum = s.phase[k] + (oversampling.Under(off * (2.0 * kPi)) + bin * expected);
-        const double phase = sum - 2.0 * kPi * Nearest(sum * (0.5 / kPi));
-        s.phase[k] = phase;
-        const auto value = static_cast<float>(static_cast<double>(s.magnitude[k]) * Cosine(phase));
-        s.accumulator[k] = static_cast<float>(static_cast<double>(s.accumulator[k]) +
-                                              scale.Under(2.0 * s.window[k] * static_cast<double>(value)));
-    }
-}
-
-// The frame's size is a power of two, so that both divisors are one or neither.
-void Synthesise(const Synthesis& s, std::size_t bins) {
-    const auto oversampling = static_cast<std::uint32_t>(s.oversampling);
-    if ((oversampling & (oversampling - 1)) == 0)
-        SynthesiseWith<PowerOfTwo>(s, bins);
+// run(divisor) with the quicker one.
+template <typename Run>
+void WithDivisor(double value, Run run) {
+    const auto whole = static_cast<std::uint32_t>(value);
+    if ((whole & (whole - 1)) == 0)
+        run(PowerOfTwo(value));
     else
-        SynthesiseWith<AnyDivisor>(s, bins);
+        run(AnyDivisor{value});
 }
 
-constexpr Kernels kKernels{Analyse, Synthesise};
+void TakeAdvance(const Advance& a, std::size_t bins) {
+    WithDivisor(a.oversampling, [&](auto oversampling) {
+        const double binWidth = a.binWidth, expected = a.expectedPhase;
+        const auto count = static_cast<std::int32_t>(bins);
+        for (std::int32_t k = 0; k < count; ++k) {
+            const auto bin = static_cast<double>(a.target[k]);
+            const auto frequency = static_cast<double>(a.frequency[k] * a.pitch);
+            const double off = (frequency - bin * binWidth) / binWidth;
+            a.advance[k] = oversampling.Under(off * (2.0 * kPi)) + bin * expected;
+        }
+    });
+}
+
+void Synthesise(const Synthesis& s, std::size_t bins) {
+    WithDivisor(s.scale, [&](auto scale) {
+        const auto count = static_cast<std::int32_t>(bins);
+        for (std::int32_t k = 0; k < count; ++k) {
+            const double sum = s.phase[k] + s.advance[k];
+            const double phase = sum - 2.0 * kPi * Nearest(sum * (0.5 / kPi));
+            s.phase[k] = phase;
+            const auto value = static_cast<float>(static_cast<double>(s.magnitude[k]) * Cosine(phase));
+            s.accumulator[k] =
+                static_cast<float>(static_cast<double>(s.accumulator[k]) +
+                                   scale.Under(2.0 * s.window[k] * static_cast<double>(value)));
+        }
+    });
+}
+
+constexpr Kernels kKernels{Analyse<float>, Analyse<double>, Place, TakeAdvance, Synthesise};
 
 }  // namespace
 }  // namespace Corvo::DSP::ClassicPitch

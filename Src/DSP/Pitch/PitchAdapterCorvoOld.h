@@ -29,8 +29,15 @@ public:
 private:
     struct Channel;
 
-    void ShiftChannel(Channel& channel, float* samples, int frames, int stride, float factor);
-    void ShiftFrame(Channel& channel, float pitch);
+    // One for each way in which a bin's sign can go from frame to frame.
+    template <typename Number>
+    using Tables = std::array<std::vector<Number>, 3>;
+
+    void TakeAdvances(const Channel& channel, const float* frequencies, float pitch, std::size_t count,
+                      double* advances) const;
+    void Analyse(Channel& channel, Tables<double>& advances, std::size_t bins);
+    void ShiftChannel(std::size_t side, float* samples, int frames, int stride);
+    void ShiftFrame(std::size_t side);
 
     int m_rate = 0;
     std::array<float, 2> m_factors{};  // taken from another thread while audio runs
@@ -39,8 +46,9 @@ private:
     int m_step = 0, m_latency = 0;
     double m_expectedPhase = 0.0, m_binWidth = 0.0;
     std::vector<double> m_window;
-    // Analysis frequency of each bin for the three ways its sign can go from frame to frame; see CookFactors.
-    std::array<std::vector<float>, 3> m_frequencies;
+    Tables<float> m_frequencies;  // of each bin before it is moved; see CookFactors
+    std::vector<double> m_emptyAdvances;
+    std::array<Tables<double>, 2> m_advances;  // of each channel's bins, while its pitch stands
     std::unique_ptr<std::array<Channel, 2>> m_state;
 };
 

@@ -40,9 +40,19 @@ void RunWith(const PolePairLowPass& filter, State& state, Stream& stream) {
     Pairs pairs(state, filter.advance.data());
     const double* const phases = filter.phases.data();
     Stream s = stream;
+    constexpr auto kRow = static_cast<std::ptrdiff_t>(PolePairLowPass::kRow);
     for (;;) {
-        for (; s.step < s.up && s.room > 0; s.step += s.down, s.out += State::kLanes, --s.room)
-            pairs.Output(phases + s.step * static_cast<std::ptrdiff_t>(PolePairLowPass::kRow), s.out);
+        for (; s.step + s.down < s.up && s.room > 1; s.room -= 2) {
+            const double* const row = phases + s.step * kRow;
+            pairs.TwoOutputs(row, row + s.down * kRow, s.out);
+            s.step += 2 * s.down;
+            s.out += 2 * State::kLanes;
+        }
+        for (; s.step < s.up && s.room > 0; --s.room) {
+            pairs.Output(phases + s.step * kRow, s.out);
+            s.step += s.down;
+            s.out += State::kLanes;
+        }
         if (s.step < s.up || s.frames == 0) break;
         s.step -= s.up;
         pairs.Take(s.in);

@@ -31,6 +31,10 @@ public:
             m_value[k] += m_change[k];
         }
     }
+    void TwoOutputs(const double* row, const double* next, double* out) const {
+        Output(row, out);
+        Output(next, out + State::kLanes);
+    }
     void Output(const double* row, double* out) const {
         Lanes even = m_sample * Load(row);
         Lanes odd = m_value[0] * Load(row + PolePairLowPass::ValueAt(0));

@@ -19,15 +19,11 @@ struct PolePairLowPass {
     static constexpr std::size_t kPairs = 5;
     static constexpr std::size_t kLanes = 2;  // every number stands here twice: two channels at once
 
-    // A row of factors: of the sample, -0.0, then of the pairs' c and u, those of two pairs side by side and
-    // the last one's alone. So a register holds two pairs, and all of them start at a multiple of its size.
+    // A row of factors: of the sample, -0.0, then of each pair's c and u. So a wide register holds a pair,
+    // and all of them start at a multiple of its size.
     static constexpr std::size_t kRow = kLanes * (2 + 2 * kPairs);
-    static constexpr std::size_t ChangeAt(std::size_t pair) {
-        return kLanes * (2 + 4 * (pair / 2) + pair % 2);
-    }
-    static constexpr std::size_t ValueAt(std::size_t pair) {
-        return ChangeAt(pair) + (pair + 1 == kPairs ? 1 : 2) * kLanes;
-    }
+    static constexpr std::size_t ChangeAt(std::size_t pair) { return kLanes * (2 + 2 * pair); }
+    static constexpr std::size_t ValueAt(std::size_t pair) { return ChangeAt(pair) + kLanes; }
 
     // Per step j a row: L d (at step 0, else 0) and L times the pairs' factors.
     std::vector<double, Corvo::AlignedAllocator<double>> phases;

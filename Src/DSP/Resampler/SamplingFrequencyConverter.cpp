@@ -17,30 +17,19 @@ using PolePairs::State;
 
 namespace {
 
-constexpr std::size_t kTaps = SamplingFrequencyConverter::kOrder + 1;  // of a history in use
+constexpr int kTaps = SamplingFrequencyConverter::kOrder + 1;  // of a history in use
 
-constexpr double kSilent[State::kLanes]{};
-
-// The newest values of a stream at the raised rate, at most as many as a history holds.
+// The newest values of a group's stream at the raised rate, at most as many as a history holds: what went
+// into the filter, and L times what came out of it.
 struct Newest {
-    std::size_t count = 0;
-    std::array<std::array<double, 2>, kTaps> input, output;  // output: L times the filter's
-
-    void Add(const double* in, const double* out) {
-        if (count == kTaps) {
-            std::shift_left(input.begin(), input.end(), 1);
-            std::shift_left(output.begin(), output.end(), 1);
-            --count;
-        }
-        std::copy_n(in, 2, input[count].data());
-        std::copy_n(out, 2, output[count].data());
-        ++count;
-    }
+    int frames = 0, first = 0, count = 0;  // from step `first` of the oldest of these frames on
+    const double *samples = nullptr, *raised = nullptr;
 };
 
-void Append(double* history, const auto& values, std::size_t count, std::size_t lane, double scale) {
-    std::shift_left(history, history + kTaps, static_cast<std::ptrdiff_t>(count));
-    for (std::size_t i = 0; i < count; ++i) history[kTaps - count + i] = values[i][lane] * scale;
+// Makes room for so many values at the end of a history and returns where they go.
+double* Shifted(double* history, int count) {
+    std::shift_left(history, history + kTaps, count);
+    return history + kTaps - count;
 }
 
 bool AllZero(const double* history) {
@@ -52,6 +41,24 @@ int Advance(int& position, std::int64_t steps, int ringLength) {
     const std::int64_t moved = position + steps;
     position = static_cast<int>(moved % ringLength);
     return static_cast<int>(moved / ringLength);
+}
+
+// Brings histories and ring of one channel up to date.
+void Record(SamplingFrequencyConverter& c, int channel, const Newest& newest, std::size_t lane,
+            int ringPosition) {
+    double* const input = Shifted(c.inputHistory[channel], newest.count);
+    std::fill_n(input, newest.count, 0.0);
+    for (int i = newest.first > 0; i < newest.frames; ++i)
+        input[i * c.up - newest.first] =
+            newest.samples[static_cast<std::size_t>(i) * State::kLanes + lane] * (1.0 / c.lowPass.gain);
+    double* const output = Shifted(c.outputHistory[channel], newest.count);
+    double* const ring = c.rings[channel];
+    const double* raised = newest.raised + lane;
+    for (int i = 0; i < newest.count; ++i, raised += State::kLanes) {
+        output[i] = *raised * (1.0 / c.up);
+        ring[ringPosition] = *raised;
+        if (++ringPosition == c.ringLength) ringPosition = 0;
+    }
 }
 
 // Converts one group, then brings its channels' histories and rings up to date.
@@ -74,34 +81,24 @@ int ConvertGroup(SamplingFrequencyConverter& c, int firstChannel, const Block& b
     }
 
     GroupRun<In, Out, kChannels> run(c, state, block, toNextOutput);
-    const int taps = static_cast<int>(kTaps);
-    const int recorded = std::min(block.frames, (taps + c.up - 1) / c.up);
-    run.Run(block.frames - recorded);
     Newest newest;
-    for (int i = 0; i < recorded; ++i) {
-        run.Run(1);
-        const int first = std::max(0, c.up - taps);
-        const double* output = run.Raised(first);
-        for (int step = first; step < c.up; ++step, output += State::kLanes)
-            newest.Add(step == 0 ? run.Filter().sample : kSilent, output);
-    }
+    newest.frames = std::min(block.frames, (kTaps + c.up - 1) / c.up);
+    newest.first = std::max(0, newest.frames * c.up - kTaps);
+    newest.count = newest.frames * c.up - newest.first;
+    run.Run(block.frames - newest.frames);
+    const State before = run.Filter();
+    run.Run(newest.frames);
+    newest.samples = run.Samples();
+    newest.raised = run.Raised(before, static_cast<std::size_t>(newest.frames), newest.first);
 
     for (std::size_t k = 0; k < State::kPairs; ++k) {
         std::copy_n(run.Filter().value[k], kChannels, stored[2 * k] + firstLane);
         std::copy_n(run.Filter().change[k], kChannels, stored[2 * k + 1] + firstLane);
     }
-    for (std::size_t lane = 0; lane < kChannels; ++lane) {
-        const int channel = firstChannel + static_cast<int>(lane);
-        Append(c.inputHistory[channel], newest.input, newest.count, lane, 1.0 / c.lowPass.gain);
-        Append(c.outputHistory[channel], newest.output, newest.count, lane, 1.0 / c.up);
-        int position = c.writePosition;
-        Advance(position, static_cast<std::int64_t>(block.frames) * c.up - static_cast<int>(newest.count),
-                c.ringLength);
-        for (std::size_t i = 0; i < newest.count; ++i) {
-            c.rings[channel][position] = newest.output[i][lane];
-            Advance(position, 1, c.ringLength);
-        }
-    }
+    int position = c.writePosition;
+    Advance(position, static_cast<std::int64_t>(block.frames) * c.up - newest.count, c.ringLength);
+    for (int lane = 0; lane < kChannels; ++lane)
+        Record(c, firstChannel + lane, newest, static_cast<std::size_t>(lane), position);
     return run.Written();
 }
 

@@ -24,8 +24,8 @@ struct PolePairLowPass;
 //
 // Samples that are not finite count as 0.
 //
-// Cost: 5 to 11 ns for a stereo frame of input at the usual rates, and what the dither takes of each sample
-// that comes out.
+// Cost: 4 to 6 ns for a stereo frame of input at the usual rates in blocks of 512 frames, a third more
+// in blocks of 64, and what the dither takes of each sample that comes out.
 //
 // Copying and moving copy member by member: both objects then point to the same rings, and only one of
 // them may free those. Filter and histories are independent.

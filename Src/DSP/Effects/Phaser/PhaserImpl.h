@@ -2,7 +2,6 @@
 
 #include <array>
 #include <cmath>
-#include <cstddef>
 
 #include "DSP/Parts/SineOscillator.h"
 
@@ -32,36 +31,6 @@ struct PhaserImpl {
     template <typename Sample>
     void ClearUnlessFinite() {
         if (!std::isfinite(static_cast<Sample>(last))) Clear();
-    }
-
-    // The all-passes' coefficients in the next frames, at most a piece of the oscillator. They are the
-    // floats that the library's sines give, to the bit: where the oscillator's may round to another one, the
-    // library is asked.
-    void TakeCoefficients(double* coefficients, int frames) {
-        std::array<double, SineOscillator::kPiece> sines;
-        for (int taken; frames > 0; frames -= taken, coefficients += taken) {
-            double phase = oscillator.Phase();
-            taken = oscillator.TakeSinesAndStep(sines.data(), frames, kCycle);
-            if (Convert(sines.data(), coefficients, taken)) continue;
-            for (int i = 0; i < taken; ++i, phase += oscillator.Increment())
-                sines[static_cast<std::size_t>(i)] = std::sin(phase);
-            Convert(sines.data(), coefficients, taken);
-        }
-    }
-
-private:
-    // False when an error of the sines would show in the coefficients.
-    bool Convert(const double* sines, double* coefficients, int count) const {
-        const double range = maximum - minimum;
-        const double doubt = 1e-13 * std::abs(range) + 1e-15 * (maximum + minimum);
-        int doubtful = 0;
-        for (int i = 0; i < count; ++i) {
-            const double w = (sines[i] + 1.0) * 0.5 * range + minimum;
-            const auto narrow = static_cast<float>(w);
-            doubtful += static_cast<float>(w - doubt) != static_cast<float>(w + doubt);
-            coefficients[i] = (1.0f - narrow) / (1.0f + narrow);
-        }
-        return doubtful == 0;
     }
 };
 
