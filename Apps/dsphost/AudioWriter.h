@@ -29,7 +29,7 @@ struct AudioWriterOptions {
 // that would pass 4 GiB becomes an RF64; an AIFF is refused. The same samples always give the same bytes (Ogg
 // excepted, whose streams carry a random number).
 //
-// Files are encoded and written on a thread of the writer's own, which is one block behind: a failure shows
+// Files are encoded and written on a thread of the writer's own, which is some blocks behind: a failure shows
 // in one of the next calls.
 //
 // Integers: full scale is 1; values are rounded to nearest, ties to even, without dither, and clipped.

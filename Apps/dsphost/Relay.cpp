@@ -11,9 +11,7 @@ std::size_t BlockSamples(std::size_t channels) {
     return std::max(kSamples / channels, std::size_t{1}) * channels;
 }
 
-Relay::Relay(std::size_t samplesPerBlock) {
-    for (auto& block : m_blocks) block.samples.resize(samplesPerBlock);
-}
+Relay::Relay(std::size_t samplesPerBlock) : m_samplesPerBlock(samplesPerBlock) {}
 
 Relay::~Relay() { Close(); }
 
@@ -39,6 +37,7 @@ Block* Relay::ToFill() {
     ThrowReason();
     if (m_closed) return nullptr;
     Block& block = m_blocks[m_passed % m_blocks.size()];
+    block.samples.resize(m_samplesPerBlock);  // short files need few blocks
     block.frames = 0;
     return &block;
 }

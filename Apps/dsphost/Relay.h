@@ -51,6 +51,7 @@ private:
     std::size_t Waiting() const { return m_passed - m_returned; }  // blocks, to be taken
     void ThrowReason() const;
 
+    std::size_t m_samplesPerBlock;
     std::mutex m_mutex;
     std::condition_variable m_mayFill, m_mayTake;
     std::array<Block, 16> m_blocks;
