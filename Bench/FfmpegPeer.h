@@ -22,12 +22,13 @@ extern "C" {
 #include "Support/Signals.h"
 
 // A chain of libavfilter's audio filters as a peer in the benchmarks. `format` is the sample format that
-// the filters work in themselves ("flt", "fltp", "dblp" ...), so that no conversion is timed. What the graph
-// costs by itself is measured with the chain "anull".
+// the filters work in themselves ("flt", "fltp", "dblp" ...), so that no conversion is timed. The chain gets
+// every block as a new frame of its own, as a decoder hands them out: filters that work in place can. What
+// the frames and the graph cost by themselves is measured with the chain "anull".
 class FfmpegPeer {
 public:
     FfmpegPeer(const std::string& filters, const std::string& format, int rate, int frames)
-        : m_frames(frames) {
+        : m_rate(rate), m_frames(frames) {
         av_log_set_level(AV_LOG_ERROR);
         m_format = av_get_sample_fmt(format.c_str());
         const std::string source = "sample_fmt=" + format + ":sample_rate=" + std::to_string(rate) +
@@ -49,18 +50,17 @@ public:
         Check(avfilter_graph_config(m_graph.get(), nullptr));
 
         m_input.reset(av_frame_alloc());
-        m_input->format = m_format;
-        m_input->sample_rate = rate;
-        m_input->nb_samples = frames;
-        av_channel_layout_default(&m_input->ch_layout, 2);
-        Check(av_frame_get_buffer(m_input.get(), 0));
         m_output.reset(av_frame_alloc());
     }
 
     // Runs one block of stereo frames: interleaved samples of the format's type.
     template <typename Sample>
     void Run(const Sample* interleaved) {
-        Check(av_frame_make_writable(m_input.get()));
+        m_input->format = m_format;
+        m_input->sample_rate = m_rate;
+        m_input->nb_samples = m_frames;
+        av_channel_layout_default(&m_input->ch_layout, 2);
+        Check(av_frame_get_buffer(m_input.get(), 0));
         if (av_sample_fmt_is_planar(m_format))
             for (int channel = 0; channel < 2; ++channel) {
                 auto* plane = reinterpret_cast<Sample*>(m_input->data[channel]);
@@ -71,7 +71,7 @@ public:
                         2 * sizeof(Sample) * static_cast<std::size_t>(m_frames));
         m_input->pts = m_pts;
         m_pts += m_frames;
-        Check(av_buffersrc_add_frame_flags(m_source, m_input.get(), AV_BUFFERSRC_FLAG_KEEP_REF));
+        Check(av_buffersrc_add_frame(m_source, m_input.get()));  // which leaves it empty
         while (av_buffersink_get_frame(m_sink, m_output.get()) >= 0) av_frame_unref(m_output.get());
     }
 
@@ -84,7 +84,7 @@ private:
         if (result < 0) throw std::runtime_error("libavfilter refused the chain");
     }
 
-    int m_frames;
+    int m_rate, m_frames;
     std::int64_t m_pts = 0;
     AVSampleFormat m_format;
     std::unique_ptr<AVFilterGraph, Free> m_graph;

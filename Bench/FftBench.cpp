@@ -9,9 +9,8 @@
 #include <fftw3.h>
 #endif
 
-// What does a real forward transform cost beside FFTW's (estimated plans)? Bar: 2.0, goal 1.4, the geometric
-// mean over 256 .. 65536 in both precisions. Ours works in place and gets a fresh copy of its input each
-// time; BM_FftCopy is what to subtract.
+// What does a real forward transform cost beside FFTW's (estimated plans)? Ours works in place and gets a
+// fresh copy of its input each time; BM_FftCopy is what to subtract.
 namespace {
 
 constexpr int kShortest = 256, kLongest = 65536;

@@ -6,17 +6,17 @@
 #include <dlfcn.h>
 #include <ladspa.h>
 
-#include <cstring>
 #include <map>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Support/Signals.h"
 
 // A LADSPA plug-in as a peer in the benchmarks: `file` under the system's LADSPA folder, `label` inside it.
-// Controls go by the start of their port's name; those not named stay in the middle of their range. A plug-in
-// with one input runs once per channel.
+// Controls go by the start of their port's name; those not named stay in the middle of their range; one that
+// names no port is an error. A plug-in with one input runs once per channel.
 class LadspaPeer {
 public:
     using Controls = std::map<std::string, float>;
@@ -30,6 +30,8 @@ public:
         for (unsigned long i = 0; find && (m_descriptor = find(i)); ++i)
             if (label == m_descriptor->Label) break;
         if (!m_descriptor) throw std::runtime_error(file + " has no " + label);
+        for (const auto& control : controls)
+            if (!HasPort(control.first)) throw std::runtime_error(label + " has no port " + control.first);
         const std::size_t inputs = Count(LADSPA_PORT_INPUT), outputs = Count(LADSPA_PORT_OUTPUT);
         m_buffers.assign(2 + 2 * outputs, std::vector<float>(frames));
         m_values.resize(m_descriptor->PortCount);
@@ -62,6 +64,16 @@ private:
         return count;
     }
 
+    bool IsNamed(unsigned long port, const std::string& start) const {
+        return LADSPA_IS_PORT_CONTROL(m_descriptor->PortDescriptors[port]) &&
+               std::string_view(m_descriptor->PortNames[port]).starts_with(start);
+    }
+    bool HasPort(const std::string& start) const {
+        for (unsigned long port = 0; port < m_descriptor->PortCount; ++port)
+            if (IsNamed(port, start)) return true;
+        return false;
+    }
+
     LADSPA_Handle Connect(std::size_t instance, const Controls& controls, unsigned long rate) {
         const auto handle = m_descriptor->instantiate(m_descriptor, rate);
         std::size_t input = instance, output = 2 + instance;
@@ -75,8 +87,7 @@ private:
             const auto& range = m_descriptor->PortRangeHints[port];
             m_values[port] = (range.LowerBound + range.UpperBound) * 0.5f;
             for (const auto& [name, value] : controls)
-                if (std::strncmp(m_descriptor->PortNames[port], name.c_str(), name.size()) == 0)
-                    m_values[port] = value;
+                if (IsNamed(port, name)) m_values[port] = value;
             m_descriptor->connect_port(handle, port, &m_values[port]);
         }
         if (m_descriptor->activate) m_descriptor->activate(handle);

@@ -15,8 +15,8 @@
 #include <vector>
 
 // An LV2 plug-in as a peer in the benchmarks, run in this process from one planar stereo block into another.
-// Controls go by their port's symbol; those not named have their default. A plug-in with one input runs once
-// per channel.
+// Controls go by their port's symbol; those not named have their default; one that names no port is an error.
+// A plug-in with one input runs once per channel.
 class Lv2Peer {
 public:
     using Controls = std::map<std::string, double>;
@@ -30,6 +30,7 @@ public:
             lilv_plugins_get_by_uri(lilv_world_get_all_plugins(world.lilv), node);
         lilv_node_free(node);
         if (!plugin) throw std::runtime_error(uri + " is not installed");
+        for (const auto& control : controls) RequirePort(world, plugin, control.first);
         m_values.resize(lilv_plugin_get_num_ports(plugin));
         lilv_plugin_get_port_ranges_float(plugin, nullptr, nullptr, m_values.data());
         const auto inputs = lilv_plugin_get_num_ports_of_class(plugin, world.audio, world.input, nullptr);
@@ -76,6 +77,15 @@ private:
             return world;
         }
     };
+
+    static void RequirePort(const World& world, const LilvPlugin* plugin, const std::string& symbol) {
+        LilvNode* const node = lilv_new_string(world.lilv, symbol.c_str());
+        const bool found = lilv_plugin_get_port_by_symbol(plugin, node) != nullptr;
+        lilv_node_free(node);
+        if (!found)
+            throw std::runtime_error(std::string(lilv_node_as_uri(lilv_plugin_get_uri(plugin))) +
+                                     " has no port " + symbol);
+    }
 
     void Connect(const World& world, const LilvPlugin* plugin, const Controls& controls, double rate,
                  float* const* from, float* const* to) {

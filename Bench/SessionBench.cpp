@@ -213,14 +213,17 @@ void BM_SessionPeers(benchmark::State& state) { RunSession<PeerTrack>(state); }
 BENCHMARK(BM_SessionPeers)->ArgsProduct(kSizes);
 #endif
 
-double ThreadSeconds() {
+double Seconds(clockid_t clock) {
     timespec time{};
-    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &time);
+    clock_gettime(clock, &time);
     return static_cast<double>(time.tv_sec) + 1e-9 * static_cast<double>(time.tv_nsec);
 }
+double ThreadSeconds() { return Seconds(CLOCK_THREAD_CPUTIME_ID); }
 
 // The same on one thread, or shared out to two that work side by side: the time is the slower one's, on the
-// processor. The arguments are tracks in all, frames and threads.
+// processor, which says nothing of waiting, or on the wall, which tells of all that the machine does
+// meanwhile. The arguments are tracks in all, frames and threads.
+template <clockid_t clock>
 void BM_SessionThreads(benchmark::State& state) {
     constexpr int kBlocks = 64;
     const auto threads = static_cast<std::size_t>(state.range(2));
@@ -232,10 +235,10 @@ void BM_SessionThreads(benchmark::State& state) {
         std::atomic<std::size_t> waiting = threads;
         const auto work = [&](std::size_t i) {
             for (--waiting; waiting > 0;) std::this_thread::yield();
-            const double start = ThreadSeconds();
+            const double start = Seconds(clock);
             for (int block = 0; block < kBlocks; ++block)
                 Session<OurTrack>::OfThread(i).Process(tracks, frames);
-            seconds[i] = ThreadSeconds() - start;
+            seconds[i] = Seconds(clock) - start;
         };
         {
             std::vector<std::jthread> running;
@@ -245,7 +248,9 @@ void BM_SessionThreads(benchmark::State& state) {
     }
     state.SetItemsProcessed(state.iterations() * kBlocks * state.range(0) * state.range(1));
 }
-BENCHMARK(BM_SessionThreads)->ArgsProduct({{64}, {64, 512}, {1, 2}})->UseManualTime();
+constexpr clockid_t kProcessor = CLOCK_THREAD_CPUTIME_ID, kWall = CLOCK_MONOTONIC;
+BENCHMARK_TEMPLATE(BM_SessionThreads, kProcessor)->ArgsProduct({{64}, {64, 512}, {1, 2}})->UseManualTime();
+BENCHMARK_TEMPLATE(BM_SessionThreads, kWall)->ArgsProduct({{64}, {64, 512}, {1, 2}})->UseManualTime();
 
 // Two seconds of noise that an effect learns.
 void Learn(Corvo::DSP::CorvoEffectBase& effect) {

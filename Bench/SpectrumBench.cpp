@@ -9,9 +9,9 @@
 #include "Spectrum/kivspectrum.h"
 #include "Support/Signals.h"
 
-// What does the analyser cost per frame and per sample fed? A frame of 4096 samples (window, transform,
-// power) may take 2.3 of FFTW's bare float transform (BM_FftPeerFftw<float>/4096), goal 1.6; 2048 levels in
-// decibels 0.6 of a loop over the library's logarithm, goal 0.15.
+// What does the analyser cost per frame (window, transform, power) and per sample fed? Beside a frame stands
+// FFTW's bare float transform (BM_FftPeerFftw<float>), beside levels in decibels a loop over the library's
+// logarithm.
 namespace {
 
 constexpr int kRate = 48000;

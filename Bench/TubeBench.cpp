@@ -3,8 +3,7 @@
 #include "FfmpegPeer.h"
 #include "LadspaPeer.h"
 
-// What does the distortion cost, plain and oversampled, beside others of its kind? Bars: without oversampling
-// 0.8 of foverdrive (goal 0.4); 8x 1.2 of Saturate (0.6), 16x 1.0 of asoftclip (0.5).
+// What does the distortion cost, plain and oversampled, beside others of its kind?
 namespace {
 
 using Corvo::DSP::TubeDistorsion;

@@ -12,8 +12,8 @@
 #endif
 
 // What does one tuning of a window of 8192 samples cost? The peers take samples and transform them inside, so
-// that BM_TunerFrame (windowing, transform, power and method) is what stands beside them: method 0 may take
-// as long as aubio's yinfft, goal 0.4 of it; the others as long as its yin. BM_Tuner is the method alone.
+// that BM_TunerFrame (windowing, transform, power and method) is what stands beside them. BM_Tuner is the
+// method alone.
 namespace {
 
 constexpr int kRate = 44100, kLength = 8192;

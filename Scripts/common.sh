@@ -40,6 +40,18 @@ build_preset() {
     cmake --build --preset "$preset" ${1:+--target "$@"}
 }
 
+# The benchmarks of a library that keeps to SSE2, in build/baseline.
+build_baseline() {
+    cmake --preset bench -B build/baseline -DDSP_BUILD_APPS=OFF -DCMAKE_CXX_FLAGS=-DDSP_BASELINE_ONLY >/dev/null
+    cmake --build build/baseline --target "$@"
+}
+
+# What a measurement says of the machine: the processor, and the load average of the minute before it began.
+processor_and_load() {
+    printf '%s (%s processors, a load average of %s in the minute before)' \
+        "$(sed -n 's/^model name[^:]*: //p' /proc/cpuinfo | head -1)" "$(nproc)" "$1"
+}
+
 # Puts the typeface of the drawings into a folder; Debian has no package of it.
 fetch_montserrat() {
     command -v npm >/dev/null || return 1

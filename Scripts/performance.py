@@ -1,7 +1,7 @@
 #!/usr/bin/python3
-"""Measures the rows of Bench/rows.txt and prints them as tables in Markdown: performance.py PROGRAMS FOLDER
-PROGRAMS holds dsp_bench and dsphost; FOLDER holds the recordings of the commands, and gets what they write. Which rows
-miss their goals stands on standard error."""
+"""Measures the rows of Bench/rows.txt and prints them as tables in Markdown: performance.py PROGRAMS BASELINE FOLDER
+PROGRAMS holds dsp_bench and dsphost, BASELINE a dsp_bench of a library with nothing but SSE2; FOLDER holds the recordings
+of the commands, and gets what they write. Which rows miss their goals stands on standard error."""
 
 import json
 import os
@@ -14,22 +14,25 @@ import sys
 import time
 
 ROUNDS, SECONDS, SHELL_ROUNDS = 9, 0.02, 5
-SHELL = "From a shell"
+SHELL, BASELINE = "From a shell", "With SSE2 alone"
 BENCH = pathlib.Path(__file__).parent.parent / "Bench"
 EXPLAINED = {
     "Effects": "Stereo floats at 48 kHz, interleaved, blocks of 512; times are those of a frame. A percentage is the "
     "share of one core that real time takes.",
+    BASELINE: "As above, with a library that keeps to SSE2, as on a processor without AVX2.",
     "Converter": "Stereo floats, times are those of an input frame. soxr's filter is far steeper than ours: "
     "[what ours does to sound](converter.md#what-it-does-to-sound).",
     "Analyser": "Times of transforms and of the spectrum are those of a sample. A frame is analysed and drawn; Cairo "
-    "replays each fill, stroke and picture of it in the plainest way, without texts and without analysing anything. What "
-    "it takes for the tuner's varies twentyfold from round to round.",
+    "replays each fill, stroke and picture of it in the plainest way, without texts and without analysing anything. Times "
+    "are means of 16 frames, one after the other.",
     "Session": "Tracks of gain, equaliser (4 bands), compressor, echo and reverb, each with settings of its own, on one "
     "thread; times are those of a frame of one track. Two threads take half of the tracks each, side by side; their time "
-    "is the slower one's, on the processor, without waiting. Opening: making an effect, restoring its settings and "
-    "preparing it, while others of its kind are open.",
+    "is the slower one's, on the processor, which says nothing of waiting, and on the clock, which other programs make "
+    "longer. Opening: making an effect, restoring its settings and preparing it, while others of its kind are open; the "
+    "memory is that of the pages that this touches.",
     SHELL: "Ten minutes of stereo, 16 bits, from file to file: whole processes in turn, and the time on the clock. "
-    "soxr and sox filter far more steeply than our converter.",
+    "soxr and sox filter far more steeply than our converter. ffmpeg has one thread for its equaliser: with more it spends its "
+    "time on waking them for each short block. Our files are on the disk when a command ends, theirs in the system's memory.",
 }
 
 
@@ -86,7 +89,7 @@ def run_benchmarks(program, rows):
     failed = {each["run_name"]: each["error_message"] for each in found if each.get("error_occurred")}
     ours = "|".join(pattern(name) for row in rows for name in names_in(row[1]))
     for name, message in failed.items():
-        if re.fullmatch(ours, name):
+        if re.fullmatch(ours, name) or not message.endswith("not installed"):
             sys.exit(f"{name}: {message}")
     return medians
 
@@ -156,7 +159,13 @@ def duration(nanos):
     return f"{nanos:.3g} ns"
 
 
-def table_row(what, ours, theirs, row):
+def memory(row, medians):
+    """What a benchmark counted beside the time."""
+    counted = medians.get(row[1], {}).get("KB")
+    return f", {counted:.0f} KB" if counted else ""
+
+
+def table_row(what, ours, theirs, row, beside=""):
     peer, goal, remark = row[3:6]
     if row[2] and theirs is None:
         return f"| {what} | {duration(ours)} | | | {peer}, not installed | |"
@@ -167,29 +176,31 @@ def table_row(what, ours, theirs, row):
     if "@" in row[1] or row[2] == "REAL_TIME":  # no times
         return f"| {what} | {100 * ours / theirs:.2g} % | | | {peer} | {remark} |"
     if not theirs:
-        return f"| {what} | {duration(ours)} | | | | {remark} |"
+        return f"| {what} | {duration(ours)}{beside} | | | | {remark} |"
     return f"| {what} | {duration(ours)} | {duration(theirs)} | {ours / theirs:.2g} | {peer} | {remark} |"
 
 
-def main(programs, folder):
+def main(programs, baseline, folder):
     rows = read_rows(BENCH / "rows.txt")
-    shell_rows = [row for section, row in rows if section == SHELL]
-    benchmark_rows = [row for section, row in rows if section != SHELL]
-    look_for_missing(f"{programs}/dsp_bench", benchmark_rows)
-    commands = run_commands(shell_rows, programs, folder)
-    medians = run_benchmarks(f"{programs}/dsp_bench", benchmark_rows)
-    for section in dict.fromkeys(section for section, _ in rows):
+    sections = {section: [row for each, row in rows if each == section] for section, _ in rows}
+    usual = [row for section, row in rows if section not in (SHELL, BASELINE)]
+    look_for_missing(f"{programs}/dsp_bench", usual + sections[BASELINE])
+    commands = run_commands(sections[SHELL], programs, folder)
+    medians = run_benchmarks(f"{programs}/dsp_bench", usual)
+    medians_of_baseline = run_benchmarks(f"{baseline}/dsp_bench", sections[BASELINE])
+    for section, rows in sections.items():
         print(f"\n### {section}\n")
         if section in EXPLAINED:
             print(EXPLAINED[section] + "\n")
         print("| | Ours | Theirs | Ratio | Beside | Remark |\n|---|---|---|---|---|---|")
-        for row in (row for each, row in rows if each == section):
+        found = medians_of_baseline if section == BASELINE else medians
+        for row in rows:
             if section == SHELL:
                 print(table_row(row[0], commands[row[1]], commands[row[2]], row))
                 continue
-            for what, ours, theirs in measured(row, medians):
-                print(table_row(what, ours, theirs, row))
+            for what, ours, theirs in measured(row, found):
+                print(table_row(what, ours, theirs, row, memory(row, found)))
 
 
 if __name__ == "__main__":
-    main(*sys.argv[1:3])
+    main(*sys.argv[1:4])

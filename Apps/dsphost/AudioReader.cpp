@@ -202,10 +202,25 @@ int AudioReader::Read(double* samples, int frames) {
     return done;
 }
 
+std::span<const double> AudioReader::Next(int frames) {
+    const auto channels = static_cast<std::size_t>(Channels());
+    const auto count = static_cast<std::size_t>(frames) * channels;
+    if (!m_streams && Ahead() >= frames) return {Taken(frames), count};
+    m_next.resize(count);
+    return std::span(m_next).first(static_cast<std::size_t>(Read(m_next.data(), frames)) * channels);
+}
+
 // None at the end only.
 int AudioReader::ReadAhead(double* samples, int frames) {
-    const auto channels = static_cast<std::size_t>(Channels());
-    if (!m_ahead) m_ahead = std::make_unique<Relay>(BlockSamples(channels));
+    const auto count = static_cast<int>(std::min<std::int64_t>(frames, Ahead()));
+    if (count > 0) std::copy_n(Taken(count), static_cast<std::ptrdiff_t>(count) * Channels(), samples);
+    return count;
+}
+
+// How many frames stand in the block that was read ahead, a new one where they were all taken. None at the
+// end only.
+std::int64_t AudioReader::Ahead() {
+    if (!m_ahead) m_ahead = std::make_unique<Relay>(BlockSamples(static_cast<std::size_t>(Channels())));
     if (m_block && m_taken == m_block->frames) {
         m_ahead->Return();
         m_block = nullptr;
@@ -219,12 +234,11 @@ int AudioReader::ReadAhead(double* samples, int frames) {
         m_block = m_ahead->ToTake();
         m_taken = 0;
     }
-    if (!m_block) return 0;
-    const auto count = std::min<std::int64_t>(frames, m_block->frames - m_taken);
-    const auto* const from = m_block->samples.data() + static_cast<std::size_t>(m_taken) * channels;
-    std::copy_n(from, static_cast<std::size_t>(count) * channels, samples);
-    m_taken += count;
-    return static_cast<int>(count);
+    return m_block ? m_block->frames - m_taken : 0;
+}
+
+const double* AudioReader::Taken(int frames) {
+    return m_block->samples.data() + std::exchange(m_taken, m_taken + frames) * Channels();
 }
 
 // Passes one more block on. False at the end.
@@ -261,8 +275,7 @@ int AudioReader::ReadSome(double* samples, int frames) {
     for (const auto& end : {m_frames, m_doubtfulFrames})
         if (end) wanted = std::min(wanted, *end - m_position);
     if (wanted <= 0) return 0;
-    const auto got = sf_readf_double(m_sound->Get(), samples, wanted);
-    CountNotFinite(std::span(samples, static_cast<std::size_t>(got * Channels())));
+    const auto got = Decode(samples, wanted);
     m_position += got;
     m_file->ThrowIfFailed();
     if (sf_error(m_sound->Get()) == SF_ERR_NO_ERROR) return static_cast<int>(got);
@@ -272,6 +285,20 @@ int AudioReader::ReadSome(double* samples, int frames) {
         throw UserError(m_name + ": is damaged after " + std::to_string(m_position) +
                         " frames: " + m_sound->Error());
     return static_cast<int>(got);
+}
+
+std::int64_t AudioReader::Decode(double* samples, std::int64_t frames) {
+    const auto count = static_cast<std::size_t>(frames * Channels());
+    if ((m_info.format & SF_FORMAT_SUBMASK) == SF_FORMAT_PCM_16) {
+        m_words.resize(count);
+        const auto got = sf_readf_short(m_sound->Get(), m_words.data(), frames);
+        const auto words = std::span(m_words).first(static_cast<std::size_t>(got * Channels()));
+        std::ranges::transform(words, samples, [](std::int16_t word) { return word * 0x1p-15; });
+        return got;
+    }
+    const auto got = sf_readf_double(m_sound->Get(), samples, frames);
+    CountNotFinite(std::span(samples, static_cast<std::size_t>(got * Channels())));
+    return got;
 }
 
 void AudioReader::CountNotFinite(std::span<const double> samples) {

@@ -5,6 +5,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <vector>
 
 #include "File.h"
 #include "Relay.h"
@@ -43,6 +44,8 @@ public:
     // the end. Throws UserError when the file turns out to be damaged. At the end it warns of an input that
     // was cut off and of samples that are not finite numbers, which it leaves as they are.
     int Read(double* samples, int frames);
+    // The same without a copy where that can be; they stay until the next call.
+    std::span<const double> Next(int frames);
 
 private:
     void OpenStream(File stream);
@@ -51,7 +54,10 @@ private:
     void OpenSound(const std::optional<WavStreamHeader>& header);
     int ReadSome(double* samples, int frames);
     int ReadAhead(double* samples, int frames);
+    std::int64_t Ahead();
+    const double* Taken(int frames);
     bool DecodeBlock();
+    std::int64_t Decode(double* samples, std::int64_t frames);
     void CountNotFinite(std::span<const double> samples);
     void End();
 
@@ -64,8 +70,10 @@ private:
     std::int64_t m_position = 0;
     std::int64_t m_notFinite = 0, m_firstNotFinite = 0;  // samples; the frame of the first
     bool m_cutOff = false, m_ended = false, m_streams = false;
-    Block* m_block = nullptr;  // what was read ahead
-    std::int64_t m_taken = 0;  // frames of it
+    std::vector<std::int16_t> m_words;
+    std::vector<double> m_next;  // what Next had to copy
+    Block* m_block = nullptr;    // what was read ahead
+    std::int64_t m_taken = 0;    // frames of it
     bool m_ownThread = false;
     std::unique_ptr<Relay> m_ahead;  // last: its thread uses the others
 };

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <bit>
 #include <cmath>
+#include <limits>
 #include <span>
 
 #include "Errors.h"
@@ -10,7 +11,7 @@
 namespace dsphost {
 namespace {
 
-constexpr int kBlocksBetweenSyncs = 64;  // some megabytes
+constexpr int kBlocksBetweenSyncs = 256;  // some megabytes
 
 // Two ways to make a value an integer: which values lead into the range, and to which number within it.
 
@@ -33,19 +34,32 @@ struct TowardsZero {
     }
 };
 
-// Each sample becomes the top bits of 32, as libsndfile takes every integer. Returns how many did not fit:
-// they are clipped, and what is no number becomes 0.
-template <typename Way>
-std::int64_t ToIntegers(std::span<const double> samples, int bits, int* integers) {
+// Whether all of them are at most so far from zero, and numbers: vectors of any processor can do this.
+bool Within(std::span<const double> samples, double limit) {
+    constexpr std::int64_t kMagnitude = std::numeric_limits<std::int64_t>::max();
+    std::int64_t room = 0;
+    for (const double sample : samples)
+        room |= std::bit_cast<std::int64_t>(limit) - (std::bit_cast<std::int64_t>(sample) & kMagnitude);
+    return room >= 0;
+}
+
+// Each sample becomes the top bits of what libsndfile takes. Returns how many did not fit: they are clipped,
+// and what is no number becomes 0.
+template <typename Way, typename Stored>
+std::int64_t ToIntegers(std::span<const double> samples, int bits, Stored* integers) {
     const double scale = std::ldexp(1.0, bits - 1);
     const double lowest = -scale, highest = scale - 1.0;
-    const int shift = 32 - bits;
+    const int shift = 8 * static_cast<int>(sizeof(Stored)) - bits;
+    const auto integer = [shift](double value) { return static_cast<Stored>(Way::Integer(value) << shift); };
+    if (Within(samples, highest / scale)) {
+        for (const double sample : samples) *integers++ = integer(sample * scale);
+        return 0;
+    }
     std::int64_t clipped = 0;
     for (const double sample : samples) {
         const double value = sample * scale;
         clipped += !Way::Fits(value, lowest, highest);  // no branch: a loud passage clips here and there
-        const double inside = std::isnan(value) ? 0.0 : std::min(std::max(value, lowest), highest);
-        *integers++ = static_cast<int>(Way::Integer(inside) << shift);
+        *integers++ = integer(std::isnan(value) ? 0.0 : std::min(std::max(value, lowest), highest));
     }
     return clipped;
 }
@@ -105,26 +119,54 @@ void AudioWriter::Write(const double* samples, std::int64_t frames) {
     m_frames += frames;
 }
 
+std::int64_t AudioWriter::Put(std::int64_t most, const std::function<std::int64_t(double*)>& fill) {
+    const auto count = static_cast<std::size_t>(most * m_info.channels);
+    if (m_output.IsStream() || count > BlockSamples(static_cast<std::size_t>(m_info.channels))) {
+        m_apart.resize(count);
+        const std::int64_t frames = fill(m_apart.data());
+        Write(m_apart.data(), frames);
+        return frames;
+    }
+    if (Room().size() < count) PassBlock();
+    const std::int64_t frames = fill(Room().data());
+    RequireRoom(m_frames + frames);
+    Filled(frames);
+    m_frames += frames;
+    return frames;
+}
+
 void AudioWriter::WriteBehind(const double* samples, std::int64_t frames) {
-    const auto channels = static_cast<std::size_t>(m_info.channels);
-    if (!m_behind) m_behind = std::make_unique<Relay>(BlockSamples(channels));
-    for (auto rest = static_cast<std::size_t>(frames) * channels; rest > 0;) {
-        if (!m_block) m_block = m_behind->ToFill();
-        const std::size_t filled = static_cast<std::size_t>(m_block->frames) * channels;
-        const std::size_t count = std::min(rest, m_block->samples.size() - filled);
-        std::copy_n(samples, count, m_block->samples.data() + filled);
-        m_block->frames += static_cast<std::int64_t>(count / channels);
+    for (auto rest = static_cast<std::size_t>(frames * m_info.channels); rest > 0;) {
+        const auto room = Room();
+        const std::size_t count = std::min(rest, room.size());
+        std::copy_n(samples, count, room.data());
         samples += count;
         rest -= count;
-        if (filled + count < m_block->samples.size()) return;
-        m_block = nullptr;
-        m_behind->Pass();
-        if (!m_ownThread)
-            m_ownThread = m_behind->Start([this] {
-                while (StoreBlock()) continue;
-            });
-        if (!m_ownThread) StoreBlock();
+        Filled(static_cast<std::int64_t>(count) / m_info.channels);
     }
+}
+
+// What is free of the block to be filled.
+std::span<double> AudioWriter::Room() {
+    if (!m_behind)
+        m_behind = std::make_unique<Relay>(BlockSamples(static_cast<std::size_t>(m_info.channels)));
+    if (!m_block) m_block = m_behind->ToFill();
+    return std::span(m_block->samples).subspan(static_cast<std::size_t>(m_block->frames * m_info.channels));
+}
+
+void AudioWriter::Filled(std::int64_t frames) {
+    m_block->frames += frames;
+    if (Room().empty()) PassBlock();
+}
+
+void AudioWriter::PassBlock() {
+    m_block = nullptr;
+    m_behind->Pass();
+    if (!m_ownThread)
+        m_ownThread = m_behind->Start([this] {
+            while (StoreBlock()) continue;
+        });
+    if (!m_ownThread) StoreBlock();
 }
 
 // Stores the next block that was passed on. False when there is none and none will come.
@@ -146,24 +188,27 @@ void AudioWriter::FinishBehind() {
 }
 
 void AudioWriter::Store(const double* samples, std::int64_t frames) {
-    if (IntegerBits(m_format) > 0) {
-        StoreIntegers(samples, frames);
-    } else if (sf_writef_double(m_sound->Get(), samples, frames) != frames) {
-        m_output.Bytes().ThrowIfFailed();
-        throw IoError(Name() + ": " + m_sound->Error());
-    }
+    const int bits = IntegerBits(m_format);
+    const bool stored = bits == 16 ? StoreIntegers(samples, frames, m_words)
+                        : bits > 0 ? StoreIntegers(samples, frames, m_integers)
+                                   : sf_writef_double(m_sound->Get(), samples, frames) == frames;
     m_output.Bytes().ThrowIfFailed();
+    if (!stored) throw IoError(Name() + ": " + m_sound->Error());
 }
 
-void AudioWriter::StoreIntegers(const double* samples, std::int64_t frames) {
-    const int bits = IntegerBits(m_format);
-    const auto count = static_cast<std::size_t>(frames * m_info.channels);
-    m_integers.resize(count);
-    const auto toIntegers = m_truncates ? ToIntegers<TowardsZero> : ToIntegers<Nearest>;
-    m_clipped += toIntegers({samples, count}, bits, m_integers.data());
-    if (sf_writef_int(m_sound->Get(), m_integers.data(), frames) == frames) return;
-    m_output.Bytes().ThrowIfFailed();
-    throw IoError(Name() + ": " + m_sound->Error());
+template <typename Stored>
+bool AudioWriter::StoreIntegers(const double* samples, std::int64_t frames, std::vector<Stored>& integers) {
+    constexpr std::size_t kAtOnce = 512;  // of which one that must be clipped makes all slower
+    const auto toIntegers = m_truncates ? ToIntegers<TowardsZero, Stored> : ToIntegers<Nearest, Stored>;
+    const std::span all(samples, static_cast<std::size_t>(frames * m_info.channels));
+    integers.resize(all.size());
+    for (std::size_t i = 0; i < all.size(); i += kAtOnce)
+        m_clipped += toIntegers(all.subspan(i, std::min(kAtOnce, all.size() - i)), IntegerBits(m_format),
+                                integers.data() + i);
+    if constexpr (sizeof(Stored) == 2)
+        return sf_writef_short(m_sound->Get(), integers.data(), frames) == frames;
+    else
+        return sf_writef_int(m_sound->Get(), integers.data(), frames) == frames;
 }
 
 void AudioWriter::CompleteWav() {

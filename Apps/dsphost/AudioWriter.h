@@ -1,8 +1,10 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -27,7 +29,7 @@ struct AudioWriterOptions {
 // that would pass 4 GiB becomes an RF64; an AIFF is refused. The same samples always give the same bytes (Ogg
 // excepted, whose streams carry a random number).
 //
-// Files are encoded and written on a thread of the writer's own, which is one block behind: a failure shows
+// Files are encoded and written on a thread of the writer's own, which is some blocks behind: a failure shows
 // in one of the next calls.
 //
 // Integers: full scale is 1; values are rounded to nearest, ties to even, without dither, and clipped.
@@ -42,6 +44,9 @@ public:
 
     // `samples`: interleaved. Throws IoError when they cannot be stored.
     void Write(const double* samples, std::int64_t frames);
+    // The same without a copy: `fill` puts up to `most` frames where it is told to, and returns how many.
+    // Returns the same.
+    std::int64_t Put(std::int64_t most, const std::function<std::int64_t(double*)>& fill);
     // Completes the file and puts it in its place. Throws IoError.
     void Commit();
     // The first half of it; the result is still to be committed.
@@ -58,17 +63,23 @@ private:
     void WriteHeader(std::optional<std::int64_t> sampleBytes);
     void CompleteWav();
     void WriteBehind(const double* samples, std::int64_t frames);
+    std::span<double> Room();
+    void Filled(std::int64_t frames);
+    void PassBlock();
     bool StoreBlock();
     void FinishBehind();
     void Store(const double* samples, std::int64_t frames);
-    void StoreIntegers(const double* samples, std::int64_t frames);
+    template <typename Stored>
+    bool StoreIntegers(const double* samples, std::int64_t frames, std::vector<Stored>& integers);
 
     OutputFile m_output;
     SF_INFO m_info{};
     SampleFormat m_format;
     std::optional<WavShape> m_wav;
     std::unique_ptr<SoundFile> m_sound;
+    std::vector<std::int16_t> m_words;
     std::vector<int> m_integers;
+    std::vector<double> m_apart;  // more than fits into a block, or for a stream
     std::int64_t m_clipped = 0, m_frames = 0;
     Block* m_block = nullptr;  // being filled
     bool m_truncates = false, m_ownThread = false;

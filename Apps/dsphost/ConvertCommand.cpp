@@ -71,7 +71,6 @@ void RunConvert(ConvertArguments arguments) {
 
     AudioReader input(arguments.input, arguments.spoolLimit);
     RequireFormat(input, SamplingFrequencyConverter::kMaxChannels, "the converter takes up to 48");
-    const auto channels = static_cast<std::size_t>(input.Channels());
     AlignedConverter::Settings settings{.inRate = input.Rate(),
                                         .outRate = arguments.rate,
                                         .channels = input.Channels(),
@@ -95,15 +94,14 @@ void RunConvert(ConvertArguments arguments) {
     if (bits == 16 || bits == 24) output.TruncateIntegers();
     std::int64_t read = 0;
     const auto most = static_cast<int>(converter->MostFrames(kBlock));
-    std::vector<double> samples(kBlock * channels), converted(static_cast<std::size_t>(most) * channels);
     {
         Progress progress("convert", input.Rate(), input.Frames(), arguments.writing.quiet);
-        while (const int got = input.Read(samples.data(), kBlock)) {
-            output.Write(converted.data(), converter->Convert(samples.data(), got, converted.data()));
-            progress.Update(read += got);
+        for (auto samples = input.Next(kBlock); !samples.empty(); samples = input.Next(kBlock)) {
+            const int frames = static_cast<int>(samples.size()) / input.Channels();
+            output.Put(most, [&](double* to) { return converter->Convert(samples.data(), frames, to); });
+            progress.Update(read += frames);
         }
-        while (const int rest = converter->Finish(converted.data(), most))
-            output.Write(converted.data(), rest);
+        while (output.Put(most, [&](double* to) { return converter->Finish(to, most); }) > 0) continue;
     }
     output.Commit();
     WarnOfClipping(output);

@@ -7,13 +7,11 @@
 namespace dsphost {
 
 std::size_t BlockSamples(std::size_t channels) {
-    constexpr std::size_t kSamples = 1 << 16;
+    constexpr std::size_t kSamples = 1 << 14;
     return std::max(kSamples / channels, std::size_t{1}) * channels;
 }
 
-Relay::Relay(std::size_t samplesPerBlock) {
-    for (auto& block : m_blocks) block.samples.resize(samplesPerBlock);
-}
+Relay::Relay(std::size_t samplesPerBlock) : m_samplesPerBlock(samplesPerBlock) {}
 
 Relay::~Relay() { Close(); }
 
@@ -34,10 +32,12 @@ bool Relay::Start(std::function<void()> work) {
 
 Block* Relay::ToFill() {
     std::unique_lock lock(m_mutex);
-    m_changed.wait(lock, [this] { return m_closed || m_passed - m_returned < m_blocks.size(); });
+    if (Waiting() == m_blocks.size())
+        m_mayFill.wait(lock, [this] { return m_closed || Waiting() <= m_blocks.size() / 2; });
     ThrowReason();
     if (m_closed) return nullptr;
     Block& block = m_blocks[m_passed % m_blocks.size()];
+    block.samples.resize(m_samplesPerBlock);  // short files need few blocks
     block.frames = 0;
     return &block;
 }
@@ -45,13 +45,13 @@ Block* Relay::ToFill() {
 void Relay::Pass() {
     const std::lock_guard lock(m_mutex);
     ++m_passed;
-    m_changed.notify_one();
+    if (Waiting() == m_blocks.size() / 2) m_mayTake.notify_one();
 }
 
 Block* Relay::ToTake() {
     std::unique_lock lock(m_mutex);
-    m_changed.wait(lock, [this] { return m_closed || m_passed > m_returned; });
-    if (m_passed > m_returned) return &m_blocks[m_returned % m_blocks.size()];
+    if (Waiting() == 0) m_mayTake.wait(lock, [this] { return m_closed || Waiting() >= m_blocks.size() / 2; });
+    if (Waiting() > 0) return &m_blocks[m_returned % m_blocks.size()];
     ThrowReason();
     return nullptr;
 }
@@ -59,14 +59,15 @@ Block* Relay::ToTake() {
 void Relay::Return() {
     const std::lock_guard lock(m_mutex);
     ++m_returned;
-    m_changed.notify_one();
+    if (Waiting() == m_blocks.size() / 2) m_mayFill.notify_one();
 }
 
 void Relay::Close(std::exception_ptr reason) {
     const std::lock_guard lock(m_mutex);
     m_closed = true;
     if (!m_reason) m_reason = std::move(reason);
-    m_changed.notify_all();
+    m_mayFill.notify_all();
+    m_mayTake.notify_all();
 }
 
 void Relay::Finish() {

@@ -17,11 +17,13 @@ struct Block {
     std::int64_t frames = 0;
 };
 
-// What a block holds at most, in whole frames: enough that handing it over costs next to nothing.
+// What a block holds at most, in whole frames: enough that handing it over costs next to nothing, and so few
+// that all blocks of a relay stay in a processor's caches.
 std::size_t BlockSamples(std::size_t channels);
 
-// Hands blocks from a thread that fills them to one that takes them: two of them, so that one is filled while
-// the other is worked on. One of the two threads belongs to the relay.
+// Hands blocks from a thread that fills them to one that takes them. One of the two threads belongs to the
+// relay. A side that had to wait goes on when half of the blocks are there for it, as going to sleep and
+// waking up cost more than handing over a block.
 //
 // Either side may close it, with the reason where something failed. What was passed on before is still taken,
 // then the taking side learns of the end, or gets the reason thrown. The filling side learns of it at once.
@@ -46,11 +48,13 @@ public:
     void Finish();
 
 private:
+    std::size_t Waiting() const { return m_passed - m_returned; }  // blocks, to be taken
     void ThrowReason() const;
 
+    std::size_t m_samplesPerBlock;
     std::mutex m_mutex;
-    std::condition_variable m_changed;
-    std::array<Block, 2> m_blocks;
+    std::condition_variable m_mayFill, m_mayTake;
+    std::array<Block, 16> m_blocks;
     std::size_t m_passed = 0, m_returned = 0;  // blocks since the start
     bool m_closed = false;
     std::exception_ptr m_reason;

@@ -163,15 +163,20 @@ TEST_F(RenderCommand, RoundsToNearestEvenAndClips) {
                                 -full - 0.6, 7 * full, -7 * full, std::nan("")};
         std::vector<double> samples;
         for (const double sample : cases) samples.push_back(sample * step);
-        Save("in.wav", {1, 1000, kDouble, samples});
-        EXPECT_EQ(Run(std::string("render in.wav out.wav -y --format ") + format).err,
-                  "dsphost: warning: in.wav: 1 sample is not a finite number, at 0.015 s\n"
-                  "dsphost: warning: out.wav: 6 samples were clipped\n");
-        const Sound out = Load("out.wav");
-        ASSERT_EQ(out.samples.size(), std::size(cases));
-        for (std::size_t i = 0; i < std::size(cases); ++i) {
-            const double nearest = std::isnan(cases[i]) ? 0.0 : std::nearbyint(cases[i]);
-            EXPECT_EQ(out.samples[i], std::clamp(nearest, -full, most) * step) << cases[i];
+        // The first seven alone, too: where nothing is clipped, a quicker way is taken.
+        for (const std::size_t count : {std::size(cases), std::size_t{7}}) {
+            samples.resize(count);
+            Save("in.wav", {1, 1000, kDouble, samples});
+            EXPECT_EQ(Run(std::string("render in.wav out.wav -y --format ") + format).err,
+                      count == 7 ? ""
+                                 : "dsphost: warning: in.wav: 1 sample is not a finite number, at 0.015 s\n"
+                                   "dsphost: warning: out.wav: 6 samples were clipped\n");
+            const Sound out = Load("out.wav");
+            ASSERT_EQ(out.samples.size(), count);
+            for (std::size_t i = 0; i < count; ++i) {
+                const double nearest = std::isnan(cases[i]) ? 0.0 : std::nearbyint(cases[i]);
+                EXPECT_EQ(out.samples[i], std::clamp(nearest, -full, most) * step) << cases[i];
+            }
         }
     }
 }
