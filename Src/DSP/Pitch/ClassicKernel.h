@@ -37,7 +37,7 @@ struct Advance {
 // Each bin's phase goes on, and its cosine is added to the output. Wrapping the phase keeps the cosine exact
 // for ever.
 struct Synthesis {
-    const float* magnitude;
+    float* level;  // the magnitudes; what the cosines make of them comes in their place
     const double *advance, *window;
     double scale;
     double* phase;

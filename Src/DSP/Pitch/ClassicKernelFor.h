@@ -89,17 +89,19 @@ void TakeAdvance(const Advance& a, std::size_t bins) {
     });
 }
 
+// Three short loops: what a bin goes through is so long that a processor has too few in hand at once.
 void Synthesise(const Synthesis& s, std::size_t bins) {
+    const auto count = static_cast<std::int32_t>(bins);
+    for (std::int32_t k = 0; k < count; ++k) {
+        const double sum = s.phase[k] + s.advance[k];
+        s.phase[k] = sum - 2.0 * kPi * Nearest(sum * (0.5 / kPi));
+    }
+    for (std::int32_t k = 0; k < count; ++k)
+        s.level[k] = static_cast<float>(static_cast<double>(s.level[k]) * Cosine(s.phase[k]));
     WithDivisor(s.scale, [&](auto scale) {
-        const auto count = static_cast<std::int32_t>(bins);
         for (std::int32_t k = 0; k < count; ++k) {
-            const double sum = s.phase[k] + s.advance[k];
-            const double phase = sum - 2.0 * kPi * Nearest(sum * (0.5 / kPi));
-            s.phase[k] = phase;
-            const auto value = static_cast<float>(static_cast<double>(s.magnitude[k]) * Cosine(phase));
-            s.accumulator[k] =
-                static_cast<float>(static_cast<double>(s.accumulator[k]) +
-                                   scale.Under(2.0 * s.window[k] * static_cast<double>(value)));
+            const double added = scale.Under(2.0 * s.window[k] * static_cast<double>(s.level[k]));
+            s.accumulator[k] = static_cast<float>(static_cast<double>(s.accumulator[k]) + added);
         }
     });
 }

@@ -44,8 +44,8 @@ private:
 // bins, without a transform; that is its sound, 60 to 70 dB below the input.
 //
 // Cost of a stereo frame: "New" 10 to 20 ns at quality 0, 90 to 190 at quality 9, most where the pitch moves
-// far. "Classic" 8 ns at the lowest quality, 15 at an overlap of 4, 29 at 8 and 110 at 32, a tenth more while
-// the pitch moves; it works once in a step, so that some blocks take many times as long as others.
+// far. "Classic" 7 ns at the lowest quality, 13 at an overlap of 4, 24 at 8 and 90 at 32, a seventh more
+// while the pitch moves; it works once in a step, so that some blocks take many times as long as others.
 // Configuring fills tables and buffers: of "New" 1.2 MB in stereo at 48 kHz, half of it for what the lowest
 // pitch holds, and more with rate and channels.
 //

@@ -43,8 +43,7 @@ double BinsOff(double phaseChange, double advance, int oversampling) {
 
 struct PitchAdapterCorvoOld::Channel {
     std::array<float, kMostFrame> input, output;
-    std::array<float, 2 * kMostFrame> accumulator;
-    std::array<float, kMostBins> magnitude;
+    std::array<float, kMostBins> accumulator, magnitude;
     std::array<double, kMostBins> advance;
     std::array<double, kMostBins> phase;  // double: it grows without end, and a float would soon be noise
     std::array<std::int32_t, kMostBins> last;          // the bits of the last frame's windowed samples
@@ -171,6 +170,7 @@ void PitchAdapterCorvoOld::Analyse(Channel& c, Tables<double>& advances, std::si
         const auto* const all = c.target.data();
         c.sources =
             static_cast<std::size_t>(std::find(all, all + bins, static_cast<std::int32_t>(bins)) - all);
+        std::copy_n(m_emptyAdvances.begin(), bins, c.advance.begin());
         c.placed = true;
         c.placedPitch = c.pitch;
         c.tables = 0;
@@ -194,7 +194,6 @@ void PitchAdapterCorvoOld::ShiftFrame(std::size_t side) {
     // Every bin moves to where the pitch takes it. Amplitudes meet there, the last advance stays.
     Analyse(c, m_advances[side], bins);
     std::fill_n(c.magnitude.begin(), bins, 0.0f);
-    std::copy_n(m_emptyAdvances.begin(), bins, c.advance.begin());
     for (std::size_t k = 0; k < c.sources; ++k) {
         const auto j = static_cast<std::size_t>(c.target[k]);
         c.magnitude[j] += c.strength[k];
@@ -206,7 +205,8 @@ void PitchAdapterCorvoOld::ShiftFrame(std::size_t side) {
          static_cast<double>(m_size / 2) * m_oversampling, c.phase.data(), c.accumulator.data()},
         bins);
     std::copy_n(c.accumulator.begin(), step, c.output.begin());
-    std::copy(c.accumulator.begin() + step, c.accumulator.begin() + size + step, c.accumulator.begin());
+    const auto end = c.accumulator.begin() + static_cast<std::ptrdiff_t>(bins);
+    std::fill(std::copy(c.accumulator.begin() + step, end, c.accumulator.begin()), end, 0.0f);
     std::copy(c.input.begin() + step, c.input.begin() + size, c.input.begin());
 }
 
