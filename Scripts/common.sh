@@ -26,7 +26,7 @@ need_packages() {
 BUILD_PACKAGES=(g++ cmake ninja-build ccache pkg-config libxsimd-dev libsndfile1-dev libcli11-dev
     nlohmann-json3-dev libsoundtouch-dev libcairo2-dev libpango1.0-dev libsdl2-dev fonts-dejavu-core)
 TEST_PACKAGES=(libgtest-dev binutils abigail-tools)
-CLANG_PACKAGES=(clang libclang-rt-dev)
+CLANG_PACKAGES=(clang libclang-rt-dev libbenchmark-dev)  # the preset asan builds the benchmarks, too
 PLUGIN_PACKAGES=(dpf-source libxcb1-dev)
 
 # What installs them by hand.
