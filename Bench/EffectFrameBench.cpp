@@ -2,7 +2,7 @@
 #include "EffectRun.h"
 #include "Support/EffectCases.h"
 
-// What does the frame itself cost per block, before any effect does anything? Bar: 60 ns.
+// What does the frame itself cost per block, before any effect does anything?
 namespace {
 
 class NoEffect : public Corvo::DSP::CorvoEffectBase {

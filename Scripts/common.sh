@@ -42,7 +42,7 @@ build_preset() {
 
 # The benchmarks of a library that keeps to SSE2, in build/baseline.
 build_baseline() {
-    cmake --preset bench -B build/baseline -DDSP_BUILD_APPS=OFF -DCMAKE_CXX_FLAGS=-DDSP_BASELINE_ONLY >/dev/null
+    cmake --preset bench -B build/baseline -DDSP_BUILD_APPS=OFF "-DCMAKE_CXX_FLAGS=${CXXFLAGS:-} -DDSP_BASELINE_ONLY" >/dev/null
     cmake --build build/baseline --target "$@"
 }
 

@@ -31,8 +31,9 @@ EXPLAINED = {
     "longer. Opening: making an effect, restoring its settings and preparing it, while others of its kind are open; the "
     "memory is that of the pages that this touches.",
     SHELL: "Ten minutes of stereo, 16 bits, from file to file: whole processes in turn, and the time on the clock. "
-    "soxr and sox filter far more steeply than our converter. ffmpeg has one thread for its equaliser: with more it spends its "
-    "time on waking them for each short block. Our files are on the disk when a command ends, theirs in the system's memory.",
+    "soxr and sox filter far more steeply than our converter. ffmpeg's equaliser runs as it comes and, in a second row, "
+    "with floats on one thread: with more it spends its time on waking them for each short block. Our files are on the disk "
+    "when a command ends, theirs in the system's memory.",
 }
 
 

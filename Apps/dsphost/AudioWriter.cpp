@@ -198,7 +198,7 @@ void AudioWriter::Store(const double* samples, std::int64_t frames) {
 
 template <typename Stored>
 bool AudioWriter::StoreIntegers(const double* samples, std::int64_t frames, std::vector<Stored>& integers) {
-    constexpr std::size_t kAtOnce = 512;  // of which one that must be clipped makes all slower
+    constexpr std::size_t kAtOnce = 512;  // one clipped sample slows down all of these
     const auto toIntegers = m_truncates ? ToIntegers<TowardsZero, Stored> : ToIntegers<Nearest, Stored>;
     const std::span all(samples, static_cast<std::size_t>(frames * m_info.channels));
     integers.resize(all.size());

@@ -89,7 +89,7 @@ void TakeAdvance(const Advance& a, std::size_t bins) {
     });
 }
 
-// Three short loops: what a bin goes through is so long that a processor has too few in hand at once.
+// Three short loops: in one long one a processor waits for the results of the few bins it has in hand.
 void Synthesise(const Synthesis& s, std::size_t bins) {
     const auto count = static_cast<std::int32_t>(bins);
     for (std::int32_t k = 0; k < count; ++k) {

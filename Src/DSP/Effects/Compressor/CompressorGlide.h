@@ -41,7 +41,7 @@ struct GlidingCurve {
 // Both channels' curves where they are kept: what there is to say about them, then the points in use, the
 // left curve's and the right one's. The memory behind them is never touched, so that few pages are.
 struct KeptCurves {
-    KeptCurves() {}  // nothing is written
+    KeptCurves() {}  // leaves the points as they are in memory
     KeptCurves(const KeptCurves&) = delete;
     KeptCurves& operator=(const KeptCurves& from);
     KeptCurves& operator=(const CompMapStereo& from);
@@ -53,8 +53,8 @@ struct KeptCurves {
     // Whether all points in use are the same.
     bool HasPointsOf(const KeptCurves& other) const;
 
-    std::array<std::int32_t, 2> count, reserved;
-    std::int32_t last_threshold, last_ratio_step;
+    std::array<std::int32_t, 2> count{}, reserved{};
+    std::int32_t last_threshold = 0, last_ratio_step = 0;
     std::array<CurvePoint, 2 * TransferCurve::kMaxPoints> points;
 };
 
@@ -82,7 +82,6 @@ int GlideFrames(double factor, double smoothing);
 // Both channels' curves. A glide ends after a fixed number of frames; the points then stand on their
 // targets exactly.
 struct GlidingMap {
-    GlidingMap() { m_target.count = {}; }
     double factor = 0.0;
     int framesLeft = 0;
     std::array<GlidingCurve, 2> m_comp_map;

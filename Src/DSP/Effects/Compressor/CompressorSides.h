@@ -14,6 +14,7 @@
 namespace Corvo::DSP::CompressorPrivate {
 
 constexpr std::int32_t kMonitorFlag = 1;                              // of the flags word
+constexpr std::int32_t kShortestTime = 1, kLongestTime = 100000;      // hundredths of a millisecond
 constexpr std::int32_t kSilentOutGain = -960, kHighestOutGain = 200;  // tenths of a decibel
 
 // Settings as they are kept and travel between the threads, with the number of the user interface's
