@@ -5,6 +5,7 @@
 
 #include "DSP/Effects/Denoiser/DenoiserEngine.h"
 #include "DSP/Effects/Denoiser/DenoiserProcessor.h"
+#include "Platform/UntouchedZeros.h"
 #include "Threads/LatestValue.h"
 #include "Threads/SharedRecord.h"
 
