@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <type_traits>
 
 #include "Platform/UntouchedZeros.h"
 
@@ -23,9 +24,11 @@ public:
     std::size_t Taken() const { return m_taken; }
     bool Counting() const { return m_memory.empty(); }
 
-    // `count` plain values, all of their bytes 0, from a cache line on; null while counting.
+    // `count` values, all of their bytes 0 whatever T's defaults are, from a cache line on; null while
+    // counting.
     template <typename T = float>
     T* Take(std::size_t count) {
+        static_assert(std::is_trivially_copyable_v<T>);
         const std::size_t from = m_taken;
         m_taken += (count * sizeof(T) + kLine - 1) / kLine * (kLine / sizeof(float));
         return m_taken <= m_memory.size() ? reinterpret_cast<T*>(m_memory.data() + from) : nullptr;

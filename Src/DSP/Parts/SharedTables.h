@@ -17,7 +17,8 @@ std::shared_ptr<const Tables> SharedTables(const Key&... key) {
     std::erase_if(all, [](const auto& tables) { return tables.expired(); });
     for (const auto& tables : all)
         if (auto found = tables.lock(); found && found->IsFor(key...)) return found;
-    auto made = std::make_shared<const Tables>(key...);
+    // What make_shared makes would stay until the last weak pointer goes too.
+    std::shared_ptr<const Tables> made(new const Tables(key...));
     all.push_back(made);
     return made;
 }

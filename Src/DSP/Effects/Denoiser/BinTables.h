@@ -4,9 +4,9 @@
 #include <cstddef>
 #include <utility>
 
-#include "DSP/Effects/Denoiser/Arena.h"
 #include "DSP/Effects/Denoiser/MaskingLimit.h"
 #include "DSP/Effects/Denoiser/SizeSets.h"
+#include "DSP/Parts/Arena.h"
 
 namespace Corvo::DSP::Denoising {
 

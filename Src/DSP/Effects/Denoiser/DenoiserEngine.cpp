@@ -200,6 +200,7 @@ void DenoiserEngine::Apply(const EngineSettings& settings) {
         tracker.SetMaterial(settings.music);
         tracker.SetWhitening(settings.gains.whitening > 0.0f);
     }
+    // Only the next frames whiten by it: those at hand keep the gains they began with.
     if (settings.gains.whitening > 0.0f) FindReference();
     ChooseMode(false);
     AimOutput(!first);
@@ -212,7 +213,7 @@ void DenoiserEngine::CookCurves(std::size_t size) {
     const float* const places = m_windows[LengthIndex(size)].bins->gainPlace;
     const std::size_t values = m_windows[LengthIndex(size)].Values();
     const bool flat = IsFlat(m_settings.gainDb) && IsFlat(m_settings.rangeDb);
-    const std::size_t worked = flat ? 16 : values;
+    const std::size_t worked = flat ? kBinsAtOnce : values;
     for (std::size_t bin = 0; bin < worked; ++bin) {
         const float place = places[bin];
         curves.floor[bin] = kPerDb * (m_settings.sensitivityDb + AtPlace(m_settings.gainDb, place));

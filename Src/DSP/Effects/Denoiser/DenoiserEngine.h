@@ -11,6 +11,7 @@
 #include "DSP/Effects/Denoiser/NoiseTracker.h"
 #include "DSP/Effects/Denoiser/Pace.h"
 #include "DSP/Effects/Denoiser/SizeBlend.h"
+#include "Platform/UntouchedZeros.h"
 
 namespace Corvo::DSP::Denoising {
 

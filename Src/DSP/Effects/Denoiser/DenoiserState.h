@@ -5,6 +5,7 @@
 
 #include "DSP/Effects/Denoiser/DenoiserEngine.h"
 #include "DSP/Effects/Denoiser/DenoiserProcessor.h"
+#include "Platform/UntouchedZeros.h"
 #include "Threads/LatestValue.h"
 #include "Threads/SharedRecord.h"
 
@@ -45,10 +46,10 @@ struct State {
         EndPassage();
         auto made = engine ? std::move(engine) : std::make_unique<DenoiserEngine>();
         made->Prepare(preparedRate, channels, sizeSet);
+        // One that is still on its way is no newer than what is known.
+        if (const auto* loaded = m_toAudio.Take()) m_taken = (*loaded)->generation;
         made->Adopt(Known());
         GiveRoom(static_cast<std::uint32_t>(preparedRate));
-        // One that is still on its way is what is known.
-        if (const auto* loaded = m_toAudio.Take()) m_taken = (*loaded)->generation;
         engine = std::move(made);
         rate.store(static_cast<std::uint32_t>(preparedRate));
         m_channels = channels;

@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "DSP/Effects/Denoiser/Arena.h"
+#include "DSP/Effects/Denoiser/Rings.h"
 
 namespace Corvo::DSP::Denoising {
 

@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <span>
 
-#include "DSP/Effects/Denoiser/Arena.h"
+#include "DSP/Parts/Arena.h"
 
 namespace Corvo::DSP::Denoising {
 

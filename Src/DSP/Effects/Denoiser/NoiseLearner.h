@@ -5,9 +5,10 @@
 #include <span>
 #include <vector>
 
-#include "DSP/Effects/Denoiser/Arena.h"
 #include "DSP/Effects/Denoiser/NoiseProfile.h"
+#include "DSP/Effects/Denoiser/Rings.h"
 #include "DSP/Effects/Denoiser/SizeReducer.h"
+#include "Platform/UntouchedZeros.h"
 
 namespace Corvo::DSP::Denoising {
 

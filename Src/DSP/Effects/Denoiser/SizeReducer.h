@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <span>
 
-#include "DSP/Effects/Denoiser/Arena.h"
+#include "DSP/Effects/Denoiser/Rings.h"
 #include "DSP/Effects/Denoiser/SizeSets.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
 #include "DSP/Effects/Denoiser/WindowTables.h"

@@ -64,9 +64,12 @@ inline constexpr std::array kSizeSets{
 };
 // clang-format on
 
+// Loops over bins go over a multiple of so many values.
+constexpr std::size_t kBinsAtOnce = 16;
+
 // Values that a spectrum of a window of `length` takes in memory, per frame.
 constexpr std::size_t SpectrumValues(int length) {
-    return (static_cast<std::size_t>(length) / 2 + 1 + 15) / 16 * 16;
+    return (static_cast<std::size_t>(length) / 2 + kBinsAtOnce) / kBinsAtOnce * kBinsAtOnce;
 }
 
 // The set that a stored word chooses; words out of range act like the nearest.

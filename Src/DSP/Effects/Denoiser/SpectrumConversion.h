@@ -2,7 +2,7 @@
 
 #include <cstddef>
 
-#include "DSP/Effects/Denoiser/Arena.h"
+#include "DSP/Effects/Denoiser/Rings.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
 #include "DSP/Effects/Denoiser/WindowTables.h"
 

@@ -5,8 +5,8 @@
 namespace Corvo::DSP::Denoising {
 
 // Loops over the bins of a spectrum, as they stand in the middle of the noise reducer. Ranges are [from, to),
-// multiples of 16; every array reaches that far. Frames are arrays of one value per bin; `weights` holds one
-// weight per frame.
+// multiples of kBinsAtOnce; every array reaches that far. Frames are arrays of one value per bin; `weights`
+// holds one weight per frame.
 struct Frames {
     const float* const* frame;
     const float* weights;

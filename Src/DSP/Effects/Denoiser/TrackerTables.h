@@ -5,7 +5,7 @@
 #include <cstdint>
 #include <vector>
 
-#include "DSP/Effects/Denoiser/Arena.h"
+#include "DSP/Effects/Denoiser/Rings.h"
 
 namespace Corvo::DSP::Denoising {
 

@@ -2,8 +2,8 @@
 
 #include <cstddef>
 
-#include "DSP/Effects/Denoiser/Arena.h"
 #include "DSP/Effects/Denoiser/ReducerTables.h"
+#include "DSP/Effects/Denoiser/Rings.h"
 #include "DSP/Effects/Denoiser/SpectrumKernels.h"
 #include "Spectrum/Fft/SplitTransform.h"
 
