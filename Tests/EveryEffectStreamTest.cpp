@@ -120,9 +120,14 @@ TEST_P(EveryEffect, StaysInsideItsBlocksAtAnyRateAndSize) {
         for (const bool prepared : {false, true}) {
             if (prepared) effect->InitProcessing(100, &format);
             for (const int frames : {100, 200, 1, 0}) {
-                auto block = Noise<Sample>(static_cast<std::size_t>(frames * channels));
-                ProcessBlock(*effect, block.data(), frames, format);
-                ASSERT_TRUE(AllFinite(block)) << rate << " Hz, " << channels << " channels, " << frames;
+                const int edge = 2 * channels;  // samples on each side that are not the effect's
+                const auto before = Noise<Sample>(static_cast<std::size_t>(frames * channels + 2 * edge));
+                auto block = before;
+                ProcessBlock(*effect, block.data() + edge, frames, format);
+                ASSERT_TRUE(AllFinite(block) &&
+                            std::equal(before.begin(), before.begin() + edge, block.begin()) &&
+                            std::equal(before.end() - edge, before.end(), block.end() - edge))
+                    << rate << " Hz, " << channels << " channels, " << frames;
             }
         }
     };

@@ -1,9 +1,11 @@
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <memory>
 #include <optional>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "Apps/Program.h"
@@ -163,6 +165,27 @@ TEST(Relay, LeavesNobodyWaiting) {
     dsphost::Relay taker(1), filler(1);
     taker.Start([&] { EXPECT_FALSE(taker.ToTake()); });
     filler.Start([&] { Fill(filler); });
+}
+
+// Each side runs dry or full while the other sleeps, and must be woken in the middle of the stream.
+TEST(Relay, KeepsTheOrderWhileEitherSideSleepsNowAndThen) {
+    const auto doze = [](int block, int when) {
+        if (block % 100 == when) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    };
+    dsphost::Relay relay(1);
+    int taken = 0;
+    relay.Start([&] {
+        for (; const auto* block = relay.ToTake(); ++taken, relay.Return()) {
+            EXPECT_EQ(block->samples[0], taken);
+            doze(taken, 0);
+        }
+    });
+    for (int i = 0; i < 1000; ++i, relay.Pass()) {
+        relay.ToFill()->samples[0] = i;
+        doze(i, 50);
+    }
+    relay.Finish();
+    EXPECT_EQ(taken, 1000);
 }
 
 }  // namespace

@@ -22,7 +22,10 @@
 #elif COUNTS_CALLS
 #include <dlfcn.h>
 #include <pthread.h>
+#include <sys/mman.h>
+#include <sys/syscall.h>
 #include <time.h>
+#include <unistd.h>
 
 #include <typeinfo>
 #endif
@@ -179,6 +182,19 @@ int posix_memalign(void** memory, std::size_t alignment, std::size_t size) {
 void free(void* memory) {
     if (memory) Note(kFree);
     __libc_free(memory);
+}
+// Large pieces are mapped. What the C library maps for itself does not come by here.
+void* mmap(void* address, std::size_t bytes, int protection, int flags, int file, off_t offset) noexcept {
+    const auto map = [=] {
+        return reinterpret_cast<void*>(syscall(SYS_mmap, address, bytes, protection, flags, file, offset));
+    };
+    if (!(flags & MAP_ANONYMOUS) || !(flags & MAP_PRIVATE)) return map();
+    void* const memory = Allocated(map);
+    return memory ? memory : MAP_FAILED;
+}
+int munmap(void* memory, std::size_t bytes) noexcept {
+    Note(kFree);
+    return static_cast<int>(syscall(SYS_munmap, memory, bytes));
 }
 
 // Trying a lock is allowed; only a lock that can wait counts. A condition is waited for under such a lock.

@@ -59,15 +59,19 @@ using Edits = std::vector<Probe::Record>;
 
 // Catches pairs and reversed orders that reach the wrong parameter or lose the automation flag.
 TEST(CorvoEffectBase, RoutesExternalParametersToRealOnes) {
-    for (const bool reversed : {false, true}) {
-        Probe probe;
-        probe.paired = true;
-        probe.m_reverse_param_order = reversed;
-        probe.SetParam(1, 0.5f, true);
-        // A reversed order drops the second flag.
-        const int first = reversed ? 4 : 2;
-        EXPECT_EQ(probe.edits, Edits({{first, 0.5f, true}, {first + 1, 0.5f, !reversed}}));
-    }
+    for (const bool reversed : {false, true})
+        for (const bool paired : {false, true}) {
+            Probe probe(7);
+            probe.paired = paired;
+            probe.m_reverse_param_order = reversed;
+            EXPECT_EQ(probe.GetParamCount(), paired ? 3 : 7);
+            probe.SetParam(2, 0.5f, true);
+            // A reversed order drops the flag, of a pair that of the second.
+            const int last = paired ? (reversed ? 2 : 5) : (reversed ? 4 : 2);
+            Edits expected{{last, 0.5f, !reversed}};
+            if (paired) expected.insert(expected.begin(), {last - 1, 0.5f, true});
+            EXPECT_EQ(probe.edits, expected);
+        }
 }
 
 // Catches segments played early, twice or never.
