@@ -7,6 +7,7 @@
 #include "Platform/AlignedMemory.h"
 #include "Spectrum/Fft/FftPlan.h"
 #include "Spectrum/Fft/SharedPlan.h"
+#include "Spectrum/Fft/SplitSpectrum.h"
 
 using Corvo::AlignedAllocate;
 using Corvo::AlignedFree;
@@ -123,27 +124,21 @@ void CorvoFFT::SplitForward(const SetUp<T>& setUp, T* scratch, const T* in, T* r
         in = scratch;
     }
     Run<T>(setUp, &Kernels<T>::realForward, in, scratch);
-    const int pairs = std::min(length, m_scratchLength) / 2;
-    for (int k = 0; k < pairs; ++k) {
-        re[k] = scratch[2 * k];
-        im[k] = scratch[2 * k + 1];
-    }
+    const int pairs = std::max(std::min(length, m_scratchLength) / 2, 0);
+    Corvo::Fft::SplitPairs(scratch, re, im, static_cast<std::size_t>(pairs));
 }
 
 template <typename T>
 void CorvoFFT::SplitInverse(const SetUp<T>& setUp, T* scratch, T* out, const T* re, const T* im,
                             int length) const {
     if (!setUp.plan || m_scratchLength == 0) return;
-    const int pairs = std::min(length, m_scratchLength) / 2;
-    for (int k = 0; k < pairs; ++k) {
-        scratch[2 * k] = re[k];
-        scratch[2 * k + 1] = im[k];
-    }
+    const int pairs = std::max(std::min(length, m_scratchLength) / 2, 0);
+    Corvo::Fft::JoinPairs(re, im, scratch, static_cast<std::size_t>(pairs));
     const int transformed = RealLength(setUp);
     if (length >= transformed) {
         Run<T>(setUp, &Kernels<T>::realInverse, scratch, out);
     } else {
-        std::fill(scratch + 2 * std::max(pairs, 0), scratch + transformed, T(0));
+        std::fill(scratch + 2 * pairs, scratch + transformed, T(0));
         Run<T>(setUp, &Kernels<T>::realInverse, scratch, scratch);
         std::copy_n(scratch, std::max(length, 0), out);
     }

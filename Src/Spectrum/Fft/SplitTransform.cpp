@@ -3,6 +3,8 @@
 #include <bit>
 #include <new>
 
+#include "Spectrum/Fft/SplitSpectrum.h"
+
 namespace Corvo::Fft {
 namespace {
 
@@ -28,19 +30,13 @@ void SplitTransform::Forward(const float* in, float* re, float* im, float* work)
     const auto& plan = *m_shared->plan;
     float* const packed = PackedIn(work, plan.points);
     plan.kernels->realForward(plan, in, packed, work);
-    for (std::size_t k = 0; k < plan.points; ++k) {
-        re[k] = packed[2 * k];
-        im[k] = packed[2 * k + 1];
-    }
+    SplitPairs(packed, re, im, plan.points);
 }
 
 void SplitTransform::Inverse(const float* re, const float* im, float* out, float* work) const {
     const auto& plan = *m_shared->plan;
     float* const packed = PackedIn(work, plan.points);
-    for (std::size_t k = 0; k < plan.points; ++k) {
-        packed[2 * k] = re[k];
-        packed[2 * k + 1] = im[k];
-    }
+    JoinPairs(re, im, packed, plan.points);
     plan.kernels->realInverse(plan, packed, out, work);
 }
 
